@@ -1,0 +1,27 @@
+# Warnings, sanitizers and the compiler cache, the same for every target of the project.
+
+find_program(CCACHE_PROGRAM ccache)
+if(CCACHE_PROGRAM AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
+    set(CMAKE_CXX_COMPILER_LAUNCHER ${CCACHE_PROGRAM})
+endif()
+
+set(VLSERVICE_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize= takes them")
+if(VLSERVICE_SANITIZE)
+    add_compile_options(-fsanitize=${VLSERVICE_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    add_link_options(-fsanitize=${VLSERVICE_SANITIZE})
+endif()
+
+option(VLSERVICE_COVERAGE "Instrument for coverage" OFF)
+if(VLSERVICE_COVERAGE)
+    add_compile_options(--coverage)
+    add_link_options(--coverage)
+endif()
+
+# Only our own targets are warned about; what find_package brings is a system include.
+add_library(vlservice_warnings INTERFACE)
+target_compile_options(vlservice_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor
+    -Woverloaded-virtual -Wcast-align -Wnull-dereference)
+if(VLSERVICE_SANITIZE AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+    # The instrumentation makes g++ see null pointers and uninitialised values where there are none.
+    target_compile_options(vlservice_warnings INTERFACE -Wno-null-dereference -Wno-maybe-uninitialized)
+endif()

@@ -1,0 +1,75 @@
+#include "vlservice/platform/cmd.h"
+
+#include "vlservice/platform/log.h"
+
+#include <utility>
+
+namespace Ipc {
+
+using namespace std::chrono_literals;
+
+std::chrono::milliseconds Timeouts::duration(TimeoutId id) {
+    switch (id) {
+    case TIMEOUT_ID_0:
+        return 0s;
+    case TIMEOUT_ID_1:
+        return 10s;
+    case TIMEOUT_ID_2:
+        return 30s;
+    case TIMEOUT_ID_3:
+        return 120s;
+    }
+    return 0s;
+}
+
+CmdTransferI::~CmdTransferI() = default;
+
+CmdProcessorI::~CmdProcessorI() = default;
+
+CmdTransferI* CmdProcessorI::transfer() { return nullptr; }
+
+CmdI::CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor) : id_(id), processor_(std::move(processor)) {}
+
+CmdI::~CmdI() = default;
+
+Timeouts::TimeoutId CmdI::reqTimeoutId() const { return Timeouts::TIMEOUT_ID_1; }
+
+void CmdI::onTransferError(std::string message) {
+    Log::Lock log(4);
+    log.logStreamLine() << "Command " << name() << " failed in transfer. " << message;
+}
+
+bool CmdI::sendNextReqAfterDone() const { return true; }
+
+JsonCmdBase::JsonCmdBase(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
+    : CmdI(id, std::move(processor)) {}
+
+JsonCmdBase::~JsonCmdBase() = default;
+
+namespace {
+
+void transferOrFail(CmdI& cmd, void (CmdTransferI::*step)(std::shared_ptr<CmdI>)) {
+    CmdTransferI* const transfer = cmd.processor() ? cmd.processor()->transfer() : nullptr;
+    if (transfer)
+        (transfer->*step)(cmd.shared_from_this());
+    else
+        cmd.onTransferError("There is no connection");
+}
+
+} // namespace
+
+void JsonCmdBase::sendReq() { transferOrFail(*this, &CmdTransferI::sendReq); }
+void JsonCmdBase::readReq() { transferOrFail(*this, &CmdTransferI::readReq); }
+void JsonCmdBase::sendResp() { transferOrFail(*this, &CmdTransferI::sendResp); }
+void JsonCmdBase::readResp() { transferOrFail(*this, &CmdTransferI::readResp); }
+
+json::Object JsonCmdBase::serializeReq() const { return {}; }
+void JsonCmdBase::sendReqDone() {}
+void JsonCmdBase::deserializeReq(json::Object const&) {}
+void JsonCmdBase::readReqDone() {}
+json::Object JsonCmdBase::serializeResp() const { return {}; }
+void JsonCmdBase::sendRespDone() {}
+void JsonCmdBase::deserializeResp(json::Object const&) {}
+void JsonCmdBase::readRespDone() {}
+
+} // namespace Ipc

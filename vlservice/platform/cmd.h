@@ -1,0 +1,106 @@
+#pragma once
+// The bases of commands: what a command is to the connection that carries it and to the processor that handles it.
+
+#include "vlservice/cfg/json.h"
+#include "vlservice/export.h"
+
+#include <chrono>
+#include <memory>
+#include <string>
+
+namespace Ipc {
+
+class CmdI;
+
+/// How long a request may take.
+class VLSERVICE_EXPORT Timeouts {
+public:
+    enum TimeoutId { TIMEOUT_ID_0 = 0, TIMEOUT_ID_1 = 1, TIMEOUT_ID_2 = 2, TIMEOUT_ID_3 = 3 };
+
+    /// Zero, which is no limit, for 0; then 10 s, 30 s and 120 s.
+    static std::chrono::milliseconds duration(TimeoutId id);
+};
+
+/// Carries commands for the operations by which a command sends and reads itself.
+/// A connection between programs implements it; a processor hands it out.
+class VLSERVICE_EXPORT CmdTransferI {
+public:
+    virtual ~CmdTransferI();
+    virtual void sendReq(std::shared_ptr<CmdI> cmd) = 0;
+    virtual void readReq(std::shared_ptr<CmdI> cmd) = 0;
+    virtual void sendResp(std::shared_ptr<CmdI> cmd) = 0;
+    virtual void readResp(std::shared_ptr<CmdI> cmd) = 0;
+};
+
+/// Receives commands.
+class VLSERVICE_EXPORT CmdProcessorI {
+public:
+    /// Takes charge of a command.
+    virtual void submit(std::shared_ptr<CmdI> cmd) = 0;
+    virtual ~CmdProcessorI();
+
+    /// What carries this processor's commands; null when they never leave the program.
+    virtual CmdTransferI* transfer();
+};
+
+/// A command: a number, a name, and its steps over a connection. Held by std::shared_ptr; one thread at a time.
+class VLSERVICE_EXPORT CmdI : public std::enable_shared_from_this<CmdI> {
+protected:
+    virtual ~CmdI();
+
+public:
+    CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor);
+    CmdI(CmdI const&) = default;
+
+    unsigned char id() const { return id_; }
+    std::shared_ptr<CmdProcessorI> const& processor() const { return processor_; }
+
+    /// The display name.
+    virtual char const* name() const = 0;
+    /// Which timeout governs the request; TIMEOUT_ID_1 unless overridden.
+    virtual Timeouts::TimeoutId reqTimeoutId() const;
+    /// Told the text of a transfer failure; logs it.
+    virtual void onTransferError(std::string message);
+    virtual void sendReq() = 0;
+    virtual void readReq() = 0;
+    virtual void sendResp() = 0;
+    virtual void readResp() = 0;
+    virtual void accept(CmdProcessorI& processor) = 0;
+    /// Whether the next request may be sent when this command is done; true.
+    virtual bool sendNextReqAfterDone() const;
+
+private:
+    unsigned char id_;
+    std::shared_ptr<CmdProcessorI> processor_;
+};
+
+/// A command whose request and response are JSON objects. The four transfer steps run over processor()->transfer(); without
+/// one they end in onTransferError. The base's serialisation gives an empty object and its reading takes nothing.
+class VLSERVICE_EXPORT JsonCmdBase : public CmdI {
+protected:
+    ~JsonCmdBase() override;
+
+public:
+    JsonCmdBase(unsigned char id, std::shared_ptr<CmdProcessorI> processor);
+    JsonCmdBase(JsonCmdBase const&) = default;
+
+    void sendReq() override;
+    void readReq() override;
+    void sendResp() override;
+    void readResp() override;
+
+    virtual json::Object serializeReq() const;
+    /// The request has gone.
+    virtual void sendReqDone();
+    virtual void deserializeReq(json::Object const& request);
+    /// The request has been read.
+    virtual void readReqDone();
+    virtual json::Object serializeResp() const;
+    /// The response has gone.
+    virtual void sendRespDone();
+    virtual void deserializeResp(json::Object const& response);
+    /// The response has been read.
+    virtual void readRespDone();
+};
+
+} // namespace Ipc

@@ -1,0 +1,9 @@
+#pragma once
+// Everything public, the platform layer included.
+
+#include "vlservice/cfg/json.h"
+#include "vlservice/platform/cmd.h"
+#include "vlservice/platform/json_text.h"
+#include "vlservice/platform/local_time.h"
+#include "vlservice/platform/log.h"
+#include "vlservice/platform/uchar_alloc.h"
