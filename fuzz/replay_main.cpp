@@ -1,5 +1,6 @@
-// Feeds every file of the folders named on the command line to a fuzz target, for builds without a fuzzing engine.
-// An empty or missing folder is a failure: a target whose seeds were lost would otherwise pass unnoticed.
+// Feeds every file of the folders named on the command line to a fuzz target, for builds without a fuzzing
+// engine. An empty or missing folder is a failure: a target whose seeds were lost would otherwise pass
+// unnoticed.
 #include <cstdint>
 #include <filesystem>
 #include <fstream>

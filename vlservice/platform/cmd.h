@@ -1,5 +1,6 @@
 #pragma once
-// The bases of commands: what a command is to the connection that carries it and to the processor that handles it.
+// The bases of commands: what a command is to the connection that carries it and to the processor that
+// handles it.
 
 #include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
@@ -43,7 +44,8 @@ public:
     virtual CmdTransferI* transfer();
 };
 
-/// A command: a number, a name, and its steps over a connection. Held by std::shared_ptr; one thread at a time.
+/// A command: a number, a name, and its steps over a connection. Held by std::shared_ptr; one thread at a
+/// time.
 class VLSERVICE_EXPORT CmdI : public std::enable_shared_from_this<CmdI> {
 protected:
     virtual ~CmdI();
@@ -74,8 +76,9 @@ private:
     std::shared_ptr<CmdProcessorI> processor_;
 };
 
-/// A command whose request and response are JSON objects. The four transfer steps run over processor()->transfer(); without
-/// one they end in onTransferError. The base's serialisation gives an empty object and its reading takes nothing.
+/// A command whose request and response are JSON objects. The four transfer steps run over
+/// processor()->transfer(); without one they end in onTransferError. The base's serialisation gives an empty
+/// object and its reading takes nothing.
 class VLSERVICE_EXPORT JsonCmdBase : public CmdI {
 protected:
     ~JsonCmdBase() override;

@@ -3,15 +3,16 @@
 #include <algorithm>
 #include <charconv>
 #include <cstdlib>
-#include <memory>
 #include <locale>
+#include <memory>
 #include <ostream>
 #include <sstream>
 
 namespace json {
 namespace {
 
-/// Digits that every finite real in a document survives; 15 for most, and then they read as people wrote them.
+/// Digits that every finite real in a document survives; 15 for most, and then they read as people wrote
+/// them.
 constexpr int DIGITS_FOR_PEOPLE = 15;
 constexpr int DIGITS_EXACT = 17;
 
@@ -23,7 +24,8 @@ bool survives(double real, int digits) {
     return back == real;
 }
 
-/// Tests the keys, which the printer of jansson lets through as malformed text, and finds the digits that are needed.
+/// Tests the keys, which the printer of jansson lets through as malformed text, and finds the digits that are
+/// needed.
 int prepare(Value const& value) {
     int digits = DIGITS_FOR_PEOPLE;
     if (value.isObject()) {
@@ -68,15 +70,20 @@ Object strToObject(char const* text, std::size_t length) {
     if (!parsed) {
         std::ostringstream message;
         message.imbue(std::locale::classic());
-        message << "JSON error: " << error.text << " (line " << error.line << ", column " << error.column << ')';
+        message << "JSON error: " << error.text << " (line " << error.line << ", column " << error.column
+                << ')';
         throw Exc(message.str());
     }
     return std::move(parsed).toObject();
 }
 
-std::ostream& operator<<(std::ostream& out, Object const& object) { return print(out, object); }
+std::ostream& operator<<(std::ostream& out, Object const& object) {
+    return print(out, object);
+}
 
-std::ostream& operator<<(std::ostream& out, Array const& array) { return print(out, array); }
+std::ostream& operator<<(std::ostream& out, Array const& array) {
+    return print(out, array);
+}
 
 std::ostream& operator<<(std::ostream& out, Value const& value) {
     if (!value)

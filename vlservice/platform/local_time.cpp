@@ -28,8 +28,8 @@ std::optional<long> offsetAt(long long seconds) {
     return local.tm_gmtoff;
 }
 
-/// The zone's standard offset in a year. Zone data calls the summer time of some countries standard time, so it is the
-/// smaller of the winter's and the summer's offset that counts.
+/// The zone's standard offset in a year. Zone data calls the summer time of some countries standard time, so
+/// it is the smaller of the winter's and the summer's offset that counts.
 std::optional<long> standardOffset(long long year) {
     auto const january = offsetAt(daysToMonth(year, 0) * SECONDS_A_DAY);
     auto const july = offsetAt(daysToMonth(year, 6) * SECONDS_A_DAY);

@@ -45,7 +45,10 @@ struct Lock::Line {
     std::ostringstream text;
 };
 
-Lock::Lock(LogPriority priority) : line_(new Line{priority, {}}) { line_->text.imbue(std::locale::classic()); }
+Lock::Lock(LogPriority priority)
+    : line_(new Line{priority, {}}) {
+    line_->text.imbue(std::locale::classic());
+}
 
 Lock::~Lock() {
     try {
@@ -60,6 +63,8 @@ Lock::~Lock() {
     }
 }
 
-std::ostream& Lock::logStreamLine() { return line_->text; }
+std::ostream& Lock::logStreamLine() {
+    return line_->text;
+}
 
 } // namespace Log

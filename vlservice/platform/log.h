@@ -19,11 +19,12 @@ using LogPriority = int;
 using Sink = std::function<void(LogPriority, std::string const& line)>;
 
 /// Installs a sink and returns the one before. An empty sink drops all lines.
-/// The sink at start writes to standard error, each line prefixed "<3>" and so on, which the journal understands.
+/// The sink at start writes to standard error, each line prefixed "<3>" and so on, which the journal
+/// understands.
 VLSERVICE_EXPORT Sink setSink(Sink sink);
 
-/// One message: what is streamed in reaches the sink, in one call, when the object is destroyed, without its final
-/// end of line. Numbers are written with the classic locale. Lines of several threads do not mix.
+/// One message: what is streamed in reaches the sink, in one call, when the object is destroyed, without its
+/// final end of line. Numbers are written with the classic locale. Lines of several threads do not mix.
 class VLSERVICE_EXPORT Lock {
 public:
     explicit Lock(LogPriority priority);
