@@ -335,18 +335,10 @@ private:
     std::size_t index_ = 0;
 };
 
-inline Object::Iterator Object::begin() const {
-    return Iterator(*this);
-}
-inline Object::Iterator Object::end() const noexcept {
-    return {};
-}
-inline Array::Iterator Array::begin() const {
-    return Iterator(*this);
-}
-inline Array::Iterator Array::end() const noexcept {
-    return {};
-}
+inline Object::Iterator Object::begin() const { return Iterator(*this); }
+inline Object::Iterator Object::end() const noexcept { return {}; }
+inline Array::Iterator Array::begin() const { return Iterator(*this); }
+inline Array::Iterator Array::end() const noexcept { return {}; }
 
 inline Object const& Value::toObject() const& {
     require(isObject(), "object");

@@ -26,9 +26,7 @@ CmdTransferI::~CmdTransferI() = default;
 
 CmdProcessorI::~CmdProcessorI() = default;
 
-CmdTransferI* CmdProcessorI::transfer() {
-    return nullptr;
-}
+CmdTransferI* CmdProcessorI::transfer() { return nullptr; }
 
 CmdI::CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
     : id_(id)
@@ -36,18 +34,14 @@ CmdI::CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
 
 CmdI::~CmdI() = default;
 
-Timeouts::TimeoutId CmdI::reqTimeoutId() const {
-    return Timeouts::TIMEOUT_ID_1;
-}
+Timeouts::TimeoutId CmdI::reqTimeoutId() const { return Timeouts::TIMEOUT_ID_1; }
 
 void CmdI::onTransferError(std::string message) {
     Log::Lock log(4);
     log.logStreamLine() << "Command " << name() << " failed in transfer. " << message;
 }
 
-bool CmdI::sendNextReqAfterDone() const {
-    return true;
-}
+bool CmdI::sendNextReqAfterDone() const { return true; }
 
 JsonCmdBase::JsonCmdBase(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
     : CmdI(id, std::move(processor)) {}
@@ -66,28 +60,16 @@ void transferOrFail(CmdI& cmd, void (CmdTransferI::*step)(std::shared_ptr<CmdI>)
 
 } // namespace
 
-void JsonCmdBase::sendReq() {
-    transferOrFail(*this, &CmdTransferI::sendReq);
-}
-void JsonCmdBase::readReq() {
-    transferOrFail(*this, &CmdTransferI::readReq);
-}
-void JsonCmdBase::sendResp() {
-    transferOrFail(*this, &CmdTransferI::sendResp);
-}
-void JsonCmdBase::readResp() {
-    transferOrFail(*this, &CmdTransferI::readResp);
-}
+void JsonCmdBase::sendReq() { transferOrFail(*this, &CmdTransferI::sendReq); }
+void JsonCmdBase::readReq() { transferOrFail(*this, &CmdTransferI::readReq); }
+void JsonCmdBase::sendResp() { transferOrFail(*this, &CmdTransferI::sendResp); }
+void JsonCmdBase::readResp() { transferOrFail(*this, &CmdTransferI::readResp); }
 
-json::Object JsonCmdBase::serializeReq() const {
-    return {};
-}
+json::Object JsonCmdBase::serializeReq() const { return {}; }
 void JsonCmdBase::sendReqDone() {}
 void JsonCmdBase::deserializeReq(json::Object const&) {}
 void JsonCmdBase::readReqDone() {}
-json::Object JsonCmdBase::serializeResp() const {
-    return {};
-}
+json::Object JsonCmdBase::serializeResp() const { return {}; }
 void JsonCmdBase::sendRespDone() {}
 void JsonCmdBase::deserializeResp(json::Object const&) {}
 void JsonCmdBase::readRespDone() {}

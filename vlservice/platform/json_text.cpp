@@ -77,13 +77,9 @@ Object strToObject(char const* text, std::size_t length) {
     return std::move(parsed).toObject();
 }
 
-std::ostream& operator<<(std::ostream& out, Object const& object) {
-    return print(out, object);
-}
+std::ostream& operator<<(std::ostream& out, Object const& object) { return print(out, object); }
 
-std::ostream& operator<<(std::ostream& out, Array const& array) {
-    return print(out, array);
-}
+std::ostream& operator<<(std::ostream& out, Array const& array) { return print(out, array); }
 
 std::ostream& operator<<(std::ostream& out, Value const& value) {
     if (!value)

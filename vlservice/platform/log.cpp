@@ -63,8 +63,6 @@ Lock::~Lock() {
     }
 }
 
-std::ostream& Lock::logStreamLine() {
-    return line_->text;
-}
+std::ostream& Lock::logStreamLine() { return line_->text; }
 
 } // namespace Log

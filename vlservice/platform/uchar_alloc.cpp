@@ -1,9 +1,5 @@
 #include "vlservice/platform/uchar_alloc.h"
 
-unsigned char* ExportedUCharAlloc::alloc(std::size_t size) {
-    return new unsigned char[size];
-}
+unsigned char* ExportedUCharAlloc::alloc(std::size_t size) { return new unsigned char[size]; }
 
-void ExportedUCharAlloc::operator()(unsigned char* block) const {
-    delete[] block;
-}
+void ExportedUCharAlloc::operator()(unsigned char* block) const { delete[] block; }
