@@ -19,8 +19,7 @@ namespace fs = std::filesystem;
 
 class FileDescriptor {
 public:
-    FileDescriptor(fs::path const& path, int flags)
-        : number_(::open(path.c_str(), flags | O_CLOEXEC)) {
+    FileDescriptor(fs::path const& path, int flags) : number_(::open(path.c_str(), flags | O_CLOEXEC)) {
         if (number_ < 0)
             fail("cannot open " + path.string());
     }
@@ -53,8 +52,7 @@ void giveUsualRights(int file) {
 
 } // namespace
 
-PendingFile::PendingFile(fs::path target)
-    : target_(std::move(target)) {
+PendingFile::PendingFile(fs::path target) : target_(std::move(target)) {
     std::string name = (folderOf(target_) / ".XXXXXX.part").string();
     int const file = ::mkstemps(name.data(), 5);
     if (file < 0)

@@ -39,8 +39,7 @@ std::size_t displayWidth(std::string const& text) {
     return width;
 }
 
-TextTable::TextTable(std::vector<Column> columns)
-    : columns_(std::move(columns)) {}
+TextTable::TextTable(std::vector<Column> columns) : columns_(std::move(columns)) {}
 
 void TextTable::addRow(std::vector<std::string> cells) {
     cells.resize(columns_.size());

@@ -24,8 +24,7 @@ class Object;
 /// The one failure of the JSON layer; what() begins with "JSON error: ".
 class VLSERVICE_EXPORT Exc : public std::runtime_error {
 public:
-    explicit Exc(std::string const& message)
-        : std::runtime_error(message) {}
+    explicit Exc(std::string const& message) : std::runtime_error(message) {}
 };
 
 namespace detail {
@@ -43,30 +42,22 @@ class Value {
 public:
     Value() noexcept = default;
     /// Takes over the reference that the caller holds; null gives the empty handle.
-    explicit Value(json_t* node) noexcept
-        : node_(node) {}
+    explicit Value(json_t* node) noexcept : node_(node) {}
     // A template, so that a raw pointer does not become a boolean.
     template<std::same_as<bool> T>
-    Value(T flag)
-        : node_(flag ? json_true() : json_false()) {}
+    Value(T flag) : node_(flag ? json_true() : json_false()) {}
     /// Any width and sign, as the 64-bit integer of the same bits.
     template<detail::Integer T>
-    Value(T number)
-        : node_(json_integer(static_cast<json_int_t>(number))) {}
+    Value(T number) : node_(json_integer(static_cast<json_int_t>(number))) {}
     /// NaN and the infinities give the empty handle.
     template<std::floating_point T>
-    Value(T number)
-        : node_(json_real(static_cast<double>(number))) {}
+    Value(T number) : node_(json_real(static_cast<double>(number))) {}
     /// A null pointer gives the empty handle. The bytes are not tested for UTF-8.
-    Value(char const* text)
-        : node_(json_string_nocheck(text)) {}
-    Value(std::string const& text)
-        : node_(json_string_nocheck(text.c_str())) {}
+    Value(char const* text) : node_(json_string_nocheck(text)) {}
+    Value(std::string const& text) : node_(json_string_nocheck(text.c_str())) {}
 
-    Value(Value const& other) noexcept
-        : node_(json_incref(other.node_)) {}
-    Value(Value&& other) noexcept
-        : node_(std::exchange(other.node_, nullptr)) {}
+    Value(Value const& other) noexcept : node_(json_incref(other.node_)) {}
+    Value(Value&& other) noexcept : node_(std::exchange(other.node_, nullptr)) {}
     ~Value() { json_decref(node_); }
 
     Value& operator=(Value const& other) noexcept {
@@ -190,10 +181,8 @@ class Object : public Value {
 public:
     class Iterator;
 
-    Object()
-        : Value(json_object()) {}
-    Object(std::initializer_list<std::pair<char const*, Value>> members)
-        : Object() {
+    Object() : Value(json_object()) {}
+    Object(std::initializer_list<std::pair<char const*, Value>> members) : Object() {
         for (auto const& [key, value] : members)
             set(key, value);
     }
@@ -224,10 +213,8 @@ public:
 
 private:
     friend class Value;
-    explicit Object(Value const& object) noexcept
-        : Value(object) {}
-    explicit Object(Value&& object) noexcept
-        : Value(std::move(object)) {}
+    explicit Object(Value const& object) noexcept : Value(object) {}
+    explicit Object(Value&& object) noexcept : Value(std::move(object)) {}
 };
 
 /// An array's handle. Default construction makes a new empty array.
@@ -235,8 +222,7 @@ class Array : public Value {
 public:
     class Iterator;
 
-    Array()
-        : Value(json_array()) {}
+    Array() : Value(json_array()) {}
 
     /// The element, or the empty handle when there is none.
     Value at(std::size_t index) const noexcept { return Value(json_incref(json_array_get(node_, index))); }
@@ -261,10 +247,8 @@ public:
 
 private:
     friend class Value;
-    explicit Array(Value const& array) noexcept
-        : Value(array) {}
-    explicit Array(Value&& array) noexcept
-        : Value(std::move(array)) {}
+    explicit Array(Value const& array) noexcept : Value(array) {}
+    explicit Array(Value&& array) noexcept : Value(std::move(array)) {}
 };
 
 /// Holds a reference to the node, so that a change during the iteration goes to a copy.
@@ -278,8 +262,7 @@ public:
 
     Iterator() noexcept = default;
     explicit Iterator(Value object) noexcept
-        : object_(std::move(object))
-        , at_(json_object_iter(object_.node())) {}
+        : object_(std::move(object)), at_(json_object_iter(object_.node())) {}
 
     value_type operator*() const {
         return {json_object_iter_key(at_), Value(json_incref(json_object_iter_value(at_)))};
@@ -310,8 +293,7 @@ public:
     using pointer = void;
 
     Iterator() noexcept = default;
-    explicit Iterator(Value array) noexcept
-        : array_(std::move(array)) {}
+    explicit Iterator(Value array) noexcept : array_(std::move(array)) {}
 
     Value operator*() const noexcept { return Value(json_incref(json_array_get(array_.node(), index_))); }
     Iterator& operator++() noexcept {

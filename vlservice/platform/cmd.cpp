@@ -29,8 +29,7 @@ CmdProcessorI::~CmdProcessorI() = default;
 CmdTransferI* CmdProcessorI::transfer() { return nullptr; }
 
 CmdI::CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
-    : id_(id)
-    , processor_(std::move(processor)) {}
+    : id_(id), processor_(std::move(processor)) {}
 
 CmdI::~CmdI() = default;
 

@@ -45,8 +45,7 @@ struct Lock::Line {
     std::ostringstream text;
 };
 
-Lock::Lock(LogPriority priority)
-    : line_(new Line{priority, {}}) {
+Lock::Lock(LogPriority priority) : line_(new Line{priority, {}}) {
     line_->text.imbue(std::locale::classic());
 }
 
