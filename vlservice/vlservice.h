@@ -2,6 +2,8 @@
 // Everything public, the platform layer included.
 
 #include "vlservice/cfg/json.h"
+#include "vlservice/extract/extracted_field.h"
+#include "vlservice/extract/ignore_on_group.h"
 #include "vlservice/platform/cmd.h"
 #include "vlservice/platform/json_text.h"
 #include "vlservice/platform/local_time.h"
