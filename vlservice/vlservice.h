@@ -3,6 +3,7 @@
 
 #include "vlservice/cfg/json.h"
 #include "vlservice/extract/extracted_field.h"
+#include "vlservice/extract/extracted_fields.h"
 #include "vlservice/extract/ignore_on_group.h"
 #include "vlservice/platform/cmd.h"
 #include "vlservice/platform/json_text.h"
