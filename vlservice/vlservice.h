@@ -1,6 +1,9 @@
 #pragma once
 // Everything public, the platform layer included.
 
+#include "vlservice/cfg/cfg_node_id.h"
+#include "vlservice/cfg/geometry.h"
+#include "vlservice/cfg/id.h"
 #include "vlservice/cfg/json.h"
 #include "vlservice/extract/extracted_field.h"
 #include "vlservice/extract/extracted_fields.h"
