@@ -1,10 +1,17 @@
 #pragma once
 // Everything public, the platform layer included.
 
+#include "vlservice/cfg/app.h"
 #include "vlservice/cfg/cfg_node_id.h"
+#include "vlservice/cfg/departments.h"
 #include "vlservice/cfg/geometry.h"
 #include "vlservice/cfg/id.h"
+#include "vlservice/cfg/inet.h"
 #include "vlservice/cfg/json.h"
+#include "vlservice/cfg/part.h"
+#include "vlservice/cfg/po.h"
+#include "vlservice/cfg/profiles.h"
+#include "vlservice/cfg/show_ctrls.h"
 #include "vlservice/extract/extracted_field.h"
 #include "vlservice/extract/extracted_fields.h"
 #include "vlservice/extract/ignore_on_group.h"

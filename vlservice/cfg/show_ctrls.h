@@ -1,0 +1,35 @@
+#pragma once
+// Which controls of the user interface are shown.
+
+#include "vlservice/cfg/json.h"
+#include "vlservice/export.h"
+
+#include <bitset>
+#include <cstddef>
+
+namespace Cfg {
+
+/// A set of bits, one for each control. What each stands for is the user interface's affair.
+/// JSON: an array of integers of 64 bits each, lowest first, as signed numbers; always two of them when
+/// written.
+class VLSERVICE_EXPORT ShowCtrls {
+public:
+    static constexpr std::size_t COUNT = 78;
+    using Bits = std::bitset<COUNT>;
+
+    ShowCtrls() = default;
+    explicit ShowCtrls(Bits const& bits) : bits_(bits) {}
+    /// Integers that are missing leave their bits clear, and what is behind the last bit is dropped. The
+    /// empty handle has no bit set. Throws json::Exc when the node is no array or an element no integer.
+    ShowCtrls(json::Value const& node);
+
+    Bits const& bits() const { return bits_; }
+    Bits& bits() { return bits_; }
+    json::Array serialize() const;
+    friend bool operator==(ShowCtrls const&, ShowCtrls const&) = default;
+
+private:
+    Bits bits_;
+};
+
+} // namespace Cfg
