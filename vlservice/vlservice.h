@@ -20,3 +20,6 @@
 #include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
 #include "vlservice/platform/uchar_alloc.h"
+#include "vlservice/presets/letterhead_inf.h"
+#include "vlservice/presets/pack_preset.h"
+#include "vlservice/presets/process_mode.h"

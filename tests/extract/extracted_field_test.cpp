@@ -1,38 +1,21 @@
 #include "vlservice/extract/extracted_field.h"
 
-#include "vlservice/platform/json_text.h"
+#include "tests/json_helpers.h"
 
-#include <gmock/gmock.h>
-
-#include <cmath>
 #include <cstdlib>
 #include <ctime>
 #include <limits>
-#include <sstream>
+#include <string>
 #include <utility>
+#include <vector>
 
 namespace Cfg {
 namespace {
 
-using testing::StrEq;
-using testing::ThrowsMessage;
 using ValueType = ExtractedField::ValueType;
 
 constexpr long long MAX_INT64 = std::numeric_limits<long long>::max();
 constexpr long long MIN_INT64 = std::numeric_limits<long long>::min();
-
-std::string print(json::Value const& value) {
-    std::ostringstream text;
-    text << value;
-    return text.str();
-}
-
-json::Object parse(std::string const& text) { return json::strToObject(text.data(), text.size()); }
-
-/// The value of any JSON text; the empty text is the empty handle.
-json::Value valueOf(std::string const& text) {
-    return text.empty() ? json::Value() : parse("{\"v\":" + text + "}").get("v");
-}
 
 ExtractedField field(json::Value const& value, ValueType type = ValueType::Plain,
                      IgnoreOnGroup ignore = IgnoreOnGroup::MustMatch) {
@@ -41,12 +24,6 @@ ExtractedField field(json::Value const& value, ValueType type = ValueType::Plain
 
 ExtractedField grouped(IgnoreOnGroup ignore, std::string const& value) {
     return field(valueOf(value), ValueType::Plain, ignore);
-}
-
-template<typename Call>
-void expectWrongType(Call call, std::string const& actual, std::string const& wanted) {
-    EXPECT_THAT(call, ThrowsMessage<json::Exc>(
-                          StrEq("JSON error: Wrong type: " + actual + ". Expected type: " + wanted)));
 }
 
 class ExtractedFieldTimes : public testing::Test {
@@ -398,8 +375,7 @@ TEST(ExtractedFieldGrouping, RefusesWhatIsNoPrimitiveValue) {
     for (auto const& row : rows) {
         for (IgnoreOnGroup const rule : {IgnoreOnGroup::Sum, IgnoreOnGroup::Min, IgnoreOnGroup::Max}) {
             ExtractedField f = grouped(rule, row.value);
-            EXPECT_THAT([&] { f.combineOnGroup(field(valueOf(row.other))); },
-                        ThrowsMessage<json::Exc>(StrEq(row.message)));
+            expectFailure<json::Exc>([&] { f.combineOnGroup(field(valueOf(row.other))); }, row.message);
             EXPECT_EQ(f.rawValue(), valueOf(row.value));
         }
     }

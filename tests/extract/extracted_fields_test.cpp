@@ -1,10 +1,7 @@
 #include "vlservice/extract/extracted_fields.h"
 
-#include "vlservice/platform/json_text.h"
+#include "tests/json_helpers.h"
 
-#include <gmock/gmock.h>
-
-#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -13,20 +10,9 @@ namespace Cfg {
 namespace {
 
 using testing::ElementsAre;
-using testing::StrEq;
-using testing::ThrowsMessage;
 using ValueType = ExtractedField::ValueType;
 
-json::Array arrayOf(std::string const& text) {
-    std::string const object = "{\"v\":" + text + "}";
-    return json::strToObject(object.data(), object.size()).get("v").toArray();
-}
-
-std::string print(json::Array const& array) {
-    std::ostringstream text;
-    text << array;
-    return text.str();
-}
+json::Array arrayOf(std::string const& text) { return valueOf(text).toArray(); }
 
 struct Entry {
     std::string name;
@@ -79,8 +65,7 @@ TEST(ExtractedFieldsReading, RefusesWhatIsNoField) {
         {"[{}]", "JSON error: Wrong type: empty. Expected type: string"},
     };
     for (auto const& [text, message] : rows)
-        EXPECT_THAT([&] { ExtractedFields fields(arrayOf(text)); }, ThrowsMessage<json::Exc>(StrEq(message)))
-            << text;
+        expectFailure<json::Exc>([&] { ExtractedFields fields(arrayOf(text)); }, message);
 }
 
 TEST(ExtractedFieldsWriting, GivesTheFieldsInIterationOrder) {
@@ -235,8 +220,7 @@ TEST(ExtractedFieldsGrouping, KeepsWhatWasMergedBeforeAFailure) {
                                       {.name = "b", .value = 1, .ignore = IgnoreOnGroup::Sum}});
     ExtractedFields const letter = fieldsOf({{.name = "a", .value = 2, .ignore = IgnoreOnGroup::Sum},
                                              {.name = "b", .value = "x", .ignore = IgnoreOnGroup::Sum}});
-    EXPECT_THAT([&] { group.combineOnGroup(letter); },
-                ThrowsMessage<json::Exc>(StrEq("JSON error: Wrong type: string. Expected type: integer")));
+    expectWrongType([&] { group.combineOnGroup(letter); }, "string", "integer");
     EXPECT_EQ(group.begin()->second.intVal(), 3);
     EXPECT_EQ(std::next(group.begin())->second.intVal(), 1);
 }

@@ -17,6 +17,7 @@
 #include <tuple>
 #include <type_traits>
 #include <utility>
+#include <vector>
 
 namespace json {
 
@@ -134,6 +135,29 @@ void readKeys(std::tuple<Rows...> const& table, Object const& from, Record& into
 template<typename Record, typename... Rows>
 void writeKeys(std::tuple<Rows...> const& table, Record const& from, Object& into) {
     std::apply([&](auto const&... rows) { (rows.write(from, into), ...); }, table);
+}
+
+/// A list of records, each built from its element; a missing key gives none.
+/// Throws Exc when the value is no array, and whatever an element's constructor throws.
+template<typename T>
+std::vector<T> readList(Value const& value) {
+    std::vector<T> list;
+    if (!value)
+        return list;
+    Array const& array = value.toArray();
+    list.reserve(array.size());
+    for (Value const& element : array)
+        list.emplace_back(element);
+    return list;
+}
+
+/// The records in their JSON form, in list order.
+template<typename T>
+Array writeList(std::vector<T> const& list) {
+    Array array;
+    for (T const& element : list)
+        array.append(element.serialize());
+    return array;
 }
 
 } // namespace json
