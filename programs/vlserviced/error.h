@@ -1,0 +1,14 @@
+#pragma once
+// How the service fails towards people: one line.
+
+#include <stdexcept>
+
+namespace VlServiced {
+
+/// A failure as a person reads it: one line that says what failed, where, and what to do.
+class Error : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+} // namespace VlServiced

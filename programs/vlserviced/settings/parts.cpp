@@ -1,0 +1,186 @@
+#include "programs/vlserviced/settings/parts.h"
+
+#include "programs/vlserviced/error.h"
+#include "vlservice/cfg/app.h"
+#include "vlservice/cfg/departments.h"
+#include "vlservice/cfg/inet.h"
+#include "vlservice/cfg/po.h"
+#include "vlservice/cfg/profiles.h"
+
+#include <algorithm>
+#include <array>
+#include <functional>
+#include <stdexcept>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+using Chain = std::vector<SettingsLevel>;
+
+json::Value jsonNull() { return json::Value(json_null()); }
+
+std::string shownNode(std::string const& id) { return id.empty() ? "the root" : "node " + id; }
+
+template<typename Part>
+Part readLevel(SettingsLevel const& level, bool global) {
+    try {
+        return Part(level.parts.get(Part::PART_NAME), global, true);
+    } catch (std::exception const& failure) {
+        throw Error("the settings \"" + std::string(Part::PART_NAME) + "\" of " + shownNode(level.id) +
+                    " cannot be read: " + failure.what());
+    }
+}
+
+/// Completes each level from the one above it, so that in every field and in every list the nearest node
+/// comes first. The root is built as the global part: below its own values stand the built-in ones.
+template<typename Part>
+Part complete(Chain const& chain, std::size_t at) {
+    bool const isRoot = at + 1 == chain.size();
+    // The node itself is global too, because only a global part writes its inherited values.
+    Part part = readLevel<Part>(chain[at], isRoot || at == 0);
+    if (!isRoot)
+        part.combineParent(complete<Part>(chain, at + 1));
+    return part;
+}
+
+template<typename Part>
+json::Object effective(Chain const& chain) {
+    return complete<Part>(chain, 0).serialize().toObject();
+}
+
+template<typename Part>
+json::Value readOwn(json::Value const& sent) {
+    return Part(sent, false, false).serialize();
+}
+
+enum class Inheritance { Whole, ByElements };
+
+struct PartKind {
+    std::string name;
+    /// How the lists of the part are inherited.
+    Inheritance lists;
+    json::Value (*own)(json::Value const& sent);
+    json::Object (*effective)(Chain const& chain);
+};
+
+template<typename Part>
+PartKind kind(Inheritance lists) {
+    return {Part::PART_NAME, lists, &readOwn<Part>, &effective<Part>};
+}
+
+std::array<PartKind, 5> const& kinds() {
+    static std::array<PartKind, 5> const all{
+        kind<Cfg::App>(Inheritance::Whole),
+        kind<Cfg::Inet>(Inheritance::Whole),
+        kind<Cfg::PO>(Inheritance::Whole),
+        kind<Cfg::Departments>(Inheritance::Whole),
+        kind<Cfg::Profiles>(Inheritance::ByElements),
+    };
+    return all;
+}
+
+PartKind const& kindNamed(std::string const& name) {
+    auto const found =
+        std::find_if(kinds().begin(), kinds().end(), [&](PartKind const& k) { return k.name == name; });
+    if (found != kinds().end())
+        return *found;
+    std::string known;
+    for (std::string const& part : partNames())
+        known += (known.empty() ? "" : ", ") + part;
+    throw Error("there are no settings \"" + name + "\"; there are " + known);
+}
+
+/// A global part writes every key that it has, whatever its values.
+void checkKeys(PartKind const& kind, json::Object const& sent) {
+    json::Object const known = kind.effective({SettingsLevel{}});
+    for (auto const& [key, value] : sent)
+        if (!known.get(key))
+            throw Error("the settings \"" + kind.name + "\" have no key \"" + key + "\"");
+}
+
+bool isWrapper(json::Value const& value) { return value.isObject() && value.toObject().get("inh").isTrue(); }
+
+json::Value unwrapped(json::Value const& value) {
+    return isWrapper(value) ? value.toObject().get("v") : value;
+}
+
+json::Array unwrappedElements(json::Array const& list) {
+    json::Array plain;
+    for (json::Value const& element : list)
+        plain.append(unwrapped(element));
+    return plain;
+}
+
+/// The nearest level that has the key itself: stored parts hold own values alone.
+json::Value originOfValue(PartKind const& kind, char const* key, Chain const& chain) {
+    for (SettingsLevel const& level : chain)
+        if (json::Value const part = level.parts.get(kind.name); part && part.toObject().get(key))
+            return level.id;
+    return jsonNull();
+}
+
+/// The levels' own elements follow one another, and built-in ones come behind them.
+json::Array originsOfElements(PartKind const& kind, char const* key, Chain const& chain, std::size_t count) {
+    json::Array origins;
+    for (SettingsLevel const& level : chain) {
+        json::Value const part = level.parts.get(kind.name);
+        json::Value const list = part ? part.toObject().get(key) : json::Value();
+        for (std::size_t own = list ? list.toArray().size() : 0; own > 0; --own)
+            origins.append(level.id);
+    }
+    while (origins.size() < count)
+        origins.append(jsonNull());
+    return origins;
+}
+
+json::Object resolvePart(PartKind const& kind, Chain const& chain) {
+    json::Object values;
+    json::Object origins;
+    for (auto const& [key, written] : kind.effective(chain)) {
+        if (kind.lists == Inheritance::ByElements) {
+            json::Array const list = unwrappedElements(written.toArray());
+            origins.set(key, originsOfElements(kind, key, chain, list.size()));
+            values.set(key, list);
+        } else {
+            origins.set(key, originOfValue(kind, key, chain));
+            values.set(key, unwrapped(written));
+        }
+    }
+    json::Value const own = chain.front().parts.get(kind.name);
+    return {{"own", own ? own : json::Object()}, {"values", values}, {"origins", origins}};
+}
+
+} // namespace
+
+std::vector<std::string> const& partNames() {
+    static std::vector<std::string> const names = [] {
+        std::vector<std::string> all;
+        for (PartKind const& kind : kinds())
+            all.push_back(kind.name);
+        return all;
+    }();
+    return names;
+}
+
+json::Value ownForm(std::string const& part, json::Value const& sent) {
+    PartKind const& kind = kindNamed(part);
+    try {
+        if (sent)
+            checkKeys(kind, sent.toObject());
+        return kind.own(sent);
+    } catch (Error const&) {
+        throw;
+    } catch (std::exception const& failure) {
+        throw Error("the settings \"" + part + "\" were not changed: " + failure.what());
+    }
+}
+
+json::Object resolve(Chain const& chain, std::vector<std::string> const& wantedParts) {
+    json::Object parts;
+    for (std::string const& name : wantedParts)
+        parts.set(name, resolvePart(kindNamed(name), chain));
+    return parts;
+}
+
+} // namespace VlServiced

@@ -1,0 +1,33 @@
+#pragma once
+// The folder that holds everything the service keeps: who may use it, and what lies where in it.
+
+#include <filesystem>
+
+namespace VlServiced {
+
+/// A data folder in use by this process and no other.
+class DataFolder {
+public:
+    /// Makes the folder, which only its owner may enter, unless it is there, and takes hold of it until
+    /// destruction. Throws Error when it cannot be written or another process has it.
+    explicit DataFolder(std::filesystem::path folder);
+    ~DataFolder();
+    DataFolder(DataFolder const&) = delete;
+    DataFolder& operator=(DataFolder const&) = delete;
+
+    std::filesystem::path const& path() const { return folder_; }
+    std::filesystem::path database() const { return folder_ / "service.db"; }
+    std::filesystem::path token() const { return folder_ / "token"; }
+    /// Where finished containers wait unless another folder was named.
+    std::filesystem::path outbox() const { return folder_ / "outbox"; }
+
+private:
+    std::filesystem::path folder_;
+    int lock_;
+};
+
+/// Makes a folder, with its parents, unless it is there, and tests that files can be made in it.
+/// Throws Error.
+void makeWritableFolder(std::filesystem::path const& folder);
+
+} // namespace VlServiced

@@ -1,0 +1,155 @@
+#include "programs/vlserviced/store/job_store.h"
+
+#include "programs/vlserviced/error.h"
+
+#include <SQLiteCpp/Statement.h>
+
+#include <algorithm>
+#include <array>
+#include <set>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+constexpr std::array<std::pair<JobState, char const*>, 7> STATE_NAMES{{
+    {JobState::Accepted, "accepted"},
+    {JobState::Queued, "queued"},
+    {JobState::Submitting, "submitting"},
+    {JobState::Submitted, "submitted"},
+    {JobState::Lodged, "lodged"},
+    {JobState::Delivered, "delivered"},
+    {JobState::Failed, "failed"},
+}};
+
+JobState stateNamed(std::string const& name) {
+    auto const found = std::find_if(STATE_NAMES.begin(), STATE_NAMES.end(),
+                                    [&](auto const& row) { return row.second == name; });
+    if (found == STATE_NAMES.end())
+        throw Error("the service database holds a job in the unknown state \"" + name + "\"");
+    return found->first;
+}
+
+constexpr char const* SELECT_JOBS =
+    "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
+    "problem, to_upload, accepted_at, changed_at FROM jobs ";
+
+Job jobIn(SQLite::Statement& row) {
+    Job job;
+    job.pack.packId = row.getColumn(0).getString();
+    job.pack.folder = row.getColumn(1).getString();
+    job.pack.database = row.getColumn(2).getString();
+    job.cfgId = row.getColumn(3).getString();
+    job.title = row.getColumn(4).getString();
+    job.documents = row.getColumn(5).getInt64();
+    job.pages = row.getColumn(6).getInt64();
+    job.state = stateNamed(row.getColumn(7).getString());
+    job.problem = row.getColumn(8).getString();
+    job.toUpload = row.getColumn(9).getInt() != 0;
+    job.acceptedAt = row.getColumn(10).getInt64();
+    job.changedAt = row.getColumn(11).getInt64();
+    return job;
+}
+
+std::vector<Job> jobsIn(SQLite::Statement& query) {
+    std::vector<Job> jobs;
+    while (query.executeStep())
+        jobs.push_back(jobIn(query));
+    return jobs;
+}
+
+} // namespace
+
+char const* stateName(JobState state) {
+    return std::find_if(STATE_NAMES.begin(), STATE_NAMES.end(),
+                        [&](auto const& row) { return row.first == state; })
+        ->second;
+}
+
+JobStore::JobStore(SQLite::Database& database) : database_(database) {}
+
+std::optional<Job> JobStore::find(std::string const& packId) const {
+    SQLite::Statement query(database_, std::string(SELECT_JOBS) + "WHERE pack = ?");
+    query.bindNoCopy(1, packId);
+    if (!query.executeStep())
+        return std::nullopt;
+    return jobIn(query);
+}
+
+std::vector<Job> JobStore::inState(JobState state) const {
+    SQLite::Statement query(database_,
+                            std::string(SELECT_JOBS) + "WHERE state = ? ORDER BY accepted_at, pack");
+    query.bind(1, stateName(state));
+    return jobsIn(query);
+}
+
+std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) const {
+    SQLite::Statement query(database_, std::string(SELECT_JOBS) +
+                                           "WHERE ?1 IN ('', db_folder) AND ?2 IN ('', db_name) "
+                                           "ORDER BY accepted_at DESC, pack DESC");
+    query.bindNoCopy(1, filter.folder);
+    query.bindNoCopy(2, filter.database);
+    std::set<std::string> const wanted(filter.packIds.begin(), filter.packIds.end());
+    std::vector<Job> jobs;
+    while (jobs.size() < limit && query.executeStep())
+        if (wanted.empty() || wanted.contains(query.getColumn(0).getString()))
+            jobs.push_back(jobIn(query));
+    std::reverse(jobs.begin(), jobs.end());
+    return jobs;
+}
+
+bool JobStore::accept(Job const& job) {
+    SQLite::Statement insertion(
+        database_, "INSERT INTO jobs (pack, db_folder, db_name, cfg_id, title, documents, pages, "
+                   "state, accepted_at, changed_at) VALUES (?, ?, ?, ?, ?, ?, ?, ?, ?, ?9) "
+                   "ON CONFLICT DO NOTHING");
+    insertion.bind(1, job.pack.packId);
+    insertion.bind(2, job.pack.folder);
+    insertion.bind(3, job.pack.database);
+    insertion.bind(4, job.cfgId);
+    insertion.bind(5, job.title);
+    insertion.bind(6, static_cast<std::int64_t>(job.documents));
+    insertion.bind(7, static_cast<std::int64_t>(job.pages));
+    insertion.bind(8, stateName(JobState::Accepted));
+    insertion.bind(9, static_cast<std::int64_t>(job.acceptedAt));
+    return insertion.exec() == 1;
+}
+
+bool JobStore::advance(std::string const& packId, JobState from, JobState to, long long now) {
+    SQLite::Statement change(database_, "UPDATE jobs SET state = ?, problem = '', changed_at = ? "
+                                        "WHERE pack = ? AND state = ?");
+    change.bind(1, stateName(to));
+    change.bind(2, static_cast<std::int64_t>(now));
+    change.bind(3, packId);
+    change.bind(4, stateName(from));
+    return change.exec() == 1;
+}
+
+void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
+    SQLite::Statement change(database_,
+                             "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
+    change.bind(1, stateName(JobState::Failed));
+    change.bind(2, reason);
+    change.bind(3, static_cast<std::int64_t>(now));
+    change.bind(4, packId);
+    change.exec();
+}
+
+void JobStore::setProblem(std::string const& packId, std::string const& problem) {
+    SQLite::Statement change(database_, "UPDATE jobs SET problem = ? WHERE pack = ?");
+    change.bind(1, problem);
+    change.bind(2, packId);
+    change.exec();
+}
+
+void JobStore::wantUpload(std::string const& folder, std::string const& database) {
+    SQLite::Statement change(database_, "UPDATE jobs SET to_upload = 1 WHERE ?1 IN ('', db_folder) AND "
+                                        "?2 IN ('', db_name) AND state IN (?3, ?4)");
+    change.bind(1, folder);
+    change.bind(2, database);
+    change.bind(3, stateName(JobState::Accepted));
+    change.bind(4, stateName(JobState::Queued));
+    change.exec();
+}
+
+} // namespace VlServiced

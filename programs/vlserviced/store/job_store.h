@@ -1,0 +1,50 @@
+#pragma once
+// Jobs as the database keeps them: one for each pack id, whatever happens to the command that brought it.
+
+#include "programs/vlserviced/jobs/job.h"
+
+#include <SQLiteCpp/Database.h>
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace VlServiced {
+
+/// Which jobs a query is about; an empty text is no restriction.
+struct JobFilter {
+    std::string folder;
+    std::string database;
+    std::vector<std::string> packIds;
+};
+
+/// Every change is one transaction and on the disk when the operation returns.
+class JobStore {
+public:
+    /// The database has to outlive the store.
+    explicit JobStore(SQLite::Database& database);
+
+    std::optional<Job> find(std::string const& packId) const;
+    /// In the order of their acceptance.
+    std::vector<Job> inState(JobState state) const;
+    /// In the order of their acceptance, at most `limit`, the youngest when there are more.
+    std::vector<Job> matching(JobFilter const& filter, std::size_t limit) const;
+
+    /// Records a new job as accepted. False when there is one of that pack id already: it stays as it is.
+    bool accept(Job const& job);
+    /// Moves a job on and clears its problem. The container's way is irreversible, so `from` has to be the
+    /// job's state; false, and no change, when it is not.
+    bool advance(std::string const& packId, JobState from, JobState to, long long now);
+    /// Gives a job up for the reason told.
+    void fail(std::string const& packId, std::string const& reason, long long now);
+    /// Notes what keeps a job where it is.
+    void setProblem(std::string const& packId, std::string const& problem);
+    /// Marks the jobs of a pack database that are not handed on yet as to be handed on; empty texts are no
+    /// restriction.
+    void wantUpload(std::string const& folder, std::string const& database);
+
+private:
+    SQLite::Database& database_;
+};
+
+} // namespace VlServiced

@@ -1,0 +1,56 @@
+#include "programs/vlserviced/store/schema.h"
+
+namespace VlServiced {
+namespace {
+
+/// "VLSD" as a number.
+constexpr int APPLICATION_ID = 0x564C5344;
+
+/// Settings are a tree of nodes under the root, whose id is the empty text; a node's parts hold its own
+/// values alone. Service settings are one object. A job's states are those of jobs/job.h.
+constexpr char const* SCHEMA_1 = R"sql(
+CREATE TABLE nodes (
+    id     TEXT NOT NULL PRIMARY KEY,
+    parent TEXT REFERENCES nodes (id),
+    CHECK ((id = '') = (parent IS NULL))
+) WITHOUT ROWID;
+CREATE INDEX nodes_by_parent ON nodes (parent);
+INSERT INTO nodes VALUES ('', NULL);
+
+CREATE TABLE parts (
+    node TEXT NOT NULL REFERENCES nodes (id) ON DELETE CASCADE,
+    part TEXT NOT NULL,
+    json TEXT NOT NULL,
+    PRIMARY KEY (node, part)
+) WITHOUT ROWID;
+
+CREATE TABLE service_settings (
+    one  INTEGER NOT NULL PRIMARY KEY CHECK (one = 1),
+    json TEXT NOT NULL
+);
+
+CREATE TABLE jobs (
+    pack        TEXT NOT NULL PRIMARY KEY,
+    db_folder   TEXT NOT NULL,
+    db_name     TEXT NOT NULL,
+    cfg_id      TEXT NOT NULL,
+    title       TEXT NOT NULL,
+    documents   INTEGER NOT NULL,
+    pages       INTEGER NOT NULL,
+    state       TEXT NOT NULL,
+    problem     TEXT NOT NULL DEFAULT '',
+    to_upload   INTEGER NOT NULL DEFAULT 0,
+    accepted_at INTEGER NOT NULL,
+    changed_at  INTEGER NOT NULL
+) WITHOUT ROWID;
+CREATE INDEX jobs_by_state ON jobs (state);
+)sql";
+
+} // namespace
+
+Mailing::DatabaseKind const& serviceDatabase() {
+    static Mailing::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1}};
+    return kind;
+}
+
+} // namespace VlServiced

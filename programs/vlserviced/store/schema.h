@@ -1,0 +1,12 @@
+#pragma once
+// The service's database file: its kind and the history of its schema.
+
+#include "programs/mailing/sqlite_file.h"
+
+namespace VlServiced {
+
+/// Schema version n is what the first n scripts make. A script that was published is never changed: a new
+/// version is a new script behind it.
+Mailing::DatabaseKind const& serviceDatabase();
+
+} // namespace VlServiced

@@ -1,0 +1,142 @@
+#include "programs/vlserviced/store/settings_store.h"
+
+#include "programs/vlserviced/error.h"
+#include "programs/vlserviced/node_id.h"
+#include "vlservice/cfg/id.h"
+#include "vlservice/platform/json_text.h"
+
+#include <SQLiteCpp/Statement.h>
+#include <SQLiteCpp/Transaction.h>
+
+#include <sstream>
+
+namespace VlServiced {
+namespace {
+
+std::string textOf(json::Object const& object) {
+    std::ostringstream text;
+    text << object;
+    return text.str();
+}
+
+json::Object objectIn(SQLite::Column const& column) {
+    return json::strToObject(column.getText(), static_cast<std::size_t>(column.getBytes()));
+}
+
+} // namespace
+
+SettingsStore::SettingsStore(SQLite::Database& database) : database_(database) {}
+
+bool SettingsStore::contains(std::string const& id) const {
+    SQLite::Statement query(database_, "SELECT 1 FROM nodes WHERE id = ?");
+    query.bindNoCopy(1, id);
+    return query.executeStep();
+}
+
+std::vector<std::string> SettingsStore::nodes() const {
+    SQLite::Statement query(database_, "SELECT id FROM nodes ORDER BY id");
+    std::vector<std::string> ids;
+    while (query.executeStep())
+        ids.push_back(query.getColumn(0).getString());
+    return ids;
+}
+
+json::Value SettingsStore::part(std::string const& id, std::string const& part) const {
+    return partsOf(id).get(part);
+}
+
+json::Object SettingsStore::partsOf(std::string const& id) const {
+    SQLite::Statement query(database_, "SELECT part, json FROM parts WHERE node = ?");
+    query.bindNoCopy(1, id);
+    json::Object parts;
+    while (query.executeStep())
+        parts.set(query.getColumn(0).getText(), objectIn(query.getColumn(1)));
+    return parts;
+}
+
+std::vector<SettingsLevel> SettingsStore::chain(std::string const& id) const {
+    // One state of the tree for all levels.
+    SQLite::Transaction const reading(database_);
+    std::vector<SettingsLevel> levels;
+    for (Cfg::Id const& level : Cfg::Id(id, false).allIds()) {
+        // An id that ends in a slash has the root twice in its chain.
+        if (levels.empty() || levels.back().id != level.str())
+            levels.push_back({level.str(), partsOf(level.str())});
+    }
+    return levels;
+}
+
+void SettingsStore::addChain(std::string const& id) {
+    // Known nodes end the way up: what is above them is known too.
+    std::vector<std::string> missing;
+    for (std::string at = id; !contains(at); at = parentNodeId(at))
+        missing.push_back(at);
+    SQLite::Statement insertion(database_, "INSERT INTO nodes (id, parent) VALUES (?, ?)");
+    for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
+        insertion.bind(1, *at);
+        insertion.bind(2, parentNodeId(*at));
+        insertion.exec();
+        insertion.reset();
+    }
+}
+
+void SettingsStore::add(std::string const& id) {
+    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+    addChain(id);
+    transaction.commit();
+}
+
+void SettingsStore::setPart(std::string const& id, std::string const& part, json::Value const& value) {
+    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+    addChain(id);
+    SQLite::Statement change(database_, value ? "INSERT INTO parts (node, part, json) VALUES (?1, ?2, ?3) "
+                                                "ON CONFLICT DO UPDATE SET json = excluded.json"
+                                              : "DELETE FROM parts WHERE node = ?1 AND part = ?2");
+    change.bind(1, id);
+    change.bind(2, part);
+    if (value)
+        change.bind(3, textOf(value.toObject()));
+    change.exec();
+    transaction.commit();
+}
+
+void SettingsStore::clear(std::string const& id) {
+    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+    addChain(id);
+    SQLite::Statement deletion(database_, "DELETE FROM parts WHERE node = ?");
+    deletion.bind(1, id);
+    deletion.exec();
+    transaction.commit();
+}
+
+void SettingsStore::remove(std::string const& id) {
+    if (id.empty())
+        throw Error("the root cannot be removed");
+    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+    if (!contains(id))
+        throw Error("there is no node " + id);
+    SQLite::Statement children(database_, "SELECT count(*), min(id) FROM nodes WHERE parent = ?");
+    children.bind(1, id);
+    children.executeStep();
+    if (int const count = children.getColumn(0).getInt(); count > 0)
+        throw Error("node " + id + " has " + std::to_string(count) + (count == 1 ? " child" : " children") +
+                    " (" + children.getColumn(1).getString() + "): remove what is below it first");
+    SQLite::Statement deletion(database_, "DELETE FROM nodes WHERE id = ?");
+    deletion.bind(1, id);
+    deletion.exec();
+    transaction.commit();
+}
+
+json::Object SettingsStore::serviceSettings() const {
+    SQLite::Statement query(database_, "SELECT json FROM service_settings");
+    return query.executeStep() ? objectIn(query.getColumn(0)) : json::Object();
+}
+
+void SettingsStore::setServiceSettings(json::Object const& settings) {
+    SQLite::Statement change(database_, "INSERT INTO service_settings (one, json) VALUES (1, ?) "
+                                        "ON CONFLICT DO UPDATE SET json = excluded.json");
+    change.bind(1, textOf(settings));
+    change.exec();
+}
+
+} // namespace VlServiced

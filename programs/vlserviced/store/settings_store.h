@@ -1,0 +1,54 @@
+#pragma once
+// Settings nodes and their own values, as the database keeps them.
+
+#include "vlservice/cfg/json.h"
+
+#include <SQLiteCpp/Database.h>
+
+#include <string>
+#include <vector>
+
+namespace VlServiced {
+
+/// What one node of a chain holds itself: an object from part name to that part's JSON in flat form.
+struct SettingsLevel {
+    std::string id;
+    json::Object parts;
+};
+
+/// The nodes of the settings tree. Ids are texts that checkNodeId has let through. Every change is one
+/// transaction and on the disk when the operation returns.
+class SettingsStore {
+public:
+    /// The database has to outlive the store.
+    explicit SettingsStore(SQLite::Database& database);
+
+    bool contains(std::string const& id) const;
+    /// Every node, the root among them, in the order of the texts.
+    std::vector<std::string> nodes() const;
+    /// The node's own value of a part; the empty handle when it has none.
+    json::Value part(std::string const& id, std::string const& part) const;
+    /// The node and all above it, the root last. Nodes that are not stored are levels without parts.
+    std::vector<SettingsLevel> chain(std::string const& id) const;
+
+    /// Adds the node, and those above it that are not there yet.
+    void add(std::string const& id);
+    /// Replaces the node's own value of a part, adding the node when it is new. The empty handle erases it.
+    void setPart(std::string const& id, std::string const& part, json::Value const& value);
+    /// Erases all own values of the node, and adds it when it is new.
+    void clear(std::string const& id);
+    /// Throws Error when there is no such node, when it has children, and for the root.
+    void remove(std::string const& id);
+
+    /// The service's own settings: one object, empty at first.
+    json::Object serviceSettings() const;
+    void setServiceSettings(json::Object const& settings);
+
+private:
+    void addChain(std::string const& id);
+    json::Object partsOf(std::string const& id) const;
+
+    SQLite::Database& database_;
+};
+
+} // namespace VlServiced

@@ -1,0 +1,61 @@
+#include "programs/vlserviced/store/data_folder.h"
+
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/failure_of.h"
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <unistd.h>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using VlServiced::DataFolder;
+
+TEST(DataFolder, IsMadeForItsOwnerAlone) {
+    TemporaryFolder temporary;
+    DataFolder const folder(temporary.path() / "a" / "b");
+    EXPECT_EQ(fs::status(folder.path()).permissions(), fs::perms::owner_all);
+}
+
+TEST(DataFolder, KeepsTheRightsOfAFolderThatIsThere) {
+    TemporaryFolder temporary;
+    fs::permissions(temporary.path(), fs::perms(0750));
+    DataFolder const folder(temporary.path());
+    EXPECT_EQ(fs::status(folder.path()).permissions(), fs::perms(0750));
+}
+
+TEST(DataFolder, IsRefusedToASecondUser) {
+    TemporaryFolder temporary;
+    {
+        DataFolder const first(temporary.path());
+        EXPECT_EQ(failureOf([&] { DataFolder second(temporary.path()); }),
+                  "the data folder " + temporary.path().string() +
+                      " is in use by another vlserviced (process " + std::to_string(::getpid()) +
+                      "): stop that one or name another folder");
+    }
+    EXPECT_NO_THROW(DataFolder third(temporary.path()));
+}
+
+TEST(DataFolder, ThatCannotBeMadeIsNamed) {
+    TemporaryFolder temporary;
+    fs::path const file = temporary / "file";
+    std::ofstream(file) << "x";
+    EXPECT_EQ(failureOf([&] { DataFolder folder(file); }),
+              "cannot write into the folder " + file.string() + ": Not a directory");
+    EXPECT_EQ(failureOf([&] { DataFolder folder(file / "below"); }),
+              "cannot write into the folder " + (file / "below").string() + ": Not a directory");
+}
+
+TEST(DataFolder, ThatCannotBeWrittenIsNamed) {
+    if (::geteuid() == 0 && !fs::exists("/proc/self"))
+        GTEST_SKIP() << "runs as root, who may write everywhere, and there is no /proc";
+    // Nobody can make files in /proc/self, not even root.
+    fs::path const folder = ::geteuid() == 0 ? fs::path("/proc/self") : fs::path("/");
+    std::string const text = failureOf([&] { DataFolder data(folder); });
+    EXPECT_TRUE(text.starts_with("cannot write into the folder " + folder.string() + ": ")) << text;
+}
+
+} // namespace

@@ -1,0 +1,137 @@
+#include "programs/vlserviced/store/job_store.h"
+
+#include "programs/vlserviced/store/schema.h"
+#include "tests/temporary_folder.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using VlServiced::Job;
+using VlServiced::JobFilter;
+using VlServiced::JobState;
+using VlServiced::JobStore;
+
+class JobStoreTest : public testing::Test {
+protected:
+    static Job job(std::string const& packId, long long acceptedAt = 100) {
+        Job job;
+        job.pack = {"/srv/packs", "packs.db", packId};
+        job.cfgId = "a=acme";
+        job.title = "Bills of March";
+        job.documents = 2;
+        job.pages = 7;
+        job.acceptedAt = acceptedAt;
+        return job;
+    }
+    static std::vector<std::string> ids(std::vector<Job> const& jobs) {
+        std::vector<std::string> all;
+        for (Job const& job : jobs)
+            all.push_back(job.pack.packId);
+        return all;
+    }
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = Mailing::openDatabase(folder_ / "service.db", VlServiced::serviceDatabase(),
+                                                       Mailing::Journal::WriteAhead);
+    JobStore store_{database_};
+};
+
+TEST_F(JobStoreTest, RecordsAJobAsAccepted) {
+    EXPECT_TRUE(store_.accept(job("p1")));
+    Job const found = store_.find("p1").value();
+    EXPECT_EQ(found.pack, job("p1").pack);
+    EXPECT_EQ(found.cfgId, "a=acme");
+    EXPECT_EQ(found.title, "Bills of March");
+    EXPECT_EQ(found.documents, 2);
+    EXPECT_EQ(found.pages, 7);
+    EXPECT_EQ(found.state, JobState::Accepted);
+    EXPECT_EQ(found.problem, "");
+    EXPECT_FALSE(found.toUpload);
+    EXPECT_EQ(found.acceptedAt, 100);
+    EXPECT_EQ(found.changedAt, 100);
+    EXPECT_FALSE(store_.find("p2"));
+}
+
+TEST_F(JobStoreTest, RecordsAPackIdOnce) {
+    EXPECT_TRUE(store_.accept(job("p1")));
+    store_.advance("p1", JobState::Accepted, JobState::Queued, 150);
+    EXPECT_FALSE(store_.accept(job("p1", 200)));
+    EXPECT_EQ(store_.find("p1")->acceptedAt, 100);
+    EXPECT_EQ(store_.find("p1")->state, JobState::Queued);
+}
+
+TEST_F(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
+    store_.accept(job("p1"));
+    EXPECT_FALSE(store_.advance("p1", JobState::Queued, JobState::Submitting, 150));
+    EXPECT_EQ(store_.find("p1")->changedAt, 100);
+    store_.setProblem("p1", "waits");
+    EXPECT_TRUE(store_.advance("p1", JobState::Accepted, JobState::Queued, 150));
+    EXPECT_FALSE(store_.advance("p1", JobState::Accepted, JobState::Queued, 160));
+    EXPECT_EQ(store_.find("p1")->state, JobState::Queued);
+    EXPECT_EQ(store_.find("p1")->changedAt, 150);
+    EXPECT_EQ(store_.find("p1")->problem, "");
+    EXPECT_FALSE(store_.advance("p2", JobState::Accepted, JobState::Queued, 150));
+}
+
+TEST_F(JobStoreTest, GivesAJobUpWithTheReason) {
+    store_.accept(job("p1"));
+    store_.fail("p1", "page 2 is missing", 150);
+    EXPECT_EQ(store_.find("p1")->state, JobState::Failed);
+    EXPECT_EQ(store_.find("p1")->problem, "page 2 is missing");
+    EXPECT_EQ(store_.find("p1")->changedAt, 150);
+}
+
+TEST_F(JobStoreTest, ListsAStateInTheOrderOfAcceptance) {
+    store_.accept(job("b", 2));
+    store_.accept(job("a", 3));
+    store_.accept(job("c", 1));
+    store_.advance("b", JobState::Accepted, JobState::Queued, 4);
+    EXPECT_THAT(ids(store_.inState(JobState::Accepted)), ElementsAre("c", "a"));
+    EXPECT_THAT(ids(store_.inState(JobState::Queued)), ElementsAre("b"));
+    EXPECT_THAT(ids(store_.inState(JobState::Failed)), IsEmpty());
+}
+
+TEST_F(JobStoreTest, FindsTheJobsOfAPackDatabase) {
+    store_.accept(job("p1", 1));
+    store_.accept(job("p2", 2));
+    Job other = job("p3", 3);
+    other.pack.folder = "/srv/other";
+    store_.accept(other);
+    EXPECT_THAT(ids(store_.matching({}, 10)), ElementsAre("p1", "p2", "p3"));
+    EXPECT_THAT(ids(store_.matching({}, 2)), ElementsAre("p2", "p3"));
+    EXPECT_THAT(ids(store_.matching({"/srv/packs", "", {}}, 10)), ElementsAre("p1", "p2"));
+    EXPECT_THAT(ids(store_.matching({"", "other.db", {}}, 10)), IsEmpty());
+    EXPECT_THAT(ids(store_.matching({"/srv/packs", "packs.db", {"p2", "p3"}}, 10)), ElementsAre("p2"));
+    EXPECT_THAT(ids(store_.matching({"", "", {"p1", "p9"}}, 1)), ElementsAre("p1"));
+}
+
+TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
+    for (auto const* id : {"accepted", "queued", "submitted"})
+        store_.accept(job(id));
+    for (auto const* id : {"queued", "submitted"})
+        store_.advance(id, JobState::Accepted, JobState::Queued, 2);
+    store_.advance("submitted", JobState::Queued, JobState::Submitted, 3);
+    store_.wantUpload("/srv/elsewhere", "");
+    EXPECT_FALSE(store_.find("accepted")->toUpload);
+    store_.wantUpload("/srv/packs", "packs.db");
+    EXPECT_TRUE(store_.find("accepted")->toUpload);
+    EXPECT_TRUE(store_.find("queued")->toUpload);
+    EXPECT_FALSE(store_.find("submitted")->toUpload);
+}
+
+TEST_F(JobStoreTest, NamesEveryState) {
+    std::pair<JobState, char const*> const names[] = {
+        {JobState::Accepted, "accepted"},     {JobState::Queued, "queued"},
+        {JobState::Submitting, "submitting"}, {JobState::Submitted, "submitted"},
+        {JobState::Lodged, "lodged"},         {JobState::Delivered, "delivered"},
+        {JobState::Failed, "failed"},
+    };
+    for (auto const& [state, name] : names)
+        EXPECT_STREQ(VlServiced::stateName(state), name);
+}
+
+} // namespace

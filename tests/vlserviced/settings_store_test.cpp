@@ -1,0 +1,122 @@
+#include "programs/vlserviced/store/settings_store.h"
+
+#include "programs/vlserviced/store/schema.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/failure_of.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing::ElementsAre;
+using VlServiced::SettingsStore;
+
+class SettingsStoreTest : public testing::Test {
+protected:
+    SQLite::Database open() {
+        return Mailing::openDatabase(folder_ / "service.db", VlServiced::serviceDatabase(),
+                                     Mailing::Journal::WriteAhead);
+    }
+    std::vector<std::string> chainIds(std::string const& id) {
+        std::vector<std::string> ids;
+        for (VlServiced::SettingsLevel const& level : store_.chain(id))
+            ids.push_back(level.id);
+        return ids;
+    }
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = open();
+    SettingsStore store_{database_};
+};
+
+TEST_F(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(store_.nodes(), ElementsAre("")); }
+
+TEST_F(SettingsStoreTest, AddsANodeWithAllAboveIt) {
+    store_.add("u=bob/ou=sales/a=acme");
+    EXPECT_THAT(store_.nodes(), ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme"));
+    store_.add("u=bob/ou=sales/a=acme");
+    store_.add("u=eve/");
+    EXPECT_THAT(store_.nodes(),
+                ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme", "u=eve/"));
+    EXPECT_TRUE(store_.contains("a=acme"));
+    EXPECT_FALSE(store_.contains("a=other"));
+}
+
+TEST_F(SettingsStoreTest, KeepsAPartOfANode) {
+    json::Object const first{{"descr", "first"}};
+    json::Object const second{{"descr", "second"}};
+    store_.setPart("a=acme", "app", first);
+    store_.setPart("a=acme", "po", json::Object{{"code", "7"}});
+    EXPECT_EQ(store_.part("a=acme", "app"), first);
+    store_.setPart("a=acme", "app", second);
+    EXPECT_EQ(store_.part("a=acme", "app"), second);
+    store_.setPart("a=acme", "app", json::Value());
+    EXPECT_FALSE(store_.part("a=acme", "app"));
+    EXPECT_TRUE(store_.part("a=acme", "po"));
+    EXPECT_FALSE(store_.part("a=other", "app"));
+}
+
+TEST_F(SettingsStoreTest, ClearsANodeAndKeepsIt) {
+    store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
+    store_.clear("a=acme");
+    EXPECT_FALSE(store_.part("a=acme", "app"));
+    EXPECT_TRUE(store_.contains("a=acme"));
+}
+
+TEST_F(SettingsStoreTest, GivesTheLevelsFromTheNodeToTheRoot) {
+    store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
+    EXPECT_THAT(chainIds("u=bob/ou=sales/a=acme"),
+                ElementsAre("u=bob/ou=sales/a=acme", "ou=sales/a=acme", "a=acme", ""));
+    EXPECT_EQ(store_.chain("u=bob/a=acme")[1].parts.get("app"), (json::Object{{"descr", "x"}}));
+    EXPECT_TRUE(store_.chain("u=bob/a=acme")[0].parts.empty());
+}
+
+TEST_F(SettingsStoreTest, HasTheRootOnceInTheChainOfAnIdThatEndsInASlash) {
+    EXPECT_THAT(chainIds("u=bob/"), ElementsAre("u=bob/", ""));
+    EXPECT_THAT(chainIds(""), ElementsAre(""));
+}
+
+TEST_F(SettingsStoreTest, RemovesANodeWithItsParts) {
+    store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
+    store_.remove("a=acme");
+    EXPECT_FALSE(store_.contains("a=acme"));
+    store_.add("a=acme");
+    EXPECT_FALSE(store_.part("a=acme", "app"));
+}
+
+TEST_F(SettingsStoreTest, RefusesToRemoveWhatOthersStandOn) {
+    store_.add("u=bob/ou=sales/a=acme");
+    store_.add("u=eve/ou=sales/a=acme");
+    EXPECT_EQ(failureOf([&] { store_.remove("a=acme"); }),
+              "node a=acme has 1 child (ou=sales/a=acme): remove what is below it first");
+    EXPECT_EQ(failureOf([&] { store_.remove("ou=sales/a=acme"); }),
+              "node ou=sales/a=acme has 2 children (u=bob/ou=sales/a=acme): remove what is below it first");
+    EXPECT_EQ(failureOf([&] { store_.remove(""); }), "the root cannot be removed");
+    EXPECT_EQ(failureOf([&] { store_.remove("a=other"); }), "there is no node a=other");
+    EXPECT_EQ(store_.nodes().size(), 5u);
+    EXPECT_EQ(failureOf([&] { store_.remove("u=bob/ou=sales/a=acme"); }), "nothing was thrown");
+}
+
+TEST_F(SettingsStoreTest, KeepsTheServicesOwnSettings) {
+    EXPECT_EQ(store_.serviceSettings(), json::Object());
+    json::Object const settings{{"upload_folder", "/srv/upload"}};
+    store_.setServiceSettings(settings);
+    EXPECT_EQ(store_.serviceSettings(), settings);
+    store_.setServiceSettings(json::Object());
+    EXPECT_EQ(store_.serviceSettings(), json::Object());
+}
+
+TEST_F(SettingsStoreTest, IsThereForTheNextThatOpensTheFile) {
+    store_.setPart("a=acme", "app", json::Object{{"descr", "grüße"}});
+    SQLite::Database again = open();
+    EXPECT_EQ(SettingsStore(again).part("a=acme", "app"), (json::Object{{"descr", "grüße"}}));
+}
+
+TEST_F(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
+    std::string const noUtf8 = "\xFF";
+    EXPECT_THROW(store_.setPart("a=acme", "app", json::Object{{"descr", noUtf8}}), json::Exc);
+    EXPECT_THAT(store_.nodes(), ElementsAre(""));
+}
+
+} // namespace
