@@ -15,7 +15,6 @@ namespace {
 using ValueType = ExtractedField::ValueType;
 
 constexpr long long MAX_INT64 = std::numeric_limits<long long>::max();
-constexpr long long MIN_INT64 = std::numeric_limits<long long>::min();
 
 ExtractedField field(json::Value const& value, ValueType type = ValueType::Plain,
                      IgnoreOnGroup ignore = IgnoreOnGroup::MustMatch) {

@@ -64,8 +64,8 @@ TEST(ExtractedFieldsReading, RefusesWhatIsNoField) {
         {"[null]", "JSON error: Wrong type: null. Expected type: object"},
         {"[{}]", "JSON error: Wrong type: empty. Expected type: string"},
     };
-    for (auto const& [text, message] : rows)
-        expectFailure<json::Exc>([&] { ExtractedFields fields(arrayOf(text)); }, message);
+    for (auto const& row : rows)
+        expectFailure<json::Exc>([&] { ExtractedFields fields(arrayOf(row.first)); }, row.second);
 }
 
 TEST(ExtractedFieldsWriting, GivesTheFieldsInIterationOrder) {
