@@ -44,7 +44,24 @@ requires std::is_enum_v<T>
 struct JsonForm<T> {
     using Integer = std::underlying_type_t<T>;
     static T read(json::Value const& node) { return static_cast<T>(static_cast<Integer>(node.toInt())); }
-    static json::Value write(T value) { return static_cast<Integer>(value); }
+    // By way of 64 bits, since the smallest underlying types are character types.
+    static json::Value write(T value) { return static_cast<long long>(value); }
+};
+
+/// An integer passes for a real.
+template<>
+struct JsonForm<double> {
+    static double read(json::Value const& node) {
+        return node.isInt() ? static_cast<double>(node.toInt()) : node.toReal();
+    }
+    static json::Value write(double value) { return value; }
+};
+
+/// Whatever stands there, shared with what it was read from.
+template<>
+struct JsonForm<json::Value> {
+    static json::Value read(json::Value const& node) { return node; }
+    static json::Value write(json::Value const& value) { return value; }
 };
 
 template<>

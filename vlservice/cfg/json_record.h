@@ -11,76 +11,37 @@
 //     };
 
 #include "vlservice/cfg/json.h"
+#include "vlservice/cfg/json_form.h"
 
 #include <concepts>
 #include <string>
 #include <tuple>
 #include <type_traits>
 #include <utility>
-#include <vector>
 
 namespace json {
 
-/// How a member of type T stands under its key. Reading is lenient: another JSON type reads as a missing key.
-/// Types with a form of their own specialise this with the same two functions.
+/// Whether a node is read where a T is wanted. Anything else stands for a missing key, but a type with a form
+/// of its own reads whatever is there, and may refuse it.
 template<typename T>
-struct Form;
-
-template<>
-struct Form<bool> {
-    /// Only JSON true sets a flag.
-    static bool read(Value const& value, bool) { return value.isTrue(); }
-    static Value write(bool flag) { return flag; }
-};
-
-/// Integers are cut to the member's width.
-template<detail::Integer T>
-struct Form<T> {
-    static T read(Value const& value, T missing) {
-        return value.isInt() ? static_cast<T>(value.toInt()) : missing;
-    }
-    static Value write(T number) { return number; }
-};
-
-/// Enumerations travel as plain numbers; a number without a name is kept.
-template<typename T>
-requires std::is_enum_v<T>
-struct Form<T> {
-    static T read(Value const& value, T missing) {
-        return value.isInt() ? static_cast<T>(static_cast<std::underlying_type_t<T>>(value.toInt()))
-                             : missing;
-    }
-    static Value write(T number) { return static_cast<long long>(number); }
-};
-
-template<>
-struct Form<double> {
-    /// An integer passes for a real.
-    static double read(Value const& value, double missing) {
-        return value.isInt() || value.isReal() ? value.numberOrZero() : missing;
-    }
-    static Value write(double number) { return number; }
-};
-
-template<>
-struct Form<std::string> {
-    static std::string read(Value const& value, std::string missing) {
-        return value.isString() ? std::string(value.toString()) : std::move(missing);
-    }
-    static Value write(std::string const& text) { return text; }
-};
-
-/// Whatever stands there, shared with the object it was read from.
-template<>
-struct Form<Value> {
-    static Value read(Value const& value, Value const&) { return value; }
-    static Value write(Value const& value) { return value; }
-};
+bool passesFor(Value const& node) {
+    if constexpr (std::same_as<T, bool>)
+        return node.isTrue();
+    else if constexpr (std::integral<T> || std::is_enum_v<T>)
+        return node.isInt();
+    else if constexpr (std::floating_point<T>)
+        return node.isInt() || node.isReal();
+    else if constexpr (std::same_as<T, std::string>)
+        return node.isString();
+    else
+        return static_cast<bool>(node);
+}
 
 /// The default of a row that names none: the member's zero value.
 struct Zero {};
 
-/// A row for a key that may be missing; a member that equals the default is not written.
+/// A row for a key that may be missing. A T stands there in the form of Cfg::JsonForm; a member that equals
+/// the default is not written.
 template<typename Record, typename T, typename Missing = Zero>
 class Key {
 public:
@@ -88,13 +49,14 @@ public:
         : name_(name), member_(member), missing_(missing) {}
 
     void read(Object const& from, Record& into) const {
-        into.*member_ = Form<T>::read(from.get(name_), missing());
+        Value const node = from.get(name_);
+        into.*member_ = passesFor<T>(node) ? Cfg::JsonForm<T>::read(node) : missing();
     }
     void write(Record const& from, Object& into) const {
         if (from.*member_ == missing())
             return;
         // A real without a JSON form gives the empty handle, which is nothing to write.
-        if (Value value = Form<T>::write(from.*member_))
+        if (Value value = Cfg::JsonForm<T>::write(from.*member_))
             into.set(name_, std::move(value));
     }
 
@@ -135,29 +97,6 @@ void readKeys(std::tuple<Rows...> const& table, Object const& from, Record& into
 template<typename Record, typename... Rows>
 void writeKeys(std::tuple<Rows...> const& table, Record const& from, Object& into) {
     std::apply([&](auto const&... rows) { (rows.write(from, into), ...); }, table);
-}
-
-/// A list of records, each built from its element; a missing key gives none.
-/// Throws Exc when the value is no array, and whatever an element's constructor throws.
-template<typename T>
-std::vector<T> readList(Value const& value) {
-    std::vector<T> list;
-    if (!value)
-        return list;
-    Array const& array = value.toArray();
-    list.reserve(array.size());
-    for (Value const& element : array)
-        list.emplace_back(element);
-    return list;
-}
-
-/// The records in their JSON form, in list order.
-template<typename T>
-Array writeList(std::vector<T> const& list) {
-    Array array;
-    for (T const& element : list)
-        array.append(element.serialize());
-    return array;
 }
 
 } // namespace json

@@ -1,27 +1,23 @@
+#include "vlservice/cfg/json_form.h"
 #include "vlservice/cfg/json_record.h"
 #include "vlservice/presets/pack_preset.h"
 
 #include <tuple>
 
-namespace json {
+namespace Cfg {
 
-/// Strict, unlike other defaults: a delay that cannot be read must not become none.
+/// Strict, unlike plain numbers: a delay that cannot be read must not become none.
 template<>
-struct Form<std::set<int>> {
-    static std::set<int> read(Value const& value, std::set<int> const&) {
-        return Cfg::PackPreset::DelayInfo::jArrToInts(value);
-    }
-    static Value write(std::set<int> const& numbers) {
-        Array array;
+struct JsonForm<std::set<int>> {
+    static std::set<int> read(json::Value const& node) { return PackPreset::DelayInfo::jArrToInts(node); }
+    static json::Value write(std::set<int> const& numbers) {
+        json::Array array;
         for (int const number : numbers)
             array.append(number);
         return array;
     }
 };
 
-} // namespace json
-
-namespace Cfg {
 namespace {
 
 using DelayInfo = PackPreset::DelayInfo;

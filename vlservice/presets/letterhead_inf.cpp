@@ -1,5 +1,6 @@
 #include "vlservice/presets/letterhead_inf.h"
 
+#include "vlservice/cfg/json_form.h"
 #include "vlservice/cfg/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 
@@ -11,6 +12,8 @@
 
 namespace Cfg {
 namespace {
+
+using Texts = JsonForm<std::vector<std::string>>;
 
 constexpr std::tuple KEYS{
     json::Required{"id", &LetterheadInf::id},
@@ -40,22 +43,6 @@ bool isReserved(std::string_view key) {
     return std::find(RESERVED.begin(), RESERVED.end(), key) != RESERVED.end();
 }
 
-std::vector<std::string> readTexts(json::Value const& value) {
-    std::vector<std::string> texts;
-    if (!value)
-        return texts;
-    for (json::Value const& text : value.toArray())
-        texts.emplace_back(text.toString());
-    return texts;
-}
-
-json::Array writeTexts(std::vector<std::string> const& texts) {
-    json::Array array;
-    for (std::string const& text : texts)
-        array.append(text);
-    return array;
-}
-
 } // namespace
 
 LetterheadInf::LetterheadInf(std::string document, bool notForLetters, bool notForAttachments,
@@ -70,7 +57,7 @@ LetterheadInf::LetterheadInf(json::Value const& value) {
     }
     json::Object const& object = value.toObject();
     json::readKeys(KEYS, object, *this);
-    whichAttachments = readTexts(object.get(WHICH_ATTACHMENTS));
+    whichAttachments = Texts::read(object.get(WHICH_ATTACHMENTS));
     additional = additionalKeys(object, isReserved);
 }
 
@@ -81,7 +68,7 @@ json::Value LetterheadInf::serialize() const {
     if (!hasFlags)
         return id;
     if (!whichAttachments.empty())
-        object.set(WHICH_ATTACHMENTS, writeTexts(whichAttachments));
+        object.set(WHICH_ATTACHMENTS, Texts::write(whichAttachments));
     addKeys(additional, object);
     return object;
 }

@@ -1,5 +1,6 @@
 #include "vlservice/presets/pack_preset.h"
 
+#include "vlservice/cfg/json_form.h"
 #include "vlservice/cfg/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 
@@ -11,19 +12,16 @@
 #include <string_view>
 #include <tuple>
 
-namespace json {
+namespace Cfg {
 
-/// Words of flag bits: cut to 32 bits and written unsigned.
+/// Words of flag bits: what is no integer reads as 0, and they are written unsigned.
 template<typename T>
-requires std::same_as<T, Cfg::ProcessMode> || std::same_as<T, Cfg::ProcessModeClient>
-struct Form<T> {
-    static T read(Value const& value, T) { return T(static_cast<std::uint32_t>(value.intOrZero())); }
-    static Value write(T mode) { return mode.bits(); }
+requires std::same_as<T, ProcessMode> || std::same_as<T, ProcessModeClient>
+struct JsonForm<T> {
+    static T read(json::Value const& node) { return T(static_cast<std::uint32_t>(node.intOrZero())); }
+    static json::Value write(T mode) { return mode.bits(); }
 };
 
-} // namespace json
-
-namespace Cfg {
 namespace {
 
 constexpr char const* EMBEDDED_NAME = "pack_preset";
@@ -127,9 +125,9 @@ json::Object PackPreset::serialize(bool embedded) const {
     if (delay_)
         object.set(DELAY, delay_->serialize());
     if (!attachments_.empty())
-        object.set(ATTACHMENTS, json::writeList(attachments_));
+        object.set(ATTACHMENTS, JsonForm<std::vector<Attachment>>::write(attachments_));
     if (!letterheads_.empty())
-        object.set(LETTERHEADS, json::writeList(letterheads_));
+        object.set(LETTERHEADS, JsonForm<std::vector<LetterheadInf>>::write(letterheads_));
     addKeys(additional_, object);
     return object;
 }
@@ -171,11 +169,11 @@ std::shared_ptr<PackPreset::DelayInfo const> PackPreset::j2pDelayInf(json::Value
 }
 
 std::vector<PackPreset::Attachment> PackPreset::j2Attachments(json::Value const& value) {
-    return json::readList<Attachment>(value);
+    return JsonForm<std::vector<Attachment>>::read(value);
 }
 
 std::vector<LetterheadInf> PackPreset::j2ltrheads(json::Value const& value) {
-    return json::readList<LetterheadInf>(value);
+    return JsonForm<std::vector<LetterheadInf>>::read(value);
 }
 
 } // namespace Cfg
