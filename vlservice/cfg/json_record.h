@@ -59,6 +59,7 @@ public:
         if (Value value = Cfg::JsonForm<T>::write(from.*member_))
             into.set(name_, std::move(value));
     }
+    bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
 
 private:
     constexpr T missing() const {
@@ -81,6 +82,7 @@ public:
 
     void read(Object const& from, Record& into) const { into.*member_ = from.get(name_).toString(); }
     void write(Record const& from, Object& into) const { into.set(name_, from.*member_); }
+    bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
 
 private:
     char const* name_;
@@ -97,6 +99,12 @@ void readKeys(std::tuple<Rows...> const& table, Object const& from, Record& into
 template<typename Record, typename... Rows>
 void writeKeys(std::tuple<Rows...> const& table, Record const& from, Object& into) {
     std::apply([&](auto const&... rows) { (rows.write(from, into), ...); }, table);
+}
+
+/// Whether two records agree in every member of the table.
+template<typename Record, typename... Rows>
+bool sameKeys(std::tuple<Rows...> const& table, Record const& a, Record const& b) {
+    return std::apply([&](auto const&... rows) { return (rows.same(a, b) && ...); }, table);
 }
 
 } // namespace json

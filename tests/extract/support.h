@@ -1,0 +1,111 @@
+#pragma once
+// What the tests of definitions, zones and presets share.
+
+#include "vlservice/extract/extract_field.h"
+#include "vlservice/platform/json_text.h"
+#include "vlservice/platform/log.h"
+
+#include <gmock/gmock.h>
+
+#include <cstdlib>
+#include <ctime>
+#include <memory>
+#include <ostream>
+#include <sstream>
+#include <string>
+#include <utility>
+#include <vector>
+
+inline json::Object parse(std::string const& text) { return json::strToObject(text.data(), text.size()); }
+
+/// The value of any JSON text; the empty text is the empty handle.
+inline json::Value valueOf(std::string const& text) {
+    return text.empty() ? json::Value() : parse("{\"v\":" + text + "}").get("v");
+}
+
+inline std::string print(json::Value const& value) {
+    std::ostringstream text;
+    text << value;
+    return text.str();
+}
+
+template<typename Call>
+void expectWrongType(Call call, std::string const& actual, std::string const& wanted) {
+    EXPECT_THAT(call, testing::ThrowsMessage<json::Exc>(testing::StrEq("JSON error: Wrong type: " + actual +
+                                                                       ". Expected type: " + wanted)));
+}
+
+/// The lines that are logged during its life, as "<priority> text".
+class LoggedLines {
+public:
+    LoggedLines()
+        : before_(Log::setSink([this](LogPriority priority, std::string const& line) {
+              lines_.push_back(std::to_string(priority) + " " + line);
+          })) {}
+    ~LoggedLines() { Log::setSink(std::move(before_)); }
+    LoggedLines(LoggedLines const&) = delete;
+    LoggedLines& operator=(LoggedLines const&) = delete;
+
+    std::vector<std::string> const& lines() const { return lines_; }
+
+private:
+    std::vector<std::string> lines_;
+    Log::Sink before_;
+};
+
+/// Local time of a zone; UTC again behind it.
+class TimeZone {
+public:
+    explicit TimeZone(char const* zone) { set(zone); }
+    ~TimeZone() { set("UTC"); }
+    TimeZone(TimeZone const&) = delete;
+    TimeZone& operator=(TimeZone const&) = delete;
+
+private:
+    static void set(char const* zone) {
+        setenv("TZ", zone, 1);
+        tzset();
+    }
+};
+
+inline long long utc(int year, int month, int day, int hour = 0, int minute = 0, int second = 0) {
+    std::tm time{};
+    time.tm_year = year - 1900;
+    time.tm_mon = month - 1;
+    time.tm_mday = day;
+    time.tm_hour = hour;
+    time.tm_min = minute;
+    time.tm_sec = second;
+    return timegm(&time);
+}
+
+namespace Cfg {
+
+/// What a validation makes of a text: the state and the value.
+struct Typed {
+    ExtractedField::ValueType state;
+    json::Value value;
+
+    friend bool operator==(Typed const&, Typed const&) = default;
+    friend std::ostream& operator<<(std::ostream& out, Typed const& typed) {
+        return out << "state " << int(typed.state) << ", " << typed.value;
+    }
+};
+
+inline Typed plain(json::Value const& value) { return {ExtractedField::ValueType::Plain, value}; }
+inline Typed date(long long seconds) { return {ExtractedField::ValueType::Time, seconds}; }
+inline Typed invalid(std::string const& text) { return {ExtractedField::ValueType::Invalid, text}; }
+
+inline Typed typed(ExtractedField const& field) { return {field.valueType(), field.rawValue()}; }
+
+inline ExtractedField rawValue(json::Value const& value) {
+    return {"f", value, 0, false, IgnoreOnGroup::MustMatch, ExtractedField::ValueType::NotValidated};
+}
+
+inline Typed validate(ExtractField const& definition, std::string const& text) {
+    ExtractedField value = rawValue(text);
+    definition.validate(value);
+    return typed(value);
+}
+
+} // namespace Cfg

@@ -1,0 +1,142 @@
+#include "vlservice/extract/extract_field.h"
+
+#include "vlservice/cfg/json_record.h"
+#include "vlservice/extract/lower_case.h"
+#include "vlservice/extract/regex.h"
+#include "vlservice/platform/log.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <exception>
+#include <tuple>
+#include <type_traits>
+
+namespace Cfg {
+
+static_assert(std::is_nothrow_move_constructible_v<ExtractField>);
+static_assert(std::is_nothrow_move_assignable_v<ExtractField>);
+
+struct ExtractField::Keys {
+    static constexpr std::tuple TABLE{
+        json::Required{"name", &ExtractField::name_},
+        json::Key{"value_extract", &ExtractField::strRegex_},
+        json::Key{"mark", &ExtractField::mark_},
+        json::Key{"ignore_font_metrics", &ExtractField::ignoreFontMetrics_},
+        json::Key{"priority", &ExtractField::priority_},
+        json::Key{"obligatory", &ExtractField::mustHave_},
+        json::Key{"make_one_line", &ExtractField::make1Line_},
+        json::Key{"send_to_server", &ExtractField::sendToServer_},
+        json::Key{"width", &ExtractField::width_},
+        json::Key{"ignore_on_group", &ExtractField::ignoreOnGroup_},
+        json::Key{"name_is_redirect_match", &ExtractField::nameIsRedirectMatch_},
+        json::Key{"postal_match", &ExtractField::postalMatch_},
+    };
+};
+
+/// The group's bytes, and where the whole match stands in the text.
+struct ExtractField::Found {
+    std::string value;
+    std::size_t offset;
+    std::size_t length;
+};
+
+ExtractField::ExtractField(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+    validation_.reset(Validation::createImpl(object, *this));
+    fix();
+}
+
+std::shared_ptr<ExtractedField> ExtractField::extractField(std::string& text, Measure const& measure) const {
+    try {
+        if (auto found = find(text)) {
+            if (!measure)
+                text.erase(found->offset, found->length);
+            else if (isTooWide(measure(text, found->offset, found->length)))
+                return sharedDefault();
+            return makeValue(std::move(found->value));
+        }
+    } catch (std::exception const& error) {
+        Log::Lock(3).logStreamLine() << "Extract field failed with " << error.what() << '\n';
+    }
+    auto const& standIn = sharedDefault();
+    return standIn ? std::make_shared<ExtractedField>(*standIn) : nullptr;
+}
+
+void ExtractField::validate(ExtractedField& value) const {
+    if (!value.isValidated() && validation_)
+        validation_->validate(value);
+}
+
+bool ExtractField::fieldsCanCoexist(ExtractField const& other) const {
+    bool const sameAddress = priority_ >= 1 && priority_ == other.priority_;
+    return name_ != other.name_ && !sameAddress;
+}
+
+void ExtractField::fix() {
+    if (priority_ != 0)
+        name_ = lowerCase(std::move(name_));
+    if (mark_ != LetterSeparatorMark::None)
+        mustHave_ = true;
+    if (priority_ >= 1 && validation_)
+        validation_->defaultValue_.reset();
+}
+
+json::Object ExtractField::serialize() const {
+    json::Object object;
+    json::writeKeys(Keys::TABLE, *this, object);
+    if (validation_)
+        validation_->serialize(object);
+    return object;
+}
+
+bool ExtractField::operator==(ExtractField const& other) const {
+    std::string const none;
+    auto const validationPattern = [&](ExtractField const& field) -> std::string const& {
+        return field.validation_ ? field.validation_->strRegex_ : none;
+    };
+    return json::sameKeys(Keys::TABLE, *this, other) && validationPattern(*this) == validationPattern(other);
+}
+
+std::optional<ExtractField::Found> ExtractField::find(std::string const& text) const {
+    if (strRegex_.empty())
+        return std::nullopt;
+    auto const match = compiledRegex_.get(strRegex_).search(text);
+    if (!match)
+        return std::nullopt;
+    auto const value = match->group(REGEX_VALUE_GROUP_MARK.c_str());
+    if (!value)
+        return std::nullopt;
+    auto const whole = match->whole();
+    return Found{std::string(*value), static_cast<std::size_t>(whole.data() - text.data()), whole.size()};
+}
+
+std::shared_ptr<ExtractedField> ExtractField::makeValue(std::string text) const {
+    if (make1Line_)
+        std::erase(text, '\n');
+    std::replace(text.begin(), text.end(), '\t', ' ');
+    return std::make_shared<ExtractedField>(name_, text, priority_, sendToServer_, ignoreOnGroup_,
+                                            ExtractedField::ValueType::NotValidated);
+}
+
+std::shared_ptr<ExtractedField> const& ExtractField::sharedDefault() const {
+    static std::shared_ptr<ExtractedField> const none;
+    return validation_ ? validation_->defaultValue_ : none;
+}
+
+ExtractField::OwnedValidation::OwnedValidation() noexcept = default;
+ExtractField::OwnedValidation::OwnedValidation(OwnedValidation const& other)
+    : validation_(other ? other->clone() : nullptr) {}
+ExtractField::OwnedValidation::OwnedValidation(OwnedValidation&& other) noexcept = default;
+ExtractField::OwnedValidation& ExtractField::OwnedValidation::operator=(OwnedValidation const& other) {
+    validation_.reset(other ? other->clone() : nullptr);
+    return *this;
+}
+ExtractField::OwnedValidation& ExtractField::OwnedValidation::operator=(OwnedValidation&& other) noexcept {
+    validation_.swap(other.validation_);
+    return *this;
+}
+ExtractField::OwnedValidation::~OwnedValidation() = default;
+
+void ExtractField::OwnedValidation::reset(Validation* validation) noexcept { validation_.reset(validation); }
+
+} // namespace Cfg

@@ -1,0 +1,106 @@
+#include "vlservice/extract/regex.h"
+
+#include <boost/regex/icu.hpp>
+#include <unicode/uclean.h>
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdlib>
+#include <utility>
+#include <vector>
+
+extern "C" {
+static void releaseUnicodeTables() { u_cleanup(); }
+}
+
+namespace Cfg {
+
+namespace {
+
+// Registered at load, so that it runs behind the destructors of everything that was built by the library's
+// users.
+[[maybe_unused]] int const CLEANUP_AT_EXIT = std::atexit(releaseUnicodeTables);
+
+using CodePoints = std::vector<UChar32>;
+using Decoder = boost::u8_to_u32_iterator<char const*, UChar32>;
+
+/// Zeroes behind the last code point that do not count as part of it.
+constexpr std::size_t NO_PADDING = 0;
+// The parser of patterns looks ahead of a malformed one's end without asking for it.
+constexpr std::size_t PATTERN_PADDING = 16;
+
+CodePoints decode(std::string_view utf8, std::size_t padding) {
+    char const* const first = utf8.data();
+    char const* const last = first + utf8.size();
+    CodePoints points;
+    points.reserve(utf8.size() + padding);
+    std::copy(Decoder(first, first, last), Decoder(last, first, last), std::back_inserter(points));
+    points.resize(points.size() + padding);
+    return points;
+}
+
+boost::u32regex compile(std::string_view pattern, boost::regex_constants::syntax_option_type options) {
+    CodePoints const points = decode(pattern, PATTERN_PADDING);
+    return boost::u32regex(points.data(), points.data() + points.size() - PATTERN_PADDING, options);
+}
+
+} // namespace
+
+struct RegexMatch::Results {
+    boost::match_results<char const*> groups;
+};
+
+RegexMatch::RegexMatch(std::unique_ptr<Results const> results) : results_(std::move(results)) {}
+RegexMatch::RegexMatch(RegexMatch&& other) noexcept = default;
+RegexMatch::~RegexMatch() = default;
+
+static std::string_view piece(boost::sub_match<char const*> const& group) {
+    return {group.first, static_cast<std::size_t>(group.length())};
+}
+
+std::string_view RegexMatch::whole() const { return piece(results_->groups[0]); }
+
+std::optional<std::string_view> RegexMatch::group(char const* name) const {
+    auto const& found = results_->groups[name];
+    return found.matched ? std::optional(piece(found)) : std::nullopt;
+}
+
+struct FieldRegex::Compiled {
+    boost::u32regex regex;
+};
+
+FieldRegex::FieldRegex(std::string_view pattern)
+    : compiled_(new Compiled{compile(pattern, boost::regex_constants::perl)}) {}
+FieldRegex::~FieldRegex() = default;
+
+std::optional<RegexMatch> FieldRegex::search(std::string_view text) const {
+    auto found = std::make_unique<RegexMatch::Results>();
+    if (!boost::u32regex_search(text.data(), text.data() + text.size(), found->groups, compiled_->regex,
+                                boost::match_not_dot_newline))
+        return std::nullopt;
+    return RegexMatch(std::move(found));
+}
+
+std::optional<RegexMatch> FieldRegex::match(std::string_view text) const {
+    auto found = std::make_unique<RegexMatch::Results>();
+    if (!boost::u32regex_match(text.data(), text.data() + text.size(), found->groups, compiled_->regex,
+                               boost::match_not_dot_newline))
+        return std::nullopt;
+    return RegexMatch(std::move(found));
+}
+
+struct NameRegex::Compiled {
+    boost::u32regex regex;
+};
+
+NameRegex::NameRegex(std::string_view pattern)
+    : compiled_(
+          new Compiled{compile(pattern, boost::regex_constants::perl | boost::regex_constants::icase)}) {}
+NameRegex::~NameRegex() = default;
+
+bool NameRegex::matches(std::string_view name) const {
+    CodePoints const points = decode(name, NO_PADDING);
+    return boost::regex_match(points.data(), points.data() + points.size(), compiled_->regex);
+}
+
+} // namespace Cfg
