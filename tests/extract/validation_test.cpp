@@ -634,8 +634,8 @@ TEST(ValidationFailures, LetAValueThatIsNoTextOut) {
 }
 
 TEST(ValidationFailures, LetRunawayBacktrackingOut) {
-    auto const field = definition(R"("value_match":"(a*)*(a*)*(a*)*b")");
-    EXPECT_THROW(validate(field, std::string(25, 'a')), std::runtime_error);
+    auto const field = definition(R"("value_match":"(a|aa)*b")");
+    EXPECT_THROW(validate(field, std::string(40, 'a')), std::runtime_error);
 }
 
 } // namespace
