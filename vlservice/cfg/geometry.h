@@ -3,6 +3,7 @@
 // corner.
 
 #include "vlservice/cfg/json.h"
+#include "vlservice/cfg/json_form.h"
 #include "vlservice/export.h"
 
 #include <cstdint>
@@ -42,6 +43,13 @@ struct VLSERVICE_EXPORT Rect {
     json::Object serialize() const;
 
     friend constexpr bool operator==(Rect const&, Rect const&) = default;
+};
+
+/// As a setting a rectangle must be there: the empty handle is refused like everything that is no object.
+template<>
+struct JsonForm<Rect> {
+    static Rect read(json::Value const& node) { return node.toObject(); }
+    static json::Value write(Rect const& rect) { return rect.serialize(); }
 };
 
 } // namespace Cfg
