@@ -13,6 +13,7 @@
 #include "vlservice/cfg/profiles.h"
 #include "vlservice/cfg/show_ctrls.h"
 #include "vlservice/extract/extract_field.h"
+#include "vlservice/extract/extract_preset.h"
 #include "vlservice/extract/extract_zone.h"
 #include "vlservice/extract/extract_zones.h"
 #include "vlservice/extract/extracted_field.h"
