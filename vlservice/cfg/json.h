@@ -21,7 +21,8 @@ namespace json {
 class Array;
 class Object;
 
-/// The one failure of the JSON layer; what() begins with "JSON error: ".
+/// The one failure of the JSON layer, whose texts begin with "JSON error: "; users of the layer have texts of
+/// their own.
 class VLSERVICE_EXPORT Exc : public std::runtime_error {
 public:
     explicit Exc(std::string const& message) : std::runtime_error(message) {}
