@@ -27,4 +27,5 @@
 #include "vlservice/platform/uchar_alloc.h"
 #include "vlservice/presets/letterhead_inf.h"
 #include "vlservice/presets/pack_preset.h"
+#include "vlservice/presets/presets.h"
 #include "vlservice/presets/process_mode.h"
