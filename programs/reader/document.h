@@ -1,0 +1,52 @@
+#pragma once
+// A document from outside, PDF or text, as pages with words on them.
+
+#include "programs/reader/error.h"
+#include "programs/reader/page.h"
+
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace Reader {
+
+class PageSource;
+
+/// One document. Pages are read when they are first asked for, and kept.
+/// A document belongs to one thread; several threads may each have their own.
+class Document {
+public:
+    Document(std::string name, std::unique_ptr<PageSource> source);
+    Document(Document&&) noexcept;
+    Document& operator=(Document&&) noexcept;
+    ~Document();
+
+    /// The name that presets are matched with: the file's, with its ending, without folders.
+    std::string const& name() const { return name_; }
+    int pageCount() const;
+
+    /// Pages count from 1 in all calls. They throw Error when the page is damaged and std::out_of_range when
+    /// there is none of that number.
+    Page const& page(int number);
+    /// A PDF of this page alone. The same page gives the same bytes.
+    std::string singlePagePdf(int number);
+    /// A PNG picture of the page.
+    std::string renderPage(int number, double dotsPerInch);
+
+private:
+    void checkNumber(int number) const;
+
+    std::string name_;
+    std::unique_ptr<PageSource> source_;
+    std::vector<std::optional<Page>> pages_;
+};
+
+/// Opens a PDF, or a text file whose pages end with form feeds. Throws Error.
+Document openDocument(std::filesystem::path const& path);
+
+/// The same for a document in memory; `name` stands for the path.
+Document openDocument(std::string bytes, std::filesystem::path const& name);
+
+} // namespace Reader

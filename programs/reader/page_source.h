@@ -1,0 +1,27 @@
+#pragma once
+// What a kind of document must be able to do; one source file for each kind.
+
+#include "programs/reader/page.h"
+
+#include <memory>
+#include <string>
+
+namespace Reader {
+
+/// Pages count from 1, and callers stay within pageCount(). All operations throw Error.
+class PageSource {
+public:
+    virtual ~PageSource() = default;
+
+    virtual int pageCount() const = 0;
+    virtual Page readPage(int number) = 0;
+    virtual std::string singlePagePdf(int number) = 0;
+    virtual std::string renderPage(int number, double dotsPerInch) = 0;
+};
+
+// `where` names the document in messages.
+
+std::unique_ptr<PageSource> openPdf(std::string bytes, std::string const& where);
+std::unique_ptr<PageSource> openText(std::string_view bytes, std::string const& where);
+
+} // namespace Reader

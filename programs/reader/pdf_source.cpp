@@ -1,0 +1,203 @@
+// The one file that knows poppler, which reads the words and draws the pages; single pages are written by
+// pdf_page.
+#include "programs/reader/clean_text.h"
+#include "programs/reader/error.h"
+#include "programs/reader/page_source.h"
+#include "programs/reader/pdf_page.h"
+
+#include <poppler-document.h>
+#include <poppler-image.h>
+#include <poppler-page-renderer.h>
+#include <poppler-page.h>
+
+#include <png.h>
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <mutex>
+#include <optional>
+#include <utility>
+
+namespace Reader {
+namespace {
+
+/// Further out there is no paper; it keeps damaged coordinates within an int.
+constexpr double MAX_COORDINATE = 1e7;
+/// For fonts that do not tell their size: the share of the height of a word's box.
+constexpr double SIZE_OF_HEIGHT = 0.8;
+constexpr char16_t SOFT_HYPHEN = 0x00AD;
+/// Of a picture: A4 at 1,000 dots per inch, about.
+constexpr double MAX_PIXELS = 1e8;
+
+/// What poppler finds wrong with a document shows in what can be read of it.
+void keepPopplerQuiet() {
+    static std::once_flag once;
+    std::call_once(once,
+                   [] { poppler::set_debug_error_function([](std::string const&, void*) {}, nullptr); });
+}
+
+int toHundredths(double points) {
+    double const value = points * POINT;
+    return std::isnan(value)
+               ? 0
+               : static_cast<int>(std::lround(std::clamp(value, -MAX_COORDINATE, MAX_COORDINATE)));
+}
+
+Box boxOf(poppler::rectf const& rect) {
+    auto const [left, right] = std::minmax(toHundredths(rect.left()), toHundredths(rect.right()));
+    auto const [top, bottom] = std::minmax(toHundredths(rect.top()), toHundredths(rect.bottom()));
+    return {left, top, right, bottom};
+}
+
+/// Some documents say "soft hyphen" for every hyphen; what has been drawn is one.
+void showDrawnHyphens(std::u16string& text, poppler::text_box const& box) {
+    for (std::size_t i = text.find(SOFT_HYPHEN); i != std::u16string::npos; i = text.find(SOFT_HYPHEN, i)) {
+        poppler::rectf const drawn = box.char_bbox(i);
+        if (drawn.width() != 0 && drawn.height() != 0)
+            text[i] = u'-';
+        ++i;
+    }
+}
+
+std::string textOf(poppler::text_box const& box) {
+    poppler::ustring const units = box.text();
+    std::u16string text(units.begin(), units.end());
+    showDrawnHyphens(text, box);
+    return cleanText(text);
+}
+
+/// Numbers the fonts of a page.
+class FontNumbers {
+public:
+    explicit FontNumbers(std::vector<std::string>& names) : names_(names) {}
+
+    std::uint16_t of(std::string const& name) {
+        auto const known = std::find(names_.begin(), names_.end(), name);
+        if (known != names_.end())
+            return static_cast<std::uint16_t>(known - names_.begin());
+        if (names_.size() == MAX_FONTS)
+            return MAX_FONTS - 1;
+        names_.push_back(name);
+        return static_cast<std::uint16_t>(names_.size() - 1);
+    }
+
+private:
+    /// Pages with more fonts are none that blanks could be measured on.
+    static constexpr std::uint16_t MAX_FONTS = 256;
+
+    std::vector<std::string>& names_;
+};
+
+std::optional<Word> wordOf(poppler::text_box const& box, FontNumbers& fonts) {
+    Word word;
+    word.text = textOf(box);
+    if (word.text.empty())
+        return std::nullopt;
+    word.box = boxOf(box.bbox());
+    word.turn = static_cast<Turn>(box.rotation() & 3);
+    word.size = toHundredths(box.get_font_size());
+    if (word.size <= 0) {
+        int const height = runsAcross(word.turn) ? word.box.height() : word.box.width();
+        word.size = std::max(1, static_cast<int>(height * SIZE_OF_HEIGHT));
+    }
+    word.font = fonts.of(box.get_font_name());
+    word.blankBehind = box.has_space_after();
+    return word;
+}
+
+std::string pngOf(poppler::image const& image) {
+    png_image png{};
+    png.version = PNG_IMAGE_VERSION;
+    png.width = static_cast<png_uint_32>(image.width());
+    png.height = static_cast<png_uint_32>(image.height());
+    png.format = PNG_FORMAT_RGB;
+    png_alloc_size_t size = PNG_IMAGE_PNG_SIZE_MAX(png);
+    std::string bytes(size, '\0');
+    if (!png_image_write_to_memory(&png, bytes.data(), &size, 0, image.const_data(), image.bytes_per_row(),
+                                   nullptr))
+        throw Error(std::string("the picture of the page cannot be written: ") + png.message);
+    bytes.resize(size);
+    return bytes;
+}
+
+class PdfSource : public PageSource {
+public:
+    PdfSource(std::string bytes, std::string where)
+        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_) {
+        keepPopplerQuiet();
+        if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
+            throw Error(where_ + ": is larger than 2 GiB; split it");
+        document_.reset(
+            poppler::document::load_from_raw_data(bytes_.data(), static_cast<int>(bytes_.size())));
+        if (document_ && document_->is_locked())
+            throw Error(where_ + ": is an encrypted PDF; save it without a password");
+        if (!document_ || document_->pages() < 1)
+            throw Error(where_ + ": is a damaged PDF; export the document again");
+    }
+
+    int pageCount() const override { return document_->pages(); }
+
+    Page readPage(int number) override {
+        std::unique_ptr<poppler::page> const source = popplerPage(number);
+        Page page;
+        page.number = number;
+        poppler::rectf const sheet = source->page_rect();
+        page.width = toHundredths(std::abs(sheet.width()));
+        page.height = toHundredths(std::abs(sheet.height()));
+        poppler::page::orientation_enum const orientation = source->orientation();
+        if (orientation == poppler::page::landscape || orientation == poppler::page::seascape)
+            std::swap(page.width, page.height);
+
+        FontNumbers fonts(page.fonts);
+        Box const visible{0, 0, page.width, page.height};
+        for (poppler::text_box const& box : source->text_list(poppler::page::text_list_include_font))
+            if (std::optional<Word> word = wordOf(box, fonts); word && visible.contains(word->box.centre()))
+                page.words.push_back(std::move(*word));
+        return page;
+    }
+
+    std::string singlePagePdf(int number) override { return writer_.write(number); }
+
+    std::string renderPage(int number, double dotsPerInch) override {
+        std::unique_ptr<poppler::page> const page = popplerPage(number);
+        poppler::rectf const sheet = page->page_rect();
+        double const scale = dotsPerInch / 72;
+        if (!(sheet.width() * scale * sheet.height() * scale <= MAX_PIXELS))
+            throw Error(where_ + ": page " + std::to_string(number) +
+                        " makes too large a picture; ask for fewer dots per inch");
+
+        poppler::page_renderer renderer;
+        renderer.set_image_format(poppler::image::format_rgb24);
+        renderer.set_render_hint(poppler::page_renderer::antialiasing);
+        renderer.set_render_hint(poppler::page_renderer::text_antialiasing);
+        poppler::image const image = renderer.render_page(page.get(), dotsPerInch, dotsPerInch);
+        if (!image.is_valid())
+            throw Error(where_ + ": page " + std::to_string(number) +
+                        " cannot be drawn; export the document again");
+        return pngOf(image);
+    }
+
+private:
+    std::unique_ptr<poppler::page> popplerPage(int number) const {
+        std::unique_ptr<poppler::page> page(document_->create_page(number - 1));
+        if (!page)
+            throw Error(where_ + ": page " + std::to_string(number) +
+                        " is damaged; export the document again");
+        return page;
+    }
+
+    /// poppler and the writer read from it as long as they live.
+    std::string const bytes_;
+    std::string const where_;
+    PdfPageWriter writer_;
+    std::unique_ptr<poppler::document> document_;
+};
+
+} // namespace
+
+std::unique_ptr<PageSource> openPdf(std::string bytes, std::string const& where) {
+    return std::make_unique<PdfSource>(std::move(bytes), where);
+}
+
+} // namespace Reader

@@ -1,0 +1,157 @@
+// Text files: pages end with form feeds, and each character stands in a column of a typed page.
+#include "programs/reader/clean_text.h"
+#include "programs/reader/error.h"
+#include "programs/reader/page_source.h"
+#include "programs/reader/text_pdf.h"
+#include "programs/reader/typed_page.h"
+
+#include <algorithm>
+#include <string_view>
+#include <unicode/uchar.h>
+#include <unicode/utf16.h>
+#include <utility>
+
+namespace Reader {
+namespace {
+
+constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
+
+/// Text in the encoding that it turns out to have.
+std::u16string decode(std::string_view bytes, std::string const& where) {
+    if (bytes.find('\0') != std::string_view::npos)
+        throw Error(where + ": is neither a PDF nor text; export the document as PDF");
+    if (bytes.substr(0, UTF8_MARK.size()) == UTF8_MARK)
+        bytes.remove_prefix(UTF8_MARK.size());
+    std::optional<std::u16string> text = utf16Of(bytes);
+    return text ? std::move(*text) : utf16OfWindows1252(bytes);
+}
+
+/// Accents that are characters of their own stand above the letter before them.
+bool takesColumn(UChar32 c) {
+    switch (u_charType(c)) {
+    case U_NON_SPACING_MARK:
+    case U_ENCLOSING_MARK:
+    case U_FORMAT_CHAR:
+    case U_CONTROL_CHAR:
+        return false;
+    default:
+        return true;
+    }
+}
+
+/// Puts characters on pages, as a typewriter does.
+class Typist {
+public:
+    std::vector<Page> type(std::u16string_view text) {
+        newPage();
+        for (std::size_t i = 0; i < text.size();) {
+            UChar32 c = 0;
+            U16_NEXT(text.data(), i, text.size(), c);
+            bool const isPair = c == '\r' && i < text.size() && text[i] == u'\n';
+            if (!isPair)
+                type(c);
+        }
+        endWord();
+        // A form feed at the end closes the last page.
+        if (pages_.size() > 1 && text.back() == u'\f')
+            pages_.pop_back();
+        return std::move(pages_);
+    }
+
+private:
+    void type(UChar32 c) {
+        switch (c) {
+        case '\f':
+            endWord();
+            newPage();
+            return;
+        case '\n':
+        case '\r':
+        case '\v':
+            endWord();
+            ++row_;
+            column_ = 0;
+            return;
+        case '\t':
+            endWord();
+            column_ += TypedPage::TAB - column_ % TypedPage::TAB;
+            return;
+        default:
+            break;
+        }
+        if (u_isUWhiteSpace(c)) {
+            endWord();
+            ++column_;
+            return;
+        }
+        if (word_.empty())
+            wordColumn_ = column_;
+        char16_t units[2];
+        std::size_t length = 0;
+        U16_APPEND_UNSAFE(units, length, c);
+        word_.append(units, length);
+        column_ += takesColumn(c) ? 1 : 0;
+    }
+
+    void endWord() {
+        if (word_.empty())
+            return;
+        Word word;
+        word.text = cleanText(word_);
+        word_.clear();
+        if (word.text.empty())
+            return;
+        word.box = TypedPage::boxOf(row_, wordColumn_, std::max(column_, wordColumn_ + 1));
+        word.size = TypedPage::SIZE;
+        Page& page = pages_.back();
+        page.width = std::max(page.width, word.box.right + TypedPage::LEFT);
+        page.height = std::max(page.height, word.box.bottom + TypedPage::TOP);
+        page.words.push_back(std::move(word));
+    }
+
+    void newPage() {
+        pages_.push_back({static_cast<int>(pages_.size()) + 1,
+                          TypedPage::WIDTH,
+                          TypedPage::HEIGHT,
+                          {},
+                          {TypedPage::FONT}});
+        row_ = 0;
+        column_ = 0;
+    }
+
+    std::vector<Page> pages_;
+    std::u16string word_;
+    int row_ = 0;
+    int column_ = 0;
+    int wordColumn_ = 0;
+};
+
+class TextSource : public PageSource {
+public:
+    TextSource(std::vector<Page> pages, std::string where)
+        : pages_(std::move(pages)), where_(std::move(where)) {}
+
+    int pageCount() const override { return static_cast<int>(pages_.size()); }
+    Page readPage(int number) override { return page(number); }
+    std::string singlePagePdf(int number) override { return pdfOfTypedPage(page(number), where_); }
+    std::string renderPage(int number, double dotsPerInch) override {
+        return openPdf(singlePagePdf(number), where_)->renderPage(1, dotsPerInch);
+    }
+
+private:
+    Page const& page(int number) const { return pages_[static_cast<std::size_t>(number - 1)]; }
+
+    std::vector<Page> const pages_;
+    std::string const where_;
+};
+
+} // namespace
+
+std::unique_ptr<PageSource> openText(std::string_view bytes, std::string const& where) {
+    constexpr std::size_t MAX_BYTES = std::size_t{64} << 20;
+    if (bytes.size() > MAX_BYTES)
+        throw Error(where + ": has more than 64 MiB of text; split it");
+    return std::make_unique<TextSource>(Typist().type(decode(bytes, where)), where);
+}
+
+} // namespace Reader

@@ -1,0 +1,178 @@
+#include "programs/reader/zone_text.h"
+
+#include "programs/reader/letters_of.h"
+
+#include <algorithm>
+#include <optional>
+#include <string_view>
+#include <utility>
+
+namespace Reader {
+namespace {
+
+/// At most so many letters from the front.
+std::string_view cutToLetters(std::string_view text, std::size_t letters) {
+    for (std::size_t i = 0; i < text.size(); ++i)
+        if (beginsLetter(text[i]) && letters-- == 0)
+            return text.substr(0, i);
+    return text;
+}
+
+/// The part of a word's box that some of its letters take, as if all were equally wide.
+Box partOf(Word const& word, std::size_t begin, std::size_t end) {
+    std::string_view const text = word.text;
+    double const letters = static_cast<double>(countLetters(text));
+    double const from = static_cast<double>(countLetters(text.substr(0, begin))) / letters;
+    double const to = static_cast<double>(countLetters(text.substr(0, end))) / letters;
+    auto const at = [](int zero, int one, double share) {
+        return static_cast<int>(std::lround(zero + (one - zero) * share));
+    };
+    Box const& box = word.box;
+    switch (word.turn) {
+    case Turn::Upright:
+        break;
+    case Turn::Down:
+        return {box.left, at(box.top, box.bottom, from), box.right, at(box.top, box.bottom, to)};
+    case Turn::UpsideDown:
+        return {at(box.right, box.left, to), box.top, at(box.right, box.left, from), box.bottom};
+    case Turn::Up:
+        return {box.left, at(box.bottom, box.top, to), box.right, at(box.bottom, box.top, from)};
+    }
+    return {at(box.left, box.right, from), box.top, at(box.left, box.right, to), box.bottom};
+}
+
+void unite(std::optional<Box>& sum, Box const& box) { sum = sum ? sum->united(box) : box; }
+
+} // namespace
+
+ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location) {
+    ZoneText zone;
+    for (Block const& block : layout.blocks)
+        zone.addBlock(page, layout, block, &location);
+    return zone;
+}
+
+ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) {
+    ZoneText zone;
+    if (Block const* const block = layout.nearestBlock(point))
+        zone.addBlock(page, layout, *block, nullptr);
+    return zone;
+}
+
+void ZoneText::addBlock(Page const& page, Layout const& layout, Block const& block, Box const* location) {
+    std::optional<Box> seen;
+    for (std::size_t i = block.firstLine; i < block.endLine; ++i) {
+        bool const isFirst = lines_.empty();
+        std::size_t const before = text_.size();
+        if (!isFirst)
+            text_ += '\n';
+        TextLine line = lineOf(page, layout.lines[i], location);
+        if (line.pieces.empty()) {
+            text_.resize(before);
+            continue;
+        }
+        for (Piece const& piece : line.pieces)
+            unite(seen, piece.word->box);
+        lines_.push_back(std::move(line));
+    }
+    if (!seen)
+        return;
+    box_ = blocks_.empty() ? *seen : box_.united(*seen);
+    blocks_.push_back(*seen);
+}
+
+/// Adds the line's words to the text and tells where they are.
+ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line, Box const* location) {
+    TextLine result;
+    std::size_t lettersLeft = MAX_LINE_LENGTH;
+    bool skipped = false;
+    for (LineWord const& lineWord : line.words) {
+        Word const& word = page.words[lineWord.word];
+        if (location && !location->contains(word.box.centre())) {
+            skipped = true;
+            continue;
+        }
+        bool const blank = !result.pieces.empty() && (lineWord.blankBefore || skipped);
+        skipped = false;
+        if (lettersLeft <= (blank ? 1U : 0U))
+            break;
+        if (blank) {
+            text_ += ' ';
+            ++result.length;
+            --lettersLeft;
+        }
+        std::string_view const text = cutToLetters(word.text, lettersLeft);
+        text_ += text;
+        result.pieces.push_back({result.length, result.length + text.size(), &word});
+        result.length += text.size();
+        lettersLeft -= countLetters(text);
+    }
+    return result;
+}
+
+ZoneText::LineRange ZoneText::linesAt(std::size_t offset, std::size_t length) const {
+    std::size_t end = std::min(offset + length, text_.size());
+    while (offset < end && text_[offset] == '\n')
+        ++offset;
+    while (offset < end && text_[end - 1] == '\n')
+        --end;
+    if (offset >= end)
+        return {};
+
+    LineRange range;
+    std::size_t lineBegin = 0;
+    for (std::size_t i = 0; i < lines_.size() && lineBegin < end; ++i) {
+        std::size_t const lineEnd = lineBegin + lines_[i].length;
+        if (lineEnd <= offset) {
+            range.first = i + 1;
+            range.textBegin = lineEnd + 1;
+        }
+        range.end = i + 1;
+        range.textEnd = lineEnd;
+        lineBegin = lineEnd + 1;
+    }
+    return range;
+}
+
+Stretch ZoneText::stretch(std::size_t offset, std::size_t length) const {
+    Stretch result;
+    if (offset > text_.size())
+        return result;
+    result.text = text_.substr(offset, length);
+    std::size_t const end = offset + result.text.size();
+    LineRange const range = linesAt(offset, result.text.size());
+    std::optional<Box> all;
+    std::size_t lineBegin = range.textBegin;
+    for (std::size_t i = range.first; i < range.end; ++i) {
+        std::optional<Box> ofLine;
+        for (Piece const& piece : lines_[i].pieces) {
+            std::size_t const from = std::max(offset, lineBegin + piece.begin) - lineBegin - piece.begin;
+            std::size_t const pieceEnd = std::min(end, lineBegin + piece.end);
+            if (pieceEnd > lineBegin + piece.begin + from)
+                unite(ofLine, partOf(*piece.word, from, pieceEnd - lineBegin - piece.begin));
+        }
+        lineBegin += lines_[i].length + 1;
+        if (!ofLine)
+            continue;
+        result.width = std::max(result.width, lengthAlong(*ofLine, lines_[i].pieces.front().word->turn));
+        unite(all, *ofLine);
+    }
+    result.box = all.value_or(Box{});
+    return result;
+}
+
+std::string ZoneText::cutLines(std::size_t offset, std::size_t length) {
+    LineRange const range = linesAt(offset, length);
+    if (range.first == range.end)
+        return {};
+    std::string const cut = text_.substr(range.textBegin, range.textEnd - range.textBegin);
+    // The line break behind goes with the lines, that before them only where there is none behind.
+    bool const isLast = range.end == lines_.size();
+    std::size_t const begin = isLast && range.first > 0 ? range.textBegin - 1 : range.textBegin;
+    text_.erase(begin, range.textEnd + (isLast ? 0 : 1) - begin);
+    lines_.erase(lines_.begin() + static_cast<std::ptrdiff_t>(range.first),
+                 lines_.begin() + static_cast<std::ptrdiff_t>(range.end));
+    return cut;
+}
+
+} // namespace Reader

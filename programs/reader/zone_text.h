@@ -1,0 +1,77 @@
+#pragma once
+// The text of a zone with its place on the page: fields are searched in it, and each stretch of it can be
+// measured.
+
+#include "programs/reader/layout.h"
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+namespace Reader {
+
+/// Lines longer than this are cut: patterns may take time that grows with a power of a line's length.
+constexpr std::size_t MAX_LINE_LENGTH = 1000;
+
+/// A stretch of a zone's text.
+struct Stretch {
+    std::string text;
+    /// Around its letters on the page; an empty box for an empty stretch.
+    Box box;
+    /// Of its widest line, in 1/100 mm along the line.
+    int width = 0;
+};
+
+/// Lines joined by line feeds, the words of a line by one blank; there is no line feed at the end.
+/// Holds references to the page, which must live longer.
+class ZoneText {
+public:
+    /// The words whose centre lies in the location; a line of the page that has none of them leaves nothing.
+    static ZoneText inside(Page const& page, Layout const& layout, Box const& location);
+    /// The block nearest to the point.
+    static ZoneText nearest(Page const& page, Layout const& layout, Point point);
+
+    std::string const& text() const { return text_; }
+    /// For a search that wants a reference it could write to; only cutLines() changes the text.
+    std::string& searchedText() { return text_; }
+    /// The boxes of the text blocks that the text came from, in reading order.
+    std::vector<Box> const& blocks() const { return blocks_; }
+    /// Around all words that the zone had at the start.
+    Box const& box() const { return box_; }
+
+    /// What stands at these bytes of text(); words that are only partly in it count by their letters.
+    Stretch stretch(std::size_t offset, std::size_t length) const;
+    /// Takes the lines that have a letter in these bytes out of text(), with their line breaks, and gives
+    /// their text.
+    std::string cutLines(std::size_t offset, std::size_t length);
+
+private:
+    struct Piece {
+        /// Bytes of the line.
+        std::size_t begin = 0;
+        std::size_t end = 0;
+        Word const* word = nullptr;
+    };
+    struct TextLine {
+        std::vector<Piece> pieces;
+        std::size_t length = 0;
+    };
+    /// Whole lines, and the bytes of text() that they take without their last line break.
+    struct LineRange {
+        std::size_t first = 0;
+        std::size_t end = 0;
+        std::size_t textBegin = 0;
+        std::size_t textEnd = 0;
+    };
+
+    void addBlock(Page const& page, Layout const& layout, Block const& block, Box const* location);
+    TextLine lineOf(Page const& page, Line const& line, Box const* location);
+    LineRange linesAt(std::size_t offset, std::size_t length) const;
+
+    std::string text_;
+    std::vector<TextLine> lines_;
+    std::vector<Box> blocks_;
+    Box box_;
+};
+
+} // namespace Reader

@@ -1,0 +1,198 @@
+#include "programs/reader/document.h"
+
+#include "programs/reader/layout.h"
+
+#include <gmock/gmock.h>
+
+#include <cstdlib>
+#include <fstream>
+#include <unistd.h>
+
+namespace Reader {
+namespace {
+
+namespace fs = std::filesystem;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+/// A folder that disappears with the test.
+class Documents : public testing::Test {
+protected:
+    Documents() {
+        std::string name = (fs::temp_directory_path() / "reader-XXXXXX").string();
+        if (!::mkdtemp(name.data()))
+            std::abort();
+        folder_ = name;
+    }
+    ~Documents() override { fs::remove_all(folder_); }
+
+    fs::path file(std::string const& name, std::string const& bytes) const {
+        std::ofstream(folder_ / name, std::ios::binary) << bytes;
+        return folder_ / name;
+    }
+
+    /// What opening it says is wrong, without the path in front.
+    std::string complaint(fs::path const& path) const {
+        try {
+            openDocument(path);
+        } catch (Error const& error) {
+            std::string const text = error.what();
+            EXPECT_THAT(text, StartsWith(path.string() + ": "));
+            return text.substr(std::min(text.size(), path.string().size() + 2));
+        }
+        return "nothing";
+    }
+
+    fs::path folder_;
+};
+
+std::vector<std::string> linesOf(Page const& page) {
+    std::vector<std::string> texts;
+    for (Layout const layout = layOut(page); Line const& line : layout.lines)
+        texts.push_back(textOf(page, line));
+    return texts;
+}
+
+/// A PDF of one page, made out of text.
+std::string pdfOf(std::string const& text) { return openDocument(text, "made.txt").singlePagePdf(1); }
+
+TEST_F(Documents, ThatCannotBeOpenedSayWhyAndWhatToDo) {
+    EXPECT_EQ(complaint(folder_ / "none.pdf"), "there is no such file; check the name");
+    EXPECT_EQ(complaint(folder_), "is a folder; name the documents in it");
+    EXPECT_EQ(complaint("/dev/null"), "is no ordinary file; save the document to one");
+    EXPECT_EQ(complaint(file("empty.pdf", "")), "is empty; export the document again");
+    EXPECT_EQ(complaint(file("picture.pdf", std::string("GIF89a\0\0", 8))),
+              "is neither a PDF nor text; export the document as PDF");
+    EXPECT_EQ(complaint(file("damaged.pdf", "%PDF-1.5\nand nothing more")),
+              "is a damaged PDF; export the document again");
+    EXPECT_EQ(complaint(file("a.txt", "x") / "b.txt"), "there is no such file; check the name");
+}
+
+/// Gives up the rights of root, who may read everything, for a while.
+class WithoutRights {
+public:
+    WithoutRights()
+        : user_(::geteuid()) {
+        if (user_ == 0 && ::seteuid(NOBODY) != 0)
+            std::abort();
+    }
+    ~WithoutRights() {
+        if (user_ == 0 && ::seteuid(user_) != 0)
+            std::abort();
+    }
+    WithoutRights(WithoutRights const&) = delete;
+    WithoutRights& operator=(WithoutRights const&) = delete;
+
+private:
+    static constexpr uid_t NOBODY = 65534;
+    uid_t user_;
+};
+
+TEST_F(Documents, WithoutTheRightToReadSaySo) {
+    fs::path const path = file("secret.pdf", "%PDF-");
+    fs::permissions(path, fs::perms::none);
+    fs::permissions(folder_, fs::perms::all);
+    WithoutRights const guard;
+    EXPECT_EQ(complaint(path), "no right to read it; change its permissions");
+}
+
+TEST_F(Documents, AreNamedAfterTheirFilesWithoutFolders) {
+    EXPECT_EQ(openDocument(file("Brief an Müller.txt", "x")).name(), "Brief an Müller.txt");
+}
+
+TEST_F(Documents, PagesCountFromOne) {
+    Document document = openDocument(std::string("eins\fzwei"), "a.txt");
+    EXPECT_EQ(document.pageCount(), 2);
+    EXPECT_EQ(document.page(2).number, 2);
+    EXPECT_THROW(document.page(0), std::out_of_range);
+    EXPECT_THROW(document.page(3), std::out_of_range);
+    EXPECT_THROW(document.singlePagePdf(3), std::out_of_range);
+    EXPECT_THROW(document.renderPage(-1, 72), std::out_of_range);
+}
+
+TEST(TextFiles, StandOnATypedPage) {
+    Document document = openDocument(std::string("Herrn\n  Olaf  Strößner\n\n\tTab"), "a.txt");
+    Page const& page = document.page(1);
+    EXPECT_EQ(page.width, 21000);
+    EXPECT_EQ(page.height, 29700);
+    ASSERT_EQ(page.words.size(), 4U);
+    EXPECT_EQ(page.words[0].box, (Box{2500, 1000, 3558, 1353}));
+    EXPECT_EQ(page.words[1].box, (Box{2923, 1423, 3770, 1776}));
+    EXPECT_EQ(page.words[3].box, (Box{4193, 2270, 4828, 2623}));
+    EXPECT_THAT(linesOf(page), ElementsAre("Herrn", "Olaf Strößner", "Tab"));
+}
+
+TEST(TextFiles, PagesEndAtFormFeeds) {
+    auto const pages = [](std::string const& text) { return openDocument(text, "a.txt").pageCount(); };
+    EXPECT_EQ(pages("a"), 1);
+    EXPECT_EQ(pages("a\f"), 1);
+    EXPECT_EQ(pages("a\fb"), 2);
+    EXPECT_EQ(pages("a\f\fb\f"), 3);
+    EXPECT_EQ(pages("\f"), 1);
+}
+
+TEST(TextFiles, TakeEveryKindOfLineBreak) {
+    Document document = openDocument(std::string("a\r\nb\rc\nd"), "a.txt");
+    EXPECT_THAT(linesOf(document.page(1)), ElementsAre("a", "b", "c", "d"));
+    EXPECT_EQ(document.page(1).words[3].box.top, 1000 + 1270);
+}
+
+TEST(TextFiles, AreUtf8OrElseWindows1252) {
+    EXPECT_EQ(openDocument(std::string("\xEF\xBB\xBFGr\xC3\xBCn"), "a.txt").page(1).words[0].text, "Grün");
+    EXPECT_EQ(openDocument(std::string("Gr\xFCn"), "a.txt").page(1).words[0].text, "Grün");
+}
+
+TEST(TextFiles, AccentsOfTheirOwnTakeNoColumn) {
+    Document document = openDocument(std::string("Cafe\xCC\x81 x"), "a.txt");
+    EXPECT_EQ(document.page(1).words[0].text, "Caf\xC3\xA9");
+    EXPECT_EQ(document.page(1).words[1].box.left, 2500 + 1058);
+}
+
+TEST(TextFiles, HaveALargerSheetWhereTheyNeedIt) {
+    Document document = openDocument(std::string(100, '\n') + std::string(200, 'x'), "a.txt");
+    EXPECT_EQ(document.page(1).height, 1000 + 42333 + 353 + 1000);
+    EXPECT_EQ(document.page(1).width, 2500 + 42333 + 2500);
+}
+
+TEST(TextFiles, BecomePdfsThatReadTheSame) {
+    std::string const text = "Herrn (Olaf) \\ Strößner\n04109 Leipzig €";
+    Document typed = openDocument(text, "a.txt");
+    Document printed = openDocument(typed.singlePagePdf(1), "a.pdf");
+    ASSERT_EQ(printed.pageCount(), 1);
+    EXPECT_EQ(linesOf(printed.page(1)), linesOf(typed.page(1)));
+    EXPECT_EQ(printed.page(1).width, typed.page(1).width);
+    ASSERT_EQ(printed.page(1).words.size(), typed.page(1).words.size());
+    for (std::size_t i = 0; i < typed.page(1).words.size(); ++i) {
+        EXPECT_NEAR(printed.page(1).words[i].box.left, typed.page(1).words[i].box.left, 2);
+        EXPECT_NEAR(printed.page(1).words[i].box.right, typed.page(1).words[i].box.right, 2);
+    }
+}
+
+TEST(Pdfs, GiveTheSameSinglePageEveryTime) {
+    Document document = openDocument(pdfOf("Brief"), "a.pdf");
+    std::string const once = document.singlePagePdf(1);
+    EXPECT_EQ(document.singlePagePdf(1), once);
+    EXPECT_EQ(openDocument(pdfOf("Brief"), "b.pdf").singlePagePdf(1), once);
+}
+
+TEST(Pdfs, AreDrawnAsPng) {
+    Document document = openDocument(pdfOf("Brief"), "a.pdf");
+    EXPECT_THAT(document.renderPage(1, 36), StartsWith("\x89PNG\r\n\x1A\n"));
+    EXPECT_THROW(document.renderPage(1, 1e9), Error);
+}
+
+TEST(Pdfs, CutOffAnywhereFailCleanlyOrAreRead) {
+    std::string const whole = pdfOf("Herrn Olaf");
+    for (std::size_t length = 1; length < whole.size(); ++length) {
+        try {
+            Document document = openDocument(whole.substr(0, length), "cut.pdf");
+            document.page(1);
+        } catch (Error const& error) {
+            EXPECT_THAT(error.what(), HasSubstr("; "));
+        }
+    }
+}
+
+} // namespace
+} // namespace Reader
