@@ -10,7 +10,6 @@
 #include <cstddef>
 #include <initializer_list>
 #include <iterator>
-#include <sstream>
 #include <stdexcept>
 #include <string>
 #include <type_traits>
@@ -21,7 +20,8 @@ namespace json {
 class Array;
 class Object;
 
-/// The one failure of the JSON layer; what() begins with "JSON error: ".
+/// The one failure of the JSON layer, whose texts begin with "JSON error: "; users of the layer have texts of
+/// their own.
 class VLSERVICE_EXPORT Exc : public std::runtime_error {
 public:
     explicit Exc(std::string const& message) : std::runtime_error(message) {}
@@ -196,10 +196,8 @@ public:
     void set(char const* key, Value value) {
         makeUnique();
         if (json_object_set_new_nocheck(node_, key, json_incref(value.node())) != 0) {
-            std::ostringstream message;
-            message << "JSON error: object element can not be set. Key: " << (key ? key : "")
-                    << ". New value type: " << value.typeName();
-            throw Exc(message.str());
+            throw Exc(std::string("JSON error: object element can not be set. Key: ") + (key ? key : "") +
+                      ". New value type: " + value.typeName());
         }
     }
     void set(std::string const& key, Value value) { set(key.c_str(), std::move(value)); }
@@ -231,10 +229,8 @@ public:
     void append(Value value) {
         makeUnique();
         if (json_array_append_new(node_, json_incref(value.node())) != 0) {
-            std::ostringstream message;
-            message << "JSON error: array element can not be appended. Size: " << std::to_string(size())
-                    << ". New value type: " << value.typeName();
-            throw Exc(message.str());
+            throw Exc("JSON error: array element can not be appended. Size: " + std::to_string(size()) +
+                      ". New value type: " + value.typeName());
         }
     }
 

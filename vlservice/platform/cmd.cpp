@@ -28,6 +28,10 @@ CmdProcessorI::~CmdProcessorI() = default;
 
 CmdTransferI* CmdProcessorI::transfer() { return nullptr; }
 
+namespace {
+constexpr char const* NO_FORM = "The command has no form to be sent in";
+} // namespace
+
 CmdI::CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor)
     : id_(id), processor_(std::move(processor)) {}
 
@@ -40,6 +44,11 @@ void CmdI::onTransferError(std::string message) {
     log.logStreamLine() << "Command " << name() << " failed in transfer. " << message;
 }
 
+void CmdI::sendReq() { onTransferError(NO_FORM); }
+void CmdI::readReq() { onTransferError(NO_FORM); }
+void CmdI::sendResp() { onTransferError(NO_FORM); }
+void CmdI::readResp() { onTransferError(NO_FORM); }
+void CmdI::accept(CmdProcessorI&) {}
 bool CmdI::sendNextReqAfterDone() const { return true; }
 
 JsonCmdBase::JsonCmdBase(unsigned char id, std::shared_ptr<CmdProcessorI> processor)

@@ -63,11 +63,13 @@ public:
     virtual Timeouts::TimeoutId reqTimeoutId() const;
     /// Told the text of a transfer failure; logs it.
     virtual void onTransferError(std::string message);
-    virtual void sendReq() = 0;
-    virtual void readReq() = 0;
-    virtual void sendResp() = 0;
-    virtual void readResp() = 0;
-    virtual void accept(CmdProcessorI& processor) = 0;
+    /// The four steps of a transfer. A command that has no form to be sent in ends them in onTransferError.
+    virtual void sendReq();
+    virtual void readReq();
+    virtual void sendResp();
+    virtual void readResp();
+    /// Shows itself to the processor; here nothing.
+    virtual void accept(CmdProcessorI& processor);
     /// Whether the next request may be sent when this command is done; true.
     virtual bool sendNextReqAfterDone() const;
 

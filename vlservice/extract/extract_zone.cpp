@@ -1,0 +1,50 @@
+#include "vlservice/extract/extract_zone.h"
+
+#include "vlservice/cfg/json_form.h"
+#include "vlservice/cfg/json_record.h"
+
+#include <algorithm>
+#include <tuple>
+
+namespace Cfg {
+
+using Fields = JsonForm<std::vector<ExtractField>>;
+
+struct ExtractZone::Keys {
+    static constexpr std::tuple TABLE{
+        json::Key{"location", &ExtractZone::location_},
+        json::Key{"most_probable_point", &ExtractZone::mostProbablePoint_},
+        json::Key{"combine_blocks", &ExtractZone::combineBlocks_},
+        json::Key{"restrict_to_location", &ExtractZone::restrictToLocation_},
+    };
+};
+
+ExtractZone::ExtractZone(std::string const& name, std::vector<ExtractField> fields)
+    : name_(name), fields_(std::move(fields)) {}
+
+ExtractZone::ExtractZone(std::string const& name, std::vector<ExtractField> fields, Rect const& location,
+                         CombineBlocksMethod combineBlocks, RestrictZoneLocation restrictToLocation)
+    : name_(name), fields_(std::move(fields)), location_(location), combineBlocks_(combineBlocks),
+      restrictToLocation_(restrictToLocation) {}
+
+ExtractZone::ExtractZone(json::Object const& object)
+    : name_(object.get("name").toString()), fields_(Fields::read(object.get("fields").toArray())) {
+    json::readKeys(Keys::TABLE, object, *this);
+}
+
+bool ExtractZone::hasAddress() const {
+    return std::any_of(fields_.begin(), fields_.end(),
+                       [](auto const& field) { return field.priority() >= 1; });
+}
+
+bool ExtractZone::operator==(ExtractZone const& other) const {
+    return json::sameKeys(Keys::TABLE, *this, other) && name_ == other.name_ && fields_ == other.fields_;
+}
+
+json::Object ExtractZone::serialize() const {
+    json::Object object{{"name", name_}, {"fields", Fields::write(fields_)}};
+    json::writeKeys(Keys::TABLE, *this, object);
+    return object;
+}
+
+} // namespace Cfg
