@@ -1,0 +1,34 @@
+#pragma once
+// Tells the service to upload what is queued.
+
+#include "vlservice/ipc/cmd_vlsvc_base.h"
+#include "vlservice/ipc/pack_db.h"
+
+#include <string>
+
+namespace Ipc {
+
+/// Names the database of the packs. There is no payload in the response.
+class VLSERVICE_EXPORT UploadQueued : public CmdVLSvcBase {
+public:
+    static constexpr unsigned char CMD_ID = 20;
+
+    UploadQueued(std::shared_ptr<CmdProcessorI> processor);
+    UploadQueued(std::shared_ptr<CmdProcessorI> processor, std::string dbHost, std::string dbName);
+
+    char const* name() const override;
+
+    std::string const& dbHost() const { return db_.host; }
+    std::string const& dbName() const { return db_.name; }
+
+    using CmdVLSvcBase::accept;
+
+private:
+    json::Object serializeReq() const override;
+    void deserializeReq(json::Object const& request) override;
+    void accept(CmdProcessorVLSvcI& processor) override;
+
+    PackDb db_;
+};
+
+} // namespace Ipc
