@@ -26,6 +26,8 @@
 #include "vlservice/ipc/cmd_vlsvc_base.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/cs_config_srv_change.h"
+#include "vlservice/ipc/discovery_base.h"
+#include "vlservice/ipc/discovery_cli.h"
 #include "vlservice/ipc/get_svc_cfg.h"
 #include "vlservice/ipc/gui_fwd.h"
 #include "vlservice/ipc/make_empty_cmd.h"

@@ -14,24 +14,36 @@
 #include "vlservice/ipc/update_status.h"
 #include "vlservice/ipc/upload_queued.h"
 
+#include <array>
 #include <utility>
 
 namespace Ipc {
 namespace {
 
-template<typename... Cmds>
-std::shared_ptr<CmdVLSvcBase> makeOneOf(unsigned char id, std::shared_ptr<CmdProcessorI> processor) {
-    std::shared_ptr<CmdVLSvcBase> cmd;
-    ((id == Cmds::CMD_ID && (cmd = std::make_shared<Cmds>(std::move(processor)), true)) || ...);
-    return cmd;
+using Maker = std::shared_ptr<CmdVLSvcBase> (*)(std::shared_ptr<CmdProcessorI>);
+
+template<typename Cmd>
+std::shared_ptr<CmdVLSvcBase> make(std::shared_ptr<CmdProcessorI> processor) {
+    return std::make_shared<Cmd>(std::move(processor));
 }
+
+template<typename... Cmds>
+constexpr std::array<Maker, 256> makersByNumber() {
+    std::array<Maker, 256> makers{};
+    ((makers[Cmds::CMD_ID] = make<Cmds>), ...);
+    return makers;
+}
+
+constexpr auto MAKERS =
+    makersByNumber<SetApp, SetInet, SetProfiles, SetPO, SetDepartments, RemoveCfgNode, CfgIdsForUser,
+                   CfgIdsTree, UploadQueued, UpdateStatus, UpdateCfg, PriceEst, ProcessPack, GetSvcCfg,
+                   SetSvcCfg, CSConfigIdsList, CSConfigSrvChange>();
 
 } // namespace
 
 std::shared_ptr<CmdVLSvcBase> makeEmptyCmd(unsigned char id, std::shared_ptr<CmdProcessorI> processor) {
-    return makeOneOf<SetApp, SetInet, SetProfiles, SetPO, SetDepartments, RemoveCfgNode, CfgIdsForUser,
-                     CfgIdsTree, UploadQueued, UpdateStatus, UpdateCfg, PriceEst, ProcessPack, GetSvcCfg,
-                     SetSvcCfg, CSConfigIdsList, CSConfigSrvChange>(id, std::move(processor));
+    Maker const maker = MAKERS[id];
+    return maker ? maker(std::move(processor)) : nullptr;
 }
 
 } // namespace Ipc
