@@ -44,6 +44,8 @@ std::vector<CmdCase> allCmds() {
     return {
         cmdCase<Ipc::SetPartTmpl<Cfg::App, 10>>("SetApp", 10, "\"Set app\"", DEFAULT, "set app"),
         cmdCase<Ipc::SetPartTmpl<Cfg::Inet, 12>>("SetInet", 12, "\"Set inet\"", DEFAULT, "set inet"),
+        cmdCase<Ipc::SetPartTmpl<Cfg::Presets, 13>>("SetPresets", 13, "\"Set presets\"", DEFAULT,
+                                                    "set presets"),
         cmdCase<Ipc::SetPartTmpl<Cfg::Profiles, 14>>("SetProfiles", 14, "\"Set profiles\"", DEFAULT,
                                                      "set profiles"),
         cmdCase<Ipc::SetPartTmpl<Cfg::PO, 15>>("SetPO", 15, "\"Set po\"", DEFAULT, "set po"),

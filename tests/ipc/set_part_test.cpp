@@ -19,6 +19,7 @@ TEST(SetPartNames, AreFormedWhenTheLibraryIsLoaded) { EXPECT_EQ(NAME_AT_LOAD, "\
 TEST(SetPartNames, KeepTheirQuotes) {
     EXPECT_EQ((Ipc::SetPartTmpl<Cfg::App, 10>::CMD_NAME), "\"Set app\"");
     EXPECT_EQ((Ipc::SetPartTmpl<Cfg::Inet, 12>::CMD_NAME), "\"Set inet\"");
+    EXPECT_EQ((Ipc::SetPartTmpl<Cfg::Presets, 13>::CMD_NAME), "\"Set presets\"");
     EXPECT_EQ((Ipc::SetPartTmpl<Cfg::Profiles, 14>::CMD_NAME), "\"Set profiles\"");
     EXPECT_EQ((Ipc::SetPartTmpl<Cfg::PO, 15>::CMD_NAME), "\"Set po\"");
     EXPECT_EQ((Ipc::SetPartTmpl<Cfg::Departments, 16>::CMD_NAME), "\"Set deps\"");

@@ -35,9 +35,9 @@ constexpr std::array<Maker, 256> makersByNumber() {
 }
 
 constexpr auto MAKERS =
-    makersByNumber<SetApp, SetInet, SetProfiles, SetPO, SetDepartments, RemoveCfgNode, CfgIdsForUser,
-                   CfgIdsTree, UploadQueued, UpdateStatus, UpdateCfg, PriceEst, ProcessPack, GetSvcCfg,
-                   SetSvcCfg, CSConfigIdsList, CSConfigSrvChange>();
+    makersByNumber<SetApp, SetInet, SetPresets, SetProfiles, SetPO, SetDepartments, RemoveCfgNode,
+                   CfgIdsForUser, CfgIdsTree, UploadQueued, UpdateStatus, UpdateCfg, PriceEst, ProcessPack,
+                   GetSvcCfg, SetSvcCfg, CSConfigIdsList, CSConfigSrvChange>();
 
 } // namespace
 

@@ -7,6 +7,7 @@
 #include "vlservice/cfg/po.h"
 #include "vlservice/cfg/profiles.h"
 #include "vlservice/ipc/set_part_base.h"
+#include "vlservice/presets/presets.h"
 
 #include <memory>
 #include <string>
@@ -42,6 +43,7 @@ std::string const SetPartTmpl<Part, Id>::CMD_NAME = "\"Set " + Part::PART_NAME +
 
 using SetApp = SetPartTmpl<Cfg::App, 10>;
 using SetInet = SetPartTmpl<Cfg::Inet, 12>;
+using SetPresets = SetPartTmpl<Cfg::Presets, 13>;
 using SetProfiles = SetPartTmpl<Cfg::Profiles, 14>;
 using SetPO = SetPartTmpl<Cfg::PO, 15>;
 using SetDepartments = SetPartTmpl<Cfg::Departments, 16>;
@@ -49,6 +51,7 @@ using SetDepartments = SetPartTmpl<Cfg::Departments, 16>;
 // The library forms their names when it is loaded, so that a program's static objects may use them.
 extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::App, 10>;
 extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::Inet, 12>;
+extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::Presets, 13>;
 extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::Profiles, 14>;
 extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::PO, 15>;
 extern template class VLSERVICE_EXPORT SetPartTmpl<Cfg::Departments, 16>;
