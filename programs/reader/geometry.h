@@ -1,6 +1,8 @@
 #pragma once
 // Places on a page: 1/100 mm from the top left corner of the page as it is shown.
 
+#include "vlservice/cfg/geometry.h"
+
 #include <algorithm>
 #include <cmath>
 
@@ -9,12 +11,7 @@ namespace Reader {
 /// Points to 1/100 mm.
 constexpr double POINT = 2540.0 / 72.0;
 
-struct Point {
-    int x = 0;
-    int y = 0;
-
-    friend bool operator==(Point const&, Point const&) = default;
-};
+using Cfg::Point;
 
 struct Box {
     int left = 0;
@@ -31,9 +28,7 @@ struct Box {
     }
     /// 0 for a point inside.
     double distanceTo(Point point) const {
-        double const dx = std::max({left - point.x, 0, point.x - right});
-        double const dy = std::max({top - point.y, 0, point.y - bottom});
-        return std::hypot(dx, dy);
+        return std::hypot(distance(left, right, point.x), distance(top, bottom, point.y));
     }
     /// The smallest box around both.
     Box united(Box const& other) const {
@@ -42,6 +37,10 @@ struct Box {
     }
 
     friend bool operator==(Box const&, Box const&) = default;
+
+private:
+    /// Points come from settings and may be anywhere: their differences need not fit an int.
+    static double distance(double from, double to, double at) { return std::max({from - at, 0.0, at - to}); }
 };
 
 /// Which way text runs on the page as it is shown, in quarter turns clockwise.

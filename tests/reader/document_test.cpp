@@ -72,8 +72,7 @@ TEST_F(Documents, ThatCannotBeOpenedSayWhyAndWhatToDo) {
 /// Gives up the rights of root, who may read everything, for a while.
 class WithoutRights {
 public:
-    WithoutRights()
-        : user_(::geteuid()) {
+    WithoutRights() : user_(::geteuid()) {
         if (user_ == 0 && ::seteuid(NOBODY) != 0)
             std::abort();
     }
