@@ -16,6 +16,8 @@ namespace Cfg {
 static_assert(std::is_nothrow_move_constructible_v<ExtractField>);
 static_assert(std::is_nothrow_move_assignable_v<ExtractField>);
 
+std::string const ExtractField::REGEX_VALUE_GROUP_MARK = "VAL";
+
 struct ExtractField::Keys {
     static constexpr std::tuple TABLE{
         json::Required{"name", &ExtractField::name_},

@@ -53,7 +53,7 @@ public:
                                                      unsigned long long length)>;
 
     /// The group of an extraction pattern that captures the value.
-    inline static std::string const REGEX_VALUE_GROUP_MARK = "VAL";
+    static std::string const REGEX_VALUE_GROUP_MARK;
 
     /// Has no validator: give it one with setValidation() before it is used for more than its attributes.
     ExtractField() = default;

@@ -19,6 +19,8 @@ struct ExtractZone::Keys {
     };
 };
 
+std::string const ExtractZone::DEF_ZONE_NAME = "_Address";
+
 ExtractZone::ExtractZone(std::string const& name, std::vector<ExtractField> fields)
     : name_(name), fields_(std::move(fields)) {}
 

@@ -23,7 +23,7 @@ namespace Cfg {
 /// A zone is found by its location or, without one, by the point where its content is expected.
 class VLSERVICE_EXPORT ExtractZone {
 public:
-    inline static std::string const DEF_ZONE_NAME = "_Address";
+    static std::string const DEF_ZONE_NAME;
     /// Where an address is expected on a letter.
     static constexpr Point DEF_MOST_PROBABLE_POINT{4500, 6200};
 

@@ -15,6 +15,8 @@ auto named(std::string const& name) {
 
 } // namespace
 
+std::string const ExtractZones::SINGLE_LTR_FLD_NAME = "Single Letter Documents (Automatic)";
+
 ExtractField const* ExtractZones::findField(std::string const& name) const {
     for (ExtractZone const& zone : *this) {
         auto const& fields = zone.fields();

@@ -14,7 +14,7 @@ namespace Cfg {
 class VLSERVICE_EXPORT ExtractZones : public std::vector<ExtractZone> {
 public:
     /// The name of the automatic field with which a client marks documents that hold one letter only.
-    inline static std::string const SINGLE_LTR_FLD_NAME = "Single Letter Documents (Automatic)";
+    static std::string const SINGLE_LTR_FLD_NAME;
 
     using std::vector<ExtractZone>::vector;
     explicit ExtractZones(std::vector<ExtractZone> zones) : std::vector<ExtractZone>(std::move(zones)) {}

@@ -16,6 +16,12 @@
 #include <new>
 #include <optional>
 
+std::string const PackWrapper::TAG_CORBULET = Container::TAG_MAILING;
+std::string const PackWrapper::TAG_CORBULET_ID = Container::MAILING_ID;
+std::string const PackWrapper::TAG_CORBULET_TITLE = Container::MAILING_TITLE;
+std::string const PackWrapper::TAG_VANTELAR = Container::TAG_ROOT;
+std::string const PackWrapper::VL_JOBMETADATA = Container::JOB_METADATA;
+
 namespace {
 
 namespace fs = boost::filesystem;

@@ -46,9 +46,9 @@ public:
         std::string document;
     };
 
-    inline static std::string const TAG_CORBULET = Container::TAG_MAILING;
-    inline static std::string const TAG_CORBULET_ID = Container::MAILING_ID;
-    inline static std::string const TAG_CORBULET_TITLE = Container::MAILING_TITLE;
+    static std::string const TAG_CORBULET;
+    static std::string const TAG_CORBULET_ID;
+    static std::string const TAG_CORBULET_TITLE;
 
     /// Creates the file, replacing one that is there, or opens it and reads its index.
     /// The id is that of a mailing to be written; an import's packId() comes from the file.
@@ -90,8 +90,8 @@ protected:
     bool onFailureRetFalse();
 
 private:
-    inline static std::string const TAG_VANTELAR = Container::TAG_ROOT;
-    inline static std::string const VL_JOBMETADATA = Container::JOB_METADATA;
+    static std::string const TAG_VANTELAR;
+    static std::string const VL_JOBMETADATA;
 
     /// Document and page, as they stand in the entries.
     using PageKey = std::pair<std::string_view, std::string_view>;

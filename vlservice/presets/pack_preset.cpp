@@ -22,6 +22,9 @@ struct JsonForm<T> {
     static json::Value write(T mode) { return mode.bits(); }
 };
 
+std::string const PackPreset::NAME_FLD_NAME = "name";
+std::string const PackPreset::PROC_MODE_FLD_NAME = "process_mode";
+
 namespace {
 
 constexpr char const* EMBEDDED_NAME = "pack_preset";

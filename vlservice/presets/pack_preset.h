@@ -69,8 +69,8 @@ public:
         std::set<int> mins;
     };
 
-    static inline std::string const NAME_FLD_NAME = "name";
-    static inline std::string const PROC_MODE_FLD_NAME = "process_mode";
+    static std::string const NAME_FLD_NAME;
+    static std::string const PROC_MODE_FLD_NAME;
 
     PackPreset() = default;
     /// Reads the configuration form, which has the name under "name", when `extraFields` is empty. Otherwise
