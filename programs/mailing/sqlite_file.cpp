@@ -12,8 +12,9 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// Another process may hold the file for a moment, say while it checks it.
+/// Another process may hold the file for a moment.
 constexpr int BUSY_TIMEOUT_MS = 5000;
+constexpr int READING_BUSY_TIMEOUT_MS = 500;
 
 std::string theFile(DatabaseKind const& kind, fs::path const& file) {
     return "the " + std::string(kind.name) + " " + file.string();
@@ -59,12 +60,6 @@ void checkKind(SQLite::Database& database, DatabaseKind const& kind, fs::path co
         failDamaged(kind, file, "schema " + std::to_string(version));
 }
 
-void checkPages(SQLite::Database& database, DatabaseKind const& kind, fs::path const& file) {
-    std::string const verdict = database.execAndGet("PRAGMA quick_check(1)").getString();
-    if (verdict != "ok")
-        failDamaged(kind, file, verdict);
-}
-
 void migrate(SQLite::Database& database, DatabaseKind const& kind) {
     for (auto version = static_cast<std::size_t>(number(database, "PRAGMA user_version"));
          version < kind.migrations.size(); ++version) {
@@ -86,7 +81,6 @@ SQLite::Database openDatabase(fs::path const& file, DatabaseKind const& kind, Jo
         SQLite::Database database(file, SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE, BUSY_TIMEOUT_MS);
         database.exec("PRAGMA trusted_schema = OFF");
         checkKind(database, kind, file);
-        checkPages(database, kind, file);
         database.exec(journal == Journal::WriteAhead ? "PRAGMA journal_mode = WAL"
                                                      : "PRAGMA journal_mode = DELETE");
         // In write-ahead mode the weaker levels would lose the last commits with the power.
@@ -99,13 +93,24 @@ SQLite::Database openDatabase(fs::path const& file, DatabaseKind const& kind, Jo
     }
 }
 
+void requireUndamaged(SQLite::Database& database, DatabaseKind const& kind) {
+    fs::path const file = database.getFilename();
+    try {
+        std::string const verdict = database.execAndGet("PRAGMA quick_check(1)").getString();
+        if (verdict != "ok")
+            failDamaged(kind, file, verdict);
+    } catch (SQLite::Exception const& failure) {
+        rethrow(failure, kind, file);
+    }
+}
+
 SQLite::Database openForReading(fs::path const& file, DatabaseKind const& kind, int maxValueBytes) {
     // A pipe would hold up the opening, and a folder would fail with a misleading text.
     std::error_code error;
     if (!fs::is_regular_file(file, error))
         throw DatabaseError("there is no " + std::string(kind.name) + " " + file.string());
     try {
-        SQLite::Database database(file, SQLite::OPEN_READONLY, BUSY_TIMEOUT_MS);
+        SQLite::Database database(file, SQLite::OPEN_READONLY, READING_BUSY_TIMEOUT_MS);
         sqlite3_limit(database.getHandle(), SQLITE_LIMIT_LENGTH, maxValueBytes);
         database.exec("PRAGMA trusted_schema = OFF");
         database.exec("PRAGMA cell_size_check = ON");

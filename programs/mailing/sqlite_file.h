@@ -32,10 +32,12 @@ enum class Journal {
     WriteAhead,
 };
 
-/// Opens a file for writing, creates it when it is not there, checks it and runs the migrations that it
-/// lacks. A commit is on the disk when it returns, and foreign keys hold.
-/// Throws DatabaseError.
+/// Opens a file for writing, creates it when it is not there and runs the migrations that it lacks. A commit
+/// is on the disk when it returns, and foreign keys hold. Throws DatabaseError.
 SQLite::Database openDatabase(std::filesystem::path const& file, DatabaseKind const& kind, Journal journal);
+
+/// Reads the whole file once to find damage. Throws DatabaseError when there is some.
+void requireUndamaged(SQLite::Database& database, DatabaseKind const& kind);
 
 /// Opens a file that another program wrote, for reading alone; nothing that its schema defines is run.
 /// Values of more than `maxValueBytes` bytes fail to be read. Throws DatabaseError.

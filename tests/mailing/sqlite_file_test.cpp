@@ -45,6 +45,15 @@ protected:
         }
         return "opened";
     }
+    std::string damage() {
+        try {
+            SQLite::Database database = open(FIRST);
+            Mailing::requireUndamaged(database, FIRST);
+        } catch (DatabaseError const& error) {
+            return error.what();
+        }
+        return "none";
+    }
     /// Runs SQL on the file behind the back of what opens it.
     void run(char const* sql) {
         SQLite::Database(file_, SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE).exec(sql);
@@ -109,7 +118,9 @@ TEST_F(SqliteFile, ThatIsNoDatabaseIsRefused) {
     EXPECT_EQ(readingFailure(FIRST), file_.string() + " is not a book of words");
 }
 
-TEST_F(SqliteFile, ThatIsDamagedIsRefused) {
+TEST_F(SqliteFile, ThatIsWholeIsFoundUndamaged) { EXPECT_EQ(damage(), "none"); }
+
+TEST_F(SqliteFile, ThatIsDamagedIsFoundOut) {
     {
         SQLite::Database database = open(FIRST);
         SQLite::Transaction transaction(database);
@@ -118,7 +129,7 @@ TEST_F(SqliteFile, ThatIsDamagedIsRefused) {
         transaction.commit();
     }
     std::fstream(file_).seekp(2 * 4096) << std::string(4096, '\xFF');
-    std::string const text = failure(FIRST);
+    std::string const text = damage();
     EXPECT_TRUE(text.starts_with("the book of words " + file_.string() + " is damaged (")) << text;
     EXPECT_TRUE(text.ends_with("): restore it from a backup, or move it away to begin anew")) << text;
 }

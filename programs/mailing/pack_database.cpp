@@ -1,0 +1,214 @@
+#include "programs/mailing/pack_database.h"
+
+#include "programs/mailing/safe_name.h"
+
+#include <SQLiteCpp/Exception.h>
+
+#include <ctime>
+#include <unordered_set>
+#include <utility>
+
+namespace Mailing {
+namespace {
+
+namespace fs = std::filesystem;
+
+/// "VLPK" as a number.
+constexpr int APPLICATION_ID = 0x564C504B;
+
+constexpr char const* SCHEMA_1 = R"sql(
+CREATE TABLE packs (
+    id         TEXT NOT NULL PRIMARY KEY,
+    cfg_id     TEXT NOT NULL,
+    title      TEXT NOT NULL,
+    metadata   BLOB,
+    complete   INTEGER NOT NULL DEFAULT 0,
+    created_at INTEGER NOT NULL
+);
+CREATE TABLE pages (
+    pack     TEXT NOT NULL REFERENCES packs (id) ON DELETE CASCADE,
+    position INTEGER NOT NULL,
+    document TEXT NOT NULL,
+    page     TEXT NOT NULL,
+    data     BLOB NOT NULL,
+    PRIMARY KEY (pack, position),
+    UNIQUE (pack, document, page)
+);
+)sql";
+
+/// A transaction is ended when it has grown by this much, so that others get at the database in between.
+constexpr unsigned long long BATCH_BYTES = 16ULL << 20;
+/// What a client left unfinished so long ago is what a crash left.
+constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
+/// More than any page needs, and a bound for what a forged database makes its reader allocate.
+constexpr int MAX_BLOB_BYTES = 256 << 20;
+constexpr std::size_t MAX_PACK_ID_BYTES = 128;
+
+template<typename Operation>
+decltype(auto) orDatabaseError(fs::path const& file, Operation operation) {
+    try {
+        return operation();
+    } catch (SQLite::Exception const& failure) {
+        throw DatabaseError("the pack database " + file.string() + " failed: " + failure.what());
+    }
+}
+
+SharedMemBuffer bufferIn(SQLite::Column const& column) {
+    // The pointer first: asking for it may convert the value, and the size is that of what it became.
+    void const* const data = column.getBlob();
+    return SharedMemBuffer::copyOf(data, static_cast<unsigned long long>(column.getBytes()));
+}
+
+} // namespace
+
+DatabaseKind const& packDatabase() {
+    static DatabaseKind const kind{"pack database", APPLICATION_ID, {SCHEMA_1}};
+    return kind;
+}
+
+bool isPackId(std::string const& id) { return id.size() <= MAX_PACK_ID_BYTES && safeFileName(id) == id; }
+
+PackDatabaseWriter::PackDatabaseWriter(fs::path const& file, PackInfo const& pack)
+    : PageSaverI(pack.id), file_(file), database_(openDatabase(file, packDatabase(), Journal::Rollback)) {
+    if (!isPackId(pack.id))
+        throw DatabaseError("the pack id \"" + pack.id + "\" cannot name a file");
+    orDatabaseError(file_, [&] { begin(pack); });
+}
+
+PackDatabaseWriter::~PackDatabaseWriter() {
+    if (finished_)
+        return;
+    try {
+        eraseUnfinished();
+    } catch (std::exception const&) {
+        // It stays unfinished, and whoever opens the database a day later erases it.
+    }
+}
+
+void PackDatabaseWriter::begin(PackInfo const& pack) {
+    // A batch stays in memory until it is committed, so that meanwhile others can read.
+    database_.exec("PRAGMA cache_spill = OFF");
+    database_.exec("BEGIN IMMEDIATE");
+    long long const now = std::time(nullptr);
+    SQLite::Statement cleaning(database_,
+                               "DELETE FROM packs WHERE complete = 0 AND (id = ? OR created_at < ?)");
+    cleaning.bind(1, pack.id);
+    cleaning.bind(2, static_cast<std::int64_t>(now - UNFINISHED_SECONDS));
+    cleaning.exec();
+    SQLite::Statement insertion(database_, "INSERT INTO packs (id, cfg_id, title, created_at) "
+                                           "VALUES (?, ?, ?, ?) ON CONFLICT DO NOTHING");
+    insertion.bind(1, pack.id);
+    insertion.bind(2, pack.cfgId);
+    insertion.bind(3, pack.title);
+    insertion.bind(4, static_cast<std::int64_t>(now));
+    if (insertion.exec() == 0)
+        throw DatabaseError("the pack database " + file_.string() + " has a pack " + pack.id + " already");
+}
+
+void PackDatabaseWriter::savePage(std::string const& document, std::string const& page,
+                                  SharedMemBuffer data) {
+    if (data.empty() || data.size() > MAX_BLOB_BYTES)
+        throw DatabaseError("page \"" + page + "\" of \"" + document + "\" cannot be stored: it has " +
+                            std::to_string(data.size()) + " bytes");
+    orDatabaseError(file_, [&] {
+        SQLite::Statement insertion(database_, "INSERT INTO pages (pack, position, document, page, data) "
+                                               "VALUES (?, ?, ?, ?, ?)");
+        insertion.bindNoCopy(1, savedPackId());
+        insertion.bind(2, static_cast<std::int64_t>(position_));
+        insertion.bindNoCopy(3, document);
+        insertion.bindNoCopy(4, page);
+        insertion.bindNoCopy(5, data.data(), static_cast<int>(data.size()));
+        insertion.exec();
+        ++position_;
+        batchBytes_ += data.size();
+        if (batchBytes_ >= BATCH_BYTES)
+            commitBatch();
+    });
+}
+
+void PackDatabaseWriter::commitBatch() {
+    database_.exec("COMMIT");
+    database_.exec("BEGIN IMMEDIATE");
+    batchBytes_ = 0;
+}
+
+void PackDatabaseWriter::finish(SharedMemBuffer metadata) {
+    orDatabaseError(file_, [&] {
+        SQLite::Statement change(database_, "UPDATE packs SET metadata = ?, complete = 1 WHERE id = ?");
+        change.bindNoCopy(1, metadata.data(), static_cast<int>(metadata.size()));
+        change.bindNoCopy(2, savedPackId());
+        change.exec();
+        database_.exec("COMMIT");
+        finished_ = true;
+    });
+}
+
+void PackDatabaseWriter::eraseUnfinished() {
+    database_.tryExec("ROLLBACK");
+    SQLite::Statement deletion(database_, "DELETE FROM packs WHERE id = ? AND complete = 0");
+    deletion.bind(1, savedPackId());
+    deletion.exec();
+}
+
+PackDatabaseReader::PackDatabaseReader(fs::path const& file, std::string const& packId)
+    : PageLoaderI(packId), file_(file), database_(openForReading(file, packDatabase(), MAX_BLOB_BYTES)) {
+    orDatabaseError(file_, [&] {
+        readInfo();
+        readPageNames();
+    });
+}
+
+void PackDatabaseReader::readInfo() {
+    SQLite::Statement query(database_, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
+    query.bind(1, packId());
+    if (!query.executeStep())
+        throw DatabaseError("the pack database " + file_.string() + " has no finished pack " + packId());
+    info_ = {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
+}
+
+void PackDatabaseReader::readPageNames() {
+    SQLite::Statement query(database_, "SELECT document, page FROM pages WHERE pack = ? ORDER BY position");
+    query.bind(1, packId());
+    while (query.executeStep())
+        pages_.push_back({query.getColumn(0).getString(), query.getColumn(1).getString()});
+}
+
+std::size_t PackDatabaseReader::documentCount() const {
+    std::unordered_set<std::string> documents;
+    for (PageName const& name : pages_)
+        documents.insert(name.document);
+    return documents.size();
+}
+
+void PackDatabaseReader::requestPageData(std::string const& document, std::string const& page,
+                                         PageFunc func) {
+    PageLoaderI::requestPageData(document, page, std::move(func));
+    SharedMemBuffer data = orDatabaseError(file_, [&] {
+        SQLite::Statement query(database_,
+                                "SELECT data FROM pages WHERE pack = ? AND document = ? AND page = ?");
+        query.bindNoCopy(1, packId());
+        query.bindNoCopy(2, document);
+        query.bindNoCopy(3, page);
+        return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
+    });
+    callPgFunc(document, page, std::move(data));
+}
+
+SharedMemBuffer PackDatabaseReader::metadata() {
+    return orDatabaseError(file_, [&] {
+        SQLite::Statement query(database_, "SELECT metadata FROM packs WHERE id = ?");
+        query.bindNoCopy(1, packId());
+        return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
+    });
+}
+
+void removePack(fs::path const& file, std::string const& packId) {
+    SQLite::Database database = openDatabase(file, packDatabase(), Journal::Rollback);
+    orDatabaseError(file, [&] {
+        SQLite::Statement deletion(database, "DELETE FROM packs WHERE id = ?");
+        deletion.bind(1, packId);
+        deletion.exec();
+    });
+}
+
+} // namespace Mailing

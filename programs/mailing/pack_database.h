@@ -1,0 +1,97 @@
+#pragma once
+// The pack database: where a client leaves the pages of its mailings until the service has fetched them.
+
+#include "programs/mailing/sqlite_file.h"
+#include "vlservice/pack/page_loader.h"
+#include "vlservice/pack/page_saver.h"
+
+#include <SQLiteCpp/Statement.h>
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace Mailing {
+
+// A database holds any number of packs. A pack is one row of `packs` (id, cfg_id, title, metadata, complete,
+// created_at) and one row of `pages` for each page (pack, position from 0, document, page, data). Metadata
+// and pages are products of PageSaverI::zipDbData. Readers see a pack only when `complete` is 1.
+DatabaseKind const& packDatabase();
+
+/// Whether a pack can bear this id: it names a file later on, so it has to be a safe file name of at most 128
+/// bytes.
+bool isPackId(std::string const& id);
+
+/// What a pack is beside its pages.
+struct PackInfo {
+    std::string id;
+    /// The settings node that it is sent for; the empty text is the root.
+    std::string cfgId;
+    std::string title;
+};
+
+/// Stores one pack. What was stored disappears with the object unless finish() was called. Every operation
+/// throws DatabaseError when the database cannot do its part.
+class PackDatabaseWriter : public PageSaverI {
+public:
+    /// Opens the database, or creates it, and begins a pack. Throws DatabaseError when the id is none or
+    /// belongs to a finished pack already.
+    PackDatabaseWriter(std::filesystem::path const& file, PackInfo const& pack);
+    ~PackDatabaseWriter() override;
+    PackDatabaseWriter(PackDatabaseWriter const&) = delete;
+    PackDatabaseWriter& operator=(PackDatabaseWriter const&) = delete;
+
+    /// `data` is a product of zipDbData, of 256 MiB at most. A page of the same document and name must not be
+    /// there yet.
+    void savePage(std::string const& document, std::string const& page, SharedMemBuffer data) override;
+    /// From here on readers see the pack, also after a crash or a power failure.
+    void finish(SharedMemBuffer metadata);
+
+private:
+    void begin(PackInfo const& pack);
+    void commitBatch();
+    void eraseUnfinished();
+
+    std::filesystem::path file_;
+    SQLite::Database database_;
+    long long position_ = 0;
+    unsigned long long batchBytes_ = 0;
+    bool finished_ = false;
+};
+
+/// The pages of one finished pack, each read when it is asked for and answered at once.
+class PackDatabaseReader : public PageLoaderI {
+public:
+    struct PageName {
+        std::string document;
+        std::string page;
+    };
+
+    /// Throws DatabaseError when there is no such finished pack.
+    PackDatabaseReader(std::filesystem::path const& file, std::string const& packId);
+
+    PackInfo const& info() const { return info_; }
+    /// In the order in which they were stored.
+    std::vector<PageName> const& pages() const { return pages_; }
+    std::size_t documentCount() const;
+
+    /// Calls `func` before it returns, with the empty buffer when there is no such page.
+    /// Throws DatabaseError when the database cannot be read.
+    void requestPageData(std::string const& document, std::string const& page, PageFunc func) override;
+    SharedMemBuffer metadata();
+
+private:
+    void readInfo();
+    void readPageNames();
+
+    std::filesystem::path file_;
+    SQLite::Database database_;
+    PackInfo info_;
+    std::vector<PageName> pages_;
+};
+
+/// Erases a pack and gives its room back to the database. Nothing happens when there is none of that id.
+/// Throws DatabaseError.
+void removePack(std::filesystem::path const& file, std::string const& packId);
+
+} // namespace Mailing

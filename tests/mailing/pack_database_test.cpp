@@ -1,0 +1,183 @@
+#include "programs/mailing/pack_database.h"
+
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+
+#include <SQLiteCpp/Exception.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using Mailing::PackDatabaseReader;
+using Mailing::PackDatabaseWriter;
+
+SharedMemBuffer zipped(std::string const& text) { return PageSaverI::zipDbData(text.data(), text.size()); }
+
+std::string text(SharedMemBuffer const& blob) {
+    SharedMemBuffer const data = PageLoaderI::unzipDbData(blob);
+    return data.empty() ? "" : std::string(reinterpret_cast<char const*>(data.data()), data.size());
+}
+
+class PackDatabase : public testing::Test {
+protected:
+    void storePack(std::string const& id) {
+        PackDatabaseWriter writer(file_, {id, "u=bob/a=acme", "Bills"});
+        writer.savePage("one.pdf", "1", zipped("page one"));
+        writer.savePage("one.pdf", "2", zipped("page two"));
+        writer.savePage("two.pdf", "1", zipped("page three"));
+        writer.finish(zipped("metadata"));
+    }
+    std::string page(PackDatabaseReader& reader, std::string const& document, std::string const& name) {
+        std::string result = "not called";
+        reader.requestPageData(document, name, [&](SharedMemBuffer const& data) { result = text(data); });
+        return result;
+    }
+    std::string readingFailure(std::string const& id) {
+        return failureOf([&] { PackDatabaseReader(file_, id); });
+    }
+    std::string noSuchPack(std::string const& id) {
+        return "the pack database " + file_.string() + " has no finished pack " + id;
+    }
+    void run(char const* sql) { SQLite::Database(file_, SQLite::OPEN_READWRITE).exec(sql); }
+
+    TemporaryFolder folder_;
+    fs::path file_ = folder_ / "packs.db";
+};
+
+TEST_F(PackDatabase, GivesBackWhatWasStored) {
+    storePack("p1");
+    PackDatabaseReader reader(file_, "p1");
+    EXPECT_EQ(reader.packId(), "p1");
+    EXPECT_EQ(reader.info().cfgId, "u=bob/a=acme");
+    EXPECT_EQ(reader.info().title, "Bills");
+    EXPECT_EQ(reader.documentCount(), 2u);
+    ASSERT_EQ(reader.pages().size(), 3u);
+    EXPECT_EQ(reader.pages()[1].document, "one.pdf");
+    EXPECT_EQ(reader.pages()[1].page, "2");
+    EXPECT_EQ(page(reader, "one.pdf", "2"), "page two");
+    EXPECT_EQ(page(reader, "two.pdf", "1"), "page three");
+    EXPECT_EQ(page(reader, "one.pdf", "1"), "page one");
+    EXPECT_EQ(text(reader.metadata()), "metadata");
+    EXPECT_TRUE(reader.nothingPening());
+}
+
+TEST_F(PackDatabase, AnswersWithNoDataForAPageThatItDoesNotHave) {
+    storePack("p1");
+    PackDatabaseReader reader(file_, "p1");
+    EXPECT_EQ(page(reader, "one.pdf", "9"), "");
+    EXPECT_EQ(page(reader, "nine.pdf", "1"), "");
+}
+
+TEST_F(PackDatabase, KeepsPagesInTheOrderInWhichTheyWereStored) {
+    {
+        PackDatabaseWriter writer(file_, {"p1", "", ""});
+        for (int number = 12; number > 0; --number)
+            writer.savePage("doc", std::to_string(number), zipped("x"));
+        writer.finish(zipped(""));
+    }
+    PackDatabaseReader const reader(file_, "p1");
+    EXPECT_EQ(reader.pages().front().page, "12");
+    EXPECT_EQ(reader.pages().back().page, "1");
+}
+
+TEST_F(PackDatabase, ShowsAPackOnlyWhenItIsFinished) {
+    storePack("other");
+    PackDatabaseWriter writer(file_, {"p1", "", ""});
+    writer.savePage("one.pdf", "1", zipped("page"));
+    EXPECT_EQ(readingFailure("p1"), noSuchPack("p1"));
+    writer.finish(zipped(""));
+    EXPECT_EQ(readingFailure("p1"), "nothing was thrown");
+    EXPECT_EQ(readingFailure("p2"), noSuchPack("p2"));
+}
+
+TEST_F(PackDatabase, LeavesNothingOfAPackThatWasNotFinished) {
+    {
+        PackDatabaseWriter writer(file_, {"p1", "", ""});
+        writer.savePage("one.pdf", "1", zipped("page"));
+    }
+    SQLite::Database database(file_);
+    EXPECT_EQ(database.execAndGet("SELECT count(*) FROM packs").getInt(), 0);
+    EXPECT_EQ(database.execAndGet("SELECT count(*) FROM pages").getInt(), 0);
+}
+
+TEST_F(PackDatabase, CanBeReadWhileALargePackIsStored) {
+    storePack("p1");
+    SharedMemBuffer blob;
+    blob.resize(9 << 20);
+    std::fill(blob.data(), blob.data() + blob.size(), static_cast<unsigned char>('x'));
+    {
+        PackDatabaseWriter writer(file_, {"large", "", ""});
+        for (char const* name : {"1", "2", "3"}) {
+            writer.savePage("doc", name, blob);
+            EXPECT_EQ(readingFailure("p1"), "nothing was thrown");
+            EXPECT_EQ(readingFailure("large"), noSuchPack("large"));
+        }
+        EXPECT_GT(SQLite::Database(file_).execAndGet("SELECT count(*) FROM pages").getInt(), 3);
+    }
+    EXPECT_EQ(SQLite::Database(file_).execAndGet("SELECT count(*) FROM pages").getInt(), 3);
+}
+
+TEST_F(PackDatabase, ForgetsWhatACrashLeftADayAgo) {
+    storePack("kept");
+    run("INSERT INTO packs (id, cfg_id, title, created_at) VALUES ('old', '', '', 5)");
+    run("INSERT INTO pages VALUES ('old', 0, 'd', 'p', x'00')");
+    storePack("new");
+    SQLite::Database database(file_);
+    EXPECT_EQ(database.execAndGet("SELECT group_concat(id, ' ') FROM (SELECT id FROM packs ORDER BY id)")
+                  .getString(),
+              "kept new");
+    EXPECT_EQ(database.execAndGet("SELECT count(*) FROM pages WHERE pack = 'old'").getInt(), 0);
+}
+
+TEST_F(PackDatabase, TakesAnIdThatWasNotFinishedOnceMoreAndAFinishedOneNever) {
+    storePack("p1");
+    run("UPDATE packs SET complete = 0");
+    storePack("p1");
+    EXPECT_EQ(failureOf([&] { storePack("p1"); }),
+              "the pack database " + file_.string() + " has a pack p1 already");
+    EXPECT_EQ(PackDatabaseReader(file_, "p1").pages().size(), 3u);
+}
+
+TEST_F(PackDatabase, RefusesPagesThatItCannotKeep) {
+    PackDatabaseWriter writer(file_, {"p1", "", ""});
+    writer.savePage("doc", "1", zipped("x"));
+    EXPECT_EQ(failureOf([&] { writer.savePage("doc", "2", SharedMemBuffer()); }),
+              "page \"2\" of \"doc\" cannot be stored: it has 0 bytes");
+    EXPECT_EQ(failureOf([&] { writer.savePage("doc", "1", zipped("y")); }),
+              "the pack database " + file_.string() +
+                  " failed: UNIQUE constraint failed: pages.pack, pages.document, pages.page");
+}
+
+TEST_F(PackDatabase, RefusesIdsThatCannotNameAFile) {
+    for (std::string const id : {"", "../x", "a/b", ".hidden", "a\nb", "\xFF"})
+        EXPECT_EQ(failureOf([&] {
+                      PackDatabaseWriter(file_, {id, "", ""});
+                  }),
+                  "the pack id \"" + id + "\" cannot name a file");
+    EXPECT_TRUE(Mailing::isPackId(std::string(128, 'x')));
+    EXPECT_FALSE(Mailing::isPackId(std::string(129, 'x')));
+    EXPECT_TRUE(Mailing::isPackId("Bills of March, 2"));
+}
+
+TEST_F(PackDatabase, RemovesAPackWithItsPages) {
+    storePack("p1");
+    storePack("p2");
+    Mailing::removePack(file_, "p1");
+    Mailing::removePack(file_, "p9");
+    EXPECT_EQ(readingFailure("p1"), noSuchPack("p1"));
+    EXPECT_EQ(PackDatabaseReader(file_, "p2").pages().size(), 3u);
+    EXPECT_EQ(SQLite::Database(file_).execAndGet("SELECT count(*) FROM pages").getInt(), 3);
+}
+
+TEST_F(PackDatabase, TellsWhenItCannotBeRead) {
+    storePack("p1");
+    PackDatabaseReader reader(file_, "p1");
+    run("DROP TABLE pages");
+    EXPECT_EQ(failureOf([&] { page(reader, "one.pdf", "1"); }),
+              "the pack database " + file_.string() + " failed: no such table: pages");
+    EXPECT_EQ(readingFailure("p1"), "the pack database " + file_.string() + " failed: no such table: pages");
+}
+
+} // namespace
