@@ -35,8 +35,7 @@ protected:
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = Mailing::openDatabase(folder_ / "service.db", VlServiced::serviceDatabase(),
-                                                       Mailing::Journal::WriteAhead);
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     JobStore store_{database_};
 };
 
@@ -75,6 +74,25 @@ TEST_F(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
     EXPECT_EQ(store_.find("p1")->changedAt, 150);
     EXPECT_EQ(store_.find("p1")->problem, "");
     EXPECT_FALSE(store_.advance("p2", JobState::Accepted, JobState::Queued, 150));
+}
+
+TEST_F(JobStoreTest, RecordsWhereAContainerGoesBeforeItGoesThere) {
+    store_.accept(job("p1"));
+    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/upload", 140));
+    store_.advance("p1", JobState::Accepted, JobState::Queued, 150);
+    EXPECT_TRUE(store_.beginSubmitting("p1", "/srv/upload", 160));
+    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/other", 170));
+    EXPECT_EQ(store_.find("p1")->state, JobState::Submitting);
+    EXPECT_EQ(store_.find("p1")->uploadFolder, "/srv/upload");
+    EXPECT_EQ(store_.find("p1")->changedAt, 160);
+}
+
+TEST_F(JobStoreTest, CountsTheJobsOfEachState) {
+    for (auto const* id : {"a", "b", "c"})
+        store_.accept(job(id));
+    store_.fail("b", "", 5);
+    EXPECT_THAT(store_.counts(), testing::UnorderedElementsAre(testing::Pair(JobState::Accepted, 2),
+                                                               testing::Pair(JobState::Failed, 1)));
 }
 
 TEST_F(JobStoreTest, GivesAJobUpWithTheReason) {

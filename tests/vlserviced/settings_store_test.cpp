@@ -1,8 +1,8 @@
 #include "programs/vlserviced/store/settings_store.h"
 
 #include "programs/vlserviced/store/schema.h"
+#include "tests/failure_of.h"
 #include "tests/temporary_folder.h"
-#include "tests/vlserviced/failure_of.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -14,10 +14,7 @@ using VlServiced::SettingsStore;
 
 class SettingsStoreTest : public testing::Test {
 protected:
-    SQLite::Database open() {
-        return Mailing::openDatabase(folder_ / "service.db", VlServiced::serviceDatabase(),
-                                     Mailing::Journal::WriteAhead);
-    }
+    SQLite::Database open() { return VlServiced::openServiceDatabase(folder_ / "service.db"); }
     std::vector<std::string> chainIds(std::string const& id) {
         std::vector<std::string> ids;
         for (VlServiced::SettingsLevel const& level : store_.chain(id))
@@ -25,20 +22,27 @@ protected:
         return ids;
     }
 
+    std::vector<std::string> nodeIds() {
+        std::vector<std::string> ids;
+        for (VlServiced::SettingsNode const& node : store_.nodes())
+            ids.push_back(node.id);
+        return ids;
+    }
+    json::Value part(std::string const& id, char const* part) { return store_.parts(id).get(part); }
+
     TemporaryFolder folder_;
     SQLite::Database database_ = open();
     SettingsStore store_{database_};
 };
 
-TEST_F(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(store_.nodes(), ElementsAre("")); }
+TEST_F(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(nodeIds(), ElementsAre("")); }
 
 TEST_F(SettingsStoreTest, AddsANodeWithAllAboveIt) {
     store_.add("u=bob/ou=sales/a=acme");
-    EXPECT_THAT(store_.nodes(), ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme"));
+    EXPECT_THAT(nodeIds(), ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme"));
     store_.add("u=bob/ou=sales/a=acme");
     store_.add("u=eve/");
-    EXPECT_THAT(store_.nodes(),
-                ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme", "u=eve/"));
+    EXPECT_THAT(nodeIds(), ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme", "u=eve/"));
     EXPECT_TRUE(store_.contains("a=acme"));
     EXPECT_FALSE(store_.contains("a=other"));
 }
@@ -48,19 +52,32 @@ TEST_F(SettingsStoreTest, KeepsAPartOfANode) {
     json::Object const second{{"descr", "second"}};
     store_.setPart("a=acme", "app", first);
     store_.setPart("a=acme", "po", json::Object{{"code", "7"}});
-    EXPECT_EQ(store_.part("a=acme", "app"), first);
+    EXPECT_EQ(part("a=acme", "app"), first);
     store_.setPart("a=acme", "app", second);
-    EXPECT_EQ(store_.part("a=acme", "app"), second);
+    EXPECT_EQ(part("a=acme", "app"), second);
     store_.setPart("a=acme", "app", json::Value());
-    EXPECT_FALSE(store_.part("a=acme", "app"));
-    EXPECT_TRUE(store_.part("a=acme", "po"));
-    EXPECT_FALSE(store_.part("a=other", "app"));
+    EXPECT_FALSE(part("a=acme", "app"));
+    EXPECT_TRUE(part("a=acme", "po"));
+    EXPECT_FALSE(part("a=other", "app"));
+}
+
+TEST_F(SettingsStoreTest, ListsNodesWithDescriptionAndParts) {
+    store_.setPart("a=acme", "po", json::Object{{"code", "7"}});
+    store_.setPart("a=acme", "app", json::Object{{"descr", "Acme Ltd"}});
+    store_.add("u=bob/a=acme");
+    std::vector<VlServiced::SettingsNode> const nodes = store_.nodes();
+    ASSERT_EQ(nodes.size(), 3u);
+    EXPECT_EQ(nodes[1].id, "a=acme");
+    EXPECT_EQ(nodes[1].description, "Acme Ltd");
+    EXPECT_THAT(nodes[1].parts, ElementsAre("app", "po"));
+    EXPECT_EQ(nodes[2].description, "");
+    EXPECT_THAT(nodes[2].parts, ElementsAre());
 }
 
 TEST_F(SettingsStoreTest, ClearsANodeAndKeepsIt) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
     store_.clear("a=acme");
-    EXPECT_FALSE(store_.part("a=acme", "app"));
+    EXPECT_FALSE(part("a=acme", "app"));
     EXPECT_TRUE(store_.contains("a=acme"));
 }
 
@@ -82,7 +99,7 @@ TEST_F(SettingsStoreTest, RemovesANodeWithItsParts) {
     store_.remove("a=acme");
     EXPECT_FALSE(store_.contains("a=acme"));
     store_.add("a=acme");
-    EXPECT_FALSE(store_.part("a=acme", "app"));
+    EXPECT_FALSE(part("a=acme", "app"));
 }
 
 TEST_F(SettingsStoreTest, RefusesToRemoveWhatOthersStandOn) {
@@ -110,13 +127,13 @@ TEST_F(SettingsStoreTest, KeepsTheServicesOwnSettings) {
 TEST_F(SettingsStoreTest, IsThereForTheNextThatOpensTheFile) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "grüße"}});
     SQLite::Database again = open();
-    EXPECT_EQ(SettingsStore(again).part("a=acme", "app"), (json::Object{{"descr", "grüße"}}));
+    EXPECT_EQ(SettingsStore(again).parts("a=acme").get("app"), (json::Object{{"descr", "grüße"}}));
 }
 
 TEST_F(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
     std::string const noUtf8 = "\xFF";
     EXPECT_THROW(store_.setPart("a=acme", "app", json::Object{{"descr", noUtf8}}), json::Exc);
-    EXPECT_THAT(store_.nodes(), ElementsAre(""));
+    EXPECT_THAT(nodeIds(), ElementsAre(""));
 }
 
 } // namespace

@@ -46,6 +46,8 @@ struct Job {
     std::string problem;
     /// Whether the container is to be handed on as soon as it is there.
     bool toUpload = false;
+    /// Where the container goes, or went; empty before Submitting.
+    std::string uploadFolder;
     /// Seconds since the epoch.
     long long acceptedAt = 0;
     long long changedAt = 0;

@@ -6,6 +6,7 @@
 #include "vlservice/cfg/inet.h"
 #include "vlservice/cfg/po.h"
 #include "vlservice/cfg/profiles.h"
+#include "vlservice/presets/presets.h"
 
 #include <algorithm>
 #include <array>
@@ -54,6 +55,43 @@ json::Value readOwn(json::Value const& sent) {
     return Part(sent, false, false).serialize();
 }
 
+/// Erasing what bears an erase mark is left to whoever stores the presets.
+template<auto List>
+void dropErased(Cfg::Presets& presets) {
+    auto const& elements = presets.elements<List>();
+    std::vector<std::size_t> erased;
+    std::size_t position = 0;
+    for (auto const& element : elements) {
+        if (element.inh)
+            break;
+        if (element.value.eraseMe())
+            erased.push_back(position);
+        ++position;
+    }
+    for (auto at = erased.rbegin(); at != erased.rend(); ++at)
+        presets.eraseOwn<List>(*at);
+}
+
+/// One expression that cannot be compiled would end the search for every document that reaches it.
+void requireUsable(Cfg::Presets const& presets) {
+    for (auto const& element : presets.elements<Cfg::PresetFieldIdxs::ExtractPresets>()) {
+        try {
+            element.value.match("");
+        } catch (std::exception const& failure) {
+            throw Error("the expression " + element.value.strRegex() + " cannot be used: " + failure.what());
+        }
+    }
+}
+
+template<>
+json::Value readOwn<Cfg::Presets>(json::Value const& sent) {
+    Cfg::Presets presets(sent, false, false);
+    dropErased<Cfg::PresetFieldIdxs::ExtractPresets>(presets);
+    dropErased<Cfg::PresetFieldIdxs::PackPresets>(presets);
+    requireUsable(presets);
+    return presets.serialize();
+}
+
 enum class Inheritance { Whole, ByElements };
 
 struct PartKind {
@@ -69,13 +107,14 @@ PartKind kind(Inheritance lists) {
     return {Part::PART_NAME, lists, &readOwn<Part>, &effective<Part>};
 }
 
-std::array<PartKind, 5> const& kinds() {
-    static std::array<PartKind, 5> const all{
+std::array<PartKind, 6> const& kinds() {
+    static std::array<PartKind, 6> const all{
         kind<Cfg::App>(Inheritance::Whole),
         kind<Cfg::Inet>(Inheritance::Whole),
         kind<Cfg::PO>(Inheritance::Whole),
         kind<Cfg::Departments>(Inheritance::Whole),
         kind<Cfg::Profiles>(Inheritance::ByElements),
+        kind<Cfg::Presets>(Inheritance::ByElements),
     };
     return all;
 }

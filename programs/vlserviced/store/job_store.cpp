@@ -32,7 +32,7 @@ JobState stateNamed(std::string const& name) {
 
 constexpr char const* SELECT_JOBS =
     "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
-    "problem, to_upload, accepted_at, changed_at FROM jobs ";
+    "problem, to_upload, upload_folder, accepted_at, changed_at FROM jobs ";
 
 Job jobIn(SQLite::Statement& row) {
     Job job;
@@ -46,8 +46,9 @@ Job jobIn(SQLite::Statement& row) {
     job.state = stateNamed(row.getColumn(7).getString());
     job.problem = row.getColumn(8).getString();
     job.toUpload = row.getColumn(9).getInt() != 0;
-    job.acceptedAt = row.getColumn(10).getInt64();
-    job.changedAt = row.getColumn(11).getInt64();
+    job.uploadFolder = row.getColumn(10).getString();
+    job.acceptedAt = row.getColumn(11).getInt64();
+    job.changedAt = row.getColumn(12).getInt64();
     return job;
 }
 
@@ -125,6 +126,17 @@ bool JobStore::advance(std::string const& packId, JobState from, JobState to, lo
     return change.exec() == 1;
 }
 
+bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder, long long now) {
+    SQLite::Statement change(database_, "UPDATE jobs SET state = ?, problem = '', upload_folder = ?, "
+                                        "changed_at = ? WHERE pack = ? AND state = ?");
+    change.bind(1, stateName(JobState::Submitting));
+    change.bind(2, uploadFolder);
+    change.bind(3, static_cast<std::int64_t>(now));
+    change.bind(4, packId);
+    change.bind(5, stateName(JobState::Queued));
+    return change.exec() == 1;
+}
+
 void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
     SQLite::Statement change(database_,
                              "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
@@ -150,6 +162,14 @@ void JobStore::wantUpload(std::string const& folder, std::string const& database
     change.bind(3, stateName(JobState::Accepted));
     change.bind(4, stateName(JobState::Queued));
     change.exec();
+}
+
+std::vector<std::pair<JobState, long long>> JobStore::counts() const {
+    SQLite::Statement query(database_, "SELECT state, count(*) FROM jobs GROUP BY state");
+    std::vector<std::pair<JobState, long long>> counts;
+    while (query.executeStep())
+        counts.emplace_back(stateNamed(query.getColumn(0).getString()), query.getColumn(1).getInt64());
+    return counts;
 }
 
 } // namespace VlServiced

@@ -7,6 +7,7 @@
 
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace VlServiced {
@@ -30,11 +31,16 @@ public:
     /// In the order of their acceptance, at most `limit`, the youngest when there are more.
     std::vector<Job> matching(JobFilter const& filter, std::size_t limit) const;
 
+    /// How many jobs are in each state that any is in.
+    std::vector<std::pair<JobState, long long>> counts() const;
+
     /// Records a new job as accepted. False when there is one of that pack id already: it stays as it is.
     bool accept(Job const& job);
     /// Moves a job on and clears its problem. The container's way is irreversible, so `from` has to be the
     /// job's state; false, and no change, when it is not.
     bool advance(std::string const& packId, JobState from, JobState to, long long now);
+    /// Moves a queued job on to Submitting, into that folder; false, and no change, when it is not queued.
+    bool beginSubmitting(std::string const& packId, std::string const& uploadFolder, long long now);
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.

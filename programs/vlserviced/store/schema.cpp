@@ -30,18 +30,19 @@ CREATE TABLE service_settings (
 );
 
 CREATE TABLE jobs (
-    pack        TEXT NOT NULL PRIMARY KEY,
-    db_folder   TEXT NOT NULL,
-    db_name     TEXT NOT NULL,
-    cfg_id      TEXT NOT NULL,
-    title       TEXT NOT NULL,
-    documents   INTEGER NOT NULL,
-    pages       INTEGER NOT NULL,
-    state       TEXT NOT NULL,
-    problem     TEXT NOT NULL DEFAULT '',
-    to_upload   INTEGER NOT NULL DEFAULT 0,
-    accepted_at INTEGER NOT NULL,
-    changed_at  INTEGER NOT NULL
+    pack          TEXT NOT NULL PRIMARY KEY,
+    db_folder     TEXT NOT NULL,
+    db_name       TEXT NOT NULL,
+    cfg_id        TEXT NOT NULL,
+    title         TEXT NOT NULL,
+    documents     INTEGER NOT NULL,
+    pages         INTEGER NOT NULL,
+    state         TEXT NOT NULL,
+    problem       TEXT NOT NULL DEFAULT '',
+    to_upload     INTEGER NOT NULL DEFAULT 0,
+    upload_folder TEXT NOT NULL DEFAULT '',
+    accepted_at   INTEGER NOT NULL,
+    changed_at    INTEGER NOT NULL
 ) WITHOUT ROWID;
 CREATE INDEX jobs_by_state ON jobs (state);
 )sql";
@@ -51,6 +52,12 @@ CREATE INDEX jobs_by_state ON jobs (state);
 Mailing::DatabaseKind const& serviceDatabase() {
     static Mailing::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1}};
     return kind;
+}
+
+SQLite::Database openServiceDatabase(std::filesystem::path const& file) {
+    SQLite::Database database = Mailing::openDatabase(file, serviceDatabase(), Mailing::Journal::WriteAhead);
+    Mailing::requireUndamaged(database, serviceDatabase());
+    return database;
 }
 
 } // namespace VlServiced

@@ -9,4 +9,7 @@ namespace VlServiced {
 /// version is a new script behind it.
 Mailing::DatabaseKind const& serviceDatabase();
 
+/// Opens, or creates, the service's database and tests it for damage. Throws Mailing::DatabaseError.
+SQLite::Database openServiceDatabase(std::filesystem::path const& file);
+
 } // namespace VlServiced

@@ -33,19 +33,23 @@ bool SettingsStore::contains(std::string const& id) const {
     return query.executeStep();
 }
 
-std::vector<std::string> SettingsStore::nodes() const {
-    SQLite::Statement query(database_, "SELECT id FROM nodes ORDER BY id");
-    std::vector<std::string> ids;
-    while (query.executeStep())
-        ids.push_back(query.getColumn(0).getString());
-    return ids;
+std::vector<SettingsNode> SettingsStore::nodes() const {
+    SQLite::Statement query(database_, "SELECT id, part, CASE part WHEN 'app' THEN json END FROM nodes "
+                                       "LEFT JOIN parts ON node = id ORDER BY id, part");
+    std::vector<SettingsNode> nodes;
+    while (query.executeStep()) {
+        std::string id = query.getColumn(0).getString();
+        if (nodes.empty() || nodes.back().id != id)
+            nodes.push_back({std::move(id), {}, {}});
+        if (!query.getColumn(1).isNull())
+            nodes.back().parts.push_back(query.getColumn(1).getString());
+        if (!query.getColumn(2).isNull())
+            nodes.back().description = objectIn(query.getColumn(2)).get("descr").textOrEmpty();
+    }
+    return nodes;
 }
 
-json::Value SettingsStore::part(std::string const& id, std::string const& part) const {
-    return partsOf(id).get(part);
-}
-
-json::Object SettingsStore::partsOf(std::string const& id) const {
+json::Object SettingsStore::parts(std::string const& id) const {
     SQLite::Statement query(database_, "SELECT part, json FROM parts WHERE node = ?");
     query.bindNoCopy(1, id);
     json::Object parts;
@@ -61,7 +65,7 @@ std::vector<SettingsLevel> SettingsStore::chain(std::string const& id) const {
     for (Cfg::Id const& level : Cfg::Id(id, false).allIds()) {
         // An id that ends in a slash has the root twice in its chain.
         if (levels.empty() || levels.back().id != level.str())
-            levels.push_back({level.str(), partsOf(level.str())});
+            levels.push_back({level.str(), parts(level.str())});
     }
     return levels;
 }

@@ -16,6 +16,15 @@ struct SettingsLevel {
     json::Object parts;
 };
 
+/// A node in a list of nodes.
+struct SettingsNode {
+    std::string id;
+    /// Its own, not an inherited one.
+    std::string description;
+    /// The names of the parts that it has own values of.
+    std::vector<std::string> parts;
+};
+
 /// The nodes of the settings tree. Ids are texts that checkNodeId has let through. Every change is one
 /// transaction and on the disk when the operation returns.
 class SettingsStore {
@@ -25,9 +34,9 @@ public:
 
     bool contains(std::string const& id) const;
     /// Every node, the root among them, in the order of the texts.
-    std::vector<std::string> nodes() const;
-    /// The node's own value of a part; the empty handle when it has none.
-    json::Value part(std::string const& id, std::string const& part) const;
+    std::vector<SettingsNode> nodes() const;
+    /// An object from part name to the node's own value, in flat form.
+    json::Object parts(std::string const& id) const;
     /// The node and all above it, the root last. Nodes that are not stored are levels without parts.
     std::vector<SettingsLevel> chain(std::string const& id) const;
 
@@ -46,7 +55,6 @@ public:
 
 private:
     void addChain(std::string const& id);
-    json::Object partsOf(std::string const& id) const;
 
     SQLite::Database& database_;
 };

@@ -1,0 +1,44 @@
+#include "programs/vlserviced/jobs/container.h"
+
+#include "programs/mailing/pack_database.h"
+#include "programs/mailing/pending_file.h"
+#include "vlservice/pack/blob_format.h"
+#include "vlservice/pack/pack_wrapper.h"
+
+#include <algorithm>
+
+namespace VlServiced {
+namespace {
+
+/// A container's index is found by how its first blob begins, and readers expand every blob.
+bool isCompressed(SharedMemBuffer const& blob) {
+    return blob.size() > DB_ZIP_HEADER_SIZE &&
+           std::equal(DB_ZIP_MAGIC.begin(), DB_ZIP_MAGIC.end(), reinterpret_cast<char const*>(blob.data()));
+}
+
+void copyPages(Mailing::PackDatabaseReader& pages, PackWrapper& container) {
+    for (auto const& [document, page] : pages.pages()) {
+        pages.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
+            if (!isCompressed(blob))
+                throw BadPack("page \"" + page + "\" of \"" + document + "\" is not a compressed page");
+            container.savePage(document, page, std::move(blob));
+        });
+    }
+}
+
+} // namespace
+
+void writeContainer(PackLocation const& pack, std::filesystem::path const& target) {
+    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
+    SharedMemBuffer const metadata = pages.metadata();
+    if (!isCompressed(metadata))
+        throw BadPack("the metadata of pack " + pack.packId + " is not compressed");
+    Mailing::PendingFile pending(target);
+    PackWrapper container(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, pack.packId);
+    copyPages(pages, container);
+    if (!container.finalizeOutput(metadata))
+        throw Error("the container " + target.string() + " could not be written; the log says why");
+    pending.commit();
+}
+
+} // namespace VlServiced

@@ -1,0 +1,219 @@
+#include "programs/vlserviced/jobs/job_runner.h"
+
+#include "programs/mailing/pack_database.h"
+#include "programs/mailing/safe_name.h"
+#include "programs/vlserviced/error.h"
+#include "programs/vlserviced/jobs/container.h"
+#include "programs/vlserviced/jobs/hand_over.h"
+#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/one_line.h"
+#include "vlservice/platform/log.h"
+
+#include <limits>
+#include <system_error>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::size_t MAX_TITLE_BYTES = 500;
+constexpr std::size_t ALL = std::numeric_limits<std::size_t>::max();
+
+/// One spelling for a folder, so that jobs are found again by it.
+std::string folderText(std::string const& folder) {
+    std::string const normal = fs::path(folder).lexically_normal().string();
+    return normal.size() > 1 && normal.back() == '/' ? normal.substr(0, normal.size() - 1) : normal;
+}
+
+PackLocation checkedLocation(PackLocation const& pack) {
+    if (!Mailing::isPackId(pack.packId))
+        throw Error("the pack id \"" + pack.packId + "\" cannot name a file");
+    if (!fs::path(pack.folder).is_absolute())
+        throw Error(
+            "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a "
+            "folder, and \"" +
+            pack.folder + "\" is none");
+    if (Mailing::safeFileName(pack.database) != pack.database)
+        throw Error("\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
+    return {folderText(pack.folder), pack.database, pack.packId};
+}
+
+/// A job that is there already: the pack is taken, or it cannot be.
+void requireSamePack(Job const& known, PackLocation const& pack) {
+    if (!(known.pack == pack))
+        throw Error("there is another pack " + pack.packId + ", from " + known.pack.file().string());
+    if (known.state == JobState::Failed)
+        throw Error("pack " + pack.packId + " was given up: " + known.problem);
+}
+
+} // namespace
+
+JobRunner::JobRunner(JobStore& jobs, JobSurroundings surroundings)
+    : jobs_(jobs), surroundings_(std::move(surroundings)) {}
+
+void JobRunner::resume() {
+    for (JobState const state : {JobState::Submitting, JobState::Queued, JobState::Accepted})
+        for (Job const& job : jobs_.inState(state))
+            proceed(job);
+}
+
+void JobRunner::accept(PackLocation pack) {
+    pack = checkedLocation(pack);
+    std::optional<Job> job = jobs_.find(pack.packId);
+    if (job)
+        requireSamePack(*job, pack);
+    else
+        jobs_.accept(*(job = newJob(pack)));
+    proceed(*job);
+}
+
+Job JobRunner::newJob(PackLocation const& pack) const {
+    Mailing::PackDatabaseReader const pages(pack.file(), pack.packId);
+    Job job;
+    job.pack = pack;
+    job.cfgId = pages.info().cfgId;
+    job.title = pages.info().title;
+    job.documents = static_cast<long long>(pages.documentCount());
+    job.pages = static_cast<long long>(pages.pages().size());
+    job.acceptedAt = surroundings_.now();
+    if (job.pages == 0)
+        throw Error("pack " + pack.packId + " has no pages");
+    if (!isPlainText(job.title, MAX_TITLE_BYTES))
+        throw Error("the title of pack " + pack.packId + " is not a line of text of at most " +
+                    std::to_string(MAX_TITLE_BYTES) + " bytes");
+    checkNodeId(job.cfgId);
+    if (surroundings_.settings().isDisabled(job.cfgId))
+        throw Error("node " + job.cfgId + " is disabled: pack " + pack.packId + " is not taken");
+    return job;
+}
+
+void JobRunner::proceed(Job const& job) {
+    if (busy_.contains(job.pack.packId) || surroundings_.settings().isSuspended(Suspended::Jobs))
+        return;
+    if (job.state == JobState::Accepted)
+        startPacking(job);
+    else if (job.state == JobState::Queued && job.toUpload)
+        startStaging(job);
+    else if (job.state == JobState::Submitting)
+        finishSubmitting(job);
+}
+
+void JobRunner::startPacking(Job const& job) {
+    inBackground(
+        job.pack.packId,
+        [pack = job.pack, target = surroundings_.outbox / job.containerName()] {
+            writeContainer(pack, target);
+        },
+        [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
+}
+
+void JobRunner::onPacked(std::string const& packId, Outcome const& outcome) {
+    if (outcome.kind == Outcome::Kind::GiveUp) {
+        Log::Lock(3).logStreamLine() << "Pack " << packId << " is given up: " << outcome.why;
+        jobs_.fail(packId, outcome.why, surroundings_.now());
+    } else if (outcome.kind == Outcome::Kind::TryLater) {
+        noteProblem(packId, outcome.why);
+    } else {
+        jobs_.advance(packId, JobState::Accepted, JobState::Queued, surroundings_.now());
+        proceed(jobs_.find(packId).value());
+    }
+}
+
+void JobRunner::startStaging(Job const& job) {
+    std::string const folder = surroundings_.settings().uploadFolder();
+    if (folder.empty())
+        return noteProblem(job.pack.packId, "the service has no upload folder");
+    inBackground(
+        job.pack.packId,
+        [container = surroundings_.outbox / job.containerName(), folder] { stage(container, folder); },
+        [this, packId = job.pack.packId, folder](Outcome const& outcome) {
+            onStaged(packId, folder, outcome);
+        });
+}
+
+void JobRunner::onStaged(std::string const& packId, std::string const& folder, Outcome const& outcome) {
+    if (outcome.kind != Outcome::Kind::Done)
+        return noteProblem(packId, outcome.why);
+    jobs_.beginSubmitting(packId, folder, surroundings_.now());
+    finishSubmitting(jobs_.find(packId).value());
+}
+
+void JobRunner::finishSubmitting(Job const& job) {
+    Outcome const outcome = outcomeOf([&] { publish(job.containerName(), job.uploadFolder); });
+    if (outcome.kind != Outcome::Kind::Done)
+        return noteProblem(job.pack.packId, outcome.why);
+    jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
+    std::error_code ignored;
+    fs::remove(surroundings_.outbox / job.containerName(), ignored);
+}
+
+void JobRunner::upload(std::string const& folder, std::string const& database) {
+    if (surroundings_.settings().uploadFolder().empty())
+        throw Error(
+            "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
+    jobs_.wantUpload(folder.empty() ? folder : folderText(folder), database);
+    resume();
+}
+
+void JobRunner::updateStatus(std::string const& folder, std::string const& database) {
+    for (Job const& job : jobs_.matching({folder.empty() ? folder : folderText(folder), database, {}}, ALL)) {
+        if (job.state == JobState::Submitted || job.state == JobState::Lodged)
+            refresh(job);
+        else
+            proceed(job);
+    }
+}
+
+void JobRunner::refresh(Job const& job) {
+    Outcome const outcome = outcomeOf([&] {
+        bool const waits = liesIn(job.uploadFolder, job.containerName());
+        std::optional<CarrierReport> const report = carrierReport(job.uploadFolder, job.containerName());
+        if (report && !report->delivered)
+            jobs_.fail(job.pack.packId, "the carrier: " + oneLine(report->text), surroundings_.now());
+        else if (report)
+            jobs_.advance(job.pack.packId, job.state, JobState::Delivered, surroundings_.now());
+        else if (job.state == JobState::Submitted && !waits)
+            jobs_.advance(job.pack.packId, job.state, JobState::Lodged, surroundings_.now());
+    });
+    if (outcome.kind != Outcome::Kind::Done)
+        noteProblem(job.pack.packId, outcome.why);
+    else if (!job.problem.empty() && jobs_.find(job.pack.packId)->state == job.state)
+        jobs_.setProblem(job.pack.packId, {});
+}
+
+void JobRunner::noteProblem(std::string const& packId, std::string const& problem) {
+    Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot go on: " << problem;
+    jobs_.setProblem(packId, problem);
+}
+
+void JobRunner::inBackground(std::string const& packId, std::function<void()> work,
+                             std::function<void(Outcome)> then) {
+    busy_.insert(packId);
+    auto const finish = [this, packId, then = std::move(then)](Outcome const& outcome) {
+        busy_.erase(packId);
+        try {
+            then(outcome);
+        } catch (std::exception const& failure) {
+            // The record did not change, so the step is made again with the next resume().
+            Log::Lock(3).logStreamLine() << "Pack " << packId << " cannot be recorded. " << failure.what();
+        }
+    };
+    surroundings_.onWorker([work = std::move(work), finish, onOwnThread = surroundings_.onOwnThread] {
+        onOwnThread([finish, outcome = outcomeOf(work)] { finish(outcome); });
+    });
+}
+
+JobRunner::Outcome JobRunner::outcomeOf(std::function<void()> const& work) {
+    try {
+        work();
+        return {};
+    } catch (BadPack const& bad) {
+        return {Outcome::Kind::GiveUp, oneLine(bad.what())};
+    } catch (std::exception const& failure) {
+        return {Outcome::Kind::TryLater, oneLine(failure.what())};
+    }
+}
+
+} // namespace VlServiced

@@ -1,0 +1,78 @@
+#pragma once
+// Brings jobs along their way: from the client's database into the outbox, from there to the upload folder,
+// and on with what the carrier reports.
+
+#include "programs/vlserviced/settings/service_settings.h"
+#include "programs/vlserviced/store/job_store.h"
+
+#include <filesystem>
+#include <functional>
+#include <set>
+#include <string>
+
+namespace VlServiced {
+
+/// What a runner needs around it.
+struct JobSurroundings {
+    using Work = std::function<void()>;
+
+    /// Runs long work, one after another, away from the caller's thread.
+    std::function<void(Work)> onWorker;
+    /// Runs work on the runner's own thread; may be called from any.
+    std::function<void(Work)> onOwnThread;
+    /// Seconds since the epoch.
+    std::function<long long()> now;
+    /// The service's settings as they are at that moment.
+    std::function<ServiceSettings()> settings;
+    std::filesystem::path outbox;
+};
+
+/// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
+/// process. Used by one thread; the work it hands to the worker touches nothing of it.
+/// Operations on a pack database take its folder and its name; for all but accept() an empty text is no
+/// restriction.
+class JobRunner {
+public:
+    /// The store has to outlive the runner, and the runner has to outlive the work on its own thread.
+    JobRunner(JobStore& jobs, JobSurroundings surroundings);
+
+    /// Takes up every job that can go on: at the start, and when jobs are no longer held back.
+    void resume();
+    /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
+    /// nothing. The pages are fetched later. Throws Error or Mailing::DatabaseError when the pack cannot be
+    /// taken.
+    void accept(PackLocation pack);
+    /// Has the containers of these jobs handed on, those that are not there yet as soon as they are.
+    /// Throws Error when there is no upload folder.
+    void upload(std::string const& folder, std::string const& database);
+    /// Brings the states of these jobs up to date with the upload folder, and tries again what failed before.
+    void updateStatus(std::string const& folder, std::string const& database);
+
+private:
+    /// How a step of the worker ended.
+    struct Outcome {
+        enum class Kind { Done, TryLater, GiveUp } kind = Kind::Done;
+        std::string why;
+    };
+
+    void proceed(Job const& job);
+    void startPacking(Job const& job);
+    void startStaging(Job const& job);
+    void finishSubmitting(Job const& job);
+    void onPacked(std::string const& packId, Outcome const& outcome);
+    void onStaged(std::string const& packId, std::string const& folder, Outcome const& outcome);
+    void refresh(Job const& job);
+    void noteProblem(std::string const& packId, std::string const& problem);
+    Job newJob(PackLocation const& pack) const;
+    /// Runs `work` on the worker and hands its outcome to `then` on the own thread.
+    void inBackground(std::string const& packId, std::function<void()> work,
+                      std::function<void(Outcome)> then);
+    static Outcome outcomeOf(std::function<void()> const& work);
+
+    JobStore& jobs_;
+    JobSurroundings surroundings_;
+    /// Pack ids that the worker is busy with, or will be.
+    std::set<std::string> busy_;
+};
+
+} // namespace VlServiced

@@ -1,0 +1,132 @@
+#include "programs/vlserviced/settings/settings_service.h"
+
+#include "programs/vlserviced/error.h"
+#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/settings/parts.h"
+#include "vlservice/cfg/cfg_node_id.h"
+#include "vlservice/cfg/id.h"
+
+#include <algorithm>
+#include <map>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+using Children = std::map<std::string, std::vector<SettingsNode const*>>;
+
+json::Array arrayOf(std::vector<std::string> const& texts) {
+    json::Array array;
+    for (std::string const& text : texts)
+        array.append(text);
+    return array;
+}
+
+json::Object branch(SettingsNode const& node, Children const& children, ServiceSettings const& service) {
+    json::Object object{{"id", node.id}, {"descr", node.description}};
+    if (service.isDisabled(node.id))
+        object.set("disabled", true);
+    object.set("parts", arrayOf(node.parts));
+    json::Array below;
+    if (auto const found = children.find(node.id); found != children.end())
+        for (SettingsNode const* child : found->second)
+            below.append(branch(*child, children, service));
+    object.set("children", below);
+    return object;
+}
+
+bool isNodeOf(std::string const& user, std::string const& id) {
+    std::vector<std::string> const tokens = Cfg::Id(id, false).tokens();
+    return !tokens.empty() && tokens.front() == Cfg::Id::USER_PREFIX + user;
+}
+
+/// Who may use a node is a question of tokens, never of how the texts end.
+bool mayUse(std::vector<Cfg::CfgNodeId> const& nodesOfUser, std::string const& id) {
+    Cfg::CfgNodeId const asked{Cfg::Id(id, false)};
+    return std::ranges::any_of(
+        nodesOfUser, [&](Cfg::CfgNodeId const& own) { return asked == own || asked.isParentOf(own); });
+}
+
+} // namespace
+
+SettingsService::SettingsService(SettingsStore& store) : store_(store) {}
+
+json::Object SettingsService::tree() const {
+    std::vector<SettingsNode> const nodes = store_.nodes();
+    Children children;
+    for (SettingsNode const& node : nodes)
+        if (!node.id.empty())
+            children[parentNodeId(node.id)].push_back(&node);
+    // The root's text comes first in any order.
+    return branch(nodes.front(), children, service());
+}
+
+std::vector<SettingsService::UsableNode> SettingsService::usableNodes(std::string const& user) const {
+    std::vector<SettingsNode> const nodes = store_.nodes();
+    std::vector<Cfg::CfgNodeId> ofUser;
+    for (SettingsNode const& node : nodes)
+        if (!user.empty() && isNodeOf(user, node.id))
+            ofUser.emplace_back(Cfg::Id(node.id, false));
+    ServiceSettings const settings = service();
+    std::vector<UsableNode> usable;
+    for (SettingsNode const& node : nodes) {
+        bool const isUsable = user.empty() ? Cfg::Id::isParentIdStr(node.id) : mayUse(ofUser, node.id);
+        if (isUsable && !node.id.empty())
+            usable.push_back({node.id, node.description, settings.isDisabled(node.id)});
+    }
+    return usable;
+}
+
+json::Object SettingsService::effective(std::string const& id,
+                                        std::vector<std::string> const& wantedParts) const {
+    checkNodeId(id);
+    std::vector<SettingsLevel> const chain = store_.chain(id);
+    json::Array ids;
+    for (SettingsLevel const& level : chain)
+        ids.append(level.id);
+    return {{"id", id},
+            {"known", store_.contains(id)},
+            {"chain", ids},
+            {"parts", resolve(chain, wantedParts.empty() ? partNames() : wantedParts)}};
+}
+
+void SettingsService::setPart(std::string const& id, std::string const& part, json::Value const& sent) {
+    requireChangeable();
+    checkNodeId(id);
+    store_.setPart(id, part, ownForm(part, sent));
+}
+
+void SettingsService::update(std::string const& id, bool reset) {
+    requireChangeable();
+    checkNodeId(id);
+    // An id that is missing from a request reads as the root.
+    if (reset && id.empty())
+        throw Error("the root cannot be reset as a whole: set its parts to nothing one by one");
+    if (reset)
+        store_.clear(id);
+    else
+        store_.add(id);
+    resolve(store_.chain(id), partNames());
+}
+
+void SettingsService::remove(std::string const& id) {
+    requireChangeable();
+    checkNodeId(id);
+    store_.remove(id);
+}
+
+ServiceSettings SettingsService::service() const { return ServiceSettings(store_.serviceSettings()); }
+
+void SettingsService::changeService(json::Object const& changes) {
+    requireChangeable();
+    store_.setServiceSettings(service().withChanges(changes).stored());
+}
+
+void SettingsService::suspend(int bits) { store_.setServiceSettings(service().withSuspended(bits).stored()); }
+
+void SettingsService::requireChangeable() const {
+    if (service().isSuspended(Suspended::SettingsChanges))
+        throw Error("changes of settings are held back at the moment");
+}
+
+} // namespace VlServiced

@@ -1,0 +1,120 @@
+#include "programs/vlserviced/jobs/job_list.h"
+
+#include "programs/vlserviced/store/schema.h"
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using VlServiced::Job;
+using VlServiced::JobState;
+
+class JobList : public testing::Test {
+protected:
+    void add(std::string const& packId, long long acceptedAt) {
+        Job job;
+        job.pack = {"/srv/packs", "packs.db", packId};
+        job.cfgId = "a=acme";
+        job.title = "Bills";
+        job.documents = 1;
+        job.pages = 2;
+        job.acceptedAt = acceptedAt;
+        jobs_.accept(job);
+    }
+    json::Object list(std::string const& query, long long now = 0) {
+        return listJobs(parse(query), jobs_, settings_, "/var/outbox", now);
+    }
+    std::string ids(std::string const& query) {
+        std::string all;
+        for (json::Value const& job : list(query).get("jobs").toArray())
+            all += job.toObject().get("id").textOrEmpty() + " ";
+        return all;
+    }
+    json::Value keyOf(char const* packId, char const* key, long long now) {
+        return list(R"({"ids":[")" + std::string(packId) + "\"]}", now)
+            .get("jobs")
+            .toArray()
+            .at(0)
+            .toObject()
+            .get(key);
+    }
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{database_};
+    VlServiced::SettingsStore store_{database_};
+    VlServiced::SettingsService settings_{store_};
+};
+
+TEST_F(JobList, TellsEverythingOfAJob) {
+    add("p1", 100);
+    EXPECT_EQ(
+        print(list("{}")),
+        R"({"jobs":[{"id":"p1","state":"accepted","title":"Bills","cfg_id":"a=acme","db_host":"/srv/packs",)"
+        R"("db_name":"packs.db","documents":1,"pages":2,"accepted":100,"changed":100}]})");
+    jobs_.setProblem("p1", "the disk is full");
+    jobs_.wantUpload("", "");
+    EXPECT_EQ(keyOf("p1", "problem", 0), json::Value("the disk is full"));
+    EXPECT_TRUE(keyOf("p1", "to_upload", 0).isTrue());
+}
+
+TEST_F(JobList, IsNarrowedByDatabaseIdsAndNumber) {
+    add("p1", 1);
+    add("p2", 2);
+    add("p3", 3);
+    EXPECT_EQ(ids("{}"), "p1 p2 p3 ");
+    EXPECT_EQ(ids(R"({"limit":2})"), "p2 p3 ");
+    EXPECT_EQ(ids(R"({"ids":["p3","p1","p9"]})"), "p1 p3 ");
+    EXPECT_EQ(ids(R"({"db_host":"/srv/packs","db_name":"packs.db"})"), "p1 p2 p3 ");
+    EXPECT_EQ(ids(R"({"db_host":"/srv"})"), "");
+}
+
+TEST_F(JobList, NamesTheContainerWhereItLies) {
+    add("p1", 1);
+    EXPECT_FALSE(keyOf("p1", "container", 0));
+    jobs_.advance("p1", JobState::Accepted, JobState::Queued, 2);
+    EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/var/outbox/p1.mailing"));
+    jobs_.beginSubmitting("p1", "/srv/upload", 3);
+    EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/var/outbox/p1.mailing"));
+    jobs_.advance("p1", JobState::Submitting, JobState::Submitted, 4);
+    EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/srv/upload/p1.mailing"));
+    jobs_.advance("p1", JobState::Submitted, JobState::Lodged, 5);
+    EXPECT_FALSE(keyOf("p1", "container", 0));
+}
+
+TEST_F(JobList, RaisesAnAlarmByTheHoursOfTheNode) {
+    constexpr long long HOUR = 3600;
+    settings_.setPart("a=acme", "inet", parse(R"({"lodged_alarm_hours":24})"));
+    add("p1", 0);
+    EXPECT_FALSE(keyOf("p1", "alarm", 1000 * HOUR));
+    jobs_.advance("p1", JobState::Accepted, JobState::Submitted, 0);
+    EXPECT_FALSE(keyOf("p1", "alarm", 4 * HOUR - 1));
+    EXPECT_EQ(keyOf("p1", "alarm", 4 * HOUR),
+              json::Value("nobody has taken the container from the upload folder for 4 hours"));
+    jobs_.advance("p1", JobState::Submitted, JobState::Lodged, 0);
+    EXPECT_FALSE(keyOf("p1", "alarm", 24 * HOUR - 1));
+    EXPECT_EQ(keyOf("p1", "alarm", 30 * HOUR), json::Value("the carrier has not reported for 30 hours"));
+    settings_.setPart("a=acme", "inet", parse(R"({"lodged_alarm_hours":0})"));
+    EXPECT_FALSE(keyOf("p1", "alarm", 1000 * HOUR));
+}
+
+TEST_F(JobList, RefusesQueriesOfAWrongType) {
+    struct {
+        char const* query;
+        char const* message;
+    } const cases[] = {
+        {R"({"db_host":7})", R"("db_host" of a query for jobs has to be a text)"},
+        {R"({"db_name":null})", R"("db_name" of a query for jobs has to be a text)"},
+        {R"({"ids":"p1"})", R"("ids" of a query for jobs has to be an array of texts)"},
+        {R"({"ids":[1]})", R"("ids" of a query for jobs has to be an array of texts)"},
+        {R"({"limit":0})", R"("limit" of a query for jobs has to be an integer above 0)"},
+        {R"({"limit":"9"})", R"("limit" of a query for jobs has to be an integer above 0)"},
+    };
+    for (auto const& [query, message] : cases)
+        EXPECT_EQ(failureOf([this, &query = query] { list(query); }), message);
+}
+
+} // namespace

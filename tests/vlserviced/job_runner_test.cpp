@@ -1,0 +1,361 @@
+#include "programs/vlserviced/jobs/job_runner.h"
+
+#include "programs/vlserviced/jobs/hand_over.h"
+#include "programs/vlserviced/store/schema.h"
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+#include "tests/vlserviced/pack_help.h"
+
+#include <gtest/gtest.h>
+
+#include <deque>
+#include <fstream>
+#include <optional>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using VlServiced::JobRunner;
+using VlServiced::JobState;
+
+/// A runner whose worker does what it was given only when the test says so. Whatever was not done by then is
+/// lost when a new runner takes over, as it is with a process.
+class JobRunnerTest : public testing::Test {
+protected:
+    JobRunnerTest() {
+        fs::create_directory(outbox_);
+        fs::create_directory(upload_);
+        settings_ = parse(R"({"upload_folder":")" + upload_.string() + "\"}");
+        startRunner();
+    }
+
+    void startRunner() {
+        work_.clear();
+        runner_.emplace(
+            jobs_, VlServiced::JobSurroundings{
+                       [this](VlServiced::JobSurroundings::Work work) { work_.push_back(std::move(work)); },
+                       [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                       [this] { return now_; },
+                       [this] { return VlServiced::ServiceSettings(settings_); },
+                       outbox_,
+                   });
+    }
+    void doWork() {
+        for (; !work_.empty(); work_.pop_front())
+            work_.front()();
+    }
+    void accept(std::string const& packId) { runner_->accept({folder_.path().string(), "packs.db", packId}); }
+    void acceptStored(std::string const& packId) {
+        storePack(packs_, packId);
+        accept(packId);
+    }
+    std::string state(std::string const& packId) {
+        std::optional<VlServiced::Job> const job = jobs_.find(packId);
+        return !job ? "none" : stateName(job->state) + (job->problem.empty() ? "" : ": " + job->problem);
+    }
+    std::string acceptFailure(std::string const& folder, std::string const& database,
+                              std::string const& packId) {
+        return failureOf([&] { runner_->accept({folder, database, packId}); });
+    }
+    void run(char const* sql) { SQLite::Database(packs_, SQLite::OPEN_READWRITE).exec(sql); }
+    void setSettings(std::string const& text) { settings_ = parse(text); }
+
+    TemporaryFolder folder_;
+    fs::path packs_ = folder_ / "packs.db";
+    fs::path outbox_ = folder_ / "outbox";
+    fs::path upload_ = folder_ / "upload";
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{database_};
+    json::Object settings_;
+    std::deque<VlServiced::JobSurroundings::Work> work_;
+    long long now_ = 1000;
+    std::optional<JobRunner> runner_;
+};
+
+TEST_F(JobRunnerTest, PutsThePackOnRecordBeforeThePagesAreFetched) {
+    acceptStored("p1");
+    EXPECT_EQ(state("p1"), "accepted");
+    VlServiced::Job const job = jobs_.find("p1").value();
+    EXPECT_EQ(job.title, "Title of p1");
+    EXPECT_EQ(job.cfgId, "a=acme");
+    EXPECT_EQ(job.documents, 2);
+    EXPECT_EQ(job.pages, 3);
+    EXPECT_EQ(job.acceptedAt, 1000);
+    now_ = 1005;
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+    EXPECT_EQ(jobs_.find("p1")->changedAt, 1005);
+    EXPECT_EQ(contentOf(outbox_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, TakesAPackOnceHoweverOftenItIsSent) {
+    acceptStored("p1");
+    accept("p1");
+    EXPECT_EQ(work_.size(), 1u);
+    doWork();
+    accept("p1");
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+    runner_->upload("", "");
+    doWork();
+    accept("p1");
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    fs::remove(upload_ / "p1.mailing");
+    runner_->updateStatus("", "");
+    accept("p1");
+    doWork();
+    EXPECT_EQ(state("p1"), "lodged");
+    EXPECT_FALSE(fs::exists(upload_ / "p1.mailing"));
+}
+
+TEST_F(JobRunnerTest, FindsTheSameFolderUnderAnySpelling) {
+    acceptStored("p1");
+    std::string const folder = folder_.path().string();
+    EXPECT_EQ(acceptFailure(folder + "/", "packs.db", "p1"), "nothing was thrown");
+    EXPECT_EQ(acceptFailure(folder + "/x/..", "packs.db", "p1"), "nothing was thrown");
+    doWork();
+    runner_->upload(folder + "//", "packs.db");
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, RefusesPacksThatItCannotTake) {
+    storePack(packs_, "p1");
+    storePack(packs_, "wrong node", "acme");
+    storePack(packs_, "no pages");
+    storePack(packs_, "bad title");
+    storePack(packs_, "disabled", "u=eve/a=closed");
+    run("DELETE FROM pages WHERE pack = 'no pages'; UPDATE packs SET title = char(10) WHERE id = 'bad "
+        "title'");
+    setSettings(R"({"disabled":["a=closed"]})");
+    std::string const folder = folder_.path().string();
+    struct {
+        std::string folder;
+        std::string database;
+        std::string packId;
+        std::string message;
+    } const cases[] = {
+        {"db.example:5432", "packs", "p1",
+         "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a folder, "
+         "and "
+         "\"db.example:5432\" is none"},
+        {"", "packs.db", "p1",
+         "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a folder, "
+         "and "
+         "\"\" is none"},
+        {folder, "../packs.db", "p1",
+         "\"db_name\" has to be the name of a file, and \"../packs.db\" is none"},
+        {folder, "", "p1", "\"db_name\" has to be the name of a file, and \"\" is none"},
+        {folder, "packs.db", "../p1", "the pack id \"../p1\" cannot name a file"},
+        {folder, "packs.db", "", "the pack id \"\" cannot name a file"},
+        {folder, "other.db", "p1", "there is no pack database " + folder + "/other.db"},
+        {folder, "service.db", "p1", folder + "/service.db is not a pack database"},
+        {folder, "packs.db", "p2", "the pack database " + folder + "/packs.db has no finished pack p2"},
+        {folder, "packs.db", "wrong node",
+         "node id \"acme\" is not valid: wanted is a path like u=NAME/ou=GROUP/a=ACCOUNT, or the same "
+         "without its "
+         "front"},
+        {folder, "packs.db", "no pages", "pack no pages has no pages"},
+        {folder, "packs.db", "bad title",
+         "the title of pack bad title is not a line of text of at most 500 bytes"},
+        {folder, "packs.db", "disabled", "node u=eve/a=closed is disabled: pack disabled is not taken"},
+    };
+    for (auto const& [db, name, packId, message] : cases) {
+        EXPECT_EQ(acceptFailure(db, name, packId), message);
+        EXPECT_EQ(state(packId), "none");
+    }
+}
+
+TEST_F(JobRunnerTest, RefusesAnotherPackOfAnIdThatIsKnown) {
+    acceptStored("p1");
+    EXPECT_EQ(acceptFailure("/elsewhere", "packs.db", "p1"),
+              "there is another pack p1, from " + packs_.string());
+}
+
+TEST_F(JobRunnerTest, GivesUpAPackThatIsBad) {
+    acceptStored("p1");
+    run("UPDATE pages SET data = 'x' WHERE position = 0");
+    doWork();
+    EXPECT_EQ(state("p1"), "failed: page \"1\" of \"one.pdf\" is not a compressed page");
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
+              "pack p1 was given up: page \"1\" of \"one.pdf\" is not a compressed page");
+    runner_->resume();
+    EXPECT_TRUE(work_.empty());
+}
+
+TEST_F(JobRunnerTest, TriesAgainWhatMayPass) {
+    acceptStored("p1");
+    fs::remove(outbox_);
+    doWork();
+    EXPECT_EQ(state("p1"), "accepted: cannot write into " + outbox_.string() + ": No such file or directory");
+    fs::create_directory(outbox_);
+    runner_->updateStatus("/elsewhere", "");
+    EXPECT_TRUE(work_.empty());
+    runner_->updateStatus(folder_.path().string(), "packs.db");
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+TEST_F(JobRunnerTest, HandsOnWhatIsQueuedAndWhatWillBe) {
+    acceptStored("p1");
+    doWork();
+    acceptStored("p2");
+    storePack(folder_ / "other.db", "p3");
+    runner_->accept({folder_.path().string(), "other.db", "p3"});
+    runner_->upload(folder_.path().string(), "packs.db");
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_EQ(state("p2"), "submitted");
+    EXPECT_EQ(state("p3"), "queued");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+    EXPECT_EQ(contentOf(upload_ / "p2.mailing"), contentOfPack("p2"));
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_TRUE(fs::exists(outbox_ / "p3.mailing"));
+}
+
+TEST_F(JobRunnerTest, HandsNothingOnWithoutAFolder) {
+    setSettings("{}");
+    acceptStored("p1");
+    EXPECT_EQ(
+        failureOf([&] { runner_->upload("", ""); }),
+        "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
+}
+
+TEST_F(JobRunnerTest, KeepsAContainerWhoseFolderIsGoneUntilItIsBack) {
+    acceptStored("p1");
+    doWork();
+    fs::remove(upload_);
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"),
+              "queued: there is no upload folder " + upload_.string() + ": No such file or directory");
+    EXPECT_TRUE(fs::exists(outbox_ / "p1.mailing"));
+    fs::create_directory(upload_);
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, FollowsWhatTheCarrierDoes) {
+    for (char const* id : {"waits", "taken", "done", "returned", "at once"})
+        acceptStored(id);
+    runner_->upload("", "");
+    doWork();
+    for (char const* id : {"taken", "done", "returned"})
+        fs::remove(upload_ / (id + std::string(".mailing")));
+    runner_->updateStatus("", "");
+    for (char const* id : {"taken", "done", "returned"})
+        EXPECT_EQ(state(id), "lodged");
+    std::ofstream(upload_ / "done.mailing.status") << R"({"state":"delivered"})";
+    std::ofstream(upload_ / "at once.mailing.status") << R"({"state":"delivered"})";
+    std::ofstream(upload_ / "returned.mailing.status") << R"({"state":"failed","text":"no\nsuch street"})";
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("waits"), "submitted");
+    EXPECT_EQ(state("taken"), "lodged");
+    EXPECT_EQ(state("done"), "delivered");
+    EXPECT_EQ(state("at once"), "delivered");
+    EXPECT_EQ(state("returned"), "failed: the carrier: no such street");
+}
+
+TEST_F(JobRunnerTest, ConcludesNothingFromAFolderThatIsGone) {
+    acceptStored("p1");
+    runner_->upload("", "");
+    doWork();
+    fs::rename(upload_, folder_ / "unmounted");
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("p1"),
+              "submitted: there is no upload folder " + upload_.string() + ": No such file or directory");
+    fs::rename(folder_ / "unmounted", upload_);
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, HoldsJobsBackWhileItIsSuspended) {
+    settings_.set("suspended", 2);
+    acceptStored("p1");
+    EXPECT_TRUE(work_.empty());
+    EXPECT_EQ(state("p1"), "accepted");
+    settings_.set("suspended", 1);
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+// What a process that was killed leaves behind, step by step along the way of a job.
+
+TEST_F(JobRunnerTest, GoesOnBehindTheAcceptance) {
+    acceptStored("p1");
+    startRunner();
+    EXPECT_EQ(state("p1"), "accepted");
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(contentOf(outbox_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, GoesOnBehindAContainerThatIsNotOnRecord) {
+    acceptStored("p1");
+    doWork();
+    database_.exec("UPDATE jobs SET state = 'accepted'");
+    startRunner();
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+    EXPECT_EQ(contentOf(outbox_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, GoesOnBehindAnUploadThatWasOnlyWanted) {
+    acceptStored("p1");
+    doWork();
+    runner_->upload("", "");
+    startRunner();
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, GoesOnBehindAStagedContainer) {
+    acceptStored("p1");
+    doWork();
+    VlServiced::stage(outbox_ / "p1.mailing", upload_);
+    jobs_.beginSubmitting("p1", upload_.string(), now_);
+    startRunner();
+    runner_->resume();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+}
+
+TEST_F(JobRunnerTest, DoesNotSubmitAgainWhatWasPublishedAndTakenAlready) {
+    acceptStored("p1");
+    doWork();
+    VlServiced::stage(outbox_ / "p1.mailing", upload_);
+    jobs_.beginSubmitting("p1", upload_.string(), now_);
+    VlServiced::publish("p1.mailing", upload_);
+    fs::remove(upload_ / "p1.mailing");
+    startRunner();
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_TRUE(fs::is_empty(upload_));
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("p1"), "lodged");
+}
+
+TEST_F(JobRunnerTest, SubmitsIntoTheFolderThatItWasStagedIn) {
+    acceptStored("p1");
+    doWork();
+    VlServiced::stage(outbox_ / "p1.mailing", upload_);
+    jobs_.beginSubmitting("p1", upload_.string(), now_);
+    setSettings(R"({"upload_folder":"/elsewhere"})");
+    startRunner();
+    runner_->resume();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_TRUE(fs::exists(upload_ / "p1.mailing"));
+}
+
+} // namespace

@@ -1,0 +1,89 @@
+#include "programs/vlserviced/settings/service_settings.h"
+
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using VlServiced::ServiceSettings;
+using VlServiced::Suspended;
+
+ServiceSettings settings(std::string const& text) { return ServiceSettings(parse(text)); }
+
+TEST(ServiceSettings, AreEmptyAtFirst) {
+    ServiceSettings const empty = settings("{}");
+    EXPECT_EQ(empty.uploadFolder(), "");
+    EXPECT_FALSE(empty.isDisabled("a=acme"));
+    EXPECT_FALSE(empty.isSuspended(Suspended::Jobs));
+    EXPECT_EQ(failureOf([&] { empty.tariff(); }),
+              "the service has no tariff yet: set one with \"vlmail settings service tariff=FILE\"");
+}
+
+TEST(ServiceSettings, ReplaceTheKeysOfAChangeAlone) {
+    TemporaryFolder folder;
+    json::Object const change{{"upload_folder", folder.path().string()},
+                              {"tariff", parse(R"({"currency":"EUR"})")}};
+    ServiceSettings const changed = settings(R"({"disabled":["a=old"]})").withChanges(change);
+    EXPECT_EQ(changed.uploadFolder(), folder.path().string());
+    EXPECT_EQ(changed.tariff().currency, "EUR");
+    EXPECT_TRUE(changed.isDisabled("a=old"));
+    ServiceSettings const erased = changed.withChanges(parse(R"({"tariff":null,"disabled":[]})"));
+    EXPECT_FALSE(erased.stored().get("tariff"));
+    EXPECT_FALSE(erased.isDisabled("a=old"));
+    EXPECT_EQ(erased.uploadFolder(), folder.path().string());
+}
+
+TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
+    struct {
+        char const* change;
+        char const* message;
+    } const cases[] = {
+        {R"({"colour":"red"})",
+         R"(the service has no setting "colour"; there are upload_folder, tariff, disabled)"},
+        {R"({"suspended":1})",
+         R"(the service has no setting "suspended"; there are upload_folder, tariff, disabled)"},
+        {R"({"upload_folder":"relative"})",
+         R"("upload_folder" has to be the absolute path of a folder that is there)"},
+        {R"({"upload_folder":"/missing/folder"})",
+         R"("upload_folder" has to be the absolute path of a folder that is there)"},
+        {R"({"upload_folder":7})",
+         R"("upload_folder" has to be the absolute path of a folder that is there)"},
+        {R"({"tariff":7})", R"("tariff" has to be an object)"},
+        {R"({"tariff":{}})", R"("currency" of the tariff has to be three capital letters)"},
+        {R"({"disabled":"a=acme"})", R"("disabled" has to be an array of node ids)"},
+        {R"({"disabled":[7]})",
+         R"("disabled" has to be an array of node ids, and the root cannot be disabled)"},
+        {R"({"disabled":[""]})",
+         R"("disabled" has to be an array of node ids, and the root cannot be disabled)"},
+        {R"({"disabled":["acme"]})", "node id \"acme\" is not valid: wanted is a path like "
+                                     "u=NAME/ou=GROUP/a=ACCOUNT, or the same without its front"},
+    };
+    for (auto const& [change, message] : cases)
+        EXPECT_EQ(failureOf([&change = change] { settings("{}").withChanges(parse(change)); }), message);
+}
+
+TEST(ServiceSettings, DisableANodeWithAllBelowIt) {
+    ServiceSettings const some = settings(R"({"disabled":["ou=sales/a=acme","a=x/"]})");
+    EXPECT_TRUE(some.isDisabled("ou=sales/a=acme"));
+    EXPECT_TRUE(some.isDisabled("u=bob/ou=sales/a=acme"));
+    EXPECT_FALSE(some.isDisabled("a=acme"));
+    EXPECT_FALSE(some.isDisabled("u=bob/a=acme"));
+    EXPECT_FALSE(some.isDisabled("ou=presales/a=acme"));
+    EXPECT_FALSE(some.isDisabled(""));
+}
+
+TEST(ServiceSettings, AreSuspendedByBits) {
+    EXPECT_TRUE(settings("{}").withSuspended(1).isSuspended(Suspended::SettingsChanges));
+    EXPECT_FALSE(settings("{}").withSuspended(1).isSuspended(Suspended::Jobs));
+    EXPECT_TRUE(settings("{}").withSuspended(3).isSuspended(Suspended::Jobs));
+    EXPECT_FALSE(settings("{}").withSuspended(3).withSuspended(0).isSuspended(Suspended::Jobs));
+    for (int const bits : {4, -1, 7})
+        EXPECT_EQ(failureOf([&] { settings("{}").withSuspended(bits); }),
+                  "the service cannot be suspended by the number " + std::to_string(bits) +
+                      ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
+}
+
+} // namespace

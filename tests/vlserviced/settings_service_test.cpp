@@ -1,0 +1,136 @@
+#include "programs/vlserviced/settings/settings_service.h"
+
+#include "programs/vlserviced/store/schema.h"
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using VlServiced::SettingsService;
+
+class SettingsServiceTest : public testing::Test {
+protected:
+    std::vector<std::string> usable(std::string const& user) {
+        std::vector<std::string> ids;
+        for (auto const& [id, description, disabled] : service_.usableNodes(user))
+            ids.push_back(id + (disabled ? " (disabled)" : ""));
+        return ids;
+    }
+    void add(std::initializer_list<char const*> ids) {
+        for (char const* id : ids)
+            service_.update(id, false);
+    }
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{database_};
+    SettingsService service_{store_};
+};
+
+TEST_F(SettingsServiceTest, ShowsTheTreeFromTheRoot) {
+    EXPECT_EQ(print(service_.tree()), R"({"id":"","descr":"","parts":[],"children":[]})");
+    service_.setPart("a=acme", "app", parse(R"({"descr":"Acme Ltd"})"));
+    add({"u=bob/a=acme", "u=eve/"});
+    service_.changeService(parse(R"({"disabled":["u=bob/a=acme"]})"));
+    EXPECT_EQ(print(service_.tree()),
+              R"({"id":"","descr":"","parts":[],"children":[)"
+              R"({"id":"a=acme","descr":"Acme Ltd","parts":["app"],"children":[)"
+              R"({"id":"u=bob/a=acme","descr":"","disabled":true,"parts":[],"children":[]}]},)"
+              R"({"id":"u=eve/","descr":"","parts":[],"children":[]}]})");
+}
+
+TEST_F(SettingsServiceTest, AUserMayUseHisNodesAndThoseAboveThem) {
+    add({"u=bob/ou=sales/a=acme", "u=bobby/ou=sales/a=acme", "ou=board/a=acme", "u=bob/a=other", "u=bob/"});
+    EXPECT_THAT(usable("bob"), ElementsAre("a=acme", "a=other", "ou=sales/a=acme", "u=bob/", "u=bob/a=other",
+                                           "u=bob/ou=sales/a=acme"));
+    EXPECT_THAT(usable("bobby"), ElementsAre("a=acme", "ou=sales/a=acme", "u=bobby/ou=sales/a=acme"));
+    EXPECT_THAT(usable("nobody"), IsEmpty());
+    EXPECT_THAT(usable("bob/ou=sales"), IsEmpty());
+}
+
+TEST_F(SettingsServiceTest, WithoutAUserAllNodesButThoseOfUsersMayBeUsed) {
+    add({"u=bob/ou=sales/a=acme"});
+    service_.changeService(parse(R"({"disabled":["ou=sales/a=acme"]})"));
+    EXPECT_THAT(usable(""), ElementsAre("a=acme", "ou=sales/a=acme (disabled)"));
+}
+
+TEST_F(SettingsServiceTest, TheEffectiveSettingsHaveChainValuesAndOrigins) {
+    service_.setPart("", "po", parse(R"({"code":"R"})"));
+    service_.setPart("u=bob/a=acme", "po", parse(R"({"expiry":5})"));
+    EXPECT_EQ(print(service_.effective("u=bob/a=acme", {"po"})),
+              R"({"id":"u=bob/a=acme","known":true,"chain":["u=bob/a=acme","a=acme",""],"parts":{"po":{)"
+              R"("own":{"expiry":5},"values":{"code":"R","expiry":5},)"
+              R"("origins":{"code":"","expiry":"u=bob/a=acme"}}}})");
+    json::Object const unknown = service_.effective("u=eve/a=acme", {"po"});
+    EXPECT_FALSE(unknown.get("known").isTrue());
+    EXPECT_EQ(print(unknown.get("parts").toObject().get("po").toObject().get("values")),
+              R"({"code":"R","expiry":0})");
+    EXPECT_EQ(service_.effective("", {}).get("parts").toObject().size(), 6u);
+}
+
+TEST_F(SettingsServiceTest, APartThatIsSetToNothingIsInheritedAgain) {
+    service_.setPart("a=acme", "po", parse(R"({"code":"A"})"));
+    service_.setPart("a=acme", "po", json::Value());
+    EXPECT_EQ(print(store_.parts("a=acme")), "{}");
+    service_.setPart("a=acme", "po", parse(R"({"code":"A"})"));
+    service_.setPart("a=acme", "po", parse(R"({"code":{"inh":true,"v":"A"}})"));
+    EXPECT_EQ(print(store_.parts("a=acme")), "{}");
+}
+
+TEST_F(SettingsServiceTest, AnUpdateAddsTheNodeAndAResetErasesItsValues) {
+    service_.setPart("a=acme", "po", parse(R"({"code":"A"})"));
+    service_.update("a=acme", false);
+    EXPECT_EQ(print(store_.parts("a=acme")), R"({"po":{"code":"A"}})");
+    service_.update("a=acme", true);
+    EXPECT_EQ(print(store_.parts("a=acme")), "{}");
+    EXPECT_TRUE(store_.contains("a=acme"));
+    service_.update("a=new", true);
+    EXPECT_TRUE(store_.contains("a=new"));
+}
+
+TEST_F(SettingsServiceTest, AnUpdateTellsOfSettingsThatCannotBeRead) {
+    store_.setPart("a=acme", "po", parse(R"({"code":7})"));
+    EXPECT_EQ(failureOf([&] { service_.update("u=bob/a=acme", false); }),
+              R"(the settings "po" of node a=acme cannot be read: )"
+              "JSON error: Wrong type: integer. Expected type: string");
+}
+
+TEST_F(SettingsServiceTest, TheRootIsNeitherResetNorRemoved) {
+    service_.setPart("", "po", parse(R"({"code":"R"})"));
+    EXPECT_EQ(failureOf([&] { service_.update("", true); }),
+              "the root cannot be reset as a whole: set its parts to nothing one by one");
+    EXPECT_EQ(failureOf([&] { service_.remove(""); }), "the root cannot be removed");
+    EXPECT_EQ(print(store_.parts("")), R"({"po":{"code":"R"}})");
+}
+
+TEST_F(SettingsServiceTest, IdsThatAreNotWellFormedReachNothing) {
+    std::string const slashes(50000, '/');
+    for (std::string const& id : {std::string("acme"), slashes}) {
+        EXPECT_TRUE(failureOf([&] { service_.setPart(id, "po", {}); }).starts_with("node id \""));
+        EXPECT_TRUE(failureOf([&] { service_.update(id, false); }).starts_with("node id \""));
+        EXPECT_TRUE(failureOf([&] { service_.remove(id); }).starts_with("node id \""));
+        EXPECT_TRUE(failureOf([&] { service_.effective(id, {}); }).starts_with("node id \""));
+    }
+    EXPECT_EQ(store_.nodes().size(), 1u);
+}
+
+TEST_F(SettingsServiceTest, NothingIsChangedWhileChangesAreHeldBack) {
+    add({"a=acme"});
+    service_.suspend(1);
+    std::string const held = "changes of settings are held back at the moment";
+    EXPECT_EQ(failureOf([&] { service_.setPart("a=acme", "po", {}); }), held);
+    EXPECT_EQ(failureOf([&] { service_.update("a=acme", true); }), held);
+    EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), held);
+    EXPECT_EQ(failureOf([&] { service_.changeService({}); }), held);
+    EXPECT_EQ(failureOf([&] { service_.effective("a=acme", {}); }), "nothing was thrown");
+    service_.suspend(0);
+    EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), "nothing was thrown");
+}
+
+} // namespace
