@@ -20,13 +20,18 @@ SettingsLevel level(std::string const& id, std::string const& parts) {
 std::vector<SettingsLevel> fiveLevels() {
     return {
         level("u=bob/ou=north/ou=sales/a=acme",
-              R"({"app":{"descr":"Bob","debug_view":1},"profiles":{"vals":[{"name":"Bob's"}]}})"),
+              R"({"app":{"descr":"Bob","debug_view":1},"profiles":{"vals":[{"name":"Bob's"}]},)"
+              R"("presets":{"extract_presets":[{"match":"offer.*","order":5,"pack_preset":"colour"}]}})"),
         level("ou=north/ou=sales/a=acme", R"({"po":{"code":"N-7","expiry":1900000000}})"),
         level("ou=sales/a=acme",
               R"({"app":{"max_letter_sheets":20,"enforce_po":true},)"
               R"("profiles":{"vals":[{"name":"Offer"},{"name":"Bill","descrip":"with a copy"}]}})"),
         level("a=acme", R"({"deps":{"vals":["Sales","Board",{"name":"IT","descrip":"computers"}]},)"
-                        R"("inet":{"submitted_alarm_hours":8}})"),
+                        R"("inet":{"submitted_alarm_hours":8},)"
+                        R"("presets":{"extract_presets":[{"match":"bill.*","order":1,"pack_preset":"plain"},)"
+                        R"({"match":"reminder.*","order":2,"pack_preset":"plain"}],)"
+                        R"("pack_presets":[{"name":"plain","duplex":true,"process_mode":3},)"
+                        R"({"name":"colour","colour_model":2,"process_mode":1}]}})"),
         level("",
               R"({"app":{"db_name":"packs.db","db_host":"/srv/packs"},"inet":{"status_update_hours":1}})"),
     };

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/store/data_folder.h"
 
+#include "tests/failure_of.h"
 #include "tests/temporary_folder.h"
-#include "tests/vlserviced/failure_of.h"
 
 #include <gtest/gtest.h>
 

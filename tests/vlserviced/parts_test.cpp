@@ -1,29 +1,18 @@
 #include "programs/vlserviced/settings/parts.h"
 
-#include "tests/vlserviced/failure_of.h"
+#include "tests/failure_of.h"
+#include "tests/vlserviced/json_help.h"
 #include "vlservice/cfg/app.h"
-#include "vlservice/cfg/departments.h"
-#include "vlservice/cfg/profiles.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/presets/presets.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <sstream>
 
 namespace {
 
 using VlServiced::ownForm;
 using VlServiced::resolve;
 using VlServiced::SettingsLevel;
-
-json::Object parse(std::string const& text) { return json::strToObject(text.data(), text.size()); }
-
-std::string print(json::Value const& value) {
-    std::ostringstream text;
-    text << value;
-    return text.str();
-}
 
 SettingsLevel level(std::string const& id, std::string const& parts) { return {id, parse(parts)}; }
 
@@ -156,6 +145,47 @@ TEST(Resolving, TakesAListThatIsOneValueAsAWhole) {
     EXPECT_EQ(
         print(valueOf(resolved({level("a=acme", R"({"deps":{"vals":[]}})"), chain.back()}, "deps"), "vals")),
         "[]");
+}
+
+TEST(Resolving, TestsTheNearestNodesPresetsFirstAndTheCatchAllLast) {
+    std::vector<SettingsLevel> const chain{
+        level("u=bob/a=acme",
+              R"({"presets":{"extract_presets":[{"match":"b2.*","order":9},{"match":"b1.*","order":3}],)"
+              R"("pack_presets":[{"name":"bob"}]}})"),
+        level("a=acme", R"({"presets":{"extract_presets":[{"match":"a.*","order":1}]}})"),
+        level("", R"({"presets":{"pack_presets":[{"name":"root"}]}})"),
+    };
+    json::Object const presets = resolved(chain, "presets");
+    Cfg::Presets const read(presets.get("values"), false, false);
+    std::vector<std::string> patterns;
+    for (auto const& element : read.elements<Cfg::PresetFieldIdxs::ExtractPresets>())
+        patterns.push_back(element.value.strRegex());
+    EXPECT_EQ(patterns, (std::vector<std::string>{"b1.*", "b2.*", "a.*", ".*"}));
+    EXPECT_EQ(originOf(presets, "extract_presets"), R"(["u=bob/a=acme","u=bob/a=acme","a=acme",null])");
+    EXPECT_EQ(originOf(presets, "pack_presets"), R"(["u=bob/a=acme","",null])");
+    EXPECT_EQ(read.findMatch("xyz").second.name(), "GLOBAL");
+}
+
+TEST(OwnForm, DropsPresetsThatBearAnEraseMark) {
+    EXPECT_EQ(print(ownForm("presets", parse(R"({"pack_presets":[{"name":"a","erase_me":true},{"name":"b"},)"
+                                             R"({"name":"c","erase_me":true}]})"))),
+              R"({"pack_presets":[{"name":"b"}]})");
+    EXPECT_FALSE(ownForm("presets", parse(R"({"extract_presets":[{"match":"x","erase_me":true}]})")));
+}
+
+TEST(OwnForm, RefusesAPresetWhoseExpressionCannotBeCompiled) {
+    std::string const text =
+        failureOf([] { ownForm("presets", parse(R"({"extract_presets":[{"match":"bill("}]})")); });
+    EXPECT_TRUE(text.starts_with("the expression bill( cannot be used: ")) << text;
+    EXPECT_EQ(failureOf([] {
+                  ownForm("presets", parse(R"({"extract_presets":[{"match":"bill(","erase_me":true}]})"));
+              }),
+              "nothing was thrown");
+}
+
+TEST(OwnForm, OfTheRootsPresetsLeavesTheBuiltInOnesOut) {
+    Cfg::Presets const global(json::Value(), true, false);
+    EXPECT_EQ(print(ownForm("presets", global.serialize())), "#absent#");
 }
 
 TEST(Resolving, NamesNodeAndPartThatCannotBeRead) {

@@ -1,0 +1,51 @@
+#pragma once
+// Carries out the commands that clients send.
+
+#include "programs/vlserviced/jobs/job_runner.h"
+#include "programs/vlserviced/settings/settings_service.h"
+#include "vlservice/ipc/cmd_processor_vlsvc.h"
+#include "vlservice/ipc/set_part_base.h"
+
+#include <filesystem>
+#include <functional>
+
+namespace VlServiced {
+
+/// A command is done when its visit returns. What fails is told in the command's own response where that has
+/// room for it, as one line under "err"; otherwise the visit throws Error.
+class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI {
+public:
+    /// All have to outlive the processor.
+    Processor(SettingsService& settings, JobStore& jobs, JobRunner& runner, std::filesystem::path outbox,
+              std::function<long long()> now);
+
+    void submit(std::shared_ptr<Ipc::CmdI> cmd) override;
+
+    void visit(Ipc::CSConfigSrvChange& cmd) override;
+    void visit(Ipc::CSConfigIdsList& cmd) override;
+    void visit(Ipc::GuiFwd& cmd) override;
+    void visit(Ipc::SetSvcCfg& cmd) override;
+    void visit(Ipc::GetSvcCfg& cmd) override;
+    void visit(Ipc::ProcessPack& cmd) override;
+    void visit(Ipc::PriceEst& cmd) override;
+    void visit(Ipc::UpdateCfg& cmd) override;
+    void visit(Ipc::UpdateStatus& cmd) override;
+    void visit(Ipc::UploadQueued& cmd) override;
+    void visit(Ipc::CfgIdsTree& cmd) override;
+    void visit(Ipc::CfgIdsForUser& cmd) override;
+    void visit(Ipc::RemoveCfgNode& cmd) override;
+    void visit(Ipc::SetPartBase& cmd) override;
+
+private:
+    json::Object answer(json::Object const& query) const;
+    json::Object settingsOf(json::Object const& query) const;
+    json::Object serviceOverview() const;
+
+    SettingsService& settings_;
+    JobStore& jobs_;
+    JobRunner& runner_;
+    std::filesystem::path outbox_;
+    std::function<long long()> now_;
+};
+
+} // namespace VlServiced
