@@ -40,6 +40,9 @@ constexpr double MIN_LINE_DISTANCE = 0.3;
 /// From this ratio on, two sizes are different: an address and the sender's small line above it.
 constexpr double OTHER_SIZE = 1.2;
 
+/// What whole numbers of 1/100 mm may take from a gap.
+constexpr int ROUNDING = 1;
+
 /// Larger fonts count as this large when a search is bounded, in 1/100 mm.
 constexpr int LARGE_SIZE = 5000;
 /// Candidates looked at for a word or a line, so that no page costs more than in proportion to its words.
@@ -188,7 +191,7 @@ private:
         double const gap = placed.frame.start - line.words.back().frame.end;
         if (gap < -MAX_OVERPRINT * size)
             return isCopy(last, next, line.words.back().frame, placed.frame);
-        return gap <= size * std::max(limits[last.font], limits[next.font]);
+        return gap <= size * std::max(limits[last.font], limits[next.font]) + ROUNDING;
     }
 
     /// Lines whose bottom edges are near each other.
@@ -216,13 +219,6 @@ private:
     std::vector<OpenLine> lines_;
     std::unordered_map<int, Cell> cells_;
 };
-
-std::size_t countFonts(Page const& page) {
-    std::size_t count = 0;
-    for (Word const& word : page.words)
-        count = std::max<std::size_t>(count, word.font + 1U);
-    return count;
-}
 
 /// What tells how wide a font's blank is, in font sizes.
 struct FontSample {
@@ -304,7 +300,7 @@ Line closed(Page const& page, OpenLine const& open, Turn turn, double minWordGap
 
 std::vector<Line> findLines(Page const& page, LayoutRules const& rules) {
     // The first search knows no fonts: it is there to learn how wide their blanks are.
-    std::vector<FontSample> samples(countFonts(page));
+    std::vector<FontSample> samples(page.fonts.size());
     sampleWords(page, samples);
     std::vector<LineFinder> finders;
     for (Turn turn : TURNS) {
@@ -312,8 +308,10 @@ std::vector<Line> findLines(Page const& page, LayoutRules const& rules) {
         sampleGaps(page, finders.back().find(GapLimits(samples.size(), MAX_BLANK_SAMPLE)), samples);
     }
     GapLimits limits;
-    for (FontSample& sample : samples)
-        limits.push_back(sample.blank() * rules.maxSpaces);
+    for (std::size_t font = 0; font < samples.size(); ++font) {
+        double const known = page.fonts[font].blank;
+        limits.push_back(rules.maxSpaces * (known > 0 ? known : samples[font].blank()));
+    }
     double const minWordGap = MIN_WORD_GAP * (1 + rules.spaceAdjustPerc / 100.0);
 
     std::vector<Line> lines;

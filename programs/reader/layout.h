@@ -55,7 +55,8 @@ struct Layout {
     Block const* nearestBlock(Point point) const;
 };
 
-/// Costs n log n in the number of words. The same words in another order give the same layout.
+/// Every word's font must be one of the page's. Costs n log n in the number of words. The same words in
+/// another order give the same layout.
 Layout layOut(Page const& page, LayoutRules const& rules = {});
 
 /// The words of a line, joined by one blank each.

@@ -22,6 +22,12 @@ struct Word {
     bool blankBehind = true;
 };
 
+struct Font {
+    std::string name;
+    /// Width of a blank in font sizes; 0 where it is not known.
+    double blank = 0;
+};
+
 struct Page {
     /// From 1.
     int number = 0;
@@ -30,7 +36,7 @@ struct Page {
     int height = 0;
     /// In no order that anything may depend on.
     std::vector<Word> words;
-    std::vector<std::string> fonts;
+    std::vector<Font> fonts;
 };
 
 } // namespace Reader

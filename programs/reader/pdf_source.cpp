@@ -70,23 +70,24 @@ std::string textOf(poppler::text_box const& box) {
 /// Numbers the fonts of a page.
 class FontNumbers {
 public:
-    explicit FontNumbers(std::vector<std::string>& names) : names_(names) {}
+    explicit FontNumbers(std::vector<Font>& fonts) : fonts_(fonts) {}
 
     std::uint16_t of(std::string const& name) {
-        auto const known = std::find(names_.begin(), names_.end(), name);
-        if (known != names_.end())
-            return static_cast<std::uint16_t>(known - names_.begin());
-        if (names_.size() == MAX_FONTS)
+        auto const known =
+            std::find_if(fonts_.begin(), fonts_.end(), [&](Font const& font) { return font.name == name; });
+        if (known != fonts_.end())
+            return static_cast<std::uint16_t>(known - fonts_.begin());
+        if (fonts_.size() == MAX_FONTS)
             return MAX_FONTS - 1;
-        names_.push_back(name);
-        return static_cast<std::uint16_t>(names_.size() - 1);
+        fonts_.push_back({name});
+        return static_cast<std::uint16_t>(fonts_.size() - 1);
     }
 
 private:
     /// Pages with more fonts are none that blanks could be measured on.
     static constexpr std::uint16_t MAX_FONTS = 256;
 
-    std::vector<std::string>& names_;
+    std::vector<Font>& fonts_;
 };
 
 std::optional<Word> wordOf(poppler::text_box const& box, FontNumbers& fonts) {

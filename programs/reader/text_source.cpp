@@ -110,11 +110,12 @@ private:
     }
 
     void newPage() {
-        pages_.push_back({static_cast<int>(pages_.size()) + 1,
-                          TypedPage::WIDTH,
-                          TypedPage::HEIGHT,
-                          {},
-                          {TypedPage::FONT}});
+        Page page;
+        page.number = static_cast<int>(pages_.size()) + 1;
+        page.width = TypedPage::WIDTH;
+        page.height = TypedPage::HEIGHT;
+        page.fonts = {{TypedPage::FONT, TypedPage::COLUMN / TypedPage::SIZE}};
+        pages_.push_back(std::move(page));
         row_ = 0;
         column_ = 0;
     }

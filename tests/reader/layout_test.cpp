@@ -274,7 +274,7 @@ TEST(HostilePages, DoNotCostTheSquareOfTheirWords) {
         },
     };
     for (Place place : places) {
-        Page page{1, 21000, 29700, {}, {"Serif"}};
+        Page page{1, 21000, 29700, {}, {{"Serif"}}};
         for (int i = 0; i < WORDS; ++i)
             page.words.push_back({std::to_string(i), place(i), 1 + i % 5000, 0, Turn::Upright, false});
         EXPECT_THAT(layOut(page).lines, testing::Not(IsEmpty()));

@@ -15,7 +15,7 @@ public:
     static constexpr int SIZE = 400;
     static constexpr int LETTER = SIZE / 2;
 
-    Typesetter() { page.fonts = {"Serif", "Mono"}; }
+    Typesetter() { page.fonts = {{"Serif"}}; }
 
     /// The words of `text` from there on, `gap` apart; gives the right edge.
     int line(int left, int base, std::string const& text, int size = SIZE, int gap = 100) {

@@ -1,0 +1,296 @@
+#include "programs/reader/letters.h"
+
+#include "tests/support/json_literal.h"
+#include "vlservice/platform/log.h"
+
+#include <gmock/gmock.h>
+
+namespace Reader {
+namespace {
+
+using VLServiceTest::operator""_json;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::Pair;
+using testing::SizeIs;
+using VLServiceTest::text;
+
+/// A preset with one zone over the whole page.
+Cfg::ExtractPreset presetWith(char const* fields) {
+    std::string const all = R"({"match": ".*", "zones": [{"name": "All",
+        "location": {"right": 100000, "bottom": 100000}, "fields": )" +
+                            std::string(fields) + "}]}";
+    return Cfg::ExtractPreset(json::strToObject(all.data(), all.size()));
+}
+
+std::vector<Letter> lettersOf(std::string const& document, Cfg::ExtractPreset const& preset,
+                              Trace* trace = nullptr) {
+    Document opened = openDocument(document, "a.txt");
+    return readLetters(opened, preset, trace);
+}
+
+/// Names and values of the fields of a letter, in their order.
+std::vector<std::pair<std::string, std::string>> valuesOf(Letter const& letter) {
+    std::vector<std::pair<std::string, std::string>> values;
+    for (auto const& [priority, field] : letter.fields)
+        values.emplace_back(field.name(), text(field.rawValue()));
+    return values;
+}
+
+std::vector<std::vector<int>> pagesOf(std::vector<Letter> const& letters) {
+    std::vector<std::vector<int>> pages;
+    for (Letter const& letter : letters)
+        pages.push_back(letter.pages);
+    return pages;
+}
+
+constexpr char const* REF_MARKS = R"([{"name": "ref", "mark": 1, "value_extract": "^Ref: (?<VAL>.*)$"}])";
+
+TEST(Letters, WithoutAMarkTheDocumentIsOne) {
+    auto const letters =
+        lettersOf("Ref: a\fRef: b", presetWith(R"([{"name": "ref", "value_extract": "^Ref: (?<VAL>.*)$"}])"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2)));
+    EXPECT_THAT(valuesOf(letters[0]), ElementsAre(Pair("ref", "\"a\"")));
+}
+
+TEST(Letters, BeginWhereAMarkedFieldIsFound) {
+    auto const letters = lettersOf("Ref: a\fmore\fRef: b\fRef: c\fmore", presetWith(REF_MARKS));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2), ElementsAre(3), ElementsAre(4, 5)));
+    EXPECT_THAT(valuesOf(letters[1]), ElementsAre(Pair("ref", "\"b\"")));
+}
+
+TEST(Letters, EveryMarkButTheSingleLetterOneSeparates) {
+    for (int mark : {1, 3, -1, 17}) {
+        std::string const fields = R"([{"name": "ref", "mark": )" + std::to_string(mark) +
+                                   R"(, "value_extract": "^Ref: (?<VAL>.*)$"}])";
+        EXPECT_THAT(lettersOf("Ref: a\fRef: b", presetWith(fields.c_str())), SizeIs(2)) << mark;
+    }
+}
+
+TEST(Letters, PagesInFrontOfTheFirstMarkAreOneToo) {
+    auto const letters = lettersOf("cover\fcover\fRef: b", presetWith(REF_MARKS));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2), ElementsAre(3)));
+    EXPECT_THAT(letters[0].missing, ElementsAre("ref"));
+    EXPECT_THAT(letters[1].missing, IsEmpty());
+}
+
+TEST(Letters, AFieldMarkedAsSingleLetterKeepsTheDocumentWhole) {
+    auto const letters = lettersOf("Ref: a\fRef: b", presetWith(R"([
+        {"name": "ref", "mark": 1, "value_extract": "^Ref: (?<VAL>.*)$"},
+        {"name": "Single", "mark": 2, "default_value": 0}])"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2)));
+    EXPECT_THAT(valuesOf(letters[0]), ElementsAre(Pair("ref", "\"a\""), Pair("Single", "0")));
+}
+
+TEST(Letters, ADefaultValueBeginsNone) {
+    auto const letters = lettersOf("Ref: a\fmore", presetWith(R"([{"name": "ref", "mark": 1,
+        "value_extract": "^Ref: (?<VAL>.*)$", "default_value": "none"}])"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2)));
+}
+
+TEST(Letters, AnInvalidValueBeginsOneAllTheSame) {
+    auto const letters = lettersOf("No 1\fNo x", presetWith(R"([{"name": "no", "mark": 1, "value_type": 1,
+        "value_extract": "^No (?<VAL>.*)$"}])"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1), ElementsAre(2)));
+    EXPECT_EQ(letters[1].fields.begin()->second.valueType(), Cfg::ExtractedField::ValueType::Invalid);
+}
+
+TEST(Letters, FurtherPagesYieldNothing) {
+    auto const letters = lettersOf("Herrn\fTotal 5", presetWith(R"([{"name": "total", "obligatory": true,
+        "value_extract": "^Total (?<VAL>.*)$"}])"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2)));
+    EXPECT_THAT(valuesOf(letters[0]), IsEmpty());
+    EXPECT_THAT(letters[0].missing, ElementsAre("total"));
+}
+
+TEST(Letters, ACoverSheetThatIsSkippedBelongsToNone) {
+    Cfg::ExtractPreset preset = presetWith(REF_MARKS);
+    preset.setSkipFirstPage(true);
+    EXPECT_THAT(pagesOf(lettersOf("Ref: a\fRef: b\fmore", preset)), ElementsAre(ElementsAre(2, 3)));
+    EXPECT_THAT(lettersOf("Ref: a", preset), IsEmpty());
+}
+
+TEST(Letters, WithoutZonesHaveNoFields) {
+    auto const letters = lettersOf("a\fb", Cfg::ExtractPreset());
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2)));
+    EXPECT_THAT(valuesOf(letters[0]), IsEmpty());
+}
+
+constexpr char const* EMAIL_AND_ADDRESS = R"([
+    {"name": "email", "priority": 2, "value_extract": "^(?i:email):+\\h*(?<VAL>.*)$"},
+    {"name": "postal", "priority": 1, "width": 14000,
+     "value_extract": "\\A(?<VAL>(.{1,72}\\n){0,8}.{1,72})\\Z"}])";
+
+TEST(Fields, TakeTheirLinesOutOfTheZone) {
+    for (char const* document :
+         {"Email: a@b.example\nLena Brandt\nWhitstable", "Lena Brandt\nEmail: a@b.example\nWhitstable",
+          "Lena Brandt\nWhitstable\nEmail: a@b.example"})
+        EXPECT_THAT(
+            valuesOf(lettersOf(document, presetWith(EMAIL_AND_ADDRESS)).at(0)),
+            ElementsAre(Pair("email", "\"a@b.example\""), Pair("postal", "\"Lena Brandt\nWhitstable\"")))
+            << document;
+}
+
+TEST(Fields, TakeTheWholeLineWhereTheyMatchPartOfIt) {
+    auto const letters = lettersOf("write to a@b.example\nLena Brandt\nWhitstable", presetWith(R"([
+        {"name": "email", "value_extract": "(?<VAL>\\S+@\\S+)$"},
+        {"name": "rest", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}])"));
+    EXPECT_THAT(valuesOf(letters.at(0)),
+                ElementsAre(Pair("email", "\"a@b.example\""), Pair("rest", "\"Lena Brandt\nWhitstable\"")));
+}
+
+TEST(Fields, ThatAreTooWideLeaveTheTextAlone) {
+    // 15 columns of 2.1167 mm.
+    char const* const fields = R"([
+        {"name": "narrow", "width": 3174, "value_extract": "^(?<VAL>.*)$"},
+        {"name": "just", "width": 3175, "value_extract": "^(?<VAL>.*)$"}])";
+    EXPECT_THAT(valuesOf(lettersOf("3 Orchard Close", presetWith(fields)).at(0)),
+                ElementsAre(Pair("just", "\"3 Orchard Close\"")));
+}
+
+TEST(Fields, AreAsWideAsTheirWidestLine) {
+    std::string const wide(67, 'x');
+    EXPECT_THAT(valuesOf(lettersOf("Lena\n" + wide + "\nLeeds", presetWith(EMAIL_AND_ADDRESS)).at(0)),
+                IsEmpty());
+    EXPECT_THAT(
+        valuesOf(lettersOf("Lena\n" + wide.substr(1) + "\nLeeds", presetWith(EMAIL_AND_ADDRESS)).at(0)),
+        SizeIs(1));
+}
+
+TEST(Fields, OfOneNameYieldOneValue) {
+    auto const letters = lettersOf("Tel 1\nPhone 2", presetWith(R"([
+        {"name": "phone", "value_extract": "^Fon (?<VAL>.*)$", "default_value": "none"},
+        {"name": "phone", "value_extract": "^Tel (?<VAL>.*)$"},
+        {"name": "phone", "value_extract": "^Phone (?<VAL>.*)$"}])"));
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("phone", "\"1\"")));
+}
+
+TEST(Fields, ThatAreObligatoryAndNotThereAreNamed) {
+    auto const letters = lettersOf("x", presetWith(R"([
+        {"name": "a", "obligatory": true, "value_extract": "^A(?<VAL>.*)$"},
+        {"name": "b", "obligatory": true, "value_extract": "^B(?<VAL>.*)$", "default_value": "1"},
+        {"name": "c", "value_extract": "^C(?<VAL>.*)$"}])"));
+    EXPECT_THAT(letters.at(0).missing, ElementsAre("a"));
+}
+
+TEST(Fields, AreValidated) {
+    auto const letters = lettersOf("No 1,234\nSum x", presetWith(R"([
+        {"name": "no", "value_type": 1, "value_extract": "^No (?<VAL>.*)$"},
+        {"name": "sum", "value_type": 2, "value_extract": "^Sum (?<VAL>.*)$"}])"));
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("no", "1234"), Pair("sum", "\"x\"")));
+    std::string message;
+    EXPECT_FALSE(letters[0].fields.isProductionReady(message));
+    EXPECT_EQ(message, "Field name: \"sum\"");
+}
+
+TEST(Fields, WithABadValidationPatternStopTheDocument) {
+    Cfg::ExtractPreset const preset =
+        presetWith(R"([{"name": "no", "value_match": "(", "value_extract": "^No (?<VAL>.*)$"}])");
+    try {
+        lettersOf("No 1", preset);
+        FAIL();
+    } catch (Error const& error) {
+        EXPECT_THAT(error.what(),
+                    testing::StartsWith("a.txt: the value of field \"no\" cannot be validated ("));
+        EXPECT_THAT(error.what(), testing::EndsWith("); correct the field's value_match"));
+    }
+}
+
+TEST(Fields, WithABadExtractionPatternFindNothing) {
+    std::vector<std::string> lines;
+    Log::Sink const before =
+        Log::setSink([&](LogPriority, std::string const& line) { lines.push_back(line); });
+    auto const letters = lettersOf("x", presetWith(R"([{"name": "no", "value_extract": "("}])"));
+    Log::setSink(before);
+    EXPECT_THAT(valuesOf(letters.at(0)), IsEmpty());
+    EXPECT_THAT(lines, ElementsAre(testing::StartsWith("Extract field failed with ")));
+}
+
+TEST(Zones, WithoutALocationHoldTheBlockNearestToTheirPoint) {
+    // The default point is at 45, 62 mm: the 13th row.
+    std::string const document = "Sender\n\n\n\n\n\n\n\n\n\n\nLena Brandt\nWhitstable\n\n\nDear Lena";
+    auto const letters = lettersOf(document, Cfg::ExtractPreset(R"({"zones": [{"name": "_Address", "fields": [
+        {"name": "postal", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}]}]})"_json.toObject()));
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("postal", "\"Lena Brandt\nWhitstable\"")));
+}
+
+TEST(Zones, EachHaveATextOfTheirOwn) {
+    auto const letters = lettersOf("Ref: a", Cfg::ExtractPreset(R"({"zones": [
+        {"name": "A", "fields": [{"name": "a", "value_extract": "^Ref: (?<VAL>.*)$"}]},
+        {"name": "B", "fields": [{"name": "b", "value_extract": "^Ref: (?<VAL>.*)$"}]}]})"_json.toObject()));
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("a", "\"a\""), Pair("b", "\"a\"")));
+}
+
+TEST(Presets, SayHowFarApartWordsAndLinesMayBe) {
+    Cfg::ExtractPreset preset = presetWith(R"([{"name": "date", "value_extract": "^Date: (?<VAL>.*)$"}])");
+    std::string const document = "Date:          today";
+    EXPECT_THAT(valuesOf(lettersOf(document, preset).at(0)), IsEmpty());
+    preset.setMaxSpacesBetweenFrags(10.0);
+    EXPECT_THAT(valuesOf(lettersOf(document, preset).at(0)), ElementsAre(Pair("date", "\"today\"")));
+    preset.setMaxLineDistance(2.5);
+    preset.setSpaceAdjustPerc(20);
+    EXPECT_EQ(rulesOf(preset).maxLineDistance, 2.5);
+    EXPECT_EQ(rulesOf(preset).spaceAdjustPerc, 20);
+}
+
+TEST(Traces, TellWhatWasSeenAndWhatCameOfIt) {
+    Cfg::ExtractPreset const preset = presetWith(R"([
+        {"name": "first", "mark": 1, "value_type": 1, "value_extract": "^Page (?<VAL>1) of \\d+$"},
+        {"name": "name", "width": 1000, "value_extract": "^(?<VAL>Lena .*)$"},
+        {"name": "country", "value_extract": "^to (?<VAL>.*)$", "default_value": "UK"},
+        {"name": "phone", "value_extract": "^Tel (?<VAL>.*)$"}])");
+    Trace trace;
+    std::string const document = "Page 1 of 2\nLena Brandt\fPage 2 of 2";
+    EXPECT_EQ(valuesOf(lettersOf(document, preset, &trace).at(0)),
+              valuesOf(lettersOf(document, preset).at(0)));
+
+    ASSERT_THAT(trace.pages, SizeIs(2));
+    EXPECT_EQ(trace.pages[0].page, 1);
+    EXPECT_TRUE(trace.pages[0].beginsLetter);
+    EXPECT_EQ(trace.pages[1].page, 2);
+    EXPECT_FALSE(trace.pages[1].beginsLetter);
+
+    ASSERT_THAT(trace.pages[0].zones, SizeIs(1));
+    ZoneTrace const& zone = trace.pages[0].zones[0];
+    EXPECT_EQ(zone.definition, &preset.zones()[0]);
+    EXPECT_EQ(zone.text, "Page 1 of 2\nLena Brandt");
+    EXPECT_EQ(zone.box, (Box{2500, 1000, 4828, 1776}));
+    EXPECT_THAT(zone.blocks, ElementsAre(zone.box));
+
+    ASSERT_THAT(zone.fields, SizeIs(4));
+    FieldTrace const& first = zone.fields[0];
+    EXPECT_EQ(first.definition, &preset.zones()[0].fields()[0]);
+    ASSERT_TRUE(first.match);
+    EXPECT_EQ(first.match->text, "Page 1 of 2");
+    EXPECT_EQ(first.match->box, (Box{2500, 1000, 4828, 1353}));
+    EXPECT_EQ(first.match->width, 2328);
+    EXPECT_EQ(first.cut, "Page 1 of 2");
+    EXPECT_EQ(first.rawText, "1");
+    EXPECT_EQ(text(first.value->rawValue()), "1");
+    EXPECT_FALSE(first.isTooWide);
+
+    FieldTrace const& name = zone.fields[1];
+    ASSERT_TRUE(name.match);
+    EXPECT_TRUE(name.isTooWide);
+    EXPECT_EQ(name.match->width, 2328);
+    EXPECT_EQ(name.cut, "");
+    EXPECT_EQ(name.rawText, std::nullopt);
+    EXPECT_EQ(name.value, nullptr);
+
+    FieldTrace const& country = zone.fields[2];
+    EXPECT_FALSE(country.match);
+    EXPECT_EQ(country.rawText, std::nullopt);
+    EXPECT_EQ(text(country.value->rawValue()), "\"UK\"");
+
+    EXPECT_FALSE(zone.fields[3].match);
+    EXPECT_EQ(zone.fields[3].value, nullptr);
+}
+
+TEST(Traces, OfOneLetterHoldItsFirstPageOnly) {
+    Trace trace;
+    lettersOf("a\fb\fc", presetWith("[]"), &trace);
+    EXPECT_THAT(trace.pages, SizeIs(1));
+}
+
+} // namespace
+} // namespace Reader
