@@ -1,0 +1,91 @@
+#include "programs/mailing/metadata.h"
+
+#include "vlservice/pack/page_loader.h"
+#include "vlservice/pack/page_saver.h"
+#include "vlservice/platform/json_text.h"
+
+#include <sstream>
+#include <stdexcept>
+#include <utility>
+
+namespace Mailing {
+namespace {
+
+constexpr char const* ID_KEY = "id";
+constexpr char const* CREATED_KEY = "created";
+constexpr char const* LETTERS_KEY = "letters";
+constexpr char const* DOCUMENTS_KEY = "documents";
+constexpr char const* NAME_KEY = "name";
+constexpr char const* PAGES_KEY = "pages";
+constexpr char const* FIELDS_KEY = "fields";
+
+/// What is not the pack preset's in the object that it shares; its name's key is listed so that the name is
+/// not taken for an unknown key as well.
+std::unordered_set<std::string> const NOT_THE_PRESETS{ID_KEY, CREATED_KEY, LETTERS_KEY, "pack_preset"};
+
+json::Object toJson(DocumentPages const& document) {
+    json::Array pages;
+    for (int const page : document.pages)
+        pages.append(page);
+    return {{NAME_KEY, document.document}, {PAGES_KEY, pages}};
+}
+
+DocumentPages documentFrom(json::Object const& object) {
+    DocumentPages document{object.get(NAME_KEY).toString(), {}};
+    for (json::Value const& page : object.get(PAGES_KEY).toArray())
+        document.pages.push_back(static_cast<int>(page.toInt()));
+    return document;
+}
+
+json::Object toJson(MailedLetter const& letter) {
+    json::Array documents;
+    for (DocumentPages const& document : letter.documents)
+        documents.append(toJson(document));
+    return {{DOCUMENTS_KEY, documents}, {FIELDS_KEY, letter.fields.serialize()}};
+}
+
+MailedLetter letterFrom(json::Object const& object) {
+    MailedLetter letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
+    for (json::Value const& document : object.get(DOCUMENTS_KEY).toArray())
+        letter.documents.push_back(documentFrom(document.toObject()));
+    return letter;
+}
+
+} // namespace
+
+json::Object Metadata::toJson() const {
+    json::Object object = packPreset.serialize(true);
+    object.set(ID_KEY, id);
+    object.set(CREATED_KEY, created);
+    json::Array all;
+    for (MailedLetter const& letter : letters)
+        all.append(Mailing::toJson(letter));
+    object.set(LETTERS_KEY, all);
+    return object;
+}
+
+Metadata Metadata::fromJson(json::Object const& object) {
+    Metadata metadata{object.get(ID_KEY).toString(),
+                      object.get(CREATED_KEY).toInt(),
+                      Cfg::PackPreset(object, NOT_THE_PRESETS),
+                      {}};
+    for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
+        metadata.letters.push_back(letterFrom(letter.toObject()));
+    return metadata;
+}
+
+SharedMemBuffer Metadata::toBlob() const {
+    std::ostringstream text;
+    text << toJson();
+    std::string const bytes = std::move(text).str();
+    return PageSaverI::zipDbData(bytes.data(), bytes.size());
+}
+
+Metadata Metadata::fromBlob(SharedMemBuffer blob) {
+    SharedMemBuffer const text = PageLoaderI::unzipDbData(std::move(blob));
+    if (text.empty())
+        throw std::runtime_error("the metadata cannot be expanded");
+    return fromJson(json::strToObject(reinterpret_cast<char const*>(text.data()), text.size()));
+}
+
+} // namespace Mailing

@@ -1,0 +1,47 @@
+#pragma once
+// The metadata of a mailing, which stands in its container as one blob: what the pages belong to and how they
+// go out.
+
+#include "vlservice/extract/extracted_fields.h"
+#include "vlservice/pack/shared_mem_buffer.h"
+#include "vlservice/presets/pack_preset.h"
+
+#include <string>
+#include <vector>
+
+namespace Mailing {
+
+/// Pages of one document that belong to a letter.
+struct DocumentPages {
+    /// As the container names the document.
+    std::string document;
+    /// From 1, in the order in which they go out.
+    std::vector<int> pages;
+};
+
+/// One letter, or several that go out as one because they are addressed alike.
+struct MailedLetter {
+    std::vector<DocumentPages> documents;
+    Cfg::ExtractedFields fields;
+};
+
+/// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
+/// its keys "id", "created" and "letters".
+struct Metadata {
+    std::string id;
+    /// Seconds since the epoch, UTC.
+    long long created = 0;
+    Cfg::PackPreset packPreset;
+    std::vector<MailedLetter> letters;
+
+    json::Object toJson() const;
+    /// Throws std::exception when a key has not the form above.
+    static Metadata fromJson(json::Object const& object);
+
+    /// The compressed JSON text, as the container takes it.
+    SharedMemBuffer toBlob() const;
+    /// Throws std::exception when the blob cannot be expanded or holds something else.
+    static Metadata fromBlob(SharedMemBuffer blob);
+};
+
+} // namespace Mailing
