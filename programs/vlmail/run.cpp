@@ -20,6 +20,8 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
                  "vlmail");
     app.require_subcommand(1);
     Task task;
+    addLetterCommand(app, task);
+    addMailCommand(app, task);
     addPackCommand(app, task);
     try {
         app.parse(argc, argv);

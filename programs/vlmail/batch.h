@@ -1,0 +1,20 @@
+#pragma once
+// Reading many documents at once.
+
+#include "programs/vlmail/command.h"
+#include "programs/vlmail/reading.h"
+
+#include <functional>
+
+namespace VlMail {
+
+class NodeSettings;
+
+/// Reads the files by the settings, on up to `workers` processes, and hands each result over in the order of
+/// the files. Shows progress where a person watches. A document that brings its reader down has that for its
+/// error.
+void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
+               WithPages withPages, Terminal const& terminal,
+               std::function<void(std::size_t, ReadResult)> const& take);
+
+} // namespace VlMail

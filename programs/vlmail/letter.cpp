@@ -1,0 +1,115 @@
+// vlmail letter: what the settings make of each document, for a person or as JSON.
+#include "programs/vlmail/batch.h"
+#include "programs/vlmail/command.h"
+#include "programs/vlmail/node_settings.h"
+#include "programs/vlmail/outcome.h"
+#include "programs/vlmail/text_table.h"
+#include "programs/vlmail/worker_pool.h"
+#include "vlservice/platform/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <memory>
+#include <ostream>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    std::vector<std::string> files;
+    std::string settings;
+    bool json = false;
+    std::size_t jobs = processorCount();
+};
+
+std::string stateInWords(Cfg::ExtractedField const& field) {
+    switch (field.valueType()) {
+    case Cfg::ExtractedField::ValueType::NotValidated:
+        return "not validated";
+    case Cfg::ExtractedField::ValueType::Plain:
+        return "ok";
+    case Cfg::ExtractedField::ValueType::Time:
+        return "date";
+    case Cfg::ExtractedField::ValueType::Invalid:
+        break;
+    }
+    return "INVALID";
+}
+
+std::string roleInWords(Cfg::ExtractedField const& field, Cfg::ExtractedField const* primary) {
+    if (&field == primary)
+        return "recipient, this one counts";
+    if (field.isRcptAddress())
+        return "recipient";
+    return field.isNotifyAddress() ? "notification" : "";
+}
+
+std::string linesJoined(std::string text) {
+    for (std::size_t at = text.find('\n'); at != std::string::npos; at = text.find('\n', at))
+        text.replace(at, 1, " / ");
+    return text;
+}
+
+void print(std::ostream& out, LetterReading const& letter, std::size_t number, std::size_t of) {
+    std::string const why = letter.whyNot();
+    out << "  letter " << number << " of " << of << ", " << pagesInWords(letter.pages) << ": "
+        << (why.empty() ? "ready" : "cannot go out: " + why) << '\n';
+    TextTable table({{"field"}, {"value"}, {"state"}, {"address"}});
+    for (auto const& [priority, field] : letter.fields)
+        table.addRow({field.name(), linesJoined(field.valueToStr()), stateInWords(field),
+                      roleInWords(field, letter.fields.primaryAddressField())});
+    if (table.empty())
+        out << "    no field was found\n";
+    else
+        table.print(out, 4);
+}
+
+void print(std::ostream& out, DocumentReading const& reading) {
+    out << reading.document << '\n'
+        << "  read by the preset for  " << reading.extractPreset << '\n'
+        << "  sent by the pack preset " << reading.packPreset << '\n';
+    if (reading.isAttachment()) {
+        out << "  an attachment: it holds no letters\n\n";
+        return;
+    }
+    for (std::size_t i = 0; i < reading.letters->size(); ++i)
+        print(out, (*reading.letters)[i], i + 1, reading.letters->size());
+    out << '\n';
+}
+
+int showLetters(Options const& options, Terminal const& terminal) {
+    NodeSettings const settings =
+        options.settings.empty() ? NodeSettings() : NodeSettings::fromFile(options.settings);
+    Outcome outcome;
+    readBatch(options.files, settings, options.jobs, WithPages::No, terminal,
+              [&](std::size_t, ReadResult result) {
+                  DocumentReading const& reading = result.reading;
+                  outcome.count(reading);
+                  if (options.json)
+                      terminal.out << reading.toJson() << std::endl;
+                  else if (!reading.failed())
+                      print(terminal.out, reading);
+                  if (reading.failed())
+                      terminal.complain(reading.error);
+              });
+    if (!options.json && options.files.size() > 1)
+        terminal.out << outcome.inWords() << '\n';
+    return outcome.exitStatus();
+}
+
+} // namespace
+
+void addLetterCommand(CLI::App& app, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const letter = app.add_subcommand(
+        "letter", "Shows the letters in documents: presets, fields, and whether they can go out");
+    letter->add_option("FILE", options->files, "PDF or text documents")->required();
+    letter->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
+    letter->add_flag("--json", options->json, "One JSON object a document, each on a line");
+    letter->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);
+    letter->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showLetters(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,89 @@
+#include "programs/vlmail/node_settings.h"
+
+#include "programs/vlmail/command.h"
+#include "vlservice/cfg/app.h"
+#include "vlservice/cfg/departments.h"
+#include "vlservice/cfg/inet.h"
+#include "vlservice/cfg/po.h"
+#include "vlservice/cfg/profiles.h"
+#include "vlservice/platform/json_text.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+#include <iterator>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+std::string quoted(fs::path const& file) { return '"' + file.string() + '"'; }
+
+bool isPartName(std::string const& name) {
+    std::string const* const names[] = {&Cfg::App::PART_NAME,      &Cfg::Inet::PART_NAME,
+                                        &Cfg::PO::PART_NAME,       &Cfg::Departments::PART_NAME,
+                                        &Cfg::Profiles::PART_NAME, &Cfg::Presets::PART_NAME};
+    return std::any_of(std::begin(names), std::end(names),
+                       [&](std::string const* part) { return *part == name; });
+}
+
+bool isPresetsPart(json::Object const& document) {
+    return document.get("extract_presets") || document.get("pack_presets");
+}
+
+/// A misspelt part would be passed over in silence, and with it all of its settings.
+void requirePartNames(json::Object const& document, fs::path const& file) {
+    for (auto const& [name, part] : document) {
+        if (!isPartName(name))
+            throw Error(
+                "cannot use the settings in " + quoted(file) + ": \"" + name +
+                "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or "
+                "\"profiles\"");
+    }
+}
+
+} // namespace
+
+std::string readFile(fs::path const& file) {
+    if (fs::is_directory(file))
+        throw Error("cannot read " + quoted(file) + ": it is a folder; name a file");
+    errno = 0;
+    std::ifstream in(file, std::ios::binary);
+    std::string const bytes{std::istreambuf_iterator<char>(in), {}};
+    if (!in) {
+        int const code = errno;
+        throw Error("cannot read " + quoted(file) + ": " + std::strerror(code ? code : EIO) +
+                    "; check the name and the rights");
+    }
+    return bytes;
+}
+
+NodeSettings NodeSettings::fromFile(fs::path const& file) {
+    std::string const text = readFile(file);
+    NodeSettings settings;
+    settings.file_ = file;
+    try {
+        settings.parts_ = json::strToObject(text.data(), text.size());
+    } catch (json::Exc const& wrong) {
+        throw Error("cannot read the settings in " + quoted(file) + ": " + wrong.what() +
+                    "; correct the file there");
+    }
+    if (isPresetsPart(settings.parts_))
+        settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};
+    requirePartNames(settings.parts_, file);
+    settings.presets();
+    return settings;
+}
+
+Cfg::Presets NodeSettings::presets() const {
+    try {
+        return Cfg::Presets(part(Cfg::Presets::PART_NAME), true, true);
+    } catch (std::exception const& wrong) {
+        throw Error("cannot use the presets in " + quoted(file_) + ": " + wrong.what() +
+                    "; correct the file");
+    }
+}
+
+} // namespace VlMail

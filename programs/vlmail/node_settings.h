@@ -1,0 +1,37 @@
+#pragma once
+// The settings that a command works with, from a JSON document on disk.
+
+#include "vlservice/cfg/json.h"
+#include "vlservice/presets/presets.h"
+
+#include <filesystem>
+#include <optional>
+
+namespace VlMail {
+
+/// A node's settings parts as JSON. The document holds parts under their names, {"presets": {...}, "app":
+/// {...}}, or is the part "presets" itself.
+class NodeSettings {
+public:
+    /// Nothing set: the global defaults apply.
+    NodeSettings() = default;
+    /// Throws Error when the file cannot be read or is not such a document.
+    static NodeSettings fromFile(std::filesystem::path const& file);
+
+    /// Completed by the global defaults, so that a pair of presets exists for every document's name.
+    /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
+    Cfg::Presets presets() const;
+    /// The part's JSON as it stands in the document; the empty handle when it is not there.
+    json::Value part(std::string const& name) const { return parts_.get(name); }
+    /// Where they come from, for messages; empty for the defaults.
+    std::filesystem::path const& file() const { return file_; }
+
+private:
+    std::filesystem::path file_;
+    json::Object parts_;
+};
+
+/// A whole file. Throws Error.
+std::string readFile(std::filesystem::path const& file);
+
+} // namespace VlMail

@@ -1,0 +1,11 @@
+#pragma once
+// Names and messages from the operating system as valid text.
+
+#include <string>
+
+namespace VlMail {
+
+/// The text with U+FFFD for each stretch that is not UTF-8: JSON and terminals take nothing else.
+std::string validUtf8(std::string const& text);
+
+} // namespace VlMail
