@@ -34,18 +34,23 @@ public:
     std::vector<std::shared_ptr<CmdI>> submitted;
 };
 
+/// Sends and receives at once, and notes what was to be carried.
 class Transfer : public Ipc::CmdTransferI {
 public:
-    void sendReq(std::shared_ptr<CmdI> cmd) override { note("sendReq", cmd); }
-    void readReq(std::shared_ptr<CmdI> cmd) override { note("readReq", cmd); }
-    void sendResp(std::shared_ptr<CmdI> cmd) override { note("sendResp", cmd); }
-    void readResp(std::shared_ptr<CmdI> cmd) override { note("readResp", cmd); }
+    void send(std::shared_ptr<CmdI> cmd, Message which, json::Object const& message,
+              std::function<void()> gone) override {
+        steps.push_back("send " + nameOf(which) + ' ' + cmd->name() + ' ' + text(message));
+        gone();
+    }
+    void read(std::shared_ptr<CmdI> cmd, Message which,
+              std::function<void(json::Object const&)> taken) override {
+        steps.push_back("read " + nameOf(which) + ' ' + cmd->name());
+        taken(json::Object{{"from", nameOf(which)}});
+    }
     std::vector<std::string> steps;
 
 private:
-    void note(std::string const& step, std::shared_ptr<CmdI> const& cmd) {
-        steps.push_back(step + " " + cmd->name());
-    }
+    static std::string nameOf(Message which) { return which == Message::Request ? "request" : "response"; }
 };
 
 class ConnectedProcessor : public Processor {
@@ -61,6 +66,21 @@ public:
     Ping(Ping const&) = default;
     ~Ping() override = default;
     char const* name() const override { return "Ping"; }
+};
+
+/// Has a payload in both directions and notes its steps.
+class Talk : public Ping {
+public:
+    using Ping::Ping;
+    json::Object serializeReq() const override { return {{"to", "there"}}; }
+    void sendReqDone() override { steps.push_back("request gone"); }
+    void deserializeReq(json::Object const& request) override { steps.push_back(text(request)); }
+    void readReqDone() override { steps.push_back("request read"); }
+    json::Object serializeResp() const override { return {{"and", "back"}}; }
+    void sendRespDone() override { steps.push_back("response gone"); }
+    void deserializeResp(json::Object const& response) override { steps.push_back(text(response)); }
+    void readRespDone() override { steps.push_back("response read"); }
+    std::vector<std::string> steps;
 };
 
 /// The same one level up.
@@ -118,13 +138,16 @@ TEST_F(Commands, CarryNothingUnlessTheySayWhat) {
 
 TEST_F(Commands, TakeTheirFourStepsOverTheProcessorsConnection) {
     auto const processor = std::make_shared<ConnectedProcessor>();
-    auto const ping = std::make_shared<Ping>(static_cast<unsigned char>(1), processor);
-    ping->sendReq();
-    ping->readReq();
-    ping->sendResp();
-    ping->readResp();
+    auto const talk = std::make_shared<Talk>(static_cast<unsigned char>(1), processor);
+    talk->sendReq();
+    talk->readReq();
+    talk->sendResp();
+    talk->readResp();
     EXPECT_THAT(processor->connection.steps,
-                ElementsAre("sendReq Ping", "readReq Ping", "sendResp Ping", "readResp Ping"));
+                ElementsAre(R"(send request Ping {"to":"there"})", "read request Ping",
+                            R"(send response Ping {"and":"back"})", "read response Ping"));
+    EXPECT_THAT(talk->steps, ElementsAre("request gone", R"({"from":"request"})", "request read",
+                                         "response gone", R"({"from":"response"})", "response read"));
     EXPECT_THAT(lines, ElementsAre());
 }
 

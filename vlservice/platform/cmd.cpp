@@ -56,22 +56,44 @@ JsonCmdBase::JsonCmdBase(unsigned char id, std::shared_ptr<CmdProcessorI> proces
 
 JsonCmdBase::~JsonCmdBase() = default;
 
-namespace {
-
-void transferOrFail(CmdI& cmd, void (CmdTransferI::*step)(std::shared_ptr<CmdI>)) {
-    CmdTransferI* const transfer = cmd.processor() ? cmd.processor()->transfer() : nullptr;
-    if (transfer)
-        (transfer->*step)(cmd.shared_from_this());
-    else
-        cmd.onTransferError("There is no connection");
+CmdTransferI* JsonCmdBase::transferOrFail() {
+    CmdTransferI* const transfer = processor() ? processor()->transfer() : nullptr;
+    if (!transfer)
+        onTransferError("There is no connection");
+    return transfer;
 }
 
-} // namespace
+std::shared_ptr<JsonCmdBase> JsonCmdBase::self() {
+    return std::static_pointer_cast<JsonCmdBase>(shared_from_this());
+}
 
-void JsonCmdBase::sendReq() { transferOrFail(*this, &CmdTransferI::sendReq); }
-void JsonCmdBase::readReq() { transferOrFail(*this, &CmdTransferI::readReq); }
-void JsonCmdBase::sendResp() { transferOrFail(*this, &CmdTransferI::sendResp); }
-void JsonCmdBase::readResp() { transferOrFail(*this, &CmdTransferI::readResp); }
+void JsonCmdBase::sendReq() {
+    if (CmdTransferI* const transfer = transferOrFail())
+        transfer->send(self(), CmdTransferI::Message::Request, serializeReq(),
+                       [cmd = self()] { cmd->sendReqDone(); });
+}
+
+void JsonCmdBase::readReq() {
+    if (CmdTransferI* const transfer = transferOrFail())
+        transfer->read(self(), CmdTransferI::Message::Request, [cmd = self()](json::Object const& request) {
+            cmd->deserializeReq(request);
+            cmd->readReqDone();
+        });
+}
+
+void JsonCmdBase::sendResp() {
+    if (CmdTransferI* const transfer = transferOrFail())
+        transfer->send(self(), CmdTransferI::Message::Response, serializeResp(),
+                       [cmd = self()] { cmd->sendRespDone(); });
+}
+
+void JsonCmdBase::readResp() {
+    if (CmdTransferI* const transfer = transferOrFail())
+        transfer->read(self(), CmdTransferI::Message::Response, [cmd = self()](json::Object const& response) {
+            cmd->deserializeResp(response);
+            cmd->readRespDone();
+        });
+}
 
 json::Object JsonCmdBase::serializeReq() const { return {}; }
 void JsonCmdBase::sendReqDone() {}

@@ -6,6 +6,7 @@
 #include "vlservice/export.h"
 
 #include <chrono>
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -22,15 +23,20 @@ public:
     static std::chrono::milliseconds duration(TimeoutId id);
 };
 
-/// Carries commands for the operations by which a command sends and reads itself.
-/// A connection between programs implements it; a processor hands it out.
+/// Carries the messages of commands. A connection between programs implements it; a processor hands it out.
+/// A message that cannot be carried ends in the command's onTransferError. The functions are called later or
+/// at once.
 class VLSERVICE_EXPORT CmdTransferI {
 public:
+    enum class Message { Request, Response };
+
     virtual ~CmdTransferI();
-    virtual void sendReq(std::shared_ptr<CmdI> cmd) = 0;
-    virtual void readReq(std::shared_ptr<CmdI> cmd) = 0;
-    virtual void sendResp(std::shared_ptr<CmdI> cmd) = 0;
-    virtual void readResp(std::shared_ptr<CmdI> cmd) = 0;
+    /// Sends a message; `gone` is called when it has been written.
+    virtual void send(std::shared_ptr<CmdI> cmd, Message which, json::Object const& message,
+                      std::function<void()> gone) = 0;
+    /// Receives a message and hands it to `taken`; what that throws is a transfer failure.
+    virtual void read(std::shared_ptr<CmdI> cmd, Message which,
+                      std::function<void(json::Object const&)> taken) = 0;
 };
 
 /// Receives commands.
@@ -106,6 +112,11 @@ public:
     virtual void deserializeResp(json::Object const& response);
     /// The response has been read.
     virtual void readRespDone();
+
+private:
+    /// Null, and the command has been told, when there is no connection.
+    CmdTransferI* transferOrFail();
+    std::shared_ptr<JsonCmdBase> self();
 };
 
 } // namespace Ipc
