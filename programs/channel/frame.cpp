@@ -1,0 +1,116 @@
+#include "programs/channel/frame.h"
+
+#include <algorithm>
+
+namespace Channel {
+namespace {
+
+/// What is read at once while nothing long is on its way.
+constexpr std::size_t PIECE = 8 * 1024;
+/// An idle connection keeps no more memory than this.
+constexpr std::size_t KEPT = 64 * 1024;
+
+template<typename Number>
+void appendNumber(std::string& bytes, Number number) {
+    for (int shift = 8 * (static_cast<int>(sizeof number) - 1); shift >= 0; shift -= 8)
+        bytes += static_cast<char>(number >> shift & 0xff);
+}
+
+template<typename Number>
+Number numberAt(std::string_view bytes, std::size_t offset) {
+    Number number = 0;
+    for (char const byte : bytes.substr(offset, sizeof number))
+        number = static_cast<Number>(number << 8 | static_cast<unsigned char>(byte));
+    return number;
+}
+
+// Offsets in the header.
+constexpr std::size_t COMMAND_AT = 0;
+constexpr std::size_t KIND_AT = 1;
+constexpr std::size_t SEQUENCE_AT = 2;
+constexpr std::size_t LENGTH_AT = 6;
+
+[[noreturn]] void refuseLength(std::size_t length, std::size_t limit) {
+    throw Error("A message of " + std::to_string(length) + " bytes is over the limit of " +
+                std::to_string(limit) + ".");
+}
+
+bool isKind(std::uint8_t kind) {
+    return kind >= static_cast<std::uint8_t>(Kind::Request) && kind <= static_cast<std::uint8_t>(Kind::Error);
+}
+
+} // namespace
+
+std::string preface() {
+    std::string bytes(MAGIC);
+    appendNumber(bytes, VERSION);
+    return bytes;
+}
+
+void appendFrame(std::string& bytes, Frame const& frame) {
+    if (frame.text.size() > MAX_TEXT)
+        refuseLength(frame.text.size(), MAX_TEXT);
+    bytes.reserve(bytes.size() + HEADER_SIZE + frame.text.size());
+    appendNumber(bytes, frame.command);
+    appendNumber(bytes, static_cast<std::uint8_t>(frame.kind));
+    appendNumber(bytes, frame.sequence);
+    appendNumber(bytes, static_cast<std::uint32_t>(frame.text.size()));
+    bytes += frame.text;
+}
+
+std::span<char> FrameDecoder::room() {
+    std::size_t const held = filled_ - begin_;
+    std::copy_n(bytes_.begin() + static_cast<std::ptrdiff_t>(begin_), held, bytes_.begin());
+    begin_ = 0;
+    filled_ = held;
+    if (held == 0 && bytes_.size() > KEPT)
+        bytes_ = std::string();
+    // Twice what is held at the most: a length that only was announced allocates nothing.
+    std::size_t const missing = announced() > held ? announced() - held : 0;
+    std::size_t const wanted = std::clamp(missing, PIECE, std::max(PIECE, held));
+    if (bytes_.size() < held + wanted)
+        bytes_.resize(held + wanted);
+    return {bytes_.data() + held, wanted};
+}
+
+std::optional<Frame> FrameDecoder::next() {
+    if (!hasPreface_ && !readPreface())
+        return std::nullopt;
+    std::size_t const size = announced();
+    if (size == 0 || unread().size() < size)
+        return std::nullopt;
+    std::string_view const message = unread().substr(0, size);
+    begin_ += size;
+    return Frame{numberAt<std::uint8_t>(message, COMMAND_AT),
+                 static_cast<Kind>(numberAt<std::uint8_t>(message, KIND_AT)),
+                 numberAt<std::uint32_t>(message, SEQUENCE_AT), message.substr(HEADER_SIZE)};
+}
+
+std::size_t FrameDecoder::announced() const {
+    if (!hasPreface_ || unread().size() < HEADER_SIZE)
+        return 0;
+    auto const kind = numberAt<std::uint8_t>(unread(), KIND_AT);
+    if (!isKind(kind))
+        throw Error("There is no message of kind " + std::to_string(kind) + ".");
+    auto const length = numberAt<std::uint32_t>(unread(), LENGTH_AT);
+    if (length > limit_)
+        refuseLength(length, limit_);
+    return HEADER_SIZE + length;
+}
+
+bool FrameDecoder::readPreface() {
+    std::string_view const magic = unread().substr(0, MAGIC.size());
+    if (magic != MAGIC.substr(0, magic.size()))
+        throw Error("The first bytes are not those of this protocol.");
+    if (unread().size() < PREFACE_SIZE)
+        return false;
+    auto const version = numberAt<std::uint16_t>(unread(), MAGIC.size());
+    if (version != VERSION)
+        throw Error("Version " + std::to_string(version) +
+                    " of the protocol is not spoken here, only version " + std::to_string(VERSION) + ".");
+    begin_ += PREFACE_SIZE;
+    hasPreface_ = true;
+    return true;
+}
+
+} // namespace Channel

@@ -1,0 +1,92 @@
+#pragma once
+// The service's side of the connection: it listens, lets in who knows the access token, and hands over
+// commands.
+
+#include "vlservice/platform/cmd.h"
+
+#include <chrono>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace boost::asio {
+class io_context;
+}
+
+namespace Channel {
+
+struct ServerSettings {
+    /// An IP address. Any but a loopback address wants the certificate and its key, and speaks TLS alone.
+    std::string address = "127.0.0.1";
+    /// 0 takes a free port.
+    std::uint16_t port = 0;
+    std::string token;
+    /// PEM files. The key's must be private.
+    std::string certificateFile;
+    std::string keyFile;
+
+    /// More wait until one of these has left.
+    std::size_t maxConnections = 2000;
+    /// For TLS and the exchange of proofs.
+    std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
+    /// For the rest of a message whose first byte is there, and for a peer to take an answer.
+    std::chrono::milliseconds messageTime = std::chrono::seconds(30);
+    /// For all large requests at once; further ones wait.
+    std::size_t requestMemory = 64 * 1024 * 1024;
+};
+
+/// Ends the handling of one command; copies are the same answer. May be called from any thread, once: further
+/// calls do nothing. An answer that goes without a call is a failure. The command is not touched by the
+/// caller afterwards.
+class Answer {
+public:
+    struct State;
+    explicit Answer(std::shared_ptr<State> state) : state_(std::move(state)) {}
+
+    /// The command's response goes out.
+    void operator()() const;
+    /// An error message goes out instead; the client's command is told it as a transfer error.
+    void fail(std::string const& reason) const;
+
+private:
+    std::shared_ptr<State> state_;
+};
+
+/// Everything happens on the thread that runs the io_context. A connection's next request is read when the
+/// one before has been answered, so that a connection is answered in order and costs one request's memory.
+class Server {
+public:
+    /// An empty command for a number, which holds that processor; null when there is none. Ipc::makeEmptyCmd
+    /// is one.
+    using Factory = std::function<std::shared_ptr<Ipc::CmdI>(unsigned char id,
+                                                             std::shared_ptr<Ipc::CmdProcessorI> connection)>;
+    /// Carries out a command whose request has been read. What it throws is answered as a failure.
+    using Handler = std::function<void(std::shared_ptr<Ipc::CmdI> cmd, Answer answer)>;
+
+    /// Listens from now on. Raises the limit of open files as far as the system lets it. Throws Error.
+    Server(boost::asio::io_context& io, ServerSettings settings, Factory factory, Handler handler);
+    /// Closes all connections at once.
+    ~Server();
+    Server(Server const&) = delete;
+    Server& operator=(Server const&) = delete;
+
+    std::uint16_t port() const;
+    /// Of the certificate; empty without TLS.
+    std::string const& fingerprint() const;
+    std::size_t connections() const;
+
+    /// Lets nobody in any more and closes each connection when the command that it is handling has been
+    /// answered. When all are closed, nothing of the server is left in the io_context.
+    void stop();
+
+private:
+    class Impl;
+    std::shared_ptr<Impl> impl_;
+};
+
+/// The handler for processors that are done when accept returns. The processor is what the commands expect.
+Server::Handler acceptAtOnce(std::shared_ptr<Ipc::CmdProcessorI> processor);
+
+} // namespace Channel

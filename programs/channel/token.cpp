@@ -1,0 +1,76 @@
+#include "programs/channel/token.h"
+
+#include "programs/channel/error.h"
+#include "programs/channel/hex.h"
+#include "programs/channel/private_file.h"
+
+#include <openssl/crypto.h>
+#include <openssl/evp.h>
+#include <openssl/hmac.h>
+#include <openssl/rand.h>
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+
+namespace Channel {
+namespace {
+
+constexpr std::size_t RANDOM_BYTES = 32;
+constexpr std::size_t MAX_TOKEN_FILE = 4096;
+constexpr std::string_view WHITE = " \t\r\n";
+
+bool isWordCharacter(char c) { return c > ' ' && c < '\x7f'; }
+
+std::string randomHex() {
+    std::array<unsigned char, RANDOM_BYTES> bytes;
+    if (RAND_bytes(bytes.data(), bytes.size()) != 1)
+        throw Error("The system gives no random numbers.");
+    return toHex(bytes);
+}
+
+std::string_view trimmed(std::string_view text) {
+    auto const first = text.find_first_not_of(WHITE);
+    if (first == std::string_view::npos)
+        return {};
+    return text.substr(first, text.find_last_not_of(WHITE) - first + 1);
+}
+
+} // namespace
+
+std::string readToken(std::string const& file) {
+    std::string const contents = readPrivateFile(file, MAX_TOKEN_FILE);
+    std::string_view const token = trimmed(contents);
+    if (token.size() < MIN_TOKEN_LENGTH || !std::all_of(token.begin(), token.end(), isWordCharacter))
+        throw Error("The file \"" + file + "\" holds no access token, which is one word of at least " +
+                    std::to_string(MIN_TOKEN_LENGTH) + " characters.");
+    return std::string(token);
+}
+
+std::string readOrCreateToken(std::string const& file) {
+    if (::access(file.c_str(), F_OK) != 0)
+        createPrivateFile(file, randomHex() + '\n');
+    return readToken(file);
+}
+
+std::string makeNonce() { return randomHex(); }
+
+std::string makeProof(Side side, std::string_view token, std::string_view clientNonce,
+                      std::string_view serviceNonce, std::string_view fingerprint) {
+    // Each part is ended by a byte that none of them holds.
+    std::string message(side == Side::Client ? "client" : "service");
+    for (std::string_view const part : {clientNonce, serviceNonce, fingerprint})
+        message.append(1, '\0').append(part);
+    std::array<unsigned char, EVP_MAX_MD_SIZE> code;
+    unsigned int length = 0;
+    HMAC(EVP_sha256(), token.data(), static_cast<int>(token.size()),
+         reinterpret_cast<unsigned char const*>(message.data()), message.size(), code.data(), &length);
+    return toHex({code.data(), length});
+}
+
+bool isSameProof(std::string_view a, std::string_view b) {
+    return a.size() == b.size() && CRYPTO_memcmp(a.data(), b.data(), a.size()) == 0;
+}
+
+} // namespace Channel

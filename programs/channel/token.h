@@ -1,0 +1,31 @@
+#pragma once
+// The access token: a secret text in a private file, the same on both sides, by which service and client know
+// each other. It never travels: each side proves that it knows it.
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace Channel {
+
+constexpr std::size_t MIN_TOKEN_LENGTH = 32;
+
+/// The token in a private file, without white space around it. Throws Error when it is too short or not one
+/// word.
+std::string readToken(std::string const& file);
+/// The same; where there is no file yet, one with a new random token is made.
+std::string readOrCreateToken(std::string const& file);
+
+/// Fresh random bits for one greeting, as hexadecimal digits.
+std::string makeNonce();
+
+enum class Side { Client, Service };
+
+/// The proof of one side for one greeting. The fingerprint is that of the certificate as this side sees it,
+/// so that nobody can pass a proof on over a certificate of his own; it is empty without TLS.
+std::string makeProof(Side side, std::string_view token, std::string_view clientNonce,
+                      std::string_view serviceNonce, std::string_view fingerprint);
+/// Takes the same time wherever the two differ.
+bool isSameProof(std::string_view a, std::string_view b);
+
+} // namespace Channel
