@@ -3,13 +3,13 @@
 // byte.
 
 #include "tests/pack/log_lines.h"
+#include "tests/temporary_folder.h"
 #include "vlservice/pack/pack_wrapper.h"
 
 #include <gmock/gmock.h>
 #include <zlib.h>
 
 #include <cstdint>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -85,13 +85,6 @@ inline std::string wideLayout(std::string const& id, std::string const& blobs, s
 
 class ContainerTest : public testing::Test {
 protected:
-    ContainerTest() {
-        std::string name = (std::filesystem::temp_directory_path() / "container.XXXXXX").string();
-        folder_ = ::mkdtemp(name.data());
-        file_ = folder_ / "m.mailing";
-    }
-    ~ContainerTest() override { std::filesystem::remove_all(folder_); }
-
     void write(std::string const& bytes) {
         std::ofstream(file_, std::ios::binary)
             .write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
@@ -135,8 +128,8 @@ protected:
     std::string const PAGE_2 = blobOf("second page");
     std::string const METADATA = blobOf("metadata");
 
-    std::filesystem::path folder_;
-    std::filesystem::path file_;
+    TemporaryFolder folder_;
+    std::filesystem::path file_ = folder_ / "m.mailing";
     LogLines log_;
     std::optional<PackWrapper> wrapper_;
 };

@@ -207,10 +207,11 @@ TEST_F(WritingContainers, RefuseNamesThatXmlCannotHold) {
 }
 
 TEST_F(WritingContainers, LogAFileThatCannotBeCreated) {
-    file_ = folder_ / "missing" / "a\"b&c.mailing";
+    file_ = folder_ / "missing/a\"b&c.mailing";
     PackWrapper& out = create();
-    EXPECT_THAT(log_.take(), ElementsAre(LogLine{3, "Mailing wrapper failed to create file \"" +
-                                                        folder_.string() + "/missing/a&\"b&&c.mailing\""}));
+    EXPECT_THAT(log_.take(),
+                ElementsAre(LogLine{3, "Mailing wrapper failed to create file \"" + folder_.path().string() +
+                                           "/missing/a&\"b&&c.mailing\""}));
     EXPECT_FALSE(out.outputFinished());
     out.savePage("a.pdf", "1", bufferOf(PAGE_1));
     EXPECT_FALSE(out.finalizeOutput(bufferOf(METADATA)));
