@@ -27,6 +27,22 @@ bool maySeparateLetters(Cfg::ExtractZones const& zones) {
            });
 }
 
+/// Answers the width of a match, and takes its lines out of the zone unless they are too wide for the field.
+ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
+    return [&field, &text, trace](std::string&, unsigned long long offset, unsigned long long length) {
+        Stretch stretch = text.stretch(offset, length);
+        auto const width = static_cast<unsigned long long>(stretch.width);
+        bool const isTooWide = field.maxWidth() != 0 && field.maxWidth() < width;
+        std::string cut = isTooWide ? std::string() : text.cutLines(offset, length);
+        if (trace) {
+            trace->match = std::move(stretch);
+            trace->isTooWide = isTooWide;
+            trace->cut = std::move(cut);
+        }
+        return width;
+    };
+}
+
 /// What one field yields.
 struct Yield {
     std::shared_ptr<ExtractedField> value;
@@ -67,13 +83,9 @@ private:
 
     void search(ExtractField const& field, ZoneText& text) {
         FieldTrace* const trace = trace_ ? &trace_->zones.back().fields.emplace_back() : nullptr;
-        if (trace)
-            trace->definition = &field;
         Yield yield;
-        yield.value = field.extractField(text.searchedText(), measureFor(field, text, trace));
+        yield.value = cutField(field, text, trace);
         yield.isFound = yield.value && !yield.value->isValidated();
-        if (trace && yield.isFound)
-            trace->rawText = yield.value->rawValue().textOrEmpty();
         if (yield.value)
             validate(field, *yield.value);
         if (trace && yield.value)
@@ -83,23 +95,6 @@ private:
             missing_.push_back(field.name());
         if (yield.value)
             take(std::move(yield));
-    }
-
-    /// Answers the width of a match, and takes its lines out of the zone unless they are too wide for the
-    /// field.
-    static ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
-        return [&field, &text, trace](std::string&, unsigned long long offset, unsigned long long length) {
-            Stretch stretch = text.stretch(offset, length);
-            auto const width = static_cast<unsigned long long>(stretch.width);
-            bool const isTooWide = field.maxWidth() != 0 && field.maxWidth() < width;
-            std::string cut = isTooWide ? std::string() : text.cutLines(offset, length);
-            if (trace) {
-                trace->match = std::move(stretch);
-                trace->isTooWide = isTooWide;
-                trace->cut = std::move(cut);
-            }
-            return width;
-        };
     }
 
     void validate(ExtractField const& field, ExtractedField& value) const {
@@ -146,6 +141,17 @@ std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& pr
         letters.back().pages.push_back(page);
     }
     return letters;
+}
+
+std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
+    std::shared_ptr<ExtractedField> value =
+        field.extractField(text.searchedText(), measureFor(field, text, trace));
+    if (trace) {
+        trace->definition = &field;
+        if (value && !value->isValidated())
+            trace->rawText = value->rawValue().textOrEmpty();
+    }
+    return value;
 }
 
 LayoutRules rulesOf(Cfg::ExtractPreset const& preset) {

@@ -69,6 +69,11 @@ struct Trace {
 /// fails; a failing extraction pattern is logged by the library and finds nothing.
 std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr);
 
+/// Takes one field out of a zone's text, as readLetters() does: not validated, or its default, or null.
+/// Fills a trace but for its value.
+std::shared_ptr<Cfg::ExtractedField> cutField(Cfg::ExtractField const& field, ZoneText& text,
+                                              FieldTrace* trace = nullptr);
+
 /// What a preset says about lines and blocks.
 LayoutRules rulesOf(Cfg::ExtractPreset const& preset);
 
