@@ -4,6 +4,7 @@
 
 #include <array>
 #include <limits>
+#include <map>
 #include <optional>
 #include <tuple>
 #include <unordered_map>
@@ -263,19 +264,18 @@ void sampleGaps(Page const& page, std::vector<OpenLine> const& lines, std::vecto
 
 /// The size of most of the line's letters.
 int mainSize(Page const& page, OpenLine const& line) {
-    std::vector<std::pair<int, std::size_t>> lettersOfSizes;
+    std::map<int, std::size_t> lettersOfSizes;
+    int main = 0;
+    std::size_t most = 0;
     for (PlacedWord const& placed : line.words) {
         Word const& word = page.words[placed.index];
-        auto const known = std::find_if(lettersOfSizes.begin(), lettersOfSizes.end(),
-                                        [&](auto const& entry) { return entry.first == word.size; });
-        if (known != lettersOfSizes.end())
-            known->second += word.text.size();
-        else if (lettersOfSizes.size() < MAX_CANDIDATES)
-            lettersOfSizes.emplace_back(word.size, word.text.size());
+        std::size_t const letters = lettersOfSizes[word.size] += word.text.size();
+        if (letters > most) {
+            most = letters;
+            main = word.size;
+        }
     }
-    return std::max_element(lettersOfSizes.begin(), lettersOfSizes.end(),
-                            [](auto const& a, auto const& b) { return a.second < b.second; })
-        ->first;
+    return main;
 }
 
 Line closed(Page const& page, OpenLine const& open, Turn turn, double minWordGap) {

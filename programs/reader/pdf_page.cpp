@@ -7,7 +7,7 @@
 #include <qpdf/QPDFPageDocumentHelper.hh>
 #include <qpdf/QPDFWriter.hh>
 
-#include <exception>
+#include <stdexcept>
 #include <utility>
 
 namespace Reader {
@@ -31,7 +31,7 @@ PdfPageWriter::PdfPageWriter(std::string_view pdf, std::string where) : pdf_(pdf
 
 PdfPageWriter::~PdfPageWriter() = default;
 
-std::string PdfPageWriter::write(int number) {
+std::string PdfPageWriter::write(int number, int pageCount) {
     try {
         if (!parsed_) {
             auto parsed = std::make_unique<Parsed>();
@@ -42,6 +42,8 @@ std::string PdfPageWriter::write(int number) {
             parsed->pages = document.getAllPages();
             parsed_ = std::move(parsed);
         }
+        if (parsed_->pages.size() != static_cast<std::size_t>(pageCount))
+            throw std::runtime_error("Some pages are lost.");
         QPDFPageObjectHelper page = parsed_->pages.at(static_cast<std::size_t>(number - 1));
         // Documents often list the fonts and pictures of all pages at each of them.
         page.removeUnreferencedResources();

@@ -20,8 +20,9 @@ public:
     PdfPageWriter(std::string_view pdf, std::string where);
     ~PdfPageWriter();
 
-    /// Pages count from 1. The same page gives the same bytes. Throws Error when the PDF is damaged.
-    std::string write(int number);
+    /// Page `number`, from 1, of a PDF that should have so many pages. The same page gives the same bytes.
+    /// Throws Error when the PDF is damaged; pages that cannot be told apart for certain are not written.
+    std::string write(int number, int pageCount);
 
 private:
     struct Parsed;

@@ -30,11 +30,19 @@ constexpr char16_t SOFT_HYPHEN = 0x00AD;
 /// Of a picture: A4 at 1,000 dots per inch, about.
 constexpr double MAX_PIXELS = 1e8;
 
-/// What poppler finds wrong with a document shows in what can be read of it.
-void keepPopplerQuiet() {
+/// Sets poppler up, once for the process.
+void preparePoppler() {
     static std::once_flag once;
-    std::call_once(once,
-                   [] { poppler::set_debug_error_function([](std::string const&, void*) {}, nullptr); });
+    std::call_once(once, [] {
+        // What poppler finds wrong with a document shows in what can be read of it.
+        poppler::set_debug_error_function([](std::string const&, void*) {}, nullptr);
+    });
+    // poppler drops its tables with the last document and makes them anew for the next, which costs more than
+    // opening it does: an empty document keeps them.
+    static std::string const EMPTY = "%PDF-1.4\n1 0 obj<</Type/Catalog/Pages 2 0 R>>endobj\n"
+                                     "2 0 obj<</Type/Pages/Kids[]/Count 0>>endobj\ntrailer<</Root 1 0 R>>\n";
+    static std::unique_ptr<poppler::document> const keeper(
+        poppler::document::load_from_raw_data(EMPTY.data(), static_cast<int>(EMPTY.size())));
 }
 
 int toHundredths(double points) {
@@ -126,7 +134,7 @@ class PdfSource : public PageSource {
 public:
     PdfSource(std::string bytes, std::string where)
         : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_) {
-        keepPopplerQuiet();
+        preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
             throw Error(where_ + ": is larger than 2 GiB; split it");
         document_.reset(
@@ -158,7 +166,10 @@ public:
         return page;
     }
 
-    std::string singlePagePdf(int number) override { return writer_.write(number); }
+    std::string singlePagePdf(int number) override {
+        popplerPage(number); // It throws for a page that was not read either.
+        return writer_.write(number, pageCount());
+    }
 
     std::string renderPage(int number, double dotsPerInch) override {
         std::unique_ptr<poppler::page> const page = popplerPage(number);
