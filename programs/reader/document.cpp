@@ -36,29 +36,6 @@ bool isPdf(std::string_view bytes) {
     }
 }
 
-std::string readFile(fs::path const& path) {
-    std::error_code failure;
-    fs::file_status const status = fs::status(path, failure);
-    if (failure)
-        failToOpen(path, failure.value());
-    if (fs::is_directory(status))
-        throw Error(path.string() + ": is a folder; name the documents in it");
-    if (!fs::is_regular_file(status))
-        throw Error(path.string() + ": is no ordinary file; save the document to one");
-
-    errno = 0;
-    std::ifstream in(path, std::ios::binary);
-    if (!in)
-        failToOpen(path, errno);
-    std::string bytes(fs::file_size(path), '\0');
-    in.read(bytes.data(), static_cast<std::streamsize>(bytes.size()));
-    if (in.bad())
-        failToOpen(path, errno ? errno : EIO);
-    // The file may have become shorter meanwhile.
-    bytes.resize(static_cast<std::size_t>(in.gcount()));
-    return bytes;
-}
-
 } // namespace
 
 Document::Document(std::string name, std::unique_ptr<PageSource> source)
@@ -92,6 +69,29 @@ std::string Document::renderPage(int number, double dotsPerInch) {
 void Document::checkNumber(int number) const {
     if (number < 1 || number > pageCount())
         throw std::out_of_range("no page " + std::to_string(number));
+}
+
+std::string readFile(fs::path const& path) {
+    std::error_code failure;
+    fs::file_status const status = fs::status(path, failure);
+    if (failure)
+        failToOpen(path, failure.value());
+    if (fs::is_directory(status))
+        throw Error(path.string() + ": is a folder; name the documents in it");
+    if (!fs::is_regular_file(status))
+        throw Error(path.string() + ": is no ordinary file; save the document to one");
+
+    errno = 0;
+    std::ifstream in(path, std::ios::binary);
+    if (!in)
+        failToOpen(path, errno);
+    std::string bytes(fs::file_size(path), '\0');
+    in.read(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+    if (in.bad())
+        failToOpen(path, errno ? errno : EIO);
+    // The file may have become shorter meanwhile.
+    bytes.resize(static_cast<std::size_t>(in.gcount()));
+    return bytes;
 }
 
 Document openDocument(fs::path const& path) { return openDocument(readFile(path), path); }

@@ -52,6 +52,7 @@ std::string pack(ReadResult const& result) {
     text << result.reading.toJson();
     std::string const json = std::move(text).str();
     message.put(json.data(), json.size());
+    message.put(result.sha256.data(), result.sha256.size());
     message.put(result.pages.size());
     for (auto const& letter : result.pages) {
         message.put(letter.size());
@@ -66,7 +67,9 @@ std::string pack(ReadResult const& result) {
 ReadResult unpack(std::string bytes) {
     Message message(std::move(bytes));
     auto const [json, length] = message.bytes();
-    ReadResult result{DocumentReading::fromJson(json::strToObject(json, length)), {}};
+    ReadResult result{DocumentReading::fromJson(json::strToObject(json, length))};
+    auto const [digest, digestLength] = message.bytes();
+    result.sha256.assign(digest, digestLength);
     result.pages.resize(message.number());
     for (auto& letter : result.pages) {
         letter.resize(message.number());
@@ -88,24 +91,44 @@ ReadResult crashed(std::string const& file) {
     return result;
 }
 
+void runBatch(std::size_t count, std::size_t workers, Terminal const& terminal,
+              std::function<ReadResult(std::size_t)> const& work,
+              std::function<std::string(std::size_t)> const& fileOf,
+              std::function<void(std::size_t, ReadResult)> const& take) {
+    ProgressLine progress(terminal, count);
+    auto const consume = [&](std::size_t index, std::optional<std::string> bytes) {
+        ReadResult result = bytes ? unpack(std::move(*bytes)) : crashed(fileOf(index));
+        if (result.reading.letters)
+            progress.lettersFound(result.reading.letters->size());
+        progress.hide();
+        take(index, std::move(result));
+    };
+    runJobs(
+        count, workers, [&](std::size_t index) { return pack(work(index)); }, consume,
+        [&](std::size_t done) { progress.documentsDone(done); });
+}
+
 } // namespace
 
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
                WithPages withPages, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
-    ProgressLine progress(terminal, files.size());
-    auto const read = [&](std::size_t index) {
-        return pack(readDocument(files[index], presets, settings, withPages));
-    };
-    auto const consume = [&](std::size_t index, std::optional<std::string> bytes) {
-        ReadResult result = bytes ? unpack(std::move(*bytes)) : crashed(files[index]);
-        if (result.reading.letters)
-            progress.lettersFound(result.reading.letters->size());
-        progress.hide();
-        take(index, std::move(result));
-    };
-    runJobs(files.size(), workers, read, consume, [&](std::size_t done) { progress.documentsDone(done); });
+    runBatch(
+        files.size(), workers, terminal,
+        [&](std::size_t index) { return readDocument(files[index], presets, settings, withPages); },
+        [&](std::size_t index) { return files[index]; }, take);
+}
+
+void splitBatch(std::vector<Plan::Document> const& documents, std::size_t workers, Terminal const& terminal,
+                std::function<void(std::size_t, ReadResult)> const& take) {
+    runBatch(
+        documents.size(), workers, terminal,
+        [&](std::size_t index) {
+            Plan::Document const& document = documents[index];
+            return splitDocument(document.file, document.sha256, document.reading);
+        },
+        [&](std::size_t index) { return documents[index].file.string(); }, take);
 }
 
 } // namespace VlMail

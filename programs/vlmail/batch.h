@@ -2,6 +2,7 @@
 // Reading many documents at once.
 
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/plan.h"
 #include "programs/vlmail/reading.h"
 
 #include <functional>
@@ -16,5 +17,9 @@ class NodeSettings;
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
                WithPages withPages, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take);
+
+/// The same with the pages of documents that were read before, as splitDocument() gives them.
+void splitBatch(std::vector<Plan::Document> const& documents, std::size_t workers, Terminal const& terminal,
+                std::function<void(std::size_t, ReadResult)> const& take);
 
 } // namespace VlMail

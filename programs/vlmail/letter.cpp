@@ -63,6 +63,8 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         out << "    no field was found\n";
     else
         table.print(out, 4);
+    for (std::string const& name : letter.missing)
+        out << "    missing, although obligatory: " << name << '\n';
 }
 
 void print(std::ostream& out, DocumentReading const& reading) {
@@ -79,8 +81,7 @@ void print(std::ostream& out, DocumentReading const& reading) {
 }
 
 int showLetters(Options const& options, Terminal const& terminal) {
-    NodeSettings const settings =
-        options.settings.empty() ? NodeSettings() : NodeSettings::fromFile(options.settings);
+    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Outcome outcome;
     readBatch(options.files, settings, options.jobs, WithPages::No, terminal,
               [&](std::size_t, ReadResult result) {

@@ -43,7 +43,7 @@ void MailingBuilder::add(std::string const& document, LetterReading letter,
                          std::vector<PageBlob> const& blobs) {
     for (PageBlob const& blob : blobs)
         pages_.savePage(document, std::to_string(blob.number), blob.data);
-    pageCount_ += blobs.size();
+    pageCount_ += letter.pages.size();
     ++letterCount_;
     Mailing::DocumentPages pages{document, letter.pages};
     if (!metadata_.packPreset.noGroup() && joinGroup(letter, pages))

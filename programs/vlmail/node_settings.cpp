@@ -1,6 +1,7 @@
 #include "programs/vlmail/node_settings.h"
 
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/digest.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/cfg/departments.h"
 #include "vlservice/cfg/inet.h"
@@ -64,6 +65,7 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     std::string const text = readFile(file);
     NodeSettings settings;
     settings.file_ = file;
+    settings.sha256_ = VlMail::sha256(text);
     try {
         settings.parts_ = json::strToObject(text.data(), text.size());
     } catch (json::Exc const& wrong) {
@@ -75,6 +77,10 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     requirePartNames(settings.parts_, file);
     settings.presets();
     return settings;
+}
+
+NodeSettings NodeSettings::fromFileIfNamed(std::string const& file) {
+    return file.empty() ? NodeSettings() : fromFile(file);
 }
 
 Cfg::Presets NodeSettings::presets() const {

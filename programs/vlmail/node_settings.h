@@ -5,7 +5,7 @@
 #include "vlservice/presets/presets.h"
 
 #include <filesystem>
-#include <optional>
+#include <string>
 
 namespace VlMail {
 
@@ -17,6 +17,8 @@ public:
     NodeSettings() = default;
     /// Throws Error when the file cannot be read or is not such a document.
     static NodeSettings fromFile(std::filesystem::path const& file);
+    /// The same, or the global defaults for an empty name.
+    static NodeSettings fromFileIfNamed(std::string const& file);
 
     /// Completed by the global defaults, so that a pair of presets exists for every document's name.
     /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
@@ -25,9 +27,12 @@ public:
     json::Value part(std::string const& name) const { return parts_.get(name); }
     /// Where they come from, for messages; empty for the defaults.
     std::filesystem::path const& file() const { return file_; }
+    /// Of the file as it was read; empty for the defaults.
+    std::string const& sha256() const { return sha256_; }
 
 private:
     std::filesystem::path file_;
+    std::string sha256_;
     json::Object parts_;
 };
 

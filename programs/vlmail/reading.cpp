@@ -3,6 +3,7 @@
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/digest.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/utf8.h"
 
@@ -13,6 +14,8 @@
 namespace VlMail {
 namespace {
 
+namespace fs = std::filesystem;
+
 constexpr char const* DOCUMENT_KEY = "document";
 constexpr char const* ERROR_KEY = "error";
 constexpr char const* EXTRACT_PRESET_KEY = "extract_preset";
@@ -22,6 +25,7 @@ constexpr char const* PAGES_KEY = "pages";
 constexpr char const* FIELDS_KEY = "fields";
 constexpr char const* READY_KEY = "production_ready";
 constexpr char const* MESSAGE_KEY = "message";
+constexpr char const* MISSING_KEY = "missing";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
 
 json::Value nameOrNull(Cfg::ExtractedField const* field) {
@@ -29,22 +33,30 @@ json::Value nameOrNull(Cfg::ExtractedField const* field) {
 }
 
 json::Object toJson(LetterReading const& letter) {
-    json::Array pages;
-    for (int const page : letter.pages)
-        pages.append(page);
     std::string message;
     bool const ready = letter.isProductionReady(message);
-    return {{PAGES_KEY, pages},
-            {FIELDS_KEY, letter.fields.serialize()},
-            {READY_KEY, ready},
-            {MESSAGE_KEY, message},
-            {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
+    json::Object object{{PAGES_KEY, toJsonArray(letter.pages)},
+                        {FIELDS_KEY, letter.fields.serialize()},
+                        {READY_KEY, ready},
+                        {MESSAGE_KEY, message},
+                        {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
+    if (letter.missing.empty())
+        return object;
+    json::Array missing;
+    for (std::string const& name : letter.missing)
+        missing.append(name);
+    object.set(MISSING_KEY, missing);
+    return object;
 }
 
 LetterReading letterFrom(json::Object const& object) {
-    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
+    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()), {}};
     for (json::Value const& page : object.get(PAGES_KEY).toArray())
         letter.pages.push_back(static_cast<int>(page.toInt()));
+    if (json::Value const missing = object.get(MISSING_KEY)) {
+        for (json::Value const& name : missing.toArray())
+            letter.missing.push_back(name.toString());
+    }
     return letter;
 }
 
@@ -87,7 +99,7 @@ findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings c
 std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPreset const& preset) {
     std::vector<LetterReading> letters;
     for (Reader::Letter& letter : Reader::readLetters(document, preset))
-        letters.push_back({std::move(letter.pages), std::move(letter.fields)});
+        letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing)});
     return letters;
 }
 
@@ -102,7 +114,27 @@ std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& l
     return blobs;
 }
 
+std::vector<std::vector<PageBlob>> pagesOf(Reader::Document& document, DocumentReading const& reading) {
+    std::vector<std::vector<PageBlob>> pages;
+    for (LetterReading const& letter : *reading.letters)
+        pages.push_back(blobsOf(document, letter));
+    return pages;
+}
+
+void fail(ReadResult& result, std::exception const& failure) {
+    result.reading.document = validUtf8(result.reading.document);
+    result.reading.error = validUtf8(failure.what());
+    result.pages.clear();
+}
+
 } // namespace
+
+json::Array toJsonArray(std::vector<int> const& numbers) {
+    json::Array array;
+    for (int const number : numbers)
+        array.append(number);
+    return array;
+}
 
 std::string LetterReading::whyNot() const {
     std::string message;
@@ -146,13 +178,15 @@ DocumentReading DocumentReading::fromJson(json::Object const& object) {
     return reading;
 }
 
-ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
-                        NodeSettings const& settings, WithPages withPages) {
+ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
+                        WithPages withPages) {
     ReadResult result;
     DocumentReading& reading = result.reading;
     reading.document = file.filename().string();
     try {
-        Reader::Document document = Reader::openDocument(file);
+        std::string bytes = Reader::readFile(file);
+        result.sha256 = sha256(bytes);
+        Reader::Document document = Reader::openDocument(std::move(bytes), file);
         auto const& [extractPreset, packPreset] = findPresets(reading.document, presets, settings);
         reading.extractPreset = extractPreset.strRegex();
         reading.packPreset = packPreset.name();
@@ -160,15 +194,29 @@ ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& p
             return result;
         requirePatterns(extractPreset, settings);
         reading.letters = lettersOf(document, extractPreset);
-        for (LetterReading const& letter : *reading.letters) {
-            result.pages.emplace_back();
-            if (withPages == WithPages::Yes)
-                result.pages.back() = blobsOf(document, letter);
-        }
+        if (withPages == WithPages::Yes)
+            result.pages = pagesOf(document, reading);
+        else
+            result.pages.resize(reading.letters->size());
     } catch (std::exception const& failure) {
-        reading.document = validUtf8(reading.document);
-        reading.error = validUtf8(failure.what());
-        result.pages.clear();
+        fail(result, failure);
+    }
+    return result;
+}
+
+ReadResult splitDocument(fs::path const& file, std::string const& digest, DocumentReading reading) {
+    ReadResult result{std::move(reading)};
+    if (!result.reading.letters)
+        return result;
+    try {
+        std::string bytes = Reader::readFile(file);
+        result.sha256 = sha256(bytes);
+        if (result.sha256 != digest)
+            throw Error('"' + file.string() + "\" has changed; make the plan again");
+        Reader::Document document = Reader::openDocument(std::move(bytes), file);
+        result.pages = pagesOf(document, result.reading);
+    } catch (std::exception const& failure) {
+        fail(result, failure);
     }
     return result;
 }

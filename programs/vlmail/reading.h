@@ -19,6 +19,8 @@ struct LetterReading {
     /// From 1.
     std::vector<int> pages;
     Cfg::ExtractedFields fields;
+    /// The obligatory fields that the letter does not have. They do not keep it from going out.
+    std::vector<std::string> missing = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -42,6 +44,8 @@ struct DocumentReading {
     bool isAttachment() const { return !failed() && !letters; }
 
     /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}.
+    /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and "missing" when
+    /// it misses obligatory fields.
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);
@@ -56,9 +60,14 @@ struct PageBlob {
 /// A document as read, and on request the pages of its letters.
 struct ReadResult {
     DocumentReading reading;
-    /// For each letter of the reading the blobs of its pages; empty for a letter that cannot go out.
-    std::vector<std::vector<PageBlob>> pages;
+    /// Of the file; empty when it could not be read.
+    std::string sha256 = {};
+    /// For each letter of the reading the blobs of its pages, when they were asked for; none for a letter
+    /// that cannot go out.
+    std::vector<std::vector<PageBlob>> pages = {};
 };
+
+json::Array toJsonArray(std::vector<int> const& numbers);
 
 enum class WithPages { No, Yes };
 
@@ -66,5 +75,10 @@ enum class WithPages { No, Yes };
 /// std::exception is thrown.
 ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
                         NodeSettings const& settings, WithPages withPages);
+
+/// The pages of a document that was read before, for the letters that can go out. A document that is not the
+/// one with that digest any more is a failure, said in the reading's `error`.
+ReadResult splitDocument(std::filesystem::path const& file, std::string const& sha256,
+                         DocumentReading reading);
 
 } // namespace VlMail

@@ -23,11 +23,16 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
     addLetterCommand(app, task);
     addMailCommand(app, task);
     addPackCommand(app, task);
+    addPlanCommand(app, task);
     try {
         app.parse(argc, argv);
         return task(terminal);
     } catch (CLI::ParseError const& wrong) {
-        return app.exit(wrong, terminal.out, terminal.err) == 0 ? FINE : FAILED;
+        // Asking for help is one of them.
+        if (wrong.get_exit_code() == 0)
+            return app.exit(wrong, terminal.out, terminal.err);
+        terminal.complain(std::string(wrong.what()) + "; --help explains");
+        return FAILED;
     } catch (std::exception const& failure) {
         terminal.complain(failure.what());
         return FAILED;

@@ -1,0 +1,92 @@
+#include "programs/vlmail/outgoing_mailing.h"
+
+#include "programs/mailing/pending_file.h"
+#include "programs/vlmail/command.h"
+#include "vlservice/pack/pack_wrapper.h"
+
+#include <iomanip>
+#include <random>
+#include <sstream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr char const* MAILING_ENDING = ".mailing";
+
+class MailingFile : public OutgoingMailing {
+public:
+    MailingFile(fs::path const& folder, Cfg::PackPreset const& preset, std::time_t now)
+        : MailingFile(folder, preset, now, newMailingId(now)) {}
+
+    MailingBuilder& builder() override { return builder_; }
+
+    void finish() override {
+        if (!container_.finalizeOutput(builder_.metadata().toBlob()))
+            throw Error("cannot write the mailing " + place() +
+                        ": the line above says why; make room on the disk and mail again");
+        file_.commit();
+    }
+
+    std::string place() const override { return file_.target().string(); }
+
+private:
+    MailingFile(fs::path const& folder, Cfg::PackPreset const& preset, std::time_t now, std::string const& id)
+        : file_(folder / (id + MAILING_ENDING)),
+          container_(file_.temporary().string(), PackWrapper::PURPOSE_OUTPUT, id),
+          builder_(container_, id, preset, now) {}
+
+    Mailing::PendingFile file_;
+    PackWrapper container_;
+    MailingBuilder builder_;
+};
+
+class PlannedMailing : public OutgoingMailing {
+public:
+    explicit PlannedMailing(Cfg::PackPreset const& preset) : builder_(nowhere_, {}, preset, 0) {}
+
+    MailingBuilder& builder() override { return builder_; }
+    void finish() override {}
+    std::string place() const override { return {}; }
+
+private:
+    struct Nowhere : PageSaverI {
+        Nowhere() : PageSaverI({}) {}
+        void savePage(std::string const&, std::string const&, SharedMemBuffer) override {}
+    };
+
+    Nowhere nowhere_;
+    MailingBuilder builder_;
+};
+
+} // namespace
+
+OutgoingMailing::~OutgoingMailing() = default;
+
+BeginMailing mailingsIntoFolder(fs::path const& folder) {
+    std::error_code failure;
+    fs::create_directories(folder, failure);
+    if (failure)
+        throw Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() +
+                    "; name another with -o");
+    return [folder](Cfg::PackPreset const& preset) {
+        return std::make_unique<MailingFile>(folder, preset, std::time(nullptr));
+    };
+}
+
+BeginMailing mailingsNowhere() {
+    return [](Cfg::PackPreset const& preset) { return std::make_unique<PlannedMailing>(preset); };
+}
+
+std::string newMailingId(std::time_t now) {
+    std::tm utc{};
+    gmtime_r(&now, &utc);
+    std::random_device random;
+    std::ostringstream id;
+    id << std::put_time(&utc, "%Y%m%dT%H%M%SZ-") << std::hex << std::setfill('0') << std::setw(8) << random();
+    return id.str();
+}
+
+} // namespace VlMail

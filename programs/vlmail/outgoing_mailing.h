@@ -1,0 +1,38 @@
+#pragma once
+// A mailing on its way to where it goes: a file, a service, or nowhere while only a plan is made.
+
+#include "programs/vlmail/mailing_builder.h"
+
+#include <ctime>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace VlMail {
+
+class OutgoingMailing {
+public:
+    virtual ~OutgoingMailing();
+
+    virtual MailingBuilder& builder() = 0;
+    /// Lets the mailing arrive. Throws std::exception with a line for people; nothing has arrived then.
+    virtual void finish() = 0;
+    /// Where it is once it has arrived.
+    virtual std::string place() const = 0;
+};
+
+/// Begins a mailing for a pack preset.
+using BeginMailing = std::function<std::unique_ptr<OutgoingMailing>(Cfg::PackPreset const&)>;
+
+/// Mailings as files "<id>.mailing" in a folder, which is made when it is missing. Throws Error when it
+/// cannot be made.
+BeginMailing mailingsIntoFolder(std::filesystem::path const& folder);
+
+/// Mailings that are only decided: their pages are thrown away.
+BeginMailing mailingsNowhere();
+
+/// Sorts by time and never comes twice.
+std::string newMailingId(std::time_t now);
+
+} // namespace VlMail
