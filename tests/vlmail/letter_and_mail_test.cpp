@@ -242,7 +242,7 @@ TEST_F(VlMailTest, RefusesAFolderThatCannotBeMade) {
 TEST_F(VlMailTest, LeavesNoHalfFileOnAFullDisk) {
     fs::create_directory(path("out"));
     if (::unshare(CLONE_NEWNS) != 0 || ::mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
-        ::mount("tmpfs", path("out").c_str(), "tmpfs", 0, "size=16k") != 0)
+        ::mount("tmpfs", path("out").c_str(), "tmpfs", 0, "size=8k") != 0)
         GTEST_SKIP() << "no right to mount a small disk: " << std::strerror(errno);
     std::string pages;
     for (int i = 0; i < 20; ++i)
