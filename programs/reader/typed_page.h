@@ -13,8 +13,10 @@ constexpr int TOP = 1000;
 
 constexpr double COLUMN = 2540.0 / 12;
 constexpr double ROW = 2540.0 / 6;
-/// 10 points, of which a letter of the font takes 6 in width: a column.
+/// 10 points, of which a letter takes 6 in width, a column.
 constexpr double POINTS = 10;
+/// Width of a letter in thousandths of the font size.
+constexpr int LETTER = 600;
 constexpr int SIZE = 353;
 /// From the top of a row's letters to the line they stand on.
 constexpr int ASCENT = 280;

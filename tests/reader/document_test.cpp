@@ -155,16 +155,34 @@ TEST(TextFiles, HaveALargerSheetWhereTheyNeedIt) {
 }
 
 TEST(TextFiles, BecomePdfsThatReadTheSame) {
-    std::string const text = "Herrn (Olaf) \\ Strößner\n04109 Leipzig €";
-    Document typed = openDocument(text, "a.txt");
-    Document printed = openDocument(typed.singlePagePdf(1), "a.pdf");
-    ASSERT_EQ(printed.pageCount(), 1);
-    EXPECT_EQ(linesOf(printed.page(1)), linesOf(typed.page(1)));
-    EXPECT_EQ(printed.page(1).width, typed.page(1).width);
-    ASSERT_EQ(printed.page(1).words.size(), typed.page(1).words.size());
-    for (std::size_t i = 0; i < typed.page(1).words.size(); ++i) {
-        EXPECT_NEAR(printed.page(1).words[i].box.left, typed.page(1).words[i].box.left, 2);
-        EXPECT_NEAR(printed.page(1).words[i].box.right, typed.page(1).words[i].box.right, 2);
+    for (std::string const text :
+         {"Herrn (Olaf) \\ Strößner\n04109 Leipzig €", "Pan Stanisław Żółkiewski\nul. Świętej Gertrudy 26/8",
+          "Γεώργιο Παπαδόπουλο\n105 63 ΑΘΗΝΑ", "Щербакову Алексею\nг. Москва № 5"}) {
+        Document typed = openDocument(text, "a.txt");
+        Document printed = openDocument(typed.singlePagePdf(1), "a.pdf");
+        ASSERT_EQ(printed.pageCount(), 1);
+        EXPECT_EQ(linesOf(printed.page(1)), linesOf(typed.page(1)));
+        EXPECT_EQ(printed.page(1).width, typed.page(1).width);
+        std::vector<Word> const& words = typed.page(1).words;
+        ASSERT_EQ(printed.page(1).words.size(), words.size());
+        for (std::size_t i = 0; i < words.size(); ++i) {
+            EXPECT_NEAR(printed.page(1).words[i].box.left, words[i].box.left, 2);
+            EXPECT_NEAR(printed.page(1).words[i].box.right, words[i].box.right, 2);
+        }
+    }
+}
+
+TEST(TextFiles, EmbedOnlyTheLettersThatAreUsed) {
+    EXPECT_LT(openDocument(std::string("Leipzig"), "a.txt").singlePagePdf(1).size(), 1500U);
+    EXPECT_LT(openDocument(std::string("ΑΘΗΝΑ"), "a.txt").singlePagePdf(1).size(), 30000U);
+}
+
+TEST(TextFiles, WithLettersThatNoFontHasSaySo) {
+    try {
+        openDocument(std::string("a\f中文"), "a.txt").singlePagePdf(2);
+        FAIL();
+    } catch (Error const& error) {
+        EXPECT_STREQ(error.what(), "a.txt: page 2: no font for \"中文\"; export the document as PDF");
     }
 }
 
