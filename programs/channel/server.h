@@ -32,7 +32,7 @@ struct ServerSettings {
     /// For TLS and the exchange of proofs.
     std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
     /// For the rest of a message whose first byte is there, and for a peer to take an answer.
-    std::chrono::milliseconds messageTime = std::chrono::seconds(30);
+    std::chrono::milliseconds messageTime = std::chrono::seconds(60);
     /// For all large requests at once; further ones wait.
     std::size_t requestMemory = 64 * 1024 * 1024;
 };
@@ -42,7 +42,7 @@ struct ServerSettings {
 /// caller afterwards.
 class Answer {
 public:
-    struct State;
+    class State;
     explicit Answer(std::shared_ptr<State> state) : state_(std::move(state)) {}
 
     /// The command's response goes out.

@@ -1,0 +1,51 @@
+#include "programs/channel/client.h"
+
+#include "programs/channel/client_connection.h"
+
+#include <boost/asio/io_context.hpp>
+
+#include <optional>
+
+namespace Channel {
+
+class Client::Impl {
+public:
+    explicit Impl(ClientSettings settings) : connection_(ClientConnection::make(io_, std::move(settings))) {
+        wait([&](ClientConnection::Done done) { connection_->connect(std::move(done)); });
+    }
+    ~Impl() { connection_->close(); }
+    Impl(Impl const&) = delete;
+    Impl& operator=(Impl const&) = delete;
+
+    std::shared_ptr<Ipc::CmdProcessorI> processor() const { return connection_; }
+    void send(std::shared_ptr<Ipc::CmdI> const& cmd) {
+        wait([&](ClientConnection::Done done) {
+            connection_->submit(cmd, std::move(done));
+            connection_->sendNext();
+        });
+    }
+
+private:
+    /// Starts something and runs until it is done.
+    template<typename Start>
+    void wait(Start start) {
+        auto const result = std::make_shared<std::optional<std::string>>();
+        start([result](std::string const& failure) { *result = failure; });
+        io_.restart();
+        while (!*result)
+            io_.run_one();
+        if (!(*result)->empty())
+            throw Error(**result);
+    }
+
+    boost::asio::io_context io_;
+    std::shared_ptr<ClientConnection> connection_;
+};
+
+Client::Client(ClientSettings settings) : impl_(std::make_unique<Impl>(std::move(settings))) {}
+Client::~Client() = default;
+
+std::shared_ptr<Ipc::CmdProcessorI> Client::processor() const { return impl_->processor(); }
+void Client::send(std::shared_ptr<Ipc::CmdI> const& cmd) { impl_->send(cmd); }
+
+} // namespace Channel

@@ -1,0 +1,368 @@
+#include "programs/channel/client_connection.h"
+
+#include "programs/channel/greeting.h"
+#include "programs/channel/message_text.h"
+#include "programs/channel/pin_store.h"
+#include "programs/channel/token.h"
+
+#include <boost/asio/connect.hpp>
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/post.hpp>
+
+#include <algorithm>
+#include <limits>
+#include <utility>
+
+namespace Channel {
+
+namespace asio = boost::asio;
+
+namespace {
+
+std::string inSeconds(std::chrono::milliseconds time) {
+    auto const milliseconds = time.count() % 1000;
+    std::string text = std::to_string(time.count() / 1000);
+    if (milliseconds != 0)
+        text += '.' + std::to_string(1000 + milliseconds).substr(1);
+    return text + " s";
+}
+
+Deadline::Clock::time_point dueAfter(std::chrono::milliseconds time) {
+    return time.count() > 0 ? Deadline::Clock::now() + time : Deadline::NEVER;
+}
+
+} // namespace
+
+std::shared_ptr<ClientConnection> ClientConnection::make(asio::io_context& io, ClientSettings settings) {
+    std::shared_ptr<ClientConnection> connection(new ClientConnection(io, std::move(settings)));
+    std::weak_ptr const weak(connection);
+    connection->connectDeadline_.emplace(io, [weak] {
+        if (auto const self = weak.lock())
+            self->fail("It does not let us in within " + inSeconds(self->settings_.connectTime) + '.');
+    });
+    connection->deadline_.emplace(io, [weak] {
+        if (auto const self = weak.lock())
+            self->onDue();
+    });
+    return connection;
+}
+
+ClientConnection::ClientConnection(asio::io_context& io, ClientSettings settings)
+    : io_(&io), settings_(std::move(settings)) {}
+
+// --- connecting
+
+void ClientConnection::connect(Done done) {
+    connected_ = std::move(done);
+    state_ = State::Connecting;
+    connectDeadline_->set(dueAfter(settings_.connectTime));
+    resolve();
+}
+
+void ClientConnection::resolve() {
+    error_code ec;
+    auto const address = asio::ip::make_address(settings_.host, ec);
+    if (!ec)
+        return connectTo({tcp::endpoint(address, settings_.port)});
+    resolver_.emplace(*io_);
+    resolver_->async_resolve(
+        settings_.host, std::to_string(settings_.port),
+        [self = shared_from_this()](error_code const& resolved, tcp::resolver::results_type const& results) {
+            if (self->state_ == State::Closed)
+                return;
+            if (resolved)
+                return self->fail("The host cannot be found: " + resolved.message() + '.');
+            self->connectTo({results.begin(), results.end()});
+        });
+}
+
+void ClientConnection::connectTo(std::vector<tcp::endpoint> endpoints) {
+    socket_.emplace(*io_);
+    auto const kept = std::make_shared<std::vector<tcp::endpoint>>(std::move(endpoints));
+    asio::async_connect(
+        *socket_, *kept, [self = shared_from_this(), kept](error_code const& ec, tcp::endpoint const&) {
+            if (self->state_ == State::Closed)
+                return;
+            if (ec)
+                return self->fail("Nobody answers there: " + ec.message() + '.');
+            self->orFail([&] { self->onConnected(*std::exchange(self->socket_, std::nullopt)); });
+        });
+}
+
+void ClientConnection::onConnected(tcp::socket socket) {
+    socket.set_option(tcp::no_delay(true));
+    socket.set_option(asio::socket_base::keep_alive(true));
+    bool const isTls =
+        settings_.tls == ClientSettings::Tls::Always || !isLoopback(socket.remote_endpoint().address());
+    if (isTls) {
+        tls_ = makeClientContext();
+        link_ = std::make_shared<Link>(makeTlsStream(std::move(socket), *tls_, TlsRole::Client));
+    } else {
+        link_ = std::make_shared<Link>(makePlainStream(std::move(socket)));
+    }
+    link_->stream().handshake([self = shared_from_this()](error_code const& ec) {
+        if (self->state_ == State::Closed)
+            return;
+        if (ec)
+            return self->fail("TLS failed: " + ec.message() + '.');
+        self->orFail([&] { self->onHandshake(); });
+    });
+}
+
+void ClientConnection::onHandshake() {
+    if (tls_) {
+        fingerprint_ = link_->stream().fingerprint();
+        requirePinned();
+    }
+    challenge();
+}
+
+void ClientConnection::requirePinned() const {
+    PinStore const pins(settings_.pinFile);
+    auto const pinned = pins.find(service());
+    if (!pinned && !settings_.acceptNew)
+        throw Error("Its certificate is new: " + fingerprint_ + ". It must be accepted first.");
+    if (pinned && *pinned != fingerprint_)
+        throw Error("Its certificate has changed from " + *pinned + " to " + fingerprint_ +
+                    ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
+}
+
+void ClientConnection::challenge() {
+    clientNonce_ = makeNonce();
+    link_->limitText(MAX_GREETING);
+    link_->allow(HEADER_SIZE + MAX_TEXT);
+    write({GREETING, Kind::Request, CHALLENGE, print({{NONCE, clientNonce_}})},
+          [this] { receive([this](Frame const& message) { onChallenged(message); }); });
+}
+
+namespace {
+
+json::Object greetingIn(Frame const& message, std::uint32_t sequence) {
+    if (message.kind == Kind::Error)
+        throw Error("It refuses: " + reasonOf(message.text));
+    if (message.command != GREETING || message.kind != Kind::Response || message.sequence != sequence)
+        throw Error("It does not greet.");
+    return parse(message.text);
+}
+
+} // namespace
+
+void ClientConnection::onChallenged(Frame const& message) {
+    json::Object const answer = greetingIn(message, CHALLENGE);
+    std::string const serviceNonce = answer.get(NONCE).toString();
+    if (!isSameProof(answer.get(PROOF).toString(),
+                     makeProof(Side::Service, settings_.token, clientNonce_, serviceNonce, fingerprint_)))
+        throw Error("Whoever answers there does not know our access token.");
+    std::string const proof =
+        makeProof(Side::Client, settings_.token, clientNonce_, serviceNonce, fingerprint_);
+    write({GREETING, Kind::Request, PROVING, print({{PROOF, proof}})}, [this] {
+        receive([this](Frame const& welcome) {
+            greetingIn(welcome, PROVING);
+            onWelcome();
+        });
+    });
+}
+
+void ClientConnection::onWelcome() {
+    if (tls_)
+        pinNew();
+    link_->limitText(MAX_TEXT);
+    connectDeadline_.reset();
+    sequence_ = FIRST_COMMAND;
+    state_ = State::Ready;
+    if (auto const connected = std::exchange(connected_, nullptr))
+        connected({});
+    pump();
+}
+
+void ClientConnection::pinNew() {
+    PinStore const pins(settings_.pinFile);
+    if (pins.find(service()))
+        return;
+    if (!settings_.acceptNew(service(), fingerprint_))
+        throw Error("Its certificate was not accepted.");
+    pins.add(service(), fingerprint_);
+}
+
+// --- the queue
+
+void ClientConnection::submit(std::shared_ptr<Ipc::CmdI> cmd, Done done) {
+    auto const time = settings_.requestTime(cmd->reqTimeoutId());
+    Request request{std::move(cmd), std::move(done), time, dueAfter(time)};
+    if (state_ == State::Closed)
+        return failRequest(request, failure_);
+    deadline_->setNoLaterThan(request.due);
+    requests_.push_back(std::move(request));
+    pump();
+}
+
+void ClientConnection::sendNext() {
+    isHeld_ = false;
+    pump();
+}
+
+void ClientConnection::pump() {
+    while (state_ == State::Ready && !isBusy_ && !isHeld_ && !requests_.empty())
+        begin();
+}
+
+void ClientConnection::begin() {
+    isBusy_ = true;
+    isSent_ = false;
+    auto const cmd = requests_.front().cmd;
+    try {
+        cmd->sendReq();
+        if (!isSent_ && state_ == State::Ready)
+            endRequest("It was not built for this connection.");
+    } catch (std::exception const& e) {
+        if (isSent_)
+            fail(e.what());
+        else
+            endRequest(e.what());
+    }
+}
+
+void ClientConnection::send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json::Object const& message,
+                            std::function<void()> gone) {
+    if (!isBusy_ || isSent_ || cmd != requests_.front().cmd || which != Message::Request)
+        return cmd->onTransferError("It is not its turn.");
+    write({cmd->id(), Kind::Request, sequence_, print(message)}, [this, cmd, gone = std::move(gone)] {
+        gone();
+        cmd->readResp();
+        if (!taken_)
+            throw Error("This command cannot take an answer.");
+    });
+    isSent_ = true;
+}
+
+void ClientConnection::read(std::shared_ptr<Ipc::CmdI> cmd, Message which,
+                            std::function<void(json::Object const&)> taken) {
+    if (!isBusy_ || !isSent_ || taken_ || cmd != requests_.front().cmd || which != Message::Response)
+        return cmd->onTransferError("There is nothing to be read for it.");
+    taken_ = std::move(taken);
+    receive([this](Frame const& message) { takeAnswer(message); });
+}
+
+void ClientConnection::takeAnswer(Frame const& message) {
+    bool const isAnswer = message.command == requests_.front().cmd->id() && message.sequence == sequence_ &&
+                          message.kind != Kind::Request;
+    if (!isAnswer && message.kind == Kind::Error)
+        throw Error("It closes the connection: " + reasonOf(message.text));
+    if (!isAnswer)
+        throw Error("It answers what was not asked.");
+    std::string failure;
+    try {
+        if (message.kind == Kind::Error)
+            failure = "The service refuses: " + reasonOf(message.text);
+        else
+            taken_(parse(message.text));
+    } catch (std::exception const& e) {
+        failure = std::string("The answer cannot be used: ") + e.what();
+    }
+    endRequest(failure);
+    pump();
+}
+
+void ClientConnection::endRequest(std::string const& failure) {
+    Request request = std::move(requests_.front());
+    requests_.pop_front();
+    taken_ = nullptr;
+    sequence_ = sequence_ == std::numeric_limits<std::uint32_t>::max() ? FIRST_COMMAND : sequence_ + 1;
+    isHeld_ = !request.cmd->sendNextReqAfterDone();
+    // Still busy, so that what the functions submit waits for its turn.
+    if (!failure.empty())
+        failRequest(request, failure);
+    else if (request.done)
+        request.done({});
+    isBusy_ = false;
+}
+
+void ClientConnection::failRequest(Request& request, std::string const& reason) {
+    request.cmd->onTransferError(reason);
+    if (request.done)
+        request.done(reason);
+}
+
+void ClientConnection::onDue() {
+    auto const now = Deadline::Clock::now();
+    if (isBusy_ && !requests_.empty() && requests_.front().due <= now)
+        return fail("It gives no answer within " + inSeconds(requests_.front().time) + '.');
+    std::deque<Request> late;
+    auto next = Deadline::NEVER;
+    auto const waiting = requests_.begin() + (isBusy_ && !requests_.empty() ? 1 : 0);
+    auto const firstLate =
+        std::stable_partition(waiting, requests_.end(), [&](Request const& r) { return r.due > now; });
+    std::move(firstLate, requests_.end(), std::back_inserter(late));
+    requests_.erase(firstLate, requests_.end());
+    for (Request const& request : requests_)
+        next = std::min(next, request.due);
+    deadline_->setNoLaterThan(next);
+    for (Request& request : late)
+        failRequest(request, "Its turn did not come within " + inSeconds(request.time) + '.');
+}
+
+// --- the connection
+
+void ClientConnection::write(Frame const& message, std::function<void()> gone) {
+    std::string bytes = prefaceSent_ ? std::string() : preface();
+    appendFrame(bytes, message);
+    prefaceSent_ = true;
+    link_->send(std::move(bytes), [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
+        if (self->state_ == State::Closed)
+            return;
+        if (ec)
+            return self->fail("The connection broke: " + ec.message() + '.');
+        self->orFail(gone);
+    });
+}
+
+void ClientConnection::receive(std::function<void(Frame const&)> onMessage) {
+    link_->receive([self = shared_from_this(), onMessage = std::move(onMessage)](Received const& received) {
+        if (self->state_ == State::Closed)
+            return;
+        if (received.what != Received::What::Message)
+            return self->fail(received.reason);
+        self->orFail([&] { onMessage(received.message); });
+    });
+}
+
+template<typename Step>
+void ClientConnection::orFail(Step step) {
+    try {
+        step();
+    } catch (std::exception const& e) {
+        fail(e.what());
+    }
+}
+
+void ClientConnection::close() { end("The connection was closed."); }
+
+void ClientConnection::fail(std::string const& reason) { end(service() + ": " + reason); }
+
+void ClientConnection::end(std::string const& reason) {
+    if (state_ == State::Closed)
+        return;
+    auto const self = shared_from_this();
+    state_ = State::Closed;
+    failure_ = reason;
+    connectDeadline_.reset();
+    deadline_.reset();
+    resolver_.reset();
+    socket_.reset();
+    if (link_)
+        link_->close();
+    link_.reset();
+    taken_ = nullptr;
+    auto const requests = std::exchange(requests_, {});
+    if (auto const connected = std::exchange(connected_, nullptr))
+        connected(failure_);
+    for (Request request : requests)
+        failRequest(request, failure_);
+}
+
+std::string ClientConnection::service() const {
+    bool const isIp6 = settings_.host.find(':') != std::string::npos;
+    return (isIp6 ? '[' + settings_.host + ']' : settings_.host) + ':' + std::to_string(settings_.port);
+}
+
+} // namespace Channel

@@ -1,0 +1,70 @@
+#pragma once
+// Messages over a stream, one at a time in each direction.
+
+#include "programs/channel/frame.h"
+#include "programs/channel/stream.h"
+
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace Channel {
+
+struct Received {
+    enum class What {
+        Message,
+        /// A message has begun that is larger than allowed so far.
+        Large,
+        /// The other side closed the connection between two messages.
+        End,
+        /// It closed the connection inside a message.
+        Cut,
+        /// What came is not of this protocol.
+        Malformed,
+        Broken
+    };
+    What what;
+    Frame message;
+    /// One line for a person, when there is no message.
+    std::string reason;
+};
+
+/// The functions that it is given keep their owner alive, and this object lives as long as one of them is
+/// waiting. After close they come back as broken.
+class Link : public std::enable_shared_from_this<Link> {
+public:
+    /// Messages up to this size need not be allowed.
+    static constexpr std::size_t SMALL = 64 * 1024;
+
+    explicit Link(std::unique_ptr<Stream> stream) : stream_(std::move(stream)) {}
+
+    Stream& stream() { return *stream_; }
+
+    void limitText(std::uint32_t limit) { decoder_.limitText(limit); }
+    /// How large a message may be before it is reported as large.
+    void allow(std::size_t size) { allowed_ = size; }
+    /// The size of the message that has begun.
+    std::size_t announced() const { return decoder_.announced(); }
+    /// Called each time when only a part of a message is there.
+    void onPart(std::function<void()> onPart) { onPart_ = std::move(onPart); }
+
+    /// The message is valid until the next call.
+    void receive(std::function<void(Received const&)> done);
+    void send(std::string bytes, Stream::Done done);
+    /// Says that nothing more will come, and throws away what still comes until the other side closes, so
+    /// that it gets what was sent last.
+    void finish(std::function<void()> done);
+    void close();
+
+private:
+    void readMore(std::function<void(Received const&)> done);
+    void drain(std::size_t left, std::function<void()> done);
+
+    std::unique_ptr<Stream> stream_;
+    FrameDecoder decoder_;
+    std::size_t allowed_ = SMALL;
+    std::function<void()> onPart_;
+    std::string sending_;
+};
+
+} // namespace Channel

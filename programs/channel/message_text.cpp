@@ -1,0 +1,41 @@
+#include "programs/channel/message_text.h"
+
+#include "vlservice/platform/json_text.h"
+
+#include <algorithm>
+#include <sstream>
+
+namespace Channel {
+namespace {
+
+constexpr char const* ERR = "err";
+
+} // namespace
+
+std::string print(json::Object const& object) {
+    std::ostringstream text;
+    text << object;
+    return std::move(text).str();
+}
+
+json::Object parse(std::string_view text) { return json::strToObject(text.data(), text.size()); }
+
+std::string printError(std::string reason) {
+    try {
+        return print({{ERR, reason}});
+    } catch (json::Exc const&) {
+        std::replace_if(
+            reason.begin(), reason.end(), [](char c) { return static_cast<unsigned char>(c) >= 0x80; }, '?');
+        return print({{ERR, reason}});
+    }
+}
+
+std::string reasonOf(std::string_view errorText) {
+    try {
+        return parse(errorText).get(ERR).toString();
+    } catch (json::Exc const&) {
+        return "It gave no reason.";
+    }
+}
+
+} // namespace Channel

@@ -1,0 +1,402 @@
+#include "programs/channel/peer.h"
+
+#include "programs/channel/greeting.h"
+#include "programs/channel/message_text.h"
+#include "programs/channel/token.h"
+
+#include "vlservice/platform/log.h"
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/dispatch.hpp>
+#include <boost/asio/error.hpp>
+#include <boost/asio/io_context.hpp>
+
+#include <atomic>
+#include <sstream>
+
+namespace Channel {
+
+namespace asio = boost::asio;
+
+namespace {
+
+constexpr LogPriority FAILED = 4;
+constexpr LogPriority TRACE = 7;
+
+/// What a TLS client begins with.
+constexpr char TLS_HANDSHAKE = 0x16;
+
+std::string nameOf(tcp::socket const& socket) {
+    error_code ec;
+    std::ostringstream name;
+    name << socket.remote_endpoint(ec);
+    return name.str();
+}
+
+} // namespace
+
+// --- answers
+
+class Answer::State {
+public:
+    State(asio::io_context& io, std::weak_ptr<Peer> peer) : io_(io), peer_(std::move(peer)) {}
+    ~State() { end("The service gave no answer."); }
+
+    void end(std::optional<std::string> failure) {
+        if (isEnded_.exchange(true) || peer_.expired())
+            return;
+        asio::dispatch(io_, [weak = peer_, failure = std::move(failure)] {
+            if (auto const peer = weak.lock())
+                peer->answered(failure);
+        });
+    }
+
+private:
+    asio::io_context& io_;
+    std::weak_ptr<Peer> peer_;
+    std::atomic<bool> isEnded_ = false;
+};
+
+void Answer::operator()() const { state_->end(std::nullopt); }
+void Answer::fail(std::string const& reason) const { state_->end(reason); }
+
+// --- from connection to greeting
+
+std::shared_ptr<Peer> Peer::make(asio::io_context& io, std::shared_ptr<PeerContext> context,
+                                 tcp::socket socket) {
+    std::shared_ptr<Peer> peer(new Peer(io, std::move(context), std::move(socket)));
+    peer->deadline_.emplace(io, [weak = std::weak_ptr(peer)] {
+        if (auto const self = weak.lock())
+            self->onDue();
+    });
+    return peer;
+}
+
+Peer::Peer(asio::io_context& io, std::shared_ptr<PeerContext> context, tcp::socket socket)
+    : context_(std::move(context)), io_(io), name_(nameOf(socket)), socket_(std::move(socket)) {}
+
+void Peer::start() {
+    log(TRACE, "It connects.");
+    setDeadline(context_->settings().greetingTime, "It does not greet.");
+    if (context_->tls()) {
+        expectTls();
+    } else {
+        link_ = std::make_shared<Link>(makePlainStream(*std::exchange(socket_, std::nullopt)));
+        receive();
+    }
+}
+
+void Peer::expectTls() {
+    socket_->async_wait(tcp::socket::wait_read,
+                        [self = shared_from_this()](error_code const& ec) { self->onFirstByte(ec); });
+}
+
+void Peer::onFirstByte(error_code const& waited) {
+    if (state_ == State::Closed)
+        return;
+    char first = 0;
+    error_code ec = waited;
+    if (!ec)
+        socket_->non_blocking(true, ec);
+    if (!ec)
+        socket_->receive(asio::buffer(&first, 1), tcp::socket::message_peek, ec);
+    if (ec == asio::error::would_block)
+        return expectTls();
+    if (ec) {
+        log(TRACE, "It left before it said anything.");
+        return close();
+    }
+    tcp::socket socket = *std::exchange(socket_, std::nullopt);
+    if (first == TLS_HANDSHAKE) {
+        link_ = std::make_shared<Link>(makeTlsStream(std::move(socket), *context_->tls(), TlsRole::Service));
+        shakeHands();
+    } else {
+        link_ = std::make_shared<Link>(makePlainStream(std::move(socket)));
+        refuse("This service speaks TLS alone.");
+    }
+}
+
+void Peer::shakeHands() {
+    link_->stream().handshake([self = shared_from_this()](error_code const& ec) {
+        if (self->state_ == State::Closed)
+            return;
+        if (ec) {
+            self->log(FAILED, "TLS failed: " + ec.message() + '.');
+            return self->close();
+        }
+        self->receive();
+    });
+}
+
+// --- receiving
+
+void Peer::receive() {
+    if (state_ == State::Greeting)
+        link_->limitText(MAX_GREETING);
+    link_->receive([self = shared_from_this()](Received const& received) { self->onReceived(received); });
+}
+
+void Peer::onReceived(Received const& received) {
+    if (state_ == State::Leaving || state_ == State::Closed)
+        return;
+    switch (received.what) {
+    case Received::What::Message:
+        return onMessage(received.message);
+    case Received::What::Large:
+        return onLarge();
+    case Received::What::Cut:
+    case Received::What::Malformed:
+        return refuse(received.reason);
+    case Received::What::End:
+        log(TRACE, received.reason);
+        return close();
+    case Received::What::Broken:
+        log(FAILED, received.reason);
+        return close();
+    }
+}
+
+void Peer::onPart() {
+    if (state_ == State::Ready && !std::exchange(isInsideMessage_, true))
+        setDeadline(context_->settings().messageTime, "The rest of its message does not come.");
+}
+
+void Peer::onLarge() {
+    // While it waits for others, its time stands still.
+    deadline_->clear();
+    isInsideMessage_ = false;
+    context_->reserve(link_->announced(), shared_from_this());
+}
+
+void Peer::onReserved(std::size_t size) {
+    if (state_ == State::Closed)
+        return context_->release(size);
+    reserved_ = size;
+    link_->allow(size);
+    receive();
+}
+
+void Peer::onMessage(Frame const& message) {
+    switch (state_) {
+    case State::Greeting:
+        return onChallenge(message);
+    case State::Proving:
+        return onProof(message);
+    case State::Ready:
+        return onRequest(message);
+    case State::Leaving:
+    case State::Closed:
+        return;
+    }
+}
+
+// --- the greeting
+
+namespace {
+
+std::string textUnder(char const* key, Frame const& message, std::uint32_t sequence) {
+    if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
+        throw Error("The greeting is missing.");
+    return parse(message.text).get(key).toString();
+}
+
+} // namespace
+
+void Peer::onChallenge(Frame const& message) {
+    try {
+        clientNonce_ = textUnder(NONCE, message, CHALLENGE);
+        serviceNonce_ = makeNonce();
+    } catch (std::exception const& e) {
+        return refuse(e.what());
+    }
+    state_ = State::Proving;
+    std::string const text = print({{NONCE, serviceNonce_},
+                                    {PROOF, makeProof(Side::Service, context_->settings().token, clientNonce_,
+                                                      serviceNonce_, context_->fingerprint())}});
+    write({GREETING, Kind::Response, CHALLENGE, text}, [this] { receive(); });
+}
+
+void Peer::onProof(Frame const& message) {
+    std::string proof;
+    try {
+        proof = textUnder(PROOF, message, PROVING);
+    } catch (std::exception const& e) {
+        return refuse(e.what());
+    }
+    if (!isSameProof(proof, makeProof(Side::Client, context_->settings().token, clientNonce_, serviceNonce_,
+                                      context_->fingerprint())))
+        return refuse("Its access token is not the one of this service.");
+    write({GREETING, Kind::Response, PROVING, "{}"}, [this] {
+        state_ = State::Ready;
+        deadline_->clear();
+        link_->limitText(MAX_TEXT);
+        link_->onPart([weak = weak_from_this()] {
+            if (auto const self = weak.lock())
+                self->onPart();
+        });
+        receive();
+    });
+}
+
+// --- requests
+
+void Peer::onRequest(Frame const& message) {
+    isInsideMessage_ = false;
+    deadline_->clear();
+    if (message.kind != Kind::Request)
+        return refuse("Only requests are expected here.");
+    request_ = Request{message, {}};
+    try {
+        takeRequest(message.command);
+    } catch (std::exception const& e) {
+        return refuseRequest(e.what());
+    }
+    Answer const answer(std::make_shared<Answer::State>(io_, weak_from_this()));
+    try {
+        context_->handler()(request_->cmd, answer);
+    } catch (std::exception const& e) {
+        answer.fail(e.what());
+    }
+}
+
+void Peer::takeRequest(std::uint8_t command) {
+    request_->cmd = context_->factory()(command, shared_from_this());
+    if (!request_->cmd)
+        throw Error("There is no command with the number " + std::to_string(command) + '.');
+    request_->cmd->readReq();
+    if (!request_->isRead)
+        throw Error("This command cannot be received.");
+}
+
+void Peer::read(std::shared_ptr<Ipc::CmdI> cmd, Message which,
+                std::function<void(json::Object const&)> taken) {
+    if (!request_ || cmd != request_->cmd || which != Message::Request || request_->isRead)
+        return cmd->onTransferError("There is nothing to be read for it.");
+    request_->isRead = true;
+    taken(parse(request_->message.text));
+}
+
+void Peer::answered(std::optional<std::string> const& failure) {
+    if (!request_ || state_ != State::Ready)
+        return;
+    if (failure)
+        return refuseRequest(*failure);
+    try {
+        request_->cmd->sendResp();
+    } catch (std::exception const& e) {
+        return refuseRequest(e.what());
+    }
+    if (!request_->isAnswered)
+        refuseRequest("This command cannot be answered.");
+}
+
+void Peer::send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json::Object const& message,
+                std::function<void()> gone) {
+    if (!request_ || cmd != request_->cmd || which != Message::Response || request_->isAnswered)
+        return cmd->onTransferError("Nobody has asked for it.");
+    Frame const to = request_->message;
+    write({to.command, Kind::Response, to.sequence, print(message)}, [this, gone = std::move(gone)] {
+        tellGone(gone);
+        endRequest();
+    });
+    request_->isAnswered = true;
+}
+
+void Peer::tellGone(std::function<void()> const& gone) const {
+    try {
+        gone();
+    } catch (std::exception const& e) {
+        log(FAILED, e.what());
+    }
+}
+
+void Peer::submit(std::shared_ptr<Ipc::CmdI> cmd) { cmd->onTransferError("A service sends no requests."); }
+
+void Peer::refuseRequest(std::string const& reason) {
+    log(FAILED, "Request " + std::to_string(request_->message.command) + " failed: " + reason);
+    Frame const to = request_->message;
+    request_->isAnswered = true;
+    write({to.command, Kind::Error, to.sequence, printError(reason)}, [this] { endRequest(); });
+}
+
+void Peer::endRequest() {
+    request_.reset();
+    context_->release(std::exchange(reserved_, 0));
+    link_->allow(Link::SMALL);
+    if (context_->isStopping())
+        close();
+    else
+        receive();
+}
+
+// --- writing
+
+void Peer::write(Frame const& message, std::function<void()> gone) {
+    std::string bytes = prefaceSent_ ? std::string() : preface();
+    appendFrame(bytes, message);
+    prefaceSent_ = true;
+    // Greeting and leaving have a time as a whole.
+    if (state_ == State::Ready)
+        setDeadline(context_->settings().messageTime, "It does not take its answer.");
+    link_->send(std::move(bytes), [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
+        if (self->state_ == State::Closed)
+            return;
+        if (ec) {
+            self->log(FAILED, ec.message() + '.');
+            return self->close();
+        }
+        if (self->state_ == State::Ready)
+            self->deadline_->clear();
+        gone();
+    });
+}
+
+// --- the end
+
+void Peer::refuse(std::string const& reason) {
+    log(FAILED, reason);
+    state_ = State::Leaving;
+    setDeadline(context_->settings().greetingTime, "It does not leave.");
+    write({GREETING, Kind::Error, 0, printError(reason)},
+          [this] { link_->finish([self = shared_from_this()] { self->close(); }); });
+}
+
+void Peer::stop() {
+    if (!request_)
+        close();
+}
+
+void Peer::close() {
+    if (state_ == State::Closed)
+        return;
+    state_ = State::Closed;
+    auto const self = shared_from_this();
+    // The command holds this object as its processor.
+    request_.reset();
+    deadline_.reset();
+    socket_.reset();
+    if (link_)
+        link_->close();
+    link_.reset();
+    context_->release(std::exchange(reserved_, 0));
+    context_->leave(self);
+}
+
+void Peer::setDeadline(std::chrono::milliseconds time, std::string reason) {
+    dueReason_ = std::move(reason);
+    deadline_->set(time);
+}
+
+void Peer::onDue() {
+    log(FAILED, dueReason_);
+    close();
+}
+
+void Peer::log(int priority, std::string const& text) const {
+    if (priority == TRACE && !g_LogVerbose)
+        return;
+    Log::Lock line(priority);
+    line.logStreamLine() << "Channel " << name_ << ": " << text;
+}
+
+} // namespace Channel

@@ -1,0 +1,113 @@
+#pragma once
+// One client as its service sees it: the greeting, then a request and its answer, one after the other.
+
+#include "programs/channel/deadline.h"
+#include "programs/channel/link.h"
+#include "programs/channel/server.h"
+
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace Channel {
+
+class Peer;
+
+/// What all peers of a service share.
+class PeerContext {
+public:
+    virtual ~PeerContext() = default;
+
+    virtual ServerSettings const& settings() const = 0;
+    virtual std::string const& fingerprint() const = 0;
+    /// Null without TLS.
+    virtual boost::asio::ssl::context* tls() = 0;
+    virtual Server::Factory const& factory() const = 0;
+    virtual Server::Handler const& handler() const = 0;
+    virtual bool isStopping() const = 0;
+
+    /// Takes memory for a large request and calls the peer's onReserved, now or as soon as there is some.
+    virtual void reserve(std::size_t size, std::shared_ptr<Peer> peer) = 0;
+    virtual void release(std::size_t size) = 0;
+    virtual void leave(std::shared_ptr<Peer> const& peer) = 0;
+};
+
+/// The processor and the carrier of the commands that it receives. It must be closed: what it handles holds
+/// it.
+class Peer : public Ipc::CmdProcessorI, public Ipc::CmdTransferI, public std::enable_shared_from_this<Peer> {
+public:
+    static std::shared_ptr<Peer> make(boost::asio::io_context& io, std::shared_ptr<PeerContext> context,
+                                      tcp::socket socket);
+
+    void start();
+    /// A large request may go on.
+    void onReserved(std::size_t size);
+    /// Closes at once, or when the command that is being handled has been answered.
+    void stop();
+    void close();
+    /// The handling has ended, with the reason when it failed.
+    void answered(std::optional<std::string> const& failure);
+
+    // A service sends no requests of its own.
+    void submit(std::shared_ptr<Ipc::CmdI> cmd) override;
+    Ipc::CmdTransferI* transfer() override { return this; }
+    void send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json::Object const& message,
+              std::function<void()> gone) override;
+    void read(std::shared_ptr<Ipc::CmdI> cmd, Message which,
+              std::function<void(json::Object const&)> taken) override;
+
+private:
+    enum class State { Greeting, Proving, Ready, Leaving, Closed };
+
+    /// The request that is being handled.
+    struct Request {
+        Frame message;
+        std::shared_ptr<Ipc::CmdI> cmd;
+        bool isRead = false;
+        bool isAnswered = false;
+    };
+
+    Peer(boost::asio::io_context& io, std::shared_ptr<PeerContext> context, tcp::socket socket);
+
+    void expectTls();
+    void onFirstByte(error_code const& ec);
+    void shakeHands();
+    void receive();
+    void onReceived(Received const& received);
+    void onPart();
+    void onLarge();
+    void onMessage(Frame const& message);
+    void onChallenge(Frame const& message);
+    void onProof(Frame const& message);
+    void onRequest(Frame const& message);
+    void takeRequest(std::uint8_t command);
+
+    void write(Frame const& message, std::function<void()> gone);
+    void setDeadline(std::chrono::milliseconds time, std::string reason);
+    void refuseRequest(std::string const& reason);
+    void tellGone(std::function<void()> const& gone) const;
+    void endRequest();
+    /// Tells the peer and the log what is wrong with it, and closes.
+    void refuse(std::string const& reason);
+    void onDue();
+    void log(int priority, std::string const& text) const;
+
+    std::shared_ptr<PeerContext> context_;
+    boost::asio::io_context& io_;
+    std::string name_;
+    /// Until it is known what is spoken on it.
+    std::optional<tcp::socket> socket_;
+    std::shared_ptr<Link> link_;
+    std::optional<Deadline> deadline_;
+    State state_ = State::Greeting;
+    /// What becomes of the connection when the deadline is due.
+    std::string dueReason_;
+    bool isInsideMessage_ = false;
+    std::string clientNonce_;
+    std::string serviceNonce_;
+    bool prefaceSent_ = false;
+    std::optional<Request> request_;
+    std::size_t reserved_ = 0;
+};
+
+} // namespace Channel

@@ -1,0 +1,141 @@
+#include "programs/channel/stream.h"
+
+#include "programs/channel/error.h"
+#include "programs/channel/private_file.h"
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/post.hpp>
+#include <boost/asio/ssl/stream.hpp>
+#include <boost/asio/write.hpp>
+
+#include <openssl/evp.h>
+#include <openssl/ssl.h>
+#include <openssl/x509.h>
+
+#include <array>
+
+namespace Channel {
+
+namespace asio = boost::asio;
+namespace ssl = asio::ssl;
+
+namespace {
+
+/// In the form in which the tools for certificates print it.
+std::string fingerprintOf(X509 const* certificate) {
+    std::array<unsigned char, EVP_MAX_MD_SIZE> digest;
+    unsigned int length = 0;
+    if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1)
+        return {};
+    constexpr char const* DIGITS = "0123456789ABCDEF";
+    std::string text;
+    for (unsigned int i = 0; i < length; ++i) {
+        if (i > 0)
+            text += ':';
+        text += DIGITS[digest[i] >> 4];
+        text += DIGITS[digest[i] & 15];
+    }
+    return text;
+}
+
+class PlainStream : public Stream {
+public:
+    explicit PlainStream(tcp::socket socket) : socket_(std::move(socket)) {}
+
+    void handshake(Done done) override {
+        asio::post(socket_.get_executor(), [done = std::move(done)] { done({}); });
+    }
+    void readSome(std::span<char> room, Moved done) override {
+        socket_.async_read_some(asio::buffer(room.data(), room.size()), std::move(done));
+    }
+    void writeAll(std::string_view bytes, Done done) override {
+        asio::async_write(socket_, asio::buffer(bytes.data(), bytes.size()),
+                          [done = std::move(done)](error_code const& ec, std::size_t) { done(ec); });
+    }
+    std::string fingerprint() override { return {}; }
+    tcp::socket& socket() override { return socket_; }
+
+private:
+    tcp::socket socket_;
+};
+
+class TlsStream : public Stream {
+public:
+    TlsStream(tcp::socket socket, ssl::context& context, TlsRole role)
+        : stream_(std::move(socket), context), role_(role) {}
+
+    void handshake(Done done) override {
+        stream_.async_handshake(
+            role_ == TlsRole::Client ? ssl::stream_base::client : ssl::stream_base::server, std::move(done));
+    }
+    void readSome(std::span<char> room, Moved done) override {
+        stream_.async_read_some(asio::buffer(room.data(), room.size()), std::move(done));
+    }
+    void writeAll(std::string_view bytes, Done done) override {
+        asio::async_write(stream_, asio::buffer(bytes.data(), bytes.size()),
+                          [done = std::move(done)](error_code const& ec, std::size_t) { done(ec); });
+    }
+    std::string fingerprint() override {
+        std::unique_ptr<X509, decltype(&X509_free)> const certificate(
+            SSL_get1_peer_certificate(stream_.native_handle()), X509_free);
+        return fingerprintOf(certificate.get());
+    }
+    tcp::socket& socket() override { return stream_.next_layer(); }
+
+private:
+    ssl::stream<tcp::socket> stream_;
+    TlsRole role_;
+};
+
+std::unique_ptr<ssl::context> makeContext(ssl::context::method method) {
+    auto context = std::make_unique<ssl::context>(method);
+    SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_3_VERSION);
+    return context;
+}
+
+void orThrow(error_code const& ec, std::string const& what, std::string const& file) {
+    if (ec)
+        throw Error("Cannot use the " + what + " \"" + file + "\": " + ec.message() + '.');
+}
+
+} // namespace
+
+std::unique_ptr<Stream> makePlainStream(tcp::socket socket) {
+    return std::make_unique<PlainStream>(std::move(socket));
+}
+
+std::unique_ptr<Stream> makeTlsStream(tcp::socket socket, ssl::context& context, TlsRole role) {
+    return std::make_unique<TlsStream>(std::move(socket), context, role);
+}
+
+std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateFile,
+                                                 std::string const& keyFile) {
+    auto context = makeContext(ssl::context::tls_server);
+    error_code ec;
+    context->use_certificate_chain_file(certificateFile, ec);
+    orThrow(ec, "certificate", certificateFile);
+    // A key with a password is refused instead of asking on the terminal.
+    context->set_password_callback([](std::size_t, ssl::context::password_purpose) { return std::string(); });
+    std::string const key = readPrivateFile(keyFile);
+    context->use_private_key(asio::buffer(key), ssl::context::pem, ec);
+    orThrow(ec, "private key", keyFile);
+    return context;
+}
+
+std::string fingerprintOf(ssl::context& context) {
+    return fingerprintOf(SSL_CTX_get0_certificate(context.native_handle()));
+}
+
+std::unique_ptr<ssl::context> makeClientContext() {
+    auto context = makeContext(ssl::context::tls_client);
+    context->set_verify_mode(ssl::verify_none);
+    return context;
+}
+
+bool isLoopback(asio::ip::address const& address) {
+    if (address.is_v6() && address.to_v6().is_v4_mapped())
+        return asio::ip::make_address_v4(asio::ip::v4_mapped, address.to_v6()).is_loopback();
+    return address.is_loopback();
+}
+
+} // namespace Channel

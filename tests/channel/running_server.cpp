@@ -1,0 +1,163 @@
+#include "tests/channel/running_server.h"
+
+#include "programs/channel/greeting.h"
+#include "programs/channel/message_text.h"
+#include "programs/channel/token.h"
+
+#include "vlservice/ipc/make_empty_cmd.h"
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/post.hpp>
+#include <boost/asio/read.hpp>
+#include <boost/asio/write.hpp>
+
+#include <sys/socket.h>
+
+#include <algorithm>
+#include <chrono>
+
+namespace ChannelTest {
+
+namespace asio = boost::asio;
+using namespace std::chrono_literals;
+
+namespace {
+
+constexpr auto PATIENCE = 10s;
+
+} // namespace
+
+// --- RunningServer
+
+RunningServer::RunningServer(Channel::ServerSettings settings, Channel::Server::Handler handler) {
+    if (settings.token.empty())
+        settings.token = TOKEN;
+    if (!handler)
+        handler = Channel::acceptAtOnce(std::make_shared<Echo>());
+    server_ =
+        std::make_unique<Channel::Server>(io_, std::move(settings), Ipc::makeEmptyCmd, std::move(handler));
+    port_ = server_->port();
+    thread_ = std::thread([this] {
+        auto const work = asio::make_work_guard(io_);
+        io_.run();
+    });
+}
+
+RunningServer::~RunningServer() {
+    io_.stop();
+    thread_.join();
+    server_.reset();
+}
+
+Channel::ClientSettings RunningServer::clientSettings() const {
+    Channel::ClientSettings settings;
+    settings.host = "127.0.0.1";
+    settings.port = port_;
+    settings.token = TOKEN;
+    return settings;
+}
+
+void RunningServer::post(std::function<void()> work) { asio::post(io_, std::move(work)); }
+
+std::size_t RunningServer::connections() {
+    return onThread([](Channel::Server& server) { return server.connections(); });
+}
+
+bool RunningServer::hasConnections(std::size_t wanted) {
+    auto const deadline = std::chrono::steady_clock::now() + PATIENCE;
+    while (connections() != wanted)
+        if (std::chrono::steady_clock::now() > deadline)
+            return false;
+    return true;
+}
+
+// --- SharedLog
+
+SharedLog::SharedLog()
+    : before_(Log::setSink([this](LogPriority priority, std::string const& line) {
+          if (priority >= 7)
+              return;
+          std::lock_guard const guard(mutex_);
+          lines_.push_back(line);
+          changed_.notify_all();
+      })) {}
+
+SharedLog::~SharedLog() { Log::setSink(before_); }
+
+std::vector<std::string> SharedLog::lines() {
+    std::lock_guard const guard(mutex_);
+    return lines_;
+}
+
+bool SharedLog::hasLogged(std::string const& part) {
+    std::unique_lock lock(mutex_);
+    return changed_.wait_for(lock, PATIENCE, [&] {
+        return std::any_of(lines_.begin(), lines_.end(),
+                           [&](std::string const& line) { return line.find(part) != std::string::npos; });
+    });
+}
+
+// --- RawPeer
+
+std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text) {
+    std::string bytes;
+    Channel::appendFrame(bytes, {static_cast<std::uint8_t>(command), kind, sequence, text});
+    return bytes;
+}
+
+RawPeer::RawPeer(std::uint16_t port) : socket_(io_) {
+    socket_.connect({asio::ip::address_v4::loopback(), port});
+    timeval const patience{std::chrono::seconds(PATIENCE).count(), 0};
+    ::setsockopt(socket_.native_handle(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+}
+
+void RawPeer::send(std::string const& bytes) { asio::write(socket_, asio::buffer(bytes)); }
+
+void RawPeer::send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text) {
+    send(bytesOf(command, kind, sequence, text));
+}
+
+void RawPeer::finish() { socket_.shutdown(asio::ip::tcp::socket::shutdown_send); }
+
+std::optional<Message> RawPeer::receive() {
+    for (;;) {
+        if (auto const frame = decoder_.next())
+            return Message{frame->command, frame->kind, frame->sequence, std::string(frame->text)};
+        auto const room = decoder_.room();
+        // Straight from the system: the library's reading would wait for longer than the socket's patience.
+        ssize_t const got = ::recv(socket_.native_handle(), room.data(), room.size(), 0);
+        if (got < 0 && errno != ECONNRESET)
+            throw std::runtime_error("The service says nothing.");
+        if (got <= 0)
+            return std::nullopt;
+        decoder_.commit(static_cast<std::size_t>(got));
+    }
+}
+
+void RawPeer::greet() {
+    std::string const nonce = Channel::makeNonce();
+    send(Channel::preface());
+    send(Channel::GREETING, Channel::Kind::Request, Channel::CHALLENGE,
+         Channel::print({{Channel::NONCE, nonce}}));
+    auto const challenge = receive();
+    std::string const serviceNonce = Channel::parse(challenge.value().text).get(Channel::NONCE).toString();
+    std::string const proof = Channel::makeProof(Channel::Side::Client, TOKEN, nonce, serviceNonce, "");
+    send(Channel::GREETING, Channel::Kind::Request, Channel::PROVING,
+         Channel::print({{Channel::PROOF, proof}}));
+    if (receive().value().text != "{}")
+        throw std::runtime_error("The service does not welcome its peer.");
+}
+
+std::string RawPeer::refusal() {
+    auto const message = receive();
+    if (!message)
+        return "closed without a word";
+    if (message->kind != Channel::Kind::Error)
+        return "no error: " + message->text;
+    return isClosed() ? Channel::reasonOf(message->text) : "not closed: " + message->text;
+}
+
+bool RawPeer::isClosed() { return !receive(); }
+
+} // namespace ChannelTest

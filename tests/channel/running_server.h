@@ -1,0 +1,134 @@
+#pragma once
+// A service on a free port of the loopback address, on a thread of its own, and peers that speak to it byte
+// by byte.
+
+#include "programs/channel/client.h"
+#include "programs/channel/frame.h"
+#include "programs/channel/server.h"
+#include "tests/ipc/recording_processor.h"
+#include "vlservice/ipc/price_est.h"
+#include "vlservice/ipc/remove_cfg_node.h"
+#include "vlservice/platform/log.h"
+
+#include <utility>
+
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/tcp.hpp>
+
+#include <condition_variable>
+#include <functional>
+#include <future>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace ChannelTest {
+
+inline std::string const TOKEN = "0123456789abcdef0123456789abcdef";
+
+/// Unless told otherwise it answers as Echo does.
+class RunningServer {
+public:
+    explicit RunningServer(Channel::ServerSettings settings = {}, Channel::Server::Handler handler = {});
+    ~RunningServer();
+    RunningServer(RunningServer const&) = delete;
+    RunningServer& operator=(RunningServer const&) = delete;
+
+    std::uint16_t port() const { return port_; }
+    Channel::ClientSettings clientSettings() const;
+
+    /// Does something on the service's thread and gives what it returns.
+    template<typename Work>
+    auto onThread(Work work) {
+        std::packaged_task<decltype(work(std::declval<Channel::Server&>()))()> task(
+            [&] { return work(*server_); });
+        auto result = task.get_future();
+        post([&task] { task(); });
+        return result.get();
+    }
+    std::size_t connections();
+    /// Waits, within ten seconds, until so many are connected.
+    bool hasConnections(std::size_t wanted);
+
+    boost::asio::io_context& io() { return io_; }
+
+private:
+    void post(std::function<void()> work);
+
+    boost::asio::io_context io_;
+    std::unique_ptr<Channel::Server> server_;
+    std::uint16_t port_ = 0;
+    std::thread thread_;
+};
+
+/// Collects what is logged as a failure, by all threads, while it lives.
+class SharedLog {
+public:
+    SharedLog();
+    ~SharedLog();
+    SharedLog(SharedLog const&) = delete;
+    SharedLog& operator=(SharedLog const&) = delete;
+
+    std::vector<std::string> lines();
+    /// Waits, within ten seconds, for a line with that in it.
+    bool hasLogged(std::string const& part);
+
+private:
+    std::mutex mutex_;
+    std::condition_variable changed_;
+    std::vector<std::string> lines_;
+    Log::Sink before_;
+};
+
+/// Gives an estimate back with the parameters in it, and fails what it does not know.
+class Echo : public RecordingProcessor {
+public:
+    using RecordingProcessor::visit;
+    void visit(Ipc::PriceEst& cmd) override { cmd.setResp({{"asked", cmd.reqParams()}}); }
+    void visit(Ipc::RemoveCfgNode& cmd) override {
+        cmd.setResp("There is no node " + cmd.cfgId().str() + '.');
+    }
+    void visit(Ipc::UpdateStatus&) override { throw std::runtime_error("The database is away."); }
+};
+
+/// A message that owns its text.
+struct Message {
+    int command;
+    Channel::Kind kind;
+    std::uint32_t sequence;
+    std::string text;
+};
+
+/// A client that may send whatever it likes. It waits ten seconds at the most for anything.
+class RawPeer {
+public:
+    explicit RawPeer(std::uint16_t port);
+
+    void send(std::string const& bytes);
+    void send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
+    /// Says that nothing more will come.
+    void finish();
+    /// The preface and the exchange of proofs.
+    void greet();
+    /// The next message; none when the service has closed the connection.
+    std::optional<Message> receive();
+    /// The reason in the error message that comes next, and that the connection is closed behind it.
+    std::string refusal();
+    bool isClosed();
+
+    boost::asio::ip::tcp::socket& socket() { return socket_; }
+
+private:
+    boost::asio::io_context io_;
+    boost::asio::ip::tcp::socket socket_;
+    Channel::FrameDecoder decoder_;
+};
+
+/// The bytes of a message.
+std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
+
+} // namespace ChannelTest
