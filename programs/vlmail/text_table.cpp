@@ -1,5 +1,7 @@
 #include "programs/vlmail/text_table.h"
 
+#include "programs/vlmail/utf8.h"
+
 #include <unicode/uchar.h>
 #include <unicode/utf8.h>
 
@@ -18,12 +20,6 @@ std::size_t characterWidth(UChar32 c) {
         return 0;
     int const width = u_getIntPropertyValue(c, UCHAR_EAST_ASIAN_WIDTH);
     return width == U_EA_WIDE || width == U_EA_FULLWIDTH ? 2 : 1;
-}
-
-std::string onOneLine(std::string text) {
-    std::replace_if(
-        text.begin(), text.end(), [](unsigned char c) { return c < 0x20 || c == 0x7F; }, ' ');
-    return text;
 }
 
 } // namespace

@@ -1,0 +1,65 @@
+#pragma once
+// A mailing file as the subcommands look into it.
+
+#include "vlservice/pack/pack_wrapper.h"
+#include "vlservice/platform/log.h"
+
+#include <optional>
+#include <string>
+
+namespace VlMail {
+
+/// Keeps the library's log lines from the terminal while it lives: the subcommands say what failed in words
+/// of their own.
+class QuietLog {
+public:
+    QuietLog() {
+        before_ = Log::setSink([this](LogPriority, std::string const&) { isEmpty_ = false; });
+    }
+    ~QuietLog() { Log::setSink(before_); }
+    QuietLog(QuietLog const&) = delete;
+    QuietLog& operator=(QuietLog const&) = delete;
+
+    /// Whether nothing was logged.
+    bool empty() const { return isEmpty_; }
+
+private:
+    bool isEmpty_ = true;
+    Log::Sink before_;
+};
+
+/// Opened for reading. Its index is whole; its blobs may be damaged.
+class ContainerFile {
+public:
+    using Entry = PackWrapper::BinEntry;
+
+    struct Blob {
+        SharedMemBuffer bytes;
+        /// What is wrong with it, in words; empty when it is whole and can be expanded.
+        std::string damage;
+    };
+
+    /// Throws Error when there is no such file or its index cannot be read.
+    explicit ContainerFile(std::string const& path);
+
+    std::string const& packId() const { return container_->packId(); }
+    unsigned long long size() const { return container_->szBins(); }
+    Entry const& entry(unsigned long long index) const { return container_->bin(index); }
+
+    /// The blob of an entry as it is stored, checked.
+    Blob blob(unsigned long long index);
+
+private:
+    std::string damageOf(Entry const& entry, SharedMemBuffer const& blob) const;
+
+    QuietLog quiet_;
+    std::uint64_t fileSize_;
+    std::optional<PackWrapper> container_;
+};
+
+bool isPage(PackWrapper::BinEntry const& entry);
+
+/// `page 2 of "a.pdf"`, "the metadata".
+std::string inWords(PackWrapper::BinEntry const& entry);
+
+} // namespace VlMail
