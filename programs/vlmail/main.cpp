@@ -1,8 +1,14 @@
 #include "programs/vlmail/command.h"
 
+#include "vlservice/platform/log.h"
+
 #include <iostream>
 #include <unistd.h>
 
 int main(int argc, char** argv) {
-    return VlMail::run(argc, argv, VlMail::Terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1});
+    VlMail::Terminal const terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1};
+    Log::setSink([&](LogPriority, std::string const& line) { terminal.complain(line); });
+    int const status = VlMail::run(argc, argv, terminal);
+    Log::setSink({});
+    return status;
 }
