@@ -1,5 +1,6 @@
 #include "programs/vlmail/node_settings.h"
 
+#include "programs/reader/document.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/digest.h"
 #include "vlservice/cfg/app.h"
@@ -10,9 +11,6 @@
 #include "vlservice/platform/json_text.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
-#include <fstream>
 #include <iterator>
 
 namespace VlMail {
@@ -47,22 +45,8 @@ void requirePartNames(json::Object const& document, fs::path const& file) {
 
 } // namespace
 
-std::string readFile(fs::path const& file) {
-    if (fs::is_directory(file))
-        throw Error("cannot read " + quoted(file) + ": it is a folder; name a file");
-    errno = 0;
-    std::ifstream in(file, std::ios::binary);
-    std::string const bytes{std::istreambuf_iterator<char>(in), {}};
-    if (!in) {
-        int const code = errno;
-        throw Error("cannot read " + quoted(file) + ": " + std::strerror(code ? code : EIO) +
-                    "; check the name and the rights");
-    }
-    return bytes;
-}
-
 NodeSettings NodeSettings::fromFile(fs::path const& file) {
-    std::string const text = readFile(file);
+    std::string const text = Reader::readFile(file);
     NodeSettings settings;
     settings.file_ = file;
     settings.sha256_ = VlMail::sha256(text);

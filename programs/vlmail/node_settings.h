@@ -15,7 +15,8 @@ class NodeSettings {
 public:
     /// Nothing set: the global defaults apply.
     NodeSettings() = default;
-    /// Throws Error when the file cannot be read or is not such a document.
+    /// Throws std::runtime_error with a line for people when the file cannot be read or is not such a
+    /// document.
     static NodeSettings fromFile(std::filesystem::path const& file);
     /// The same, or the global defaults for an empty name.
     static NodeSettings fromFileIfNamed(std::string const& file);
@@ -35,8 +36,5 @@ private:
     std::string sha256_;
     json::Object parts_;
 };
-
-/// A whole file. Throws Error.
-std::string readFile(std::filesystem::path const& file);
 
 } // namespace VlMail

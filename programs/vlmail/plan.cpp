@@ -1,5 +1,6 @@
 #include "programs/vlmail/plan.h"
 
+#include "programs/reader/document.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/digest.h"
 #include "vlservice/platform/json_text.h"
@@ -46,8 +47,9 @@ json::Object fileToJson(fs::path const& file, std::string const& digest) {
 /// What is wrong with a file now, or nothing.
 std::string changeOf(fs::path const& file, std::string const& digest) {
     try {
-        return sha256(readFile(file)) == digest ? std::string() : '"' + file.string() + "\" has changed";
-    } catch (Error const&) {
+        return sha256(Reader::readFile(file)) == digest ? std::string()
+                                                        : '"' + file.string() + "\" has changed";
+    } catch (Reader::Error const&) {
         return '"' + file.string() + "\" cannot be read any more";
     }
 }
@@ -62,7 +64,7 @@ Plan::Plan(NodeSettings const& settings) {
 }
 
 Plan Plan::fromFile(fs::path const& file) {
-    std::string const text = readFile(file);
+    std::string const text = Reader::readFile(file);
     try {
         json::Object const object = json::strToObject(text.data(), text.size());
         if (object.get(VERSION_KEY).intOrZero() != PLAN_VERSION)

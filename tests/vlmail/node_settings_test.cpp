@@ -27,7 +27,7 @@ protected:
     std::string errorOf(fs::path const& path) {
         try {
             VlMail::NodeSettings::fromFile(path);
-        } catch (VlMail::Error const& error) {
+        } catch (std::runtime_error const& error) {
             return error.what();
         }
         return "no error";
@@ -73,10 +73,8 @@ TEST_F(NodeSettingsTest, SaysWhatIsWrongWhereAndWhatToDo) {
               "cannot use the settings in \"" + path.string() +
                   "\": \"preset\" is no settings part; name the parts \"presets\", \"app\", \"inet\", "
                   "\"po\", \"deps\" or \"profiles\"");
-    EXPECT_EQ(errorOf(folder_), "cannot read \"" + folder_.string() + "\": it is a folder; name a file");
     EXPECT_EQ(errorOf(folder_ / "missing"),
-              "cannot read \"" + (folder_ / "missing").string() +
-                  "\": No such file or directory; check the name and the rights");
+              (folder_ / "missing").string() + ": there is no such file; check the name");
 }
 
 } // namespace
