@@ -1,5 +1,7 @@
 #include "vlservice/platform/uchar_alloc.h"
 
+#include "tests/support/sanitized.h"
+
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -31,9 +33,8 @@ TEST(UCharAlloc, GivesABlockOfNoBytes) {
 }
 
 TEST(UCharAlloc, ThrowsWhenThereIsNotThatMuch) {
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-    GTEST_SKIP() << "the sanitizer's allocator ends the process instead";
-#endif
+    if (VLServiceTest::SANITIZED)
+        GTEST_SKIP() << "the sanitizer's allocator ends the process instead";
     EXPECT_THROW(ExportedUCharAlloc()(ExportedUCharAlloc::alloc(std::size_t{1} << 62)), std::bad_alloc);
 }
 
