@@ -1,0 +1,56 @@
+// A document's bytes, PDF or text: read, searched with the presets that every node has, its first page
+// written and read again.
+#include "programs/reader/letters.h"
+
+#include "vlservice/platform/log.h"
+#include "vlservice/presets/presets.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdlib>
+#include <string>
+
+namespace {
+
+constexpr int MAX_PAGES = 4;
+
+void require(bool holds) {
+    if (!holds)
+        std::abort();
+}
+
+void search(Reader::Document& document, Cfg::ExtractPreset const& preset) {
+    Reader::Trace trace;
+    auto const letters = Reader::readLetters(document, preset, &trace);
+    require(letters.size() == 1 && trace.pages.size() == 1);
+    require(letters[0].pages.size() == static_cast<std::size_t>(document.pageCount()));
+    for (Reader::ZoneTrace const& zone : trace.pages[0].zones)
+        for (Reader::FieldTrace const& field : zone.fields)
+            require(!field.match || zone.text.find(field.cut) != std::string::npos);
+}
+
+void read(std::string bytes) {
+    static Cfg::Presets const presets(json::Value(), true, true);
+    Reader::Document document = Reader::openDocument(std::move(bytes), "document");
+    if (document.pageCount() > MAX_PAGES)
+        return;
+    search(document, presets.matchExtrPreset("document"));
+    Reader::Document const single = Reader::openDocument(document.singlePagePdf(1), "page");
+    require(single.pageCount() == 1);
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size) {
+    static bool const isQuiet = [] {
+        Log::setSink({});
+        return true;
+    }();
+    static_cast<void>(isQuiet);
+    try {
+        read(std::string(reinterpret_cast<char const*>(data), size));
+    } catch (Reader::Error const& error) {
+        require(std::string(error.what()).find('\n') == std::string::npos);
+    }
+    return 0;
+}
