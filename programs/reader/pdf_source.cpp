@@ -19,6 +19,20 @@
 #include <optional>
 #include <utility>
 
+#ifdef __SANITIZE_ADDRESS__
+#define VLSERVICE_LEAKS_ARE_SOUGHT
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer)
+#define VLSERVICE_LEAKS_ARE_SOUGHT
+#endif
+#endif
+
+#ifdef VLSERVICE_LEAKS_ARE_SOUGHT
+/// The library with which poppler looks for fonts keeps some bytes to itself.
+extern "C" __attribute__((visibility("default"))) char const* __lsan_default_suppressions();
+char const* __lsan_default_suppressions() { return "leak:libfontconfig\n"; }
+#endif
+
 namespace Reader {
 namespace {
 
@@ -53,8 +67,8 @@ int toHundredths(double points) {
 }
 
 Box boxOf(poppler::rectf const& rect) {
-    auto const [left, right] = std::minmax(toHundredths(rect.left()), toHundredths(rect.right()));
-    auto const [top, bottom] = std::minmax(toHundredths(rect.top()), toHundredths(rect.bottom()));
+    auto const [left, right] = std::minmax({toHundredths(rect.left()), toHundredths(rect.right())});
+    auto const [top, bottom] = std::minmax({toHundredths(rect.top()), toHundredths(rect.bottom())});
     return {left, top, right, bottom};
 }
 
