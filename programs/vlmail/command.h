@@ -46,6 +46,7 @@ void addLetterCommand(CLI::App& app, Task& task);
 void addMailCommand(CLI::App& app, Task& task);
 void addPackCommand(CLI::App& app, Task& task);
 void addPlanCommand(CLI::App& app, Task& task);
+void addPresetsCommand(CLI::App& app, Task& task);
 
 /// Parses the command line, carries it out and gives the exit status. Throws nothing derived from
 /// std::exception.

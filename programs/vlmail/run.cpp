@@ -24,6 +24,7 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
     addMailCommand(app, task);
     addPackCommand(app, task);
     addPlanCommand(app, task);
+    addPresetsCommand(app, task);
     try {
         app.parse(argc, argv);
         return task(terminal);

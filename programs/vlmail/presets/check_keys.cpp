@@ -1,0 +1,244 @@
+// Keys that nobody knows, and values that are not read as they stand.
+#include "programs/vlmail/presets/checks.h"
+#include "programs/vlmail/presets/keys.h"
+#include "programs/vlmail/presets/words.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <limits>
+#include <string>
+
+namespace VlMail {
+namespace {
+
+using enum FindingKind;
+
+/// What a type is called, and what reads where another type stands.
+struct TypeWords {
+    char const* missing;
+    char const* wanted;
+};
+
+TypeWords wordsOf(KeyType type) {
+    switch (type) {
+    case KeyType::Text:
+        return {"the empty text", "a text in quotes"};
+    case KeyType::Flag:
+        return {"false", "true or false"};
+    case KeyType::Int32:
+    case KeyType::UInt32:
+    case KeyType::Int64:
+    case KeyType::UInt64:
+        return {"0", "an integer"};
+    case KeyType::Number:
+        return {"0", "a number"};
+    case KeyType::Record:
+        return {"nothing", "an object {...}"};
+    case KeyType::Records:
+        return {"nothing", "a list [...]"};
+    case KeyType::Numbers:
+        return {"nothing", "a list of integers"};
+    case KeyType::Texts:
+        return {"nothing", "a list of texts"};
+    case KeyType::Any:
+        break;
+    }
+    return {"nothing", "a value"};
+}
+
+bool isOfType(json::Value const& value, KeyType type) {
+    switch (type) {
+    case KeyType::Text:
+        return value.isString();
+    case KeyType::Flag:
+        return json_is_boolean(value.node());
+    case KeyType::Int32:
+    case KeyType::UInt32:
+    case KeyType::Int64:
+    case KeyType::UInt64:
+        return value.isInt();
+    case KeyType::Number:
+        return value.isInt() || value.isReal();
+    case KeyType::Record:
+        return value.isObject();
+    case KeyType::Records:
+    case KeyType::Numbers:
+    case KeyType::Texts:
+        return value.isArray();
+    case KeyType::Any:
+        break;
+    }
+    return true;
+}
+
+class KeyChecker {
+public:
+    explicit KeyChecker(Findings& findings) : findings_(findings) {}
+
+    void check(json::Value const& node, Place const& place, RecordKeys const& keys) {
+        if (node.isString() && keys.mayBeText)
+            return;
+        if (!node.isObject())
+            return refuse(node, place,
+                          keys.mayBeText ? "an object {...}, or the id as a text" : "an object {...}");
+        json::Object const& object = node.toObject();
+        for (auto const& [key, value] : object)
+            checkKey(object, key, value, place, keys);
+        for (KeyRow const& row : keys.rows)
+            if (row.use == KeyUse::Required && !object.get(row.name))
+                findings_.add(MissingKey, place, {inQuotes(row.name)});
+    }
+
+private:
+    void checkKey(json::Object const& object, std::string const& key, json::Value const& value,
+                  Place const& parent, RecordKeys const& keys) {
+        auto const row = std::ranges::find(keys.rows, key, &KeyRow::name);
+        if (row == keys.rows.end())
+            return checkUnknown(object, key, parent / key, keys);
+        if (row->use == KeyUse::Dropped)
+            return findings_.add(DroppedKey, parent / key, {inQuotes(key)});
+        if (!keys.wrapsValues)
+            return checkValue(value, parent / key, *row);
+        Unwrapped const unwrapped = unwrap(value, parent / key);
+        checkValue(unwrapped.node, unwrapped.place, *row);
+    }
+
+    /// A known key that stands in the same object already is not what was meant.
+    void checkUnknown(json::Object const& object, std::string const& key, Place const& place,
+                      RecordKeys const& keys) {
+        std::vector<std::string> candidates;
+        for (KeyRow const& row : keys.rows)
+            if (row.use != KeyUse::Dropped && !object.get(row.name))
+                candidates.push_back(row.name);
+        std::string const nearest = nearestName(key, candidates);
+        if (!nearest.empty())
+            findings_.add(MisspeltKey, place, {inQuotes(key), inQuotes(nearest)});
+        else if (!keys.keepsOthers)
+            findings_.add(UnknownKey, place, {inQuotes(key)});
+    }
+
+    void checkValue(json::Value const& value, Place const& place, KeyRow const& row) {
+        TypeWords const words = wordsOf(row.type);
+        if (!isOfType(value, row.type)) {
+            if (row.use != KeyUse::Lenient)
+                return refuse(value, place, words.wanted);
+            return findings_.add(WrongType, place,
+                                 {value.typeName(), row.missing ? row.missing : words.missing, words.wanted});
+        }
+        if (value.isInt())
+            checkRange(value.toInt(), place, row.type);
+        else if (row.type == KeyType::Record)
+            check(value, place, *row.record);
+        else if (value.isArray())
+            checkElements(value.toArray(), place, row);
+    }
+
+    void checkElements(json::Array const& array, Place const& place, KeyRow const& row) {
+        for (std::size_t i = 0; i < array.size(); ++i) {
+            json::Value const element = array.at(i);
+            if (row.type == KeyType::Numbers && !element.isInt())
+                refuse(element, place / i, "an integer");
+            else if (row.type == KeyType::Texts && !element.isString())
+                refuse(element, place / i, "a text in quotes");
+            else if (row.type == KeyType::Records)
+                checkElement(element, place / i, *row.record);
+        }
+    }
+
+    void checkElement(json::Value const& element, Place const& place, RecordKeys const& keys) {
+        if (!keys.mayBeWrapped)
+            return check(element, place, keys);
+        Unwrapped const unwrapped = unwrap(element, place);
+        check(unwrapped.node, unwrapped.place, keys);
+    }
+
+    void refuse(json::Value const& value, Place const& place, char const* wanted) {
+        findings_.add(RefusedType, place, {value.typeName(), wanted});
+    }
+
+    void checkRange(long long number, Place const& place, KeyType type) {
+        using Int32 = std::numeric_limits<std::int32_t>;
+        using UInt32 = std::numeric_limits<std::uint32_t>;
+        using Int64 = std::numeric_limits<std::int64_t>;
+        if (type == KeyType::Int32)
+            checkRange(number, place, static_cast<std::int32_t>(number), Int32::min(), Int32::max());
+        else if (type == KeyType::UInt32)
+            checkRange(number, place, static_cast<std::uint32_t>(number), 0, UInt32::max());
+        else if (type == KeyType::UInt64)
+            checkRange(number, place, static_cast<std::uint64_t>(number), 0, Int64::max());
+    }
+
+    template<typename Read>
+    void checkRange(long long number, Place const& place, Read readsAs, long long least, long long most) {
+        if (number < least || number > most)
+            findings_.add(CutNumber, place,
+                          {std::to_string(number), std::to_string(readsAs), std::to_string(least),
+                           std::to_string(most)});
+    }
+
+    Findings& findings_;
+};
+
+/// Numbers that have a meaning here, where all others are kept without one.
+struct NumberRow {
+    char const* key;
+    long long least;
+    long long most;
+    char const* otherwise;
+};
+
+constexpr NumberRow PRESET_NUMBERS[] = {
+    {"type", 0, 1, "the preset is neither for letters nor for attachments"},
+};
+constexpr NumberRow FIELD_NUMBERS[] = {
+    {"value_type", 0, 3, "the value is taken for a text"},
+    {"ignore_on_group", -1, 6,
+     "letters with other values are grouped, or not, without a value being kept for them"},
+};
+
+void checkNumbersOf(json::Object const& object, Place const& place, std::span<NumberRow const> rows,
+                    Findings& findings) {
+    for (NumberRow const& row : rows) {
+        json::Value const value = object.get(row.key);
+        if (value.isInt() && (value.toInt() < row.least || value.toInt() > row.most))
+            findings.add(UnknownNumber, place / row.key,
+                         {std::to_string(value.toInt()), row.otherwise,
+                          std::to_string(row.least) + " to " + std::to_string(row.most)});
+    }
+}
+
+} // namespace
+
+void checkParts(PresetsDocument const& document, Findings& findings) {
+    if (document.isPartAlone())
+        return;
+    for (auto const& [key, part] : document.json()) {
+        std::string const name = key;
+        if (std::ranges::none_of(partKeys(), [&](PartKeys const& keys) { return keys.name == name; }))
+            findings.add(UnknownPart, Place() / name, {inQuotes(name)});
+    }
+}
+
+void checkDuplicateKeys(PresetsDocument const& document, Findings& findings) {
+    if (!document.duplicateKey().empty())
+        findings.add(DuplicateKey, Place(), {document.duplicateKey()});
+}
+
+void checkKeys(PresetsDocument const& document, Findings& findings) {
+    KeyChecker checker(findings);
+    if (document.isPartAlone())
+        return checker.check(document.json(), Place(), PRESETS_KEYS);
+    for (PartKeys const& part : partKeys())
+        if (json::Value const node = document.json().get(part.name))
+            checker.check(node, Place() / part.name, *part.record);
+}
+
+void checkNumbers(PresetsDocument const& document, Findings& findings) {
+    for (ListedExtractPreset const& preset : document.extractPresets())
+        checkNumbersOf(preset.json, preset.place, PRESET_NUMBERS, findings);
+    forEachField(document, [&](ListedExtractPreset const&, ListedZone const&, ListedField const& field) {
+        checkNumbersOf(field.json, field.place, FIELD_NUMBERS, findings);
+    });
+}
+
+} // namespace VlMail

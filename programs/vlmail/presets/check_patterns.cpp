@@ -1,0 +1,148 @@
+// Patterns: whether they compile, how hard they work, and whether they can fit what is read.
+#include "programs/vlmail/presets/checks.h"
+#include "programs/vlmail/presets/outline.h"
+#include "programs/vlmail/presets/pattern.h"
+#include "programs/vlmail/presets/words.h"
+
+#include <unicode/normalizer2.h>
+#include <unicode/unistr.h>
+
+#include <algorithm>
+#include <string>
+#include <vector>
+
+namespace VlMail {
+namespace {
+
+using enum FindingKind;
+using Use = Pattern::Use;
+
+/// What a pattern that cannot be used does to a document.
+char const* consequence(Use use) {
+    switch (use) {
+    case Use::Name:
+        return "every document whose name is tried on it fails";
+    case Use::Extract:
+        return "the field is never found and yields its default, or nothing";
+    case Use::Validate:
+        return "every letter in which the field is found fails";
+    }
+    return "";
+}
+
+enum class Burden { Light, Slow, Runaway };
+
+struct Trial {
+    Burden burden = Burden::Light;
+    std::string line;
+};
+
+/// The readers of documents cut lines at this length.
+constexpr std::size_t LONG_LINE = 1000;
+constexpr std::size_t BUDGET = Pattern::DEFAULT_BUDGET;
+/// Only what grows beyond every power of the length exceeds the budget on so short a line.
+constexpr std::size_t SHORT_LINE = 40;
+constexpr std::size_t MIDDLE_LINE = 200;
+
+/// The line that costs most.
+Trial hardest(Pattern const& pattern, std::size_t length, std::size_t& cost) {
+    Trial trial;
+    cost = 0;
+    for (std::string const& line : hardLinesFor(pattern, length)) {
+        std::size_t const found = pattern.cost(line, BUDGET);
+        if (found <= cost)
+            continue;
+        cost = found;
+        trial.line = line;
+        if (cost == BUDGET)
+            break;
+    }
+    return trial;
+}
+
+/// Whether the cost grows with more than the square of the length.
+bool growsFast(Pattern const& pattern) {
+    constexpr std::size_t MORE_THAN_FOURFOLD = 6;
+    std::size_t single = 0;
+    std::size_t twofold = 0;
+    hardest(pattern, MIDDLE_LINE, single);
+    hardest(pattern, 2 * MIDDLE_LINE, twofold);
+    return twofold == BUDGET || twofold > MORE_THAN_FOURFOLD * single;
+}
+
+Trial tryHardLines(Pattern const& pattern) {
+    std::size_t cost = 0;
+    Trial trial = hardest(pattern, SHORT_LINE, cost);
+    if (cost == BUDGET) {
+        trial.burden = Burden::Runaway;
+        return trial;
+    }
+    if (!growsFast(pattern))
+        return {};
+    trial = hardest(pattern, LONG_LINE, cost);
+    trial.burden = cost == BUDGET ? Burden::Slow : Burden::Light;
+    return trial;
+}
+
+/// The start of a line in quotes, with what cannot be seen as "\x01".
+std::string startOf(std::string const& line) {
+    constexpr std::size_t SHOWN = 24;
+    std::string shown;
+    for (char const c : line.substr(0, SHOWN))
+        shown += static_cast<unsigned char>(c) < 0x20 ? ' ' : c;
+    // Not in the middle of a character.
+    while (shown.size() < line.size() && (line[shown.size()] & 0xC0) == 0x80)
+        shown += line[shown.size()];
+    return inQuotes(line.size() > shown.size() ? shown + "..." : shown);
+}
+
+bool isComposed(std::string const& text) {
+    UErrorCode error = U_ZERO_ERROR;
+    icu::Normalizer2 const* const nfc = icu::Normalizer2::getNFCInstance(error);
+    return U_FAILURE(error) || nfc->isNormalized(icu::UnicodeString::fromUTF8(text), error);
+}
+
+void checkPattern(std::string const& text, Use use, Place const& place, Findings& findings) {
+    if (text.empty())
+        return;
+    if (use != Use::Name && !isComposed(text))
+        findings.add(PatternNotComposed, place);
+    try {
+        Trial const trial = tryHardLines(Pattern(text, use));
+        if (trial.burden == Burden::Runaway)
+            findings.add(RunawayPattern, place, {startOf(trial.line), consequence(use)});
+        else if (trial.burden == Burden::Slow)
+            findings.add(SlowPattern, place, {startOf(trial.line)});
+    } catch (BrokenPattern const& broken) {
+        findings.add(PatternBroken, place,
+                     {std::to_string(broken.position + 1), broken.what(), consequence(use)});
+    }
+}
+
+} // namespace
+
+void checkPatterns(PresetsDocument const& document, Findings& findings) {
+    for (ListedExtractPreset const& preset : document.extractPresets())
+        checkPattern(preset.match(), Use::Name, preset.place / "match", findings);
+    forEachField(document, [&](ListedExtractPreset const&, ListedZone const&, ListedField const& field) {
+        checkPattern(field.json.get("value_extract").textOrEmpty(), Use::Extract,
+                     field.place / "value_extract", findings);
+        checkPattern(field.json.get("value_match").textOrEmpty(), Use::Validate, field.place / "value_match",
+                     findings);
+    });
+}
+
+void checkValueGroups(PresetsDocument const& document, Findings& findings) {
+    forEachField(document, [&](ListedExtractPreset const&, ListedZone const&, ListedField const& field) {
+        std::string const text = field.json.get("value_extract").textOrEmpty();
+        try {
+            if (!text.empty() &&
+                !Pattern(text, Use::Extract).hasGroup(Cfg::ExtractField::REGEX_VALUE_GROUP_MARK))
+                findings.add(ValueGroupMissing, field.place / "value_extract");
+        } catch (BrokenPattern const&) {
+            // Told by checkPatterns.
+        }
+    });
+}
+
+} // namespace VlMail

@@ -1,0 +1,113 @@
+// Zones: where they lie, and whether they have something to do.
+#include "programs/vlmail/presets/checks.h"
+#include "programs/vlmail/presets/words.h"
+
+#include <algorithm>
+#include <optional>
+#include <string>
+
+namespace VlMail {
+namespace {
+
+using enum FindingKind;
+
+// Pages in 1/100 mm.
+/// Any sheet of A4 or Letter, upright or not, lies within this length.
+constexpr int LONGEST_EDGE = 29700;
+/// The wider of both, upright.
+constexpr int UPRIGHT_WIDTH = 21590;
+constexpr int UPRIGHT_HEIGHT = 29700;
+/// Less than a short word in small print.
+constexpr int TINY = 200;
+
+bool isEmpty(Cfg::Rect const& rect) { return rect.left >= rect.right || rect.top >= rect.bottom; }
+
+bool isOffPage(Cfg::Rect const& rect) {
+    return rect.left >= LONGEST_EDGE || rect.top >= LONGEST_EDGE || rect.right <= 0 || rect.bottom <= 0;
+}
+
+bool isBeyondPage(Cfg::Rect const& rect) {
+    return rect.left < 0 || rect.top < 0 || rect.right > UPRIGHT_WIDTH || rect.bottom > UPRIGHT_HEIGHT;
+}
+
+bool isOffPage(Cfg::Point const& point) {
+    return point.x < 0 || point.y < 0 || point.x > LONGEST_EDGE || point.y > LONGEST_EDGE;
+}
+
+long long widthOf(Cfg::Rect const& rect) { return static_cast<long long>(rect.right) - rect.left; }
+long long heightOf(Cfg::Rect const& rect) { return static_cast<long long>(rect.bottom) - rect.top; }
+
+void checkLocation(ListedZone const& zone, Findings& findings) {
+    Place const place = zone.place / "location";
+    if (isEmpty(zone.location))
+        findings.add(ZoneEmpty, place, {inWords(zone.location)});
+    else if (isOffPage(zone.location))
+        findings.add(ZoneOffPage, place, {inWords(zone.location)});
+    else if (widthOf(zone.location) < TINY || heightOf(zone.location) < TINY)
+        findings.add(ZoneTiny, place,
+                     {inMillimetres(widthOf(zone.location)), inMillimetres(heightOf(zone.location))});
+    else if (isBeyondPage(zone.location))
+        findings.add(ZoneBeyondPage, place, {inWords(zone.location)});
+}
+
+std::optional<Cfg::Rect> shared(Cfg::Rect const& a, Cfg::Rect const& b) {
+    Cfg::Rect const both(std::max(a.left, b.left), std::max(a.top, b.top), std::min(a.right, b.right),
+                         std::min(a.bottom, b.bottom));
+    return isEmpty(both) ? std::nullopt : std::optional(both);
+}
+
+/// The point that holds for a zone without a location.
+Cfg::Point pointOf(ListedZone const& zone) {
+    return zone.point.isZeroes() ? Cfg::ExtractZone::DEF_MOST_PROBABLE_POINT : zone.point;
+}
+
+void checkApart(ListedZone const& zone, ListedZone const& other, Findings& findings) {
+    if (zone.hasLocation() != other.hasLocation())
+        return;
+    if (!zone.hasLocation()) {
+        Cfg::Point const point = pointOf(zone);
+        if (point == pointOf(other))
+            findings.add(ZonesAtOnePoint, zone.place,
+                         {std::to_string(point.x), std::to_string(point.y), inQuotes(other.name),
+                          other.place.pointer()});
+    } else if (auto const both = shared(zone.location, other.location)) {
+        findings.add(ZonesOverlap, zone.place / "location",
+                     {inMillimetres(widthOf(*both)), inMillimetres(heightOf(*both)), inQuotes(other.name),
+                      other.place.pointer()});
+    }
+}
+
+template<typename Look>
+void forEachZone(PresetsDocument const& document, Look look) {
+    for (ListedExtractPreset const& preset : document.extractPresets())
+        for (ListedZone const& zone : preset.zones)
+            look(zone);
+}
+
+} // namespace
+
+void checkZonePlaces(PresetsDocument const& document, Findings& findings) {
+    forEachZone(document, [&](ListedZone const& zone) {
+        if (zone.hasLocation())
+            checkLocation(zone, findings);
+        if (isOffPage(zone.point))
+            findings.add(PointOffPage, zone.place / "most_probable_point",
+                         {std::to_string(zone.point.x), std::to_string(zone.point.y)});
+    });
+}
+
+void checkZonesApart(PresetsDocument const& document, Findings& findings) {
+    for (ListedExtractPreset const& preset : document.extractPresets())
+        for (auto zone = preset.zones.begin(); zone != preset.zones.end(); ++zone)
+            for (auto other = preset.zones.begin(); other != zone; ++other)
+                checkApart(*zone, *other, findings);
+}
+
+void checkZoneFields(PresetsDocument const& document, Findings& findings) {
+    forEachZone(document, [&](ListedZone const& zone) {
+        if (zone.json.get("fields").isArray() && arrayOf(zone.json, "fields").empty())
+            findings.add(ZoneWithoutFields, zone.place);
+    });
+}
+
+} // namespace VlMail

@@ -1,0 +1,28 @@
+#include "programs/vlmail/presets/lint.h"
+
+#include "programs/vlmail/presets/checks.h"
+
+namespace VlMail {
+namespace {
+
+constexpr Check CHECKS[] = {
+    checkParts,           checkDuplicateKeys,    checkKeys,
+    checkNumbers,         checkMatches,          checkReach,
+    checkOrders,          checkErasedPresets,    checkPackPresetNames,
+    checkPackPresetsUsed, checkProcessModes,     checkLetterheads,
+    checkPatterns,        checkValueGroups,      checkZonePlaces,
+    checkZonesApart,      checkZoneFields,       checkFieldsCoexist,
+    checkAddresses,       checkFieldAttributes,  checkLimits,
+    checkDefaults,        checkDatesWithoutYear, checkNumbersWithoutMinimum,
+};
+
+} // namespace
+
+std::vector<Finding> lint(PresetsDocument const& document) {
+    Findings findings;
+    for (Check const check : CHECKS)
+        check(document, findings);
+    return findings.sorted();
+}
+
+} // namespace VlMail

@@ -1,0 +1,190 @@
+// vlmail presets match: which presets a document's name gets, and why not the ones in front.
+#include "programs/vlmail/command.h"
+#include "programs/vlmail/node_settings.h"
+#include "programs/vlmail/presets/presets_command.h"
+#include "programs/vlmail/presets/presets_document.h"
+#include "programs/vlmail/presets/why_not.h"
+#include "programs/vlmail/presets/words.h"
+#include "programs/vlmail/utf8.h"
+#include "vlservice/platform/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <filesystem>
+#include <memory>
+#include <ostream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+using enum Cfg::PresetFieldIdxs;
+
+struct Options {
+    std::vector<std::string> names;
+    std::string settings;
+    bool json = false;
+};
+
+/// A preset that was tried, or the one that was taken.
+struct Tried {
+    std::size_t number = 0;
+    ListedExtractPreset listed;
+    /// Comes from the defaults and stands in no document.
+    bool byDefault = false;
+    WhyNot why;
+};
+
+struct Found {
+    std::string name;
+    std::vector<Tried> earlier;
+    std::optional<Tried> taken;
+    std::string packPreset;
+    /// None for one that comes from the defaults.
+    std::optional<Place> packPlace;
+    /// What failed and what to do; empty when both presets were found.
+    std::string error;
+};
+
+/// The presets of the settings with their places.
+class Finder {
+public:
+    Finder(NodeSettings const& settings, std::string const& text)
+        : settings_(settings), document_(text), presets_(settings.presets()) {}
+
+    Found find(std::string const& name) const {
+        Found found{name, {}, {}, {}, {}, {}};
+        std::size_t number = 0;
+        for (auto const& element : presets_.elements<ExtractPresets>()) {
+            Tried tried = triedAt(number++, element.value);
+            try {
+                if (element.value.match(name)) {
+                    found.taken = std::move(tried);
+                    findPack(found);
+                    return found;
+                }
+            } catch (std::exception const& failure) {
+                found.error = "preset " + std::to_string(number) + ", " + tried.listed.inWords() +
+                              ", cannot be tried: " + failure.what() +
+                              "; correct it, or no later preset is reached";
+                return found;
+            }
+            tried.why = whyNot(element.value.strRegex(), name);
+            found.earlier.push_back(std::move(tried));
+        }
+        found.error = "no extraction preset fits; add one, such as \".*\"";
+        return found;
+    }
+
+private:
+    Tried triedAt(std::size_t index, Cfg::ExtractPreset const& preset) const {
+        auto const& all = document_.extractPresets();
+        if (index < all.size())
+            return {index + 1, all[index], false, {}};
+        return {index + 1, ListedExtractPreset{{}, {}, true, preset, {}}, true, {}};
+    }
+
+    void findPack(Found& found) const {
+        found.packPreset = found.taken->listed.preset.packPresetName();
+        auto const& packs = presets_.elements<PackPresets>();
+        bool const isThere = std::any_of(packs.begin(), packs.end(), [&](auto const& element) {
+            return element.value.name() == found.packPreset;
+        });
+        if (!isThere)
+            found.error = "there is no pack preset " + inQuotes(found.packPreset) +
+                          "; add it, or name another one in " + found.taken->listed.inWords();
+        auto const listed =
+            std::ranges::find(document_.packPresets(), found.packPreset, &ListedPackPreset::name);
+        if (listed != document_.packPresets().end())
+            found.packPlace = listed->place;
+    }
+
+    NodeSettings const& settings_;
+    PresetsDocument document_;
+    Cfg::Presets presets_;
+};
+
+json::Value placeOrNull(std::optional<Place> const& place) {
+    return place ? json::Value(place->pointer()) : json::Value(json_null());
+}
+
+json::Object toJson(Tried const& tried) {
+    Cfg::ExtractPreset const& preset = tried.listed.preset;
+    return {{"number", tried.number},
+            {"name", preset.name()},
+            {"match", preset.strRegex()},
+            {"place", placeOrNull(tried.byDefault ? std::nullopt : std::optional(tried.listed.place))}};
+}
+
+json::Object toJson(Found const& found) {
+    json::Object object{{"name", found.name}};
+    if (found.taken) {
+        object.set("extract_preset", toJson(*found.taken));
+        object.set("pack_preset",
+                   json::Object{{"name", found.packPreset}, {"place", placeOrNull(found.packPlace)}});
+    }
+    json::Array earlier;
+    for (Tried const& tried : found.earlier) {
+        json::Object one = toJson(tried);
+        one.set("why", tried.why.words);
+        one.set("failed_part", tried.why.failedPart);
+        one.set("fitted", tried.why.fitted);
+        earlier.append(one);
+    }
+    object.set("earlier", earlier);
+    if (!found.error.empty())
+        object.set("error", found.error);
+    return object;
+}
+
+std::string placeInWords(Tried const& tried) {
+    return tried.byDefault ? "added by default" : tried.listed.place.pointer();
+}
+
+void print(std::ostream& out, Found const& found) {
+    out << found.name << '\n';
+    for (Tried const& tried : found.earlier)
+        out << "  " << tried.number << ". " << tried.listed.inWords() << ": no, " << tried.why.words << '\n';
+    if (found.taken)
+        out << "  " << found.taken->number << ". " << found.taken->listed.inWords() << ": yes, "
+            << placeInWords(*found.taken) << '\n';
+    if (found.error.empty())
+        out << "  sent by the pack preset " << inQuotes(found.packPreset) << ", "
+            << (found.packPlace ? found.packPlace->pointer() : "added by default") << '\n';
+}
+
+int match(Options const& options, Terminal const& terminal) {
+    bool const hasSettings = !options.settings.empty();
+    NodeSettings const settings = hasSettings ? NodeSettings::fromFile(options.settings) : NodeSettings();
+    Finder const finder(settings, hasSettings ? readFile(options.settings) : "{}");
+    int status = FINE;
+    for (std::string const& name : options.names) {
+        Found const found = finder.find(validUtf8(std::filesystem::path(name).filename().string()));
+        if (options.json)
+            terminal.out << toJson(found) << '\n';
+        else
+            print(terminal.out, found);
+        if (found.error.empty())
+            continue;
+        terminal.complain(inQuotes(found.name) + ": " + found.error);
+        status = FAILED;
+    }
+    return status;
+}
+
+} // namespace
+
+void addPresetsMatchCommand(CLI::App& presets, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const command = presets.add_subcommand(
+        "match", "Tells which presets documents get by their names, and why not the others");
+    command->add_option("NAME", options->names, "Names of documents; folders in front of them are left out")
+        ->required();
+    command->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
+    command->add_flag("--json", options->json, "One JSON object a name, each on a line");
+    command->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return match(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,11 @@
+#pragma once
+// The commands under "vlmail presets"; each adds itself and, when it is named, leaves its task.
+
+#include "programs/vlmail/command.h"
+
+namespace VlMail {
+
+void addPresetsMatchCommand(CLI::App& presets, Task& task);
+void addPresetsLintCommand(CLI::App& presets, Task& task);
+
+} // namespace VlMail
