@@ -1,4 +1,5 @@
 // vlmail presets lint: what would go wrong with settings, before a letter does.
+#include "programs/reader/document.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/outcome.h"
@@ -22,7 +23,7 @@ struct Options {
 };
 
 PresetsDocument readDocument(std::string const& file) {
-    std::string const text = readFile(file);
+    std::string const text = Reader::readFile(file);
     try {
         return PresetsDocument(text);
     } catch (json::Exc const& wrong) {

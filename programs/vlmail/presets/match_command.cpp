@@ -1,4 +1,5 @@
 // vlmail presets match: which presets a document's name gets, and why not the ones in front.
+#include "programs/reader/document.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/presets/presets_command.h"
@@ -157,7 +158,7 @@ void print(std::ostream& out, Found const& found) {
 int match(Options const& options, Terminal const& terminal) {
     bool const hasSettings = !options.settings.empty();
     NodeSettings const settings = hasSettings ? NodeSettings::fromFile(options.settings) : NodeSettings();
-    Finder const finder(settings, hasSettings ? readFile(options.settings) : "{}");
+    Finder const finder(settings, hasSettings ? Reader::readFile(options.settings) : "{}");
     int status = FINE;
     for (std::string const& name : options.names) {
         Found const found = finder.find(validUtf8(std::filesystem::path(name).filename().string()));
