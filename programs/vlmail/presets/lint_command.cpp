@@ -1,7 +1,6 @@
 // vlmail presets lint: what would go wrong with settings, before a letter does.
 #include "programs/reader/document.h"
 #include "programs/vlmail/command.h"
-#include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/outcome.h"
 #include "programs/vlmail/presets/lint.h"
 #include "programs/vlmail/presets/presets_command.h"
