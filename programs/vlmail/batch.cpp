@@ -111,12 +111,12 @@ void runBatch(std::size_t count, std::size_t workers, Terminal const& terminal,
 } // namespace
 
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               WithPages withPages, Terminal const& terminal,
+               Along along, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
     runBatch(
         files.size(), workers, terminal,
-        [&](std::size_t index) { return readDocument(files[index], presets, settings, withPages); },
+        [&](std::size_t index) { return readDocument(files[index], presets, settings, along); },
         [&](std::size_t index) { return files[index]; }, take);
 }
 

@@ -15,7 +15,7 @@ class NodeSettings;
 /// the files. Shows progress where a person watches. A document that brings its reader down has that for its
 /// error.
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               WithPages withPages, Terminal const& terminal,
+               Along along, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take);
 
 /// The same with the pages of documents that were read before, as splitDocument() gives them.

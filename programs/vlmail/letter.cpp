@@ -83,7 +83,7 @@ void print(std::ostream& out, DocumentReading const& reading) {
 int showLetters(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Outcome outcome;
-    readBatch(options.files, settings, options.jobs, WithPages::No, terminal,
+    readBatch(options.files, settings, options.jobs, Along::Nothing, terminal,
               [&](std::size_t, ReadResult result) {
                   DocumentReading const& reading = result.reading;
                   outcome.count(reading);

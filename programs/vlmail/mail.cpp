@@ -39,7 +39,7 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, mailingsIntoFolder(options.output), terminal);
-    readBatch(options.files, settings, options.jobs, WithPages::Yes, terminal,
+    readBatch(options.files, settings, options.jobs, Along::Pages, terminal,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -62,7 +62,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
-    readBatch(options.files, settings, options.jobs, WithPages::No, terminal,
+    readBatch(options.files, settings, options.jobs, Along::Nothing, terminal,
               [&](std::size_t index, ReadResult result) {
                   plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
                   dispatch.take(std::move(result));

@@ -179,7 +179,7 @@ DocumentReading DocumentReading::fromJson(json::Object const& object) {
 }
 
 ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
-                        WithPages withPages) {
+                        Along along) {
     ReadResult result;
     DocumentReading& reading = result.reading;
     reading.document = file.filename().string();
@@ -194,7 +194,7 @@ ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeS
             return result;
         requirePatterns(extractPreset, settings);
         reading.letters = lettersOf(document, extractPreset);
-        if (withPages == WithPages::Yes)
+        if (contains(along, Along::Pages))
             result.pages = pagesOf(document, reading);
         else
             result.pages.resize(reading.letters->size());

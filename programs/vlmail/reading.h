@@ -69,12 +69,23 @@ struct ReadResult {
 
 json::Array toJsonArray(std::vector<int> const& numbers);
 
-enum class WithPages { No, Yes };
+/// What comes along with the letters, as a set.
+enum class Along : unsigned {
+    Nothing = 0,
+    Pages = 1,
+};
+
+constexpr Along operator|(Along one, Along other) {
+    return static_cast<Along>(static_cast<unsigned>(one) | static_cast<unsigned>(other));
+}
+constexpr bool contains(Along set, Along one) {
+    return (static_cast<unsigned>(set) & static_cast<unsigned>(one)) != 0;
+}
 
 /// Reads a document as the settings say. Failures are the reading's `error`; nothing derived from
 /// std::exception is thrown.
 ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
-                        NodeSettings const& settings, WithPages withPages);
+                        NodeSettings const& settings, Along along);
 
 /// The pages of a document that was read before, for the letters that can go out. A document that is not the
 /// one with that digest any more is a failure, said in the reading's `error`.
