@@ -39,8 +39,7 @@ bool isPdf(std::string_view bytes) {
 } // namespace
 
 Document::Document(std::string name, std::unique_ptr<PageSource> source)
-    : name_(std::move(name)), source_(std::move(source)),
-      pages_(static_cast<std::size_t>(source_->pageCount())) {}
+    : name_(std::move(name)), source_(std::move(source)) {}
 
 Document::Document(Document&&) noexcept = default;
 Document& Document::operator=(Document&&) noexcept = default;
@@ -50,10 +49,10 @@ int Document::pageCount() const { return source_->pageCount(); }
 
 Page const& Document::page(int number) {
     checkNumber(number);
-    std::optional<Page>& page = pages_[static_cast<std::size_t>(number - 1)];
-    if (!page)
-        page = source_->readPage(number);
-    return *page;
+    auto page = pages_.find(number);
+    if (page == pages_.end())
+        page = pages_.emplace(number, source_->readPage(number)).first;
+    return page->second;
 }
 
 std::string Document::singlePagePdf(int number) {

@@ -5,16 +5,15 @@
 #include "programs/reader/page.h"
 
 #include <filesystem>
+#include <map>
 #include <memory>
-#include <optional>
 #include <string>
-#include <vector>
 
 namespace Reader {
 
 class PageSource;
 
-/// One document. Pages are read when they are first asked for, and kept.
+/// One document. Pages are read when they are first asked for, and stay where they are as long as it lives.
 /// A document belongs to one thread; several threads may each have their own.
 class Document {
 public:
@@ -40,7 +39,7 @@ private:
 
     std::string name_;
     std::unique_ptr<PageSource> source_;
-    std::vector<std::optional<Page>> pages_;
+    std::map<int, Page> pages_;
 };
 
 /// The bytes of a document, for openDocument() and for whoever else wants them. Throws Error.

@@ -42,6 +42,8 @@ bool takesColumn(UChar32 c) {
 /// Puts characters on pages, as a typewriter does.
 class Typist {
 public:
+    explicit Typist(std::string const& where) : where_(where) {}
+
     std::vector<Page> type(std::u16string_view text) {
         newPage();
         for (std::size_t i = 0; i < text.size();) {
@@ -71,6 +73,9 @@ private:
             endWord();
             ++row_;
             column_ = 0;
+            if (row_ > MAX_ROWS)
+                fail("has a page of more than " + std::to_string(MAX_ROWS) +
+                     " lines; end its pages with form feeds");
             return;
         case '\t':
             endWord();
@@ -97,6 +102,8 @@ private:
         if (word_.empty())
             return;
         Word word;
+        if (column_ > MAX_COLUMNS)
+            fail("has a line of more than " + std::to_string(MAX_COLUMNS) + " characters; break its lines");
         word.text = cleanText(word_);
         word_.clear();
         if (word.text.empty())
@@ -110,6 +117,8 @@ private:
     }
 
     void newPage() {
+        if (pages_.size() == MAX_PAGES)
+            fail("has more than " + std::to_string(MAX_PAGES) + " pages; split it");
         Page page;
         page.number = static_cast<int>(pages_.size()) + 1;
         page.width = TypedPage::WIDTH;
@@ -120,6 +129,14 @@ private:
         column_ = 0;
     }
 
+    [[noreturn]] void fail(std::string const& what) const { throw Error(where_ + ": " + what); }
+
+    // What no letter needs; places on larger pages would not fit their numbers.
+    static constexpr int MAX_ROWS = 10000;
+    static constexpr int MAX_COLUMNS = 10000;
+    static constexpr std::size_t MAX_PAGES = 100000;
+
+    std::string const& where_;
     std::vector<Page> pages_;
     std::u16string word_;
     int row_ = 0;
@@ -152,7 +169,7 @@ std::unique_ptr<PageSource> openText(std::string_view bytes, std::string const& 
     constexpr std::size_t MAX_BYTES = std::size_t{64} << 20;
     if (bytes.size() > MAX_BYTES)
         throw Error(where + ": has more than 64 MiB of text; split it");
-    return std::make_unique<TextSource>(Typist().type(decode(bytes, where)), where);
+    return std::make_unique<TextSource>(Typist(where).type(decode(bytes, where)), where);
 }
 
 } // namespace Reader

@@ -154,6 +154,26 @@ TEST(TextFiles, HaveALargerSheetWhereTheyNeedIt) {
     EXPECT_EQ(document.page(1).width, 2500 + 42333 + 2500);
 }
 
+TEST(TextFiles, ThatAreNoLettersSaySo) {
+    auto const complaint = [](std::string text) -> std::string {
+        try {
+            openDocument(std::move(text), "a.txt");
+        } catch (Error const& error) {
+            return error.what();
+        }
+        return "nothing";
+    };
+    EXPECT_EQ(complaint(std::string(10000, '\n')), "nothing");
+    EXPECT_EQ(complaint(std::string(10001, '\n')),
+              "a.txt: has a page of more than 10000 lines; end its pages with form feeds");
+    EXPECT_EQ(complaint(std::string(10000, 'x')), "nothing");
+    EXPECT_EQ(complaint(std::string(10001, 'x')),
+              "a.txt: has a line of more than 10000 characters; break its lines");
+    EXPECT_EQ(complaint(std::string(100001, '\f')), "a.txt: has more than 100000 pages; split it");
+    EXPECT_EQ(complaint(std::string((std::size_t{64} << 20) + 1, ' ')),
+              "a.txt: has more than 64 MiB of text; split it");
+}
+
 TEST(TextFiles, BecomePdfsThatReadTheSame) {
     for (std::string const text :
          {"Herrn (Olaf) \\ Strößner\n04109 Leipzig €", "Pan Stanisław Żółkiewski\nul. Świętej Gertrudy 26/8",

@@ -11,6 +11,7 @@
 
 #include <cstdlib>
 #include <fstream>
+#include <future>
 #include <iterator>
 
 namespace Reader {
@@ -102,6 +103,25 @@ TEST_P(Examples, AreReadAsTheyShould) {
     EXPECT_FALSE(found.empty());
     if (std::getenv("UPDATE_GOLDEN"))
         std::ofstream(folder / "expected.json") << printed(json::Object{{"documents", found}}) << '\n';
+}
+
+TEST(Threads, ReadDocumentsOfTheirOwnSideBySide) {
+    auto const wordsOfAll = [] {
+        std::vector<std::string> words;
+        for (fs::directory_entry const& entry : fs::recursive_directory_iterator(EXAMPLES)) {
+            if (entry.path().extension() == ".json" || !entry.is_regular_file())
+                continue;
+            Document document = openDocument(entry.path());
+            for (Word const& word : document.page(1).words)
+                words.push_back(word.text);
+            words.push_back(document.singlePagePdf(1));
+        }
+        return words;
+    };
+    std::future<std::vector<std::string>> other = std::async(std::launch::async, wordsOfAll);
+    std::vector<std::string> const own = wordsOfAll();
+    EXPECT_GT(own.size(), 1000U);
+    EXPECT_EQ(other.get(), own);
 }
 
 INSTANTIATE_TEST_SUITE_P(Letters, Examples, testing::ValuesIn(collections()), [](auto const& test) {
