@@ -108,6 +108,11 @@ void DiscoveryBase::recv(RcvFunc func, boost::posix_time::time_duration timeout)
     }));
 }
 
+void DiscoveryBase::recvAll(RcvFunc func) {
+    allFunc_ = func;
+    recv(std::move(func));
+}
+
 void DiscoveryBase::close() {
     if (closed_.exchange(true))
         return;
@@ -139,7 +144,10 @@ void DiscoveryBase::handleReceive(error_code const& ec, std::uint64_t bytes) {
     }
     std::string const text(rcvBuf_.data(), bytes);
     trace(senderEndpoint_, " recevied msg: ", text);
+    std::weak_ptr const alive(alive_);
     callRcvFunc(text);
+    if (!alive.expired() && allFunc_)
+        recv(allFunc_);
 }
 
 void DiscoveryBase::handleTimeout(error_code const& ec) {

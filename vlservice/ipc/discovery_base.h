@@ -47,6 +47,9 @@ public:
     /// When the time is up, an empty object is received and what else is pending is cancelled. The time goes
     /// on after a datagram: only another timed receive, or close, ends it.
     void recv(RcvFunc func, boost::posix_time::time_duration timeout);
+    /// For a service: receives one datagram after another until close(). What is no JSON object, and what
+    /// `func` throws, is logged and passed over. A failure of the socket ends it.
+    void recvAll(RcvFunc func);
     /// Nothing is sent or received any more. A second call does nothing.
     void close();
 
@@ -79,6 +82,8 @@ private:
     std::array<char, MAX_RCV_LENGTH> rcvBuf_;
     std::string sendBuf_;
     RcvFunc rcvFunc_;
+    /// Of recvAll: it is received for again after each datagram.
+    RcvFunc allFunc_;
     std::unique_ptr<boost::asio::deadline_timer> timer_;
     /// Tells the newest timer's handler from that of a former one that had expired before it could be
     /// cancelled.
