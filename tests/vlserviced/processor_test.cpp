@@ -1,81 +1,29 @@
 #include "programs/vlserviced/processor.h"
 
-#include "programs/vlserviced/store/schema.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
-#include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
-#include "vlservice/ipc/make_empty_cmd.h"
-#include "vlservice/platform/log.h"
-
-#include <gtest/gtest.h>
-
-#include <fstream>
-#include <optional>
+#include "tests/vlserviced/processor_fixture.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 
-/// A service without a connection: a command is made of its number and the text of its request, as it is for
-/// one that was received.
-class ProcessorTest : public testing::Test {
-protected:
-    ProcessorTest() {
-        formerSink_ = Log::setSink([this](int, std::string const& line) { log_.push_back(line); });
-        fs::create_directory(outbox_);
-        fs::create_directory(upload_);
-    }
-    ~ProcessorTest() override { Log::setSink(formerSink_); }
-
-    /// The response's text, or "failed: " and what was thrown.
-    std::string send(int id, std::string const& request) {
-        std::shared_ptr<Ipc::CmdVLSvcBase> const cmd =
-            Ipc::makeEmptyCmd(static_cast<unsigned char>(id), processor_);
-        try {
-            static_cast<Ipc::JsonCmdBase&>(*cmd).deserializeReq(parse(request));
-            processor_->submit(cmd);
-            return print(static_cast<Ipc::JsonCmdBase&>(*cmd).serializeResp());
-        } catch (std::exception const& failure) {
-            return std::string("failed: ") + failure.what();
-        }
-    }
-    std::string processPack(std::string const& packId) {
-        return send(25, R"({"db_conn":")" + folder_.path().string() + R"(","db_name":"packs.db","id":")" +
-                            packId + "\"}");
-    }
-
-    TemporaryFolder folder_;
-    fs::path outbox_ = folder_ / "outbox";
-    fs::path upload_ = folder_ / "upload";
-    std::vector<std::string> log_;
-    Log::Sink formerSink_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore store_{database_};
-    VlServiced::SettingsService settings_{store_};
-    VlServiced::JobStore jobs_{database_};
-    VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
-                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                                             [] { return 1000LL; },
-                                             [this] { return settings_.service(); },
-                                             outbox_,
-                                         }};
-    std::shared_ptr<VlServiced::Processor> processor_ =
-        std::make_shared<VlServiced::Processor>(settings_, jobs_, runner_, outbox_, [] { return 1000LL; });
-};
+class ProcessorTest : public ProcessorFixture {};
 
 TEST_F(ProcessorTest, SetsEachPartOfANode) {
     std::pair<int, char const*> const commands[] = {
-        {10, R"({"max_letter_sheets":7})"}, {12, R"({"status_update_hours":3})"},
-        {14, R"({"vals":[{"name":"P"}]})"}, {15, R"({"code":"C"})"},
+        {10, R"({"max_letter_sheets":7})"},
+        {12, R"({"status_update_hours":3})"},
+        {13, R"({"pack_presets":[{"name":"A"},{"name":"B","erase_me":true}]})"},
+        {14, R"({"vals":[{"name":"P"}]})"},
+        {15, R"({"code":"C"})"},
         {16, R"({"vals":["D"]})"},
     };
     for (auto const& [id, part] : commands)
         EXPECT_EQ(send(id, R"({"cfg_id":"a=acme","part":)" + std::string(part) + "}"), "{}") << id;
-    EXPECT_EQ(print(store_.parts("a=acme")),
-              R"({"app":{"max_letter_sheets":7},"deps":{"vals":["D"]},"inet":{"status_update_hours":3},)"
-              R"("po":{"code":"C"},"profiles":{"vals":[{"name":"P"}]}})");
+    EXPECT_EQ(
+        print(store_.parts("a=acme")),
+        R"({"app":{"max_letter_sheets":7},"deps":{"vals":["D"]},"inet":{"status_update_hours":3},)"
+        R"("po":{"code":"C"},"presets":{"pack_presets":[{"name":"A"}]},"profiles":{"vals":[{"name":"P"}]}})");
     EXPECT_EQ(send(10, R"({"cfg_id":"a=acme"})"), "{}");
     EXPECT_FALSE(store_.parts("a=acme").get("app"));
 }
@@ -163,7 +111,7 @@ TEST_F(ProcessorTest, BringsAPackFromTheDatabaseToTheUploadFolder) {
     std::string const database = R"({"db_host":")" + folder_.path().string() + R"(","db_name":"packs.db"})";
     EXPECT_EQ(send(20, database), "{}");
     EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
-    fs::remove(upload_ / "p1.mailing");
+    std::filesystem::remove(upload_ / "p1.mailing");
     EXPECT_EQ(send(21, database), "{}");
     EXPECT_NE(send(29, R"({"query":"jobs"})").find(R"("id":"p1","state":"lodged")"), std::string::npos);
     EXPECT_NE(send(26, "{}").find(R"("jobs":{"lodged":1})"), std::string::npos);
@@ -181,9 +129,9 @@ TEST_F(ProcessorTest, HoldsJobsBackUntilTheyMayGoOn) {
     storePack(folder_ / "packs.db", "p1");
     EXPECT_EQ(send(30, R"({"susp_type":2})"), "{}");
     EXPECT_EQ(processPack("p1"), "{}");
-    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_FALSE(std::filesystem::exists(outbox_ / "p1.mailing"));
     EXPECT_EQ(send(30, "{}"), "{}");
-    EXPECT_TRUE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_TRUE(std::filesystem::exists(outbox_ / "p1.mailing"));
 }
 
 } // namespace

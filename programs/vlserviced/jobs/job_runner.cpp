@@ -144,9 +144,10 @@ void JobRunner::finishSubmitting(Job const& job) {
     Outcome const outcome = outcomeOf([&] { publish(job.containerName(), job.uploadFolder); });
     if (outcome.kind != Outcome::Kind::Done)
         return noteProblem(job.pack.packId, outcome.why);
-    jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
+    // While the job is on record as Submitting, so that a container that stays behind is seen to again.
     std::error_code ignored;
     fs::remove(surroundings_.outbox / job.containerName(), ignored);
+    jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
 }
 
 void JobRunner::upload(std::string const& folder, std::string const& database) {
@@ -184,6 +185,9 @@ void JobRunner::refresh(Job const& job) {
 }
 
 void JobRunner::noteProblem(std::string const& packId, std::string const& problem) {
+    // What goes on being in the way is logged once.
+    if (jobs_.find(packId).value().problem == problem)
+        return;
     Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot go on: " << problem;
     jobs_.setProblem(packId, problem);
 }

@@ -1,0 +1,36 @@
+#include "programs/vlserviced/one_line.h"
+#include "programs/vlserviced/options.h"
+#include "programs/vlserviced/service.h"
+#include "vlservice/platform/log.h"
+
+#include <exception>
+#include <iostream>
+
+namespace {
+
+int serve(VlServiced::Options const& options) {
+    try {
+        g_LogVerbose = options.verbose;
+        VlServiced::Service service(options);
+        bool const isIp6 = options.listen.find(':') != std::string::npos;
+        std::cout << "listening on " << (isIp6 ? '[' + options.listen + ']' : options.listen) << ':'
+                  << service.port() << '\n';
+        if (!service.fingerprint().empty())
+            std::cout << "certificate " << service.fingerprint() << '\n';
+        std::cout << std::flush;
+        service.run();
+        return 0;
+    } catch (std::exception const& failure) {
+        std::cerr << "vlserviced: " << VlServiced::oneLine(failure.what()) << std::endl;
+        return 1;
+    }
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr);
+    if (int const* const status = std::get_if<int>(&parsed))
+        return *status;
+    return serve(std::get<VlServiced::Options>(parsed));
+}

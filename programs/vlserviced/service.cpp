@@ -1,0 +1,202 @@
+#include "programs/vlserviced/service.h"
+
+#include "programs/channel/server.h"
+#include "programs/channel/token.h"
+#include "programs/vlserviced/discovery_answer.h"
+#include "programs/vlserviced/error.h"
+#include "programs/vlserviced/one_line.h"
+#include "programs/vlserviced/processor.h"
+#include "programs/vlserviced/store/data_folder.h"
+#include "programs/vlserviced/store/schema.h"
+#include "vlservice/ipc/make_empty_cmd.h"
+#include "vlservice/platform/log.h"
+
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/address.hpp>
+#include <boost/asio/ip/host_name.hpp>
+#include <boost/asio/post.hpp>
+#include <boost/asio/signal_set.hpp>
+#include <boost/asio/steady_timer.hpp>
+#include <boost/asio/thread_pool.hpp>
+
+#include <chrono>
+#include <csignal>
+#include <ctime>
+#include <optional>
+#include <utility>
+#include <vector>
+
+namespace VlServiced {
+namespace {
+
+namespace asio = boost::asio;
+namespace fs = std::filesystem;
+
+/// How often jobs are tried again that something kept from going on.
+constexpr std::chrono::minutes RETRY_TIME{1};
+constexpr std::size_t MAX_PATH_BYTES = 1000;
+
+long long now() { return std::time(nullptr); }
+
+fs::path preparedOutbox(Options const& options, DataFolder const& data) {
+    fs::path const outbox = fs::absolute(options.outbox.empty() ? data.outbox() : options.outbox);
+    if (!isPlainText(outbox.string(), MAX_PATH_BYTES))
+        throw Error("the path of the outbox has to be a line of UTF-8 text");
+    makeWritableFolder(outbox);
+    return outbox;
+}
+
+/// Whether the file is one that a Mailing::PendingFile was being written to.
+bool isUnfinished(fs::path const& file) {
+    std::string const name = file.filename().string();
+    return name.size() == 12 && name.starts_with('.') && name.ends_with(".part");
+}
+
+/// What a process that was killed was writing.
+void removeUnfinished(fs::path const& outbox) {
+    std::vector<fs::path> unfinished;
+    for (fs::directory_entry const& entry : fs::directory_iterator(outbox))
+        if (isUnfinished(entry.path()))
+            unfinished.push_back(entry.path());
+    std::error_code ignored;
+    for (fs::path const& file : unfinished)
+        fs::remove(file, ignored);
+}
+
+std::string announcedHost(Options const& options) {
+    if (!options.announce.empty())
+        return options.announce;
+    return asio::ip::make_address(options.listen).is_unspecified() ? asio::ip::host_name() : options.listen;
+}
+
+Channel::ServerSettings serverSettings(Options const& options, DataFolder const& data) {
+    Channel::ServerSettings settings;
+    settings.address = options.listen;
+    settings.port = options.port;
+    settings.token = Channel::readOrCreateToken(data.token().string());
+    settings.certificateFile = options.certificate;
+    settings.keyFile = options.key;
+    return settings;
+}
+
+} // namespace
+
+class Service::Impl {
+public:
+    explicit Impl(Options const& options)
+        : data_(options.data), outbox_(preparedOutbox(options, data_)),
+          database_(openServiceDatabase(data_.database())),
+          server_(std::in_place, io_, serverSettings(options, data_), &Ipc::makeEmptyCmd,
+                  Channel::acceptAtOnce(processor_)) {
+        removeUnfinished(outbox_);
+        if (options.answersDiscovery)
+            discovery_.emplace(io_, announcedHost(options), server_->port());
+    }
+
+    ~Impl() {
+        worker_.stop();
+        worker_.join();
+    }
+
+    Channel::Server const& server() const { return *server_; }
+
+    void run() {
+        signals_.async_wait([this](boost::system::error_code const& ec, int) {
+            if (!ec)
+                stop();
+        });
+        asio::post(io_, [this] { runner_.resume(); });
+        awaitUpkeep();
+        runHandlers();
+        // What the worker has finished by now goes on record; the rest is taken up at the next start.
+        worker_.stop();
+        worker_.join();
+        io_.restart();
+        runHandlers();
+    }
+
+    void stopFromAnywhere() {
+        asio::post(io_, [this] { stop(); });
+    }
+
+private:
+    void runHandlers() {
+        for (;;) {
+            try {
+                io_.run();
+                return;
+            } catch (std::exception const& failure) {
+                Log::Lock(3).logStreamLine()
+                    << "The service goes on after a failure. " << oneLine(failure.what());
+            }
+        }
+    }
+
+    void stop() {
+        server_->stop();
+        discovery_.reset();
+        upkeep_.cancel();
+        signals_.cancel();
+    }
+
+    void awaitUpkeep() {
+        upkeep_.expires_after(RETRY_TIME);
+        upkeep_.async_wait([this](boost::system::error_code const& ec) {
+            if (ec)
+                return;
+            awaitUpkeep();
+            keepUp();
+        });
+    }
+
+    void keepUp() {
+        runner_.resume();
+        auto const time = std::chrono::steady_clock::now();
+        if (time - lastStatusUpdate_ >= statusUpdateTime()) {
+            lastStatusUpdate_ = time;
+            runner_.updateStatus("", "");
+        }
+    }
+
+    std::chrono::hours statusUpdateTime() const {
+        json::Object const inet =
+            settings_.effective("", {"inet"}).get("parts").toObject().get("inet").toObject();
+        long long const hours = inet.get("values").toObject().get("status_update_hours").intOrZero();
+        return std::chrono::hours(hours > 0 ? hours : 1);
+    }
+
+    JobSurroundings surroundings() {
+        return {[this](JobSurroundings::Work work) { asio::post(worker_, std::move(work)); },
+                [this](JobSurroundings::Work work) { asio::post(io_, std::move(work)); }, &now,
+                [this] { return settings_.service(); }, outbox_};
+    }
+
+    DataFolder data_;
+    fs::path outbox_;
+    SQLite::Database database_;
+    SettingsStore store_{database_};
+    SettingsService settings_{store_};
+    JobStore jobs_{database_};
+
+    asio::io_context io_{1};
+    asio::thread_pool worker_{1};
+    JobRunner runner_{jobs_, surroundings()};
+    std::shared_ptr<Processor> processor_ =
+        std::make_shared<Processor>(settings_, jobs_, runner_, outbox_, &now);
+
+    asio::signal_set signals_{io_, SIGTERM, SIGINT};
+    asio::steady_timer upkeep_{io_};
+    std::chrono::steady_clock::time_point lastStatusUpdate_ = std::chrono::steady_clock::now();
+    std::optional<Channel::Server> server_;
+    std::optional<DiscoveryAnswer> discovery_;
+};
+
+Service::Service(Options const& options) : impl_(std::make_unique<Impl>(options)) {}
+Service::~Service() = default;
+
+std::uint16_t Service::port() const { return impl_->server().port(); }
+std::string const& Service::fingerprint() const { return impl_->server().fingerprint(); }
+void Service::run() { impl_->run(); }
+void Service::stop() { impl_->stopFromAnywhere(); }
+
+} // namespace VlServiced

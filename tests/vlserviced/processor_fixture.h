@@ -1,0 +1,64 @@
+#pragma once
+// A service without a connection, for tests of what commands do.
+
+#include "programs/vlserviced/processor.h"
+#include "programs/vlserviced/store/schema.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+#include "vlservice/ipc/make_empty_cmd.h"
+#include "vlservice/platform/log.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <vector>
+
+/// A command is made of its number and the text of its request, as it is for
+/// one that was received.
+class ProcessorFixture : public testing::Test {
+protected:
+    ProcessorFixture() {
+        formerSink_ = Log::setSink([this](int, std::string const& line) { log_.push_back(line); });
+        std::filesystem::create_directory(outbox_);
+        std::filesystem::create_directory(upload_);
+    }
+    ~ProcessorFixture() override { Log::setSink(formerSink_); }
+
+    /// The response's text, or "failed: " and what was thrown.
+    std::string send(int id, std::string const& request) {
+        std::shared_ptr<Ipc::CmdVLSvcBase> const cmd =
+            Ipc::makeEmptyCmd(static_cast<unsigned char>(id), processor_);
+        try {
+            static_cast<Ipc::JsonCmdBase&>(*cmd).deserializeReq(parse(request));
+            processor_->submit(cmd);
+            return print(static_cast<Ipc::JsonCmdBase&>(*cmd).serializeResp());
+        } catch (std::exception const& failure) {
+            return std::string("failed: ") + failure.what();
+        }
+    }
+    std::string processPack(std::string const& packId) {
+        return send(25, R"({"db_conn":")" + folder_.path().string() + R"(","db_name":"packs.db","id":")" +
+                            packId + "\"}");
+    }
+
+    TemporaryFolder folder_;
+    std::filesystem::path outbox_ = folder_ / "outbox";
+    std::filesystem::path upload_ = folder_ / "upload";
+    std::vector<std::string> log_;
+    Log::Sink formerSink_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{database_};
+    VlServiced::SettingsService settings_{store_};
+    VlServiced::JobStore jobs_{database_};
+    VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
+                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                             [] { return 1000LL; },
+                                             [this] { return settings_.service(); },
+                                             outbox_,
+                                         }};
+    std::shared_ptr<VlServiced::Processor> processor_ =
+        std::make_shared<VlServiced::Processor>(settings_, jobs_, runner_, outbox_, [] { return 1000LL; });
+};

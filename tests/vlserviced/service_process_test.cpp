@@ -1,0 +1,283 @@
+// The program as people run it: started, asked, ended, killed.
+#include "tests/vlserviced/service_process.h"
+
+#include "programs/channel/error.h"
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+#include "tests/vlserviced/pack_help.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
+#include "vlservice/ipc/get_svc_cfg.h"
+#include "vlservice/ipc/process_pack.h"
+#include "vlservice/ipc/set_part_tmpl.h"
+#include "vlservice/ipc/set_svc_cfg.h"
+#include "vlservice/ipc/upload_queued.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <chrono>
+#include <csignal>
+#include <fstream>
+#include <set>
+#include <thread>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+class ServiceProcessTest : public testing::Test {
+protected:
+    std::vector<std::string> arguments(std::vector<std::string> const& more = {}) const {
+        std::vector<std::string> all{"--data", data_.string(), "--no-discovery"};
+        all.insert(all.end(), more.begin(), more.end());
+        return all;
+    }
+    /// The error of a start that fails.
+    std::string startFailure(std::vector<std::string> const& all) {
+        ServiceProcess service(all);
+        EXPECT_EQ(service.firstLine(), "");
+        EXPECT_EQ(service.wait(), 1);
+        return service.errors();
+    }
+
+    TemporaryFolder folder_;
+    fs::path data_ = folder_ / "data";
+};
+
+TEST_F(ServiceProcessTest, SaysWhereItListensAndAnswersWhoHasTheToken) {
+    ServiceProcess const service(arguments());
+    EXPECT_TRUE(service.firstLine().starts_with("listening on 127.0.0.1:")) << service.firstLine();
+    EXPECT_NE(service.port(), 0);
+    EXPECT_EQ(fs::status(data_ / "token").permissions(), fs::perms(0600));
+    auto const client = clientOf(service, data_);
+    EXPECT_EQ(client->call<Ipc::GetSvcCfg>()->resp().get("outbox"), json::Value((data_ / "outbox").string()));
+}
+
+TEST_F(ServiceProcessTest, EndsCleanlyOnATermSignalAndKeepsWhatItHas) {
+    for (int const number : {SIGTERM, SIGINT}) {
+        ServiceProcess service(arguments());
+        auto const client = clientOf(service, data_);
+        Cfg::PO part(json::Value(), false, false);
+        part.setOwn<Cfg::POFieldIdxs::Code>("signal " + std::to_string(number));
+        EXPECT_EQ(client->call<Ipc::SetPO>(Cfg::Id("a=acme", false), part)->respErrMsg(), "");
+        service.signal(number);
+        EXPECT_EQ(service.wait(), 0);
+        EXPECT_EQ(service.errors(), "");
+        ServiceProcess const next(arguments());
+        json::Object const answer =
+            clientOf(next, data_)
+                ->call<Ipc::CSConfigIdsList>(parse(R"({"query":"settings","id":"a=acme"})"))
+                ->resp();
+        EXPECT_NE(print(answer).find("signal " + std::to_string(number)), std::string::npos);
+    }
+}
+
+TEST_F(ServiceProcessTest, TellsErrorsOfCommandsWithoutAnAnswerAsErrors) {
+    ServiceProcess const service(arguments());
+    auto const client = clientOf(service, data_);
+    std::string const text =
+        failureOf([&] { client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", "p1"); });
+    EXPECT_NE(text.find("there is no pack database " + (folder_ / "packs.db").string()), std::string::npos)
+        << text;
+}
+
+TEST_F(ServiceProcessTest, RefusesASecondProcessOnItsFolder) {
+    ServiceProcess const first(arguments());
+    std::string const text = startFailure(arguments());
+    EXPECT_TRUE(text.starts_with("vlserviced: the data folder " + data_.string() +
+                                 " is in use by another vlserviced"))
+        << text;
+}
+
+TEST_F(ServiceProcessTest, RefusesOtherAddressesWithoutACertificate) {
+    for (char const* address : {"0.0.0.0", "::"}) {
+        std::string const text = startFailure(arguments({"--listen", address}));
+        EXPECT_TRUE(text.starts_with("vlserviced: ")) << text;
+        EXPECT_NE(text.find("certificate"), std::string::npos) << text;
+    }
+}
+
+TEST_F(ServiceProcessTest, FailsWithOneLineThatSaysWhatIsWrong) {
+    std::ofstream(folder_ / "file") << "x";
+    EXPECT_EQ(startFailure({"--data", (folder_ / "file").string()}),
+              "vlserviced: cannot write into the folder " + (folder_ / "file").string() +
+                  ": Not a directory\n");
+    fs::create_directory(data_);
+    std::ofstream(data_ / "service.db") << std::string(5000, 'x');
+    EXPECT_EQ(startFailure(arguments()),
+              "vlserviced: " + (data_ / "service.db").string() + " is not a service database\n");
+    fs::remove(data_ / "service.db");
+    std::string const text = startFailure(arguments({"--listen", "nowhere"}));
+    EXPECT_TRUE(text.starts_with("vlserviced: ")) << text;
+    EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1) << text;
+}
+
+TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {
+    std::uint16_t port = 0;
+    {
+        ServiceProcess service(arguments());
+        port = service.port();
+        service.signal(SIGTERM);
+        service.wait();
+    }
+    ServiceProcess const again(arguments({"--port", std::to_string(port)}));
+    EXPECT_EQ(again.port(), port);
+}
+
+/// A mailing on its way while the process is killed; whatever was acknowledged has to be there afterwards,
+/// and each container is handed on once.
+class KilledService : public ServiceProcessTest {
+protected:
+    KilledService() {
+        fs::create_directories(upload_);
+        fs::create_directories(taken_);
+        for (char const* id : {"p1", "p2"})
+            storePack(packs_, id);
+    }
+
+    /// Sends settings and packs until the service is no longer there.
+    void sendAll(ServiceProcess const& service) {
+        try {
+            auto const client = clientOf(service, data_);
+            client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
+            acknowledged_.insert("upload folder");
+            Cfg::PO part(json::Value(), false, false);
+            part.setOwn<Cfg::POFieldIdxs::Code>("kept");
+            client->call<Ipc::SetPO>(Cfg::Id("u=bob/a=acme", false), part);
+            acknowledged_.insert("settings");
+            for (char const* id : {"p1", "p2"}) {
+                client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", id);
+                acknowledged_.insert(id);
+            }
+            client->call<Ipc::UploadQueued>(folder_.path().string(), "packs.db");
+            acknowledged_.insert("upload");
+            awaitStates(*client, {"submitted"});
+            acknowledged_.insert("end");
+        } catch (std::exception const&) {
+            // It was killed in the middle of a command.
+        }
+    }
+
+    std::map<std::string, std::string> states(Channel::Client& client) {
+        std::map<std::string, std::string> states;
+        json::Object const answer =
+            client.call<Ipc::CSConfigIdsList>(json::Object{{"query", "jobs"}})->resp();
+        for (json::Value const& job : answer.get("jobs").toArray())
+            states[job.toObject().get("id").textOrEmpty()] = job.toObject().get("state").textOrEmpty();
+        return states;
+    }
+
+    /// Polls until all jobs are in one of the states.
+    void awaitStates(Channel::Client& client, std::set<std::string> const& wanted) {
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (std::chrono::steady_clock::now() < end) {
+            bool settled = true;
+            for (auto const& [id, state] : states(client))
+                settled &= wanted.contains(state);
+            if (settled)
+                return;
+            std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        }
+        FAIL() << "the jobs do not settle";
+    }
+
+    /// What the carrier does: takes every container that is there.
+    void takeContainers(std::string const& when) {
+        std::vector<fs::path> there;
+        for (fs::directory_entry const& entry : fs::directory_iterator(upload_))
+            if (!entry.path().filename().string().starts_with('.'))
+                there.push_back(entry.path());
+        for (fs::path const& container : there) {
+            fs::path const target = taken_ / container.filename();
+            EXPECT_FALSE(fs::exists(target)) << container << " was handed on twice, " << when;
+            fs::rename(container, target);
+        }
+    }
+
+    void requireAcknowledged(Channel::Client& client, std::string const& when) {
+        std::map<std::string, std::string> const known = states(client);
+        for (char const* id : {"p1", "p2"})
+            EXPECT_TRUE(!acknowledged_.contains(id) || known.contains(id)) << id << " was lost, " << when;
+        json::Value const upload = client.call<Ipc::GetSvcCfg>()->resp().get("upload_folder");
+        EXPECT_TRUE(!acknowledged_.contains("upload folder") || upload) << "a setting was lost, " << when;
+        std::string const settings =
+            print(client
+                      .call<Ipc::CSConfigIdsList>(
+                          parse(R"({"query":"settings","id":"u=bob/a=acme","parts":["po"]})"))
+                      ->resp());
+        bool const isThere = settings.find(R"("own":{"code":"kept"})") != std::string::npos;
+        EXPECT_TRUE(!acknowledged_.contains("settings") || isThere) << "settings were lost, " << when;
+    }
+
+    /// Everything is sent again, as a client does that had no answer, and all of it arrives once.
+    void finish(std::string const& when) {
+        ServiceProcess service(arguments());
+        ASSERT_NE(service.port(), 0) << service.errors() << when;
+        {
+            auto const client = clientOf(service, data_);
+            requireAcknowledged(*client, when);
+        }
+        sendAll(service);
+        takeContainers(when);
+        for (char const* id : {"p1", "p2"})
+            EXPECT_EQ(contentOf(taken_ / (id + std::string(".mailing"))), contentOfPack(id)) << when;
+        EXPECT_TRUE(fs::is_empty(data_ / "outbox")) << when;
+        EXPECT_TRUE(fs::is_empty(upload_)) << when;
+        service.signal(SIGTERM);
+        EXPECT_EQ(service.wait(), 0) << when;
+    }
+
+    fs::path packs_ = folder_ / "packs.db";
+    fs::path upload_ = folder_ / "upload";
+    fs::path taken_ = folder_ / "taken";
+    std::set<std::string> acknowledged_;
+};
+
+/// A run that is cut short in front of one of the calls that make something durable or visible.
+class OneKill : public KilledService {
+public:
+    /// False when the service got to the end alive.
+    bool killedAt(int call) {
+        std::string const when = "killed at call " + std::to_string(call);
+        ServiceProcess service(arguments(), {{"LD_PRELOAD", KILL_AT_CALL_LIBRARY},
+                                             {"KILL_AT_CALL", std::to_string(call)},
+                                             // The sanitizer would refuse to be behind another library.
+                                             {"ASAN_OPTIONS", "verify_asan_link_order=0"}});
+        if (service.port() != 0)
+            sendAll(service);
+        bool const survived = acknowledged_.contains("end");
+        service.signal(SIGKILL);
+        service.wait();
+        takeContainers(when);
+        finish(when);
+        return !survived;
+    }
+
+private:
+    void TestBody() override {}
+};
+
+TEST(ServiceThatIsKilled, LosesNothingThatItAcknowledgedAndHandsEachContainerOnOnce) {
+    int call = 1;
+    while (OneKill().killedAt(call) && !testing::Test::HasFailure())
+        ++call;
+    // The start, five commands and the way of two jobs make something durable at least this often.
+    EXPECT_GT(call, 30);
+}
+
+TEST_F(KilledService, GoesOnAfterAKillAtAnyMoment) {
+    // Moments, not calls: between any two instructions.
+    for (int const milliseconds : {0, 3, 7, 15, 30}) {
+        ServiceProcess service(arguments());
+        std::thread sender([&] { sendAll(service); });
+        std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
+        service.signal(SIGKILL);
+        sender.join();
+        service.wait();
+    }
+    takeContainers("killed at moments");
+    finish("killed at moments");
+}
+
+} // namespace
