@@ -42,11 +42,16 @@ using Task = std::function<int(Terminal const&)>;
 
 // Each adds its subcommand to `app` and, when the command line names it, leaves its task in `task`.
 // One source file a subcommand.
+void addDiscoverCommand(CLI::App& app, Task& task);
 void addLetterCommand(CLI::App& app, Task& task);
 void addMailCommand(CLI::App& app, Task& task);
 void addPackCommand(CLI::App& app, Task& task);
 void addPlanCommand(CLI::App& app, Task& task);
 void addPresetsCommand(CLI::App& app, Task& task);
+void addPriceCommand(CLI::App& app, Task& task);
+void addSettingsCommand(CLI::App& app, Task& task);
+void addStatusCommand(CLI::App& app, Task& task);
+void addUploadCommand(CLI::App& app, Task& task);
 
 /// Parses the command line, carries it out and gives the exit status. Throws nothing derived from
 /// std::exception.

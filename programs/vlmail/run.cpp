@@ -20,11 +20,16 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
                  "vlmail");
     app.require_subcommand(1);
     Task task;
+    addDiscoverCommand(app, task);
     addLetterCommand(app, task);
     addMailCommand(app, task);
     addPackCommand(app, task);
     addPlanCommand(app, task);
     addPresetsCommand(app, task);
+    addPriceCommand(app, task);
+    addSettingsCommand(app, task);
+    addStatusCommand(app, task);
+    addUploadCommand(app, task);
     try {
         app.parse(argc, argv);
         return task(terminal);

@@ -1,0 +1,355 @@
+// The client's subcommands against a service: the command line in, text and exit status out.
+#include "programs/vlmail/command.h"
+#include "programs/vlmail/multicast_probe.h"
+#include "programs/vlmail/service_client.h"
+#include "programs/vlmail/settings/commands.h"
+#include "tests/failure_of.h"
+#include "tests/temporary_folder.h"
+#include "tests/vlserviced/json_help.h"
+#include "tests/vlserviced/pack_help.h"
+#include "tests/vlserviced/service_process.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <sstream>
+#include <thread>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using testing::HasSubstr;
+
+class ClientCommands : public testing::Test {
+protected:
+    struct Result {
+        int status = 0;
+        std::string out;
+        std::string err;
+    };
+
+    ClientCommands() { fs::create_directory(folder_ / "upload"); }
+
+    /// Runs vlmail with the service named.
+    Result vlmail(std::vector<std::string> arguments) {
+        for (std::string const& more :
+             {std::string("--service"), "127.0.0.1:" + std::to_string(service_.port()),
+              std::string("--token"), (data_ / "token").string()})
+            arguments.push_back(more);
+        return run(arguments);
+    }
+    Result run(std::vector<std::string> const& arguments) {
+        std::vector<char const*> pointers{"vlmail"};
+        for (std::string const& argument : arguments)
+            pointers.push_back(argument.c_str());
+        std::ostringstream out;
+        std::ostringstream err;
+        int const status =
+            VlMail::run(static_cast<int>(pointers.size()), pointers.data(), VlMail::Terminal{out, err});
+        return {status, out.str(), err.str()};
+    }
+    /// What a run that has to succeed writes.
+    std::string output(std::vector<std::string> const& arguments) {
+        Result const result = vlmail(arguments);
+        EXPECT_EQ(result.status, VlMail::FINE) << result.err;
+        return result.out;
+    }
+    /// The line of a run that has to fail.
+    std::string complaint(std::vector<std::string> const& arguments) {
+        Result const result = vlmail(arguments);
+        EXPECT_EQ(result.status, VlMail::FAILED) << result.out;
+        return result.err;
+    }
+    std::string write(char const* name, std::string const& text) {
+        std::ofstream(folder_ / name) << text;
+        return (folder_ / name).string();
+    }
+
+    TemporaryFolder folder_;
+    fs::path data_ = folder_ / "data";
+    ServiceProcess service_{{"--data", data_.string(), "--no-discovery"}};
+};
+
+TEST_F(ClientCommands, SettingsAreSetAndShownWithTheirOrigin) {
+    EXPECT_EQ(output({"settings", "set", "/", "po", "code=R-1"}), "");
+    EXPECT_EQ(output({"settings", "set", "bob/sales/acme", "po", "expiry=1900000000"}), "");
+    EXPECT_EQ(output({"settings", "show", "u=bob/ou=sales/a=acme", "po", "--origin"}),
+              "part  setting  value       from\n"
+              "po    code     R-1         root\n"
+              "po    expiry   1900000000  u=bob/ou=sales/a=acme\n");
+    EXPECT_EQ(output({"settings", "show", "ou=sales/a=acme", "po", "--origin"}),
+              "part  setting  value  from\n"
+              "po    code     R-1    root\n"
+              "po    expiry   0      built in\n");
+}
+
+TEST_F(ClientCommands, ANodeThatIsNotThereInheritsEverything) {
+    EXPECT_EQ(output({"settings", "show", "u=eve/a=acme", "po"}),
+              "part  setting  value\n"
+              "po    code\n"
+              "po    expiry   0\n"
+              "u=eve/a=acme has no settings yet: all of this is inherited\n");
+}
+
+TEST_F(ClientCommands, ListsAreShownElementByElement) {
+    output({"settings", "set", "/", "profiles", R"(vals=[{"name":"Root's"}])"});
+    output({"settings", "set", "a=acme", "profiles", R"(vals=[{"name":"Ours"}])"});
+    EXPECT_EQ(output({"settings", "show", "a=acme", "profiles", "--origin"}),
+              "part      setting  value               from\n"
+              "profiles  vals[0]  {\"name\":\"Ours\"}     a=acme\n"
+              "profiles  vals[1]  {\"name\":\"Root's\"}   root\n");
+}
+
+TEST_F(ClientCommands, AllPartsAreShownUnlessSomeAreNamed) {
+    std::string const text = output({"settings", "show", "/", "--json"});
+    json::Object const parts = parse(text).get("parts").toObject();
+    for (char const* part : {"app", "inet", "po", "deps", "profiles", "presets"})
+        EXPECT_TRUE(parts.get(part)) << part;
+}
+
+TEST_F(ClientCommands, ASetChangesTheKeysThatItNamesAlone) {
+    output({"settings", "set", "a=acme", "app", "max_letter_sheets=20", "descr=Acme Ltd"});
+    output({"settings", "set", "a=acme", "app", "max_letter_sheets=30", "enforce_po=true"});
+    std::string const text = output({"settings", "show", "a=acme", "app", "--json"});
+    EXPECT_THAT(text, HasSubstr(R"("own":{"descr":"Acme Ltd","max_letter_sheets":30,"enforce_po":true})"));
+}
+
+TEST_F(ClientCommands, AFileReplacesAPart) {
+    output({"settings", "set", "a=acme", "po", "code=A", "expiry=5"});
+    output({"settings", "set", "a=acme", "po", write("po.json", R"({"code":"B"})")});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"B"})"));
+}
+
+TEST_F(ClientCommands, AResetLetsTheNodeInheritAgain) {
+    output({"settings", "set", "a=acme", "po", "code=A", "expiry=5"});
+    output({"settings", "set", "a=acme", "app", "descr=x"});
+    output({"settings", "reset", "a=acme", "po", "code"});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"expiry":5})"));
+    output({"settings", "reset", "a=acme", "po"});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "--json"}), HasSubstr(R"("own":{"descr":"x"})"));
+    output({"settings", "reset", "a=acme"});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "--json"}),
+                testing::Not(HasSubstr(R"("own":{"descr")")));
+    output({"settings", "set", "/", "po", "code=R"});
+    output({"settings", "reset", "/"});
+    EXPECT_THAT(output({"settings", "show", "/", "po", "--json"}), HasSubstr(R"("own":{})"));
+}
+
+TEST_F(ClientCommands, WhatCannotBeSetIsToldInOneLine) {
+    struct {
+        std::vector<std::string> arguments;
+        std::string line;
+    } const cases[] = {
+        {{"settings", "set", "a=acme", "po", "kode=A"},
+         "vlmail: the part \"po\" has no setting \"kode\"; it has code, expiry\n"},
+        {{"settings", "set", "a=acme", "po", "expiry=soon"},
+         "vlmail: \"expiry\" wants a value in JSON like 0, and \"soon\" is none\n"},
+        {{"settings", "set", "a=acme", "po", "expiry=\"5\""},
+         "vlmail: JSON error: Wrong type: string. Expected type: integer\n"},
+        {{"settings", "set", "a=acme", "pos", "code=A"},
+         "vlmail: there are no settings \"pos\"; there are app, inet, po, deps, profiles, presets\n"},
+        {{"settings", "set", "a=acme", "po", "code=A", "B"},
+         "vlmail: \"B\" is neither the only argument, a file, nor KEY=VALUE\n"},
+        {{"settings", "set", "a=acme", "po", "/missing.json"},
+         "vlmail: cannot read \"/missing.json\"; check the name and the rights\n"},
+        {{"settings", "remove", "a=acme"}, "vlmail: there is no node a=acme\n"},
+        {{"settings", "remove", "/"}, "vlmail: the root cannot be removed\n"},
+    };
+    for (auto const& [arguments, line] : cases)
+        EXPECT_EQ(complaint(arguments), line);
+}
+
+TEST_F(ClientCommands, NodesAreShownAsATreeAndRemovedFromBelow) {
+    output({"settings", "set", "u=bob/a=acme", "po", "code=A"});
+    output({"settings", "set", "a=acme", "app", "descr=Acme Ltd"});
+    output({"settings", "service", R"(disabled=["u=bob/a=acme"])"});
+    EXPECT_EQ(output({"settings", "tree"}), "node              description  state     own settings\n"
+                                            "/\n"
+                                            "  a=acme          Acme Ltd               app\n"
+                                            "    u=bob/a=acme               disabled  po\n");
+    EXPECT_EQ(output({"settings", "ids", "bob"}), "node          description  state\n"
+                                                  "a=acme        Acme Ltd\n"
+                                                  "u=bob/a=acme               disabled\n");
+    EXPECT_EQ(complaint({"settings", "remove", "a=acme"}),
+              "vlmail: node a=acme has 1 child (u=bob/a=acme): remove what is below it first\n");
+    output({"settings", "remove", "u=bob/a=acme"});
+    output({"settings", "remove", "a=acme"});
+    EXPECT_EQ(output({"settings", "tree", "--json"}),
+              "{\"id\":\"\",\"descr\":\"\",\"parts\":[],\"children\":[]}\n");
+}
+
+TEST_F(ClientCommands, PricesFollowTheTariff) {
+    EXPECT_EQ(complaint({"price", "3"}),
+              "vlmail: the service has no tariff yet: set one with \"vlmail settings "
+              "service tariff=FILE\"\n");
+    output(
+        {"settings", "service",
+         "tariff=" + write("tariff.json", R"({"currency":"EUR","letter":85,"sheet":10,"duplex_sheet":-3})")});
+    EXPECT_EQ(output({"price", "20x3", "1", "--duplex"}), "letters  pages each  sheets each    EUR\n"
+                                                          "     20           3            2  20.40\n"
+                                                          "      1           1            1   0.95\n"
+                                                          "in all 21.35 EUR\n");
+    EXPECT_EQ(output({"price", "3", "--json"}),
+              "{\"currency\":\"EUR\",\"total\":115,\"letters\":[{\"sheets\":3,\"price\":115}]}\n");
+    EXPECT_EQ(complaint({"price", "0x3"}),
+              "vlmail: cannot estimate \"0x3\": it is neither a mailing file nor a "
+              "number of letters and pages like 20x3\n");
+}
+
+TEST_F(ClientCommands, AMailingIsSentHandedOnAndFollowed) {
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1");
+    output({"settings", "service", "upload_folder=" + (folder_ / "upload").string()});
+    {
+        auto const client = clientOf(service_, data_);
+        VlMail::sendPack(*client, database, "p1", false);
+        EXPECT_EQ(VlMail::awaitJob(*client, "p1", std::chrono::seconds(60)).get("state"),
+                  json::Value("queued"));
+        EXPECT_EQ(failureOf([&] { VlMail::awaitJob(*client, "p2", std::chrono::seconds(60)); }),
+                  "the service has no job of pack p2; send it again");
+    }
+    EXPECT_THAT(output({"status"}), HasSubstr("p1       queued"));
+    EXPECT_THAT(output({"status"}), HasSubstr("Title of p1"));
+    EXPECT_EQ(output({"status", "p2"}), "the service has no such mailings\n");
+    EXPECT_EQ(output({"upload", "--database", database.string()}), "");
+    while (output({"status", "p1", "--json"}).find(R"("state":"submitted")") == std::string::npos)
+        std::this_thread::yield();
+    EXPECT_EQ(contentOf(folder_.path() / "upload" / "p1.mailing"), contentOfPack("p1"));
+    fs::remove(folder_.path() / "upload" / "p1.mailing");
+    EXPECT_THAT(output({"status", "--update", "--database", database.string()}),
+                HasSubstr("p1       lodged"));
+    std::ofstream(folder_.path() / "upload" / "p1.mailing.status")
+        << R"({"state":"failed","text":"no street"})";
+    EXPECT_EQ(vlmail({"status", "--update"}).status, VlMail::INCOMPLETE);
+    EXPECT_THAT(vlmail({"status"}).out, HasSubstr("the carrier: no street"));
+}
+
+TEST_F(ClientCommands, ThePackDatabaseIsThatOfTheNodesSettings) {
+    auto const client = clientOf(service_, data_);
+    ::setenv("XDG_DATA_HOME", folder_.path().c_str(), 1);
+    EXPECT_EQ(VlMail::packDatabaseOf(*client, "a=acme"), folder_ / "vlmail/packs.db");
+    output({"settings", "set", "a=acme", "app", "db_host=/srv/packs", "db_name=acme.db"});
+    EXPECT_EQ(VlMail::packDatabaseOf(*client, "u=bob/a=acme"), "/srv/packs/acme.db");
+    ::unsetenv("XDG_DATA_HOME");
+}
+
+TEST_F(ClientCommands, ChangesAndJobsAreHeldBack) {
+    output({"settings", "suspend", "settings"});
+    EXPECT_EQ(complaint({"settings", "set", "a=acme", "po", "code=A"}),
+              "vlmail: changes of settings are held back at the moment\n");
+    output({"settings", "suspend", "nothing"});
+    output({"settings", "set", "a=acme", "po", "code=A"});
+    EXPECT_EQ(complaint({"settings", "suspend", "me"}),
+              "vlmail: \"me\" cannot be held back; name settings, jobs, all or nothing\n");
+}
+
+TEST_F(ClientCommands, TheServicesSettingsAreShown) {
+    output({"settings", "service", "upload_folder=" + (folder_ / "upload").string()});
+    EXPECT_EQ(output({"settings", "service"}), "setting        value\n"
+                                               "upload_folder  " +
+                                                   (folder_ / "upload").string() +
+                                                   "\n"
+                                                   "outbox         " +
+                                                   (data_ / "outbox").string() +
+                                                   "\n"
+                                                   "jobs           {}\n");
+    output({"settings", "service", "upload_folder="});
+    EXPECT_THAT(output({"settings", "service", "--json"}), testing::StartsWith("{\"outbox\":"));
+    EXPECT_EQ(
+        complaint({"settings", "service", "colour=red"}),
+        "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE or disabled=[...]\n");
+}
+
+TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {
+    Result const found = vlmail({"discover"});
+    EXPECT_EQ(found.status, VlMail::FINE);
+    EXPECT_THAT(found.out, HasSubstr("127.0.0.1:" + std::to_string(service_.port()) + "  ok"));
+    Result const stranger =
+        run({"discover", "--json", "--service", "127.0.0.1:" + std::to_string(service_.port()), "--token",
+             write("token", std::string(40, 'x'))});
+    EXPECT_EQ(stranger.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(stranger.out, testing::Not(HasSubstr(R"("connection":"ok")")));
+}
+
+// Without a service.
+
+TEST(NodeIdFromAPerson, IsCompletedUnlessItIsComplete) {
+    std::pair<char const*, char const*> const cases[] = {
+        {"/", ""},
+        {"", ""},
+        {"a=acme", "a=acme"},
+        {"bob/acme", "u=bob/a=acme"},
+        {"bob/sales/acme", "u=bob/ou=sales/a=acme"},
+        {"u=bob", "u=bob/"},
+        {"u=bob/", "u=bob/"},
+        {"u=bob/ou=sales/a=acme", "u=bob/ou=sales/a=acme"},
+    };
+    for (auto const& [text, id] : cases)
+        EXPECT_EQ(VlMail::nodeIdIn(text), id) << text;
+}
+
+TEST(ServiceAddressFromAPerson, IsHostAndPort) {
+    EXPECT_EQ(VlMail::parseServiceAddress("mail.example:45001").text(), "mail.example:45001");
+    EXPECT_EQ(VlMail::parseServiceAddress("10.0.0.1:1").host, "10.0.0.1");
+    EXPECT_EQ(VlMail::parseServiceAddress("[fe80::1%eth0]:65535").host, "fe80::1%eth0");
+    EXPECT_EQ(VlMail::parseServiceAddress("[::1]:7").text(), "[::1]:7");
+    for (char const* text :
+         {"", "host", "host:", ":7", "host:0", "host:65536", "host:7x", "::1:7", "[]:7", "a b:7"})
+        EXPECT_EQ(failureOf([&] { VlMail::parseServiceAddress(text); }),
+                  "\"" + std::string(text) +
+                      "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
+}
+
+TEST(ServiceAddressInAnAnswer, IsTestedBeforeItIsUsed) {
+    EXPECT_EQ(VlMail::addressInAnswer(parse(R"({"host":"10.0.0.1","port":7})")).text(), "10.0.0.1:7");
+    for (char const* answer :
+         {"{}", R"({"host":"x"})", R"({"port":7})", R"({"host":"x","port":"7"})",
+          R"({"host":"x","port":70000})", R"({"host":"x","port":-1})", R"({"host":"","port":7})",
+          R"({"host":"a b","port":7})", R"({"host":["x"],"port":7})"})
+        EXPECT_EQ(
+            failureOf([&] { VlMail::addressInAnswer(parse(answer)); }),
+            "something on the network answered as a service and named no address; name one with --service "
+            "HOST:PORT")
+            << answer;
+}
+
+TEST(DiscoveryHints, SayWhatAPersonCanTry) {
+    VlMail::ProbeReport loopback{"lo", "127.0.0.1", false, "", true, {}, 0};
+    VlMail::ProbeReport silent{"eth0", "10.0.0.2", false, "", true, {}, 0};
+    VlMail::ProbeReport deaf{"eth1", "fd00::2", true, "", false, {}, 0};
+    VlMail::ProbeReport broken{"eth2", "10.1.0.2", false, "send: Network is unreachable", false, {}, 0};
+    VlMail::ProbeReport answered{"eth3", "10.2.0.2", false, "", true, {"10.2.0.9:7 (from 10.2.0.9)"}, 0};
+    std::string const last =
+        "Without discovery, name the service with --service HOST:PORT; it prints its port "
+        "when it starts.";
+    using testing::ElementsAre;
+    EXPECT_THAT(VlMail::hintsFor({silent, answered}), ElementsAre());
+    EXPECT_THAT(
+        VlMail::hintsFor({}),
+        ElementsAre("No network interface is up but loopback: connect this host to a network.", last));
+    EXPECT_THAT(
+        VlMail::hintsFor({loopback}),
+        ElementsAre("No network interface is up but loopback: connect this host to a network.", last));
+    EXPECT_THAT(
+        VlMail::hintsFor({loopback, silent, deaf, broken}),
+        ElementsAre("eth0 (IPv4): the request went out and nobody answered. A service answers only in the "
+                    "same network, and a firewall there may hold up UDP port 45677.",
+                    "eth1 (IPv6): the request did not come back to this host. A firewall here may hold up "
+                    "UDP port 45677.",
+                    "eth2 (IPv4): the request could not be sent. Has the interface a route for multicast? "
+                    "(ip route)",
+                    last));
+}
+
+TEST(DiscoveryHints, AreThereInTheAnswerForPrograms) {
+    VlMail::ProbeReport const report{"eth2", "10.1.0.2", false, "send: no", false, {}, 2};
+    json::Object const object = VlMail::toJson({report});
+    EXPECT_EQ(print(object.get("interfaces")), R"([{"interface":"eth2","address":"10.1.0.2","ipv6":false,)"
+                                               R"("failure":"send: no","heard_itself":false,"answers":[],)"
+                                               R"("foreign":2}])");
+    EXPECT_EQ(object.get("hints").toArray().size(), 2u);
+}
+
+} // namespace
