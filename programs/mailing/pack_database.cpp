@@ -2,6 +2,8 @@
 
 #include "programs/mailing/safe_name.h"
 
+#include <SQLiteCpp/Transaction.h>
+
 #include <SQLiteCpp/Exception.h>
 
 #include <ctime>
@@ -36,7 +38,7 @@ CREATE TABLE pages (
 );
 )sql";
 
-/// A transaction is ended when it has grown by this much, so that others get at the database in between.
+/// Pages wait in memory until they are this much.
 constexpr unsigned long long BATCH_BYTES = 16ULL << 20;
 /// What a client left unfinished so long ago is what a crash left.
 constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
@@ -86,9 +88,7 @@ PackDatabaseWriter::~PackDatabaseWriter() {
 }
 
 void PackDatabaseWriter::begin(PackInfo const& pack) {
-    // A batch stays in memory until it is committed, so that meanwhile others can read.
-    database_.exec("PRAGMA cache_spill = OFF");
-    database_.exec("BEGIN IMMEDIATE");
+    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
     long long const now = std::time(nullptr);
     SQLite::Statement cleaning(database_,
                                "DELETE FROM packs WHERE complete = 0 AND (id = ? OR created_at < ?)");
@@ -103,6 +103,7 @@ void PackDatabaseWriter::begin(PackInfo const& pack) {
     insertion.bind(4, static_cast<std::int64_t>(now));
     if (insertion.exec() == 0)
         throw DatabaseError("the pack database " + file_.string() + " has a pack " + pack.id + " already");
+    transaction.commit();
 }
 
 void PackDatabaseWriter::savePage(std::string const& document, std::string const& page,
@@ -110,41 +111,47 @@ void PackDatabaseWriter::savePage(std::string const& document, std::string const
     if (data.empty() || data.size() > MAX_BLOB_BYTES)
         throw DatabaseError("page \"" + page + "\" of \"" + document + "\" cannot be stored: it has " +
                             std::to_string(data.size()) + " bytes");
+    batchBytes_ += data.size();
+    batch_.push_back({document, page, std::move(data)});
+    if (batchBytes_ < BATCH_BYTES)
+        return;
     orDatabaseError(file_, [&] {
-        SQLite::Statement insertion(database_, "INSERT INTO pages (pack, position, document, page, data) "
-                                               "VALUES (?, ?, ?, ?, ?)");
-        insertion.bindNoCopy(1, savedPackId());
-        insertion.bind(2, static_cast<std::int64_t>(position_));
-        insertion.bindNoCopy(3, document);
-        insertion.bindNoCopy(4, page);
-        insertion.bindNoCopy(5, data.data(), static_cast<int>(data.size()));
-        insertion.exec();
-        ++position_;
-        batchBytes_ += data.size();
-        if (batchBytes_ >= BATCH_BYTES)
-            commitBatch();
+        SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+        insertBatch();
+        transaction.commit();
     });
 }
 
-void PackDatabaseWriter::commitBatch() {
-    database_.exec("COMMIT");
-    database_.exec("BEGIN IMMEDIATE");
+void PackDatabaseWriter::insertBatch() {
+    SQLite::Statement insertion(database_, "INSERT INTO pages (pack, position, document, page, data) "
+                                           "VALUES (?, ?, ?, ?, ?)");
+    for (Page const& page : batch_) {
+        insertion.bindNoCopy(1, savedPackId());
+        insertion.bind(2, static_cast<std::int64_t>(position_++));
+        insertion.bindNoCopy(3, page.document);
+        insertion.bindNoCopy(4, page.name);
+        insertion.bindNoCopy(5, page.data.data(), static_cast<int>(page.data.size()));
+        insertion.exec();
+        insertion.reset();
+    }
+    batch_.clear();
     batchBytes_ = 0;
 }
 
 void PackDatabaseWriter::finish(SharedMemBuffer metadata) {
     orDatabaseError(file_, [&] {
+        SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+        insertBatch();
         SQLite::Statement change(database_, "UPDATE packs SET metadata = ?, complete = 1 WHERE id = ?");
         change.bindNoCopy(1, metadata.data(), static_cast<int>(metadata.size()));
         change.bindNoCopy(2, savedPackId());
         change.exec();
-        database_.exec("COMMIT");
+        transaction.commit();
         finished_ = true;
     });
 }
 
 void PackDatabaseWriter::eraseUnfinished() {
-    database_.tryExec("ROLLBACK");
     SQLite::Statement deletion(database_, "DELETE FROM packs WHERE id = ? AND complete = 0");
     deletion.bind(1, savedPackId());
     deletion.exec();

@@ -41,20 +41,29 @@ public:
     PackDatabaseWriter(PackDatabaseWriter const&) = delete;
     PackDatabaseWriter& operator=(PackDatabaseWriter const&) = delete;
 
-    /// `data` is a product of zipDbData, of 256 MiB at most. A page of the same document and name must not be
-    /// there yet.
+    /// `data` is a product of zipDbData, of 256 MiB at most. Pages are written some MiB at a time, and the
+    /// database is not locked in between: several packs can be stored at once. A page of the same document
+    /// and name must not be there yet, which is noticed when they are written.
     void savePage(std::string const& document, std::string const& page, SharedMemBuffer data) override;
     /// From here on readers see the pack, also after a crash or a power failure.
     void finish(SharedMemBuffer metadata);
 
 private:
+    struct Page {
+        std::string document;
+        std::string name;
+        SharedMemBuffer data;
+    };
+
     void begin(PackInfo const& pack);
-    void commitBatch();
+    /// Within a transaction.
+    void insertBatch();
     void eraseUnfinished();
 
     std::filesystem::path file_;
     SQLite::Database database_;
     long long position_ = 0;
+    std::vector<Page> batch_;
     unsigned long long batchBytes_ = 0;
     bool finished_ = false;
 };

@@ -1,5 +1,6 @@
 #include "programs/vlmail/dispatch.h"
 
+#include "programs/vlmail/price.h"
 #include "programs/vlmail/text_table.h"
 
 #include <algorithm>
@@ -71,6 +72,11 @@ void Dispatch::finish() {
     }
 }
 
+void Dispatch::estimate(Channel::Client& service) {
+    for (auto const& [packPreset, mailing] : mailings_)
+        prices_[mailing.get()] = estimatePrice(service, mailing->builder().metadata());
+}
+
 void Dispatch::fail(std::string const& name, std::string const& reason) {
     failures_.push_back({name, {}, reason});
     terminal_.complain(reason);
@@ -79,12 +85,15 @@ void Dispatch::fail(std::string const& name, std::string const& reason) {
 void Dispatch::print() const {
     auto const number = [](std::size_t n) { return std::to_string(n); };
     constexpr auto RIGHT = TextTable::Align::Right;
-    TextTable table({{"pack preset"}, {"letters", RIGHT}, {"sent as", RIGHT}, {"pages", RIGHT}, {"mailing"}});
+    std::vector<TextTable::Column> columns{
+        {"pack preset"}, {"letters", RIGHT}, {"sent as", RIGHT}, {"pages", RIGHT}};
+    columns.push_back(prices_.empty() ? TextTable::Column{"mailing"} : TextTable::Column{"price", RIGHT});
+    TextTable table(columns);
     for (OutgoingMailing* const mailing : arrived_) {
         MailingBuilder const& builder = mailing->builder();
         table.addRow({builder.metadata().packPreset.name(), number(builder.letterCount()),
                       number(builder.metadata().letters.size()), number(builder.pageCount()),
-                      mailing->place()});
+                      prices_.empty() ? mailing->place() : priceInWords(mailing)});
     }
     if (!table.empty())
         table.print(terminal_.out);
@@ -94,6 +103,13 @@ void Dispatch::print() const {
         terminal_.out << "left out: " << letter.name << ", " << pagesInWords(letter.pages) << ": "
                       << letter.reason << '\n';
     terminal_.out << outcome_.inWords() << '\n';
+}
+
+std::string Dispatch::priceInWords(OutgoingMailing const* mailing) const {
+    auto const found = prices_.find(mailing);
+    if (found == prices_.end())
+        return {};
+    return money(found->second.get("total").intOrZero()) + ' ' + found->second.get("currency").textOrEmpty();
 }
 
 json::Object Dispatch::toJson() const {
@@ -121,7 +137,7 @@ json::Array Dispatch::toJson(std::vector<LeftBehind> const& all) {
     return array;
 }
 
-json::Object Dispatch::toJson(OutgoingMailing& mailing) {
+json::Object Dispatch::toJson(OutgoingMailing& mailing) const {
     Mailing::Metadata const& metadata = mailing.builder().metadata();
     json::Object object{{"pack_preset", metadata.packPreset.name()},
                         {"letters", mailing.builder().letterCount()},
@@ -131,6 +147,8 @@ json::Object Dispatch::toJson(OutgoingMailing& mailing) {
         object.set("id", metadata.id);
         object.set("place", mailing.place());
     }
+    if (auto const price = prices_.find(&mailing); price != prices_.end())
+        object.set("price", price->second);
     return object;
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 // Sorts the letters of a batch into mailings, one a pack preset, and keeps account of what stays behind.
 
+#include "programs/channel/client.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/outcome.h"
 #include "programs/vlmail/outgoing_mailing.h"
@@ -21,6 +22,8 @@ public:
     /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
     /// of.
     void take(ReadResult result);
+    /// Asks what the mailings would cost. Throws std::exception with a line for people.
+    void estimate(Channel::Client& service);
     /// Lets all mailings arrive; one that fails does not stop the others.
     void finish();
 
@@ -40,9 +43,10 @@ private:
 
     void mailLetters(DocumentReading reading, std::vector<std::vector<PageBlob>> const& pages);
     OutgoingMailing& mailingFor(std::string const& packPreset);
+    std::string priceInWords(OutgoingMailing const* mailing) const;
     void fail(std::string const& name, std::string const& reason);
     static json::Array toJson(std::vector<LeftBehind> const& all);
-    static json::Object toJson(OutgoingMailing& mailing);
+    json::Object toJson(OutgoingMailing& mailing) const;
 
     Cfg::Presets const& presets_;
     BeginMailing begin_;
@@ -50,6 +54,8 @@ private:
     /// By the pack preset's name, so that the same documents give the same order of mailings.
     std::map<std::string, std::unique_ptr<OutgoingMailing>> mailings_;
     std::vector<OutgoingMailing*> arrived_;
+    /// By mailing; empty when nobody has asked.
+    std::map<OutgoingMailing const*, json::Object> prices_;
     std::vector<LeftBehind> leftOut_;
     std::vector<LeftBehind> failures_;
     std::vector<std::string> attachments_;

@@ -6,6 +6,9 @@
 #include "programs/vlmail/dispatch.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/plan.h"
+#include "programs/vlmail/price.h"
+#include "programs/vlmail/service_client.h"
+#include "programs/vlmail/settings/commands.h"
 #include "programs/vlmail/worker_pool.h"
 #include "vlservice/platform/json_text.h"
 
@@ -23,6 +26,11 @@ struct Options {
     std::string settings;
     std::string plan;
     std::string output;
+    bool send = false;
+    bool upload = false;
+    bool price = false;
+    std::string node = "/";
+    ServiceOptions service;
     bool json = false;
     std::size_t jobs = processorCount();
 };
@@ -35,10 +43,37 @@ int report(Dispatch const& dispatch, Options const& options, Terminal const& ter
     return dispatch.exitStatus();
 }
 
+/// Where the mailings go, by the options. The connection is there when a service is to get them.
+struct Destination {
+    Destination(Options const& options, Terminal const& terminal)
+        : service(options.send ? connectToService(options.service, terminal) : nullptr),
+          nodeId(nodeIdIn(options.node)), begin(service ? mailingsToService(*service, nodeId, options.upload)
+                                                        : mailingsIntoFolder(options.output)) {}
+
+    std::unique_ptr<Channel::Client> service;
+    std::string nodeId;
+    BeginMailing begin;
+};
+
+/// What counts at the node, as the service tells it.
+NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
+    std::string const& name = Cfg::Presets::PART_NAME;
+    json::Object const parts = fetchSettings(service, nodeId, {name}).get("parts").toObject();
+    json::Value const presets = parts.get(name).toObject().get("values");
+    return NodeSettings::resolved({{name.c_str(), presets}}, "the service, at " + nodeInWords(nodeId));
+}
+
+NodeSettings settingsFor(Options const& options, Destination const& destination) {
+    return options.settings.empty() && destination.service
+               ? settingsFromService(*destination.service, destination.nodeId)
+               : NodeSettings::fromFileIfNamed(options.settings);
+}
+
 int mailDocuments(Options const& options, Terminal const& terminal) {
-    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
+    Destination const destination(options, terminal);
+    NodeSettings const settings = settingsFor(options, destination);
     Cfg::Presets const presets = settings.presets();
-    Dispatch dispatch(presets, mailingsIntoFolder(options.output), terminal);
+    Dispatch dispatch(presets, destination.begin, terminal);
     readBatch(options.files, settings, options.jobs, Along::Pages, terminal,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
@@ -48,9 +83,10 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
 int mailPlan(Options const& options, Terminal const& terminal) {
     Plan const plan = Plan::fromFile(options.plan);
     plan.requireUnchanged();
+    Destination const destination(options, terminal);
     NodeSettings const settings = plan.settings();
     Cfg::Presets const presets = settings.presets();
-    Dispatch dispatch(presets, mailingsIntoFolder(options.output), terminal);
+    Dispatch dispatch(presets, destination.begin, terminal);
     splitBatch(plan.documents(), options.jobs, terminal,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
@@ -68,6 +104,8 @@ int makePlan(Options const& options, Terminal const& terminal) {
                   dispatch.take(std::move(result));
               });
     dispatch.finish();
+    if (options.price)
+        dispatch.estimate(*connectToService(options.service, terminal));
     Mailing::writeFile(options.output, plan.toText(dispatch.toJson()));
     return report(dispatch, options, terminal);
 }
@@ -89,12 +127,20 @@ void addMailCommand(CLI::App& app, Task& task) {
     mail->add_option("--plan", options->plan, "Carries out what vlmail plan has decided")
         ->excludes(files)
         ->excludes(settings);
-    mail->add_option("-o,--output", options->output, "The folder for the mailing files; made when missing")
-        ->required();
+    auto* const output = mail->add_option("-o,--output", options->output,
+                                          "The folder for the mailing files; made when missing");
+    auto* const send = mail->add_flag("--send", options->send, "Gives the mailings to the service instead")
+                           ->excludes(output);
+    mail->add_option("--node", options->node, "The node to send for, whose settings apply without --settings")
+        ->needs(send);
+    mail->add_flag("--upload", options->upload, "Has the service hand the mailings on at once")->needs(send);
+    addServiceOptions(*mail, options->service);
     addBatchOptions(*mail, *options);
     mail->callback([=, &task] {
         if (options->files.empty() && options->plan.empty())
             throw CLI::RequiredError("FILE or --plan");
+        if (options->output.empty() && !options->send)
+            throw CLI::RequiredError("--output or --send");
         task = [=](Terminal const& terminal) {
             return options->plan.empty() ? mailDocuments(*options, terminal) : mailPlan(*options, terminal);
         };
@@ -108,6 +154,8 @@ void addPlanCommand(CLI::App& app, Task& task) {
     plan->add_option("FILE", options->files, "PDF or text documents")->required();
     plan->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
     plan->add_option("-o,--output", options->output, "The file for the plan")->required();
+    plan->add_flag("--price", options->price, "Asks the service what the mailings would cost");
+    addServiceOptions(*plan, options->service);
     addBatchOptions(*plan, *options);
     plan->callback(
         [=, &task] { task = [=](Terminal const& terminal) { return makePlan(*options, terminal); }; });

@@ -49,6 +49,7 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     std::string const text = Reader::readFile(file);
     NodeSettings settings;
     settings.file_ = file;
+    settings.place_ = quoted(file);
     settings.sha256_ = VlMail::sha256(text);
     try {
         settings.parts_ = json::strToObject(text.data(), text.size());
@@ -67,12 +68,20 @@ NodeSettings NodeSettings::fromFileIfNamed(std::string const& file) {
     return file.empty() ? NodeSettings() : fromFile(file);
 }
 
+NodeSettings NodeSettings::resolved(json::Object parts, std::string place) {
+    NodeSettings settings;
+    settings.parts_ = std::move(parts);
+    settings.place_ = std::move(place);
+    // Own presets stand in front of inherited ones, whatever their order.
+    settings.sorted_ = false;
+    return settings;
+}
+
 Cfg::Presets NodeSettings::presets() const {
     try {
-        return Cfg::Presets(part(Cfg::Presets::PART_NAME), true, true);
+        return Cfg::Presets(part(Cfg::Presets::PART_NAME), true, sorted_);
     } catch (std::exception const& wrong) {
-        throw Error("cannot use the presets in " + quoted(file_) + ": " + wrong.what() +
-                    "; correct the file");
+        throw Error("cannot use the presets in " + place_ + ": " + wrong.what() + "; correct them there");
     }
 }
 

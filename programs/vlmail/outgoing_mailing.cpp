@@ -1,9 +1,12 @@
 #include "programs/vlmail/outgoing_mailing.h"
 
+#include "programs/mailing/pack_database.h"
 #include "programs/mailing/pending_file.h"
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/service_client.h"
 #include "vlservice/pack/pack_wrapper.h"
 
+#include <chrono>
 #include <iomanip>
 #include <random>
 #include <sstream>
@@ -43,6 +46,40 @@ private:
     MailingBuilder builder_;
 };
 
+class SentMailing : public OutgoingMailing {
+public:
+    SentMailing(Channel::Client& service, fs::path const& database, std::string const& nodeId, bool upload,
+                Cfg::PackPreset const& preset, std::time_t now)
+        : service_(service), database_(database), upload_(upload), id_(newMailingId(now)),
+          pack_(database, {id_, nodeId, preset.title()}), builder_(pack_, id_, preset, now) {}
+
+    MailingBuilder& builder() override { return builder_; }
+
+    void finish() override {
+        pack_.finish(builder_.metadata().toBlob());
+        sendPack(service_, database_, id_, upload_);
+        json::Object const job = awaitJob(service_, id_, PATIENCE);
+        state_ = job.get("state").textOrEmpty();
+        if (json::Value const problem = job.get("problem"))
+            throw Error("the service has trouble with mailing " + id_ + ": " + problem.textOrEmpty() +
+                        "; see vlmail status");
+    }
+
+    std::string place() const override { return id_ + ", " + state_; }
+
+private:
+    /// For a job that is only waiting for its turn; it goes on without us.
+    static constexpr std::chrono::seconds PATIENCE{10};
+
+    Channel::Client& service_;
+    fs::path database_;
+    bool upload_;
+    std::string id_;
+    std::string state_;
+    Mailing::PackDatabaseWriter pack_;
+    MailingBuilder builder_;
+};
+
 class PlannedMailing : public OutgoingMailing {
 public:
     explicit PlannedMailing(Cfg::PackPreset const& preset) : builder_(nowhere_, {}, preset, 0) {}
@@ -61,18 +98,30 @@ private:
     MailingBuilder builder_;
 };
 
+void makeFolder(fs::path const& folder, char const* remedy) {
+    std::error_code failure;
+    fs::create_directories(folder, failure);
+    if (failure)
+        throw Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() + "; " +
+                    remedy);
+}
+
 } // namespace
 
 OutgoingMailing::~OutgoingMailing() = default;
 
 BeginMailing mailingsIntoFolder(fs::path const& folder) {
-    std::error_code failure;
-    fs::create_directories(folder, failure);
-    if (failure)
-        throw Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() +
-                    "; name another with -o");
+    makeFolder(folder, "name another with -o");
     return [folder](Cfg::PackPreset const& preset) {
         return std::make_unique<MailingFile>(folder, preset, std::time(nullptr));
+    };
+}
+
+BeginMailing mailingsToService(Channel::Client& service, std::string const& nodeId, bool upload) {
+    fs::path const database = packDatabaseOf(service, nodeId);
+    makeFolder(database.parent_path(), "name another in the settings \"db_host\" of the node");
+    return [&service, nodeId, upload, database](Cfg::PackPreset const& preset) {
+        return std::make_unique<SentMailing>(service, database, nodeId, upload, preset, std::time(nullptr));
     };
 }
 

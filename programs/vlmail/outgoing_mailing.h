@@ -1,6 +1,7 @@
 #pragma once
 // A mailing on its way to where it goes: a file, a service, or nowhere while only a plan is made.
 
+#include "programs/channel/client.h"
 #include "programs/vlmail/mailing_builder.h"
 
 #include <ctime>
@@ -28,6 +29,11 @@ using BeginMailing = std::function<std::unique_ptr<OutgoingMailing>(Cfg::PackPre
 /// Mailings as files "<id>.mailing" in a folder, which is made when it is missing. Throws Error when it
 /// cannot be made.
 BeginMailing mailingsIntoFolder(std::filesystem::path const& folder);
+
+/// Mailings that a service is to process: stored in the pack database of a node and announced to the service,
+/// which must outlive the function. With `upload` the service hands them on at once. Throws std::exception
+/// with a line for people.
+BeginMailing mailingsToService(Channel::Client& service, std::string const& nodeId, bool upload);
 
 /// Mailings that are only decided: their pages are thrown away.
 BeginMailing mailingsNowhere();

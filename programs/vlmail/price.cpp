@@ -1,5 +1,6 @@
 // vlmail price: what letters would cost, by the tariff of the service.
-#include "programs/mailing/metadata.h"
+#include "programs/vlmail/price.h"
+
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/service_client.h"
 #include "programs/vlmail/text_table.h"
@@ -104,13 +105,6 @@ json::Object requestFor(std::vector<Batch> const& batches, bool colour) {
     return {{"letters", letters}};
 }
 
-/// Hundredths as a person writes them.
-std::string money(long long hundredths) {
-    char text[32];
-    std::snprintf(text, sizeof text, "%lld.%02lld", hundredths / 100, hundredths % 100);
-    return text;
-}
-
 void print(std::ostream& out, std::vector<Batch> const& batches, json::Object const& estimate) {
     std::string const currency = estimate.get("currency").textOrEmpty();
     constexpr auto RIGHT = TextTable::Align::Right;
@@ -126,19 +120,32 @@ void print(std::ostream& out, std::vector<Batch> const& batches, json::Object co
     out << "in all " << money(estimate.get("total").intOrZero()) << ' ' << currency << '\n';
 }
 
+json::Object estimate(Channel::Client& service, std::vector<Batch> const& batches, bool colour) {
+    return requireAnswer(service.call<Ipc::PriceEst>(requestFor(batches, colour))->resp());
+}
+
 int showPrice(Options const& options, Terminal const& terminal) {
     std::vector<Batch> const batches = batchesOf(options);
     auto const service = connectToService(options.service, terminal);
-    json::Object const estimate =
-        requireAnswer(service->call<Ipc::PriceEst>(requestFor(batches, options.colour))->resp());
+    json::Object const prices = estimate(*service, batches, options.colour);
     if (options.json)
-        terminal.out << estimate << '\n';
+        terminal.out << prices << '\n';
     else
-        print(terminal.out, batches, estimate);
+        print(terminal.out, batches, prices);
     return FINE;
 }
 
 } // namespace
+
+json::Object estimatePrice(Channel::Client& service, Mailing::Metadata const& mailing) {
+    return estimate(service, batchesOf(mailing), false);
+}
+
+std::string money(long long hundredths) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%lld.%02lld", hundredths / 100, hundredths % 100);
+    return text;
+}
 
 void addPriceCommand(CLI::App& app, Task& task) {
     auto const options = std::make_shared<Options>();

@@ -62,17 +62,13 @@ LetterReading letterFrom(json::Object const& object) {
 
 std::string quoted(std::string const& text) { return '"' + text + '"'; }
 
-std::string placeOf(NodeSettings const& settings) {
-    return settings.file().empty() ? "the settings" : quoted(settings.file().string());
-}
-
 /// The library takes a field with a bad pattern for one that was not found; here it is said instead.
 void requirePattern(std::string const& pattern, std::string const& whose, NodeSettings const& settings) {
     try {
         Cfg::ExtractPreset::match(pattern, std::string());
     } catch (std::exception const& bad) {
         throw Error("the pattern " + quoted(pattern) + " of " + whose + " cannot be used: " + bad.what() +
-                    "; correct it in " + placeOf(settings));
+                    "; correct it in " + settings.place());
     }
 }
 
@@ -92,7 +88,7 @@ findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings c
     try {
         return presets.findMatch(name);
     } catch (std::exception const& failure) {
-        throw Error(std::string(failure.what()) + "; correct the presets in " + placeOf(settings));
+        throw Error(std::string(failure.what()) + "; correct the presets in " + settings.place());
     }
 }
 

@@ -119,6 +119,17 @@ TEST_F(PackDatabase, CanBeReadWhileALargePackIsStored) {
     EXPECT_EQ(SQLite::Database(file_).execAndGet("SELECT count(*) FROM pages").getInt(), 3);
 }
 
+TEST_F(PackDatabase, StoresSeveralPacksAtOnce) {
+    PackDatabaseWriter one(file_, {"one", "", ""});
+    PackDatabaseWriter two(file_, {"two", "", ""});
+    one.savePage("doc", "1", zipped("x"));
+    two.savePage("doc", "1", zipped("y"));
+    one.finish(zipped("{}"));
+    two.finish(zipped("{}"));
+    EXPECT_EQ(PackDatabaseReader(file_, "one").pages().size(), 1u);
+    EXPECT_EQ(PackDatabaseReader(file_, "two").pages().size(), 1u);
+}
+
 TEST_F(PackDatabase, ForgetsWhatACrashLeftADayAgo) {
     storePack("kept");
     run("INSERT INTO packs (id, cfg_id, title, created_at) VALUES ('old', '', '', 5)");
@@ -145,7 +156,10 @@ TEST_F(PackDatabase, RefusesPagesThatItCannotKeep) {
     writer.savePage("doc", "1", zipped("x"));
     EXPECT_EQ(failureOf([&] { writer.savePage("doc", "2", SharedMemBuffer()); }),
               "page \"2\" of \"doc\" cannot be stored: it has 0 bytes");
-    EXPECT_EQ(failureOf([&] { writer.savePage("doc", "1", zipped("y")); }),
+    EXPECT_EQ(failureOf([&] {
+                  writer.savePage("doc", "1", zipped("y"));
+                  writer.finish(zipped("{}"));
+              }),
               "the pack database " + file_.string() +
                   " failed: UNIQUE constraint failed: pages.pack, pages.document, pages.page");
 }

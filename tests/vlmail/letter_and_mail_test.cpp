@@ -167,7 +167,7 @@ TEST_F(VlMailTest, SaysInOneLineWhatCannotBeReadAndGoesOnWithTheRest) {
 
 TEST_F(VlMailTest, RefusesACommandLineInOneLine) {
     EXPECT_EQ(vlmail({"mail", "x.pdf"}), VlMail::FAILED);
-    EXPECT_EQ(err_, "vlmail: --output is required; --help explains\n");
+    EXPECT_EQ(err_, "vlmail: --output or --send is required; --help explains\n");
     EXPECT_EQ(vlmail({"mail", "-o", path("out")}), VlMail::FAILED);
     EXPECT_EQ(err_, "vlmail: FILE or --plan is required; --help explains\n");
     EXPECT_EQ(vlmail({"letter", "--settings", path("gone.json"), "x.pdf"}), VlMail::FAILED);

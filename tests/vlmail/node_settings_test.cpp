@@ -44,7 +44,7 @@ TEST_F(NodeSettingsTest, TakesPartsUnderTheirNames) {
                                                "pack_presets": ["A"]}})");
     EXPECT_EQ(errorOf(path),
               "cannot use the presets in \"" + path.string() +
-                  "\": JSON error: Wrong type: string. Expected type: object; correct the file");
+                  "\": JSON error: Wrong type: string. Expected type: object; correct them there");
     file(R"({"app": {"m": 1}, "presets": {"extract_presets": [{"match": "a.*", "pack_preset": "A"}],
                                           "pack_presets": [{"name": "A"}]}})");
     EXPECT_EQ(packPresetFor(path, "abc"), "A");
