@@ -17,15 +17,21 @@ namespace {
 using enum FindingKind;
 using Use = Pattern::Use;
 
-/// What a pattern that cannot be used does to a document.
-char const* consequence(Use use) {
+/// What a pattern that does not compile does to documents.
+char const* consequenceOfBreaking(Use use) {
+    return use == Use::Name ? "every document whose name is tried on it fails"
+                            : "no document that gets this preset can be read";
+}
+
+/// What a pattern that the matcher gives up does to them.
+char const* consequenceOfGivingUp(Use use) {
     switch (use) {
     case Use::Name:
-        return "every document whose name is tried on it fails";
+        return "documents with such names fail";
     case Use::Extract:
-        return "the field is never found and yields its default, or nothing";
+        return "in such a letter the field is not found and yields its default, or nothing";
     case Use::Validate:
-        return "every letter in which the field is found fails";
+        return "documents with such a value fail";
     }
     return "";
 }
@@ -110,12 +116,12 @@ void checkPattern(std::string const& text, Use use, Place const& place, Findings
     try {
         Trial const trial = tryHardLines(Pattern(text, use));
         if (trial.burden == Burden::Runaway)
-            findings.add(RunawayPattern, place, {startOf(trial.line), consequence(use)});
+            findings.add(RunawayPattern, place, {startOf(trial.line), consequenceOfGivingUp(use)});
         else if (trial.burden == Burden::Slow)
             findings.add(SlowPattern, place, {startOf(trial.line)});
     } catch (BrokenPattern const& broken) {
         findings.add(PatternBroken, place,
-                     {std::to_string(broken.position + 1), broken.what(), consequence(use)});
+                     {std::to_string(broken.position + 1), broken.what(), consequenceOfBreaking(use)});
     }
 }
 

@@ -136,7 +136,7 @@ constexpr FindingWords WORDS[] = {
      "add fields, or remove the zone"},
 
     {FieldNameTwice, "field-name-twice", Error,
-     "the field at {1} is called {0} too: a letter cannot tell their values apart",
+     "the field at {1} is called {0} too: a letter has one value of a name, the one that is found first",
      "give it another name, or remove it"},
     {FieldPriorityTwice, "field-priority-twice", Error,
      "the recipient address {0} at {1} has the same priority {2}: a letter with both goes to the one that was found first",

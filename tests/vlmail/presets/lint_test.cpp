@@ -278,21 +278,21 @@ std::vector<Case> const CASES{
     {"BrokenPatterns",
      partWithField(R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>.*$", "value_match": "[a"})_"),
      {"error /extract_presets/0/zones/0/fields/1/value_extract: the pattern is broken at character 17 "
-      "(Unmatched marking parenthesis ( or \\(): the field is never found and yields its default, or nothing "
-      "| correct the pattern [broken-pattern]",
+      "(Unmatched marking parenthesis ( or \\(): no document that gets this preset can be read | correct the "
+      "pattern [broken-pattern]",
       "error /extract_presets/0/zones/0/fields/1/value_match: the pattern is broken at character 3 "
-      "(Unmatched [ or [^ in character class declaration): every letter in which the field is found fails | "
+      "(Unmatched [ or [^ in character class declaration): no document that gets this preset can be read | "
       "correct the pattern [broken-pattern]"}},
     {"PatternsThatRunAway",
      partWithField(
          R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>(\\w+\\s?)*);$", "value_match": "(a|a)*b"})_"),
      {"error /extract_presets/0/zones/0/fields/1/value_extract: the pattern runs away on a text such as "
-      "\"Ref: 1111111111111111111...\": the field is never found and yields its default, or nothing | repeat "
-      "nothing that is repeated inside, and let neighbouring repetitions take different characters "
-      "[runaway-pattern]",
+      "\"Ref: 1111111111111111111...\": in such a letter the field is not found and yields its default, or "
+      "nothing | repeat nothing that is repeated inside, and let neighbouring repetitions take different "
+      "characters [runaway-pattern]",
       "error /extract_presets/0/zones/0/fields/1/value_match: the pattern runs away on a text such as "
-      "\"aaaaaaaaaaaaaaaaaaaaaaaa...\": every letter in which the field is found fails | repeat nothing that "
-      "is repeated inside, and let neighbouring repetitions take different characters [runaway-pattern]"}},
+      "\"aaaaaaaaaaaaaaaaaaaaaaaa...\": documents with such a value fail | repeat nothing that is repeated "
+      "inside, and let neighbouring repetitions take different characters [runaway-pattern]"}},
     {"APatternThatIsSlow",
      partWithField(R"_({"name": "ref", "value_extract": ".*a.*a.*a.*(?<VAL>b)"})_"),
      {"warning /extract_presets/0/zones/0/fields/1/value_extract: the pattern is slow on a line of 1,000 "
@@ -360,8 +360,8 @@ std::vector<Case> const CASES{
     {"TwoFieldsOfOneName",
      partWithField(R"_({"name": "to", "default_value": "x"})_"),
      {"error /extract_presets/0/zones/0/fields/1/name: the field at /extract_presets/0/zones/0/fields/0 is "
-      "called \"to\" too: a letter cannot tell their values apart | give it another name, or remove it "
-      "[field-name-twice]"}},
+      "called \"to\" too: a letter has one value of a name, the one that is found first | give it another "
+      "name, or remove it [field-name-twice]"}},
     {"TwoAddressesOfOnePriority",
      partWithField(
          R"_({"name": "post", "value_extract": "(?<VAL>.+)", "priority": 1, "send_to_server": true})_"),
@@ -592,7 +592,7 @@ TEST(BrokenExamples, HaveTheirCauseInTheFirstLine) {
          "server, so it never counts: a letter with no other cannot go out"},
         {"bracket-not-closed.json", "error /presets/extract_presets/0/zones/1/fields/0/value_extract: the "
                                     "pattern is broken at character 27 (Unmatched marking parenthesis ( or "
-                                    "\\(): the field is never found and yields its default, or nothing"},
+                                    "\\(): no document that gets this preset can be read"},
         {"catch-all-without-order.json",
          "error /presets/extract_presets/0: no document reaches this preset: \"Everything else\" (\".*\") at "
          "/presets/extract_presets/2 fits all its names, and is tried first because its \"order\" is "
@@ -614,8 +614,8 @@ TEST(BrokenExamples, HaveTheirCauseInTheFirstLine) {
          "error /presets/extract_presets/1/pack_preset: there is no pack preset \"reminders\": every "
          "document that this preset fits fails"},
         {"pattern-runs-away.json", "error /presets/extract_presets/0/zones/1/fields/0/value_extract: the "
-                                   "pattern runs away on a text such as \"ref: 1111111111111111111...\": the "
-                                   "field is never found and yields its default, or nothing"},
+                                   "pattern runs away on a text such as \"ref: 1111111111111111111...\": in "
+                                   "such a letter the field is not found and yields its default, or nothing"},
         {"zone-in-millimetres.json", "warning /presets/extract_presets/0/zones/0/location: the zone is 0.9 "
                                      "mm wide and 0.45 mm high: hardly a word lies in it"},
     };
