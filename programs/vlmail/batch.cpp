@@ -53,6 +53,7 @@ std::string pack(ReadResult const& result) {
     std::string const json = std::move(text).str();
     message.put(json.data(), json.size());
     message.put(result.sha256.data(), result.sha256.size());
+    message.put(result.report.data(), result.report.size());
     message.put(result.pages.size());
     for (auto const& letter : result.pages) {
         message.put(letter.size());
@@ -70,6 +71,8 @@ ReadResult unpack(std::string bytes) {
     ReadResult result{DocumentReading::fromJson(json::strToObject(json, length))};
     auto const [digest, digestLength] = message.bytes();
     result.sha256.assign(digest, digestLength);
+    auto const [report, reportLength] = message.bytes();
+    result.report.assign(report, reportLength);
     result.pages.resize(message.number());
     for (auto& letter : result.pages) {
         letter.resize(message.number());
@@ -116,7 +119,7 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
     Cfg::Presets const presets = settings.presets();
     runBatch(
         files.size(), workers, terminal,
-        [&](std::size_t index) { return readDocument(files[index], presets, settings, along); },
+        [&](std::size_t index) { return readDocument(files[index], presets, settings, along, index + 1); },
         [&](std::size_t index) { return files[index]; }, take);
 }
 

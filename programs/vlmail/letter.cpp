@@ -1,8 +1,10 @@
 // vlmail letter: what the settings make of each document, for a person or as JSON.
 #include "programs/vlmail/batch.h"
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/field_words.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/outcome.h"
+#include "programs/vlmail/report/report_file.h"
 #include "programs/vlmail/text_table.h"
 #include "programs/vlmail/worker_pool.h"
 #include "vlservice/platform/json_text.h"
@@ -11,6 +13,7 @@
 
 #include <algorithm>
 #include <memory>
+#include <optional>
 #include <ostream>
 
 namespace VlMail {
@@ -19,6 +22,7 @@ namespace {
 struct Options {
     std::vector<std::string> files;
     std::string settings;
+    std::string report;
     bool json = false;
     std::size_t jobs = processorCount();
 };
@@ -37,14 +41,6 @@ std::string stateInWords(Cfg::ExtractedField const& field) {
     return "INVALID";
 }
 
-std::string roleInWords(Cfg::ExtractedField const& field, Cfg::ExtractedField const* primary) {
-    if (&field == primary)
-        return "recipient, this one counts";
-    if (field.isRcptAddress())
-        return "recipient";
-    return field.isNotifyAddress() ? "notification" : "";
-}
-
 std::string linesJoined(std::string text) {
     for (std::size_t at = text.find('\n'); at != std::string::npos; at = text.find('\n', at))
         text.replace(at, 1, " / ");
@@ -58,7 +54,7 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
     TextTable table({{"field"}, {"value"}, {"state"}, {"address"}});
     for (auto const& [priority, field] : letter.fields)
         table.addRow({field.name(), linesJoined(field.valueToStr()), stateInWords(field),
-                      roleInWords(field, letter.fields.primaryAddressField())});
+                      roleInWords(field, &field == letter.fields.primaryAddressField())});
     if (table.empty())
         out << "    no field was found\n";
     else
@@ -83,7 +79,10 @@ void print(std::ostream& out, DocumentReading const& reading) {
 int showLetters(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Outcome outcome;
-    readBatch(options.files, settings, options.jobs, Along::Nothing, terminal,
+    std::optional<Report::File> report;
+    if (!options.report.empty())
+        report.emplace(options.report);
+    readBatch(options.files, settings, options.jobs, report ? Along::Report : Along::Nothing, terminal,
               [&](std::size_t, ReadResult result) {
                   DocumentReading const& reading = result.reading;
                   outcome.count(reading);
@@ -93,7 +92,11 @@ int showLetters(Options const& options, Terminal const& terminal) {
                       print(terminal.out, reading);
                   if (reading.failed())
                       terminal.complain(reading.error);
+                  if (report)
+                      report->take(result);
               });
+    if (report)
+        report->write(outcome);
     if (!options.json && options.files.size() > 1)
         terminal.out << outcome.inWords() << '\n';
     return outcome.exitStatus();
@@ -108,6 +111,8 @@ void addLetterCommand(CLI::App& app, Task& task) {
     letter->add_option("FILE", options->files, "PDF or text documents")->required();
     letter->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
     letter->add_flag("--json", options->json, "One JSON object a document, each on a line");
+    letter->add_option("--report", options->report,
+                       "Writes an HTML page with the pages' pictures and what was found where");
     letter->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);
     letter->callback(
         [=, &task] { task = [=](Terminal const& terminal) { return showLetters(*options, terminal); }; });

@@ -5,6 +5,7 @@
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/digest.h"
 #include "programs/vlmail/node_settings.h"
+#include "programs/vlmail/report/describe.h"
 #include "programs/vlmail/utf8.h"
 
 #include "vlservice/pack/page_saver.h"
@@ -92,9 +93,10 @@ findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings c
     }
 }
 
-std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPreset const& preset) {
+std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPreset const& preset,
+                                     Reader::Trace* trace) {
     std::vector<LetterReading> letters;
-    for (Reader::Letter& letter : Reader::readLetters(document, preset))
+    for (Reader::Letter& letter : Reader::readLetters(document, preset, trace))
         letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing)});
     return letters;
 }
@@ -121,6 +123,7 @@ void fail(ReadResult& result, std::exception const& failure) {
     result.reading.document = validUtf8(result.reading.document);
     result.reading.error = validUtf8(failure.what());
     result.pages.clear();
+    result.report.clear();
 }
 
 } // namespace
@@ -175,7 +178,7 @@ DocumentReading DocumentReading::fromJson(json::Object const& object) {
 }
 
 ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
-                        Along along) {
+                        Along along, std::size_t place) {
     ReadResult result;
     DocumentReading& reading = result.reading;
     reading.document = file.filename().string();
@@ -189,7 +192,11 @@ ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeS
         if (extractPreset.isForAttachemnt())
             return result;
         requirePatterns(extractPreset, settings);
-        reading.letters = lettersOf(document, extractPreset);
+        Reader::Trace trace;
+        bool const withReport = contains(along, Along::Report);
+        reading.letters = lettersOf(document, extractPreset, withReport ? &trace : nullptr);
+        if (withReport)
+            result.report = Report::section(Report::describe(reading, document, trace), place);
         if (contains(along, Along::Pages))
             result.pages = pagesOf(document, reading);
         else

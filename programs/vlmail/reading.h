@@ -65,6 +65,8 @@ struct ReadResult {
     /// For each letter of the reading the blobs of its pages, when they were asked for; none for a letter
     /// that cannot go out.
     std::vector<std::vector<PageBlob>> pages = {};
+    /// The document's section of a report, when it was asked for and there are letters.
+    std::string report = {};
 };
 
 json::Array toJsonArray(std::vector<int> const& numbers);
@@ -73,6 +75,7 @@ json::Array toJsonArray(std::vector<int> const& numbers);
 enum class Along : unsigned {
     Nothing = 0,
     Pages = 1,
+    Report = 2,
 };
 
 constexpr Along operator|(Along one, Along other) {
@@ -82,10 +85,10 @@ constexpr bool contains(Along set, Along one) {
     return (static_cast<unsigned>(set) & static_cast<unsigned>(one)) != 0;
 }
 
-/// Reads a document as the settings say. Failures are the reading's `error`; nothing derived from
-/// std::exception is thrown.
+/// Reads a document as the settings say; `place` is its place in a report, from 1. Failures are the reading's
+/// `error`; nothing derived from std::exception is thrown.
 ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
-                        NodeSettings const& settings, Along along);
+                        NodeSettings const& settings, Along along, std::size_t place);
 
 /// The pages of a document that was read before, for the letters that can go out. A document that is not the
 /// one with that digest any more is a failure, said in the reading's `error`.

@@ -1,0 +1,149 @@
+#include "programs/vlmail/report/describe.h"
+
+#include "programs/vlmail/field_words.h"
+#include "programs/vlmail/outcome.h"
+#include "programs/vlmail/presets/words.h"
+#include "programs/vlmail/utf8.h"
+
+#include <algorithm>
+#include <map>
+#include <string>
+
+namespace VlMail::Report {
+namespace {
+
+using Reader::Box;
+using Reader::FieldTrace;
+using Reader::ZoneTrace;
+using State = Field::State;
+
+/// Text can be read, and a page is some 100 KB.
+constexpr double DOTS_PER_INCH = 110;
+
+/// Tells which of several fields of a name counts: the first that was found, or else the first default.
+class Counting {
+public:
+    explicit Counting(std::vector<ZoneTrace> const& zones) {
+        for (ZoneTrace const& zone : zones) {
+            for (FieldTrace const& field : zone.fields)
+                consider(field);
+        }
+    }
+    bool counts(FieldTrace const& field) const {
+        auto const known = counting_.find(field.definition->name());
+        return known != counting_.end() && known->second == &field;
+    }
+
+private:
+    void consider(FieldTrace const& field) {
+        if (!field.value)
+            return;
+        FieldTrace const*& known = counting_[field.definition->name()];
+        if (!known || (field.rawText && !known->rawText))
+            known = &field;
+    }
+
+    std::map<std::string, FieldTrace const*> counting_;
+};
+
+State stateOf(FieldTrace const& field, bool counts) {
+    if (!field.value)
+        return field.definition->mustHave() ? State::Missing : State::NotFound;
+    if (!counts)
+        return State::Unused;
+    if (field.value->valueType() == Cfg::ExtractedField::ValueType::Invalid)
+        return State::Invalid;
+    return field.rawText ? State::Found : State::Default;
+}
+
+void addNote(std::string& notes, std::string const& note) {
+    if (note.empty())
+        return;
+    notes += (notes.empty() ? "" : "; ") + note;
+}
+
+std::string noteOf(FieldTrace const& field, State state, Cfg::ExtractedField const* primary) {
+    std::string notes;
+    if (field.value && state != State::Unused)
+        addNote(notes, roleInWords(*field.value, primary && primary->name() == field.value->name()));
+    if (state == State::Unused)
+        addNote(notes, "another field of this name counts");
+    if (state == State::Missing)
+        addNote(notes, "it is obligatory");
+    if (field.isTooWide)
+        addNote(notes, "the match is " + inMillimetres(field.match->width) + " mm wide, allowed are " +
+                           inMillimetres(field.definition->maxWidth()) + " mm");
+    return notes;
+}
+
+Field fieldOf(FieldTrace const& trace, Counting const& counting, Cfg::ExtractedField const* primary) {
+    Field field{trace.definition->name()};
+    field.state = stateOf(trace, counting.counts(trace));
+    field.note = noteOf(trace, field.state, primary);
+    if (trace.value)
+        field.value = trace.value->valueToStr();
+    if (trace.match)
+        field.match = trace.match->box;
+    return field;
+}
+
+Box boxOf(ZoneTrace const& zone) {
+    Cfg::Rect const& location = zone.definition->location();
+    if (zone.definition->hasLocation())
+        return {location.left, location.top, location.right, location.bottom};
+    if (!zone.blocks.empty())
+        return zone.box;
+    Cfg::Point const point = zone.definition->mostProbablePoint();
+    return {point.x, point.y, point.x, point.y};
+}
+
+std::vector<Zone> zonesOf(Reader::PageTrace const& page, LetterReading const& letter) {
+    Counting const counting(page.zones);
+    std::vector<Zone> zones;
+    for (ZoneTrace const& trace : page.zones) {
+        Zone zone{trace.definition->name(), boxOf(trace), trace.definition->hasAddress(),
+                  !trace.definition->hasLocation()};
+        for (FieldTrace const& field : trace.fields)
+            zone.fields.push_back(fieldOf(field, counting, letter.fields.primaryAddressField()));
+        zones.push_back(std::move(zone));
+    }
+    return zones;
+}
+
+void draw(Letter& letter, Reader::Document& document) {
+    try {
+        letter.png = document.renderPage(letter.page, DOTS_PER_INCH);
+    } catch (std::exception const& failure) {
+        letter.whyNoPicture = failure.what();
+    }
+}
+
+Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader::PageTrace const& trace) {
+    Letter letter{trace.page, pagesInWords(reading.pages), reading.whyNot()};
+    Reader::Page const& page = document.page(trace.page);
+    letter.width = page.width;
+    letter.height = page.height;
+    draw(letter, document);
+    letter.zones = zonesOf(trace, reading);
+    return letter;
+}
+
+} // namespace
+
+Document describe(DocumentReading const& reading) {
+    Document described{reading.document, reading.error, reading.extractPreset, reading.packPreset};
+    described.isAttachment = reading.isAttachment();
+    return described;
+}
+
+Document describe(DocumentReading const& reading, Reader::Document& document, Reader::Trace const& trace) {
+    Document described = describe(reading);
+    auto letter = reading.letters->begin();
+    for (Reader::PageTrace const& page : trace.pages) {
+        if (page.beginsLetter)
+            described.letters.push_back(letterOf(*letter++, document, page));
+    }
+    return described;
+}
+
+} // namespace VlMail::Report

@@ -1,0 +1,75 @@
+#include "programs/vlmail/report/html.h"
+
+#include "programs/vlmail/utf8.h"
+
+#include <openssl/evp.h>
+
+#include <charconv>
+#include <cmath>
+#include <cstddef>
+
+namespace VlMail::Report {
+namespace {
+
+constexpr std::string_view REPLACEMENT = "\xEF\xBF\xBD";
+
+bool isForbidden(char c) {
+    auto const code = static_cast<unsigned char>(c);
+    return code == 0x7F || (code < 0x20 && c != '\n' && c != '\t');
+}
+
+void appendEscaped(std::string& html, char c) {
+    switch (c) {
+    case '&':
+        html += "&amp;";
+        return;
+    case '<':
+        html += "&lt;";
+        return;
+    case '>':
+        html += "&gt;";
+        return;
+    case '"':
+        html += "&quot;";
+        return;
+    case '\'':
+        html += "&#39;";
+        return;
+    default:
+        break;
+    }
+    if (isForbidden(c))
+        html += REPLACEMENT;
+    else
+        html += c;
+}
+
+} // namespace
+
+std::string escaped(std::string const& text) {
+    std::string html;
+    for (char const c : validUtf8(text))
+        appendEscaped(html, c);
+    return html;
+}
+
+std::string isolated(std::string const& text) { return "<bdi>" + escaped(text) + "</bdi>"; }
+
+std::string percent(double part, double whole) {
+    constexpr double HUNDREDTHS = 100;
+    double const rounded = std::round(part / whole * 100 * HUNDREDTHS) / HUNDREDTHS;
+    char digits[32];
+    auto const end = std::to_chars(std::begin(digits), std::end(digits), rounded, std::chars_format::fixed);
+    return std::string(digits, end.ptr) + '%';
+}
+
+std::string pngUri(std::string_view png) {
+    std::string base64((png.size() + 2) / 3 * 4 + 1, '\0');
+    int const length =
+        EVP_EncodeBlock(reinterpret_cast<unsigned char*>(base64.data()),
+                        reinterpret_cast<unsigned char const*>(png.data()), static_cast<int>(png.size()));
+    base64.resize(static_cast<std::size_t>(length));
+    return "data:image/png;base64," + base64;
+}
+
+} // namespace VlMail::Report

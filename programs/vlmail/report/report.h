@@ -1,0 +1,85 @@
+#pragma once
+// Letters as one HTML page for people: each with the picture of its page, over it what was searched and found
+// where, beside it a table of the fields. The page stands alone: it loads nothing and runs nothing.
+
+#include "programs/reader/geometry.h"
+
+#include <cstddef>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace VlMail::Report {
+
+struct Field {
+    enum class State {
+        Found,
+        Default,  ///< nothing was found, and the settings have a value for that
+        Unused,   ///< another field of the same name counts
+        NotFound, ///< and nobody minds
+        Invalid,
+        Missing, ///< not found, although obligatory
+    };
+
+    std::string name;
+    std::string value = {};
+    State state = State::Found;
+    /// What there is to add, for people.
+    std::string note = {};
+    /// Where the pattern matched.
+    std::optional<Reader::Box> match = {};
+};
+
+struct Zone {
+    std::string name;
+    Reader::Box box;
+    /// A recipient address is searched in it.
+    bool isAddressWindow = false;
+    /// Found by its most probable point: the box is around the text that was nearest.
+    bool isByPoint = false;
+    std::vector<Field> fields = {};
+};
+
+struct Letter {
+    /// The first page, on which the fields are searched, and all of them in words.
+    int page = 1;
+    std::string pages;
+    /// Why it cannot go out; empty when it can.
+    std::string whyNot = {};
+    /// Of the first page as shown, in 1/100 mm.
+    int width = 0;
+    int height = 0;
+    /// A picture of it, or else why there is none.
+    std::string png = {};
+    std::string whyNoPicture = {};
+    std::vector<Zone> zones = {};
+};
+
+struct Document {
+    std::string name;
+    /// When it could not be read; the rest is empty then.
+    std::string error = {};
+    std::string extractPreset = {};
+    std::string packPreset = {};
+    bool isAttachment = false;
+    std::vector<Letter> letters = {};
+};
+
+/// A document's part of the page. Its anchors begin with "d" and `place`, which is from 1 and another for
+/// each document of a page.
+std::string section(Document const& document, std::size_t place);
+
+/// A document in the overview.
+struct Entry {
+    std::string name;
+    /// Such as "2 letters, 1 cannot go out".
+    std::string state;
+    bool isTrouble = false;
+    /// As section() gives it for the entry's place.
+    std::string section = {};
+};
+
+/// The whole page. `outcome` sums it up in words.
+std::string page(std::string const& outcome, std::vector<Entry> const& entries);
+
+} // namespace VlMail::Report

@@ -1,0 +1,54 @@
+#include "programs/vlmail/report/report_file.h"
+
+#include "programs/mailing/pending_file.h"
+#include "programs/vlmail/command.h"
+#include "programs/vlmail/report/describe.h"
+#include "programs/vlmail/utf8.h"
+
+#include <algorithm>
+
+namespace VlMail::Report {
+namespace {
+
+namespace fs = std::filesystem;
+
+fs::path const& requireHtml(fs::path const& target) {
+    if (target.extension() != ".html" && target.extension() != ".htm")
+        throw Error("cannot write a report to \"" + validUtf8(target.string()) +
+                    "\": its name must end in .html; give --report another name");
+    return target;
+}
+
+std::size_t stuckLetters(DocumentReading const& reading) {
+    return static_cast<std::size_t>(
+        std::count_if(reading.letters->begin(), reading.letters->end(),
+                      [](LetterReading const& letter) { return !letter.whyNot().empty(); }));
+}
+
+std::string stateOf(DocumentReading const& reading, std::size_t stuck) {
+    if (reading.failed())
+        return "failed";
+    if (reading.isAttachment())
+        return "an attachment";
+    std::string const letters = counted(reading.letters->size(), "letter");
+    return letters + ", " + (stuck == 0 ? "ready" : std::to_string(stuck) + " cannot go out");
+}
+
+} // namespace
+
+File::File(fs::path const& target) : target_(requireHtml(target)) {
+    // Known now rather than after a long batch.
+    Mailing::PendingFile const attempt(target_);
+}
+
+void File::take(ReadResult const& result) {
+    DocumentReading const& reading = result.reading;
+    std::size_t const stuck = reading.letters ? stuckLetters(reading) : 0;
+    entries_.push_back(
+        {reading.document, stateOf(reading, stuck), reading.failed() || stuck > 0,
+         result.report.empty() ? section(describe(reading), entries_.size() + 1) : result.report});
+}
+
+void File::write(Outcome const& outcome) { Mailing::writeFile(target_, page(outcome.inWords(), entries_)); }
+
+} // namespace VlMail::Report
