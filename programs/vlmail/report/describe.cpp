@@ -76,14 +76,35 @@ std::string noteOf(FieldTrace const& field, State state, Cfg::ExtractedField con
     return notes;
 }
 
-Field fieldOf(FieldTrace const& trace, Counting const& counting, Cfg::ExtractedField const* primary) {
+bool isFree(Box const& space, Reader::Page const& page) {
+    return space.left >= 0 && space.right <= page.width &&
+           std::none_of(page.words.begin(), page.words.end(), [&](Reader::Word const& word) {
+               return word.box.left < space.right && space.left < word.box.right &&
+                      word.box.top < space.bottom && space.top < word.box.bottom;
+           });
+}
+
+/// Where the name hides the least text. Its width on the page is a guess: browsers choose the font.
+Field::Tag tagFor(Box const& match, std::string const& name, Reader::Page const& page) {
+    int const width = 300 + 200 * static_cast<int>(name.size());
+    if (isFree({match.right, match.top, match.right + width, match.bottom}, page))
+        return Field::Tag::Behind;
+    if (isFree({match.left - width, match.top, match.left, match.bottom}, page))
+        return Field::Tag::InFront;
+    return Field::Tag::Above;
+}
+
+Field fieldOf(FieldTrace const& trace, Counting const& counting, Cfg::ExtractedField const* primary,
+              Reader::Page const& page) {
     Field field{trace.definition->name()};
     field.state = stateOf(trace, counting.counts(trace));
     field.note = noteOf(trace, field.state, primary);
     if (trace.value)
         field.value = trace.value->valueToStr();
-    if (trace.match)
+    if (trace.match) {
         field.match = trace.match->box;
+        field.tag = tagFor(*field.match, field.name, page);
+    }
     return field;
 }
 
@@ -97,14 +118,15 @@ Box boxOf(ZoneTrace const& zone) {
     return {point.x, point.y, point.x, point.y};
 }
 
-std::vector<Zone> zonesOf(Reader::PageTrace const& page, LetterReading const& letter) {
-    Counting const counting(page.zones);
+std::vector<Zone> zonesOf(Reader::PageTrace const& trace, LetterReading const& letter,
+                          Reader::Page const& page) {
+    Counting const counting(trace.zones);
     std::vector<Zone> zones;
-    for (ZoneTrace const& trace : page.zones) {
-        Zone zone{trace.definition->name(), boxOf(trace), trace.definition->hasAddress(),
-                  !trace.definition->hasLocation()};
-        for (FieldTrace const& field : trace.fields)
-            zone.fields.push_back(fieldOf(field, counting, letter.fields.primaryAddressField()));
+    for (ZoneTrace const& seen : trace.zones) {
+        Zone zone{seen.definition->name(), boxOf(seen), seen.definition->hasAddress(),
+                  !seen.definition->hasLocation()};
+        for (FieldTrace const& field : seen.fields)
+            zone.fields.push_back(fieldOf(field, counting, letter.fields.primaryAddressField(), page));
         zones.push_back(std::move(zone));
     }
     return zones;
@@ -124,7 +146,7 @@ Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader
     letter.width = page.width;
     letter.height = page.height;
     draw(letter, document);
-    letter.zones = zonesOf(trace, reading);
+    letter.zones = zonesOf(trace, reading, page);
     return letter;
 }
 

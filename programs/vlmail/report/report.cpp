@@ -32,6 +32,9 @@ constexpr std::array STATES{
     StateLook{"\u2717 invalid", "bad"},    StateLook{"\u2717 missing", "bad"},
 };
 
+/// In the order of Field::Tag.
+constexpr std::array TAGS{"", " front", " above"};
+
 StateLook lookOf(Field const& field) { return STATES.at(static_cast<std::size_t>(field.state)); }
 
 bool isTrouble(Field const& field) {
@@ -89,12 +92,11 @@ std::string overlayOf(Zone const& zone, std::string const& anchor, Letter const&
     return overlay(anchor, look, box, letter, name, name);
 }
 
-/// The name stands behind the match, or before it where the page ends.
 std::string overlayOf(Field const& field, std::string const& anchor, Letter const& letter) {
     Box const box = onPage(*field.match, letter);
     StateLook const state = lookOf(field);
     std::string look = std::string("match ") + state.look;
-    look += box.right > letter.width / 4 * 3 ? " right" : "";
+    look += TAGS.at(static_cast<std::size_t>(field.tag));
     std::string const tag = (isTrouble(field) ? "\u2717 " : "") + field.name;
     return overlay(anchor, look, box, letter, tag, "field " + field.name + ": " + state.words);
 }

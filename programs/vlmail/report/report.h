@@ -21,6 +21,9 @@ struct Field {
         Missing, ///< not found, although obligatory
     };
 
+    /// Where the name stands at the match.
+    enum class Tag { Behind, InFront, Above };
+
     std::string name;
     std::string value = {};
     State state = State::Found;
@@ -28,6 +31,7 @@ struct Field {
     std::string note = {};
     /// Where the pattern matched.
     std::optional<Reader::Box> match = {};
+    Tag tag = Tag::Behind;
 };
 
 struct Zone {

@@ -47,7 +47,7 @@ h3 .state, .why { white-space: normal; }
 figure { margin: 0; }
 figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9rem; }
 
-.sheet { --high: 75rem; position: relative; width: min(100%, calc(var(--high) * var(--w) / var(--h)));
+.sheet { --high: 75rem; position: relative; container-type: inline-size; width: min(100%, calc(var(--high) * var(--w) / var(--h)));
     aspect-ratio: var(--w) / var(--h); background: #fff; color: #1b1f24; overflow: hidden;
     box-shadow: 0 0 0 1px var(--line); }
 .sheet img { display: block; width: 100%; height: 100%; }
@@ -62,12 +62,13 @@ figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9rem; }
 .match.bad { border: 2px dashed #b3152a; background-image: repeating-linear-gradient(135deg, rgb(179 21 42 / 22%) 0 3px,
     rgb(179 21 42 / 6%) 3px 8px); }
 .tag { position: absolute; z-index: 1; padding: 0 .3em; font: 600 .68rem/1.35 system-ui, sans-serif; white-space: nowrap;
-    color: #fff; background: #35548c; }
+    font-size: clamp(.3rem, 1.5cqw, .72rem); color: #fff; background: #35548c; }
 .zone > .tag { left: -1px; bottom: 100%; }
 .zone.high > .tag { top: 0; bottom: auto; }
 .window > .tag { left: -2px; background: #7b2d9b; }
 .match > .tag { left: calc(100% + 1px); top: -1px; background: #17692f; }
-.match.right > .tag { left: auto; right: calc(100% + 1px); }
+.match.front > .tag { left: auto; right: calc(100% + 1px); }
+.match.above > .tag { left: -1px; top: auto; bottom: 100%; }
 .match.quiet > .tag { background: #555d68; }
 .match.bad > .tag { background: #b3152a; }
 .sheet a:focus-visible { outline: 3px solid #0b57d0; box-shadow: 0 0 0 6px #fff; z-index: 3; }
@@ -79,10 +80,10 @@ caption { text-align: left; font-weight: 600; padding-bottom: .4rem; }
 th, td { padding: .35rem .6rem .35rem 0; text-align: left; vertical-align: top; border-bottom: 1px solid var(--line);
     overflow-wrap: anywhere; }
 thead th { color: var(--quiet); font-weight: 600; }
-tbody th { font-weight: 400; }
+tbody th { font-weight: 400; overflow-wrap: break-word; }
 .group th { padding-top: .9rem; font-weight: 600; border-bottom-width: 2px; }
 .group small { font-weight: 400; color: var(--quiet); }
-td.value { white-space: pre-line; }
+td.value { white-space: pre-line; min-width: 9em; }
 td small { display: block; color: var(--quiet); white-space: normal; }
 tr.bad { background: var(--bad-ground); box-shadow: inset .35rem 0 0 var(--bad); }
 tr.bad th { padding-left: .75rem; font-weight: 600; }
@@ -98,6 +99,7 @@ tr, .sheet a { scroll-margin: 5rem; }
 @media (min-width: 60.01rem) {
     .fields { position: sticky; top: 1rem; max-height: calc(100vh - 2rem); overflow-y: auto; padding: .2rem; }
 }
+.fields { overflow-x: auto; }
 @page { size: A4 landscape; margin: 10mm; }
 @media print {
     :root { --ground: #fff; --card: #fff; --text: #000; --quiet: #333; --line: #999; --fine: #17692f; --bad: #b3152a;
@@ -115,7 +117,7 @@ tr, .sheet a { scroll-margin: 5rem; }
     .sheet { --high: 152mm; width: min(125mm, calc(var(--high) * var(--w) / var(--h))); box-shadow: none; outline: .3mm solid #999; }
     header { padding-bottom: 6mm; }
     .document.bare + .bare { margin-top: 6mm; }
-    .tag { font-size: 4.5pt; }
+    tbody th { overflow-wrap: anywhere; }
     .fields { position: static; max-height: none; overflow: visible; }
     .sheet a:target { outline: 0; }
     tr:target { box-shadow: none; }

@@ -101,6 +101,24 @@ TEST_F(ReportCommand, HasEachDocumentInTheirOrderAlsoThoseWithoutLetters) {
               page.find("<section class=\"document\" id=\"d2\""));
 }
 
+TEST_F(ReportCommand, PutsTheNameOfAMatchWhereItHidesNoText) {
+    write("number.json", R"json({"extract_presets": [{"match": ".*", "pack_preset": "Invoices", "zones": [
+        {"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
+            {"name": "number", "value_extract": "No (?<VAL>[0-9]+)"}]}]}],
+        "pack_presets": [{"name": "Invoices"}]})json");
+    struct Case {
+        char const* line;
+        char const* look;
+    };
+    for (Case const& expected : {Case{"No 5", "match "}, Case{"No 5   behind", "match  front"},
+                                 Case{"stands in front   No 5   behind", "match  above"}}) {
+        write("number.txt", std::string("First line\n\n\n") + expected.line + "\n");
+        runVlMail({"letter", "--settings", path("number.json"), "--report", path("report.html"),
+                   path("number.txt")});
+        EXPECT_THAT(html(), HasSubstr(std::string("<a class=\"") + expected.look + "\"")) << expected.line;
+    }
+}
+
 TEST_F(ReportCommand, IsTheSameOnOneProcessAndOnTwo) {
     write("two.txt", LETTER);
     report({"one.txt", "two.txt"});

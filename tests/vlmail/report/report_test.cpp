@@ -192,9 +192,13 @@ TEST(ReportMatch, HasACrossInItsTagWhenItIsInvalid) {
                 HasSubstr("<span class=\"tag\"><bdi>\u2717 total</bdi></span>"));
 }
 
-TEST(ReportMatch, HasItsTagInFrontWhereThePageEnds) {
-    EXPECT_THAT(sectionWith(Field{"total", "5", Field::State::Found, "", Reader::Box{15000, 0, 19000, 300}}),
-                HasSubstr("<a class=\"match  right\""));
+TEST(ReportMatch, HasItsTagWhereThereIsRoom) {
+    Field field{"total", "5", Field::State::Found, "", Reader::Box{15000, 0, 19000, 300}};
+    EXPECT_THAT(sectionWith(field), HasSubstr("<a class=\"match \""));
+    field.tag = Field::Tag::InFront;
+    EXPECT_THAT(sectionWith(field), HasSubstr("<a class=\"match  front\""));
+    field.tag = Field::Tag::Above;
+    EXPECT_THAT(sectionWith(field), HasSubstr("<a class=\"match  above\""));
 }
 
 TEST(ReportRow, OfAFieldWithoutAMatchLinksToNothing) {
