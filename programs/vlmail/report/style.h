@@ -45,7 +45,7 @@ h3 .state, .why { white-space: normal; }
 .letter + .letter { margin-top: 2rem; padding-top: 1.5rem; border-top: 1px solid var(--line); }
 .beside { display: grid; grid-template-columns: minmax(0, 11fr) minmax(0, 9fr); gap: 1.5rem; align-items: start; }
 figure { margin: 0; }
-figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9rem; }
+figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9em; }
 
 .sheet { --high: 75rem; position: relative; container-type: inline-size; width: min(100%, calc(var(--high) * var(--w) / var(--h)));
     aspect-ratio: var(--w) / var(--h); background: #fff; color: #1b1f24; overflow: hidden;
