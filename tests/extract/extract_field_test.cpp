@@ -17,6 +17,7 @@
 namespace Cfg {
 namespace {
 
+using testing::Each;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::StartsWith;
@@ -450,6 +451,21 @@ TEST(ExtractionFailures, LogABadPatternEachTimeAndYieldTheDefault) {
     EXPECT_EQ(extracted(field, "a"), "\"d\"");
     EXPECT_THAT(log.lines(), ElementsAre(StartsWith("3 Extract field failed with "),
                                          StartsWith("3 Extract field failed with ")));
+}
+
+TEST(ExtractionFailures, LogAPatternThatTheEngineWouldNeverParse) {
+    LoggedLines const log;
+    for (char const* const pattern :
+         {"a?+(?#why)(?<VAL>b)", "a*+ (?#why)b", "a++(?#x)(?#y)b", "a{1}+(?#why)b", "a*?+(?#why)b"})
+        EXPECT_EQ(extracted(finding(pattern), "ab"), "nothing") << pattern;
+    EXPECT_THAT(log.lines(),
+                Each(StartsWith("3 Extract field failed with A comment stands behind a possessive")));
+    EXPECT_EQ(log.lines().size(), 5u);
+}
+
+TEST(ExtractionPatterns, TakeCommentsAndPossessiveRepeatsApartFromEachOther) {
+    for (char const* const pattern : {"a(?#why)(?<VAL>b)", "a+(?#why)(?<VAL>b)", "a++(?<VAL>b)(?#why)"})
+        EXPECT_EQ(extracted(finding(pattern), "ab"), "\"b\"") << pattern;
 }
 
 TEST(ExtractionFailures, LogTextAndPatternsThatAreNotUtf8) {

@@ -1,11 +1,14 @@
 #include "vlservice/extract/regex.h"
 
 #include <boost/regex/icu.hpp>
+#include <unicode/uchar.h>
 #include <unicode/uclean.h>
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <cstdlib>
+#include <iterator>
 #include <utility>
 #include <vector>
 
@@ -39,9 +42,43 @@ CodePoints decode(std::string_view utf8, std::size_t padding) {
     return points;
 }
 
+/// Whether the parser of patterns would run for ever: it does when a comment stands behind a possessive
+/// repeat, as in "a?+(?#why)b". Blanks between them count for nothing, since a pattern may switch them off.
+bool hangsTheParser(CodePoints const& pattern) {
+    constexpr std::array<UChar32, 3> COMMENT{'(', '?', '#'};
+    auto const first = pattern.begin();
+    auto const behindLastSolid = [first](auto at) {
+        while (at != first && u_isspace(at[-1]))
+            --at;
+        return at;
+    };
+    auto const endsIn = [first](auto at, std::string_view characters) {
+        return at != first && at[-1] < 0x80 && characters.find(static_cast<char>(at[-1])) != characters.npos;
+    };
+    auto const comment = [&](auto from) {
+        return std::search(from, pattern.end(), COMMENT.begin(), COMMENT.end());
+    };
+    for (auto at = comment(first); at != pattern.end(); at = comment(at + 1)) {
+        auto const plus = behindLastSolid(at);
+        if (endsIn(plus, "+") && endsIn(behindLastSolid(plus - 1), "*+?}"))
+            return true;
+    }
+    return false;
+}
+
 boost::u32regex compile(std::string_view pattern, boost::regex_constants::syntax_option_type options) {
     CodePoints const points = decode(pattern, PATTERN_PADDING);
-    return boost::u32regex(points.data(), points.data() + points.size() - PATTERN_PADDING, options);
+    if (hangsTheParser(points))
+        throw boost::regex_error("A comment stands behind a possessive repeat.",
+                                 boost::regex_constants::error_badrepeat, 0);
+    // Pointers to const, which are parsed where they point; any other iterators are copied first, without
+    // padding.
+    UChar32 const* const first = points.data();
+    return boost::u32regex(first, first + points.size() - PATTERN_PADDING, options);
+}
+
+std::string_view piece(boost::sub_match<char const*> const& group) {
+    return {group.first, static_cast<std::size_t>(group.length())};
 }
 
 } // namespace
@@ -53,10 +90,6 @@ struct RegexMatch::Results {
 RegexMatch::RegexMatch(std::unique_ptr<Results const> results) : results_(std::move(results)) {}
 RegexMatch::RegexMatch(RegexMatch&& other) noexcept = default;
 RegexMatch::~RegexMatch() = default;
-
-static std::string_view piece(boost::sub_match<char const*> const& group) {
-    return {group.first, static_cast<std::size_t>(group.length())};
-}
 
 std::string_view RegexMatch::whole() const { return piece(results_->groups[0]); }
 
