@@ -102,14 +102,11 @@ bool ExtractField::operator==(ExtractField const& other) const {
 std::optional<ExtractField::Found> ExtractField::find(std::string const& text) const {
     if (strRegex_.empty())
         return std::nullopt;
-    auto const match = compiledRegex_.get(strRegex_).search(text);
-    if (!match)
+    auto const found = compiledRegex_.get(strRegex_).search(text, REGEX_VALUE_GROUP_MARK);
+    if (!found || !found->group)
         return std::nullopt;
-    auto const value = match->group(REGEX_VALUE_GROUP_MARK.c_str());
-    if (!value)
-        return std::nullopt;
-    auto const whole = match->whole();
-    return Found{std::string(*value), static_cast<std::size_t>(whole.data() - text.data()), whole.size()};
+    auto const offset = static_cast<std::size_t>(found->whole.data() - text.data());
+    return Found{std::string(*found->group), offset, found->whole.size()};
 }
 
 std::shared_ptr<ExtractedField> ExtractField::makeValue(std::string text) const {

@@ -77,25 +77,34 @@ boost::u32regex compile(std::string_view pattern, boost::regex_constants::syntax
     return boost::u32regex(first, first + points.size() - PATTERN_PADDING, options);
 }
 
-std::string_view piece(boost::sub_match<char const*> const& group) {
-    return {group.first, static_cast<std::size_t>(group.length())};
+// The matchers run on decoding iterators as they are: the engine's own wrappers for UTF-8 copy all groups
+// once more.
+using Groups = boost::match_results<Decoder>;
+
+std::string_view piece(boost::sub_match<Decoder> const& group) {
+    char const* const first = group.first.base();
+    return {first, static_cast<std::size_t>(group.second.base() - first)};
+}
+
+std::optional<std::string_view> groupNamed(Groups const& groups, std::string_view name) {
+    // A string, since the names in use fit into one without an allocation.
+    std::basic_string<UChar32> const points(name.begin(), name.end());
+    auto const& found = groups.named_subexpression(points.data(), points.data() + points.size());
+    return found.matched ? std::optional(piece(found)) : std::nullopt;
 }
 
 } // namespace
 
-struct RegexMatch::Results {
-    boost::match_results<char const*> groups;
+struct RegexGroups::Results {
+    Groups groups;
 };
 
-RegexMatch::RegexMatch(std::unique_ptr<Results const> results) : results_(std::move(results)) {}
-RegexMatch::RegexMatch(RegexMatch&& other) noexcept = default;
-RegexMatch::~RegexMatch() = default;
+RegexGroups::RegexGroups(std::unique_ptr<Results const> results) : results_(std::move(results)) {}
+RegexGroups::RegexGroups(RegexGroups&& other) noexcept = default;
+RegexGroups::~RegexGroups() = default;
 
-std::string_view RegexMatch::whole() const { return piece(results_->groups[0]); }
-
-std::optional<std::string_view> RegexMatch::group(char const* name) const {
-    auto const& found = results_->groups[name];
-    return found.matched ? std::optional(piece(found)) : std::nullopt;
+std::optional<std::string_view> RegexGroups::group(std::string_view name) const {
+    return groupNamed(results_->groups, name);
 }
 
 struct FieldRegex::Compiled {
@@ -106,20 +115,24 @@ FieldRegex::FieldRegex(std::string_view pattern)
     : compiled_(new Compiled{compile(pattern, boost::regex_constants::perl)}) {}
 FieldRegex::~FieldRegex() = default;
 
-std::optional<RegexMatch> FieldRegex::search(std::string_view text) const {
-    auto found = std::make_unique<RegexMatch::Results>();
-    if (!boost::u32regex_search(text.data(), text.data() + text.size(), found->groups, compiled_->regex,
-                                boost::match_not_dot_newline))
+std::optional<FieldRegex::Found> FieldRegex::search(std::string_view text, std::string_view group) const {
+    char const* const first = text.data();
+    char const* const last = first + text.size();
+    Groups groups;
+    if (!boost::regex_search(Decoder(first, first, last), Decoder(last, first, last), groups,
+                             compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
-    return RegexMatch(std::move(found));
+    return Found{piece(groups[0]), groupNamed(groups, group)};
 }
 
-std::optional<RegexMatch> FieldRegex::match(std::string_view text) const {
-    auto found = std::make_unique<RegexMatch::Results>();
-    if (!boost::u32regex_match(text.data(), text.data() + text.size(), found->groups, compiled_->regex,
-                               boost::match_not_dot_newline))
+std::optional<RegexGroups> FieldRegex::match(std::string_view text) const {
+    char const* const first = text.data();
+    char const* const last = first + text.size();
+    auto found = std::make_unique<RegexGroups::Results>();
+    if (!boost::regex_match(Decoder(first, first, last), Decoder(last, first, last), found->groups,
+                            compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
-    return RegexMatch(std::move(found));
+    return RegexGroups(std::move(found));
 }
 
 struct NameRegex::Compiled {

@@ -10,18 +10,17 @@
 
 namespace Cfg {
 
-/// What a FieldRegex found: pieces of the text it ran over, which must outlive this object.
-class RegexMatch {
+/// The groups of a match: pieces of the text that was matched, which must outlive this object.
+class RegexGroups {
 public:
     struct Results;
 
-    explicit RegexMatch(std::unique_ptr<Results const> results);
-    RegexMatch(RegexMatch&& other) noexcept;
-    ~RegexMatch();
+    explicit RegexGroups(std::unique_ptr<Results const> results);
+    RegexGroups(RegexGroups&& other) noexcept;
+    ~RegexGroups();
 
-    std::string_view whole() const;
     /// Nothing when there is no group of that name or when it took no part in the match.
-    std::optional<std::string_view> group(char const* name) const;
+    std::optional<std::string_view> group(std::string_view name) const;
 
 private:
     std::unique_ptr<Results const> results_;
@@ -32,16 +31,22 @@ private:
 /// std::runtime_error when the pattern is too complex for the text.
 class FieldRegex {
 public:
+    /// The whole match, and one of its groups if it took part. Pieces of the text that was searched.
+    struct Found {
+        std::string_view whole;
+        std::optional<std::string_view> group;
+    };
+
     /// Throws boost::regex_error for a bad pattern and std::out_of_range for one that is not UTF-8.
     explicit FieldRegex(std::string_view pattern);
     FieldRegex(FieldRegex const&) = delete;
     FieldRegex& operator=(FieldRegex const&) = delete;
     ~FieldRegex();
 
-    /// The first place where the pattern fits.
-    std::optional<RegexMatch> search(std::string_view text) const;
-    /// The pattern over the whole text.
-    std::optional<RegexMatch> match(std::string_view text) const;
+    /// The first place where the pattern fits, with the group of that name.
+    std::optional<Found> search(std::string_view text, std::string_view group) const;
+    /// The pattern over the whole text, with all groups.
+    std::optional<RegexGroups> match(std::string_view text) const;
 
 private:
     struct Compiled;

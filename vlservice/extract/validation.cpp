@@ -111,7 +111,7 @@ std::optional<int> hourOfDay(int hour, std::string_view ampm) {
 }
 
 /// Groups that are missing leave the midnight of 1 January 1900 as it is.
-std::optional<long long> dateFromGroups(RegexMatch const& match) {
+std::optional<long long> dateFromGroups(RegexGroups const& match) {
     std::tm local{};
     local.tm_mday = 1;
     if (auto const day = match.group("day"))
