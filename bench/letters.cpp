@@ -1,0 +1,91 @@
+// Letters per second out of a batch of 200 PDFs, by one process and by two, beside the time that poppler
+// alone takes to give the same words: what the reader adds to poppler (the aim is 1.25 times its time or
+// less), and what the second core brings (1.8 times the throughput or more).
+#include "programs/reader/document.h"
+#include "programs/vlmail/batch.h"
+#include "programs/vlmail/node_settings.h"
+#include "programs/vlmail/worker_pool.h"
+
+#include <benchmark/benchmark.h>
+
+#include <poppler-document.h>
+#include <poppler-page.h>
+
+#include <filesystem>
+#include <memory>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::size_t DOCUMENTS = 200;
+
+/// The PDFs of an office and its like, over and over.
+std::vector<std::string> const& batch() {
+    static std::vector<std::string> const files = [] {
+        std::vector<std::string> found;
+        for (auto const& entry : fs::recursive_directory_iterator(VLSERVICE_EXAMPLE_LETTERS)) {
+            std::string const ending = entry.path().extension().string();
+            if (ending == ".pdf" || ending == ".PDF")
+                found.push_back(entry.path().string());
+        }
+        std::vector<std::string> repeated;
+        for (std::size_t i = 0; i < DOCUMENTS; ++i)
+            repeated.push_back(found.at(i % found.size()));
+        return repeated;
+    }();
+    return files;
+}
+
+std::string wordsByPopplerAlone(std::string const& file) {
+    // Poppler sets itself up anew for a document while it has no other; that is not what is compared here.
+    static std::unique_ptr<poppler::document> const keptOpen(
+        poppler::document::load_from_file(batch().front()));
+    std::size_t words = 0;
+    std::unique_ptr<poppler::document> const document(poppler::document::load_from_file(file));
+    for (int i = 0; i < document->pages(); ++i) {
+        std::unique_ptr<poppler::page> const page(document->create_page(i));
+        words += page->text_list(poppler::page::text_list_include_font).size();
+    }
+    return std::to_string(words);
+}
+
+/// In worker processes like the reader's, so that both pay for them.
+void popplerAlone(benchmark::State& state) {
+    for (auto _ : state) {
+        VlMail::runJobs(
+            batch().size(), static_cast<std::size_t>(state.range(0)),
+            [](std::size_t index) { return wordsByPopplerAlone(batch()[index]); },
+            [](std::size_t, std::optional<std::string> words) { benchmark::DoNotOptimize(words); });
+    }
+    state.SetItemsProcessed(state.iterations() * static_cast<long long>(batch().size()));
+}
+
+void readLetters(benchmark::State& state) {
+    VlMail::NodeSettings const settings;
+    std::ostringstream nowhere;
+    VlMail::Terminal const terminal{nowhere, nowhere};
+    std::size_t letters = 0;
+    for (auto _ : state) {
+        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), VlMail::Along::Nothing,
+                          terminal, [&](std::size_t, VlMail::ReadResult result) {
+                              letters += result.reading.letters.value().size();
+                          });
+    }
+    state.SetItemsProcessed(static_cast<long long>(letters));
+}
+
+BENCHMARK(popplerAlone)
+    ->Arg(1)
+    ->Arg(2)
+    ->Unit(benchmark::kMillisecond)
+    ->MeasureProcessCPUTime()
+    ->UseRealTime();
+BENCHMARK(readLetters)->Arg(1)->Arg(2)->Unit(benchmark::kMillisecond)->MeasureProcessCPUTime()->UseRealTime();
+
+} // namespace
+
+BENCHMARK_MAIN();
