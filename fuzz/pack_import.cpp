@@ -1,16 +1,14 @@
 // Importing a container from a file that lives in memory: nothing is thrown, and every blob that comes out
 // has the length and the checksum that the index says.
+#include "fuzz/memory_file.h"
 #include "vlservice/pack/pack_wrapper.h"
 #include "vlservice/platform/log.h"
 
-#include <sys/mman.h>
-#include <unistd.h>
 #include <zlib.h>
 
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
-#include <string>
 
 namespace {
 
@@ -18,21 +16,6 @@ void require(bool holds) {
     if (!holds)
         std::abort();
 }
-
-class MemoryFile {
-public:
-    MemoryFile(std::uint8_t const* data, std::size_t size) : number_(::memfd_create("container", 0)) {
-        require(number_ >= 0 && ::write(number_, data, size) == static_cast<ssize_t>(size));
-    }
-    ~MemoryFile() { ::close(number_); }
-    MemoryFile(MemoryFile const&) = delete;
-    MemoryFile& operator=(MemoryFile const&) = delete;
-
-    std::string path() const { return "/proc/self/fd/" + std::to_string(number_); }
-
-private:
-    int number_;
-};
 
 void check(SharedMemBuffer const& blob, PackWrapper::BinEntry const& entry) {
     require(blob.empty() ||
