@@ -52,7 +52,8 @@ std::string_view ByteFile::bytesAt(std::uint64_t position, std::size_t count) {
     if (wanted == 0)
         return {};
     if (position < windowAt_ || position + wanted > windowAt_ + window_.size())
-        moveWindow(position, std::max(wanted, WINDOW));
+        moveWindow(position,
+                   static_cast<std::size_t>(std::min<std::uint64_t>(std::max(wanted, WINDOW), left)));
     // A file that has shrunk meanwhile gives less.
     return std::string_view(window_).substr(static_cast<std::size_t>(position - windowAt_), wanted);
 }
