@@ -97,9 +97,9 @@ TEST_F(ClientCommands, ListsAreShownElementByElement) {
     output({"settings", "set", "/", "profiles", R"(vals=[{"name":"Root's"}])"});
     output({"settings", "set", "a=acme", "profiles", R"(vals=[{"name":"Ours"}])"});
     EXPECT_EQ(output({"settings", "show", "a=acme", "profiles", "--origin"}),
-              "part      setting  value               from\n"
-              "profiles  vals[0]  {\"name\":\"Ours\"}     a=acme\n"
-              "profiles  vals[1]  {\"name\":\"Root's\"}   root\n");
+              "part      setting  value              from\n"
+              "profiles  vals[0]  {\"name\":\"Ours\"}    a=acme\n"
+              "profiles  vals[1]  {\"name\":\"Root's\"}  root\n");
 }
 
 TEST_F(ClientCommands, AllPartsAreShownUnlessSomeAreNamed) {
