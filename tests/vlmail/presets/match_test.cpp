@@ -116,5 +116,5 @@ TEST(MatchCommand, RefusesSettingsThatCannotBeUsed) {
     Ran const ran = runVlMail({"presets", "match", "--settings", file.path(), "a"});
     EXPECT_EQ(ran.status, FAILED);
     EXPECT_EQ(ran.err, "vlmail: cannot use the presets in \"" + file.path() +
-                           "\": JSON error: Wrong type: integer. Expected type: array; correct the file\n");
+                           "\": JSON error: Wrong type: integer. Expected type: array; correct them there\n");
 }
