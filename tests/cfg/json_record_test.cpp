@@ -1,6 +1,6 @@
 #include "vlservice/cfg/json_record.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <cmath>
 #include <cstdint>

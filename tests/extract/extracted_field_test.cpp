@@ -1,6 +1,6 @@
 #include "vlservice/extract/extracted_field.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <cstdlib>
 #include <ctime>

@@ -1,6 +1,6 @@
 #include "vlservice/extract/extracted_fields.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <string>
 #include <utility>

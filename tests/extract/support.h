@@ -1,8 +1,8 @@
 #pragma once
 // What the tests of definitions, zones and presets share.
 
+#include "tests/support/json_helpers.h"
 #include "vlservice/extract/extract_field.h"
-#include "vlservice/platform/json_text.h"
 #include "vlservice/platform/log.h"
 
 #include <gmock/gmock.h>
@@ -15,25 +15,6 @@
 #include <string>
 #include <utility>
 #include <vector>
-
-inline json::Object parse(std::string const& text) { return json::strToObject(text.data(), text.size()); }
-
-/// The value of any JSON text; the empty text is the empty handle.
-inline json::Value valueOf(std::string const& text) {
-    return text.empty() ? json::Value() : parse("{\"v\":" + text + "}").get("v");
-}
-
-inline std::string print(json::Value const& value) {
-    std::ostringstream text;
-    text << value;
-    return text.str();
-}
-
-template<typename Call>
-void expectWrongType(Call call, std::string const& actual, std::string const& wanted) {
-    EXPECT_THAT(call, testing::ThrowsMessage<json::Exc>(testing::StrEq("JSON error: Wrong type: " + actual +
-                                                                       ". Expected type: " + wanted)));
-}
 
 /// The lines that are logged during its life, as "<priority> text".
 class LoggedLines {

@@ -1,5 +1,5 @@
 #include "tests/pack/container_fixture.h"
-#include "tests/pack/sanitized.h"
+#include "tests/support/sanitized.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/page_loader.h"
 #include "vlservice/pack/page_saver.h"
@@ -87,7 +87,7 @@ void limitMemory() {
 [[noreturn]] void exitAs(bool passed) { std::exit(passed ? 0 : 1); }
 
 TEST_F(ZippingBlobs, LogsThatThereIsNoMemory) {
-    if (SANITIZED)
+    if (VLServiceTest::SANITIZED)
         GTEST_SKIP() << "the sanitizer needs more address space than a limit leaves it";
     auto const inChild = [this] {
         limitMemory();
@@ -99,7 +99,7 @@ TEST_F(ZippingBlobs, LogsThatThereIsNoMemory) {
 }
 
 TEST_F(UnzippingBlobs, LogsThatThereIsNoMemory) {
-    if (SANITIZED)
+    if (VLServiceTest::SANITIZED)
         GTEST_SKIP() << "the sanitizer needs more address space than a limit leaves it";
     auto const inChild = [this] {
         limitMemory();

@@ -1,6 +1,6 @@
 #include "vlservice/pack/shared_mem_buffer.h"
 
-#include "tests/pack/sanitized.h"
+#include "tests/support/sanitized.h"
 
 #include <gtest/gtest.h>
 
@@ -86,7 +86,7 @@ TEST(SharedMemBuffers, ReleaseEveryKindOfBlock) {
 }
 
 TEST(SharedMemBuffers, StayAsTheyWereWhenThereIsNoMemory) {
-    if (SANITIZED)
+    if (VLServiceTest::SANITIZED)
         GTEST_SKIP() << "the sanitizer's allocator ends the process instead of throwing";
     SharedMemBuffer buffer = SharedMemBuffer::copyOf("page", 4);
     EXPECT_THROW(buffer.resize(1ull << 62), std::bad_alloc);

@@ -1,6 +1,6 @@
 #include "vlservice/presets/letterhead_inf.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <string>
 #include <utility>

@@ -1,6 +1,6 @@
 #include "vlservice/presets/pack_preset.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <ctime>
 #include <stdexcept>

@@ -2,7 +2,7 @@
 // written.
 #include "vlservice/presets/presets.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <fstream>
 #include <iterator>

@@ -1,6 +1,6 @@
 #include "vlservice/presets/presets.h"
 
-#include "tests/json_helpers.h"
+#include "tests/support/json_helpers.h"
 
 #include <limits>
 #include <stdexcept>
