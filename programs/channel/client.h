@@ -2,6 +2,7 @@
 // The client's side of the connection, for programs that wait for each answer.
 
 #include "programs/channel/error.h"
+#include "programs/channel/tls.h"
 #include "vlservice/platform/cmd.h"
 
 #include <chrono>
@@ -14,12 +15,6 @@
 namespace Channel {
 
 struct ClientSettings {
-    enum class Tls {
-        /// Unless the service's address is a loopback one.
-        Auto,
-        Always
-    };
-
     std::string host;
     std::uint16_t port = 0;
     std::string token;

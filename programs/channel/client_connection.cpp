@@ -92,8 +92,7 @@ void ClientConnection::connectTo(std::vector<tcp::endpoint> endpoints) {
 void ClientConnection::onConnected(tcp::socket socket) {
     socket.set_option(tcp::no_delay(true));
     socket.set_option(asio::socket_base::keep_alive(true));
-    bool const isTls =
-        settings_.tls == ClientSettings::Tls::Always || !isLoopback(socket.remote_endpoint().address());
+    bool const isTls = settings_.tls == Tls::Always || !isLoopback(socket.remote_endpoint().address());
     if (isTls) {
         tls_ = makeClientContext();
         link_ = std::make_shared<Link>(makeTlsStream(std::move(socket), *tls_, TlsRole::Client));

@@ -25,7 +25,12 @@ std::optional<std::string> PinStore::find(std::string const& service) const {
 }
 
 void PinStore::add(std::string const& service, std::string const& fingerprint) const {
-    appendToPrivateFile(file_, service + ' ' + fingerprint + '\n');
+    std::string line = service + ' ' + fingerprint + '\n';
+    // An editor may have left the last line without an end.
+    std::string const lines = ::access(file_.c_str(), F_OK) == 0 ? readPrivateFile(file_) : std::string();
+    if (!lines.empty() && lines.back() != '\n')
+        line.insert(0, 1, '\n');
+    appendToPrivateFile(file_, line);
 }
 
 } // namespace Channel

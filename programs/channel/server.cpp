@@ -43,7 +43,7 @@ tcp::endpoint endpointOf(ServerSettings const& settings) {
 }
 
 std::unique_ptr<asio::ssl::context> tlsFor(tcp::endpoint const& endpoint, ServerSettings const& settings) {
-    if (isLoopback(endpoint.address()))
+    if (settings.tls == Tls::Auto && isLoopback(endpoint.address()))
         return nullptr;
     if (settings.certificateFile.empty() || settings.keyFile.empty())
         throw Error(

@@ -2,6 +2,7 @@
 // The service's side of the connection: it listens, lets in who knows the access token, and hands over
 // commands.
 
+#include "programs/channel/tls.h"
 #include "vlservice/platform/cmd.h"
 
 #include <chrono>
@@ -18,12 +19,13 @@ class io_context;
 namespace Channel {
 
 struct ServerSettings {
-    /// An IP address. Any but a loopback address wants the certificate and its key, and speaks TLS alone.
+    /// An IP address.
     std::string address = "127.0.0.1";
     /// 0 takes a free port.
     std::uint16_t port = 0;
     std::string token;
-    /// PEM files. The key's must be private.
+    Tls tls = Tls::Auto;
+    /// PEM files that TLS wants. The key's must be private.
     std::string certificateFile;
     std::string keyFile;
 

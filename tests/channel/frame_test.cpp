@@ -1,0 +1,223 @@
+// Frames: what is written, what is read, and what is refused.
+
+#include "programs/channel/frame.h"
+
+#include "tests/support/format_document.h"
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <vector>
+
+using namespace testing;
+using namespace std::string_literals;
+using Channel::Frame;
+using Channel::FrameDecoder;
+using Channel::Kind;
+
+namespace {
+
+struct Owned {
+    int command;
+    Kind kind;
+    std::uint32_t sequence;
+    std::string text;
+    friend bool operator==(Owned const&, Owned const&) = default;
+};
+
+std::string bytesOf(std::vector<Owned> const& messages) {
+    std::string bytes = Channel::preface();
+    for (Owned const& m : messages)
+        Channel::appendFrame(bytes, {static_cast<std::uint8_t>(m.command), m.kind, m.sequence, m.text});
+    return bytes;
+}
+
+void feed(FrameDecoder& decoder, std::string_view bytes) {
+    while (!bytes.empty()) {
+        auto const room = decoder.room();
+        std::size_t const size = std::min(room.size(), bytes.size());
+        std::copy_n(bytes.begin(), size, room.begin());
+        decoder.commit(size);
+        bytes.remove_prefix(size);
+    }
+}
+
+std::vector<Owned> takeAll(FrameDecoder& decoder) {
+    std::vector<Owned> messages;
+    while (auto const frame = decoder.next())
+        messages.push_back({frame->command, frame->kind, frame->sequence, std::string(frame->text)});
+    return messages;
+}
+
+/// Why these bytes are refused; empty when they are not.
+std::string refusalOf(std::string_view bytes) {
+    FrameDecoder decoder;
+    try {
+        feed(decoder, bytes);
+        takeAll(decoder);
+    } catch (Channel::Error const& e) {
+        return e.what();
+    }
+    return {};
+}
+
+// --- writing
+
+TEST(Frames, BeginWithMagicAndVersion) { EXPECT_EQ(Channel::preface(), "VLCH\0\1"s); }
+
+TEST(Frames, AreAHeaderInNetworkOrderAndTheText) {
+    std::string bytes;
+    Channel::appendFrame(bytes, {25, Kind::Response, 0x01020304, "{}"});
+    EXPECT_EQ(bytes, "\x19\x02\x01\x02\x03\x04\x00\x00\x00\x02{}"s);
+}
+
+TEST(Frames, AreNotWrittenOverTheLimit) {
+    std::string bytes;
+    std::string const tooLong(Channel::MAX_TEXT + 1, ' ');
+    try {
+        Channel::appendFrame(bytes, {1, Kind::Request, 1, tooLong});
+        FAIL() << "nothing was thrown";
+    } catch (Channel::Error const& e) {
+        EXPECT_STREQ(e.what(), "A message of 16777217 bytes is over the limit of 16777216.");
+    }
+    EXPECT_EQ(bytes, "");
+}
+
+// --- reading
+
+std::vector<Owned> const THREE = {{25, Kind::Request, 2, R"({"id":"p"})"},
+                                  {0, Kind::Error, 0xffffffff, ""},
+                                  {255, Kind::Response, 3, "{}"}};
+
+TEST(Frames, ReadBackAsTheyWereWritten) {
+    FrameDecoder decoder;
+    feed(decoder, bytesOf(THREE));
+    EXPECT_EQ(takeAll(decoder), THREE);
+    EXPECT_FALSE(decoder.isInside());
+}
+
+TEST(Frames, ReadTheSameInTwoPiecesCutAnywhere) {
+    std::string const bytes = bytesOf(THREE);
+    for (std::size_t cut = 0; cut <= bytes.size(); ++cut) {
+        FrameDecoder decoder;
+        feed(decoder, bytes.substr(0, cut));
+        auto messages = takeAll(decoder);
+        feed(decoder, bytes.substr(cut));
+        for (Owned const& message : takeAll(decoder))
+            messages.push_back(message);
+        EXPECT_EQ(messages, THREE) << "cut at " << cut;
+    }
+}
+
+TEST(Frames, ReadTheSameByteByByte) {
+    FrameDecoder decoder;
+    std::vector<Owned> messages;
+    for (char const byte : bytesOf(THREE)) {
+        feed(decoder, std::string(1, byte));
+        for (Owned const& message : takeAll(decoder))
+            messages.push_back(message);
+    }
+    EXPECT_EQ(messages, THREE);
+}
+
+TEST(Frames, ThatAreTruncatedAnywhereGiveTheMessagesBeforeAndAnUnfinishedOne) {
+    std::string const bytes = bytesOf(THREE);
+    std::vector<std::size_t> ends = {Channel::PREFACE_SIZE};
+    for (Owned const& message : THREE)
+        ends.push_back(ends.back() + Channel::HEADER_SIZE + message.text.size());
+    for (std::size_t length = 0; length < bytes.size(); ++length) {
+        FrameDecoder decoder;
+        feed(decoder, bytes.substr(0, length));
+        auto const complete = static_cast<std::size_t>(
+            std::count_if(ends.begin() + 1, ends.end(), [&](std::size_t end) { return end <= length; }));
+        EXPECT_EQ(takeAll(decoder).size(), complete) << length;
+        bool const isAtAnEnd = length == 0 || std::find(ends.begin(), ends.end(), length) != ends.end();
+        EXPECT_EQ(decoder.isInside(), !isAtAnEnd) << length;
+    }
+}
+
+TEST(Frames, MayBeAsLongAsTheLimit) {
+    FrameDecoder decoder;
+    std::vector<Owned> const longest = {{1, Kind::Request, 1, std::string(Channel::MAX_TEXT, 'x')}};
+    feed(decoder, bytesOf(longest));
+    EXPECT_EQ(takeAll(decoder), longest);
+}
+
+TEST(Frames, AnnounceTheirSize) {
+    FrameDecoder decoder;
+    std::string const bytes = bytesOf({{1, Kind::Request, 1, std::string(100, 'x')}});
+    feed(decoder, bytes.substr(0, Channel::PREFACE_SIZE + Channel::HEADER_SIZE - 1));
+    EXPECT_EQ(decoder.next(), std::nullopt);
+    EXPECT_EQ(decoder.announced(), 0u);
+    feed(decoder, bytes.substr(Channel::PREFACE_SIZE + Channel::HEADER_SIZE - 1, 1));
+    EXPECT_EQ(decoder.next(), std::nullopt);
+    EXPECT_EQ(decoder.announced(), Channel::HEADER_SIZE + 100);
+}
+
+TEST(Frames, AllocateNothingForWhatIsOnlyAnnounced) {
+    FrameDecoder decoder;
+    feed(decoder, bytesOf({{1, Kind::Request, 1, std::string(Channel::MAX_TEXT, 'x')}}).substr(0, 100));
+    EXPECT_EQ(decoder.next(), std::nullopt);
+    EXPECT_LE(decoder.room().size(), 64u * 1024);
+}
+
+// --- refusing
+
+struct Refused {
+    char const* name;
+    std::string bytes;
+    char const* reason;
+};
+
+constexpr auto OTHER_PROTOCOL = "The first bytes are not those of this protocol.";
+
+class RefusedFrames : public TestWithParam<Refused> {};
+
+TEST_P(RefusedFrames, NameTheReason) { EXPECT_EQ(refusalOf(GetParam().bytes), GetParam().reason); }
+
+INSTANTIATE_TEST_SUITE_P(
+    Bytes, RefusedFrames,
+    Values(Refused{"FirstByteOfTheMagic", "X", OTHER_PROTOCOL},
+           Refused{"LastByteOfTheMagic", "VLCX", OTHER_PROTOCOL},
+           Refused{"AWebBrowser", "GET / HTTP/1.1\r\n\r\n", OTHER_PROTOCOL},
+           Refused{"ATlsClient", "\x16\x03\x01\x02\x00"s, OTHER_PROTOCOL},
+           Refused{"TheNextVersion", "VLCH\0\2"s,
+                   "Version 2 of the protocol is not spoken here, only version 1."},
+           Refused{"VersionInTheOtherOrder", "VLCH\1\0"s,
+                   "Version 256 of the protocol is not spoken here, only version 1."},
+           Refused{"KindZero", "VLCH\0\1\x19\0\0\0\0\2\0\0\0\0"s, "There is no message of kind 0."},
+           Refused{"KindFour", "VLCH\0\1\x19\4\0\0\0\2\0\0\0\0"s, "There is no message of kind 4."},
+           Refused{"OneByteOverTheLimit", "VLCH\0\1\x19\1\0\0\0\2\1\0\0\1"s,
+                   "A message of 16777217 bytes is over the limit of 16777216."},
+           Refused{"TheGreatestLength", "VLCH\0\1\x19\1\0\0\0\2\xff\xff\xff\xff"s,
+                   "A message of 4294967295 bytes is over the limit of 16777216."}),
+    [](auto const& instance) { return instance.param.name; });
+
+TEST(Frames, KeepToALowerLimit) {
+    FrameDecoder decoder;
+    decoder.limitText(99);
+    feed(decoder, bytesOf({{1, Kind::Request, 1, std::string(100, 'x')}}));
+    EXPECT_THROW(decoder.next(), Channel::Error);
+}
+
+// --- the description
+
+std::string block(std::string const& name) {
+    return VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "hexdump " + name);
+}
+
+TEST(FrameDescription, ShowsARequestBehindThePreface) {
+    EXPECT_EQ(block("request"), VLServiceTest::hexDump(bytesOf(
+                                    {{20, Kind::Request, 2, R"({"db_host":"db","db_name":"packs"})"}})));
+}
+
+TEST(FrameDescription, ShowsItsAnswers) {
+    std::string response;
+    Channel::appendFrame(response, {20, Kind::Response, 2, "{}"});
+    EXPECT_EQ(block("response"), VLServiceTest::hexDump(response));
+    std::string error;
+    Channel::appendFrame(error, {20, Kind::Error, 2, R"({"err":"The database is away."})"});
+    EXPECT_EQ(block("error"), VLServiceTest::hexDump(error));
+}
+
+} // namespace

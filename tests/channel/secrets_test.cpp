@@ -1,0 +1,228 @@
+// Tokens, proofs, accepted certificates and the files that they lie in.
+
+#include "programs/channel/error.h"
+#include "programs/channel/pin_store.h"
+#include "programs/channel/private_file.h"
+#include "programs/channel/token.h"
+
+#include "tests/support/format_document.h"
+#include "tests/support/json_literal.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+
+using namespace testing;
+using namespace Channel;
+using VLServiceTest::messageOf;
+namespace fs = std::filesystem;
+
+namespace {
+
+std::string const TOKEN = "0123456789abcdef0123456789abcdef";
+
+class PrivateFiles : public Test {
+protected:
+    fs::path const folder = fs::temp_directory_path() / ("channel_secrets_" + std::to_string(::getpid()));
+    std::string const file = (folder / "secret").string();
+
+    PrivateFiles() {
+        fs::remove_all(folder);
+        fs::create_directory(folder);
+    }
+    ~PrivateFiles() override { fs::remove_all(folder); }
+
+    void write(std::string const& contents, mode_t mode = 0600) const {
+        std::ofstream(file) << contents;
+        ::chmod(file.c_str(), mode);
+    }
+    mode_t mode() const {
+        struct stat status {};
+        ::stat(file.c_str(), &status);
+        return status.st_mode & 07777;
+    }
+};
+
+// --- files
+
+TEST_F(PrivateFiles, AreRead) {
+    for (mode_t const mode : {0600, 0400, 0700}) {
+        write("text\n", mode);
+        EXPECT_EQ(readPrivateFile(file), "text\n");
+    }
+}
+
+struct Open {
+    mode_t mode;
+    char const* text;
+};
+
+TEST_F(PrivateFiles, AreRefusedWhenTheyAreOpenToOthersInAnyWay) {
+    for (auto const& [mode, text] : {Open{0644, "0644"}, Open{0660, "0660"}, Open{0604, "0604"},
+                                     Open{0602, "0602"}, Open{0610, "0610"}, Open{04640, "4640"}}) {
+        write("text", mode);
+        EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }), "The file \"" + file +
+                                                                        "\" is open to others (mode " + text +
+                                                                        "); make it private with chmod 600.");
+    }
+}
+
+TEST_F(PrivateFiles, AreRefusedWhenTheyAreNoFiles) {
+    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(folder.string()); }),
+              '"' + folder.string() + "\" is not a file.");
+    ::mkfifo(file.c_str(), 0600);
+    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }), '"' + file + "\" is not a file.");
+}
+
+TEST_F(PrivateFiles, AreRefusedWhenTheyAreAnotherUsers) {
+    write("text");
+    if (::chown(file.c_str(), 12345, 12345) != 0)
+        GTEST_SKIP() << "There is no right to give files to another user.";
+    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }),
+              "The file \"" + file + "\" belongs to another user.");
+}
+
+TEST_F(PrivateFiles, MustBeThere) {
+    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }),
+              "Cannot open \"" + file + "\": No such file or directory.");
+}
+
+TEST_F(PrivateFiles, HaveALimit) {
+    write("12345");
+    EXPECT_EQ(readPrivateFile(file, 5), "12345");
+    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file, 4); }),
+              "The file \"" + file + "\" is larger than 4 bytes.");
+}
+
+TEST_F(PrivateFiles, AreMadePrivateWhateverTheMask) {
+    mode_t const before = ::umask(0);
+    EXPECT_TRUE(createPrivateFile(file, "text"));
+    ::umask(before);
+    EXPECT_EQ(mode(), 0600u);
+    EXPECT_EQ(readPrivateFile(file), "text");
+}
+
+TEST_F(PrivateFiles, AreNotReplaced) {
+    write("old");
+    EXPECT_FALSE(createPrivateFile(file, "new"));
+    EXPECT_EQ(readPrivateFile(file), "old");
+    EXPECT_EQ(std::distance(fs::directory_iterator(folder), {}), 1) << "nothing else is left in the folder";
+}
+
+TEST_F(PrivateFiles, CannotBeMadeWhereThereIsNoFolder) {
+    std::string const lost = (folder / "no" / "secret").string();
+    EXPECT_EQ(messageOf<Error>([&] { createPrivateFile(lost, "x"); }),
+              "Cannot create \"" + lost + "\": No such file or directory.");
+}
+
+TEST_F(PrivateFiles, GrowAtTheirEnd) {
+    appendToPrivateFile(file, "a\n");
+    appendToPrivateFile(file, "b\n");
+    EXPECT_EQ(readPrivateFile(file), "a\nb\n");
+    EXPECT_EQ(mode(), 0600u);
+    write("a\n", 0644);
+    EXPECT_THAT(messageOf<Error>([&] { appendToPrivateFile(file, "b\n"); }), HasSubstr("is open to others"));
+}
+
+// --- the token
+
+TEST_F(PrivateFiles, HoldATokenWithoutTheWhiteSpaceAroundIt) {
+    write("  " + TOKEN + "\r\n");
+    EXPECT_EQ(readToken(file), TOKEN);
+}
+
+TEST_F(PrivateFiles, HoldNoTokenThatIsShortOrNoWord) {
+    std::string const refusal =
+        "The file \"" + file + "\" holds no access token, which is one word of at least 32 characters.";
+    for (std::string const& contents : {std::string(), std::string("\n"), TOKEN.substr(1),
+                                        TOKEN + " " + TOKEN, TOKEN + "\xc3\xa9", std::string(32, '\0')}) {
+        write(contents);
+        EXPECT_EQ(messageOf<Error>([&] { readToken(file); }), refusal) << contents;
+    }
+}
+
+TEST_F(PrivateFiles, GetANewTokenWhenThereIsNone) {
+    std::string const token = readOrCreateToken(file);
+    EXPECT_THAT(token, MatchesRegex("[0-9a-f]{64}"));
+    EXPECT_EQ(mode(), 0600u);
+    EXPECT_EQ(readOrCreateToken(file), token);
+    EXPECT_EQ(readToken(file), token);
+    fs::remove(file);
+    EXPECT_NE(readOrCreateToken(file), token);
+}
+
+TEST_F(PrivateFiles, KeepATokenThatOthersCanReadFromBeingUsed) {
+    write(TOKEN, 0640);
+    EXPECT_THAT(messageOf<Error>([&] { readOrCreateToken(file); }), HasSubstr("is open to others"));
+}
+
+// --- proofs
+
+TEST(Proofs, AreTheDescribedOnes) {
+    std::string const client(64, '0');
+    std::string const service(64, 'f');
+    EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proofs"),
+              "P = " + makeProof(Side::Service, TOKEN, client, service, "") +
+                  "\nQ = " + makeProof(Side::Client, TOKEN, client, service, "") + '\n');
+}
+
+TEST(Proofs, DependOnEverythingThatTheyProve) {
+    std::vector<std::string> const proofs = {
+        makeProof(Side::Client, TOKEN, "c", "s", "f"),       makeProof(Side::Service, TOKEN, "c", "s", "f"),
+        makeProof(Side::Client, TOKEN + "x", "c", "s", "f"), makeProof(Side::Client, TOKEN, "d", "s", "f"),
+        makeProof(Side::Client, TOKEN, "c", "t", "f"),       makeProof(Side::Client, TOKEN, "c", "s", "g"),
+        makeProof(Side::Client, TOKEN, "cs", "", "f"),       makeProof(Side::Client, TOKEN, "", "cs", "f"),
+        makeProof(Side::Client, TOKEN, "c", "s", ""),
+    };
+    for (std::size_t i = 0; i < proofs.size(); ++i)
+        for (std::size_t j = 0; j < proofs.size(); ++j)
+            EXPECT_EQ(isSameProof(proofs[i], proofs[j]), i == j) << i << ' ' << j;
+}
+
+TEST(Proofs, DifferInLengthOrInAnyCharacter) {
+    EXPECT_TRUE(isSameProof("", ""));
+    EXPECT_FALSE(isSameProof("abc", "ab"));
+    EXPECT_FALSE(isSameProof("abc", "abd"));
+    EXPECT_FALSE(isSameProof("abc", "xbc"));
+}
+
+TEST(Nonces, AreNewEachTime) {
+    EXPECT_THAT(makeNonce(), MatchesRegex("[0-9a-f]{64}"));
+    EXPECT_NE(makeNonce(), makeNonce());
+}
+
+// --- accepted certificates
+
+TEST_F(PrivateFiles, KeepAcceptedCertificatesByService) {
+    PinStore const pins(file);
+    EXPECT_EQ(pins.find("a:1"), std::nullopt);
+    pins.add("a:1", "AA:BB");
+    pins.add("b:1", "CC:DD");
+    EXPECT_EQ(pins.find("a:1"), "AA:BB");
+    EXPECT_EQ(pins.find("b:1"), "CC:DD");
+    EXPECT_EQ(pins.find("a:11"), std::nullopt);
+    EXPECT_EQ(pins.find(":1"), std::nullopt);
+    EXPECT_EQ(mode(), 0600u);
+    EXPECT_EQ(readPrivateFile(file), "a:1 AA:BB\nb:1 CC:DD\n");
+}
+
+TEST_F(PrivateFiles, LetLinesBeAddedAndRemovedByHand) {
+    write("\n# of the office\nhalf\n  a:1\t AA:BB  rest\nb:1 CC:DD");
+    EXPECT_EQ(PinStore(file).find("a:1"), "AA:BB");
+    EXPECT_EQ(PinStore(file).find("b:1"), "CC:DD");
+    EXPECT_EQ(PinStore(file).find("half"), std::nullopt);
+    PinStore(file).add("c:1", "EE:FF");
+    EXPECT_EQ(PinStore(file).find("b:1"), "CC:DD");
+    EXPECT_EQ(PinStore(file).find("c:1"), "EE:FF");
+}
+
+TEST_F(PrivateFiles, KeepNoCertificatesThatOthersCouldHaveWritten) {
+    write("a:1 AA:BB\n", 0666);
+    EXPECT_THAT(messageOf<Error>([&] { PinStore(file).find("a:1"); }), HasSubstr("is open to others"));
+}
+
+} // namespace
