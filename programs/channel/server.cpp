@@ -46,9 +46,8 @@ std::unique_ptr<asio::ssl::context> tlsFor(tcp::endpoint const& endpoint, Server
     if (settings.tls == Tls::Auto && isLoopback(endpoint.address()))
         return nullptr;
     if (settings.certificateFile.empty() || settings.keyFile.empty())
-        throw Error(
-            "Listening on " + settings.address +
-            " needs a certificate and its private key; without them only a loopback address will do.");
+        throw Error("TLS on " + settings.address +
+                    " needs a certificate and its private key; only a loopback address can do without TLS.");
     return makeServiceContext(settings.certificateFile, settings.keyFile);
 }
 

@@ -12,7 +12,10 @@
 #include <openssl/ssl.h>
 #include <openssl/x509.h>
 
+#include <unistd.h>
+
 #include <array>
+#include <cerrno>
 
 namespace Channel {
 
@@ -112,7 +115,11 @@ std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateF
                                                  std::string const& keyFile) {
     auto context = makeContext(ssl::context::tls_server);
     error_code ec;
-    context->use_certificate_chain_file(certificateFile, ec);
+    // The library's own reading does not tell why a file cannot be read.
+    if (::access(certificateFile.c_str(), R_OK) != 0)
+        ec.assign(errno, boost::system::system_category());
+    else
+        context->use_certificate_chain_file(certificateFile, ec);
     orThrow(ec, "certificate", certificateFile);
     // A key with a password is refused instead of asking on the terminal.
     context->set_password_callback([](std::size_t, ssl::context::password_purpose) { return std::string(); });

@@ -106,10 +106,23 @@ std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std
     return bytes;
 }
 
+namespace {
+
+void setPatience(asio::ip::tcp::socket& socket) {
+    timeval const patience{std::chrono::seconds(PATIENCE).count(), 0};
+    ::setsockopt(socket.native_handle(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+}
+
+} // namespace
+
 RawPeer::RawPeer(std::uint16_t port) : socket_(io_) {
     socket_.connect({asio::ip::address_v4::loopback(), port});
-    timeval const patience{std::chrono::seconds(PATIENCE).count(), 0};
-    ::setsockopt(socket_.native_handle(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+    setPatience(socket_);
+}
+
+RawPeer::RawPeer(asio::ip::tcp::acceptor& acceptor) : socket_(io_) {
+    acceptor.accept(socket_);
+    setPatience(socket_);
 }
 
 void RawPeer::send(std::string const& bytes) { asio::write(socket_, asio::buffer(bytes)); }
@@ -119,6 +132,18 @@ void RawPeer::send(int command, Channel::Kind kind, std::uint32_t sequence, std:
 }
 
 void RawPeer::finish() { socket_.shutdown(asio::ip::tcp::socket::shutdown_send); }
+
+void RawPeer::welcome() {
+    std::string const nonce = Channel::makeNonce();
+    auto const challenge = receive();
+    std::string const clientNonce = Channel::parse(challenge.value().text).get(Channel::NONCE).toString();
+    std::string const proof = Channel::makeProof(Channel::Side::Service, TOKEN, clientNonce, nonce, "");
+    send(Channel::preface());
+    send(Channel::GREETING, Channel::Kind::Response, Channel::CHALLENGE,
+         Channel::print({{Channel::NONCE, nonce}, {Channel::PROOF, proof}}));
+    receive().value();
+    send(Channel::GREETING, Channel::Kind::Response, Channel::PROVING, "{}");
+}
 
 std::optional<Message> RawPeer::receive() {
     for (;;) {
@@ -158,6 +183,33 @@ std::string RawPeer::refusal() {
     return isClosed() ? Channel::reasonOf(message->text) : "not closed: " + message->text;
 }
 
+void RawPeer::vanish() {
+    socket_.set_option(asio::socket_base::linger(true, 0));
+    socket_.close();
+}
+
 bool RawPeer::isClosed() { return !receive(); }
+
+// --- FakeService
+
+FakeService::FakeService(std::function<void(RawPeer&)> script)
+    : acceptor_(io_, {asio::ip::address_v4::loopback(), 0}), thread_([this, script = std::move(script)] {
+          RawPeer peer(acceptor_);
+          script(peer);
+      }) {}
+
+FakeService::~FakeService() { thread_.join(); }
+
+Channel::ClientSettings FakeService::clientSettings() const {
+    Channel::ClientSettings settings;
+    settings.host = "127.0.0.1";
+    settings.port = acceptor_.local_endpoint().port();
+    settings.token = TOKEN;
+    return settings;
+}
+
+std::string FakeService::name() const {
+    return "127.0.0.1:" + std::to_string(acceptor_.local_endpoint().port());
+}
 
 } // namespace ChannelTest

@@ -6,6 +6,7 @@
 #include "programs/channel/frame.h"
 #include "programs/channel/server.h"
 #include "tests/ipc/recording_processor.h"
+#include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/ipc/price_est.h"
 #include "vlservice/ipc/remove_cfg_node.h"
 #include "vlservice/platform/log.h"
@@ -103,29 +104,52 @@ struct Message {
     std::string text;
 };
 
-/// A client that may send whatever it likes. It waits ten seconds at the most for anything.
+/// One end of a connection that may send whatever it likes. It waits ten seconds at the most for anything.
 class RawPeer {
 public:
+    /// A client.
     explicit RawPeer(std::uint16_t port);
+    /// A service's end.
+    explicit RawPeer(boost::asio::ip::tcp::acceptor& acceptor);
 
     void send(std::string const& bytes);
     void send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
     /// Says that nothing more will come.
     void finish();
-    /// The preface and the exchange of proofs.
+    /// The preface and the exchange of proofs, as a client and as a service.
     void greet();
-    /// The next message; none when the service has closed the connection.
+    void welcome();
+    /// The next message; none when the other side has closed the connection.
     std::optional<Message> receive();
     /// The reason in the error message that comes next, and that the connection is closed behind it.
     std::string refusal();
     bool isClosed();
 
-    boost::asio::ip::tcp::socket& socket() { return socket_; }
+    /// Closes with a reset instead of an orderly end.
+    void vanish();
 
 private:
     boost::asio::io_context io_;
     boost::asio::ip::tcp::socket socket_;
     Channel::FrameDecoder decoder_;
+};
+
+/// A service that does what the test says with the one connection that it accepts, on a thread of its own.
+class FakeService {
+public:
+    explicit FakeService(std::function<void(RawPeer&)> script);
+    ~FakeService();
+    FakeService(FakeService const&) = delete;
+    FakeService& operator=(FakeService const&) = delete;
+
+    Channel::ClientSettings clientSettings() const;
+    /// What its messages begin with.
+    std::string name() const;
+
+private:
+    boost::asio::io_context io_;
+    boost::asio::ip::tcp::acceptor acceptor_;
+    std::thread thread_;
 };
 
 /// The bytes of a message.
