@@ -99,7 +99,7 @@ void ClientConnection::onConnected(tcp::socket socket) {
     } else {
         link_ = std::make_shared<Link>(makePlainStream(std::move(socket)));
     }
-    link_->stream().handshake([self = shared_from_this()](error_code const& ec) {
+    link_->handshake([self = shared_from_this()](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
         if (ec)
@@ -110,7 +110,7 @@ void ClientConnection::onConnected(tcp::socket socket) {
 
 void ClientConnection::onHandshake() {
     if (tls_) {
-        fingerprint_ = link_->stream().fingerprint();
+        fingerprint_ = link_->fingerprint();
         requirePinned();
     }
     challenge();

@@ -21,6 +21,11 @@ bool isEnd(error_code const& ec) {
 
 } // namespace
 
+void Link::handshake(Stream::Done done) {
+    stream_->handshake(
+        [self = shared_from_this(), done = std::move(done)](error_code const& ec) { done(ec); });
+}
+
 void Link::receive(std::function<void(Received const&)> done) {
     std::optional<Received> received;
     try {

@@ -38,7 +38,8 @@ public:
 
     explicit Link(std::unique_ptr<Stream> stream) : stream_(std::move(stream)) {}
 
-    Stream& stream() { return *stream_; }
+    void handshake(Stream::Done done);
+    std::string fingerprint() const { return stream_->fingerprint(); }
 
     void limitText(std::uint32_t limit) { decoder_.limitText(limit); }
     /// How large a message may be before it is reported as large.

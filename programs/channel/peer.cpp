@@ -117,7 +117,7 @@ void Peer::onFirstByte(error_code const& waited) {
 }
 
 void Peer::shakeHands() {
-    link_->stream().handshake([self = shared_from_this()](error_code const& ec) {
+    link_->handshake([self = shared_from_this()](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
         if (ec) {

@@ -18,8 +18,8 @@ namespace Channel {
 using boost::asio::ip::tcp;
 using boost::system::error_code;
 
-/// One read and one write may be under way. What is read into and written from belongs to the caller until
-/// the operation has ended; closing ends all.
+/// One read and one write may be under way. The stream, and what is read into and written from, must live
+/// until their functions have been called; closing the socket ends them.
 class Stream {
 public:
     using Done = std::function<void(error_code const&)>;
