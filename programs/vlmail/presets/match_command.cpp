@@ -157,7 +157,7 @@ void print(std::ostream& out, Found const& found) {
 
 int match(Options const& options, Terminal const& terminal) {
     bool const hasSettings = !options.settings.empty();
-    NodeSettings const settings = hasSettings ? NodeSettings::fromFile(options.settings) : NodeSettings();
+    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Finder const finder(settings, hasSettings ? Reader::readFile(options.settings) : "{}");
     int status = FINE;
     for (std::string const& name : options.names) {
