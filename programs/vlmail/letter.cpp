@@ -1,6 +1,7 @@
 // vlmail letter: what the settings make of each document, for a person or as JSON.
 #include "programs/vlmail/batch.h"
 #include "programs/vlmail/command.h"
+#include "programs/vlmail/explain/explain_text.h"
 #include "programs/vlmail/field_words.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/outcome.h"
@@ -24,6 +25,7 @@ struct Options {
     std::string settings;
     std::string report;
     bool json = false;
+    bool explain = false;
     std::size_t jobs = processorCount();
 };
 
@@ -63,16 +65,28 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         out << "    missing, although obligatory: " << name << '\n';
 }
 
-void print(std::ostream& out, DocumentReading const& reading) {
+void printLetters(std::ostream& out, DocumentReading const& reading) {
     out << reading.document << '\n'
         << "  read by the preset for  " << reading.extractPreset << '\n'
         << "  sent by the pack preset " << reading.packPreset << '\n';
     if (reading.isAttachment()) {
-        out << "  an attachment: it holds no letters\n\n";
+        out << "  an attachment: it holds no letters\n";
         return;
     }
     for (std::size_t i = 0; i < reading.letters->size(); ++i)
         print(out, (*reading.letters)[i], i + 1, reading.letters->size());
+}
+
+/// The answer, then the evidence. Of a document that failed there may be evidence alone.
+void print(std::ostream& out, DocumentReading const& reading) {
+    if (reading.failed() && !reading.trace)
+        return;
+    if (reading.failed())
+        out << reading.document << '\n';
+    else
+        printLetters(out, reading);
+    if (reading.trace)
+        printExplanation(out, reading.trace.toObject());
     out << '\n';
 }
 
@@ -82,19 +96,20 @@ int showLetters(Options const& options, Terminal const& terminal) {
     std::optional<Report::File> report;
     if (!options.report.empty())
         report.emplace(options.report);
-    readBatch(options.files, settings, options.jobs, report ? Along::Report : Along::Nothing, terminal,
-              [&](std::size_t, ReadResult result) {
-                  DocumentReading const& reading = result.reading;
-                  outcome.count(reading);
-                  if (options.json)
-                      terminal.out << reading.toJson() << std::endl;
-                  else if (!reading.failed())
-                      print(terminal.out, reading);
-                  if (reading.failed())
-                      terminal.complain(reading.error);
-                  if (report)
-                      report->take(result);
-              });
+    Along const along =
+        (report ? Along::Report : Along::Nothing) | (options.explain ? Along::Trace : Along::Nothing);
+    readBatch(options.files, settings, options.jobs, along, terminal, [&](std::size_t, ReadResult result) {
+        DocumentReading const& reading = result.reading;
+        outcome.count(reading);
+        if (options.json)
+            terminal.out << reading.toJson() << std::endl;
+        else
+            print(terminal.out, reading);
+        if (reading.failed())
+            terminal.complain(reading.error);
+        if (report)
+            report->take(result);
+    });
     if (report)
         report->write(outcome);
     if (!options.json && options.files.size() > 1)
@@ -111,6 +126,8 @@ void addLetterCommand(CLI::App& app, Task& task) {
     letter->add_option("FILE", options->files, "PDF or text documents")->required();
     letter->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
     letter->add_flag("--json", options->json, "One JSON object a document, each on a line");
+    letter->add_flag("--explain", options->explain,
+                     "Tells how each field came about, and why one was not found; with --json as \"trace\"");
     letter->add_option("--report", options->report,
                        "Writes an HTML page with the pages' pictures and what was found where");
     letter->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);

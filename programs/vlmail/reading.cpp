@@ -4,6 +4,7 @@
 #include "programs/reader/letters.h"
 #include "programs/vlmail/command.h"
 #include "programs/vlmail/digest.h"
+#include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/node_settings.h"
 #include "programs/vlmail/report/describe.h"
 #include "programs/vlmail/utf8.h"
@@ -28,6 +29,7 @@ constexpr char const* READY_KEY = "production_ready";
 constexpr char const* MESSAGE_KEY = "message";
 constexpr char const* MISSING_KEY = "missing";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
+constexpr char const* TRACE_KEY = "trace";
 
 json::Value nameOrNull(Cfg::ExtractedField const* field) {
     return field ? json::Value(field->name()) : json::Value(json_null());
@@ -48,6 +50,13 @@ json::Object toJson(LetterReading const& letter) {
         missing.append(name);
     object.set(MISSING_KEY, missing);
     return object;
+}
+
+json::Value lettersToJson(std::vector<LetterReading> const& letters) {
+    json::Array array;
+    for (LetterReading const& letter : letters)
+        array.append(toJson(letter));
+    return array;
 }
 
 LetterReading letterFrom(json::Object const& object) {
@@ -101,6 +110,13 @@ std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPre
     return letters;
 }
 
+void addPages(json::Value& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
+              Reader::Trace const& trace) {
+    json::Object object = explanation.toObject();
+    explainPages(object, document, preset, trace);
+    explanation = object;
+}
+
 std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& letter) {
     std::vector<PageBlob> blobs;
     if (!letter.whyNot().empty())
@@ -145,25 +161,24 @@ std::string LetterReading::whyNot() const {
 }
 
 json::Object DocumentReading::toJson() const {
-    if (failed())
-        return {{DOCUMENT_KEY, document}, {ERROR_KEY, error}};
-    json::Value all(json_null());
-    if (letters) {
-        json::Array array;
-        for (LetterReading const& letter : *letters)
-            array.append(VlMail::toJson(letter));
-        all = array;
+    json::Object object{{DOCUMENT_KEY, document}};
+    if (failed()) {
+        object.set(ERROR_KEY, error);
+    } else {
+        object.set(EXTRACT_PRESET_KEY, extractPreset);
+        object.set(PACK_PRESET_KEY, packPreset);
+        object.set(LETTERS_KEY, letters ? lettersToJson(*letters) : json::Value(json_null()));
     }
-    return {{DOCUMENT_KEY, document},
-            {EXTRACT_PRESET_KEY, extractPreset},
-            {PACK_PRESET_KEY, packPreset},
-            {LETTERS_KEY, all}};
+    if (trace)
+        object.set(TRACE_KEY, trace);
+    return object;
 }
 
 DocumentReading DocumentReading::fromJson(json::Object const& object) {
     DocumentReading reading;
     reading.document = object.get(DOCUMENT_KEY).toString();
     reading.error = object.get(ERROR_KEY).textOrEmpty();
+    reading.trace = object.get(TRACE_KEY);
     if (reading.failed())
         return reading;
     reading.extractPreset = object.get(EXTRACT_PRESET_KEY).toString();
@@ -183,6 +198,8 @@ ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeS
     DocumentReading& reading = result.reading;
     reading.document = file.filename().string();
     try {
+        if (contains(along, Along::Trace))
+            reading.trace = explainPresets(presets, reading.document);
         std::string bytes = Reader::readFile(file);
         result.sha256 = sha256(bytes);
         Reader::Document document = Reader::openDocument(std::move(bytes), file);
@@ -192,9 +209,12 @@ ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeS
         if (extractPreset.isForAttachemnt())
             return result;
         requirePatterns(extractPreset, settings);
-        Reader::Trace trace;
         bool const withReport = contains(along, Along::Report);
-        reading.letters = lettersOf(document, extractPreset, withReport ? &trace : nullptr);
+        bool const withTrace = contains(along, Along::Trace);
+        Reader::Trace trace;
+        reading.letters = lettersOf(document, extractPreset, withReport || withTrace ? &trace : nullptr);
+        if (withTrace)
+            addPages(reading.trace, document, extractPreset, trace);
         if (withReport)
             result.report = Report::section(Report::describe(reading, document, trace), place);
         if (contains(along, Along::Pages))

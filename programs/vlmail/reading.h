@@ -31,7 +31,7 @@ struct LetterReading {
 
 struct DocumentReading {
     std::string document;
-    /// One line, when the document could not be read; nothing else is set then.
+    /// One line, when the document could not be read; of the rest only the trace is set then.
     std::string error;
     /// The match text of the extraction preset, and what it is called.
     std::string extractPreset;
@@ -39,11 +39,13 @@ struct DocumentReading {
     std::string packPreset;
     /// None for an attachment, which holds no letters.
     std::optional<std::vector<LetterReading>> letters;
+    /// How it came about, as docs/explain.md tells; there only when it was asked for, also with an error.
+    json::Value trace = {};
 
     bool failed() const { return !error.empty(); }
     bool isAttachment() const { return !failed() && !letters; }
 
-    /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}.
+    /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
     /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and "missing" when
     /// it misses obligatory fields.
     json::Object toJson() const;
@@ -76,6 +78,8 @@ enum class Along : unsigned {
     Nothing = 0,
     Pages = 1,
     Report = 2,
+    /// How the letters came about, as the reading's `trace`.
+    Trace = 4,
 };
 
 constexpr Along operator|(Along one, Along other) {

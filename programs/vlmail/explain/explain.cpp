@@ -1,0 +1,232 @@
+#include "programs/vlmail/explain/explain.h"
+
+#include "programs/vlmail/explain/near_miss.h"
+#include "programs/vlmail/explain/preset_walk.h"
+#include "programs/vlmail/explain/read_pages.h"
+#include "programs/vlmail/explain/refusal.h"
+#include "programs/vlmail/explain/words.h"
+
+#include <algorithm>
+#include <cstdlib>
+
+namespace VlMail {
+
+using namespace Explanation;
+using Reader::Box;
+using Reader::FieldTrace;
+using Reader::PageTrace;
+using Reader::ZoneTrace;
+
+namespace {
+
+char const* nameOf(PresetStep::Answer answer) {
+    switch (answer) {
+    case PresetStep::Answer::Yes:
+        return ANSWER_YES;
+    case PresetStep::Answer::No:
+        return ANSWER_NO;
+    case PresetStep::Answer::Failed:
+        break;
+    }
+    return ANSWER_FAILED;
+}
+
+json::Object toJson(PresetStep const& step) {
+    return {{MATCH, step.preset->strRegex()},
+            {NAME, step.preset->name()},
+            {PACK_PRESET, step.preset->packPresetName()},
+            {INHERITED, step.isInherited},
+            {ANSWER, nameOf(step.answer)},
+            {WHY, step.why}};
+}
+
+json::Object toJson(Box const& box) {
+    return {{"left", box.left}, {"top", box.top}, {"right", box.right}, {"bottom", box.bottom}};
+}
+
+json::Object toJson(Reader::Stretch const& stretch) {
+    return {{TEXT, stretch.text}, {BOX, toJson(stretch.box)}, {WIDTH, stretch.width}};
+}
+
+json::Object toJson(NearMiss const& miss) {
+    json::Object object{{KIND, VlMail::nameOf(miss.kind)}, {SAYS, miss.says}};
+    if (miss.page == 0)
+        return object;
+    object.set(TEXT, miss.text);
+    object.set(PAGE, miss.page);
+    object.set(BOX, toJson(miss.box));
+    return object;
+}
+
+char const* outcomeOf(FieldTrace const& trace) {
+    if (trace.definition->strRegex().empty())
+        return OUTCOME_NOT_SEARCHED;
+    if (trace.isTooWide)
+        return OUTCOME_TOO_WIDE;
+    if (!trace.rawText)
+        return OUTCOME_NOT_FOUND;
+    return trace.value->isValid() ? OUTCOME_FOUND : OUTCOME_INVALID;
+}
+
+/// What width limit and validator say against the match; empty when they take it.
+std::string objection(FieldTrace const& trace) {
+    if (trace.isTooWide)
+        return "wider than " + Words::millimetres(static_cast<long long>(trace.definition->maxWidth())) +
+               ": " + Words::millimetres(trace.match->width);
+    if (!trace.rawText || trace.value->isValid())
+        return {};
+    std::optional<Refusal> const refusal = refusalOf(*trace.definition, *trace.rawText);
+    return refusal ? refusal->says : std::string();
+}
+
+/// The values of one letter's first page, by the rule by which the letter takes one of each name.
+class TakenValues {
+public:
+    explicit TakenValues(PageTrace const& page) : page_(page) {}
+
+    bool isTaken(FieldTrace const& trace) const { return taken(trace) == &trace; }
+    /// The letter has a valid value of this name that was read on the page.
+    bool isFound(FieldTrace const& trace) const {
+        FieldTrace const* const one = taken(trace);
+        return one && one->rawText && one->value->isValid();
+    }
+
+private:
+    /// The first that was found, or else the first default.
+    FieldTrace const* taken(FieldTrace const& like) const {
+        FieldTrace const* firstDefault = nullptr;
+        for (ZoneTrace const& zone : page_.zones) {
+            for (FieldTrace const& trace : zone.fields) {
+                if (!trace.value || trace.definition->name() != like.definition->name())
+                    continue;
+                if (trace.rawText)
+                    return &trace;
+                firstDefault = firstDefault ? firstDefault : &trace;
+            }
+        }
+        return firstDefault;
+    }
+
+    PageTrace const& page_;
+};
+
+class PageExplainer {
+public:
+    PageExplainer(PageTrace const& trace, std::vector<int> otherPages, Cfg::ExtractPreset const& preset,
+                  ReadPages& pages)
+        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages), taken_(trace) {}
+
+    json::Object explain() const {
+        json::Array zones;
+        for (ZoneTrace const& zone : trace_.zones)
+            zones.append(explain(zone));
+        json::Object object{{PAGE, trace_.page}, {BEGINS_LETTER, trace_.beginsLetter}, {ZONES, zones}};
+        if (LaidOutPage const* const page = pages_.page(trace_.page)) {
+            object.set(WIDTH, page->page->width);
+            object.set(HEIGHT, page->page->height);
+        }
+        return object;
+    }
+
+private:
+    json::Object explain(ZoneTrace const& trace) const {
+        Cfg::ExtractZone const& zone = *trace.definition;
+        json::Object object{{NAME, zone.name()}};
+        if (zone.hasLocation())
+            object.set(LOCATION, zone.location().serialize());
+        else
+            object.set(POINT, zone.mostProbablePoint().serialize());
+        object.set(TEXT, trace.text);
+        json::Array blocks;
+        for (Box const& block : trace.blocks)
+            blocks.append(toJson(block));
+        if (!blocks.empty())
+            object.set(BOX, toJson(trace.box));
+        object.set(BLOCKS, blocks);
+        json::Array fields;
+        for (FieldTrace const& field : trace.fields)
+            fields.append(explain(trace, field));
+        object.set(FIELDS, fields);
+        return object;
+    }
+
+    json::Object explain(ZoneTrace const& zone, FieldTrace const& trace) const {
+        Cfg::ExtractField const& field = *trace.definition;
+        json::Object object{{NAME, field.name()},         {OUTCOME, outcomeOf(trace)},
+                            {PATTERN, field.strRegex()},  {TYPE, typeInWords(field)},
+                            {PRIORITY, field.priority()}, {OBLIGATORY, field.mustHave()}};
+        if (trace.match)
+            object.set(MATCH, toJson(*trace.match));
+        if (!trace.cut.empty())
+            object.set(CUT, trace.cut);
+        if (trace.rawText)
+            object.set(RAW, *trace.rawText);
+        std::string const says = objection(trace);
+        if (!says.empty())
+            object.set(SAYS, says);
+        if (trace.value)
+            addValue(object, trace);
+        addNearMisses(object, zone, trace);
+        return object;
+    }
+
+    void addValue(json::Object& object, FieldTrace const& trace) const {
+        object.set(IS_DEFAULT, !trace.rawText);
+        object.set(VALUE, trace.value->rawValue());
+        object.set(SHOWN, trace.value->valueToStr());
+        object.set(IS_PASSED_OVER, trace_.beginsLetter && !taken_.isTaken(trace));
+    }
+
+    void addNearMisses(json::Object& object, ZoneTrace const& zone, FieldTrace const& trace) const {
+        if (!trace_.beginsLetter || taken_.isFound(trace))
+            return;
+        json::Array misses;
+        for (NearMiss const& miss : nearMissesOf({preset_, zone, trace, trace_.page, otherPages_}, pages_))
+            misses.append(toJson(miss));
+        if (!misses.empty())
+            object.set(NEAR_MISSES, misses);
+    }
+
+    PageTrace const& trace_;
+    std::vector<int> otherPages_;
+    Cfg::ExtractPreset const& preset_;
+    ReadPages& pages_;
+    TakenValues taken_;
+};
+
+/// The pages behind the first of a letter, up to the next letter, and one that is skipped in front of it.
+std::vector<int> otherPagesOf(std::size_t index, Reader::Trace const& trace, int pageCount) {
+    int const first = trace.pages[index].page;
+    int end = pageCount + 1;
+    for (std::size_t later = trace.pages.size(); --later > index;)
+        if (trace.pages[later].beginsLetter)
+            end = trace.pages[later].page;
+    std::vector<int> pages;
+    for (int page = first + 1; page < end; ++page)
+        pages.push_back(page);
+    if (index == 0 && first == 2)
+        pages.insert(pages.begin(), 1);
+    return pages;
+}
+
+} // namespace
+
+json::Object explainPresets(Cfg::Presets const& presets, std::string const& document) {
+    json::Array steps;
+    for (PresetStep const& step : walkPresets(presets, document))
+        steps.append(toJson(step));
+    return {{VERSION_KEY, VERSION}, {PRESETS, steps}};
+}
+
+void explainPages(json::Object& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
+                  Reader::Trace const& trace) {
+    ReadPages pages(document, Reader::rulesOf(preset));
+    json::Array explained;
+    for (std::size_t i = 0; i < trace.pages.size(); ++i)
+        explained.append(
+            PageExplainer(trace.pages[i], otherPagesOf(i, trace, pages.count()), preset, pages).explain());
+    explanation.set(PAGE_COUNT, pages.count());
+    explanation.set(PAGES, explained);
+}
+
+} // namespace VlMail

@@ -1,0 +1,66 @@
+#pragma once
+// Why a field was not found, or found and refused: what would have to be different on the page or in the
+// settings. Every answer was tried: the field's pattern, on text as reading makes it.
+
+#include "programs/reader/letters.h"
+#include "programs/vlmail/explain/read_pages.h"
+
+#include <string>
+#include <vector>
+
+namespace VlMail {
+
+/// In the order in which they are told, the likeliest first; docs/explain.md has a table of them.
+enum class NearMissKind {
+    NoText,
+    ValueGroup,
+    EarlierField,
+    Limit,
+    LetterCase,
+    Normalisation,
+    LookAlike,
+    Blanks,
+    Gaps,
+    JoinedLines,
+    LineDistance,
+    Zone,
+    Block,
+    ValidationPattern,
+    Width,
+    OtherZone,
+    OtherPage,
+    Elsewhere,
+    Rest,
+    Literal,
+};
+
+/// As it stands in JSON, such as "letter_case".
+char const* nameOf(NearMissKind kind);
+
+struct NearMiss {
+    NearMissKind kind;
+    /// What is different and what to do, as a clause.
+    std::string says;
+    /// The text in question and where it stands; page 0 when it stands nowhere.
+    std::string text;
+    int page = 0;
+    Reader::Box box;
+};
+
+/// A field that a letter lacks or has an invalid value of, with the search for it.
+struct MissedField {
+    Cfg::ExtractPreset const& preset;
+    Reader::ZoneTrace const& zone;
+    /// One of the zone's.
+    Reader::FieldTrace const& field;
+    /// Where it was searched.
+    int page = 0;
+    /// The letter's other pages, and the one that the preset skips.
+    std::vector<int> otherPages;
+};
+
+/// At most three, the likeliest first; those that would give a valid value stand in front of those that would
+/// not. What the library says about patterns that fail meanwhile is not logged.
+std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages);
+
+} // namespace VlMail

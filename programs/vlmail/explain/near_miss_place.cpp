@@ -1,0 +1,271 @@
+// Near misses in which the text stands elsewhere: beyond the zone, in another line or block, on another page.
+#include "programs/vlmail/explain/near_miss_kinds.h"
+#include "programs/vlmail/explain/words.h"
+#include "programs/vlmail/explain/zone_change.h"
+#include "programs/vlmail/presets/words.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+
+namespace VlMail::NearMisses {
+
+using Reader::Box;
+using Reader::LayoutRules;
+using Reader::Point;
+using Reader::ZoneText;
+using Words::excerpt;
+using Words::millimetres;
+
+namespace {
+
+/// Text this near to a zone was meant to be in it, in 1/100 mm.
+constexpr long long NEAR = 2000;
+
+/// A rule of the layout that a preset sets, and values to try for it, the nearest to the default first.
+struct Rule {
+    char const* key;
+    double LayoutRules::*member;
+    std::array<double, 9> larger;
+    std::array<double, 5> smaller;
+};
+
+constexpr Rule GAPS{"max_spaces_between_fragments",
+                    &LayoutRules::maxSpaces,
+                    {4, 5, 7, 10, 15, 20, 30, 60, 120},
+                    {2.5, 2, 1.5, 1, 0.5}};
+constexpr Rule LINE_DISTANCE{"max_line_distance",
+                             &LayoutRules::maxLineDistance,
+                             {2, 2.2, 2.5, 3, 3.5, 4, 5, 6, 8},
+                             {1.6, 1.5, 1.4, 1.2, 1}};
+
+std::optional<Found> withRule(Search const& search, Rule const& rule, double value) {
+    LayoutRules rules = search.pages().rules();
+    double const current = rules.*rule.member;
+    rules.*rule.member = value;
+    LaidOutPage const page = ReadPages::laidOut(search.page(), rules);
+    return search.told(
+        search.find(search.remaining(search.textOn(page))), search.pageNumber(), [&](Hit const& hit) {
+            return "would match " + excerpt(hit.match.text) + " with " + inQuotes(rule.key) + " at " +
+                   Words::number(value) + (value > current ? " or more" : " or less") + " instead of " +
+                   Words::number(current);
+        });
+}
+
+std::optional<Found> byLargerValue(Search const& search, Rule const& rule) {
+    Best best;
+    for (double const value : rule.larger)
+        if (value > search.pages().rules().*rule.member && !best.isValid())
+            best.offer(withRule(search, rule, value));
+    return best.take();
+}
+
+std::optional<Found> bySmallerValue(Search const& search, Rule const& rule) {
+    Best best;
+    for (double const value : rule.smaller)
+        if (value < search.pages().rules().*rule.member && !best.isValid())
+            best.offer(withRule(search, rule, value));
+    return best.take();
+}
+
+/// The places on a page where the field matches, in reading order.
+std::vector<Hit> hitsOn(Search const& search, LaidOutPage const& page) {
+    ZoneText text = Search::everythingOn(page);
+    std::vector<Hit> hits;
+    while (hits.size() < MAX_TRIES) {
+        std::size_t const before = text.text().size();
+        auto hit = search.cut(search.field(), text);
+        if (!hit)
+            break;
+        hits.push_back(std::move(*hit));
+        // A match that is too wide, or empty, stays in the text.
+        if (text.text().size() == before)
+            break;
+    }
+    return hits;
+}
+
+std::vector<ZoneChange> changesNearby(Search const& search) {
+    std::vector<ZoneChange> changes;
+    for (Hit const& hit : hitsOn(search, search.page())) {
+        ZoneChange const change = grownToHold(search.location(), hit.match.box);
+        if (change.distance() > 0 && change.distance() <= NEAR)
+            changes.push_back(change);
+    }
+    for (ZoneChange const& change : changesByBlocks(search.location(), search.page().layout, NEAR))
+        changes.push_back(change);
+    std::stable_sort(changes.begin(), changes.end(), isLikelier);
+    changes.resize(std::min(changes.size(), MAX_TRIES));
+    return changes;
+}
+
+long long wholeMillimetres(double hundredths) { return std::llround(hundredths / 100) * 100; }
+
+/// As near to the middle of the box as whole millimetres are.
+Point middleOf(Box const& box) {
+    Point const centre = box.centre();
+    return {static_cast<int>(wholeMillimetres(centre.x)), static_cast<int>(wholeMillimetres(centre.y))};
+}
+
+std::string pointInWords(Point point) {
+    return "(" + millimetres(point.x) + ", " + millimetres(point.y) + ")";
+}
+
+std::vector<Box> blocksByDistance(Search const& search, Point point) {
+    std::vector<Box> boxes;
+    for (Reader::Block const& block : search.page().layout.blocks)
+        boxes.push_back(block.box);
+    std::stable_sort(boxes.begin(), boxes.end(),
+                     [&](Box const& a, Box const& b) { return a.distanceTo(point) < b.distanceTo(point); });
+    boxes.resize(std::min(boxes.size(), MAX_TRIES));
+    return boxes;
+}
+
+std::string otherPageAdvice(Search const& search, int page) {
+    if (page < search.pageNumber())
+        return "the preset skips the first page: leave \"skip_first_page\" out";
+    std::string const rule = "fields are searched on the first page of a letter: move the text there";
+    bool const maybeCovered = search.pageNumber() == 1 && page == 2;
+    return maybeCovered ? rule + ", or set \"skip_first_page\" if page 1 is a cover sheet" : rule;
+}
+
+std::optional<Found> onPage(Search const& search, LaidOutPage const& page) {
+    int const number = page.page->number;
+    auto const saying = [&](char const* where) {
+        return [&, where](Hit const& hit) {
+            return "would match " + excerpt(hit.match.text) + " on page " + std::to_string(number) + where +
+                   search.zoneName() + "; " + otherPageAdvice(search, number);
+        };
+    };
+    Best best;
+    best.offer(search.told(search.find(search.remaining(search.textOn(page))), number, saying(" in the ")));
+    if (!best.isValid() && !search.takesWholeText())
+        best.offer(search.told(search.find(Search::everythingOn(page)), number, saying(" outside the ")));
+    return best.take();
+}
+
+/// How far the zone is from the hit; 0 for a zone that is found by its point.
+ZoneChange changeFor(Search const& search, Hit const& hit) {
+    Box const zone = search.zone().hasLocation() ? search.location() : hit.match.box;
+    return grownToHold(zone, hit.match.box);
+}
+
+} // namespace
+
+std::optional<Found> noText(Search const& search) {
+    if (!search.page().page->words.empty())
+        return std::nullopt;
+    return Found{
+        "page " + std::to_string(search.pageNumber()) +
+            " has no text at all, only pictures of it: let a program for character recognition make the "
+            "document searchable",
+        {},
+        search.pageNumber(),
+        {},
+        true};
+}
+
+std::optional<Found> gaps(Search const& search) {
+    Best best;
+    // A pattern for all of a zone's text would fit columns that are joined to fewer lines.
+    if (!search.takesWholeText())
+        best.offer(byLargerValue(search, GAPS));
+    if (!best.isValid())
+        best.offer(bySmallerValue(search, GAPS));
+    return best.take();
+}
+
+std::optional<Found> lineDistance(Search const& search) {
+    // The zone's text depends on blocks only where it is found by its point.
+    if (search.zone().hasLocation())
+        return std::nullopt;
+    Best best;
+    best.offer(byLargerValue(search, LINE_DISTANCE));
+    if (!best.isValid())
+        best.offer(bySmallerValue(search, LINE_DISTANCE));
+    return best.take();
+}
+
+std::optional<Found> zone(Search const& search) {
+    if (!search.zone().hasLocation())
+        return std::nullopt;
+    Best best;
+    for (ZoneChange const& change : changesNearby(search)) {
+        if (best.isValid())
+            break;
+        ZoneText text = ZoneText::inside(*search.page().page, search.page().layout, change.after);
+        best.offer(
+            search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), [&](Hit const&) {
+                return "would match " + change.where("the " + search.zoneName()) + ": " + change.advice();
+            }));
+    }
+    return best.take();
+}
+
+std::optional<Found> block(Search const& search) {
+    if (search.zone().hasLocation())
+        return std::nullopt;
+    Point const point = search.zone().mostProbablePoint();
+    Best best;
+    for (Box const& box : blocksByDistance(search, point)) {
+        if (best.isValid())
+            break;
+        Point const middle = middleOf(box);
+        ZoneText text = ZoneText::nearest(*search.page().page, search.page().layout, middle);
+        best.offer(
+            search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), [&](Hit const&) {
+                return "would match in the text block " +
+                       millimetres(wholeMillimetres(box.distanceTo(point))) + " away from the point of the " +
+                       search.zoneName() + ": move the point from " + pointInWords(point) + " to " +
+                       pointInWords(middle);
+            }));
+    }
+    return best.take();
+}
+
+std::optional<Found> otherZone(Search const& search) {
+    if (search.takesWholeText())
+        return std::nullopt;
+    Best best;
+    for (Cfg::ExtractZone const& zone : search.missed().preset.zones()) {
+        if (&zone == &search.zone())
+            continue;
+        auto const hit = search.find(textOf(*search.page().page, search.page().layout, zone));
+        best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
+            return "would match " + excerpt(at.match.text) + " in the zone " + inQuotes(zone.name()) +
+                   ": move the field there";
+        }));
+    }
+    return best.take();
+}
+
+std::optional<Found> otherPage(Search const& search) {
+    Best best;
+    for (int const number : search.otherPages()) {
+        LaidOutPage const* const page = search.pages().page(number);
+        if (page && !best.isValid())
+            best.offer(onPage(search, *page));
+    }
+    return best.take();
+}
+
+std::optional<Found> elsewhere(Search const& search) {
+    if (search.takesWholeText())
+        return std::nullopt;
+    Best best;
+    for (Hit const& hit : hitsOn(search, search.page())) {
+        ZoneChange const change = changeFor(search, hit);
+        bool const isFar = change.distance() > NEAR || !search.zone().hasLocation();
+        if (!isFar)
+            continue;
+        best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
+            std::string const where = search.zone().hasLocation() ? change.where("the " + search.zoneName())
+                                                                  : "outside the " + search.zoneName();
+            return "would match " + excerpt(at.match.text) + " " + where +
+                   ": move the zone there, or give the field a zone of its own";
+        }));
+    }
+    return best.take();
+}
+
+} // namespace VlMail::NearMisses

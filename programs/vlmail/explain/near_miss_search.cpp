@@ -1,0 +1,109 @@
+#include "programs/vlmail/explain/near_miss_search.h"
+
+#include "programs/vlmail/presets/words.h"
+
+#include <algorithm>
+#include <limits>
+#include <utility>
+
+namespace VlMail {
+
+using Cfg::ExtractedField;
+using Cfg::ExtractField;
+using Reader::Box;
+using Reader::FieldTrace;
+using Reader::ZoneText;
+
+namespace {
+
+constexpr std::size_t MAX_OTHER_PAGES = 20;
+/// A pattern that the engine gave up so often is left alone: each time may have cost seconds.
+constexpr int MAX_FAILURES = 2;
+
+constexpr Box EVERYWHERE{std::numeric_limits<int>::min(), std::numeric_limits<int>::min(),
+                         std::numeric_limits<int>::max(), std::numeric_limits<int>::max()};
+
+bool isValid(ExtractField const& field, ExtractedField value) {
+    try {
+        field.validate(value);
+        return value.isValid();
+    } catch (std::exception const&) {
+        return false;
+    }
+}
+
+} // namespace
+
+CountedLog::CountedLog() : before_(Log::setSink([this](LogPriority, std::string const&) { ++lines_; })) {}
+
+CountedLog::~CountedLog() { Log::setSink(std::move(before_)); }
+
+std::string Search::zoneName() const { return "zone " + inQuotes(zone().name()); }
+
+Box Search::location() const {
+    Cfg::Rect const& at = zone().location();
+    return {at.left, at.top, at.right, at.bottom};
+}
+
+std::vector<int> Search::otherPages() const {
+    std::vector<int> pages = missed_.otherPages;
+    pages.resize(std::min(pages.size(), MAX_OTHER_PAGES));
+    return pages;
+}
+
+ZoneText Search::textOn(LaidOutPage const& page) const { return textOf(*page.page, page.layout, zone()); }
+
+ZoneText Search::everythingOn(LaidOutPage const& page) {
+    return ZoneText::inside(*page.page, page.layout, EVERYWHERE);
+}
+
+ZoneText Search::remaining(ZoneText text) const {
+    for (FieldTrace const* const earlier : earlierFields())
+        cutField(*earlier->definition, text);
+    return text;
+}
+
+std::vector<FieldTrace const*> Search::earlierFields() const {
+    std::vector<FieldTrace const*> earlier;
+    for (FieldTrace const& trace : missed_.zone.fields) {
+        if (&trace == &missed_.field)
+            break;
+        earlier.push_back(&trace);
+    }
+    return earlier;
+}
+
+ExtractField Search::withPattern(std::string const& pattern) const {
+    ExtractField variant(field());
+    variant.setRegex(pattern);
+    return variant;
+}
+
+std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const {
+    if (isGivenUp())
+        return std::nullopt;
+    FieldTrace trace;
+    std::shared_ptr<ExtractedField> const value = cutField(field, text, &trace);
+    if (!trace.match)
+        return std::nullopt;
+    return Hit{std::move(*trace.match), trace.rawText && isValid(field, *value)};
+}
+
+std::optional<PlainHit> Search::find(ExtractField const& field, std::string text) const {
+    if (isGivenUp())
+        return std::nullopt;
+    std::optional<PlainHit> hit;
+    ExtractField::Measure const remember = [&](std::string&, unsigned long long offset,
+                                               unsigned long long length) {
+        hit = PlainHit{static_cast<std::size_t>(offset), static_cast<std::size_t>(offset + length), false};
+        return 0;
+    };
+    auto const value = field.extractField(text, remember);
+    if (hit && value)
+        hit->isValid = isValid(field, *value);
+    return hit;
+}
+
+bool Search::isGivenUp() const { return log_.lines() >= MAX_FAILURES; }
+
+} // namespace VlMail

@@ -1,0 +1,27 @@
+#pragma once
+// What a pattern is made of, as far as advice about it needs to know. The engine decides what a pattern
+// means: everything that comes from here is tried on it, or looked up in the letter.
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace VlMail {
+
+/// Texts that must stand in every text that the pattern fits, without blanks at their ends, the longest
+/// first; none for a pattern of alternatives.
+std::vector<std::string> literalsOf(std::string_view pattern);
+
+/// The pattern cut into two, at every place between its steps, the longest front first.
+struct PatternCut {
+    std::string front;
+    std::string rest;
+};
+std::vector<PatternCut> cutsOf(std::string_view pattern);
+
+/// The pattern with all that it matches for its value.
+std::string withWholeAsValue(std::string_view pattern);
+
+bool hasValueGroup(std::string_view pattern);
+
+} // namespace VlMail

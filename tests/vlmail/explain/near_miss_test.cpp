@@ -1,0 +1,206 @@
+// The kinds of near misses that need no PDF, and which of them are told.
+#include "programs/vlmail/explain/near_miss.h"
+#include "tests/vlmail/explain/explain_fixture.h"
+
+namespace VlMail {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::SizeIs;
+using testing::StartsWith;
+
+class NearMissTest : public ExplainTest {
+protected:
+    /// Of the field "f" with that pattern, in a text document.
+    std::vector<std::string> missesOf(std::string const& document, std::string const& pattern,
+                                      std::string const& more = {}) {
+        return nearMisses(explainedFields(document, field(pattern, more)), "f");
+    }
+
+    static std::string field(std::string const& pattern, std::string const& more = {}) {
+        json::Object object{{"name", "f"}, {"value_extract", pattern}};
+        std::ostringstream text;
+        text << object;
+        std::string result = text.str();
+        result.insert(result.size() - 1, more);
+        return result;
+    }
+};
+
+TEST_F(NearMissTest, OfADocumentWithoutTextIsThatItHasNone) {
+    EXPECT_THAT(missesOf("\n\n", "^Ref: (?<VAL>.*)$"),
+                ElementsAre("no_text: page 1 has no text at all, only pictures of it: let a program for "
+                            "character recognition make the document searchable"));
+}
+
+TEST_F(NearMissTest, OfAValueGroupThatTakesNoPartIsToldAsSuch) {
+    EXPECT_THAT(
+        missesOf("Ref: none\n", "^Ref: (none|(?<VAL>\\d+))$"),
+        ElementsAre("value_group: the pattern matches \"Ref: none\", but its group (?<VAL>...) takes no "
+                    "part in the match: put it where a value always is"));
+}
+
+TEST_F(NearMissTest, OfOtherBlanksNamesThem) {
+    EXPECT_THAT(missesOf("Our  ref:   17\n", "^Our  ref:  (?<VAL>\\d+)$"),
+                ElementsAre("blanks: would match \"Our ref: 17\" with other blanks: the words of a line are "
+                            "joined by one blank each; write \\h* in the pattern where it has blanks"));
+    EXPECT_THAT(missesOf("Ref:17\n", "^Ref: (?<VAL>\\d+)$"), ElementsAre(StartsWith("blanks: ")));
+}
+
+TEST_F(NearMissTest, OfTypographyInThePatternNamesTheCharacterThere) {
+    EXPECT_THAT(
+        missesOf("Customer's no: 17\n", "^Customer\u2019s no: (?<VAL>\\d+)$"),
+        ElementsAre("look_alike: would match \"Customer's no: 17\" if characters that look alike were "
+                    "the same: the pattern has \"\u2019\" (U+2019) where the letter has \"'\": correct "
+                    "the pattern"));
+}
+
+TEST_F(NearMissTest, OfAWordBrokenOverTwoLinesJoinsThemWithoutABlank) {
+    EXPECT_THAT(missesOf("Ref: 17\n04\nend\n", "^Ref: (?<VAL>\\d{4})$"),
+                ElementsAre("joined_lines: would match with the lines \"Ref: 17\" and \"04\" joined: let the "
+                            "pattern take a line break there, \\s in the place of a blank or \\h"));
+}
+
+TEST_F(NearMissTest, OfALineInTwoColumnsThatWereReadAsOneIsASmallerGap) {
+    EXPECT_THAT(
+        missesOf("Ref: 17   Page 1\n", "^Ref: (?<VAL>\\d+)$", ""),
+        ElementsAre("gaps: would match \"Ref: 17\" with \"max_spaces_between_fragments\" at 2.5 or less "
+                    "instead of 3"));
+}
+
+TEST_F(NearMissTest, OfAZoneAtAPointIsTheDistanceOfLines) {
+    std::string const settings = R"({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+        {"name": "_Address", "fields": [{"name": "f", "value_extract": "\\A(?<VAL>.*\\n.*)\\Z"}]}]}],
+        "pack_presets": [{"name": "P"}]})";
+    std::string const address = std::string(13, '\n') + "Anna Arnold\n\nRiverton\n";
+    EXPECT_THAT(
+        nearMisses(explainedText(address, settings), "f"),
+        ElementsAre("line_distance: would match \"Anna Arnold / Riverton\" with \"max_line_distance\" at "
+                    "2.5 or more instead of 1.8"));
+}
+
+TEST_F(NearMissTest, OfARefusedPatternIsThePattern) {
+    EXPECT_THAT(
+        missesOf("Ref: A-17\n", "^Ref: (?<VAL>.+)$", R"(, "value_match": "\\d+")"),
+        ElementsAre("validation_pattern: \"A-17\" does not match the validation pattern \"\\d+\": let "
+                    "\"value_extract\" take another part of the text, or \"value_match\" accept this "
+                    "one"));
+}
+
+TEST_F(NearMissTest, OfAMinimumSaysWhatToLower) {
+    EXPECT_THAT(missesOf("Sum: 1\n", "^Sum: (?<VAL>.+)$", R"(, "value_type": 1, "value_min": 5)"),
+                ElementsAre("limit: 1 is below the minimum 5: lower \"value_min\", or correct the letter"));
+}
+
+TEST_F(NearMissTest, OnAPageThatIsSkippedSaysSo) {
+    json::Object const reading = explainedFields("Ref: 17\n\fpage two\n", field("^Ref: (?<VAL>\\d+)$"),
+                                                 R"("skip_first_page": true, )");
+    EXPECT_THAT(
+        nearMisses(reading, "f"),
+        ElementsAre("other_page: would match \"Ref: 17\" on page 1 in the zone \"Page\"; the preset skips "
+                    "the first page: leave \"skip_first_page\" out"));
+}
+
+TEST_F(NearMissTest, OnAThirdPageOffersNoCoverSheet) {
+    EXPECT_THAT(missesOf("one\n\ftwo\n\fRef: 17\n", "^Ref: (?<VAL>\\d+)$"),
+                ElementsAre("other_page: would match \"Ref: 17\" on page 3 in the zone \"Page\"; fields are "
+                            "searched on the first page of a letter: move the text there"));
+}
+
+TEST_F(NearMissTest, OfTextFarFromTheZoneSaysHowFar) {
+    std::string const settings = R"({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+        {"name": "Top", "location": {"left": 2000, "top": 0, "right": 9000, "bottom": 3000}, "fields": [
+            {"name": "f", "value_extract": "^Ref: (?<VAL>\\d+)$"}]}]}], "pack_presets": [{"name": "P"}]})";
+    std::string const document = "Hello\n" + std::string(39, '\n') + std::string(60, ' ') + "Ref: 17\n";
+    EXPECT_THAT(
+        nearMisses(explainedText(document, settings), "f"),
+        ElementsAre("elsewhere: would match \"Ref: 17\" 153 mm below and 77 mm to the right of the zone "
+                    "\"Top\": move the zone there, or give the field a zone of its own"));
+}
+
+TEST_F(NearMissTest, OfALiteralThatNothingIsLikeNamesItAlone) {
+    EXPECT_THAT(missesOf("Hello\n", "^(?i:ref):+\\h*(?<VAL>\\S.*)$"),
+                ElementsAre("literal: \"ref:\" of the pattern occurs nowhere in the letter"));
+}
+
+TEST_F(NearMissTest, OfALiteralSaysWhenNotAllPagesWereLookedAt) {
+    std::string document;
+    for (int page = 1; page <= 30; ++page)
+        document += "Hello\n\f";
+    EXPECT_THAT(
+        missesOf(document, "^Ref: (?<VAL>.*)$"),
+        ElementsAre("literal: \"Ref:\" of the pattern occurs nowhere on the first 21 pages of the letter"));
+}
+
+TEST_F(NearMissTest, OfAPatternThatBeginsAnywhereIsTheLiteralAndNotHowFarItFits) {
+    EXPECT_THAT(missesOf("Hello world\n", "^.*Ref: (?<VAL>\\d+)$"),
+                ElementsAre(StartsWith("literal: \"Ref:\"")));
+}
+
+TEST_F(NearMissTest, OfAnEndOfLineSaysThatItEnds) {
+    EXPECT_THAT(
+        missesOf("Ref: 17\n", "^Ref: (?<VAL>\\d+) of$"),
+        ElementsAre("rest: \"Ref: 17\" fits \"^Ref: (?<VAL>\\d+)\", but the end of the line behind it does "
+                    "not fit \" of$\"",
+                    "literal: \"of\" of the pattern occurs nowhere in the letter"));
+}
+
+TEST_F(NearMissTest, ThatGivesAnInvalidValueStandsBehindOthers) {
+    // On the first page the value is in capitals and too small; the second page has it right.
+    std::vector<std::string> const told =
+        missesOf("REF: 17\n\fRef: 99\n", "^Ref: (?<VAL>\\d+)$", R"(, "value_type": 1, "value_min": 50)");
+    EXPECT_THAT(told, ElementsAre(StartsWith("other_page: "), StartsWith("letter_case: ")));
+}
+
+TEST_F(NearMissTest, ListHasNoMoreThanThree) {
+    std::string const document = "REF: 17\nRef:\n17\n\fRef: 17\n\fRef: 17\n";
+    EXPECT_THAT(
+        missesOf(document, "^Ref:\\h+(?<VAL>\\d+)$"),
+        ElementsAre(StartsWith("letter_case: "), StartsWith("joined_lines: "), StartsWith("other_page: ")));
+}
+
+TEST_F(NearMissTest, IsNotSoughtForAFieldThatWasFoundInAnotherZone) {
+    std::string const fields = field("^REF: (?<VAL>\\d+)$") +
+                               R"(]}, {"name": "Again", "location": )"
+                               R"({"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [)" +
+                               field("^Ref: (?<VAL>\\d+)$");
+    EXPECT_THAT(nearMisses(explainedFields("Ref: 17\n", fields), "f"), IsEmpty());
+}
+
+TEST_F(NearMissTest, IsNotSoughtWithoutAPattern) { EXPECT_THAT(missesOf("Ref: 17\n", ""), IsEmpty()); }
+
+TEST_F(NearMissTest, IsSoughtWithinTheLetterOnly) {
+    std::string const mark = R"({"name": "mark", "value_extract": "^Dear (?<VAL>.*)$", "mark": 1}, )";
+    json::Object const reading =
+        explainedFields("Dear A\n\fRef: 1\n\fDear B\nRef: 2\n", mark + field("^Ref: (?<VAL>\\d+)$"));
+    EXPECT_THAT(nearMisses(reading, "f"),
+                ElementsAre(HasSubstr("would match \"Ref: 1\" on page 2 in the zone \"Page\"")));
+    json::Value const second = reading.get("trace").toObject().get("pages").toArray().at(1);
+    EXPECT_FALSE(second.toObject().get("begins_letter").toBool());
+}
+
+TEST_F(NearMissTest, IsGivenUpWhenThePatternIsTooComplex) {
+    // Each try would take the engine a second or more; what it says is not logged either.
+    std::string const document = std::string(900, 'a') + "\n";
+    EXPECT_THAT(missesOf(document, "^(a|aa|a?)+(?<VAL>b)$"), SizeIs(testing::Le(1)));
+    EXPECT_EQ(err_, "");
+}
+
+TEST(NearMissKinds, StandInTheDescriptionInTheirOrder) {
+    std::ifstream in(VLSERVICE_DOCS "/explain.md");
+    std::vector<std::string> described;
+    for (std::string line; std::getline(in, line);)
+        if (line.starts_with("| `") &&
+            (line.find("` | not found |") != line.npos || line.find("` | refused |") != line.npos ||
+             line.find("` | both |") != line.npos))
+            described.push_back(line.substr(3, line.find('`', 3) - 3));
+    std::vector<std::string> known;
+    for (int kind = 0; kind <= static_cast<int>(NearMissKind::Literal); ++kind)
+        known.push_back(nameOf(static_cast<NearMissKind>(kind)));
+    EXPECT_EQ(described, known);
+}
+
+} // namespace
+} // namespace VlMail
