@@ -4,13 +4,16 @@
 
 #include <qpdf/Buffer.hh>
 #include <qpdf/QPDF.hh>
+#include <qpdf/QPDFObjectHandle.hh>
 #include <qpdf/QPDFPageDocumentHelper.hh>
 #include <qpdf/QPDFWriter.hh>
 
 #include <stdexcept>
 #include <utility>
+#include <vector>
 
 namespace Reader {
+namespace {
 
 std::string bytesOf(QPDF& pdf) {
     QPDFWriter writer(pdf);
@@ -21,6 +24,57 @@ std::string bytesOf(QPDF& pdf) {
     auto const bytes = writer.getBufferSharedPointer();
     return std::string(reinterpret_cast<char const*>(bytes->getBuffer()), bytes->getSize());
 }
+
+std::string hex(unsigned value) {
+    static constexpr char DIGITS[] = "0123456789ABCDEF";
+    std::string text;
+    for (int shift = 12; shift >= 0; shift -= 4)
+        text += DIGITS[value >> shift & 0xF];
+    return text;
+}
+
+std::string utf16Hex(char32_t c) {
+    if (c <= 0xFFFF)
+        return hex(c);
+    return hex(0xD7C0 + (c >> 10)) + hex(0xDC00 + (c & 0x3FF));
+}
+
+/// Tells readers of the PDF which characters the glyphs are.
+std::string characterMap(CarriedFont const& font) {
+    std::string map = "/CIDInit /ProcSet findresource begin\n12 dict begin\nbegincmap\n"
+                      "/CMapName /Carried def\n/CMapType 2 def\n"
+                      "1 begincodespacerange\n<0000> <FFFF>\nendcodespacerange\n";
+    for (auto const& [glyph, c] : font.characters)
+        map += "1 beginbfchar\n<" + hex(glyph) + "> <" + utf16Hex(c) + ">\nendbfchar\n";
+    return map + "endcmap\nCMapName currentdict /CMap defineresource pop\nend\nend\n";
+}
+
+QPDFObjectHandle fontDescriptor(QPDF& pdf, CarriedFont const& font) {
+    std::string const ascent = std::to_string(font.ascent);
+    std::string const descent = std::to_string(font.descent);
+    QPDFObjectHandle descriptor = QPDFObjectHandle::parse(
+        "<< /Type /FontDescriptor /FontName /" + font.name +
+        " /Flags 5 /ItalicAngle 0 /StemV 80 /FontBBox [0 " + descent + " " + std::to_string(font.advance) +
+        " " + ascent + "] /Ascent " + ascent + " /Descent " + descent + " /CapHeight " + ascent + " >>");
+    descriptor.replaceKey("/FontFile2", pdf.newStream(font.file));
+    return pdf.makeIndirectObject(descriptor);
+}
+
+QPDFObjectHandle fontOf(QPDF& pdf, CarriedFont const& font) {
+    QPDFObjectHandle glyphs =
+        QPDFObjectHandle::parse("<< /Type /Font /Subtype /CIDFontType2 /BaseFont /" + font.name +
+                                " /CIDToGIDMap /Identity /CIDSystemInfo << /Registry (Adobe) /Ordering "
+                                "(Identity) /Supplement 0 >> /DW " +
+                                std::to_string(font.advance) + " >>");
+    glyphs.replaceKey("/FontDescriptor", fontDescriptor(pdf, font));
+    QPDFObjectHandle whole = QPDFObjectHandle::parse("<< /Type /Font /Subtype /Type0 /BaseFont /" +
+                                                     font.name + " /Encoding /Identity-H >>");
+    whole.replaceKey("/DescendantFonts", QPDFObjectHandle::newArray({pdf.makeIndirectObject(glyphs)}));
+    whole.replaceKey("/ToUnicode", pdf.newStream(characterMap(font)));
+    return pdf.makeIndirectObject(whole);
+}
+
+} // namespace
 
 struct PdfPageWriter::Parsed {
     QPDF pdf;
@@ -56,6 +110,21 @@ std::string PdfPageWriter::write(int number, int pageCount) {
     } catch (std::exception const&) {
         throw Error(where_ + ": page " + std::to_string(number) + " is damaged; export the document again");
     }
+}
+
+std::string pdfOf(ShownPage const& page) {
+    QPDF pdf;
+    pdf.emptyPDF();
+    QPDFObjectHandle sheet =
+        QPDFObjectHandle::parse("<< /Type /Page /MediaBox [0 0 " + page.width + " " + page.height + "] >>");
+    sheet.replaceKey("/Contents", pdf.newStream(page.content));
+    QPDFObjectHandle fonts = QPDFObjectHandle::parse(
+        "<< /Courier << /Type /Font /Subtype /Type1 /BaseFont /Courier /Encoding /WinAnsiEncoding >> >>");
+    if (page.carried)
+        fonts.replaceKey("/Carried", fontOf(pdf, *page.carried));
+    sheet.replaceKey("/Resources", QPDFObjectHandle::newDictionary({{"/Font", fonts}}));
+    QPDFPageDocumentHelper(pdf).addPage(QPDFPageObjectHelper(pdf.makeIndirectObject(sheet)), false);
+    return bytesOf(pdf);
 }
 
 } // namespace Reader

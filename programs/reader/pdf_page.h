@@ -1,17 +1,14 @@
 #pragma once
-// Single-page PDFs out of a PDF.
+// PDFs of one page, written with qpdf: out of a PDF, or out of what shows text.
+// Without anything that needs C++20: clang takes qpdf's headers up to C++17 only.
 
+#include <cstdint>
+#include <map>
 #include <memory>
 #include <string>
 #include <string_view>
-#include <vector>
-
-class QPDF;
 
 namespace Reader {
-
-/// A PDF as it is written to a file, the same at any time and place.
-std::string bytesOf(QPDF& pdf);
 
 /// Writes pages of one PDF as PDFs of their own. The PDF is parsed when the first page is written.
 class PdfPageWriter {
@@ -31,5 +28,30 @@ private:
     std::string where_;
     std::unique_ptr<Parsed> parsed_;
 };
+
+/// A font of which a PDF carries the letters it shows; all are equally wide.
+struct CarriedFont {
+    std::string name;
+    /// A TrueType file.
+    std::string file;
+    // In thousandths of the font size.
+    int ascent = 0;
+    int descent = 0;
+    int advance = 0;
+    /// The characters that the glyphs used in the content stand for.
+    std::map<std::uint16_t, char32_t> characters;
+};
+
+/// What a page shows: operators of PDF, in which the font /Courier is in Windows-1252 and /Carried, where
+/// there is one, is by glyph numbers. Sizes are in points.
+struct ShownPage {
+    std::string width;
+    std::string height;
+    std::string content;
+    CarriedFont const* carried = nullptr;
+};
+
+/// The same page gives the same bytes.
+std::string pdfOf(ShownPage const& page);
 
 } // namespace Reader

@@ -1,14 +1,10 @@
 // PDFs as they come from outside: turned, cropped, encrypted, damaged.
 #include "programs/reader/document.h"
 #include "programs/reader/layout.h"
-#include "programs/reader/pdf_page.h"
+
+#include "tests/reader/pdf_maker.h"
 
 #include <gmock/gmock.h>
-
-#include <qpdf/Buffer.hh>
-#include <qpdf/QPDF.hh>
-#include <qpdf/QPDFPageDocumentHelper.hh>
-#include <qpdf/QPDFWriter.hh>
 
 #include <fstream>
 #include <functional>
@@ -21,42 +17,7 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
-/// Makes PDFs of pages with the font /F, which is Courier.
-class PdfMaker {
-public:
-    PdfMaker() { pdf_.emptyPDF(); }
-
-    /// `keys` go into the page's dictionary, `content` shows something on it.
-    PdfMaker& page(std::string const& content, std::string const& keys = "/MediaBox [0 0 595 842]") {
-        QPDFObjectHandle sheet = QPDFObjectHandle::parse(
-            "<< /Type /Page " + keys +
-            " /Resources << /Font << /F << /Type /Font /Subtype /Type1 /BaseFont /Courier "
-            "/Encoding /WinAnsiEncoding >> >> >> >>");
-        sheet.replaceKey("/Contents", pdf_.newStream(content));
-        QPDFPageDocumentHelper(pdf_).addPage(QPDFPageObjectHelper(pdf_.makeIndirectObject(sheet)), false);
-        return *this;
-    }
-
-    QPDF& pdf() { return pdf_; }
-    std::string bytes() { return bytesOf(pdf_); }
-    Document document() { return openDocument(bytes(), "made.pdf"); }
-
-    /// Encrypted so that the user's password opens it.
-    std::string encrypted(char const* password) {
-        QPDFWriter writer(pdf_);
-        writer.setOutputMemory();
-        writer.setStaticID(true);
-        writer.setStaticAesIV(true);
-        writer.setR6EncryptionParameters(password, "owner", true, true, true, true, true, true, qpdf_r3p_full,
-                                         true);
-        writer.write();
-        auto const buffer = writer.getBufferSharedPointer();
-        return {reinterpret_cast<char const*>(buffer->getBuffer()), buffer->getSize()};
-    }
-
-private:
-    QPDF pdf_;
-};
+Document documentOf(PdfMaker& maker) { return openDocument(maker.bytes(), "made.pdf"); }
 
 /// Text at a place in points from the bottom left corner.
 std::string shown(int x, int y, std::string const& text) {
@@ -83,7 +44,7 @@ std::string complaint(std::function<void()> const& action) {
 constexpr double HUNDREDTHS = 2540.0 / 72;
 
 TEST(PdfPages, HaveTheirOriginAtTheTopLeft) {
-    Document document = PdfMaker().page(shown(72, 770, "Herrn")).document();
+    Document document = documentOf(PdfMaker().page(shown(72, 770, "Herrn")));
     Page const& page = document.page(1);
     EXPECT_NEAR(page.width, 595 * HUNDREDTHS, 1);
     EXPECT_NEAR(page.height, 842 * HUNDREDTHS, 1);
@@ -99,10 +60,8 @@ TEST(PdfPages, HaveTheirOriginAtTheTopLeft) {
 }
 
 TEST(PdfPages, AreReadAsTheyAreCropped) {
-    Document document = PdfMaker()
-                            .page(shown(172, 742, "Herrn") + shown(20, 742, "outside"),
-                                  "/MediaBox [0 0 595 842] /CropBox [100 100 500 800]")
-                            .document();
+    Document document = documentOf(PdfMaker().page(shown(172, 742, "Herrn") + shown(20, 742, "outside"),
+                                                   "/MediaBox [0 0 595 842] /CropBox [100 100 500 800]"));
     Page const& page = document.page(1);
     EXPECT_NEAR(page.width, 400 * HUNDREDTHS, 1);
     EXPECT_NEAR(page.height, 700 * HUNDREDTHS, 1);
@@ -113,7 +72,7 @@ TEST(PdfPages, AreReadAsTheyAreCropped) {
 }
 
 TEST(PdfPages, MayBeginAnywhere) {
-    Document document = PdfMaker().page(shown(-28, 842, "Herrn"), "/MediaBox [-100 100 495 942]").document();
+    Document document = documentOf(PdfMaker().page(shown(-28, 842, "Herrn"), "/MediaBox [-100 100 495 942]"));
     EXPECT_NEAR(document.page(1).words.at(0).box.left, 72 * HUNDREDTHS, 1);
     EXPECT_NEAR(document.page(1).width, 595 * HUNDREDTHS, 1);
 }
@@ -121,7 +80,7 @@ TEST(PdfPages, MayBeginAnywhere) {
 TEST(PdfPages, AreReadAsTheyAreTurned) {
     // Text that runs up the sheet, on a page that is shown turned to the right: it reads upright.
     std::string const upwards = "BT /F 10 Tf 0 1 -1 0 72 200 Tm (Herrn) Tj ET\n";
-    Document document = PdfMaker().page(upwards, "/MediaBox [0 0 595 842] /Rotate 90").document();
+    Document document = documentOf(PdfMaker().page(upwards, "/MediaBox [0 0 595 842] /Rotate 90"));
     Page const& page = document.page(1);
     EXPECT_NEAR(page.width, 842 * HUNDREDTHS, 1);
     EXPECT_NEAR(page.height, 595 * HUNDREDTHS, 1);
@@ -138,10 +97,9 @@ TEST(PdfPages, TellWhichWayTextRuns) {
         Turn turn;
     } const cases[] = {{0, Turn::Upright}, {90, Turn::Down}, {180, Turn::UpsideDown}, {270, Turn::Up}};
     for (auto const& [rotate, turn] : cases) {
-        Document document = PdfMaker()
-                                .page(shown(100, 700, "Herrn Olaf") + shown(100, 688, "Leipzig"),
-                                      "/MediaBox [0 0 595 842] /Rotate " + std::to_string(rotate))
-                                .document();
+        Document document =
+            documentOf(PdfMaker().page(shown(100, 700, "Herrn Olaf") + shown(100, 688, "Leipzig"),
+                                       "/MediaBox [0 0 595 842] /Rotate " + std::to_string(rotate)));
         EXPECT_EQ(document.page(1).words.at(0).turn, turn);
         EXPECT_THAT(textsOf(document.page(1)), ElementsAre("Herrn Olaf", "Leipzig"));
         EXPECT_THAT(layOut(document.page(1)).blocks, SizeIs(1));
@@ -149,26 +107,24 @@ TEST(PdfPages, TellWhichWayTextRuns) {
 }
 
 TEST(PdfText, ThatIsNotDrawnIsReadLikeTheTextUnderAScan) {
-    Document document = PdfMaker().page("BT 3 Tr /F 10 Tf 1 0 0 1 72 700 Tm (Herrn) Tj ET").document();
+    Document document = documentOf(PdfMaker().page("BT 3 Tr /F 10 Tf 1 0 0 1 72 700 Tm (Herrn) Tj ET"));
     EXPECT_THAT(textsOf(document.page(1)), ElementsAre("Herrn"));
 }
 
 TEST(PdfText, DrawnTwiceToLookBoldIsReadOnce) {
-    Document document =
-        PdfMaker()
-            .page(shown(72, 700, "Firma Olaf") + "1 0 0 1 0.3 0 cm " + shown(72, 700, "Firma Olaf"))
-            .document();
+    Document document = documentOf(
+        PdfMaker().page(shown(72, 700, "Firma Olaf") + "1 0 0 1 0.3 0 cm " + shown(72, 700, "Firma Olaf")));
     EXPECT_THAT(textsOf(document.page(1)), ElementsAre("Firma Olaf"));
 }
 
 TEST(PdfText, HasHyphensWhereSoftOnesAreDrawn) {
     // 0xAD is the soft hyphen.
-    Document document = PdfMaker().page(shown(72, 700, "555\\25501\\25599")).document();
+    Document document = documentOf(PdfMaker().page(shown(72, 700, "555\\25501\\25599")));
     EXPECT_THAT(textsOf(document.page(1)), ElementsAre("555-01-99"));
 }
 
 TEST(PdfText, IsAbsentOnAnEmptyPage) {
-    Document document = PdfMaker().page("").document();
+    Document document = documentOf(PdfMaker().page(""));
     EXPECT_THAT(document.page(1).words, IsEmpty());
 }
 
@@ -177,7 +133,7 @@ TEST(SinglePages, ShowWhatThePageShows) {
     maker.page(shown(72, 700, "eins"))
         .page(shown(72, 700, "zwei"), "/MediaBox [0 0 400 300] /Rotate 90")
         .page(shown(72, 700, "drei"));
-    Document document = maker.document();
+    Document document = documentOf(maker);
     ASSERT_EQ(document.pageCount(), 3);
     for (int number = 1; number <= 3; ++number) {
         Document single = openDocument(document.singlePagePdf(number), "single.pdf");
@@ -191,25 +147,19 @@ TEST(SinglePages, ShowWhatThePageShows) {
 TEST(SinglePages, CarryOnlyWhatThePageUses) {
     PdfMaker maker;
     maker.page(shown(72, 700, "eins")).page(shown(72, 700, "zwei"));
-    // A picture that both pages list and neither shows.
     std::string noise;
     for (unsigned i = 0; i < 20000; ++i)
         noise += static_cast<char>((i * 2654435761U) >> 24);
-    QPDFObjectHandle picture = maker.pdf().newStream(noise);
-    picture.getDict().replaceKey("/Subtype", QPDFObjectHandle::newName("/Image"));
-    for (QPDFPageObjectHelper& page : QPDFPageDocumentHelper(maker.pdf()).getAllPages())
-        page.getObjectHandle().getKey("/Resources").replaceKey("/XObject", QPDFObjectHandle::parse("<< >>"));
-    for (QPDFPageObjectHelper& page : QPDFPageDocumentHelper(maker.pdf()).getAllPages())
-        page.getObjectHandle().getKey("/Resources").getKey("/XObject").replaceKey("/Im", picture);
-    Document document = maker.document();
+    maker.listPicture(noise);
+    Document document = documentOf(maker);
     EXPECT_LT(document.singlePagePdf(1).size(), 3000U);
 }
 
 TEST(SinglePages, TakeOverWhatThePageTreeSaysOfAllPages) {
     PdfMaker maker;
     maker.page(shown(72, 700, "eins"), "");
-    maker.pdf().getRoot().getKey("/Pages").replaceKey("/MediaBox", QPDFObjectHandle::parse("[0 0 400 800]"));
-    Document document = maker.document();
+    maker.sayOfAllPages("/MediaBox", "[0 0 400 800]");
+    Document document = documentOf(maker);
     Document single = openDocument(document.singlePagePdf(1), "single.pdf");
     EXPECT_NEAR(single.page(1).width, 400 * HUNDREDTHS, 1);
     EXPECT_THAT(textsOf(single.page(1)), ElementsAre("eins"));
@@ -230,22 +180,14 @@ TEST(EncryptedPdfs, ThatOpenWithoutAPasswordAreReadAndWritten) {
 
 TEST(DamagedPdfs, WithoutPagesSaySo) {
     PdfMaker maker;
-    EXPECT_EQ(complaint([&] { maker.document(); }), "made.pdf: is a damaged PDF; export the document again");
+    EXPECT_EQ(complaint([&] { documentOf(maker); }), "made.pdf: is a damaged PDF; export the document again");
 }
 
 TEST(DamagedPdfs, NameThePageThatIsLost) {
     PdfMaker maker;
     maker.page(shown(72, 700, "eins"));
-    QPDFObjectHandle pages = maker.pdf().getRoot().getKey("/Pages");
-    pages.getKey("/Kids").appendItem(QPDFObjectHandle::newInteger(5));
-    pages.replaceKey("/Count", QPDFObjectHandle::newInteger(2));
-    QPDFWriter writer(maker.pdf());
-    writer.setOutputMemory();
-    writer.setStaticID(true);
-    writer.write();
-    auto const buffer = writer.getBufferSharedPointer();
-    std::string const bytes(reinterpret_cast<char const*>(buffer->getBuffer()), buffer->getSize());
-    Document document = openDocument(bytes, "a.pdf");
+    maker.losePage();
+    Document document = openDocument(maker.bytes(), "a.pdf");
     ASSERT_EQ(document.pageCount(), 2);
     EXPECT_THAT(textsOf(document.page(1)), ElementsAre("eins"));
     char const* const lost = "a.pdf: page 2 is damaged; export the document again";
