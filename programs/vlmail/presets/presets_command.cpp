@@ -10,6 +10,7 @@ void addPresetsCommand(CLI::App& app, Task& task) {
     presets->require_subcommand(1);
     addPresetsMatchCommand(*presets, task);
     addPresetsLintCommand(*presets, task);
+    addPresetsTestCommand(*presets, task);
 }
 
 } // namespace VlMail

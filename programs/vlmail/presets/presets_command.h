@@ -7,5 +7,6 @@ namespace VlMail {
 
 void addPresetsMatchCommand(CLI::App& presets, Task& task);
 void addPresetsLintCommand(CLI::App& presets, Task& task);
+void addPresetsTestCommand(CLI::App& presets, Task& task);
 
 } // namespace VlMail

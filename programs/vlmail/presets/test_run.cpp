@@ -1,0 +1,79 @@
+#include "programs/vlmail/presets/test_run.h"
+
+#include "programs/mailing/pending_file.h"
+#include "programs/reader/document.h"
+#include "programs/vlmail/batch.h"
+#include "programs/vlmail/node_settings.h"
+#include "programs/vlmail/presets/expectation.h"
+#include "programs/vlmail/presets/zones_text.h"
+#include "programs/vlmail/utf8.h"
+
+#include <exception>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+TestResult failed(std::string const& why) { return {Verdict::Failed, {}, onOneLine(validUtf8(why))}; }
+
+json::Object expectationIn(std::filesystem::path const& file) {
+    try {
+        return readExpectation(Reader::readFile(file));
+    } catch (Error const& wrong) {
+        throw Error("its expectation cannot be used: " + std::string(wrong.what()));
+    }
+}
+
+TestResult write(TestCase const& one, DocumentReading const& reading, std::vector<std::string> differences) {
+    Mailing::writeFile(one.expectation, printed(expectationOf(reading)));
+    return {Verdict::Written, std::move(differences), {}};
+}
+
+} // namespace
+
+TestRun::TestRun(NodeSettings const& settings, UpdateExpectations update)
+    : settings_(settings), presets_(settings.presets()), update_(update == UpdateExpectations::Yes) {}
+
+void TestRun::readDocuments(std::vector<TestCase> const& cases, std::size_t workers,
+                            Terminal const& terminal) {
+    std::vector<std::string> files;
+    for (TestCase const& one : cases)
+        if (one.hasDocument() && !one.isZonesText())
+            files.push_back(one.document.string());
+    readBatch(files, settings_, workers, Along::Nothing, terminal, [&](std::size_t index, ReadResult result) {
+        readings_[files[index]] = std::move(result.reading);
+    });
+}
+
+TestResult TestRun::run(TestCase const& one) const {
+    if (!one.hasDocument())
+        return failed("its document is missing; bring it back, or remove the expectation");
+    try {
+        DocumentReading const reading = readingOf(one);
+        return reading.failed() ? failed(reading.error) : compare(one, reading);
+    } catch (std::exception const& failure) {
+        return failed(failure.what());
+    }
+}
+
+DocumentReading TestRun::readingOf(TestCase const& one) const {
+    if (!one.isZonesText())
+        return readings_.at(one.document.string());
+    return readZonesText(Reader::readFile(one.document), validUtf8(one.document.stem().string()), presets_);
+}
+
+TestResult TestRun::compare(TestCase const& one, DocumentReading const& reading) const {
+    if (!std::filesystem::exists(one.expectation)) {
+        if (update_)
+            return write(one, reading, {});
+        return {Verdict::New, {}, "nothing is expected of it yet; --update writes what is found"};
+    }
+    auto const& definitions = presets_.matchExtrPreset(reading.document).zones();
+    std::vector<std::string> found = differences(expectationIn(one.expectation), reading, definitions);
+    if (found.empty())
+        return {};
+    return update_ ? write(one, reading, std::move(found))
+                   : TestResult{Verdict::Differs, std::move(found), {}};
+}
+
+} // namespace VlMail
