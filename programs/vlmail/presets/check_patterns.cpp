@@ -77,6 +77,8 @@ bool growsFast(Pattern const& pattern) {
 }
 
 Trial tryHardLines(Pattern const& pattern) {
+    if (!hasRepetition(outlineOf(pattern.text())))
+        return {};
     std::size_t cost = 0;
     Trial trial = hardest(pattern, SHORT_LINE, cost);
     if (cost == BUDGET) {

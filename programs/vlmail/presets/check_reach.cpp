@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cctype>
 #include <limits>
 #include <optional>
 #include <string>
@@ -39,6 +40,8 @@ struct Reachable {
     ListedExtractPreset const& listed;
     std::optional<Pattern> pattern;
     std::vector<std::string> names;
+    /// The expression fits one name alone, but for letter case.
+    bool hasOneName = false;
 
     bool fits(std::string const& name) const {
         return pattern && pattern->fits(name) == Pattern::Answer::Yes;
@@ -57,8 +60,14 @@ std::optional<Pattern> compiled(std::string const& text) {
     }
 }
 
+bool isOneName(std::vector<PatternSequence> const& outline) {
+    return outline.size() == 1 && std::ranges::all_of(outline.front(), [](PatternPiece const& piece) {
+               return piece.kind == PatternPiece::Kind::Literal && piece.least == piece.most;
+           });
+}
+
 Reachable reachable(ListedExtractPreset const& listed) {
-    Reachable preset{listed, compiled(listed.match()), {}};
+    Reachable preset{listed, compiled(listed.match()), {}, isOneName(outlineOf(listed.match()))};
     if (preset.pattern)
         preset.names = samplesOf(*preset.pattern, SAMPLES);
     return preset;
@@ -71,15 +80,25 @@ std::vector<Reachable> allReachable(PresetsDocument const& document) {
     return presets;
 }
 
+bool isSameLetter(unsigned char a, unsigned char b) {
+    // Beyond ASCII the engine knows more of letter case.
+    return a >= 0x80 || b >= 0x80 || std::tolower(a) == std::tolower(b);
+}
+
+/// Told without the engine: there may be thousands of presets that were made for one name each.
+bool haveOtherNames(Reachable const& a, Reachable const& b) {
+    return a.hasOneName && b.hasOneName &&
+           !std::ranges::equal(a.listed.match(), b.listed.match(), isSameLetter);
+}
+
+bool shadows(Reachable const& earlier, Reachable const& later) {
+    bool const hasTooFew = earlier.hasOneName && !later.hasOneName;
+    return !hasTooFew && !haveOtherNames(earlier, later) && earlier.fitsAll(later.names);
+}
+
 /// Whether nothing is left for `later`, beyond doubt: not by its samples alone.
 bool surelyShadows(Reachable const& earlier, Reachable const& later) {
-    bool const hasOneName =
-        std::ranges::all_of(outlineOf(later.listed.match()), [](PatternSequence const& pieces) {
-            return std::ranges::all_of(pieces, [](PatternPiece const& piece) {
-                return piece.kind == PatternPiece::Kind::Literal && piece.least == piece.most;
-            });
-        });
-    return earlier.listed.match() == later.listed.match() || hasOneName || earlier.fitsAll(ODD_NAMES);
+    return earlier.listed.match() == later.listed.match() || later.hasOneName || earlier.fitsAll(ODD_NAMES);
 }
 
 std::string orderInWords(ListedExtractPreset const& preset) {
@@ -95,7 +114,7 @@ std::string precedence(ListedExtractPreset const& earlier, ListedExtractPreset c
 
 void reportShadow(Reachable const& earlier, Reachable const& later, Findings& findings) {
     findings.add(surelyShadows(earlier, later) ? UnreachablePreset : ShadowedPreset, later.listed.place,
-                 {earlier.listed.inWords(), earlier.listed.place.pointer(),
+                 {inWords(earlier.listed.preset), earlier.listed.place.pointer(),
                   precedence(earlier.listed, later.listed), std::to_string(earlier.listed.preset.order()),
                   inQuotes(later.names.back())});
 }
@@ -105,11 +124,13 @@ bool usesOrder(PresetsDocument const& document) {
                                [](auto const& preset) { return preset.preset.order() != 0; });
 }
 
-/// Names that both may fit: those of each, and one of the first in front of one of the second.
+/// Names that both may fit: those of each, and one of the first joined with one of the second.
 std::vector<std::string> commonCandidates(Reachable const& a, Reachable const& b) {
     constexpr std::size_t JOINED = 4;
     std::vector<std::string> names = a.names;
     names.insert(names.end(), b.names.begin(), b.names.end());
+    if (a.hasOneName || b.hasOneName)
+        return names;
     for (std::size_t i = 0; i < std::min(JOINED, a.names.size()); ++i) {
         for (std::size_t j = 0; j < std::min(JOINED, b.names.size()); ++j) {
             names.push_back(a.names[i] + b.names[j]);
@@ -121,12 +142,30 @@ std::vector<std::string> commonCandidates(Reachable const& a, Reachable const& b
 
 /// A name that both fit, unless the first gets all names of the second.
 std::optional<std::string> sharedName(Reachable const& first, Reachable const& second) {
-    if (first.fitsAll(second.names))
+    if (haveOtherNames(first, second) || first.fitsAll(second.names))
         return std::nullopt;
     std::vector<std::string> const names = commonCandidates(first, second);
     auto const shared = std::ranges::find_if(
         names, [&](std::string const& name) { return first.fits(name) && second.fits(name); });
     return shared == names.end() ? std::nullopt : std::optional(*shared);
+}
+
+void checkTie(Reachable const& earlier, Reachable const& later, Findings& findings) {
+    int const order = later.listed.preset.order();
+    if (earlier.listed.preset.order() != order)
+        return;
+    if (auto const name = sharedName(earlier, later))
+        findings.add(OrderTie, later.listed.place,
+                     {inWords(earlier.listed.preset), earlier.listed.place.pointer(), std::to_string(order),
+                      inQuotes(*name)});
+}
+
+/// Programs give it to catch-alls, and to presets that are made for one document and age out.
+void checkLastOrder(Reachable const& preset, Findings& findings) {
+    constexpr int LAST = std::numeric_limits<int>::max();
+    Cfg::ExtractPreset const& extract = preset.listed.preset;
+    if (extract.order() == LAST && !extract.lastUsedIsSet() && !preset.fitsAll(ODD_NAMES))
+        findings.add(LastOrder, preset.listed.place / "order", {std::to_string(LAST)});
 }
 
 bool hasEnding(std::string const& name) { return name.find('.') != std::string::npos; }
@@ -163,8 +202,8 @@ void checkReach(PresetsDocument const& document, Findings& findings) {
         // What a parent offers may well be replaced here.
         if (later->names.empty() || later->listed.inherited)
             continue;
-        auto const earlier = std::find_if(
-            presets.begin(), later, [&](Reachable const& preset) { return preset.fitsAll(later->names); });
+        auto const earlier = std::find_if(presets.begin(), later,
+                                          [&](Reachable const& preset) { return shadows(preset, *later); });
         if (earlier != later)
             reportShadow(*earlier, *later, findings);
     }
@@ -175,16 +214,9 @@ void checkOrders(PresetsDocument const& document, Findings& findings) {
         return;
     std::vector<Reachable> const presets = allReachable(document);
     for (auto later = presets.begin(); later != presets.end(); ++later) {
-        long long const order = later->listed.preset.order();
-        if (order == std::numeric_limits<int>::max() && !later->fitsAll(ODD_NAMES))
-            findings.add(LastOrder, later->listed.place / "order", {std::to_string(order)});
-        for (auto earlier = presets.begin(); earlier != later; ++earlier) {
-            auto const name = sharedName(*earlier, *later);
-            if (earlier->listed.preset.order() == order && name)
-                findings.add(OrderTie, later->listed.place,
-                             {earlier->listed.inWords(), earlier->listed.place.pointer(),
-                              std::to_string(order), inQuotes(*name)});
-        }
+        checkLastOrder(*later, findings);
+        for (auto earlier = presets.begin(); earlier != later; ++earlier)
+            checkTie(*earlier, *later, findings);
     }
 }
 

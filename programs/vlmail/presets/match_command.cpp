@@ -31,9 +31,9 @@ struct Options {
 /// A preset that was tried, or the one that was taken.
 struct Tried {
     std::size_t number = 0;
-    ListedExtractPreset listed;
-    /// Comes from the defaults and stands in no document.
-    bool byDefault = false;
+    Cfg::ExtractPreset const* preset = nullptr;
+    /// None for one that comes from the defaults.
+    std::optional<Place> place;
     WhyNot why;
 };
 
@@ -48,60 +48,62 @@ struct Found {
     std::string error;
 };
 
-/// The presets of the settings with their places.
+/// The presets of the settings with their places. What it finds points into it.
 class Finder {
 public:
     Finder(NodeSettings const& settings, std::string const& text)
-        : settings_(settings), document_(text), presets_(settings.presets()) {}
+        : document_(text), presets_(settings.presets()) {}
 
     Found find(std::string const& name) const {
         Found found{name, {}, {}, {}, {}, {}};
-        std::size_t number = 0;
-        for (auto const& element : presets_.elements<ExtractPresets>()) {
-            Tried tried = triedAt(number++, element.value);
-            try {
-                if (element.value.match(name)) {
-                    found.taken = std::move(tried);
-                    findPack(found);
-                    return found;
-                }
-            } catch (std::exception const& failure) {
-                found.error = "preset " + std::to_string(number) + ", " + tried.listed.inWords() +
-                              ", cannot be tried: " + failure.what() +
-                              "; correct it, or no later preset is reached";
+        for (auto const& element : presets_.elements<ExtractPresets>())
+            if (endsWith(element.value, found))
                 return found;
-            }
-            tried.why = whyNot(element.value.strRegex(), name);
-            found.earlier.push_back(std::move(tried));
-        }
         found.error = "no extraction preset fits; add one, such as \".*\"";
         return found;
     }
 
 private:
-    Tried triedAt(std::size_t index, Cfg::ExtractPreset const& preset) const {
+    /// Whether the search ends with this preset, because it fits or fails.
+    bool endsWith(Cfg::ExtractPreset const& preset, Found& found) const {
+        Tried tried{found.earlier.size() + 1, &preset, placeAt(found.earlier.size()), {}};
+        try {
+            if (preset.match(found.name)) {
+                found.taken = std::move(tried);
+                findPack(found);
+                return true;
+            }
+        } catch (std::exception const& failure) {
+            found.error = "preset " + std::to_string(tried.number) + ", " + inWords(preset) +
+                          ", cannot be tried: " + failure.what() +
+                          "; correct it, or no later preset is reached";
+            return true;
+        }
+        tried.why = whyNot(preset.strRegex(), found.name);
+        found.earlier.push_back(std::move(tried));
+        return false;
+    }
+
+    std::optional<Place> placeAt(std::size_t index) const {
         auto const& all = document_.extractPresets();
-        if (index < all.size())
-            return {index + 1, all[index], false, {}};
-        return {index + 1, ListedExtractPreset{{}, {}, true, preset, {}}, true, {}};
+        return index < all.size() ? std::optional(all[index].place) : std::nullopt;
     }
 
     void findPack(Found& found) const {
-        found.packPreset = found.taken->listed.preset.packPresetName();
+        found.packPreset = found.taken->preset->packPresetName();
         auto const& packs = presets_.elements<PackPresets>();
         bool const isThere = std::any_of(packs.begin(), packs.end(), [&](auto const& element) {
             return element.value.name() == found.packPreset;
         });
         if (!isThere)
             found.error = "there is no pack preset " + inQuotes(found.packPreset) +
-                          "; add it, or name another one in " + found.taken->listed.inWords();
+                          "; add it, or name another one in " + inWords(*found.taken->preset);
         auto const listed =
             std::ranges::find(document_.packPresets(), found.packPreset, &ListedPackPreset::name);
         if (listed != document_.packPresets().end())
             found.packPlace = listed->place;
     }
 
-    NodeSettings const& settings_;
     PresetsDocument document_;
     Cfg::Presets presets_;
 };
@@ -111,11 +113,10 @@ json::Value placeOrNull(std::optional<Place> const& place) {
 }
 
 json::Object toJson(Tried const& tried) {
-    Cfg::ExtractPreset const& preset = tried.listed.preset;
     return {{"number", tried.number},
-            {"name", preset.name()},
-            {"match", preset.strRegex()},
-            {"place", placeOrNull(tried.byDefault ? std::nullopt : std::optional(tried.listed.place))}};
+            {"name", tried.preset->name()},
+            {"match", tried.preset->strRegex()},
+            {"place", placeOrNull(tried.place)}};
 }
 
 json::Object toJson(Found const& found) {
@@ -139,20 +140,23 @@ json::Object toJson(Found const& found) {
     return object;
 }
 
-std::string placeInWords(Tried const& tried) {
-    return tried.byDefault ? "added by default" : tried.listed.place.pointer();
+std::string placeInWords(std::optional<Place> const& place) {
+    return place ? place->pointer() : "added by default";
+}
+
+std::string numbered(Tried const& tried) {
+    return std::to_string(tried.number) + ". " + inWords(*tried.preset);
 }
 
 void print(std::ostream& out, Found const& found) {
     out << found.name << '\n';
     for (Tried const& tried : found.earlier)
-        out << "  " << tried.number << ". " << tried.listed.inWords() << ": no, " << tried.why.words << '\n';
+        out << "  " << numbered(tried) << ": no, " << tried.why.words << '\n';
     if (found.taken)
-        out << "  " << found.taken->number << ". " << found.taken->listed.inWords() << ": yes, "
-            << placeInWords(*found.taken) << '\n';
+        out << "  " << numbered(*found.taken) << ": yes, " << placeInWords(found.taken->place) << '\n';
     if (found.error.empty())
         out << "  sent by the pack preset " << inQuotes(found.packPreset) << ", "
-            << (found.packPlace ? found.packPlace->pointer() : "added by default") << '\n';
+            << placeInWords(found.packPlace) << '\n';
 }
 
 int match(Options const& options, Terminal const& terminal) {

@@ -489,6 +489,14 @@ std::string lineOf(Run const& run, std::string const& tail, std::size_t length) 
 
 std::vector<PatternSequence> outlineOf(std::string_view pattern) { return OutlineParser(pattern).whole(); }
 
+bool hasRepetition(std::vector<PatternSequence> const& outline) {
+    return std::ranges::any_of(outline, [](PatternSequence const& pieces) {
+        return std::ranges::any_of(pieces, [](PatternPiece const& piece) {
+            return piece.most > 1 || hasRepetition(piece.alternatives);
+        });
+    });
+}
+
 PatternSequence withJoinedLiterals(PatternSequence const& pieces) {
     auto const isPlain = [](PatternPiece const& piece) {
         return piece.kind == Kind::Literal && piece.least == 1 && piece.most == 1;

@@ -44,6 +44,9 @@ using PatternSequence = std::vector<PatternPiece>;
 /// gives what can be told of it.
 std::vector<PatternSequence> outlineOf(std::string_view pattern);
 
+/// Whether a part of it may stand in a row more than once.
+bool hasRepetition(std::vector<PatternSequence> const& outline);
+
 /// Joins neighbouring literals, as people read them.
 PatternSequence withJoinedLiterals(PatternSequence const& pieces);
 

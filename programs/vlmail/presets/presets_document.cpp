@@ -95,9 +95,9 @@ Unwrapped unwrap(json::Value const& node, Place const& place) {
     return {node.toObject().get("v"), place / "v", true};
 }
 
-std::string ListedExtractPreset::inWords() const {
-    return preset.name().empty() ? inQuotes(match())
-                                 : inQuotes(preset.name()) + " (" + inQuotes(match()) + ')';
+std::string inWords(Cfg::ExtractPreset const& preset) {
+    std::string const match = inQuotes(preset.strRegex());
+    return preset.name().empty() ? match : inQuotes(preset.name()) + " (" + match + ')';
 }
 
 PresetsDocument::PresetsDocument(std::string const& text)

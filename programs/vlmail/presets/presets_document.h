@@ -42,9 +42,10 @@ struct ListedExtractPreset {
     std::vector<ListedZone> zones;
 
     std::string const& match() const { return preset.strRegex(); }
-    /// Its name and expression for people.
-    std::string inWords() const;
 };
+
+/// Its name and expression for people.
+std::string inWords(Cfg::ExtractPreset const& preset);
 
 struct ListedPackPreset {
     Place place;

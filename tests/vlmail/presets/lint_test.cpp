@@ -216,6 +216,11 @@ std::vector<Case> const CASES{
      partOf(preset(R"_("match": "invoice.*", "order": 2147483647, "pack_preset": "P")_")),
      {"warning /extract_presets/0/order: 2147483647 is the last order there is, which a preset has that was "
       "never given one: nothing can be tried after it | give it an \"order\" of its own [last-order]"}},
+    {"NothingInPresetsThatAgeOut",
+     partOf(preset(R"_("match": "a\\.pdf", "order": 2147483647, "last_used": 1, "pack_preset": "P")_") +
+            ", " +
+            preset(R"_("match": "b\\.pdf", "order": 2147483647, "last_used": 1, "pack_preset": "P")_")),
+     {}},
     {"ATombstone",
      R"_({"extract_presets": [{"match": "a.*", "erase_me": true}], "pack_presets": []})_",
      {"error /extract_presets/0/erase_me: the preset is marked for deletion and is tried all the same: "
