@@ -76,6 +76,7 @@ private:
                     millimetres(page.get(WIDTH).intOrZero()) + " by " +
                     millimetres(page.get(HEIGHT).intOrZero()) +
                     (page.get(BEGINS_LETTER).isTrue() ? ": a letter begins here" : ": begins no letter"));
+        isLetter_ = page.get(BEGINS_LETTER).isTrue();
         for (json::Value const& zone : page.get(ZONES).toArray())
             printZone(zone.toObject());
     }
@@ -122,7 +123,7 @@ private:
         printEvidence(field);
     }
 
-    static std::string outcomeInWords(json::Object const& field) {
+    std::string outcomeInWords(json::Object const& field) const {
         static std::map<std::string, std::string, std::less<>> const WORDS{
             {OUTCOME_FOUND, "found"},
             {OUTCOME_INVALID, "INVALID"},
@@ -132,7 +133,7 @@ private:
         };
         auto const words = WORDS.find(textOf(field, OUTCOME));
         std::string text = words == WORDS.end() ? std::string() : words->second;
-        bool const isMissing = field.get(OBLIGATORY).isTrue() && !field.get(VALUE);
+        bool const isMissing = isLetter_ && field.get(OBLIGATORY).isTrue() && !field.get(VALUE);
         if (isMissing)
             text = "MISSING";
         text.resize(std::max<std::size_t>(text.size(), 12), ' ');
@@ -175,6 +176,8 @@ private:
     }
 
     std::ostream& out_;
+    /// The page that is printed begins a letter.
+    bool isLetter_ = false;
 };
 
 } // namespace

@@ -37,6 +37,7 @@ using Kind = NearMissKind;
 
 constexpr std::array WAYS{
     Way{Kind::NoText, "no_text", AppliesTo::Missing, Weight::Certain, NearMisses::noText},
+    Way{Kind::Failure, "failure", AppliesTo::Missing, Weight::Certain, NearMisses::failure},
     Way{Kind::ValueGroup, "value_group", AppliesTo::Missing, Weight::Certain, NearMisses::valueGroup},
     Way{Kind::EarlierField, "earlier_field", AppliesTo::Missing, Weight::Certain, NearMisses::earlierField},
     Way{Kind::Limit, "limit", AppliesTo::Refused, Weight::Certain, NearMisses::limit},
@@ -46,6 +47,7 @@ constexpr std::array WAYS{
     Way{Kind::Blanks, "blanks", AppliesTo::Missing, Weight::Likely, NearMisses::blanks},
     Way{Kind::Gaps, "gaps", AppliesTo::Both, Weight::Likely, NearMisses::gaps},
     Way{Kind::JoinedLines, "joined_lines", AppliesTo::Both, Weight::Likely, NearMisses::joinedLines},
+    Way{Kind::Anchor, "anchor", AppliesTo::Missing, Weight::Likely, NearMisses::anchor},
     Way{Kind::LineDistance, "line_distance", AppliesTo::Both, Weight::Likely, NearMisses::lineDistance},
     Way{Kind::Zone, "zone", AppliesTo::Both, Weight::Likely, NearMisses::zone},
     Way{Kind::Block, "block", AppliesTo::Both, Weight::Likely, NearMisses::block},
@@ -97,7 +99,7 @@ std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages) 
     LaidOutPage const* const page = pages.page(missed.page);
     if (!page || missed.field.definition->strRegex().empty())
         return {};
-    CountedLog const log;
+    KeptLog const log;
     Search const search(missed, pages, *page, log);
     Collected collected;
     bool isExplained = false;

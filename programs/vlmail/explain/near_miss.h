@@ -13,6 +13,7 @@ namespace VlMail {
 /// In the order in which they are told, the likeliest first; docs/explain.md has a table of them.
 enum class NearMissKind {
     NoText,
+    Failure,
     ValueGroup,
     EarlierField,
     Limit,
@@ -22,6 +23,7 @@ enum class NearMissKind {
     Blanks,
     Gaps,
     JoinedLines,
+    Anchor,
     LineDistance,
     Zone,
     Block,

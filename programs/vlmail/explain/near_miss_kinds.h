@@ -9,6 +9,7 @@ namespace VlMail::NearMisses {
 
 // Of a field that was not found: the pattern or the writing of the text (near_miss_pattern.cpp).
 
+std::optional<Found> failure(Search const& search);
 std::optional<Found> valueGroup(Search const& search);
 std::optional<Found> earlierField(Search const& search);
 std::optional<Found> letterCase(Search const& search);
@@ -16,6 +17,7 @@ std::optional<Found> normalisation(Search const& search);
 std::optional<Found> lookAlike(Search const& search);
 std::optional<Found> blanks(Search const& search);
 std::optional<Found> joinedLines(Search const& search);
+std::optional<Found> anchor(Search const& search);
 std::optional<Found> literal(Search const& search);
 std::optional<Found> rest(Search const& search);
 

@@ -115,22 +115,32 @@ public:
 
     bool has(std::string const& literal) const {
         return std::any_of(texts_.begin(), texts_.end(), [&](auto const& page) {
-            std::string const& text = page.second.text();
-            return ignoresCase_ ? foldedCase(text).find(foldedCase(literal)) != std::string::npos
-                                : text.find(literal) != std::string::npos;
+            return placeIn(page.second.text(), literal) != std::string::npos;
         });
+    }
+
+    /// Its page and the whole of the first line that has the literal; it must be there.
+    std::pair<int, Stretch> lineWith(std::string const& literal) const {
+        auto const found = std::find_if(texts_.begin(), texts_.end(), [&](auto const& page) {
+            return placeIn(page.second.text(), literal) != std::string::npos;
+        });
+        auto const& [page, text] = *found;
+        // Folding case may change the length of a text, but not its line breaks.
+        std::string const searched = written(text.text());
+        std::string_view const before = std::string_view(searched).substr(0, placeIn(text.text(), literal));
+        return {page, linesOf(text, lineBreaksIn(before), 1)};
     }
 
     /// Near enough to be what was meant.
     std::optional<Likest> likest(std::string const& literal) const {
-        constexpr std::size_t MIN_LETTERS = 4;
+        constexpr std::size_t MIN_LETTERS = 5;
         std::size_t const letters = letterCount(literal);
         if (letters < MIN_LETTERS)
             return std::nullopt;
         Likest best;
         for (auto const& [page, text] : texts_)
             offerLines(best, page, text, literal);
-        return best.distance <= letters / 3 ? std::optional(best) : std::nullopt;
+        return best.distance <= letters / 4 ? std::optional(best) : std::nullopt;
     }
 
     std::string whereLooked() const {
@@ -139,6 +149,11 @@ public:
     }
 
 private:
+    std::string written(std::string const& text) const { return ignoresCase_ ? foldedCase(text) : text; }
+    std::size_t placeIn(std::string const& text, std::string const& literal) const {
+        return written(text).find(written(literal));
+    }
+
     void add(LaidOutPage const& page) { texts_.emplace_back(page.page->number, Search::everythingOn(page)); }
 
     static void offerLines(Likest& best, int page, ZoneText const& text, std::string const& literal) {
@@ -158,15 +173,56 @@ private:
     bool isComplete_ = false;
 };
 
+/// The longest literal that the letter does not have.
+std::optional<std::string> absentLiteral(Lookup const& lookup, std::vector<std::string> const& literals) {
+    auto const absent = std::find_if(literals.begin(), literals.end(),
+                                     [&](std::string const& literal) { return !lookup.has(literal); });
+    return absent == literals.end() ? std::nullopt : std::optional(*absent);
+}
+
+/// All literals of the pattern are in the letter: tells where the longest one stands.
+std::optional<Found> standingSomewhere(Search const& search) {
+    std::vector<std::string> const literals = literalsOf(search.pattern());
+    if (literals.empty())
+        return std::nullopt;
+    Lookup const lookup(search);
+    if (absentLiteral(lookup, literals))
+        return std::nullopt;
+    auto const [page, line] = lookup.lineWith(literals.front());
+    return Found{inQuotes(literals.front()) + " of the pattern stands in " + excerpt(line.text) +
+                     " on page " + std::to_string(page) + ", but the rest of the pattern does not fit there",
+                 line.text, page, line.box, false};
+}
+
 /// Whether it says anything that the front of a pattern fits: a pattern that begins with ".*" fits
 /// everywhere.
 bool isTelling(PatternCut const& cut) {
     return !literalsOf(cut.front).empty() || literalsOf(cut.rest).empty();
 }
 
+/// What the engine says, in the library's message.
+std::string reasonIn(std::string message) {
+    constexpr std::string_view LEAD = "Extract field failed with ";
+    if (message.starts_with(LEAD))
+        message.erase(0, LEAD.size());
+    if (message.ends_with('.'))
+        message.pop_back();
+    return message;
+}
+
 bool isBlank(std::string_view text) { return text.find_first_not_of(" \n") == std::string_view::npos; }
 
 } // namespace
+
+std::optional<Found> failure(Search const& search) {
+    std::string const whose = search.isGivenUp() ? "patterns of the fields before it" : "the pattern";
+    std::size_t const before = search.isGivenUp() ? 0 : search.failures().size();
+    search.find(search.searchedText());
+    if (search.failures().size() == before)
+        return std::nullopt;
+    return Found{whose + " cannot be searched in this text: " + reasonIn(search.failures().back()) +
+                 "; let it repeat fewer things inside each other"};
+}
 
 std::optional<Found> valueGroup(Search const& search) {
     auto const hit =
@@ -253,12 +309,28 @@ std::optional<Found> joinedLines(Search const& search) {
     return best.take();
 }
 
+std::optional<Found> anchor(Search const& search) {
+    // A pattern without literals fits something on every page once it may begin and end anywhere.
+    if (literalsOf(search.pattern()).empty())
+        return std::nullopt;
+    auto const [front, core, end] = anchorsOf(search.pattern());
+    Best best;
+    if (!front.empty())
+        best.offer(byPattern(search, core + end,
+                             " without ^ at its front: other text stands before it in its line"));
+    if (!end.empty() && !best.isValid())
+        best.offer(byPattern(search, front + core,
+                             " without $ at its end: other text stands behind it in its line"));
+    if (!front.empty() && !end.empty() && !best.isValid())
+        best.offer(byPattern(search, core,
+                             " without ^ and $: other text stands before it and behind it in its line"));
+    return best.take();
+}
+
 std::optional<Found> literal(Search const& search) {
-    std::vector<std::string> const literals = literalsOf(search.pattern());
     Lookup const lookup(search);
-    auto const absent = std::find_if(literals.begin(), literals.end(),
-                                     [&](std::string const& one) { return !lookup.has(one); });
-    if (absent == literals.end())
+    std::optional<std::string> const absent = absentLiteral(lookup, literalsOf(search.pattern()));
+    if (!absent)
         return std::nullopt;
     Found found{inQuotes(*absent) + " of the pattern occurs nowhere " + lookup.whereLooked()};
     auto const likest = lookup.likest(*absent);
@@ -290,7 +362,7 @@ std::optional<Found> rest(Search const& search) {
                            " behind it does not fit " + inQuotes(cut.rest);
         return Found{std::move(says), stretch.text, search.pageNumber(), stretch.box, false};
     }
-    return std::nullopt;
+    return standingSomewhere(search);
 }
 
 } // namespace VlMail::NearMisses

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <span>
 
 namespace VlMail::NearMisses {
 
@@ -26,24 +27,25 @@ constexpr long long NEAR = 2000;
 struct Rule {
     char const* key;
     double LayoutRules::*member;
-    std::array<double, 9> larger;
-    std::array<double, 5> smaller;
+    std::span<double const> larger;
+    std::span<double const> smaller;
 };
 
-constexpr Rule GAPS{"max_spaces_between_fragments",
-                    &LayoutRules::maxSpaces,
-                    {4, 5, 7, 10, 15, 20, 30, 60, 120},
-                    {2.5, 2, 1.5, 1, 0.5}};
-constexpr Rule LINE_DISTANCE{"max_line_distance",
-                             &LayoutRules::maxLineDistance,
-                             {2, 2.2, 2.5, 3, 3.5, 4, 5, 6, 8},
-                             {1.6, 1.5, 1.4, 1.2, 1}};
+constexpr std::array LARGER_GAPS{4.0, 5.0, 7.0, 10.0, 15.0, 20.0, 30.0, 60.0, 120.0};
+constexpr std::array SMALLER_GAPS{2.5, 2.0, 1.5};
+constexpr Rule GAPS{"max_spaces_between_fragments", &LayoutRules::maxSpaces, LARGER_GAPS, SMALLER_GAPS};
+
+/// With more than a blank line between them, lines are no block.
+constexpr std::array LARGER_DISTANCES{2.0, 2.2, 2.5, 3.0};
+constexpr std::array SMALLER_DISTANCES{1.6, 1.4, 1.2};
+constexpr Rule LINE_DISTANCE{"max_line_distance", &LayoutRules::maxLineDistance, LARGER_DISTANCES,
+                             SMALLER_DISTANCES};
 
 std::optional<Found> withRule(Search const& search, Rule const& rule, double value) {
     LayoutRules rules = search.pages().rules();
     double const current = rules.*rule.member;
     rules.*rule.member = value;
-    LaidOutPage const page = ReadPages::laidOut(search.page(), rules);
+    LaidOutPage const& page = search.pages().laidOut(*search.page().page, rules);
     return search.told(
         search.find(search.remaining(search.textOn(page))), search.pageNumber(), [&](Hit const& hit) {
             return "would match " + excerpt(hit.match.text) + " with " + inQuotes(rule.key) + " at " +
@@ -52,18 +54,14 @@ std::optional<Found> withRule(Search const& search, Rule const& rule, double val
         });
 }
 
-std::optional<Found> byLargerValue(Search const& search, Rule const& rule) {
+std::optional<Found> byRule(Search const& search, Rule const& rule) {
+    double const current = search.pages().rules().*rule.member;
     Best best;
     for (double const value : rule.larger)
-        if (value > search.pages().rules().*rule.member && !best.isValid())
+        if (value > current && !best.isValid())
             best.offer(withRule(search, rule, value));
-    return best.take();
-}
-
-std::optional<Found> bySmallerValue(Search const& search, Rule const& rule) {
-    Best best;
     for (double const value : rule.smaller)
-        if (value < search.pages().rules().*rule.member && !best.isValid())
+        if (value < current && !best.isValid())
             best.offer(withRule(search, rule, value));
     return best.take();
 }
@@ -111,6 +109,12 @@ std::string pointInWords(Point point) {
     return "(" + millimetres(point.x) + ", " + millimetres(point.y) + ")";
 }
 
+/// Only what takes all of a zone's text stands for the zone: other fields of it may be where they should.
+std::string pointAdvice(Search const& search, Point from, Point to) {
+    return search.takesWholeText() ? "move the point from " + pointInWords(from) + " to " + pointInWords(to)
+                                   : "give the field a zone of its own with the point " + pointInWords(to);
+}
+
 std::vector<Box> blocksByDistance(Search const& search, Point point) {
     std::vector<Box> boxes;
     for (Reader::Block const& block : search.page().layout.blocks)
@@ -144,12 +148,6 @@ std::optional<Found> onPage(Search const& search, LaidOutPage const& page) {
     return best.take();
 }
 
-/// How far the zone is from the hit; 0 for a zone that is found by its point.
-ZoneChange changeFor(Search const& search, Hit const& hit) {
-    Box const zone = search.zone().hasLocation() ? search.location() : hit.match.box;
-    return grownToHold(zone, hit.match.box);
-}
-
 } // namespace
 
 std::optional<Found> noText(Search const& search) {
@@ -166,24 +164,13 @@ std::optional<Found> noText(Search const& search) {
 }
 
 std::optional<Found> gaps(Search const& search) {
-    Best best;
     // A pattern for all of a zone's text would fit columns that are joined to fewer lines.
-    if (!search.takesWholeText())
-        best.offer(byLargerValue(search, GAPS));
-    if (!best.isValid())
-        best.offer(bySmallerValue(search, GAPS));
-    return best.take();
+    return search.takesWholeText() ? std::nullopt : byRule(search, GAPS);
 }
 
 std::optional<Found> lineDistance(Search const& search) {
     // The zone's text depends on blocks only where it is found by its point.
-    if (search.zone().hasLocation())
-        return std::nullopt;
-    Best best;
-    best.offer(byLargerValue(search, LINE_DISTANCE));
-    if (!best.isValid())
-        best.offer(bySmallerValue(search, LINE_DISTANCE));
-    return best.take();
+    return search.zone().hasLocation() ? std::nullopt : byRule(search, LINE_DISTANCE);
 }
 
 std::optional<Found> zone(Search const& search) {
@@ -212,13 +199,12 @@ std::optional<Found> block(Search const& search) {
             break;
         Point const middle = middleOf(box);
         ZoneText text = ZoneText::nearest(*search.page().page, search.page().layout, middle);
-        best.offer(
-            search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), [&](Hit const&) {
-                return "would match in the text block " +
-                       millimetres(wholeMillimetres(box.distanceTo(point))) + " away from the point of the " +
-                       search.zoneName() + ": move the point from " + pointInWords(point) + " to " +
-                       pointInWords(middle);
-            }));
+        auto const says = [&](Hit const&) {
+            return "would match in the text block " + millimetres(wholeMillimetres(box.distanceTo(point))) +
+                   " away from the point of the " + search.zoneName() + ": " +
+                   pointAdvice(search, point, middle);
+        };
+        best.offer(search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), says));
     }
     return best.take();
 }
@@ -250,18 +236,16 @@ std::optional<Found> otherPage(Search const& search) {
 }
 
 std::optional<Found> elsewhere(Search const& search) {
-    if (search.takesWholeText())
+    // Of a zone at a point all blocks have been looked at.
+    if (search.takesWholeText() || !search.zone().hasLocation())
         return std::nullopt;
     Best best;
     for (Hit const& hit : hitsOn(search, search.page())) {
-        ZoneChange const change = changeFor(search, hit);
-        bool const isFar = change.distance() > NEAR || !search.zone().hasLocation();
-        if (!isFar)
+        ZoneChange const change = grownToHold(search.location(), hit.match.box);
+        if (change.distance() <= NEAR)
             continue;
         best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
-            std::string const where = search.zone().hasLocation() ? change.where("the " + search.zoneName())
-                                                                  : "outside the " + search.zoneName();
-            return "would match " + excerpt(at.match.text) + " " + where +
+            return "would match " + excerpt(at.match.text) + " " + change.where("the " + search.zoneName()) +
                    ": move the zone there, or give the field a zone of its own";
         }));
     }

@@ -17,8 +17,7 @@ using Reader::ZoneText;
 namespace {
 
 constexpr std::size_t MAX_OTHER_PAGES = 20;
-/// A pattern that the engine gave up so often is left alone: each time may have cost seconds.
-constexpr int MAX_FAILURES = 2;
+constexpr std::size_t MAX_FAILURES = 2;
 
 constexpr Box EVERYWHERE{std::numeric_limits<int>::min(), std::numeric_limits<int>::min(),
                          std::numeric_limits<int>::max(), std::numeric_limits<int>::max()};
@@ -34,9 +33,10 @@ bool isValid(ExtractField const& field, ExtractedField value) {
 
 } // namespace
 
-CountedLog::CountedLog() : before_(Log::setSink([this](LogPriority, std::string const&) { ++lines_; })) {}
+KeptLog::KeptLog()
+    : before_(Log::setSink([this](LogPriority, std::string const& line) { lines_.push_back(line); })) {}
 
-CountedLog::~CountedLog() { Log::setSink(std::move(before_)); }
+KeptLog::~KeptLog() { Log::setSink(std::move(before_)); }
 
 std::string Search::zoneName() const { return "zone " + inQuotes(zone().name()); }
 
@@ -59,7 +59,8 @@ ZoneText Search::everythingOn(LaidOutPage const& page) {
 
 ZoneText Search::remaining(ZoneText text) const {
     for (FieldTrace const* const earlier : earlierFields())
-        cutField(*earlier->definition, text);
+        if (!isGivenUp())
+            cutField(*earlier->definition, text);
     return text;
 }
 
@@ -104,6 +105,6 @@ std::optional<PlainHit> Search::find(ExtractField const& field, std::string text
     return hit;
 }
 
-bool Search::isGivenUp() const { return log_.lines() >= MAX_FAILURES; }
+bool Search::isGivenUp() const { return log_.lines().size() >= MAX_FAILURES; }
 
 } // namespace VlMail

@@ -16,18 +16,19 @@ namespace VlMail {
 /// Patterns are tried so often at most for one kind of near miss.
 constexpr std::size_t MAX_TRIES = 300;
 
-/// Counts the library's messages instead of writing them, as long as it lives.
-class CountedLog {
+/// Keeps the library's messages from being written, as long as it lives. The library has one for each pattern
+/// that fails.
+class KeptLog {
 public:
-    CountedLog();
-    ~CountedLog();
-    CountedLog(CountedLog const&) = delete;
-    CountedLog& operator=(CountedLog const&) = delete;
+    KeptLog();
+    ~KeptLog();
+    KeptLog(KeptLog const&) = delete;
+    KeptLog& operator=(KeptLog const&) = delete;
 
-    int lines() const { return lines_; }
+    std::vector<std::string> const& lines() const { return lines_; }
 
 private:
-    int lines_ = 0;
+    std::vector<std::string> lines_;
     Log::Sink before_;
 };
 
@@ -58,8 +59,8 @@ struct Found {
 class Search {
 public:
     /// All of them must live as long as the search.
-    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page, CountedLog const& log)
-        : missed_(missed), pages_(pages), page_(page), log_(log) {}
+    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page, KeptLog const& log)
+        : missed_(missed), pages_(pages), page_(page), log_(log), searchedText_(remaining(textOn(page))) {}
 
     MissedField const& missed() const { return missed_; }
     Reader::FieldTrace const& trace() const { return missed_.field; }
@@ -88,13 +89,18 @@ public:
     /// What the fields that are searched earlier leave of the text.
     Reader::ZoneText remaining(Reader::ZoneText text) const;
     /// The text in which the field was searched.
-    Reader::ZoneText searchedText() const { return remaining(textOn(page_)); }
+    Reader::ZoneText const& searchedText() const { return searchedText_; }
     std::vector<Reader::FieldTrace const*> earlierFields() const;
 
     /// The field with another pattern.
     Cfg::ExtractField withPattern(std::string const& pattern) const;
 
-    // Searches. They find nothing any more when the engine has given the pattern up too often.
+    // Searches. They find nothing any more when patterns have failed too often: each time may have cost
+    // seconds.
+
+    bool isGivenUp() const;
+    /// What the library said about patterns that failed.
+    std::vector<std::string> const& failures() const { return log_.lines(); }
 
     /// Takes the hit's lines out of the text, as reading does.
     std::optional<Hit> cut(Cfg::ExtractField const& field, Reader::ZoneText& text) const;
@@ -113,12 +119,11 @@ public:
     }
 
 private:
-    bool isGivenUp() const;
-
     MissedField const& missed_;
     ReadPages& pages_;
     LaidOutPage const& page_;
-    CountedLog const& log_;
+    KeptLog const& log_;
+    Reader::ZoneText searchedText_;
 };
 
 /// Keeps the first candidate that gives a valid value, and before there is one the first of all.

@@ -39,9 +39,12 @@ std::optional<Found> validationPattern(Search const& search) {
     auto const refusal = refusalIn(search);
     if (!refusal || isOfLimit(*refusal))
         return std::nullopt;
-    return certain(search, refusal->says +
-                               ": let \"value_extract\" take another part of the text, or \"value_match\" "
-                               "accept this one");
+    char const* const advice =
+        refusal->reason == Refusal::Reason::NoDate
+            ? ": let \"value_match\" take parts of the date that can be read"
+            : ": let \"value_extract\" take another part of the text, or \"value_match\" "
+              "accept this one";
+    return certain(search, refusal->says + advice);
 }
 
 std::optional<Found> width(Search const& search) {

@@ -85,6 +85,23 @@ std::vector<PatternCut> cutsOf(std::string_view pattern) {
     return cuts;
 }
 
+Anchors anchorsOf(std::string_view pattern) {
+    std::vector<PatternSequence> const alternatives = outlineOf(pattern);
+    Anchors anchors{{}, std::string(pattern), {}};
+    if (alternatives.size() != 1 || alternatives.front().empty())
+        return anchors;
+    // By the outline: "\\$" is no anchor.
+    if (alternatives.front().back().text == "$") {
+        anchors.end = "$";
+        anchors.core.pop_back();
+    }
+    if (alternatives.front().front().text == "^" && !anchors.core.empty()) {
+        anchors.front = "^";
+        anchors.core.erase(0, 1);
+    }
+    return anchors;
+}
+
 std::string withWholeAsValue(std::string_view pattern) {
     std::string inner(pattern);
     for (std::string const& group : valueGroups())

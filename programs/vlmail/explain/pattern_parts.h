@@ -19,6 +19,14 @@ struct PatternCut {
 };
 std::vector<PatternCut> cutsOf(std::string_view pattern);
 
+/// A pattern without "^" at its front and "$" at its end, and these where it has them.
+struct Anchors {
+    std::string front;
+    std::string core;
+    std::string end;
+};
+Anchors anchorsOf(std::string_view pattern);
+
 /// The pattern with all that it matches for its value.
 std::string withWholeAsValue(std::string_view pattern);
 

@@ -16,4 +16,13 @@ LaidOutPage const* ReadPages::page(int number) {
     return page ? &*page : nullptr;
 }
 
+LaidOutPage const& ReadPages::laidOut(Reader::Page const& page, Reader::LayoutRules const& rules) {
+    if (!byOtherRules_.empty() && byOtherRules_.begin()->second.page != &page)
+        byOtherRules_.clear();
+    auto const [at, isNew] = byOtherRules_.try_emplace({rules.maxSpaces, rules.maxLineDistance});
+    if (isNew)
+        at->second = {&page, Reader::layOut(page, rules)};
+    return at->second;
+}
+
 } // namespace VlMail

@@ -6,6 +6,7 @@
 
 #include <map>
 #include <optional>
+#include <utility>
 
 namespace VlMail {
 
@@ -23,15 +24,15 @@ public:
     int count() const { return document_.pageCount(); }
     /// Null when the page is damaged or there is none of that number.
     LaidOutPage const* page(int number);
-    /// The same page by other rules, not kept.
-    static LaidOutPage laidOut(LaidOutPage const& page, Reader::LayoutRules const& rules) {
-        return {page.page, Reader::layOut(*page.page, rules)};
-    }
+    /// A page by other rules; kept until another page is asked for.
+    LaidOutPage const& laidOut(Reader::Page const& page, Reader::LayoutRules const& rules);
 
 private:
     Reader::Document& document_;
     Reader::LayoutRules rules_;
     std::map<int, std::optional<LaidOutPage>> pages_;
+    /// By the gap and the distance of their rules; all of one page.
+    std::map<std::pair<double, double>, LaidOutPage> byOtherRules_;
 };
 
 } // namespace VlMail

@@ -93,8 +93,10 @@ std::optional<Refusal> refusalOf(ExtractField const& field, std::string const& t
             isDate &&
             validatedWithoutLimits(field, FieldValueType::String, validation.strRegex(), text).isValid();
         if (fits)
-            return Refusal{Reason::NoDate,
-                           Words::excerpt(text) + " is no date: there is no such month, year or hour"};
+            return Refusal{
+                Reason::NoDate,
+                Words::excerpt(text) +
+                    " is no date: its month, year or hour cannot be read; names of months are English"};
         return Refusal{Reason::Pattern, misfit(type, validation.strRegex(), text)};
     }
     json::Value const least = validation.minVal();

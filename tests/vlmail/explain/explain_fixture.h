@@ -69,15 +69,24 @@ protected:
         return {};
     }
 
+    static json::Array fieldsOfFirstZone(json::Object const& reading) {
+        json::Value const page = reading.get("trace").toObject().get("pages").toArray().at(0);
+        return page.toObject().get("zones").toArray().at(0).toObject().get("fields").toArray();
+    }
+
     /// "kind: words" of each near miss of the field.
-    static std::vector<std::string> nearMisses(json::Object const& reading, std::string const& name) {
+    static std::vector<std::string> nearMissesIn(json::Object const& field) {
         std::vector<std::string> told;
-        json::Value const misses = fieldOf(reading, name).get("near_misses");
-        if (misses)
-            for (json::Value const& miss : misses.toArray())
-                told.push_back(miss.toObject().get("kind").textOrEmpty() + ": " +
-                               miss.toObject().get("says").textOrEmpty());
+        json::Value const misses = field.get("near_misses");
+        if (!misses)
+            return told;
+        for (json::Value const& miss : misses.toArray())
+            told.push_back(miss.toObject().get("kind").textOrEmpty() + ": " +
+                           miss.toObject().get("says").textOrEmpty());
         return told;
+    }
+    static std::vector<std::string> nearMisses(json::Object const& reading, std::string const& field) {
+        return nearMissesIn(fieldOf(reading, field));
     }
 
     VLServiceTest::TimeZone const zone_{"UTC"};

@@ -175,18 +175,7 @@ TEST_F(ExplanationTest, MarksValuesThatAnEarlierOneOfTheSameNameStandsFor) {
         "A: 1\nB: 2\n", R"text({"name": "n", "value_extract": "^C: (?<VAL>.*)$", "default_value": "0"},
                            {"name": "n", "value_extract": "^A: (?<VAL>.*)$"},
                            {"name": "n", "value_extract": "^B: (?<VAL>.*)$"})text");
-    json::Array const fields = reading.get("trace")
-                                   .toObject()
-                                   .get("pages")
-                                   .toArray()
-                                   .at(0)
-                                   .toObject()
-                                   .get("zones")
-                                   .toArray()
-                                   .at(0)
-                                   .toObject()
-                                   .get("fields")
-                                   .toArray();
+    json::Array const fields = fieldsOfFirstZone(reading);
     EXPECT_TRUE(fields.at(0).toObject().get("passed_over").toBool());
     EXPECT_FALSE(fields.at(1).toObject().get("passed_over").toBool());
     EXPECT_TRUE(fields.at(2).toObject().get("passed_over").toBool());

@@ -42,7 +42,7 @@ Case const CASES[]{
     {"DateOfItsOwnPattern", R"({"value_type": 3, "value_match": "(?<day>\\d+)\\.(?<month>\\d+)\\."})", "5/3",
      "\"5/3\" does not match the validation pattern \"(?<day>\\d+)\\.(?<month>\\d+)\\.\""},
     {"NoSuchMonth", R"({"value_type": 3})", "5/0/2021",
-     "\"5/0/2021\" is no date: there is no such month, year or hour"},
+     "\"5/0/2021\" is no date: its month, year or hour cannot be read; names of months are English"},
     {"DateBefore", R"({"value_type": 3, "value_min": "1/1/2022"})", "5/3/2021",
      "5/3/2021 is before the earliest date 2022/01/01"},
     {"DateAfter", R"({"value_type": 3, "value_max": "1/1/2020 12:30"})", "5/3/2021",

@@ -94,6 +94,23 @@ TEST(PatternParts, CutsAPatternBetweenItsSteps) {
     EXPECT_THAT(cutsOf(""), IsEmpty());
 }
 
+TEST(PatternParts, TakesAnchorsOff) {
+    struct {
+        char const* pattern;
+        char const* front;
+        char const* core;
+        char const* end;
+    } const CASES[]{{"^a$", "^", "a", "$"},   {"^a", "^", "a", ""}, {"a$", "", "a", "$"},
+                    {"a\\$", "", "a\\$", ""}, {"a", "", "a", ""},   {"^a|b$", "", "^a|b$", ""},
+                    {"$", "", "", "$"},       {"", "", "", ""}};
+    for (auto const& [pattern, front, core, end] : CASES) {
+        Anchors const anchors = anchorsOf(pattern);
+        EXPECT_EQ(anchors.front, front) << pattern;
+        EXPECT_EQ(anchors.core, core) << pattern;
+        EXPECT_EQ(anchors.end, end) << pattern;
+    }
+}
+
 TEST(PatternParts, MakesTheWholeMatchTheValue) {
     EXPECT_EQ(withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
     EXPECT_TRUE(hasValueGroup("a(?<VAL>b)"));
