@@ -90,6 +90,24 @@ TEST(DiscoveryRequest, IsToldByJsonTrueAlone) {
             << text;
 }
 
+TEST_F(DiscoveryHandlers, ReceiveAllGoesOnBehindEveryDatagram) {
+    auto const base = makeBase();
+    base->recvAll(collect());
+    for (char const* datagram : {R"({"a":1})", "no JSON", R"({"b":2})"})
+        Access::receive(*base, datagram);
+    EXPECT_THAT(received, ElementsAre(R"({"a":1})", R"({"b":2})"));
+    base->close();
+    Access::receive(*base, R"({"c":3})");
+    EXPECT_THAT(received, SizeIs(2));
+}
+
+TEST_F(DiscoveryHandlers, ReceiveAllEndsWithTheObjectThatItsFunctionDestroys) {
+    auto base = makeBase();
+    base->recvAll([&](json::Object const&) { base.reset(); });
+    Access::receive(*base, "{}");
+    EXPECT_FALSE(base);
+}
+
 // --- opening
 
 TEST_F(DiscoveryHandlers, ASocketThatDoesNotOpenIsLoggedForIp4) {

@@ -1,0 +1,71 @@
+// Requests as the service carries them out: the first byte is the command's number, the rest the JSON text,
+// and several requests, each ended by a zero byte, meet the same database. Whatever they say, the settings
+// can be read afterwards.
+
+#include "programs/vlserviced/processor.h"
+#include "programs/vlserviced/settings/parts.h"
+#include "programs/vlserviced/store/schema.h"
+#include "vlservice/ipc/make_empty_cmd.h"
+#include "vlservice/ipc/process_pack.h"
+#include "vlservice/platform/json_text.h"
+#include "vlservice/platform/log.h"
+
+#include <cstdint>
+#include <cstdlib>
+#include <sstream>
+
+namespace {
+
+/// A service in memory whose jobs never get to work.
+struct MemoryService {
+    SQLite::Database database{
+        Mailing::openDatabase(":memory:", VlServiced::serviceDatabase(), Mailing::Journal::Rollback)};
+    VlServiced::SettingsStore store{database};
+    VlServiced::SettingsService settings{store};
+    VlServiced::JobStore jobs{database};
+    VlServiced::JobRunner runner{jobs,
+                                 {[](VlServiced::JobSurroundings::Work const&) {},
+                                  [](VlServiced::JobSurroundings::Work const&) {}, [] { return 1LL; },
+                                  [this] { return settings.service(); }, "/missing/outbox"}};
+    std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
+        settings, jobs, runner, "/missing/outbox", [] { return 1LL; });
+
+    void carryOut(std::string const& request) {
+        auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);
+        // A pack's place is any file of the machine.
+        if (!cmd || cmd->id() == Ipc::ProcessPack::CMD_ID)
+            return;
+        try {
+            auto& json = static_cast<Ipc::JsonCmdBase&>(*cmd);
+            json.deserializeReq(json::strToObject(request.data() + 1, request.size() - 1));
+            processor->submit(cmd);
+            std::ostringstream text;
+            text << json.serializeResp();
+        } catch (std::exception const&) {
+            // Refused, as an error message.
+        }
+    }
+
+    void requireReadable() {
+        for (VlServiced::SettingsNode const& node : store.nodes())
+            settings.effective(node.id, {});
+        settings.tree();
+    }
+};
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size) {
+    static auto const silent = Log::setSink({});
+    MemoryService service;
+    std::istringstream requests(std::string(reinterpret_cast<char const*>(data), size));
+    for (std::string request; std::getline(requests, request, '\0');)
+        if (!request.empty())
+            service.carryOut(request);
+    try {
+        service.requireReadable();
+    } catch (std::exception const&) {
+        std::abort();
+    }
+    return 0;
+}

@@ -1,0 +1,163 @@
+// The service as it is found, over a real network: client and service each in a namespace of its own.
+#include "programs/vlserviced/discovery_answer.h"
+
+#include "programs/vlmail/multicast_probe.h"
+#include "programs/vlmail/service_client.h"
+#include "tests/ipc/log_capture.h"
+#include "tests/ipc/two_networks.h"
+#include "tests/vlserviced/json_help.h"
+
+#include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/ip/multicast.hpp>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <optional>
+#include <thread>
+
+namespace {
+
+using boost::asio::ip::udp;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+class DiscoveryAnswerTest : public testing::Test {
+protected:
+    void SetUp() override {
+        if (!networks_.whyNot().empty())
+            GTEST_SKIP() << "There is no right to make network namespaces: " << networks_.whyNot();
+    }
+    ~DiscoveryAnswerTest() override {
+        io_.stop();
+        if (thread_.joinable())
+            thread_.join();
+    }
+
+    void serve() {
+        {
+            TwoNetworks::Inside const inside(networks_.service());
+            answer_.emplace(io_, "10.77.0.2", std::uint16_t(45001));
+        }
+        thread_ = std::thread([this] { io_.run(); });
+    }
+    /// Datagrams from the client's network to the IPv4 group.
+    void send(std::string const& datagram, int times = 1) {
+        TwoNetworks::Inside const inside(networks_.client());
+        boost::asio::io_context io;
+        udp::socket socket(io, udp::v4());
+        for (int i = 0; i < times; ++i)
+            socket.send_to(boost::asio::buffer(datagram),
+                           udp::endpoint(boost::asio::ip::make_address("239.4.5.6"), 45677));
+    }
+    /// What a client in its network finds.
+    std::string found() {
+        TwoNetworks::Inside const inside(networks_.client());
+        std::optional<json::Object> const answer = VlMail::askNetwork();
+        return answer ? print(*answer) : "nothing";
+    }
+    /// What the doctor says of the interface that leads to the service.
+    VlMail::ProbeReport examined(bool isIp6, std::chrono::milliseconds time) {
+        TwoNetworks::Inside const inside(networks_.client());
+        for (VlMail::ProbeReport const& report : VlMail::probeNetwork(time))
+            if (report.interface != "lo" && report.isIp6 == isIp6)
+                return report;
+        return {};
+    }
+
+    TwoNetworks networks_;
+    LogCapture log_;
+    boost::asio::io_context io_;
+    boost::asio::executor_work_guard<boost::asio::io_context::executor_type> work_{io_.get_executor()};
+    std::optional<VlServiced::DiscoveryAnswer> answer_;
+    std::thread thread_;
+};
+
+constexpr char const* ANSWER = R"({"host":"10.77.0.2","port":45001})";
+
+TEST_F(DiscoveryAnswerTest, NamesHostAndPort) {
+    serve();
+    EXPECT_EQ(found(), ANSWER);
+    EXPECT_EQ(found(), ANSWER);
+}
+
+TEST_F(DiscoveryAnswerTest, GoesOnBehindDatagramsThatAreNone) {
+    serve();
+    send("no JSON", 3);
+    send(std::string(5000, 'x'));
+    send(R"({"host":"another service","port":1})");
+    send("[]");
+    EXPECT_EQ(found(), ANSWER);
+}
+
+TEST_F(DiscoveryAnswerTest, IsGivenWithoutIp6) {
+    networks_.disableIp6(networks_.service());
+    serve();
+    EXPECT_EQ(found(), ANSWER);
+}
+
+TEST_F(DiscoveryAnswerTest, IsNotMultipliedByAFloodOfRequests) {
+    serve();
+    std::thread flood([this] { send(R"({"#req":true})", 200); });
+    int answers = 0;
+    {
+        TwoNetworks::Inside const inside(networks_.client());
+        boost::asio::io_context io;
+        udp::socket socket(io);
+        socket.open(udp::v4());
+        socket.set_option(udp::socket::reuse_address(true));
+        socket.bind(udp::endpoint(udp::v4(), 45677));
+        socket.set_option(boost::asio::ip::multicast::join_group(boost::asio::ip::make_address("239.4.5.6")));
+        boost::asio::steady_timer end(io, std::chrono::milliseconds(500));
+        end.async_wait([&](boost::system::error_code const&) { socket.close(); });
+        std::array<char, 2000> bytes;
+        std::function<void()> const receive = [&] {
+            socket.async_receive(boost::asio::buffer(bytes),
+                                 [&](boost::system::error_code const& ec, std::size_t size) {
+                                     if (ec)
+                                         return;
+                                     answers += std::string(bytes.data(), size) == ANSWER;
+                                     receive();
+                                 });
+        };
+        receive();
+        io.run();
+    }
+    flood.join();
+    EXPECT_LE(answers, 11);
+}
+
+TEST_F(DiscoveryAnswerTest, IsSeenByTheDoctorOnTheInterfaceThatItCameBy) {
+    serve();
+    VlMail::ProbeReport const ip4 = examined(false, std::chrono::milliseconds(1000));
+    EXPECT_EQ(ip4.failure, "");
+    EXPECT_TRUE(ip4.heardItself);
+    EXPECT_THAT(ip4.answers, ElementsAre("10.77.0.2:45001 (from 10.77.0.2)"));
+    EXPECT_THAT(VlMail::hintsFor({ip4}), IsEmpty());
+    VlMail::ProbeReport const ip6 = examined(true, std::chrono::milliseconds(1000));
+    EXPECT_EQ(ip6.failure, "");
+    ASSERT_EQ(ip6.answers.size(), 1u);
+    EXPECT_TRUE(ip6.answers.front().starts_with("10.77.0.2:45001 (from ")) << ip6.answers.front();
+}
+
+TEST_F(DiscoveryAnswerTest, IsMissedByTheDoctorWhereNobodyGivesOne) {
+    VlMail::ProbeReport const ip4 = examined(false, std::chrono::milliseconds(200));
+    EXPECT_TRUE(ip4.heardItself);
+    EXPECT_THAT(ip4.answers, IsEmpty());
+    EXPECT_EQ(VlMail::hintsFor({ip4}).size(), 2u);
+}
+
+TEST_F(DiscoveryAnswerTest, IsNotTakenFromDatagramsThatNameNoAddress) {
+    std::thread noise([this] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+        send("no JSON");
+        send(R"({"host":"","port":1})");
+    });
+    VlMail::ProbeReport const ip4 = examined(false, std::chrono::milliseconds(1000));
+    noise.join();
+    EXPECT_EQ(ip4.foreign, 2);
+    EXPECT_THAT(ip4.answers, IsEmpty());
+}
+
+} // namespace
