@@ -36,7 +36,7 @@ protected:
     SharedLog log;
 
     /// The error of connecting, without the service's name in front.
-    static std::string connectError(FakeService& service, std::chrono::milliseconds time = 10s) {
+    static std::string connectError(FakeService& service, std::chrono::milliseconds time = 60s) {
         auto settings = service.clientSettings();
         settings.connectTime = time;
         return withoutName(service, messageOf<Channel::Error>([&] { Client client(settings); }));
@@ -148,7 +148,7 @@ TEST_F(BrokenServices, ThatGiveNoAnswerAreLeftInTime) {
     });
     auto settings = service.clientSettings();
     settings.requestTime = [](Ipc::Timeouts::TimeoutId id) {
-        return id == Ipc::Timeouts::TIMEOUT_ID_3 ? 50ms : 10s;
+        return id == Ipc::Timeouts::TIMEOUT_ID_3 ? 50ms : 60s;
     };
     Client client(settings);
     std::string const expected = service.name() + ": It gives no answer within 0.050 s.";

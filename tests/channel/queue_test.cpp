@@ -161,10 +161,12 @@ TEST_F(Queue, GivesUpARequestWhoseTurnDoesNotComeInTime) {
     });
     auto settings = service.clientSettings();
     bool isShort = false;
-    settings.requestTime = [&](Ipc::Timeouts::TimeoutId) { return isShort ? 50ms : 10'000ms; };
+    settings.requestTime = [&](Ipc::Timeouts::TimeoutId) { return isShort ? 50ms : 60'000ms; };
     open(settings);
     connect();
     connection->submit(make("a"));
+    while (steps.size() < 2)
+        io.run_one();
     isShort = true;
     connection->submit(make("b"), [&](std::string const&) { connection->close(); });
     io.run();
@@ -276,7 +278,7 @@ protected:
 TEST_F(Handling, MayEndOnAnotherThread) {
     std::vector<std::thread> workers;
     std::mutex mutex;
-    RunningServer server({}, [&](std::shared_ptr<Ipc::CmdI> cmd, Channel::Answer answer) {
+    RunningServer server(patient(), [&](std::shared_ptr<Ipc::CmdI> cmd, Channel::Answer answer) {
         std::lock_guard const guard(mutex);
         workers.emplace_back([cmd = std::move(cmd), answer = std::move(answer)]() mutable {
             dynamic_cast<Ipc::PriceEst&>(*cmd).setResp({{"from", "a worker"}});
@@ -295,12 +297,13 @@ TEST_F(Handling, MayEndOnAnotherThread) {
 
 TEST_F(Handling, ThatTakesLongHoldsUpNobodyElse) {
     std::promise<Channel::Answer> slow;
-    RunningServer server({}, [&](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-        if (cmd->id() == Ipc::RemoveCfgNode::CMD_ID)
-            slow.set_value(answer);
-        else
-            answer();
-    });
+    RunningServer server(patient(),
+                         [&](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+                             if (cmd->id() == Ipc::RemoveCfgNode::CMD_ID)
+                                 slow.set_value(answer);
+                             else
+                                 answer();
+                         });
     RawPeer waiting(server.port());
     waiting.greet();
     waiting.send(Ipc::RemoveCfgNode::CMD_ID, Kind::Request, 2, R"({"id":"a=acme"})");
@@ -315,44 +318,47 @@ TEST_F(Handling, ThatTakesLongHoldsUpNobodyElse) {
 }
 
 TEST_F(Handling, MayFailWithAReason) {
-    RunningServer const server({}, [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const& answer) {
-        answer.fail("The disk is full.");
-    });
+    RunningServer const server(patient(),
+                               [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const& answer) {
+                                   answer.fail("The disk is full.");
+                               });
     EXPECT_EQ(errorOf(server), "The service refuses: The disk is full.");
 }
 
 TEST_F(Handling, MayFailWithBytesThatAreNoText) {
-    RunningServer const server(
-        {}, [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const& answer) { answer.fail("caf\xe9"); });
+    RunningServer const server(patient(), [](std::shared_ptr<Ipc::CmdI> const&,
+                                             Channel::Answer const& answer) { answer.fail("caf\xe9"); });
     EXPECT_EQ(errorOf(server), "The service refuses: caf?");
 }
 
 TEST_F(Handling, ThatForgetsToAnswerIsAFailure) {
-    RunningServer const server({}, [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const&) {});
+    RunningServer const server(patient(), [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const&) {});
     EXPECT_EQ(errorOf(server), "The service refuses: The service gave no answer.");
 }
 
 TEST_F(Handling, WithAnAnswerThatCannotBePrintedIsAFailure) {
-    RunningServer const server({}, [](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-        dynamic_cast<Ipc::PriceEst&>(*cmd).setResp({{"a", "\xff"}});
-        answer();
-    });
+    RunningServer const server(patient(),
+                               [](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+                                   dynamic_cast<Ipc::PriceEst&>(*cmd).setResp({{"a", "\xff"}});
+                                   answer();
+                               });
     EXPECT_EQ(errorOf(server),
               "The service refuses: JSON error: a text that is not valid UTF-8 cannot be printed");
 }
 
 TEST_F(Handling, WithAnAnswerOverTheLimitIsAFailure) {
-    RunningServer const server({}, [](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-        dynamic_cast<Ipc::PriceEst&>(*cmd).setResp({{"a", std::string(16 * 1024 * 1024, 'x')}});
-        answer();
-    });
+    RunningServer const server(
+        patient(), [](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+            dynamic_cast<Ipc::PriceEst&>(*cmd).setResp({{"a", std::string(16 * 1024 * 1024, 'x')}});
+            answer();
+        });
     EXPECT_EQ(errorOf(server),
               "The service refuses: A message of 16777224 bytes is over the limit of 16777216.");
 }
 
 TEST_F(Handling, MayOutliveItsClient) {
     std::promise<std::pair<std::shared_ptr<Ipc::CmdI>, Channel::Answer>> slow;
-    RunningServer server({}, [&](std::shared_ptr<Ipc::CmdI> cmd, Channel::Answer answer) {
+    RunningServer server(patient(), [&](std::shared_ptr<Ipc::CmdI> cmd, Channel::Answer answer) {
         slow.set_value({std::move(cmd), std::move(answer)});
     });
     {
@@ -368,12 +374,13 @@ TEST_F(Handling, MayOutliveItsClient) {
 
 TEST_F(Handling, GivesTheCommandsAProcessorThatSendsNothing) {
     std::promise<void> handled;
-    RunningServer server({}, [&](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-        cmd->processor()->submit(cmd);
-        cmd->readReq();
-        cmd->sendReq();
-        answer();
-    });
+    RunningServer server(patient(),
+                         [&](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+                             cmd->processor()->submit(cmd);
+                             cmd->readReq();
+                             cmd->sendReq();
+                             answer();
+                         });
     EXPECT_EQ(errorOf(server), "no error");
     std::string const failed = "Command Price Estimate failed in transfer. ";
     EXPECT_THAT(log.lines(), ElementsAre(failed + "A service sends no requests.",
@@ -385,7 +392,7 @@ TEST_F(Handling, GivesTheCommandsAProcessorThatSendsNothing) {
 
 TEST_F(Handling, IsFinishedBeforeAServiceStops) {
     std::promise<Channel::Answer> slow;
-    RunningServer server({}, [&](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const& answer) {
+    RunningServer server(patient(), [&](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const& answer) {
         slow.set_value(answer);
     });
     RawPeer idle(server.port());

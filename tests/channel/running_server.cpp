@@ -24,7 +24,8 @@ using namespace std::chrono_literals;
 
 namespace {
 
-constexpr auto PATIENCE = 10s;
+/// Only what fails takes so long.
+constexpr auto PATIENCE = 60s;
 
 } // namespace
 
@@ -55,6 +56,7 @@ Channel::ClientSettings RunningServer::clientSettings() const {
     settings.host = "127.0.0.1";
     settings.port = port_;
     settings.token = TOKEN;
+    settings.connectTime = PATIENCE;
     return settings;
 }
 
@@ -205,6 +207,7 @@ Channel::ClientSettings FakeService::clientSettings() const {
     settings.host = "127.0.0.1";
     settings.port = acceptor_.local_endpoint().port();
     settings.token = TOKEN;
+    settings.connectTime = PATIENCE;
     return settings;
 }
 

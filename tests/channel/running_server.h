@@ -16,6 +16,7 @@
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/ip/tcp.hpp>
 
+#include <chrono>
 #include <condition_variable>
 #include <functional>
 #include <future>
@@ -31,10 +32,18 @@ namespace ChannelTest {
 
 inline std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 
+/// Settings under which a slow machine does not matter.
+inline Channel::ServerSettings patient() {
+    Channel::ServerSettings settings;
+    settings.greetingTime = std::chrono::minutes(1);
+    return settings;
+}
+
 /// Unless told otherwise it answers as Echo does.
 class RunningServer {
 public:
-    explicit RunningServer(Channel::ServerSettings settings = {}, Channel::Server::Handler handler = {});
+    explicit RunningServer(Channel::ServerSettings settings = patient(),
+                           Channel::Server::Handler handler = {});
     ~RunningServer();
     RunningServer(RunningServer const&) = delete;
     RunningServer& operator=(RunningServer const&) = delete;
@@ -52,7 +61,7 @@ public:
         return result.get();
     }
     std::size_t connections();
-    /// Waits, within ten seconds, until so many are connected.
+    /// Waits, within a minute, until so many are connected.
     bool hasConnections(std::size_t wanted);
 
     boost::asio::io_context& io() { return io_; }
@@ -75,7 +84,7 @@ public:
     SharedLog& operator=(SharedLog const&) = delete;
 
     std::vector<std::string> lines();
-    /// Waits, within ten seconds, for a line with that in it.
+    /// Waits, within a minute, for a line with that in it.
     bool hasLogged(std::string const& part);
 
 private:
@@ -104,7 +113,7 @@ struct Message {
     std::string text;
 };
 
-/// One end of a connection that may send whatever it likes. It waits ten seconds at the most for anything.
+/// One end of a connection that may send whatever it likes. It waits a minute at the most for anything.
 class RawPeer {
 public:
     /// A client.

@@ -48,7 +48,7 @@ protected:
     ~TlsConnections() override { fs::remove_all(folder); }
 
     Channel::ServerSettings serverSettings(TestCertificate const& certificate) const {
-        Channel::ServerSettings settings;
+        Channel::ServerSettings settings = patient();
         settings.token = TOKEN;
         settings.tls = Channel::Tls::Always;
         settings.certificateFile = certificate.certificateFile;
