@@ -261,6 +261,47 @@ TEST_F(DiscoveryHandlers, NothingIsHandledAfterDestruction) {
     EXPECT_THAT(log.lines, IsEmpty());
 }
 
+// --- receiving for as long as a service listens
+
+TEST_F(DiscoveryHandlers, ReceivingAllGoesOnAfterGarbageAndAfterWhatTheFunctionThrows) {
+    auto const base = makeBase();
+    base->recvAll([&](json::Object object) {
+        received.push_back(textOf(object));
+        if (received.size() == 1)
+            throw std::runtime_error("no room");
+    });
+    for (char const* const datagram : {R"({"n":1})", "garbage", R"({"n":2})"})
+        Access::receive(*base, datagram);
+    EXPECT_THAT(received, ElementsAre(R"({"n":1})", R"({"n":2})"));
+    ASSERT_EQ(log.lines.size(), 2u);
+    EXPECT_EQ(log.lines[0], (Line{3, std::string(BAD_MESSAGE) + "no room"}));
+    EXPECT_THAT(log.lines[1].second, StartsWith(std::string(BAD_MESSAGE) + "JSON error: "));
+}
+
+TEST_F(DiscoveryHandlers, ReceivingAllStartsAReceiveForEachDatagramUntilItIsClosed) {
+    auto const base = makeBase();
+    Line const failed{4, "Discovery receive operation failed. Bad file descriptor"};
+    base->recvAll(collect());
+    io.run();
+    io.restart();
+    EXPECT_THAT(log.lines, ElementsAre(failed));
+    Access::receive(*base, "{}");
+    io.run();
+    io.restart();
+    EXPECT_THAT(log.lines, ElementsAre(failed, failed));
+    base->close();
+    Access::receive(*base, "{}");
+    EXPECT_EQ(io.run(), 0u);
+    EXPECT_THAT(received, ElementsAre("{}"));
+}
+
+TEST_F(DiscoveryHandlers, AFunctionThatReceivesAllMayDestroyItsBase) {
+    auto base = makeBase();
+    base->recvAll([&](json::Object) { base.reset(); });
+    Access::receive(*base, "{}");
+    EXPECT_EQ(base, nullptr);
+}
+
 // --- time
 
 TEST_F(DiscoveryHandlers, ATimeoutIsAnEmptyObject) {
