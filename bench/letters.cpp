@@ -2,9 +2,9 @@
 // alone takes to give the same words: what the reader adds to poppler (the aim is 1.25 times its time or
 // less), and what the second core brings (1.8 times the throughput or more).
 #include "programs/reader/document.h"
-#include "programs/vlmail/batch.h"
-#include "programs/vlmail/node_settings.h"
-#include "programs/vlmail/worker_pool.h"
+#include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/worker_pool.h"
 
 #include <benchmark/benchmark.h>
 

@@ -2,7 +2,7 @@
 // Decides whether the service has to keep completed parts in memory. To stay under: 100 microseconds.
 #include "programs/vlserviced/settings/parts.h"
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <benchmark/benchmark.h>
 

@@ -6,7 +6,7 @@
 #include "vlservice/cfg/inet.h"
 #include "vlservice/cfg/po.h"
 #include "vlservice/cfg/profiles.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/presets/presets.h"
 
 #include <benchmark/benchmark.h>

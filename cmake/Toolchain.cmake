@@ -2,7 +2,9 @@
 
 find_program(CCACHE_PROGRAM ccache)
 if(CCACHE_PROGRAM AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
-    set(CMAKE_CXX_COMPILER_LAUNCHER ${CCACHE_PROGRAM})
+    # Without these the cache takes no source that uses precompiled headers.
+    set(CMAKE_CXX_COMPILER_LAUNCHER
+        ${CMAKE_COMMAND} -E env CCACHE_SLOPPINESS=pch_defines,time_macros ${CCACHE_PROGRAM})
 endif()
 
 set(VLSERVICE_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize= takes them")

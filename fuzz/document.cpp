@@ -1,5 +1,6 @@
 // A document's bytes, PDF or text: read, searched with the presets that every node has, its first page
 // written and read again.
+#include "programs/base/error.h"
 #include "programs/reader/letters.h"
 
 #include "vlservice/platform/log.h"
@@ -49,7 +50,7 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     static_cast<void>(isQuiet);
     try {
         read(std::string(reinterpret_cast<char const*>(data), size));
-    } catch (Reader::Error const& error) {
+    } catch (Base::Error const& error) {
         require(std::string(error.what()).find('\n') == std::string::npos);
     }
     return 0;

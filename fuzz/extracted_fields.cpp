@@ -1,6 +1,6 @@
 // The values of two letters: {"a": [field, ...], "b": [field, ...]}, read, written, compared, grouped.
 #include "vlservice/extract/extracted_fields.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <cstdint>
 #include <cstdlib>

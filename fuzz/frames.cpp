@@ -1,5 +1,6 @@
 // Bytes from the other side of a connection, in pieces of a size that the first byte tells: they are refused,
 // or cut into messages that are written as the same bytes, however they were cut.
+#include "programs/base/error.h"
 #include "programs/channel/frame.h"
 #include "programs/channel/message_text.h"
 
@@ -36,7 +37,7 @@ Outcome decode(std::string_view bytes, std::size_t piece) {
             bytes.remove_prefix(size);
             take(decoder, outcome);
         }
-    } catch (Channel::Error const&) {
+    } catch (Base::Error const&) {
         outcome.isRefused = true;
     }
     return outcome;

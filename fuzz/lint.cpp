@@ -1,7 +1,7 @@
 // A settings document as its writer hands it to lint: read, checked, and everything that is found put into
 // words.
 #include "programs/vlmail/presets/lint.h"
-#include "programs/vlmail/presets/outline.h"
+#include "programs/patterns/outline.h"
 
 #include <cstdint>
 #include <cstdlib>
@@ -23,7 +23,7 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     if (size > LONGEST)
         return 0;
     std::string const text(reinterpret_cast<char const*>(data), size);
-    VlMail::outlineOf(text);
+    Patterns::outlineOf(text);
     try {
         for (VlMail::Finding const& finding : VlMail::lint(VlMail::PresetsDocument(text)))
             require(!finding.what.empty() && !finding.advice.empty());

@@ -1,7 +1,7 @@
 // A node's presets and its parent's, and a document's name: {"presets": ..., "parent": ..., "name": ...}.
 // Read, matched, completed, written.
 #include "vlservice/presets/presets.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <cstdint>
 #include <cstdlib>

@@ -7,7 +7,7 @@
 #include "programs/vlserviced/store/schema.h"
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/ipc/process_pack.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
 #include <cstdint>
@@ -19,7 +19,7 @@ namespace {
 /// A service in memory whose jobs never get to work.
 struct MemoryService {
     SQLite::Database database{
-        Mailing::openDatabase(":memory:", VlServiced::serviceDatabase(), Mailing::Journal::Rollback)};
+        Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::SettingsStore store{database};
     VlServiced::SettingsService settings{store};
     VlServiced::JobStore jobs{database};

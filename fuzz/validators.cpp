@@ -1,6 +1,6 @@
 // A field's definition as JSON, up to the first line feed, and a text to validate behind it.
 #include "vlservice/extract/extract_field.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <algorithm>
 #include <cstdint>

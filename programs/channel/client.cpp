@@ -1,5 +1,6 @@
 #include "programs/channel/client.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/client_connection.h"
 
 #include <boost/asio/io_context.hpp>
@@ -35,7 +36,7 @@ private:
         while (!*result)
             io_.run_one();
         if (!(*result)->empty())
-            throw Error(**result);
+            throw Base::Error(**result);
     }
 
     boost::asio::io_context io_;

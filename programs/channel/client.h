@@ -1,7 +1,7 @@
 #pragma once
 // The client's side of the connection, for programs that wait for each answer.
 
-#include "programs/channel/error.h"
+#include "programs/base/error.h"
 #include "programs/channel/tls.h"
 #include "vlservice/platform/cmd.h"
 

@@ -1,5 +1,6 @@
 #include "programs/channel/client_connection.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/pin_store.h"
@@ -120,10 +121,10 @@ void ClientConnection::requirePinned() const {
     PinStore const pins(settings_.pinFile);
     auto const pinned = pins.find(service());
     if (!pinned && !settings_.acceptNew)
-        throw Error("Its certificate is new: " + fingerprint_ + ". It must be accepted first.");
+        throw Base::Error("Its certificate is new: " + fingerprint_ + ". It must be accepted first.");
     if (pinned && *pinned != fingerprint_)
-        throw Error("Its certificate has changed from " + *pinned + " to " + fingerprint_ +
-                    ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
+        throw Base::Error("Its certificate has changed from " + *pinned + " to " + fingerprint_ +
+                          ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
 }
 
 void ClientConnection::challenge() {
@@ -138,9 +139,9 @@ namespace {
 
 json::Object greetingIn(Frame const& message, std::uint32_t sequence) {
     if (message.kind == Kind::Error)
-        throw Error("It refuses: " + reasonOf(message.text));
+        throw Base::Error("It refuses: " + reasonOf(message.text));
     if (message.command != GREETING || message.kind != Kind::Response || message.sequence != sequence)
-        throw Error("It does not greet.");
+        throw Base::Error("It does not greet.");
     return parse(message.text);
 }
 
@@ -151,7 +152,7 @@ void ClientConnection::onChallenged(Frame const& message) {
     std::string const serviceNonce = answer.get(NONCE).toString();
     if (!isSameProof(answer.get(PROOF).toString(),
                      makeProof(Side::Service, settings_.token, clientNonce_, serviceNonce, fingerprint_)))
-        throw Error("Whoever answers there does not know our access token.");
+        throw Base::Error("Whoever answers there does not know our access token.");
     std::string const proof =
         makeProof(Side::Client, settings_.token, clientNonce_, serviceNonce, fingerprint_);
     write({GREETING, Kind::Request, PROVING, print({{PROOF, proof}})}, [this] {
@@ -179,7 +180,7 @@ void ClientConnection::pinNew() {
     if (pins.find(service()))
         return;
     if (!settings_.acceptNew(service(), fingerprint_))
-        throw Error("Its certificate was not accepted.");
+        throw Base::Error("Its certificate was not accepted.");
     pins.add(service(), fingerprint_);
 }
 
@@ -229,7 +230,7 @@ void ClientConnection::send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json:
         gone();
         cmd->readResp();
         if (!taken_)
-            throw Error("This command cannot take an answer.");
+            throw Base::Error("This command cannot take an answer.");
     });
     isSent_ = true;
 }
@@ -246,9 +247,9 @@ void ClientConnection::takeAnswer(Frame const& message) {
     bool const isAnswer = message.command == requests_.front().cmd->id() && message.sequence == sequence_ &&
                           message.kind != Kind::Request;
     if (!isAnswer && message.kind == Kind::Error)
-        throw Error("It closes the connection: " + reasonOf(message.text));
+        throw Base::Error("It closes the connection: " + reasonOf(message.text));
     if (!isAnswer)
-        throw Error("It answers what was not asked.");
+        throw Base::Error("It answers what was not asked.");
     std::string failure;
     try {
         if (message.kind == Kind::Error)

@@ -1,4 +1,5 @@
 #include "programs/channel/frame.h"
+#include "programs/base/error.h"
 
 #include <algorithm>
 
@@ -31,8 +32,8 @@ constexpr std::size_t SEQUENCE_AT = 2;
 constexpr std::size_t LENGTH_AT = 6;
 
 [[noreturn]] void refuseLength(std::size_t length, std::size_t limit) {
-    throw Error("A message of " + std::to_string(length) + " bytes is over the limit of " +
-                std::to_string(limit) + ".");
+    throw Base::Error("A message of " + std::to_string(length) + " bytes is over the limit of " +
+                      std::to_string(limit) + ".");
 }
 
 bool isKind(std::uint8_t kind) {
@@ -91,7 +92,7 @@ std::size_t FrameDecoder::announced() const {
         return 0;
     auto const kind = numberAt<std::uint8_t>(unread(), KIND_AT);
     if (!isKind(kind))
-        throw Error("There is no message of kind " + std::to_string(kind) + ".");
+        throw Base::Error("There is no message of kind " + std::to_string(kind) + ".");
     auto const length = numberAt<std::uint32_t>(unread(), LENGTH_AT);
     if (length > limit_)
         refuseLength(length, limit_);
@@ -101,13 +102,14 @@ std::size_t FrameDecoder::announced() const {
 bool FrameDecoder::readPreface() {
     std::string_view const magic = unread().substr(0, MAGIC.size());
     if (magic != MAGIC.substr(0, magic.size()))
-        throw Error("The first bytes are not those of this protocol.");
+        throw Base::Error("The first bytes are not those of this protocol.");
     if (unread().size() < PREFACE_SIZE)
         return false;
     auto const version = numberAt<std::uint16_t>(unread(), MAGIC.size());
     if (version != VERSION)
-        throw Error("Version " + std::to_string(version) +
-                    " of the protocol is not spoken here, only version " + std::to_string(VERSION) + ".");
+        throw Base::Error("Version " + std::to_string(version) +
+                          " of the protocol is not spoken here, only version " + std::to_string(VERSION) +
+                          ".");
     begin_ += PREFACE_SIZE;
     hasPreface_ = true;
     return true;

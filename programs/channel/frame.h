@@ -9,7 +9,7 @@
 // Numbers are in network order. Command 0 is the greeting. A response or an error has its request's command
 // and sequence number; an error's text is an object with the key "err".
 
-#include "programs/channel/error.h"
+#include "programs/base/error.h"
 
 #include <cstddef>
 #include <cstdint>

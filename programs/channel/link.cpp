@@ -1,4 +1,5 @@
 #include "programs/channel/link.h"
+#include "programs/base/error.h"
 
 #include <boost/asio/error.hpp>
 #include <boost/asio/ssl/error.hpp>
@@ -33,7 +34,7 @@ void Link::receive(std::function<void(Received const&)> done) {
             received = Received{What::Message, *message, {}};
         else if (decoder_.announced() > allowed_)
             received = Received{What::Large, {}, {}};
-    } catch (Error const& e) {
+    } catch (Base::Error const& e) {
         received = Received{What::Malformed, {}, e.what()};
     }
     if (received)

@@ -1,6 +1,6 @@
 #include "programs/channel/message_text.h"
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <algorithm>
 #include <sstream>

@@ -1,7 +1,7 @@
 #pragma once
 // The texts of messages.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <string_view>

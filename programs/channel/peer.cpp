@@ -1,5 +1,6 @@
 #include "programs/channel/peer.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/token.h"
@@ -196,7 +197,7 @@ namespace {
 
 std::string textUnder(char const* key, Frame const& message, std::uint32_t sequence) {
     if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
-        throw Error("The greeting is missing.");
+        throw Base::Error("The greeting is missing.");
     return parse(message.text).get(key).toString();
 }
 
@@ -262,10 +263,10 @@ void Peer::onRequest(Frame const& message) {
 void Peer::takeRequest(std::uint8_t command) {
     request_->cmd = context_->factory()(command, shared_from_this());
     if (!request_->cmd)
-        throw Error("There is no command with the number " + std::to_string(command) + '.');
+        throw Base::Error("There is no command with the number " + std::to_string(command) + '.');
     request_->cmd->readReq();
     if (!request_->isRead)
-        throw Error("This command cannot be received.");
+        throw Base::Error("This command cannot be received.");
 }
 
 void Peer::read(std::shared_ptr<Ipc::CmdI> cmd, Message which,

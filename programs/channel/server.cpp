@@ -1,5 +1,6 @@
 #include "programs/channel/server.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/peer.h"
 #include "programs/channel/token.h"
 
@@ -38,7 +39,7 @@ tcp::endpoint endpointOf(ServerSettings const& settings) {
     error_code ec;
     auto const address = asio::ip::make_address(settings.address, ec);
     if (ec)
-        throw Error('"' + settings.address + "\" is no IP address to listen on.");
+        throw Base::Error('"' + settings.address + "\" is no IP address to listen on.");
     return {address, settings.port};
 }
 
@@ -46,8 +47,9 @@ std::unique_ptr<asio::ssl::context> tlsFor(tcp::endpoint const& endpoint, Server
     if (settings.tls == Tls::Auto && isLoopback(endpoint.address()))
         return nullptr;
     if (settings.certificateFile.empty() || settings.keyFile.empty())
-        throw Error("TLS on " + settings.address +
-                    " needs a certificate and its private key; only a loopback address can do without TLS.");
+        throw Base::Error(
+            "TLS on " + settings.address +
+            " needs a certificate and its private key; only a loopback address can do without TLS.");
     return makeServiceContext(settings.certificateFile, settings.keyFile);
 }
 
@@ -57,7 +59,7 @@ tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint) {
     } catch (boost::system::system_error const& e) {
         std::ostringstream message;
         message << "Cannot listen on " << endpoint << ": " << e.code().message() << '.';
-        throw Error(message.str());
+        throw Base::Error(message.str());
     }
 }
 
@@ -70,7 +72,8 @@ public:
           handler_(std::move(handler)) {
         tcp::endpoint const endpoint = endpointOf(settings_);
         if (settings_.token.size() < MIN_TOKEN_LENGTH)
-            throw Error("An access token has at least " + std::to_string(MIN_TOKEN_LENGTH) + " characters.");
+            throw Base::Error("An access token has at least " + std::to_string(MIN_TOKEN_LENGTH) +
+                              " characters.");
         tls_ = tlsFor(endpoint, settings_);
         if (tls_)
             fingerprint_ = fingerprintOf(*tls_);

@@ -1,7 +1,7 @@
 #include "programs/channel/stream.h"
 
-#include "programs/channel/error.h"
-#include "programs/channel/private_file.h"
+#include "programs/base/error.h"
+#include "programs/base/private_file.h"
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/post.hpp>
@@ -98,7 +98,7 @@ std::unique_ptr<ssl::context> makeContext(ssl::context::method method) {
 
 void orThrow(error_code const& ec, std::string const& what, std::string const& file) {
     if (ec)
-        throw Error("Cannot use the " + what + " \"" + file + "\": " + ec.message() + '.');
+        throw Base::Error("Cannot use the " + what + " \"" + file + "\": " + ec.message() + '.');
 }
 
 } // namespace
@@ -123,7 +123,7 @@ std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateF
     orThrow(ec, "certificate", certificateFile);
     // A key with a password is refused instead of asking on the terminal.
     context->set_password_callback([](std::size_t, ssl::context::password_purpose) { return std::string(); });
-    std::string const key = readPrivateFile(keyFile);
+    std::string const key = Base::readPrivateFile(keyFile);
     context->use_private_key(asio::buffer(key), ssl::context::pem, ec);
     orThrow(ec, "private key", keyFile);
     return context;

@@ -1,8 +1,8 @@
 #include "programs/channel/token.h"
 
-#include "programs/channel/error.h"
-#include "programs/channel/hex.h"
-#include "programs/channel/private_file.h"
+#include "programs/base/error.h"
+#include "programs/base/hex.h"
+#include "programs/base/private_file.h"
 
 #include <openssl/crypto.h>
 #include <openssl/evp.h>
@@ -26,8 +26,8 @@ bool isWordCharacter(char c) { return c > ' ' && c < '\x7f'; }
 std::string randomHex() {
     std::array<unsigned char, RANDOM_BYTES> bytes;
     if (RAND_bytes(bytes.data(), bytes.size()) != 1)
-        throw Error("The system gives no random numbers.");
-    return toHex(bytes);
+        throw Base::Error("The system gives no random numbers.");
+    return Base::toHex(bytes);
 }
 
 std::string_view trimmed(std::string_view text) {
@@ -40,17 +40,17 @@ std::string_view trimmed(std::string_view text) {
 } // namespace
 
 std::string readToken(std::string const& file) {
-    std::string const contents = readPrivateFile(file, MAX_TOKEN_FILE);
+    std::string const contents = Base::readPrivateFile(file, MAX_TOKEN_FILE);
     std::string_view const token = trimmed(contents);
     if (token.size() < MIN_TOKEN_LENGTH || !std::all_of(token.begin(), token.end(), isWordCharacter))
-        throw Error("The file \"" + file + "\" holds no access token, which is one word of at least " +
-                    std::to_string(MIN_TOKEN_LENGTH) + " characters.");
+        throw Base::Error("The file \"" + file + "\" holds no access token, which is one word of at least " +
+                          std::to_string(MIN_TOKEN_LENGTH) + " characters.");
     return std::string(token);
 }
 
 std::string readOrCreateToken(std::string const& file) {
     if (::access(file.c_str(), F_OK) != 0)
-        createPrivateFile(file, randomHex() + '\n');
+        Base::createPrivateFile(file, randomHex() + '\n');
     return readToken(file);
 }
 
@@ -66,7 +66,7 @@ std::string makeProof(Side side, std::string_view token, std::string_view client
     unsigned int length = 0;
     HMAC(EVP_sha256(), token.data(), static_cast<int>(token.size()),
          reinterpret_cast<unsigned char const*>(message.data()), message.size(), code.data(), &length);
-    return toHex({code.data(), length});
+    return Base::toHex({code.data(), length});
 }
 
 bool isSameProof(std::string_view a, std::string_view b) {

@@ -1,8 +1,8 @@
 #include "programs/mailing/metadata.h"
 
+#include "vlservice/json/json_text.h"
 #include "vlservice/pack/page_loader.h"
 #include "vlservice/pack/page_saver.h"
-#include "vlservice/platform/json_text.h"
 
 #include <sstream>
 #include <stdexcept>

@@ -1,6 +1,6 @@
 #include "programs/mailing/pack_database.h"
 
-#include "programs/mailing/safe_name.h"
+#include "programs/base/safe_name.h"
 
 #include <SQLiteCpp/Transaction.h>
 
@@ -51,7 +51,7 @@ decltype(auto) orDatabaseError(fs::path const& file, Operation operation) {
     try {
         return operation();
     } catch (SQLite::Exception const& failure) {
-        throw DatabaseError("the pack database " + file.string() + " failed: " + failure.what());
+        throw Database::DatabaseError("the pack database " + file.string() + " failed: " + failure.what());
     }
 }
 
@@ -63,17 +63,20 @@ SharedMemBuffer bufferIn(SQLite::Column const& column) {
 
 } // namespace
 
-DatabaseKind const& packDatabase() {
-    static DatabaseKind const kind{"pack database", APPLICATION_ID, {SCHEMA_1}};
+Database::DatabaseKind const& packDatabase() {
+    static Database::DatabaseKind const kind{"pack database", APPLICATION_ID, {SCHEMA_1}};
     return kind;
 }
 
-bool isPackId(std::string const& id) { return id.size() <= MAX_PACK_ID_BYTES && safeFileName(id) == id; }
+bool isPackId(std::string const& id) {
+    return id.size() <= MAX_PACK_ID_BYTES && Base::safeFileName(id) == id;
+}
 
 PackDatabaseWriter::PackDatabaseWriter(fs::path const& file, PackInfo const& pack)
-    : PageSaverI(pack.id), file_(file), database_(openDatabase(file, packDatabase(), Journal::Rollback)) {
+    : PageSaverI(pack.id), file_(file),
+      database_(Database::openDatabase(file, packDatabase(), Database::Journal::Rollback)) {
     if (!isPackId(pack.id))
-        throw DatabaseError("the pack id \"" + pack.id + "\" cannot name a file");
+        throw Database::DatabaseError("the pack id \"" + pack.id + "\" cannot name a file");
     orDatabaseError(file_, [&] { begin(pack); });
 }
 
@@ -102,15 +105,17 @@ void PackDatabaseWriter::begin(PackInfo const& pack) {
     insertion.bind(3, pack.title);
     insertion.bind(4, static_cast<std::int64_t>(now));
     if (insertion.exec() == 0)
-        throw DatabaseError("the pack database " + file_.string() + " has a pack " + pack.id + " already");
+        throw Database::DatabaseError("the pack database " + file_.string() + " has a pack " + pack.id +
+                                      " already");
     transaction.commit();
 }
 
 void PackDatabaseWriter::savePage(std::string const& document, std::string const& page,
                                   SharedMemBuffer data) {
     if (data.empty() || data.size() > MAX_BLOB_BYTES)
-        throw DatabaseError("page \"" + page + "\" of \"" + document + "\" cannot be stored: it has " +
-                            std::to_string(data.size()) + " bytes");
+        throw Database::DatabaseError("page \"" + page + "\" of \"" + document +
+                                      "\" cannot be stored: it has " + std::to_string(data.size()) +
+                                      " bytes");
     batchBytes_ += data.size();
     batch_.push_back({document, page, std::move(data)});
     if (batchBytes_ < BATCH_BYTES)
@@ -158,7 +163,8 @@ void PackDatabaseWriter::eraseUnfinished() {
 }
 
 PackDatabaseReader::PackDatabaseReader(fs::path const& file, std::string const& packId)
-    : PageLoaderI(packId), file_(file), database_(openForReading(file, packDatabase(), MAX_BLOB_BYTES)) {
+    : PageLoaderI(packId), file_(file),
+      database_(Database::openForReading(file, packDatabase(), MAX_BLOB_BYTES)) {
     orDatabaseError(file_, [&] {
         readInfo();
         readPageNames();
@@ -169,7 +175,8 @@ void PackDatabaseReader::readInfo() {
     SQLite::Statement query(database_, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
     query.bind(1, packId());
     if (!query.executeStep())
-        throw DatabaseError("the pack database " + file_.string() + " has no finished pack " + packId());
+        throw Database::DatabaseError("the pack database " + file_.string() + " has no finished pack " +
+                                      packId());
     info_ = {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
 }
 
@@ -210,7 +217,7 @@ SharedMemBuffer PackDatabaseReader::metadata() {
 }
 
 void removePack(fs::path const& file, std::string const& packId) {
-    SQLite::Database database = openDatabase(file, packDatabase(), Journal::Rollback);
+    SQLite::Database database = Database::openDatabase(file, packDatabase(), Database::Journal::Rollback);
     orDatabaseError(file, [&] {
         SQLite::Statement deletion(database, "DELETE FROM packs WHERE id = ?");
         deletion.bind(1, packId);

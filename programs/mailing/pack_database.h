@@ -1,7 +1,7 @@
 #pragma once
 // The pack database: where a client leaves the pages of its mailings until the service has fetched them.
 
-#include "programs/mailing/sqlite_file.h"
+#include "programs/database/sqlite_file.h"
 #include "vlservice/pack/page_loader.h"
 #include "vlservice/pack/page_saver.h"
 
@@ -16,7 +16,7 @@ namespace Mailing {
 // A database holds any number of packs. A pack is one row of `packs` (id, cfg_id, title, metadata, complete,
 // created_at) and one row of `pages` for each page (pack, position from 0, document, page, data). Metadata
 // and pages are products of PageSaverI::zipDbData. Readers see a pack only when `complete` is 1.
-DatabaseKind const& packDatabase();
+Database::DatabaseKind const& packDatabase();
 
 /// Whether a pack can bear this id: it names a file later on, so it has to be a safe file name of at most 128
 /// bytes.
@@ -31,11 +31,11 @@ struct PackInfo {
 };
 
 /// Stores one pack. What was stored disappears with the object unless finish() was called. Every operation
-/// throws DatabaseError when the database cannot do its part.
+/// throws Database::DatabaseError when the database cannot do its part.
 class PackDatabaseWriter : public PageSaverI {
 public:
-    /// Opens the database, or creates it, and begins a pack. Throws DatabaseError when the id is none or
-    /// belongs to a finished pack already.
+    /// Opens the database, or creates it, and begins a pack. Throws Database::DatabaseError when the id is
+    /// none or belongs to a finished pack already.
     PackDatabaseWriter(std::filesystem::path const& file, PackInfo const& pack);
     ~PackDatabaseWriter() override;
     PackDatabaseWriter(PackDatabaseWriter const&) = delete;
@@ -76,7 +76,7 @@ public:
         std::string page;
     };
 
-    /// Throws DatabaseError when there is no such finished pack.
+    /// Throws Database::DatabaseError when there is no such finished pack.
     PackDatabaseReader(std::filesystem::path const& file, std::string const& packId);
 
     PackInfo const& info() const { return info_; }
@@ -85,7 +85,7 @@ public:
     std::size_t documentCount() const;
 
     /// Calls `func` before it returns, with the empty buffer when there is no such page.
-    /// Throws DatabaseError when the database cannot be read.
+    /// Throws Database::DatabaseError when the database cannot be read.
     void requestPageData(std::string const& document, std::string const& page, PageFunc func) override;
     SharedMemBuffer metadata();
 
@@ -100,7 +100,7 @@ private:
 };
 
 /// Erases a pack and gives its room back to the database. Nothing happens when there is none of that id.
-/// Throws DatabaseError.
+/// Throws Database::DatabaseError.
 void removePack(std::filesystem::path const& file, std::string const& packId);
 
 } // namespace Mailing

@@ -1,5 +1,6 @@
 #include "programs/reader/document.h"
 
+#include "programs/base/error.h"
 #include "programs/reader/page_source.h"
 
 #include <cerrno>
@@ -26,13 +27,13 @@ bool isPdf(std::string_view bytes) {
     switch (error) {
     case ENOENT:
     case ENOTDIR:
-        throw Error(path.string() + ": there is no such file; check the name");
+        throw Base::Error(path.string() + ": there is no such file; check the name");
     case EACCES:
     case EPERM:
-        throw Error(path.string() + ": no right to read it; change its permissions");
+        throw Base::Error(path.string() + ": no right to read it; change its permissions");
     default:
-        throw Error(path.string() + ": cannot be read (" + std::strerror(error) +
-                    "); copy it to another place");
+        throw Base::Error(path.string() + ": cannot be read (" + std::strerror(error) +
+                          "); copy it to another place");
     }
 }
 
@@ -76,9 +77,9 @@ std::string readFile(fs::path const& path) {
     if (failure)
         failToOpen(path, failure.value());
     if (fs::is_directory(status))
-        throw Error(path.string() + ": is a folder; name the documents in it");
+        throw Base::Error(path.string() + ": is a folder; name the documents in it");
     if (!fs::is_regular_file(status))
-        throw Error(path.string() + ": is no ordinary file; save the document to one");
+        throw Base::Error(path.string() + ": is no ordinary file; save the document to one");
 
     errno = 0;
     std::ifstream in(path, std::ios::binary);
@@ -98,7 +99,7 @@ Document openDocument(fs::path const& path) { return openDocument(readFile(path)
 Document openDocument(std::string bytes, fs::path const& name) {
     std::string const where = name.string();
     if (bytes.empty())
-        throw Error(where + ": is empty; export the document again");
+        throw Base::Error(where + ": is empty; export the document again");
     return Document(name.filename().string(),
                     isPdf(bytes) ? openPdf(std::move(bytes), where) : openText(bytes, where));
 }

@@ -1,7 +1,7 @@
 #pragma once
 // A document from outside, PDF or text, as pages with words on them.
 
-#include "programs/reader/error.h"
+#include "programs/base/error.h"
 #include "programs/reader/page.h"
 
 #include <filesystem>

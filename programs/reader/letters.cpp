@@ -1,4 +1,5 @@
 #include "programs/reader/letters.h"
+#include "programs/base/error.h"
 
 #include <algorithm>
 #include <utility>
@@ -101,8 +102,9 @@ private:
         try {
             field.validate(value);
         } catch (std::exception const& failure) {
-            throw Error(document_.name() + ": the value of field \"" + field.name() +
-                        "\" cannot be validated (" + failure.what() + "); correct the field's value_match");
+            throw Base::Error(document_.name() + ": the value of field \"" + field.name() +
+                              "\" cannot be validated (" + failure.what() +
+                              "); correct the field's value_match");
         }
     }
 

@@ -1,6 +1,6 @@
 #include "programs/reader/pdf_page.h"
 
-#include "programs/reader/error.h"
+#include "programs/base/error.h"
 
 #include <qpdf/Buffer.hh>
 #include <qpdf/QPDF.hh>
@@ -108,7 +108,8 @@ std::string PdfPageWriter::write(int number, int pageCount) {
         QPDFPageDocumentHelper(single).addPage(page, false);
         return bytesOf(single);
     } catch (std::exception const&) {
-        throw Error(where_ + ": page " + std::to_string(number) + " is damaged; export the document again");
+        throw Base::Error(where_ + ": page " + std::to_string(number) +
+                          " is damaged; export the document again");
     }
 }
 

@@ -1,7 +1,7 @@
 // The one file that knows poppler, which reads the words and draws the pages; single pages are written by
 // pdf_page.
+#include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
-#include "programs/reader/error.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_page.h"
 
@@ -139,7 +139,7 @@ std::string pngOf(poppler::image const& image) {
     std::string bytes(size, '\0');
     if (!png_image_write_to_memory(&png, bytes.data(), &size, 0, image.const_data(), image.bytes_per_row(),
                                    nullptr))
-        throw Error(std::string("the picture of the page cannot be written: ") + png.message);
+        throw Base::Error(std::string("the picture of the page cannot be written: ") + png.message);
     bytes.resize(size);
     return bytes;
 }
@@ -150,13 +150,13 @@ public:
         : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_) {
         preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
-            throw Error(where_ + ": is larger than 2 GiB; split it");
+            throw Base::Error(where_ + ": is larger than 2 GiB; split it");
         document_.reset(
             poppler::document::load_from_raw_data(bytes_.data(), static_cast<int>(bytes_.size())));
         if (document_ && document_->is_locked())
-            throw Error(where_ + ": is an encrypted PDF; save it without a password");
+            throw Base::Error(where_ + ": is an encrypted PDF; save it without a password");
         if (!document_ || document_->pages() < 1)
-            throw Error(where_ + ": is a damaged PDF; export the document again");
+            throw Base::Error(where_ + ": is a damaged PDF; export the document again");
     }
 
     int pageCount() const override { return document_->pages(); }
@@ -190,8 +190,8 @@ public:
         poppler::rectf const sheet = page->page_rect();
         double const scale = dotsPerInch / 72;
         if (!(sheet.width() * scale * sheet.height() * scale <= MAX_PIXELS))
-            throw Error(where_ + ": page " + std::to_string(number) +
-                        " makes too large a picture; ask for fewer dots per inch");
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " makes too large a picture; ask for fewer dots per inch");
 
         poppler::page_renderer renderer;
         renderer.set_image_format(poppler::image::format_rgb24);
@@ -199,8 +199,8 @@ public:
         renderer.set_render_hint(poppler::page_renderer::text_antialiasing);
         poppler::image const image = renderer.render_page(page.get(), dotsPerInch, dotsPerInch);
         if (!image.is_valid())
-            throw Error(where_ + ": page " + std::to_string(number) +
-                        " cannot be drawn; export the document again");
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " cannot be drawn; export the document again");
         return pngOf(image);
     }
 
@@ -208,8 +208,8 @@ private:
     std::unique_ptr<poppler::page> popplerPage(int number) const {
         std::unique_ptr<poppler::page> page(document_->create_page(number - 1));
         if (!page)
-            throw Error(where_ + ": page " + std::to_string(number) +
-                        " is damaged; export the document again");
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " is damaged; export the document again");
         return page;
     }
 

@@ -1,7 +1,7 @@
 #include "programs/reader/text_pdf.h"
 
+#include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
-#include "programs/reader/error.h"
 #include "programs/reader/pdf_page.h"
 #include "programs/reader/true_type.h"
 #include "programs/reader/typed_page.h"
@@ -24,8 +24,8 @@ TrueTypeFont const& wideFont() {
     static TrueTypeFont const font = [] {
         std::ifstream in(FONT_FILE, std::ios::binary);
         if (!in)
-            throw Error(std::string("there is no font ") + FONT_FILE + "; install the package " +
-                        FONT_PACKAGE);
+            throw Base::Error(std::string("there is no font ") + FONT_FILE + "; install the package " +
+                              FONT_PACKAGE);
         return TrueTypeFont({std::istreambuf_iterator<char>(in), {}});
     }();
     return font;
@@ -90,8 +90,8 @@ private:
             U16_NEXT(text.data(), i, text.size(), c);
             GlyphNumber const glyph = wideFont().glyphOf(static_cast<char32_t>(c));
             if (glyph == 0)
-                throw Error(where_ + ": page " + std::to_string(page_.number) + ": no font for \"" +
-                            word.text + "\"; export the document as PDF");
+                throw Base::Error(where_ + ": page " + std::to_string(page_.number) + ": no font for \"" +
+                                  word.text + "\"; export the document as PDF");
             wideCharacters_.emplace(glyph, c);
             numbers += hex(glyph, 4);
         }

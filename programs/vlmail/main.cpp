@@ -1,4 +1,4 @@
-#include "programs/vlmail/command.h"
+#include "programs/vlmail/commands/command.h"
 
 #include "vlservice/platform/log.h"
 

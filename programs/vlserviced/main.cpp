@@ -1,4 +1,4 @@
-#include "programs/vlserviced/one_line.h"
+#include "programs/base/one_line.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
 #include "vlservice/platform/log.h"
@@ -21,7 +21,7 @@ int serve(VlServiced::Options const& options) {
         service.run();
         return 0;
     } catch (std::exception const& failure) {
-        std::cerr << "vlserviced: " << VlServiced::oneLine(failure.what()) << std::endl;
+        std::cerr << "vlserviced: " << Base::oneLine(failure.what()) << std::endl;
         return 1;
     }
 }

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/node_id.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "vlservice/cfg/id.h"
 
 #include <algorithm>
@@ -21,7 +21,7 @@ std::string shown(std::string const& id) {
 }
 
 [[noreturn]] void refuse(std::string const& id, std::string const& why) {
-    throw Error("node id " + shown(id) + " is not valid: " + why);
+    throw Base::Error("node id " + shown(id) + " is not valid: " + why);
 }
 
 /// The kind of a token whose name is not empty.

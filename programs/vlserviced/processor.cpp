@@ -1,8 +1,8 @@
 #include "programs/vlserviced/processor.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
+#include "programs/base/one_line.h"
 #include "programs/vlserviced/jobs/job_list.h"
-#include "programs/vlserviced/one_line.h"
 #include "programs/vlserviced/settings/parts.h"
 #include "vlservice/ipc/cfg_ids_for_user.h"
 #include "vlservice/ipc/cfg_ids_tree.h"
@@ -31,7 +31,7 @@ std::string errorOf(Ipc::CmdI const& cmd, Operation operation) {
         operation();
         return {};
     } catch (std::exception const& failure) {
-        std::string line = oneLine(failure.what());
+        std::string line = Base::oneLine(failure.what());
         Log::Lock(4).logStreamLine() << "Command " << cmd.name() << " was refused: " << line;
         return line;
     }
@@ -78,18 +78,18 @@ json::Object Processor::answer(json::Object const& query) const {
         return settingsOf(query);
     if (kind == "jobs")
         return listJobs(query, jobs_, settings_, outbox_, now_());
-    throw Error("there is no query \"" + kind + "\"; there are settings, jobs");
+    throw Base::Error("there is no query \"" + kind + "\"; there are settings, jobs");
 }
 
 json::Object Processor::settingsOf(json::Object const& query) const {
     json::Value const id = query.get("id");
     // Anything but a text would read as the root.
     if (!id.isString())
-        throw Error("\"id\" of a query for settings has to be the id of a node");
+        throw Base::Error("\"id\" of a query for settings has to be the id of a node");
     return settings_.effective(id.toString(), partsIn(query));
 }
 
-void Processor::visit(Ipc::GuiFwd&) { throw Error("the service forwards nothing to a user interface"); }
+void Processor::visit(Ipc::GuiFwd&) { throw Base::Error("the service forwards nothing to a user interface"); }
 
 void Processor::visit(Ipc::SetSvcCfg& cmd) { settings_.changeService(cmd.req()); }
 

@@ -1,10 +1,10 @@
 #include "programs/vlserviced/service.h"
 
+#include "programs/base/error.h"
+#include "programs/base/one_line.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
 #include "programs/vlserviced/discovery_answer.h"
-#include "programs/vlserviced/error.h"
-#include "programs/vlserviced/one_line.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/schema.h"
@@ -40,13 +40,13 @@ long long now() { return std::time(nullptr); }
 
 fs::path preparedOutbox(Options const& options, DataFolder const& data) {
     fs::path const outbox = fs::absolute(options.outbox.empty() ? data.outbox() : options.outbox);
-    if (!isPlainText(outbox.string(), MAX_PATH_BYTES))
-        throw Error("the path of the outbox has to be a line of UTF-8 text");
+    if (!Base::isPlainText(outbox.string(), MAX_PATH_BYTES))
+        throw Base::Error("the path of the outbox has to be a line of UTF-8 text");
     makeWritableFolder(outbox);
     return outbox;
 }
 
-/// Whether the file is one that a Mailing::PendingFile was being written to.
+/// Whether the file is one that a Base::PendingFile was being written to.
 bool isUnfinished(fs::path const& file) {
     std::string const name = file.filename().string();
     return name.size() == 12 && name.starts_with('.') && name.ends_with(".part");
@@ -127,7 +127,7 @@ private:
                 return;
             } catch (std::exception const& failure) {
                 Log::Lock(3).logStreamLine()
-                    << "The service goes on after a failure. " << oneLine(failure.what());
+                    << "The service goes on after a failure. " << Base::oneLine(failure.what());
             }
         }
     }

@@ -3,7 +3,7 @@
 
 #include "tests/channel/running_server.h"
 
-#include "programs/channel/error.h"
+#include "programs/base/error.h"
 
 #include "vlservice/ipc/cfg_ids_for_user.h"
 #include "vlservice/ipc/cfg_ids_tree.h"
@@ -39,7 +39,7 @@ protected:
     static std::string connectError(FakeService& service, std::chrono::milliseconds time = 60s) {
         auto settings = service.clientSettings();
         settings.connectTime = time;
-        return withoutName(service, messageOf<Channel::Error>([&] { Client client(settings); }));
+        return withoutName(service, messageOf<Base::Error>([&] { Client client(settings); }));
     }
 
     static std::string withoutName(FakeService& service, std::string const& error) {
@@ -67,10 +67,10 @@ TEST(Clients, SayThatNobodyIsThere) {
     settings.host = "127.0.0.1";
     settings.port = port;
     settings.token = TOKEN;
-    EXPECT_EQ(messageOf<Channel::Error>([&] { Client client(settings); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { Client client(settings); }),
               "127.0.0.1:" + std::to_string(port) + ": Nobody answers there: Connection refused.");
     settings.host = "::1";
-    EXPECT_THAT(messageOf<Channel::Error>([&] { Client client(settings); }),
+    EXPECT_THAT(messageOf<Base::Error>([&] { Client client(settings); }),
                 StartsWith("[::1]:" + std::to_string(port) + ": Nobody answers there: "));
 }
 
@@ -135,7 +135,7 @@ TEST(Clients, WithAnotherTokenKnowThatItIsNotTheServices) {
     RunningServer const server;
     auto settings = server.clientSettings();
     settings.token = TOKEN + "x";
-    EXPECT_THAT(messageOf<Channel::Error>([&] { Client client(settings); }),
+    EXPECT_THAT(messageOf<Base::Error>([&] { Client client(settings); }),
                 EndsWith(": Whoever answers there does not know our access token."));
 }
 
@@ -152,10 +152,10 @@ TEST_F(BrokenServices, ThatGiveNoAnswerAreLeftInTime) {
     };
     Client client(settings);
     std::string const expected = service.name() + ": It gives no answer within 0.050 s.";
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
     EXPECT_THAT(log.lines(), ElementsAre("Command Price Estimate failed in transfer. " + expected));
     // There is nothing left to wait for.
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::CfgIdsTree>(); }), expected);
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::CfgIdsTree>(); }), expected);
 }
 
 TEST_F(BrokenServices, ThatDoNotEvenReadAreLeftInTime) {
@@ -168,7 +168,7 @@ TEST_F(BrokenServices, ThatDoNotEvenReadAreLeftInTime) {
     settings.requestTime = [](Ipc::Timeouts::TimeoutId) { return 100ms; };
     Client client(settings);
     json::Object const large{{"a", std::string(15 * 1024 * 1024, 'x')}};
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(large); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(large); }),
               service.name() + ": It gives no answer within 0.100 s.");
     left.set_value();
 }
@@ -192,8 +192,8 @@ TEST_P(FatalAnswers, FailTheRequestAndWhatFollows) {
     });
     Client client(service.clientSettings());
     std::string const expected = service.name() + ": " + GetParam().error;
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }), expected);
     EXPECT_THAT(log.lines(), Each("Command Price Estimate failed in transfer. " + expected));
 }
 
@@ -221,7 +221,7 @@ TEST_F(BrokenServices, ThatBreakOffAnywhereInAnAnswerAreTold) {
             peer.send(answer.substr(0, length));
         });
         Client client(service.clientSettings());
-        EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
+        EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
                   service.name() + ": The connection ended in the middle of a message.");
     }
 }
@@ -233,7 +233,7 @@ TEST_F(BrokenServices, ThatVanishAreTold) {
         peer.vanish();
     });
     Client client(service.clientSettings());
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
               service.name() + ": Connection reset by peer.");
 }
 
@@ -257,7 +257,7 @@ TEST_P(HarmlessAnswers, LeaveTheConnectionInUse) {
         wait(peer);
     });
     Client client(service.clientSettings());
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::CfgIdsForUser>("bob"); }), GetParam().error);
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::CfgIdsForUser>("bob"); }), GetParam().error);
     EXPECT_EQ(client.call<Ipc::PriceEst>(json::Object{})->resp().get("cents").intOrZero(), 3);
 }
 
@@ -286,22 +286,22 @@ protected:
 };
 
 TEST_F(UnsendableCommands, AreThoseOfOthers) {
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.send(std::make_shared<Ipc::PriceEst>(nullptr)); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.send(std::make_shared<Ipc::PriceEst>(nullptr)); }),
               "It was not built for this connection.");
     Client other(server.clientSettings());
     EXPECT_EQ(
-        messageOf<Channel::Error>([&] { client.send(std::make_shared<Ipc::PriceEst>(other.processor())); }),
+        messageOf<Base::Error>([&] { client.send(std::make_shared<Ipc::PriceEst>(other.processor())); }),
         "It was not built for this connection.");
 }
 
 TEST_F(UnsendableCommands, AreTheTooLarge) {
     json::Object const tooLarge{{"a", std::string(16 * 1024 * 1024, 'x')}};
-    EXPECT_EQ(messageOf<Channel::Error>([&] { client.call<Ipc::PriceEst>(tooLarge); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(tooLarge); }),
               "A message of 16777224 bytes is over the limit of 16777216.");
 }
 
 TEST_F(UnsendableCommands, AreThoseWithTextThatIsNoUtf8) {
-    EXPECT_EQ(messageOf<Channel::Error>([&] {
+    EXPECT_EQ(messageOf<Base::Error>([&] {
                   client.call<Ipc::PriceEst>(json::Object{{"a", "\xff"}});
               }),
               "JSON error: a text that is not valid UTF-8 cannot be printed");

@@ -7,6 +7,7 @@
 #include "vlservice/ipc/remove_cfg_node.h"
 #include "vlservice/ipc/update_status.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/message_text.h"
 
 #include <gmock/gmock.h>
@@ -27,7 +28,7 @@ protected:
     static std::string errorOf(Operation operation) {
         try {
             operation();
-        } catch (Channel::Error const& e) {
+        } catch (Base::Error const& e) {
             return e.what();
         }
         return "no error";

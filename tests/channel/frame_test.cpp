@@ -1,5 +1,6 @@
 // Frames: what is written, what is read, and what is refused.
 
+#include "programs/base/error.h"
 #include "programs/channel/frame.h"
 
 #include "tests/support/format_document.h"
@@ -55,7 +56,7 @@ std::string refusalOf(std::string_view bytes) {
     try {
         feed(decoder, bytes);
         takeAll(decoder);
-    } catch (Channel::Error const& e) {
+    } catch (Base::Error const& e) {
         return e.what();
     }
     return {};
@@ -77,7 +78,7 @@ TEST(Frames, AreNotWrittenOverTheLimit) {
     try {
         Channel::appendFrame(bytes, {1, Kind::Request, 1, tooLong});
         FAIL() << "nothing was thrown";
-    } catch (Channel::Error const& e) {
+    } catch (Base::Error const& e) {
         EXPECT_STREQ(e.what(), "A message of 16777217 bytes is over the limit of 16777216.");
     }
     EXPECT_EQ(bytes, "");
@@ -197,7 +198,7 @@ TEST(Frames, KeepToALowerLimit) {
     FrameDecoder decoder;
     decoder.limitText(99);
     feed(decoder, bytesOf({{1, Kind::Request, 1, std::string(100, 'x')}}));
-    EXPECT_THROW(decoder.next(), Channel::Error);
+    EXPECT_THROW(decoder.next(), Base::Error);
 }
 
 // --- the description

@@ -2,7 +2,7 @@
 
 #include "tests/channel/running_server.h"
 
-#include "programs/channel/error.h"
+#include "programs/base/error.h"
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 

@@ -2,8 +2,8 @@
 
 #include "tests/channel/running_server.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/client_connection.h"
-#include "programs/channel/error.h"
 #include "programs/channel/message_text.h"
 
 #include <boost/asio/io_context.hpp>
@@ -268,7 +268,7 @@ protected:
         Client client(server.clientSettings());
         try {
             client.call<Ipc::PriceEst>(json::Object{});
-        } catch (Channel::Error const& e) {
+        } catch (Base::Error const& e) {
             return e.what();
         }
         return "no error";
@@ -457,7 +457,7 @@ TEST(Servers, RefuseWhatTheyCannotListenOn) {
     auto const refusal = [&](Channel::ServerSettings const& settings) -> std::string {
         try {
             Channel::Server(io, settings, Ipc::makeEmptyCmd, {});
-        } catch (Channel::Error const& e) {
+        } catch (Base::Error const& e) {
             return e.what();
         }
         return "no refusal";

@@ -1,8 +1,8 @@
 // Tokens, proofs, accepted certificates and the files that they lie in.
 
-#include "programs/channel/error.h"
+#include "programs/base/error.h"
+#include "programs/base/private_file.h"
 #include "programs/channel/pin_store.h"
-#include "programs/channel/private_file.h"
 #include "programs/channel/token.h"
 
 #include "tests/support/format_document.h"
@@ -52,7 +52,7 @@ protected:
 TEST_F(PrivateFiles, AreRead) {
     for (mode_t const mode : {0600, 0400, 0700}) {
         write("text\n", mode);
-        EXPECT_EQ(readPrivateFile(file), "text\n");
+        EXPECT_EQ(Base::readPrivateFile(file), "text\n");
     }
 }
 
@@ -65,67 +65,68 @@ TEST_F(PrivateFiles, AreRefusedWhenTheyAreOpenToOthersInAnyWay) {
     for (auto const& [mode, text] : {Open{0644, "0644"}, Open{0660, "0660"}, Open{0604, "0604"},
                                      Open{0602, "0602"}, Open{0610, "0610"}, Open{04640, "4640"}}) {
         write("text", mode);
-        EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }), "The file \"" + file +
-                                                                        "\" is open to others (mode " + text +
-                                                                        "); make it private with chmod 600.");
+        EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(file); }),
+                  "The file \"" + file + "\" is open to others (mode " + text +
+                      "); make it private with chmod 600.");
     }
 }
 
 TEST_F(PrivateFiles, AreRefusedWhenTheyAreNoFiles) {
-    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(folder.string()); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(folder.string()); }),
               '"' + folder.string() + "\" is not a file.");
     ::mkfifo(file.c_str(), 0600);
-    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }), '"' + file + "\" is not a file.");
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(file); }), '"' + file + "\" is not a file.");
 }
 
 TEST_F(PrivateFiles, AreRefusedWhenTheyAreAnotherUsers) {
     write("text");
     if (::chown(file.c_str(), 12345, 12345) != 0)
         GTEST_SKIP() << "There is no right to give files to another user.";
-    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(file); }),
               "The file \"" + file + "\" belongs to another user.");
 }
 
 TEST_F(PrivateFiles, MustBeThere) {
-    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(file); }),
               "Cannot open \"" + file + "\": No such file or directory.");
 }
 
 TEST_F(PrivateFiles, HaveALimit) {
     write("12345");
-    EXPECT_EQ(readPrivateFile(file, 5), "12345");
-    EXPECT_EQ(messageOf<Error>([&] { readPrivateFile(file, 4); }),
+    EXPECT_EQ(Base::readPrivateFile(file, 5), "12345");
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::readPrivateFile(file, 4); }),
               "The file \"" + file + "\" is larger than 4 bytes.");
 }
 
 TEST_F(PrivateFiles, AreMadePrivateWhateverTheMask) {
     mode_t const before = ::umask(0);
-    EXPECT_TRUE(createPrivateFile(file, "text"));
+    EXPECT_TRUE(Base::createPrivateFile(file, "text"));
     ::umask(before);
     EXPECT_EQ(mode(), 0600u);
-    EXPECT_EQ(readPrivateFile(file), "text");
+    EXPECT_EQ(Base::readPrivateFile(file), "text");
 }
 
 TEST_F(PrivateFiles, AreNotReplaced) {
     write("old");
-    EXPECT_FALSE(createPrivateFile(file, "new"));
-    EXPECT_EQ(readPrivateFile(file), "old");
+    EXPECT_FALSE(Base::createPrivateFile(file, "new"));
+    EXPECT_EQ(Base::readPrivateFile(file), "old");
     EXPECT_EQ(std::distance(fs::directory_iterator(folder), {}), 1) << "nothing else is left in the folder";
 }
 
 TEST_F(PrivateFiles, CannotBeMadeWhereThereIsNoFolder) {
     std::string const lost = (folder / "no" / "secret").string();
-    EXPECT_EQ(messageOf<Error>([&] { createPrivateFile(lost, "x"); }),
+    EXPECT_EQ(messageOf<Base::Error>([&] { Base::createPrivateFile(lost, "x"); }),
               "Cannot create \"" + lost + "\": No such file or directory.");
 }
 
 TEST_F(PrivateFiles, GrowAtTheirEnd) {
-    appendToPrivateFile(file, "a\n");
-    appendToPrivateFile(file, "b\n");
-    EXPECT_EQ(readPrivateFile(file), "a\nb\n");
+    Base::appendToPrivateFile(file, "a\n");
+    Base::appendToPrivateFile(file, "b\n");
+    EXPECT_EQ(Base::readPrivateFile(file), "a\nb\n");
     EXPECT_EQ(mode(), 0600u);
     write("a\n", 0644);
-    EXPECT_THAT(messageOf<Error>([&] { appendToPrivateFile(file, "b\n"); }), HasSubstr("is open to others"));
+    EXPECT_THAT(messageOf<Base::Error>([&] { Base::appendToPrivateFile(file, "b\n"); }),
+                HasSubstr("is open to others"));
 }
 
 // --- the token
@@ -141,7 +142,7 @@ TEST_F(PrivateFiles, HoldNoTokenThatIsShortOrNoWord) {
     for (std::string const& contents : {std::string(), std::string("\n"), TOKEN.substr(1),
                                         TOKEN + " " + TOKEN, TOKEN + "\xc3\xa9", std::string(32, '\0')}) {
         write(contents);
-        EXPECT_EQ(messageOf<Error>([&] { readToken(file); }), refusal) << contents;
+        EXPECT_EQ(messageOf<Base::Error>([&] { readToken(file); }), refusal) << contents;
     }
 }
 
@@ -157,7 +158,7 @@ TEST_F(PrivateFiles, GetANewTokenWhenThereIsNone) {
 
 TEST_F(PrivateFiles, KeepATokenThatOthersCanReadFromBeingUsed) {
     write(TOKEN, 0640);
-    EXPECT_THAT(messageOf<Error>([&] { readOrCreateToken(file); }), HasSubstr("is open to others"));
+    EXPECT_THAT(messageOf<Base::Error>([&] { readOrCreateToken(file); }), HasSubstr("is open to others"));
 }
 
 // --- proofs
@@ -207,7 +208,7 @@ TEST_F(PrivateFiles, KeepAcceptedCertificatesByService) {
     EXPECT_EQ(pins.find("a:11"), std::nullopt);
     EXPECT_EQ(pins.find(":1"), std::nullopt);
     EXPECT_EQ(mode(), 0600u);
-    EXPECT_EQ(readPrivateFile(file), "a:1 AA:BB\nb:1 CC:DD\n");
+    EXPECT_EQ(Base::readPrivateFile(file), "a:1 AA:BB\nb:1 CC:DD\n");
 }
 
 TEST_F(PrivateFiles, LetLinesBeAddedAndRemovedByHand) {
@@ -222,7 +223,7 @@ TEST_F(PrivateFiles, LetLinesBeAddedAndRemovedByHand) {
 
 TEST_F(PrivateFiles, KeepNoCertificatesThatOthersCouldHaveWritten) {
     write("a:1 AA:BB\n", 0666);
-    EXPECT_THAT(messageOf<Error>([&] { PinStore(file).find("a:1"); }), HasSubstr("is open to others"));
+    EXPECT_THAT(messageOf<Base::Error>([&] { PinStore(file).find("a:1"); }), HasSubstr("is open to others"));
 }
 
 } // namespace

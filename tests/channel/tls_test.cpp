@@ -3,13 +3,13 @@
 #include "tests/channel/running_server.h"
 #include "tests/channel/test_certificate.h"
 
+#include "programs/base/error.h"
 #include "programs/channel/client.h"
-#include "programs/channel/error.h"
 #include "programs/channel/pin_store.h"
 #include "programs/channel/stream.h"
 
-#include "tests/ipc/two_networks.h"
 #include "tests/support/json_literal.h"
+#include "tests/support/two_networks.h"
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/ssl/stream.hpp>
@@ -75,7 +75,7 @@ protected:
     }
 
     static std::string errorOf(Channel::ClientSettings const& settings) {
-        return messageOf<Channel::Error>([&] { Client client(settings); });
+        return messageOf<Base::Error>([&] { Client client(settings); });
     }
 };
 
@@ -234,7 +234,7 @@ protected:
     TestCertificate const good = makeCertificate(folder.string(), "good");
 
     std::string refusalOf(TestCertificate const& files) {
-        return messageOf<Channel::Error>(
+        return messageOf<Base::Error>(
             [&] { Channel::Server(io, serverSettings(files), Ipc::makeEmptyCmd, {}); });
     }
 };

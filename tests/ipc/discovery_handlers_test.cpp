@@ -6,7 +6,7 @@
 #include "tests/ipc/recording_processor.h"
 
 #include "vlservice/ipc/gui_fwd.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <boost/asio/error.hpp>
 #include <boost/asio/post.hpp>

@@ -3,11 +3,11 @@
 
 #include "tests/ipc/log_capture.h"
 #include "tests/ipc/recording_processor.h"
-#include "tests/ipc/two_networks.h"
+#include "tests/support/two_networks.h"
 
 #include "vlservice/ipc/discovery_cli.h"
 #include "vlservice/ipc/gui_fwd.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <boost/asio/executor_work_guard.hpp>
 #include <boost/asio/ip/multicast.hpp>

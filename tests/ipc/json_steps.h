@@ -1,8 +1,8 @@
 #pragma once
 // The JSON side of a command, which is reached through its base.
 
+#include "vlservice/json/json_text.h"
 #include "vlservice/platform/cmd.h"
-#include "vlservice/platform/json_text.h"
 
 #include <sstream>
 #include <string>

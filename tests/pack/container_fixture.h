@@ -3,7 +3,7 @@
 // byte.
 
 #include "tests/pack/log_lines.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 #include "vlservice/pack/pack_wrapper.h"
 
 #include <gmock/gmock.h>

@@ -1,5 +1,6 @@
 #include "programs/reader/document.h"
 
+#include "programs/base/error.h"
 #include "programs/reader/layout.h"
 
 #include <gmock/gmock.h>
@@ -36,7 +37,7 @@ protected:
     std::string complaint(fs::path const& path) const {
         try {
             openDocument(path);
-        } catch (Error const& error) {
+        } catch (Base::Error const& error) {
             std::string const text = error.what();
             EXPECT_THAT(text, StartsWith(path.string() + ": "));
             return text.substr(std::min(text.size(), path.string().size() + 2));
@@ -158,7 +159,7 @@ TEST(TextFiles, ThatAreNoLettersSaySo) {
     auto const complaint = [](std::string text) -> std::string {
         try {
             openDocument(std::move(text), "a.txt");
-        } catch (Error const& error) {
+        } catch (Base::Error const& error) {
             return error.what();
         }
         return "nothing";
@@ -201,7 +202,7 @@ TEST(TextFiles, WithLettersThatNoFontHasSaySo) {
     try {
         openDocument(std::string("a\f中文"), "a.txt").singlePagePdf(2);
         FAIL();
-    } catch (Error const& error) {
+    } catch (Base::Error const& error) {
         EXPECT_STREQ(error.what(), "a.txt: page 2: no font for \"中文\"; export the document as PDF");
     }
 }
@@ -216,7 +217,7 @@ TEST(Pdfs, GiveTheSameSinglePageEveryTime) {
 TEST(Pdfs, AreDrawnAsPng) {
     Document document = openDocument(pdfOf("Brief"), "a.pdf");
     EXPECT_THAT(document.renderPage(1, 36), StartsWith("\x89PNG\r\n\x1A\n"));
-    EXPECT_THROW(document.renderPage(1, 1e9), Error);
+    EXPECT_THROW(document.renderPage(1, 1e9), Base::Error);
 }
 
 TEST(Pdfs, CutOffAnywhereFailCleanlyOrAreRead) {
@@ -225,7 +226,7 @@ TEST(Pdfs, CutOffAnywhereFailCleanlyOrAreRead) {
         try {
             Document document = openDocument(whole.substr(0, length), "cut.pdf");
             document.page(1);
-        } catch (Error const& error) {
+        } catch (Base::Error const& error) {
             EXPECT_THAT(error.what(), HasSubstr("; "));
         }
     }

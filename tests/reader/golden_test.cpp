@@ -4,7 +4,7 @@
 #include "programs/reader/letters.h"
 
 #include "tests/support/time_zone.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/presets/presets.h"
 
 #include <gmock/gmock.h>

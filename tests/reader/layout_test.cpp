@@ -1,6 +1,6 @@
 #include "programs/reader/layout.h"
 
-#include "tests/reader/typesetter.h"
+#include "tests/support/typesetter.h"
 
 #include <gmock/gmock.h>
 

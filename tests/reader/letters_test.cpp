@@ -1,3 +1,4 @@
+#include "programs/base/error.h"
 #include "programs/reader/letters.h"
 
 #include "tests/support/json_literal.h"
@@ -189,7 +190,7 @@ TEST(Fields, WithABadValidationPatternStopTheDocument) {
     try {
         lettersOf("No 1", preset);
         FAIL();
-    } catch (Error const& error) {
+    } catch (Base::Error const& error) {
         EXPECT_THAT(error.what(),
                     testing::StartsWith("a.txt: the value of field \"no\" cannot be validated ("));
         EXPECT_THAT(error.what(), testing::EndsWith("); correct the field's value_match"));

@@ -1,8 +1,9 @@
 // PDFs as they come from outside: turned, cropped, encrypted, damaged.
+#include "programs/base/error.h"
 #include "programs/reader/document.h"
 #include "programs/reader/layout.h"
 
-#include "tests/reader/pdf_maker.h"
+#include "tests/support/pdf_maker.h"
 
 #include <gmock/gmock.h>
 
@@ -35,7 +36,7 @@ std::vector<std::string> textsOf(Page const& page) {
 std::string complaint(std::function<void()> const& action) {
     try {
         action();
-    } catch (Error const& error) {
+    } catch (Base::Error const& error) {
         return error.what();
     }
     return "nothing";

@@ -1,6 +1,6 @@
 #include "programs/reader/zone_text.h"
 
-#include "tests/reader/typesetter.h"
+#include "tests/support/typesetter.h"
 
 #include <gmock/gmock.h>
 

@@ -1,7 +1,7 @@
 #pragma once
 // JSON in tests: written and printed as text.
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <gmock/gmock.h>
 

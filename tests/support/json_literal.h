@@ -1,8 +1,8 @@
 #pragma once
 // JSON in tests: documents as literals, their compact text, and the message of a failure.
 
-#include "vlservice/cfg/json.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json.h"
+#include "vlservice/json/json_text.h"
 
 #include <cstddef>
 #include <sstream>

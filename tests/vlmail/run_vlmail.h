@@ -1,7 +1,7 @@
 #pragma once
 // Commands of vlmail in tests, run as a person runs them.
 
-#include "programs/vlmail/command.h"
+#include "programs/vlmail/commands/command.h"
 
 #include <sstream>
 #include <string>

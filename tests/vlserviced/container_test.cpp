@@ -1,8 +1,8 @@
 #include "programs/vlserviced/jobs/container.h"
 
-#include "programs/mailing/pending_file.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "programs/base/pending_file.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/pack_help.h"
 
 #include <gtest/gtest.h>

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/store/data_folder.h"
 
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -1,10 +1,10 @@
 // The service as it is found, over a real network: client and service each in a namespace of its own.
 #include "programs/vlserviced/discovery_answer.h"
 
-#include "programs/vlmail/multicast_probe.h"
-#include "programs/vlmail/service_client.h"
+#include "programs/vlmail/service/multicast_probe.h"
+#include "programs/vlmail/service/service_client.h"
 #include "tests/ipc/log_capture.h"
-#include "tests/ipc/two_networks.h"
+#include "tests/support/two_networks.h"
 #include "tests/vlserviced/json_help.h"
 
 #include <boost/asio/executor_work_guard.hpp>

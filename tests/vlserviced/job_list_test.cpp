@@ -1,8 +1,8 @@
 #include "programs/vlserviced/jobs/job_list.h"
 
 #include "programs/vlserviced/store/schema.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
 
 #include <gtest/gtest.h>

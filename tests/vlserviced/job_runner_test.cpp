@@ -2,8 +2,8 @@
 
 #include "programs/vlserviced/jobs/hand_over.h"
 #include "programs/vlserviced/store/schema.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
 

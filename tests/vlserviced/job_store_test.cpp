@@ -1,7 +1,7 @@
 #include "programs/vlserviced/store/job_store.h"
 
 #include "programs/vlserviced/store/schema.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

@@ -1,7 +1,7 @@
 #pragma once
 // JSON as text, both ways, for short tests.
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <sstream>
 #include <string>

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/node_id.h"
 
-#include "tests/failure_of.h"
+#include "tests/support/failure_of.h"
 
 #include <gtest/gtest.h>
 

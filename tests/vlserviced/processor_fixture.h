@@ -3,7 +3,7 @@
 
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/schema.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/platform/log.h"

@@ -1,9 +1,9 @@
 // The program as people run it: started, asked, ended, killed.
 #include "tests/vlserviced/service_process.h"
 
-#include "programs/channel/error.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "programs/base/error.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
 #include "vlservice/ipc/cs_config_ids_list.h"

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/settings/service_settings.h"
 
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
 
 #include <gtest/gtest.h>

@@ -1,8 +1,8 @@
 #include "programs/vlserviced/store/settings_store.h"
 
 #include "programs/vlserviced/store/schema.h"
-#include "tests/failure_of.h"
-#include "tests/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

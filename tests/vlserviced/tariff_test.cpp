@@ -1,6 +1,6 @@
 #include "programs/vlserviced/settings/tariff.h"
 
-#include "tests/failure_of.h"
+#include "tests/support/failure_of.h"
 #include "tests/vlserviced/json_help.h"
 
 #include <gtest/gtest.h>

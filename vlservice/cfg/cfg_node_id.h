@@ -2,8 +2,8 @@
 // The name of a configuration node as a JSON array of its tokens, for documents.
 
 #include "vlservice/cfg/id.h"
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 namespace Cfg {
 

@@ -1,9 +1,9 @@
 #pragma once
 // The departments that users pick from: one list, own or inherited as a whole.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/cfg/part.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <concepts>
 #include <string>

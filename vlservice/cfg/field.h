@@ -2,8 +2,8 @@
 // The fields of a settings part: a value, or a list of elements, each knowing whether it is the node's own or
 // comes from a parent node.
 
-#include "vlservice/cfg/json.h"
-#include "vlservice/cfg/json_form.h"
+#include "vlservice/json/json.h"
+#include "vlservice/json/json_form.h"
 
 #include <algorithm>
 #include <concepts>

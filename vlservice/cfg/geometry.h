@@ -2,9 +2,9 @@
 // The plain geometry of pages: points and rectangles in 1/100 mm, with the origin at the page's top left
 // corner.
 
-#include "vlservice/cfg/json.h"
-#include "vlservice/cfg/json_form.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
+#include "vlservice/json/json_form.h"
 
 #include <cstdint>
 

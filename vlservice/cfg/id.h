@@ -1,8 +1,8 @@
 #pragma once
 // The name of a configuration node as a path text: u=bob/ou=sales/a=acme, the most specific token first.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <concepts>
 #include <cstddef>

@@ -3,7 +3,7 @@
 // parent node and written back, field by field.
 
 #include "vlservice/cfg/field.h"
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <cstddef>
 #include <tuple>

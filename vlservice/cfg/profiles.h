@@ -1,9 +1,9 @@
 #pragma once
 // The profiles that users pick from: a list whose elements are inherited one by one.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/cfg/part.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <tuple>

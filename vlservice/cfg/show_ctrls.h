@@ -1,8 +1,8 @@
 #pragma once
 // Which controls of the user interface are shown.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <bitset>
 #include <cstddef>

@@ -1,8 +1,8 @@
 #include "vlservice/extract/extract_field.h"
 
-#include "vlservice/cfg/json_record.h"
 #include "vlservice/extract/lower_case.h"
 #include "vlservice/extract/regex.h"
+#include "vlservice/json/json_record.h"
 #include "vlservice/platform/log.h"
 
 #include <algorithm>

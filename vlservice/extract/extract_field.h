@@ -2,11 +2,11 @@
 // The definition of one piece of data to be taken from the text of a letter, and the validators that type
 // what was taken.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
 #include "vlservice/extract/extracted_field.h"
 #include "vlservice/extract/ignore_on_group.h"
 #include "vlservice/extract/regex_cache.h"
+#include "vlservice/json/json.h"
 
 #include <cstdint>
 #include <functional>

@@ -1,8 +1,8 @@
 #include "vlservice/extract/extract_preset.h"
 
-#include "vlservice/cfg/json_form.h"
-#include "vlservice/cfg/json_record.h"
 #include "vlservice/extract/regex.h"
+#include "vlservice/json/json_form.h"
+#include "vlservice/json/json_record.h"
 
 #include <ctime>
 #include <limits>

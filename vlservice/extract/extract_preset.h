@@ -2,10 +2,10 @@
 // How one kind of document is to be read: which documents, by their names, and with which zones and reader
 // parameters.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
 #include "vlservice/extract/extract_zones.h"
 #include "vlservice/extract/regex_cache.h"
+#include "vlservice/json/json.h"
 
 #include <cstdint>
 #include <memory>

@@ -1,7 +1,7 @@
 #include "vlservice/extract/extract_zone.h"
 
-#include "vlservice/cfg/json_form.h"
-#include "vlservice/cfg/json_record.h"
+#include "vlservice/json/json_form.h"
+#include "vlservice/json/json_record.h"
 
 #include <algorithm>
 #include <tuple>

@@ -2,9 +2,9 @@
 // A named part of a page together with the fields to look for in it.
 
 #include "vlservice/cfg/geometry.h"
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
 #include "vlservice/extract/extract_field.h"
+#include "vlservice/json/json.h"
 
 #include <cstdint>
 #include <string>

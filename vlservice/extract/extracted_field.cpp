@@ -1,7 +1,7 @@
 #include "vlservice/extract/extracted_field.h"
 
-#include "vlservice/cfg/json_record.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_record.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/platform/local_time.h"
 
 #include <algorithm>

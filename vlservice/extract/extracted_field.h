@@ -2,9 +2,9 @@
 // One value taken from a letter, with its validation state and what the mailing around it needs to know of
 // it.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
 #include "vlservice/extract/ignore_on_group.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 

@@ -1,6 +1,6 @@
 #include "vlservice/ipc/discovery_base.h"
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
 #include <boost/asio/buffer.hpp>

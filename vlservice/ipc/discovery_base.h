@@ -1,8 +1,8 @@
 #pragma once
 // One multicast UDP socket with JSON objects in and out: what service discovery stands on, on both sides.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <utility>
 

@@ -2,7 +2,7 @@
 // The response of a command that can fail on the service's side: "err" with one line of text, nothing on
 // success.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 

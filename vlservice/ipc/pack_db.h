@@ -1,8 +1,8 @@
 #pragma once
 // The JSON form of where the pack database is, for the commands that name nothing else.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 

@@ -2,8 +2,8 @@
 // The bases of commands: what a command is to the connection that carries it and to the processor that
 // handles it.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <chrono>
 #include <functional>

@@ -2,7 +2,7 @@
 // The keys that a record does not know: kept in one JSON value on reading, and written back behind its own
 // keys.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <utility>
 

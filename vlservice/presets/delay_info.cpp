@@ -1,5 +1,5 @@
-#include "vlservice/cfg/json_form.h"
-#include "vlservice/cfg/json_record.h"
+#include "vlservice/json/json_form.h"
+#include "vlservice/json/json_record.h"
 #include "vlservice/presets/pack_preset.h"
 
 #include <tuple>

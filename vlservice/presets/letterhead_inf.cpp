@@ -1,7 +1,7 @@
 #include "vlservice/presets/letterhead_inf.h"
 
-#include "vlservice/cfg/json_form.h"
-#include "vlservice/cfg/json_record.h"
+#include "vlservice/json/json_form.h"
+#include "vlservice/json/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 
 #include <algorithm>

@@ -1,8 +1,8 @@
 #pragma once
 // One letterhead of a pack preset: the document with it, and the pages of a mailing that it applies to.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <vector>

@@ -1,8 +1,8 @@
 #pragma once
 // How the letters of one mailing are to be produced and sent.
 
-#include "vlservice/cfg/json.h"
 #include "vlservice/export.h"
+#include "vlservice/json/json.h"
 #include "vlservice/presets/letterhead_inf.h"
 #include "vlservice/presets/process_mode.h"
 

@@ -1,10 +1,10 @@
 #pragma once
 // The presets of a configuration node: from a document's name to how it is read and how it is sent.
 
-#include "vlservice/cfg/json_form.h"
 #include "vlservice/cfg/part.h"
 #include "vlservice/export.h"
 #include "vlservice/extract/extract_preset.h"
+#include "vlservice/json/json_form.h"
 #include "vlservice/presets/pack_preset.h"
 
 #include <string>

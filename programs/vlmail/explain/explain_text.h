@@ -1,7 +1,7 @@
 #pragma once
 // An explanation for people.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <iosfwd>
 

@@ -1,6 +1,6 @@
 // Near misses in which the pattern, or the writing of the text, would have to be another.
+#include "programs/patterns/pattern_parts.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
-#include "programs/vlmail/explain/pattern_parts.h"
 #include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
 #include "programs/vlmail/presets/words.h"
@@ -182,7 +182,7 @@ std::optional<std::string> absentLiteral(Lookup const& lookup, std::vector<std::
 
 /// All literals of the pattern are in the letter: tells where the longest one stands.
 std::optional<Found> standingSomewhere(Search const& search) {
-    std::vector<std::string> const literals = literalsOf(search.pattern());
+    std::vector<std::string> const literals = Patterns::literalsOf(search.pattern());
     if (literals.empty())
         return std::nullopt;
     Lookup const lookup(search);
@@ -196,8 +196,8 @@ std::optional<Found> standingSomewhere(Search const& search) {
 
 /// Whether it says anything that the front of a pattern fits: a pattern that begins with ".*" fits
 /// everywhere.
-bool isTelling(PatternCut const& cut) {
-    return !literalsOf(cut.front).empty() || literalsOf(cut.rest).empty();
+bool isTelling(Patterns::PatternCut const& cut) {
+    return !Patterns::literalsOf(cut.front).empty() || Patterns::literalsOf(cut.rest).empty();
 }
 
 /// What the engine says, in the library's message.
@@ -226,11 +226,11 @@ std::optional<Found> failure(Search const& search) {
 
 std::optional<Found> valueGroup(Search const& search) {
     auto const hit =
-        search.find(search.withPattern(withWholeAsValue(search.pattern())), search.searchedText());
+        search.find(search.withPattern(Patterns::withWholeAsValue(search.pattern())), search.searchedText());
     if (!hit || hit->match.text.empty())
         return std::nullopt;
     std::string const why =
-        hasValueGroup(search.pattern())
+        Patterns::hasValueGroup(search.pattern())
             ? "its group (?<VAL>...) takes no part in the match: put it where a value always is"
             : "has no group (?<VAL>...): put one round the part that is the value";
     return Found{"the pattern matches " + excerpt(hit->match.text) + ", but " + why, hit->match.text,
@@ -311,9 +311,9 @@ std::optional<Found> joinedLines(Search const& search) {
 
 std::optional<Found> anchor(Search const& search) {
     // A pattern without literals fits something on every page once it may begin and end anywhere.
-    if (literalsOf(search.pattern()).empty())
+    if (Patterns::literalsOf(search.pattern()).empty())
         return std::nullopt;
-    auto const [front, core, end] = anchorsOf(search.pattern());
+    auto const [front, core, end] = Patterns::anchorsOf(search.pattern());
     Best best;
     if (!front.empty())
         best.offer(byPattern(search, core + end,
@@ -329,7 +329,7 @@ std::optional<Found> anchor(Search const& search) {
 
 std::optional<Found> literal(Search const& search) {
     Lookup const lookup(search);
-    std::optional<std::string> const absent = absentLiteral(lookup, literalsOf(search.pattern()));
+    std::optional<std::string> const absent = absentLiteral(lookup, Patterns::literalsOf(search.pattern()));
     if (!absent)
         return std::nullopt;
     Found found{inQuotes(*absent) + " of the pattern occurs nowhere " + lookup.whereLooked()};
@@ -348,10 +348,11 @@ std::optional<Found> literal(Search const& search) {
 std::optional<Found> rest(Search const& search) {
     ZoneText const text = search.searchedText();
     std::string_view const all = text.text();
-    for (PatternCut const& cut : cutsOf(search.pattern())) {
+    for (Patterns::PatternCut const& cut : Patterns::cutsOf(search.pattern())) {
         if (!isTelling(cut))
             continue;
-        auto const hit = search.find(search.withPattern(withWholeAsValue(cut.front)), std::string(all));
+        auto const hit =
+            search.find(search.withPattern(Patterns::withWholeAsValue(cut.front)), std::string(all));
         if (!hit || isBlank(matchIn(all, *hit)))
             continue;
         std::size_t const lineEnd = std::min(all.find('\n', hit->end), all.size());

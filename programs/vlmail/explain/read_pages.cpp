@@ -1,4 +1,5 @@
 #include "programs/vlmail/explain/read_pages.h"
+#include "programs/base/error.h"
 
 namespace VlMail {
 
@@ -9,7 +10,7 @@ LaidOutPage const* ReadPages::page(int number) {
         try {
             Reader::Page const& read = document_.page(number);
             page = LaidOutPage{&read, Reader::layOut(read, rules_)};
-        } catch (Reader::Error const&) {
+        } catch (Base::Error const&) {
             // A page that cannot be read offers nothing; whoever needs it says so.
         }
     }

@@ -1,6 +1,6 @@
 #include "programs/vlmail/pack/byte_file.h"
 
-#include "programs/vlmail/command.h"
+#include "programs/base/error.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -18,7 +18,7 @@ constexpr std::size_t WINDOW = std::size_t{1} << 20;
 constexpr std::size_t STEP = std::size_t{1} << 12;
 
 [[noreturn]] void cannotRead(std::filesystem::path const& path, std::string const& why) {
-    throw Error("cannot read \"" + path.string() + "\": " + why);
+    throw Base::Error("cannot read \"" + path.string() + "\": " + why);
 }
 
 } // namespace

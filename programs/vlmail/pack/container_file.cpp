@@ -1,6 +1,6 @@
 #include "programs/vlmail/pack/container_file.h"
 
-#include "programs/vlmail/command.h"
+#include "programs/base/error.h"
 #include "programs/vlmail/pack/blob_extent.h"
 #include "vlservice/pack/blob_format.h"
 
@@ -31,9 +31,9 @@ bool isCompressed(SharedMemBuffer const& bytes) {
 ContainerFile::ContainerFile(std::string const& path) : fileSize_(ByteFile(path).size()) {
     container_.emplace(path, PackWrapper::PURPOSE_IMPORT, std::string());
     if (!quiet_.empty())
-        throw Error("cannot read \"" + path +
-                    "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
-                    "salvage\" saves what is left of it");
+        throw Base::Error("cannot read \"" + path +
+                          "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
+                          "salvage\" saves what is left of it");
 }
 
 ContainerFile::Blob ContainerFile::blob(unsigned long long index) {

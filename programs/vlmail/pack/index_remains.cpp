@@ -1,6 +1,6 @@
 #include "programs/vlmail/pack/index_remains.h"
 
-#include "programs/vlmail/utf8.h"
+#include "programs/base/utf8.h"
 #include "vlservice/pack/container_format.h"
 
 #include <tinyxml.h>
@@ -47,7 +47,7 @@ std::unique_ptr<TiXmlDocument> parseTag(std::string tag) {
 
 /// Fit to be written into an index: valid text without what XML cannot hold.
 std::string writable(std::string const& text) {
-    std::string name = validUtf8(text);
+    std::string name = Base::validUtf8(text);
     for (char& c : name)
         if (static_cast<unsigned char>(c) < 0x20)
             c = '_';

@@ -1,7 +1,7 @@
 // Patterns: whether they compile, how hard they work, and whether they can fit what is read.
+#include "programs/patterns/outline.h"
+#include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/outline.h"
-#include "programs/vlmail/presets/pattern.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <unicode/normalizer2.h>
@@ -15,7 +15,7 @@ namespace VlMail {
 namespace {
 
 using enum FindingKind;
-using Use = Pattern::Use;
+using Use = Patterns::Pattern::Use;
 
 /// What a pattern that does not compile does to documents.
 char const* consequenceOfBreaking(Use use) {
@@ -45,16 +45,16 @@ struct Trial {
 
 /// The readers of documents cut lines at this length.
 constexpr std::size_t LONG_LINE = 1000;
-constexpr std::size_t BUDGET = Pattern::DEFAULT_BUDGET;
+constexpr std::size_t BUDGET = Patterns::Pattern::DEFAULT_BUDGET;
 /// Only what grows beyond every power of the length exceeds the budget on so short a line.
 constexpr std::size_t SHORT_LINE = 40;
 constexpr std::size_t MIDDLE_LINE = 200;
 
 /// The line that costs most.
-Trial hardest(Pattern const& pattern, std::size_t length, std::size_t& cost) {
+Trial hardest(Patterns::Pattern const& pattern, std::size_t length, std::size_t& cost) {
     Trial trial;
     cost = 0;
-    for (std::string const& line : hardLinesFor(pattern, length)) {
+    for (std::string const& line : Patterns::hardLinesFor(pattern, length)) {
         std::size_t const found = pattern.cost(line, BUDGET);
         if (found <= cost)
             continue;
@@ -67,7 +67,7 @@ Trial hardest(Pattern const& pattern, std::size_t length, std::size_t& cost) {
 }
 
 /// Whether the cost grows with more than the square of the length.
-bool growsFast(Pattern const& pattern) {
+bool growsFast(Patterns::Pattern const& pattern) {
     constexpr std::size_t MORE_THAN_FOURFOLD = 6;
     std::size_t single = 0;
     std::size_t twofold = 0;
@@ -76,8 +76,8 @@ bool growsFast(Pattern const& pattern) {
     return twofold == BUDGET || twofold > MORE_THAN_FOURFOLD * single;
 }
 
-Trial tryHardLines(Pattern const& pattern) {
-    if (!hasRepetition(outlineOf(pattern.text())))
+Trial tryHardLines(Patterns::Pattern const& pattern) {
+    if (!Patterns::hasRepetition(Patterns::outlineOf(pattern.text())))
         return {};
     std::size_t cost = 0;
     Trial trial = hardest(pattern, SHORT_LINE, cost);
@@ -116,12 +116,12 @@ void checkPattern(std::string const& text, Use use, Place const& place, Findings
     if (use != Use::Name && !isComposed(text))
         findings.add(PatternNotComposed, place);
     try {
-        Trial const trial = tryHardLines(Pattern(text, use));
+        Trial const trial = tryHardLines(Patterns::Pattern(text, use));
         if (trial.burden == Burden::Runaway)
             findings.add(RunawayPattern, place, {startOf(trial.line), consequenceOfGivingUp(use)});
         else if (trial.burden == Burden::Slow)
             findings.add(SlowPattern, place, {startOf(trial.line)});
-    } catch (BrokenPattern const& broken) {
+    } catch (Patterns::BrokenPattern const& broken) {
         findings.add(PatternBroken, place,
                      {std::to_string(broken.position + 1), broken.what(), consequenceOfBreaking(use)});
     }
@@ -145,9 +145,9 @@ void checkValueGroups(PresetsDocument const& document, Findings& findings) {
         std::string const text = field.json.get("value_extract").textOrEmpty();
         try {
             if (!text.empty() &&
-                !Pattern(text, Use::Extract).hasGroup(Cfg::ExtractField::REGEX_VALUE_GROUP_MARK))
+                !Patterns::Pattern(text, Use::Extract).hasGroup(Cfg::ExtractField::REGEX_VALUE_GROUP_MARK))
                 findings.add(ValueGroupMissing, field.place / "value_extract");
-        } catch (BrokenPattern const&) {
+        } catch (Patterns::BrokenPattern const&) {
             // Told by checkPatterns.
         }
     });

@@ -1,7 +1,7 @@
 // Which extraction preset a document gets to, and which ones none gets to.
+#include "programs/patterns/outline.h"
+#include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/outline.h"
-#include "programs/vlmail/presets/pattern.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
@@ -38,13 +38,13 @@ constexpr std::array<char const*, 12> ODD_NAMES{
 /// An extraction preset with names that its expression fits.
 struct Reachable {
     ListedExtractPreset const& listed;
-    std::optional<Pattern> pattern;
+    std::optional<Patterns::Pattern> pattern;
     std::vector<std::string> names;
     /// The expression fits one name alone, but for letter case.
     bool hasOneName = false;
 
     bool fits(std::string const& name) const {
-        return pattern && pattern->fits(name) == Pattern::Answer::Yes;
+        return pattern && pattern->fits(name) == Patterns::Pattern::Answer::Yes;
     }
     template<typename Names>
     bool fitsAll(Names const& all) const {
@@ -52,24 +52,25 @@ struct Reachable {
     }
 };
 
-std::optional<Pattern> compiled(std::string const& text) {
+std::optional<Patterns::Pattern> compiled(std::string const& text) {
     try {
-        return Pattern(text, Pattern::Use::Name);
-    } catch (BrokenPattern const&) {
+        return Patterns::Pattern(text, Patterns::Pattern::Use::Name);
+    } catch (Patterns::BrokenPattern const&) {
         return std::nullopt;
     }
 }
 
-bool isOneName(std::vector<PatternSequence> const& outline) {
-    return outline.size() == 1 && std::ranges::all_of(outline.front(), [](PatternPiece const& piece) {
-               return piece.kind == PatternPiece::Kind::Literal && piece.least == piece.most;
+bool isOneName(std::vector<Patterns::PatternSequence> const& outline) {
+    return outline.size() == 1 &&
+           std::ranges::all_of(outline.front(), [](Patterns::PatternPiece const& piece) {
+               return piece.kind == Patterns::PatternPiece::Kind::Literal && piece.least == piece.most;
            });
 }
 
 Reachable reachable(ListedExtractPreset const& listed) {
-    Reachable preset{listed, compiled(listed.match()), {}, isOneName(outlineOf(listed.match()))};
+    Reachable preset{listed, compiled(listed.match()), {}, isOneName(Patterns::outlineOf(listed.match()))};
     if (preset.pattern)
-        preset.names = samplesOf(*preset.pattern, SAMPLES);
+        preset.names = Patterns::samplesOf(*preset.pattern, SAMPLES);
     return preset;
 }
 

@@ -1,9 +1,9 @@
 // Limits and defaults: whether they are read, and what they let through.
+#include "programs/patterns/outline.h"
+#include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/outline.h"
-#include "programs/vlmail/presets/pattern.h"
 #include "programs/vlmail/presets/words.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <algorithm>
 #include <cmath>
@@ -114,8 +114,8 @@ void checkDefault(ListedField const& listed, Cfg::ExtractField const& field, Fin
 /// 1970.
 std::optional<std::string> dateWithoutYear(Cfg::ExtractField const& field) {
     constexpr std::size_t SAMPLES = 12;
-    Pattern const pattern(field.validation().strRegex(), Pattern::Use::Validate);
-    for (std::string const& sample : samplesOf(pattern, SAMPLES)) {
+    Patterns::Pattern const pattern(field.validation().strRegex(), Patterns::Pattern::Use::Validate);
+    for (std::string const& sample : Patterns::samplesOf(pattern, SAMPLES)) {
         auto const value = validated(field, sample);
         if (value && value->isValid() && value->timeVal() < 0 && !pattern.fitsWithGroup(sample, "year"))
             return sample;
@@ -125,11 +125,13 @@ std::optional<std::string> dateWithoutYear(Cfg::ExtractField const& field) {
 
 /// Whether the group of the value fits that text; taken for granted where that cannot be told.
 bool mayExtract(Cfg::ExtractField const& field, char const* text) {
-    auto const outline = outlineOf(field.strRegex());
-    PatternPiece const* const group = findGroup(outline, Cfg::ExtractField::REGEX_VALUE_GROUP_MARK);
+    auto const outline = Patterns::outlineOf(field.strRegex());
+    Patterns::PatternPiece const* const group =
+        Patterns::findGroup(outline, Cfg::ExtractField::REGEX_VALUE_GROUP_MARK);
     try {
-        return !group || Pattern(group->body, Pattern::Use::Validate).fits(text) == Pattern::Answer::Yes;
-    } catch (BrokenPattern const&) {
+        return !group || Patterns::Pattern(group->body, Patterns::Pattern::Use::Validate).fits(text) ==
+                             Patterns::Pattern::Answer::Yes;
+    } catch (Patterns::BrokenPattern const&) {
         return true;
     }
 }
@@ -165,7 +167,7 @@ void checkDatesWithoutYear(PresetsDocument const& document, Findings& findings) 
         try {
             if (auto const date = dateWithoutYear(field))
                 findings.add(DateWithoutYear, listed.place, {inQuotes(*date)});
-        } catch (BrokenPattern const&) {
+        } catch (Patterns::BrokenPattern const&) {
             // Told by checkPatterns.
         }
     });

@@ -1,7 +1,7 @@
 #include "programs/vlmail/presets/presets_document.h"
 #include "programs/vlmail/presets/words.h"
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <algorithm>
 #include <exception>

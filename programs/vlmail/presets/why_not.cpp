@@ -1,7 +1,7 @@
 #include "programs/vlmail/presets/why_not.h"
 
-#include "programs/vlmail/presets/outline.h"
-#include "programs/vlmail/presets/pattern.h"
+#include "programs/patterns/outline.h"
+#include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/presets_document.h"
 #include "programs/vlmail/presets/words.h"
 
@@ -11,10 +11,10 @@ namespace VlMail {
 namespace {
 
 /// The longest beginning of the name that the pattern fits; nothing when there is none.
-std::optional<std::string> longestBeginning(Pattern const& pattern, std::string const& name) {
+std::optional<std::string> longestBeginning(Patterns::Pattern const& pattern, std::string const& name) {
     for (std::size_t length = name.size() + 1; length-- > 0;) {
         bool const splitsCharacter = length < name.size() && (name[length] & 0xC0) == 0x80;
-        if (!splitsCharacter && pattern.fits(name.substr(0, length)) == Pattern::Answer::Yes)
+        if (!splitsCharacter && pattern.fits(name.substr(0, length)) == Patterns::Pattern::Answer::Yes)
             return name.substr(0, length);
     }
     return std::nullopt;
@@ -22,8 +22,9 @@ std::optional<std::string> longestBeginning(Pattern const& pattern, std::string 
 
 std::optional<std::string> fittedBy(std::string const& beginning, std::string const& name) {
     try {
-        return longestBeginning(Pattern("(?:" + beginning + ")", Pattern::Use::Name), name);
-    } catch (BrokenPattern const&) {
+        return longestBeginning(Patterns::Pattern("(?:" + beginning + ")", Patterns::Pattern::Use::Name),
+                                name);
+    } catch (Patterns::BrokenPattern const&) {
         return std::nullopt;
     }
 }
@@ -40,10 +41,10 @@ WhyNot failsAt(std::string const& part, std::string const& fitted) {
 }
 
 /// How far the pieces get, one after the other.
-WhyNot whyNot(PatternSequence const& pieces, std::string const& name) {
+WhyNot whyNot(Patterns::PatternSequence const& pieces, std::string const& name) {
     std::string beginning;
     std::string fitted;
-    for (PatternPiece const& piece : pieces) {
+    for (Patterns::PatternPiece const& piece : pieces) {
         beginning += piece.text;
         auto const longer = fittedBy(beginning, name);
         if (!longer)
@@ -59,8 +60,8 @@ WhyNot whyNot(std::string const& expression, std::string const& name) {
     if (expression.empty())
         return {"an empty expression fits no name", {}, {}};
     std::optional<WhyNot> best;
-    for (PatternSequence const& pieces : outlineOf(expression)) {
-        WhyNot why = whyNot(withJoinedLiterals(pieces), name);
+    for (Patterns::PatternSequence const& pieces : Patterns::outlineOf(expression)) {
+        WhyNot why = whyNot(Patterns::withJoinedLiterals(pieces), name);
         if (!best || why.fitted.size() > best->fitted.size())
             best = std::move(why);
     }

@@ -1,9 +1,9 @@
 #include "programs/vlmail/report/describe.h"
 
-#include "programs/vlmail/field_words.h"
-#include "programs/vlmail/outcome.h"
+#include "programs/base/utf8.h"
+#include "programs/vlmail/letters/field_words.h"
+#include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/presets/words.h"
-#include "programs/vlmail/utf8.h"
 
 #include <algorithm>
 #include <map>

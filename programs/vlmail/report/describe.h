@@ -2,7 +2,7 @@
 // What the report shows of a document: out of the letters that were read and how they came about.
 
 #include "programs/reader/letters.h"
-#include "programs/vlmail/reading.h"
+#include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/report/report.h"
 
 namespace VlMail::Report {

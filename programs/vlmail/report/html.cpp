@@ -1,6 +1,6 @@
 #include "programs/vlmail/report/html.h"
 
-#include "programs/vlmail/utf8.h"
+#include "programs/base/utf8.h"
 
 #include <openssl/evp.h>
 
@@ -48,7 +48,7 @@ void appendEscaped(std::string& html, char c) {
 
 std::string escaped(std::string const& text) {
     std::string html;
-    for (char const c : validUtf8(text))
+    for (char const c : Base::validUtf8(text))
         appendEscaped(html, c);
     return html;
 }

@@ -1,6 +1,6 @@
 #include "programs/vlmail/report/report.h"
 
-#include "programs/vlmail/outcome.h"
+#include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/presets/words.h"
 #include "programs/vlmail/report/html.h"
 #include "programs/vlmail/report/style.h"

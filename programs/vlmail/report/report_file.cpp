@@ -1,9 +1,9 @@
 #include "programs/vlmail/report/report_file.h"
 
-#include "programs/mailing/pending_file.h"
-#include "programs/vlmail/command.h"
+#include "programs/base/error.h"
+#include "programs/base/pending_file.h"
+#include "programs/base/utf8.h"
 #include "programs/vlmail/report/describe.h"
-#include "programs/vlmail/utf8.h"
 
 #include <algorithm>
 
@@ -14,8 +14,8 @@ namespace fs = std::filesystem;
 
 fs::path const& requireHtml(fs::path const& target) {
     if (target.extension() != ".html" && target.extension() != ".htm")
-        throw Error("cannot write a report to \"" + validUtf8(target.string()) +
-                    "\": its name must end in .html; give --report another name");
+        throw Base::Error("cannot write a report to \"" + Base::validUtf8(target.string()) +
+                          "\": its name must end in .html; give --report another name");
     return target;
 }
 
@@ -38,7 +38,7 @@ std::string stateOf(DocumentReading const& reading, std::size_t stuck) {
 
 File::File(fs::path const& target) : target_(requireHtml(target)) {
     // Known now rather than after a long batch.
-    Mailing::PendingFile const attempt(target_);
+    Base::PendingFile const attempt(target_);
 }
 
 void File::take(ReadResult const& result) {
@@ -49,6 +49,6 @@ void File::take(ReadResult const& result) {
          result.report.empty() ? section(describe(reading), entries_.size() + 1) : result.report});
 }
 
-void File::write(Outcome const& outcome) { Mailing::writeFile(target_, page(outcome.inWords(), entries_)); }
+void File::write(Outcome const& outcome) { Base::writeFile(target_, page(outcome.inWords(), entries_)); }
 
 } // namespace VlMail::Report

@@ -1,8 +1,8 @@
 #pragma once
 // The report of a batch as it grows, and as a file.
 
-#include "programs/vlmail/outcome.h"
-#include "programs/vlmail/reading.h"
+#include "programs/vlmail/letters/outcome.h"
+#include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/report/report.h"
 
 #include <filesystem>

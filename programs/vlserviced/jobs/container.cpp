@@ -1,7 +1,8 @@
 #include "programs/vlserviced/jobs/container.h"
 
+#include "programs/base/error.h"
+#include "programs/base/pending_file.h"
 #include "programs/mailing/pack_database.h"
-#include "programs/mailing/pending_file.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/pack_wrapper.h"
 
@@ -33,11 +34,11 @@ void writeContainer(PackLocation const& pack, std::filesystem::path const& targe
     SharedMemBuffer const metadata = pages.metadata();
     if (!isCompressed(metadata))
         throw BadPack("the metadata of pack " + pack.packId + " is not compressed");
-    Mailing::PendingFile pending(target);
+    Base::PendingFile pending(target);
     PackWrapper container(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, pack.packId);
     copyPages(pages, container);
     if (!container.finalizeOutput(metadata))
-        throw Error("the container " + target.string() + " could not be written; the log says why");
+        throw Base::Error("the container " + target.string() + " could not be written; the log says why");
     pending.commit();
 }
 

@@ -1,7 +1,7 @@
 #pragma once
 // From a pack in a client's database to a container in the outbox.
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "programs/vlserviced/jobs/job.h"
 
 #include <filesystem>
@@ -9,14 +9,14 @@
 namespace VlServiced {
 
 /// The pack itself is at fault: trying again would not help.
-class BadPack : public Error {
+class BadPack : public Base::Error {
 public:
     using Error::Error;
 };
 
 /// Writes the pack's container to `target`, which is there only when it is whole, replacing one of that name.
-/// Throws BadPack when a page is no compressed page; Mailing::DatabaseError, Error and std::system_error when
-/// the database cannot be read or the container cannot be written, which may pass.
+/// Throws BadPack when a page is no compressed page; Database::DatabaseError, Error and std::system_error
+/// when the database cannot be read or the container cannot be written, which may pass.
 void writeContainer(PackLocation const& pack, std::filesystem::path const& target);
 
 } // namespace VlServiced

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/jobs/hand_over.h"
 
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
 #include <array>

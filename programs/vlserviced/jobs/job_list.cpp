@@ -1,6 +1,6 @@
 #include "programs/vlserviced/jobs/job_list.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 
 #include <algorithm>
 #include <optional>
@@ -12,7 +12,7 @@ namespace {
 constexpr std::size_t MAX_JOBS = 1000;
 
 [[noreturn]] void refuse(char const* key, char const* wanted) {
-    throw Error(std::string("\"") + key + "\" of a query for jobs has to be " + wanted);
+    throw Base::Error(std::string("\"") + key + "\" of a query for jobs has to be " + wanted);
 }
 
 std::string textIn(json::Object const& query, char const* key) {

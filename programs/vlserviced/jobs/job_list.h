@@ -3,7 +3,7 @@
 
 #include "programs/vlserviced/settings/settings_service.h"
 #include "programs/vlserviced/store/job_store.h"
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 namespace VlServiced {
 

@@ -1,12 +1,12 @@
 #include "programs/vlserviced/jobs/job_runner.h"
 
+#include "programs/base/error.h"
+#include "programs/base/one_line.h"
+#include "programs/base/safe_name.h"
 #include "programs/mailing/pack_database.h"
-#include "programs/mailing/safe_name.h"
-#include "programs/vlserviced/error.h"
 #include "programs/vlserviced/jobs/container.h"
 #include "programs/vlserviced/jobs/hand_over.h"
 #include "programs/vlserviced/node_id.h"
-#include "programs/vlserviced/one_line.h"
 #include "vlservice/platform/log.h"
 
 #include <limits>
@@ -29,23 +29,23 @@ std::string folderText(std::string const& folder) {
 
 PackLocation checkedLocation(PackLocation const& pack) {
     if (!Mailing::isPackId(pack.packId))
-        throw Error("the pack id \"" + pack.packId + "\" cannot name a file");
+        throw Base::Error("the pack id \"" + pack.packId + "\" cannot name a file");
     if (!fs::path(pack.folder).is_absolute())
-        throw Error(
+        throw Base::Error(
             "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a "
             "folder, and \"" +
             pack.folder + "\" is none");
-    if (Mailing::safeFileName(pack.database) != pack.database)
-        throw Error("\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
+    if (Base::safeFileName(pack.database) != pack.database)
+        throw Base::Error("\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
     return {folderText(pack.folder), pack.database, pack.packId};
 }
 
 /// A job that is there already: the pack is taken, or it cannot be.
 void requireSamePack(Job const& known, PackLocation const& pack) {
     if (!(known.pack == pack))
-        throw Error("there is another pack " + pack.packId + ", from " + known.pack.file().string());
+        throw Base::Error("there is another pack " + pack.packId + ", from " + known.pack.file().string());
     if (known.state == JobState::Failed)
-        throw Error("pack " + pack.packId + " was given up: " + known.problem);
+        throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
 }
 
 } // namespace
@@ -79,13 +79,13 @@ Job JobRunner::newJob(PackLocation const& pack) const {
     job.pages = static_cast<long long>(pages.pages().size());
     job.acceptedAt = surroundings_.now();
     if (job.pages == 0)
-        throw Error("pack " + pack.packId + " has no pages");
-    if (!isPlainText(job.title, MAX_TITLE_BYTES))
-        throw Error("the title of pack " + pack.packId + " is not a line of text of at most " +
-                    std::to_string(MAX_TITLE_BYTES) + " bytes");
+        throw Base::Error("pack " + pack.packId + " has no pages");
+    if (!Base::isPlainText(job.title, MAX_TITLE_BYTES))
+        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
+                          std::to_string(MAX_TITLE_BYTES) + " bytes");
     checkNodeId(job.cfgId);
     if (surroundings_.settings().isDisabled(job.cfgId))
-        throw Error("node " + job.cfgId + " is disabled: pack " + pack.packId + " is not taken");
+        throw Base::Error("node " + job.cfgId + " is disabled: pack " + pack.packId + " is not taken");
     return job;
 }
 
@@ -152,7 +152,7 @@ void JobRunner::finishSubmitting(Job const& job) {
 
 void JobRunner::upload(std::string const& folder, std::string const& database) {
     if (surroundings_.settings().uploadFolder().empty())
-        throw Error(
+        throw Base::Error(
             "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
     jobs_.wantUpload(folder.empty() ? folder : folderText(folder), database);
     resume();
@@ -172,7 +172,7 @@ void JobRunner::refresh(Job const& job) {
         bool const waits = liesIn(job.uploadFolder, job.containerName());
         std::optional<CarrierReport> const report = carrierReport(job.uploadFolder, job.containerName());
         if (report && !report->delivered)
-            jobs_.fail(job.pack.packId, "the carrier: " + oneLine(report->text), surroundings_.now());
+            jobs_.fail(job.pack.packId, "the carrier: " + Base::oneLine(report->text), surroundings_.now());
         else if (report)
             jobs_.advance(job.pack.packId, job.state, JobState::Delivered, surroundings_.now());
         else if (job.state == JobState::Submitted && !waits)
@@ -214,9 +214,9 @@ JobRunner::Outcome JobRunner::outcomeOf(std::function<void()> const& work) {
         work();
         return {};
     } catch (BadPack const& bad) {
-        return {Outcome::Kind::GiveUp, oneLine(bad.what())};
+        return {Outcome::Kind::GiveUp, Base::oneLine(bad.what())};
     } catch (std::exception const& failure) {
-        return {Outcome::Kind::TryLater, oneLine(failure.what())};
+        return {Outcome::Kind::TryLater, Base::oneLine(failure.what())};
     }
 }
 

@@ -39,7 +39,7 @@ public:
     /// Takes up every job that can go on: at the start, and when jobs are no longer held back.
     void resume();
     /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
-    /// nothing. The pages are fetched later. Throws Error or Mailing::DatabaseError when the pack cannot be
+    /// nothing. The pages are fetched later. Throws Error or Database::DatabaseError when the pack cannot be
     /// taken.
     void accept(PackLocation pack);
     /// Has the containers of these jobs handed on, those that are not there yet as soon as they are.

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/settings/parts.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/cfg/departments.h"
 #include "vlservice/cfg/inet.h"
@@ -28,8 +28,8 @@ Part readLevel(SettingsLevel const& level, bool global) {
     try {
         return Part(level.parts.get(Part::PART_NAME), global, true);
     } catch (std::exception const& failure) {
-        throw Error("the settings \"" + std::string(Part::PART_NAME) + "\" of " + shownNode(level.id) +
-                    " cannot be read: " + failure.what());
+        throw Base::Error("the settings \"" + std::string(Part::PART_NAME) + "\" of " + shownNode(level.id) +
+                          " cannot be read: " + failure.what());
     }
 }
 
@@ -78,7 +78,8 @@ void requireUsable(Cfg::Presets const& presets) {
         try {
             element.value.match("");
         } catch (std::exception const& failure) {
-            throw Error("the expression " + element.value.strRegex() + " cannot be used: " + failure.what());
+            throw Base::Error("the expression " + element.value.strRegex() +
+                              " cannot be used: " + failure.what());
         }
     }
 }
@@ -127,7 +128,7 @@ PartKind const& kindNamed(std::string const& name) {
     std::string known;
     for (std::string const& part : partNames())
         known += (known.empty() ? "" : ", ") + part;
-    throw Error("there are no settings \"" + name + "\"; there are " + known);
+    throw Base::Error("there are no settings \"" + name + "\"; there are " + known);
 }
 
 /// A global part writes every key that it has, whatever its values.
@@ -135,7 +136,7 @@ void checkKeys(PartKind const& kind, json::Object const& sent) {
     json::Object const known = kind.effective({SettingsLevel{}});
     for (auto const& [key, value] : sent)
         if (!known.get(key))
-            throw Error("the settings \"" + kind.name + "\" have no key \"" + key + "\"");
+            throw Base::Error("the settings \"" + kind.name + "\" have no key \"" + key + "\"");
 }
 
 bool isWrapper(json::Value const& value) { return value.isObject() && value.toObject().get("inh").isTrue(); }
@@ -208,10 +209,10 @@ json::Value ownForm(std::string const& part, json::Value const& sent) {
         if (sent)
             checkKeys(kind, sent.toObject());
         return kind.own(sent);
-    } catch (Error const&) {
+    } catch (Base::Error const&) {
         throw;
     } catch (std::exception const& failure) {
-        throw Error("the settings \"" + part + "\" were not changed: " + failure.what());
+        throw Base::Error("the settings \"" + part + "\" were not changed: " + failure.what());
     }
 }
 

@@ -3,7 +3,7 @@
 
 #include "programs/vlserviced/store/settings_store.h"
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <vector>

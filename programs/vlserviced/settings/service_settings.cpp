@@ -1,6 +1,6 @@
 #include "programs/vlserviced/settings/service_settings.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "programs/vlserviced/node_id.h"
 #include "vlservice/cfg/cfg_node_id.h"
 #include "vlservice/cfg/id.h"
@@ -21,22 +21,22 @@ void checkUploadFolder(json::Value const& value) {
     std::filesystem::path const folder = value.textOrEmpty();
     std::error_code error;
     if (!folder.is_absolute() || !std::filesystem::is_directory(folder, error))
-        throw Error("\"upload_folder\" has to be the absolute path of a folder that is there");
+        throw Base::Error("\"upload_folder\" has to be the absolute path of a folder that is there");
 }
 
 void checkTariff(json::Value const& value) {
     if (!value.isObject())
-        throw Error("\"tariff\" has to be an object");
+        throw Base::Error("\"tariff\" has to be an object");
     Tariff const readable(value.toObject());
 }
 
 void checkDisabled(json::Value const& value) {
     if (!value.isArray())
-        throw Error("\"disabled\" has to be an array of node ids");
+        throw Base::Error("\"disabled\" has to be an array of node ids");
     for (json::Value const& id : value.toArray()) {
         // Anything but a text would read as the root.
         if (!id.isString() || id.textOrEmpty().empty())
-            throw Error("\"disabled\" has to be an array of node ids, and the root cannot be disabled");
+            throw Base::Error("\"disabled\" has to be an array of node ids, and the root cannot be disabled");
         checkNodeId(id.toString());
     }
 }
@@ -51,7 +51,8 @@ void checkChange(std::string const& key, json::Value const& value) {
     auto const* const row =
         std::find_if(std::begin(SETTABLE), std::end(SETTABLE), [&](auto const& r) { return key == r.first; });
     if (row == std::end(SETTABLE))
-        throw Error("the service has no setting \"" + key + "\"; there are upload_folder, tariff, disabled");
+        throw Base::Error("the service has no setting \"" + key +
+                          "\"; there are upload_folder, tariff, disabled");
     if (!json_is_null(value.node()))
         row->second(value);
 }
@@ -65,7 +66,8 @@ std::string ServiceSettings::uploadFolder() const { return stored_.get(UPLOAD_FO
 Tariff ServiceSettings::tariff() const {
     json::Value const tariff = stored_.get(TARIFF);
     if (!tariff)
-        throw Error("the service has no tariff yet: set one with \"vlmail settings service tariff=FILE\"");
+        throw Base::Error(
+            "the service has no tariff yet: set one with \"vlmail settings service tariff=FILE\"");
     return Tariff(tariff.toObject());
 }
 
@@ -100,8 +102,8 @@ ServiceSettings ServiceSettings::withChanges(json::Object const& changes) const 
 ServiceSettings ServiceSettings::withSuspended(int bits) const {
     constexpr int KNOWN = static_cast<int>(Suspended::SettingsChanges) | static_cast<int>(Suspended::Jobs);
     if ((bits & ~KNOWN) != 0)
-        throw Error("the service cannot be suspended by the number " + std::to_string(bits) +
-                    ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
+        throw Base::Error("the service cannot be suspended by the number " + std::to_string(bits) +
+                          ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
     json::Object changed = stored_;
     changed.set(SUSPENDED, bits);
     return ServiceSettings(std::move(changed));

@@ -2,7 +2,7 @@
 // The service's own settings, beside those of the nodes.
 
 #include "programs/vlserviced/settings/tariff.h"
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <optional>
 #include <string>

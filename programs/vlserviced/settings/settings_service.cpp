@@ -1,6 +1,6 @@
 #include "programs/vlserviced/settings/settings_service.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "programs/vlserviced/node_id.h"
 #include "programs/vlserviced/settings/parts.h"
 #include "vlservice/cfg/cfg_node_id.h"
@@ -101,7 +101,7 @@ void SettingsService::update(std::string const& id, bool reset) {
     checkNodeId(id);
     // An id that is missing from a request reads as the root.
     if (reset && id.empty())
-        throw Error("the root cannot be reset as a whole: set its parts to nothing one by one");
+        throw Base::Error("the root cannot be reset as a whole: set its parts to nothing one by one");
     if (reset)
         store_.clear(id);
     else
@@ -126,7 +126,7 @@ void SettingsService::suspend(int bits) { store_.setServiceSettings(service().wi
 
 void SettingsService::requireChangeable() const {
     if (service().isSuspended(Suspended::SettingsChanges))
-        throw Error("changes of settings are held back at the moment");
+        throw Base::Error("changes of settings are held back at the moment");
 }
 
 } // namespace VlServiced

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/settings/tariff.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 
 #include <algorithm>
 #include <string_view>
@@ -53,8 +53,8 @@ auto find(Rows const& rows, std::string const& key) {
 long long integerWithin(json::Value const& value, long long lowest, long long highest,
                         std::string const& what) {
     if (!value.isInt() || value.toInt() < lowest || value.toInt() > highest)
-        throw Error(what + " has to be an integer from " + std::to_string(lowest) + " to " +
-                    std::to_string(highest));
+        throw Base::Error(what + " has to be an integer from " + std::to_string(lowest) + " to " +
+                          std::to_string(highest));
     return value.toInt();
 }
 
@@ -62,7 +62,7 @@ std::string currencyIn(json::Value const& value) {
     std::string const text = value.textOrEmpty();
     if (text.size() != 3 ||
         !std::all_of(text.begin(), text.end(), [](char c) { return c >= 'A' && c <= 'Z'; }))
-        throw Error("\"currency\" of the tariff has to be three capital letters");
+        throw Base::Error("\"currency\" of the tariff has to be three capital letters");
     return text;
 }
 
@@ -74,7 +74,7 @@ Tariff::Tariff(json::Object const& object) : currency(currencyIn(object.get(CURR
             continue;
         auto const* const row = find(AMOUNTS, key);
         if (!row)
-            throw Error("the tariff has no key \"" + std::string(key) + "\"");
+            throw Base::Error("the tariff has no key \"" + std::string(key) + "\"");
         this->*row->member =
             integerWithin(value, -MAX_AMOUNT, MAX_AMOUNT, '"' + std::string(key) + "\" of the tariff");
     }
@@ -87,10 +87,10 @@ LetterBatch::LetterBatch(json::Object const& object) {
             this->*row->member = integerWithin(value, 1, row->highest, what);
         } else if (auto const* const flag = find(FLAGS, key)) {
             if (!json_is_boolean(value.node()))
-                throw Error(what + " has to be true or false");
+                throw Base::Error(what + " has to be true or false");
             this->*flag->member = value.isTrue();
         } else {
-            throw Error("the letters have no key \"" + std::string(key) + "\"");
+            throw Base::Error("the letters have no key \"" + std::string(key) + "\"");
         }
     }
 }
@@ -105,15 +105,15 @@ long long priceOf(LetterBatch const& batch, Tariff const& tariff) {
 json::Object estimate(json::Object const& request, Tariff const& tariff) {
     json::Value const batches = request.get("letters");
     if (!batches.isArray() || batches.toArray().empty() || batches.toArray().size() > MAX_BATCHES)
-        throw Error("\"letters\" of a price estimate has to be an array of 1 to " +
-                    std::to_string(MAX_BATCHES) + " objects");
+        throw Base::Error("\"letters\" of a price estimate has to be an array of 1 to " +
+                          std::to_string(MAX_BATCHES) + " objects");
     long long total = 0;
     json::Array prices;
     for (json::Value const& element : batches.toArray()) {
         LetterBatch const batch(element.toObject());
         long long const price = priceOf(batch, tariff);
         if (__builtin_add_overflow(total, price, &total))
-            throw Error("the price is beyond all bounds");
+            throw Base::Error("the price is beyond all bounds");
         prices.append(json::Object{{"sheets", batch.sheets()}, {"price", price}});
     }
     return {{CURRENCY, tariff.currency}, {"total", total}, {"letters", prices}};

@@ -1,7 +1,7 @@
 #pragma once
 // What mailings cost: the tariff of the service's settings, and the estimate of a mailing by it.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <vector>

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/store/data_folder.h"
 
-#include "programs/mailing/pending_file.h"
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
+#include "programs/base/pending_file.h"
 
 #include <cerrno>
 #include <cstring>
@@ -30,18 +30,20 @@ int takeHold(fs::path const& folder) {
     fs::path const file = folder / "lock";
     int const lock = ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
     if (lock < 0)
-        throw Error("cannot write into the data folder " + folder.string() + ": " + std::strerror(errno));
+        throw Base::Error("cannot write into the data folder " + folder.string() + ": " +
+                          std::strerror(errno));
     if (::flock(lock, LOCK_EX | LOCK_NB) != 0) {
         std::string const holder = processIn(lock);
         ::close(lock);
-        throw Error("the data folder " + folder.string() + " is in use by another vlserviced" + holder +
-                    ": stop that one or name another folder");
+        throw Base::Error("the data folder " + folder.string() + " is in use by another vlserviced" + holder +
+                          ": stop that one or name another folder");
     }
     std::string const self = std::to_string(::getpid());
     if (::ftruncate(lock, 0) != 0 || ::pwrite(lock, self.data(), self.size(), 0) < 0) {
         int const error = errno;
         ::close(lock);
-        throw Error("cannot write into the data folder " + folder.string() + ": " + std::strerror(error));
+        throw Base::Error("cannot write into the data folder " + folder.string() + ": " +
+                          std::strerror(error));
     }
     return lock;
 }
@@ -52,9 +54,10 @@ void makeWritableFolder(fs::path const& folder) {
     try {
         if (fs::create_directories(folder))
             fs::permissions(folder, fs::perms::owner_all);
-        Mailing::PendingFile const probe(folder / "probe");
+        Base::PendingFile const probe(folder / "probe");
     } catch (std::system_error const& failure) {
-        throw Error("cannot write into the folder " + folder.string() + ": " + failure.code().message());
+        throw Base::Error("cannot write into the folder " + folder.string() + ": " +
+                          failure.code().message());
     }
 }
 

@@ -1,6 +1,6 @@
 #include "programs/vlserviced/store/job_store.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 
 #include <SQLiteCpp/Statement.h>
 
@@ -26,7 +26,7 @@ JobState stateNamed(std::string const& name) {
     auto const found = std::find_if(STATE_NAMES.begin(), STATE_NAMES.end(),
                                     [&](auto const& row) { return row.second == name; });
     if (found == STATE_NAMES.end())
-        throw Error("the service database holds a job in the unknown state \"" + name + "\"");
+        throw Base::Error("the service database holds a job in the unknown state \"" + name + "\"");
     return found->first;
 }
 

@@ -49,14 +49,15 @@ CREATE INDEX jobs_by_state ON jobs (state);
 
 } // namespace
 
-Mailing::DatabaseKind const& serviceDatabase() {
-    static Mailing::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1}};
+Database::DatabaseKind const& serviceDatabase() {
+    static Database::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1}};
     return kind;
 }
 
 SQLite::Database openServiceDatabase(std::filesystem::path const& file) {
-    SQLite::Database database = Mailing::openDatabase(file, serviceDatabase(), Mailing::Journal::WriteAhead);
-    Mailing::requireUndamaged(database, serviceDatabase());
+    SQLite::Database database =
+        Database::openDatabase(file, serviceDatabase(), Database::Journal::WriteAhead);
+    Database::requireUndamaged(database, serviceDatabase());
     return database;
 }
 

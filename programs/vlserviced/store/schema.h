@@ -1,15 +1,15 @@
 #pragma once
 // The service's database file: its kind and the history of its schema.
 
-#include "programs/mailing/sqlite_file.h"
+#include "programs/database/sqlite_file.h"
 
 namespace VlServiced {
 
 /// Schema version n is what the first n scripts make. A script that was published is never changed: a new
 /// version is a new script behind it.
-Mailing::DatabaseKind const& serviceDatabase();
+Database::DatabaseKind const& serviceDatabase();
 
-/// Opens, or creates, the service's database and tests it for damage. Throws Mailing::DatabaseError.
+/// Opens, or creates, the service's database and tests it for damage. Throws Database::DatabaseError.
 SQLite::Database openServiceDatabase(std::filesystem::path const& file);
 
 } // namespace VlServiced

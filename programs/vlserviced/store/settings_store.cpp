@@ -1,9 +1,9 @@
 #include "programs/vlserviced/store/settings_store.h"
 
-#include "programs/vlserviced/error.h"
+#include "programs/base/error.h"
 #include "programs/vlserviced/node_id.h"
 #include "vlservice/cfg/id.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <SQLiteCpp/Statement.h>
 #include <SQLiteCpp/Transaction.h>
@@ -115,16 +115,17 @@ void SettingsStore::clear(std::string const& id) {
 
 void SettingsStore::remove(std::string const& id) {
     if (id.empty())
-        throw Error("the root cannot be removed");
+        throw Base::Error("the root cannot be removed");
     SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
     if (!contains(id))
-        throw Error("there is no node " + id);
+        throw Base::Error("there is no node " + id);
     SQLite::Statement children(database_, "SELECT count(*), min(id) FROM nodes WHERE parent = ?");
     children.bind(1, id);
     children.executeStep();
     if (int const count = children.getColumn(0).getInt(); count > 0)
-        throw Error("node " + id + " has " + std::to_string(count) + (count == 1 ? " child" : " children") +
-                    " (" + children.getColumn(1).getString() + "): remove what is below it first");
+        throw Base::Error("node " + id + " has " + std::to_string(count) +
+                          (count == 1 ? " child" : " children") + " (" + children.getColumn(1).getString() +
+                          "): remove what is below it first");
     SQLite::Statement deletion(database_, "DELETE FROM nodes WHERE id = ?");
     deletion.bind(1, id);
     deletion.exec();

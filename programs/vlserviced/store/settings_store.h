@@ -1,7 +1,7 @@
 #pragma once
 // Settings nodes and their own values, as the database keeps them.
 
-#include "vlservice/cfg/json.h"
+#include "vlservice/json/json.h"
 
 #include <SQLiteCpp/Database.h>
 

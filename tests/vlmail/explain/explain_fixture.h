@@ -1,10 +1,10 @@
 #pragma once
 // Runs "vlmail letter --explain" over documents and settings.
 
+#include "tests/support/temporary_folder.h"
 #include "tests/support/time_zone.h"
-#include "tests/temporary_folder.h"
 #include "tests/vlmail/run_vlmail.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

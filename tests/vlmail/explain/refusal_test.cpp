@@ -1,7 +1,7 @@
 #include "programs/vlmail/explain/refusal.h"
 
 #include "tests/support/time_zone.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <gtest/gtest.h>
 

@@ -1,4 +1,4 @@
-#include "programs/vlmail/explain/pattern_parts.h"
+#include "programs/patterns/pattern_parts.h"
 #include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
 
@@ -81,17 +81,17 @@ TEST(PatternParts, FindsTheLiteralsThatATextMustHave) {
         {R"(  )", {}},
     };
     for (auto const& [pattern, literals] : CASES)
-        EXPECT_EQ(literalsOf(pattern), literals) << pattern;
+        EXPECT_EQ(Patterns::literalsOf(pattern), literals) << pattern;
 }
 
 TEST(PatternParts, CutsAPatternBetweenItsSteps) {
     std::vector<std::string> cuts;
-    for (PatternCut const& cut : cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
+    for (Patterns::PatternCut const& cut : Patterns::cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
         cuts.push_back(cut.front + "|" + cut.rest);
     EXPECT_THAT(cuts, ElementsAre(R"(^Ref:\h*(?<VAL>\d+)|$)", R"(^Ref:\h*|(?<VAL>\d+)$)",
                                   R"(^Ref:|\h*(?<VAL>\d+)$)", R"(^|Ref:\h*(?<VAL>\d+)$)"));
-    EXPECT_THAT(cutsOf("a|b"), IsEmpty());
-    EXPECT_THAT(cutsOf(""), IsEmpty());
+    EXPECT_THAT(Patterns::cutsOf("a|b"), IsEmpty());
+    EXPECT_THAT(Patterns::cutsOf(""), IsEmpty());
 }
 
 TEST(PatternParts, TakesAnchorsOff) {
@@ -104,7 +104,7 @@ TEST(PatternParts, TakesAnchorsOff) {
                     {"a\\$", "", "a\\$", ""}, {"a", "", "a", ""},   {"^a|b$", "", "^a|b$", ""},
                     {"$", "", "", "$"},       {"", "", "", ""}};
     for (auto const& [pattern, front, core, end] : CASES) {
-        Anchors const anchors = anchorsOf(pattern);
+        Patterns::Anchors const anchors = Patterns::anchorsOf(pattern);
         EXPECT_EQ(anchors.front, front) << pattern;
         EXPECT_EQ(anchors.core, core) << pattern;
         EXPECT_EQ(anchors.end, end) << pattern;
@@ -112,10 +112,10 @@ TEST(PatternParts, TakesAnchorsOff) {
 }
 
 TEST(PatternParts, MakesTheWholeMatchTheValue) {
-    EXPECT_EQ(withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
-    EXPECT_TRUE(hasValueGroup("a(?<VAL>b)"));
-    EXPECT_TRUE(hasValueGroup("a(?'VAL'b)"));
-    EXPECT_FALSE(hasValueGroup("a(b)(?<VALUE>c)"));
+    EXPECT_EQ(Patterns::withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
+    EXPECT_TRUE(Patterns::hasValueGroup("a(?<VAL>b)"));
+    EXPECT_TRUE(Patterns::hasValueGroup("a(?'VAL'b)"));
+    EXPECT_FALSE(Patterns::hasValueGroup("a(b)(?<VALUE>c)"));
 }
 
 TEST(Words, ShortenByCharactersAndOnOneLine) {

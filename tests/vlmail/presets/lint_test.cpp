@@ -1,7 +1,7 @@
 #include "programs/vlmail/presets/finding.h"
 #include "tests/vlmail/presets/settings_file.h"
 #include "tests/vlmail/run_vlmail.h"
-#include "vlservice/platform/json_text.h"
+#include "vlservice/json/json_text.h"
 
 #include <gmock/gmock.h>
 

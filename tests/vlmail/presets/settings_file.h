@@ -1,7 +1,7 @@
 #pragma once
 // Settings documents in tests, small ones made of the piece that a test is about.
 
-#include "tests/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <filesystem>
 #include <fstream>

@@ -1,0 +1,20 @@
+# What nearly every source includes, compiled once. Only headers of others are in here: a header of the project has to
+# include what it needs, and a change in one does not rebuild everything.
+
+set(VLSERVICE_COMMON_HEADERS
+    <algorithm> <chrono> <filesystem> <functional> <map> <memory> <optional> <ostream> <sstream> <stdexcept> <string>
+    <string_view> <tuple> <utility> <vector> <jansson.h>)
+
+# vlservice_precompile(NAME [PIC] HEADERS...) makes a set of headers; its users are built alike.
+function(vlservice_precompile name)
+    cmake_parse_arguments(ARG "PIC" "" "HEADERS" ${ARGN})
+    set(source ${PROJECT_BINARY_DIR}/${name}.cpp)
+    file(GENERATE OUTPUT ${source} CONTENT "")
+    add_library(${name} OBJECT ${source})
+    set_target_properties(${name} PROPERTIES POSITION_INDEPENDENT_CODE ${ARG_PIC} CXX_CLANG_TIDY "")
+    target_compile_features(${name} PRIVATE cxx_std_20)
+    target_precompile_headers(${name} PRIVATE ${ARG_HEADERS})
+    target_link_libraries(${name} PRIVATE vlservice_warnings)
+endfunction()
+
+vlservice_precompile(vlservice_precompiled PIC HEADERS ${VLSERVICE_COMMON_HEADERS})

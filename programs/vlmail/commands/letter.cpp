@@ -1,0 +1,138 @@
+// vlmail letter: what the settings make of each document, for a person or as JSON.
+#include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/explain/explain_text.h"
+#include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/field_words.h"
+#include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/outcome.h"
+#include "programs/vlmail/letters/worker_pool.h"
+#include "programs/vlmail/report/report_file.h"
+#include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/json/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <memory>
+#include <optional>
+#include <ostream>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    std::vector<std::string> files;
+    std::string settings;
+    std::string report;
+    bool json = false;
+    bool explain = false;
+    std::size_t jobs = processorCount();
+};
+
+std::string stateInWords(Cfg::ExtractedField const& field) {
+    switch (field.valueType()) {
+    case Cfg::ExtractedField::ValueType::NotValidated:
+        return "not validated";
+    case Cfg::ExtractedField::ValueType::Plain:
+        return "ok";
+    case Cfg::ExtractedField::ValueType::Time:
+        return "date";
+    case Cfg::ExtractedField::ValueType::Invalid:
+        break;
+    }
+    return "INVALID";
+}
+
+std::string linesJoined(std::string text) {
+    for (std::size_t at = text.find('\n'); at != std::string::npos; at = text.find('\n', at))
+        text.replace(at, 1, " / ");
+    return text;
+}
+
+void print(std::ostream& out, LetterReading const& letter, std::size_t number, std::size_t of) {
+    std::string const why = letter.whyNot();
+    out << "  letter " << number << " of " << of << ", " << pagesInWords(letter.pages) << ": "
+        << (why.empty() ? "ready" : "cannot go out: " + why) << '\n';
+    TextTable table({{"field"}, {"value"}, {"state"}, {"address"}});
+    for (auto const& [priority, field] : letter.fields)
+        table.addRow({field.name(), linesJoined(field.valueToStr()), stateInWords(field),
+                      roleInWords(field, &field == letter.fields.primaryAddressField())});
+    if (table.empty())
+        out << "    no field was found\n";
+    else
+        table.print(out, 4);
+    for (std::string const& name : letter.missing)
+        out << "    missing, although obligatory: " << name << '\n';
+}
+
+void printLetters(std::ostream& out, DocumentReading const& reading) {
+    out << reading.document << '\n'
+        << "  read by the preset for  " << reading.extractPreset << '\n'
+        << "  sent by the pack preset " << reading.packPreset << '\n';
+    if (reading.isAttachment()) {
+        out << "  an attachment: it holds no letters\n";
+        return;
+    }
+    for (std::size_t i = 0; i < reading.letters->size(); ++i)
+        print(out, (*reading.letters)[i], i + 1, reading.letters->size());
+}
+
+/// The answer, then the evidence. Of a document that failed there may be evidence alone.
+void print(std::ostream& out, DocumentReading const& reading) {
+    if (reading.failed() && !reading.trace)
+        return;
+    if (reading.failed())
+        out << reading.document << '\n';
+    else
+        printLetters(out, reading);
+    if (reading.trace)
+        printExplanation(out, reading.trace.toObject());
+    out << '\n';
+}
+
+int showLetters(Options const& options, Terminal const& terminal) {
+    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
+    Outcome outcome;
+    std::optional<Report::File> report;
+    if (!options.report.empty())
+        report.emplace(options.report);
+    Along const along =
+        (report ? Along::Report : Along::Nothing) | (options.explain ? Along::Trace : Along::Nothing);
+    readBatch(options.files, settings, options.jobs, along, terminal, [&](std::size_t, ReadResult result) {
+        DocumentReading const& reading = result.reading;
+        outcome.count(reading);
+        if (options.json)
+            terminal.out << reading.toJson() << std::endl;
+        else
+            print(terminal.out, reading);
+        if (reading.failed())
+            terminal.complain(reading.error);
+        if (report)
+            report->take(result);
+    });
+    if (report)
+        report->write(outcome);
+    if (!options.json && options.files.size() > 1)
+        terminal.out << outcome.inWords() << '\n';
+    return outcome.exitStatus();
+}
+
+} // namespace
+
+void addLetterCommand(CLI::App& app, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const letter = app.add_subcommand(
+        "letter", "Shows the letters in documents: presets, fields, and whether they can go out");
+    letter->add_option("FILE", options->files, "PDF or text documents")->required();
+    letter->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
+    letter->add_flag("--json", options->json, "One JSON object a document, each on a line");
+    letter->add_flag("--explain", options->explain,
+                     "Tells how each field came about, and why one was not found; with --json as \"trace\"");
+    letter->add_option("--report", options->report,
+                       "Writes an HTML page with the pages' pictures and what was found where");
+    letter->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);
+    letter->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showLetters(*options, terminal); }; });
+}
+
+} // namespace VlMail

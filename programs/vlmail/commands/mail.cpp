@@ -1,0 +1,165 @@
+// vlmail mail and plan: the whole road from documents to mailings, in one go or decided first and carried out
+// later.
+#include "programs/base/pending_file.h"
+#include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/commands/settings.h"
+#include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/plan.h"
+#include "programs/vlmail/letters/worker_pool.h"
+#include "programs/vlmail/mailings/dispatch.h"
+#include "programs/vlmail/mailings/price.h"
+#include "programs/vlmail/service/service_client.h"
+#include "vlservice/json/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <filesystem>
+#include <memory>
+#include <ostream>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    std::vector<std::string> files;
+    std::string settings;
+    std::string plan;
+    std::string output;
+    bool send = false;
+    bool upload = false;
+    bool price = false;
+    std::string node = "/";
+    ServiceOptions service;
+    bool json = false;
+    std::size_t jobs = processorCount();
+};
+
+int report(Dispatch const& dispatch, Options const& options, Terminal const& terminal) {
+    if (options.json)
+        terminal.out << dispatch.toJson() << '\n';
+    else
+        dispatch.print();
+    return dispatch.exitStatus();
+}
+
+/// Where the mailings go, by the options. The connection is there when a service is to get them.
+struct Destination {
+    Destination(Options const& options, Terminal const& terminal)
+        : service(options.send ? connectToService(options.service, terminal) : nullptr),
+          nodeId(nodeIdIn(options.node)), begin(service ? mailingsToService(*service, nodeId, options.upload)
+                                                        : mailingsIntoFolder(options.output)) {}
+
+    std::unique_ptr<Channel::Client> service;
+    std::string nodeId;
+    BeginMailing begin;
+};
+
+/// What counts at the node, as the service tells it.
+NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
+    std::string const& name = Cfg::Presets::PART_NAME;
+    json::Object const parts = fetchSettings(service, nodeId, {name}).get("parts").toObject();
+    json::Value const presets = parts.get(name).toObject().get("values");
+    return NodeSettings::resolved({{name.c_str(), presets}}, "the service, at " + nodeInWords(nodeId));
+}
+
+NodeSettings settingsFor(Options const& options, Destination const& destination) {
+    return options.settings.empty() && destination.service
+               ? settingsFromService(*destination.service, destination.nodeId)
+               : NodeSettings::fromFileIfNamed(options.settings);
+}
+
+int mailDocuments(Options const& options, Terminal const& terminal) {
+    Destination const destination(options, terminal);
+    NodeSettings const settings = settingsFor(options, destination);
+    Cfg::Presets const presets = settings.presets();
+    Dispatch dispatch(presets, destination.begin, terminal);
+    readBatch(options.files, settings, options.jobs, Along::Pages, terminal,
+              [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
+    dispatch.finish();
+    return report(dispatch, options, terminal);
+}
+
+int mailPlan(Options const& options, Terminal const& terminal) {
+    Plan const plan = Plan::fromFile(options.plan);
+    plan.requireUnchanged();
+    Destination const destination(options, terminal);
+    NodeSettings const settings = plan.settings();
+    Cfg::Presets const presets = settings.presets();
+    Dispatch dispatch(presets, destination.begin, terminal);
+    splitBatch(plan.documents(), options.jobs, terminal,
+               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
+    dispatch.finish();
+    return report(dispatch, options, terminal);
+}
+
+int makePlan(Options const& options, Terminal const& terminal) {
+    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
+    Cfg::Presets const presets = settings.presets();
+    Plan plan(settings);
+    Dispatch dispatch(presets, mailingsNowhere(), terminal);
+    readBatch(options.files, settings, options.jobs, Along::Nothing, terminal,
+              [&](std::size_t index, ReadResult result) {
+                  plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
+                  dispatch.take(std::move(result));
+              });
+    dispatch.finish();
+    if (options.price)
+        dispatch.estimate(*connectToService(options.service, terminal));
+    Base::writeFile(options.output, plan.toText(dispatch.toJson()));
+    return report(dispatch, options, terminal);
+}
+
+void addBatchOptions(CLI::App& command, Options& options) {
+    command.add_flag("--json", options.json, "The outcome as one JSON object");
+    command.add_option("--jobs", options.jobs, "Processes to read with")->check(CLI::PositiveNumber);
+}
+
+} // namespace
+
+void addMailCommand(CLI::App& app, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const mail =
+        app.add_subcommand("mail", "Packs the letters in documents, one mailing file a pack preset");
+    auto* const files = mail->add_option("FILE", options->files, "PDF or text documents");
+    auto* const settings =
+        mail->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
+    mail->add_option("--plan", options->plan, "Carries out what vlmail plan has decided")
+        ->excludes(files)
+        ->excludes(settings);
+    auto* const output = mail->add_option("-o,--output", options->output,
+                                          "The folder for the mailing files; made when missing");
+    auto* const send = mail->add_flag("--send", options->send, "Gives the mailings to the service instead")
+                           ->excludes(output);
+    mail->add_option("--node", options->node, "The node to send for, whose settings apply without --settings")
+        ->needs(send);
+    mail->add_flag("--upload", options->upload, "Has the service hand the mailings on at once")->needs(send);
+    addServiceOptions(*mail, options->service);
+    addBatchOptions(*mail, *options);
+    mail->callback([=, &task] {
+        if (options->files.empty() && options->plan.empty())
+            throw CLI::RequiredError("FILE or --plan");
+        if (options->output.empty() && !options->send)
+            throw CLI::RequiredError("--output or --send");
+        task = [=](Terminal const& terminal) {
+            return options->plan.empty() ? mailDocuments(*options, terminal) : mailPlan(*options, terminal);
+        };
+    });
+}
+
+void addPlanCommand(CLI::App& app, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const plan =
+        app.add_subcommand("plan", "Decides a batch without any effect, for vlmail mail --plan");
+    plan->add_option("FILE", options->files, "PDF or text documents")->required();
+    plan->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
+    plan->add_option("-o,--output", options->output, "The file for the plan")->required();
+    plan->add_flag("--price", options->price, "Asks the service what the mailings would cost");
+    addServiceOptions(*plan, options->service);
+    addBatchOptions(*plan, *options);
+    plan->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return makePlan(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,116 @@
+// vlmail price: what letters would cost, by the tariff of the service.
+#include "programs/vlmail/mailings/price.h"
+
+#include "programs/base/error.h"
+#include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/service/service_client.h"
+#include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/json/json_text.h"
+#include "vlservice/pack/pack_wrapper.h"
+
+#include <CLI/CLI.hpp>
+
+#include <charconv>
+#include <memory>
+#include <optional>
+#include <ostream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    ServiceOptions service;
+    /// Each a number of letters and of pages, "20x3", or a mailing file.
+    std::vector<std::string> what;
+    bool colour = false;
+    bool duplex = false;
+    bool priority = false;
+    bool json = false;
+};
+
+/// "20x3" is 20 letters of 3 pages, "3" one letter of 3 pages.
+std::optional<PricedLetters> batchIn(std::string const& text) {
+    auto const number = [](std::string const& digits) {
+        long long value = 0;
+        auto const [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), value);
+        return error == std::errc() && end == digits.data() + digits.size() && value > 0 ? value : 0;
+    };
+    auto const cross = text.find('x');
+    PricedLetters batch;
+    batch.count = cross == std::string::npos ? 1 : number(text.substr(0, cross));
+    batch.pages = number(cross == std::string::npos ? text : text.substr(cross + 1));
+    return batch.count > 0 && batch.pages > 0 ? std::optional(batch) : std::nullopt;
+}
+
+Mailing::Metadata metadataOf(std::string const& file) {
+    PackWrapper container(file, PackWrapper::PURPOSE_IMPORT, "");
+    if (container.szBins() == 0)
+        throw Base::Error("cannot estimate \"" + file +
+                          "\": it is neither a mailing file nor a number of letters and pages like 20x3");
+    return Mailing::Metadata::fromBlob(container.inputFullMeta());
+}
+
+std::vector<PricedLetters> lettersIn(Options const& options) {
+    std::vector<PricedLetters> batches;
+    for (std::string const& text : options.what) {
+        if (std::optional<PricedLetters> const batch = batchIn(text)) {
+            batches.push_back(*batch);
+        } else {
+            std::vector<PricedLetters> const ofMailing = pricedLettersOf(metadataOf(text));
+            batches.insert(batches.end(), ofMailing.begin(), ofMailing.end());
+        }
+    }
+    for (PricedLetters& batch : batches) {
+        batch.duplex |= options.duplex;
+        batch.priority |= options.priority;
+    }
+    return batches;
+}
+
+void print(std::ostream& out, std::vector<PricedLetters> const& batches, json::Object const& estimate) {
+    std::string const currency = estimate.get("currency").textOrEmpty();
+    constexpr auto RIGHT = TextTable::Align::Right;
+    TextTable table({{"letters", RIGHT}, {"pages each", RIGHT}, {"sheets each", RIGHT}, {currency, RIGHT}});
+    json::Array const prices = estimate.get("letters").toArray();
+    for (std::size_t i = 0; i < batches.size(); ++i) {
+        json::Object const price = prices.at(i).toObject();
+        table.addRow({std::to_string(batches[i].count), std::to_string(batches[i].pages),
+                      std::to_string(price.get("sheets").intOrZero()),
+                      money(price.get("price").intOrZero())});
+    }
+    table.print(out);
+    out << "in all " << money(estimate.get("total").intOrZero()) << ' ' << currency << '\n';
+}
+
+int showPrice(Options const& options, Terminal const& terminal) {
+    std::vector<PricedLetters> const batches = lettersIn(options);
+    auto const service = connectToService(options.service, terminal);
+    json::Object const prices = estimatePrice(*service, batches, options.colour);
+    if (options.json)
+        terminal.out << prices << '\n';
+    else
+        print(terminal.out, batches, prices);
+    return FINE;
+}
+
+} // namespace
+
+void addPriceCommand(CLI::App& app, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const price =
+        app.add_subcommand("price", "Estimates what letters cost, by the service's tariff");
+    price->add_option("WHAT", options->what, "Mailing files, or letters and pages of each: 20x3")->required();
+    price->add_flag("--colour", options->colour, "Printed in colour");
+    price->add_flag("--duplex", options->duplex,
+                    "Printed on both sides, also where the mailing does not say so");
+    price->add_flag("--priority", options->priority,
+                    "Delivered with priority, also where the mailing does not say so");
+    price->add_flag("--json", options->json, "The service's answer as one JSON object");
+    addServiceOptions(*price, options->service);
+    price->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showPrice(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,80 @@
+// vlmail settings: the settings of the nodes, as the service keeps them.
+#include "programs/vlmail/commands/settings.h"
+#include "programs/base/error.h"
+
+#include "vlservice/cfg/id.h"
+#include "vlservice/json/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <fstream>
+#include <iostream>
+#include <iterator>
+#include <sstream>
+
+namespace VlMail {
+
+std::string nodeIdIn(std::string const& text) {
+    if (text.empty() || text == "/")
+        return {};
+    // An id that ends in a slash is complete, and completing it again would change it.
+    return text.back() == '/' ? text : Cfg::Id(text.c_str()).str();
+}
+
+std::string nodeInWords(std::string const& id) { return id.empty() ? "the root" : id; }
+
+json::Object fetchSettings(Channel::Client& service, std::string const& nodeId,
+                           std::vector<std::string> const& parts) {
+    json::Array names;
+    for (std::string const& part : parts)
+        names.append(part);
+    return ask(service, {{"query", "settings"}, {"id", nodeId}, {"parts", names}});
+}
+
+std::string valueInWords(json::Value const& value) {
+    if (value.isString())
+        return value.textOrEmpty();
+    std::ostringstream text;
+    text << value;
+    return text.str();
+}
+
+json::Value valueIn(std::string const& key, std::string const& text, json::Value const& model) {
+    if (model.isString())
+        return text;
+    // The parser takes objects alone.
+    std::string const document = "{\"v\":" + text + '}';
+    try {
+        return json::strToObject(document.data(), document.size()).get("v");
+    } catch (json::Exc const&) {
+        throw Base::Error("\"" + key + "\" wants a value in JSON like " + valueInWords(model) + ", and \"" +
+                          text + "\" is none");
+    }
+}
+
+json::Object readDocument(std::string const& file) {
+    std::ifstream in;
+    if (file != "-")
+        in.open(file, std::ios::binary);
+    std::istream& source = file == "-" ? std::cin : in;
+    std::string const text{std::istreambuf_iterator<char>(source), {}};
+    if (source.bad() || (file != "-" && !in.is_open()))
+        throw Base::Error("cannot read \"" + file + "\"; check the name and the rights");
+    try {
+        return json::strToObject(text.data(), text.size());
+    } catch (json::Exc const& wrong) {
+        throw Base::Error("cannot use \"" + file + "\": " + wrong.what() + "; correct the file there");
+    }
+}
+
+void addSettingsCommand(CLI::App& app, Task& task) {
+    CLI::App* const settings =
+        app.add_subcommand("settings", "Shows and changes the settings that the service keeps");
+    settings->require_subcommand(1);
+    addSettingsShowCommand(*settings, task);
+    addSettingsChangeCommands(*settings, task);
+    addSettingsTreeCommand(*settings, task);
+    addSettingsServiceCommands(*settings, task);
+}
+
+} // namespace VlMail

@@ -1,0 +1,121 @@
+// vlmail settings show: what counts at a node, and where each value comes from.
+#include "programs/vlmail/commands/settings.h"
+
+#include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/json/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <ostream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    ServiceOptions service;
+    std::string node;
+    std::vector<std::string> parts;
+    bool origin = false;
+    bool json = false;
+};
+
+/// Longer values are cut in tables.
+constexpr std::size_t MAX_VALUE_BYTES = 60;
+
+std::string cut(std::string text) {
+    if (text.size() <= MAX_VALUE_BYTES)
+        return text;
+    std::size_t end = MAX_VALUE_BYTES;
+    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
+        --end;
+    return text.substr(0, end) + "...";
+}
+
+/// The id of a node, or JSON null for a value that is built in.
+std::string originInWords(json::Value const& origin) {
+    if (!origin.isString())
+        return "built in";
+    std::string const id = origin.textOrEmpty();
+    return id.empty() ? "root" : id;
+}
+
+class SettingsTable {
+public:
+    explicit SettingsTable(bool withOrigin) : withOrigin_(withOrigin), table_(columns(withOrigin)) {}
+
+    void add(std::string const& part, json::Object const& settings) {
+        json::Object const origins = settings.get("origins").toObject();
+        for (auto const& [key, value] : settings.get("values").toObject()) {
+            json::Value const origin = origins.get(key);
+            // A list that is inherited by elements has an origin for each.
+            if (origin.isArray())
+                addElements(part, key, value.toArray(), origin.toArray());
+            else
+                addRow(part, key, value, origin);
+        }
+    }
+    void print(std::ostream& out) const { table_.print(out); }
+
+private:
+    static std::vector<TextTable::Column> columns(bool withOrigin) {
+        std::vector<TextTable::Column> columns{{"part"}, {"setting"}, {"value"}};
+        if (withOrigin)
+            columns.push_back({"from"});
+        return columns;
+    }
+
+    void addElements(std::string const& part, std::string const& key, json::Array const& list,
+                     json::Array const& origins) {
+        for (std::size_t i = 0; i < list.size(); ++i)
+            addRow(part, key + '[' + std::to_string(i) + ']', list.at(i), origins.at(i));
+    }
+    void addRow(std::string const& part, std::string const& key, json::Value const& value,
+                json::Value const& origin) {
+        std::vector<std::string> cells{part, key, cut(valueInWords(value))};
+        if (withOrigin_)
+            cells.push_back(originInWords(origin));
+        table_.addRow(std::move(cells));
+    }
+
+    bool withOrigin_;
+    TextTable table_;
+};
+
+int showSettings(Options const& options, Terminal const& terminal) {
+    auto const service = connectToService(options.service, terminal);
+    json::Object const answer = fetchSettings(*service, nodeIdIn(options.node), options.parts);
+    if (options.json) {
+        terminal.out << answer << '\n';
+        return FINE;
+    }
+    SettingsTable table(options.origin);
+    for (auto const& [part, settings] : answer.get("parts").toObject())
+        table.add(part, settings.toObject());
+    table.print(terminal.out);
+    if (!answer.get("known").isTrue())
+        terminal.out << nodeInWords(answer.get("id").textOrEmpty())
+                     << " has no settings yet: all of this is inherited\n";
+    return FINE;
+}
+
+} // namespace
+
+void addSettingsShowCommand(CLI::App& settings, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const show = settings.add_subcommand("show", "Shows what counts at a node");
+    show->add_option("NODE", options->node,
+                     "A node like u=bob/ou=sales/a=acme, or bob/sales/acme; / is the root")
+        ->required();
+    show->add_option("PART", options->parts, "app, inet, po, deps, profiles, presets [all]");
+    show->add_flag("--origin", options->origin, "Show which node each value comes from");
+    show->add_flag("--json", options->json,
+                   "The service's answer, with all values and origins, as one JSON object");
+    addServiceOptions(*show, options->service);
+    show->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showSettings(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,83 @@
+// vlmail settings tree: the nodes that the service knows.
+#include "programs/vlmail/commands/settings.h"
+
+#include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/ipc/cfg_ids_for_user.h"
+#include "vlservice/ipc/cfg_ids_tree.h"
+#include "vlservice/json/json_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <ostream>
+
+namespace VlMail {
+namespace {
+
+struct Options {
+    ServiceOptions service;
+    std::string user;
+    bool json = false;
+};
+
+std::string partsIn(json::Object const& node) {
+    std::string names;
+    for (json::Value const& part : node.get("parts").toArray())
+        names += (names.empty() ? "" : ", ") + part.textOrEmpty();
+    return names;
+}
+
+void addBranch(TextTable& table, json::Object const& node, std::size_t depth) {
+    std::string const id = node.get("id").textOrEmpty();
+    table.addRow({std::string(2 * depth, ' ') + (id.empty() ? "/" : id), node.get("descr").textOrEmpty(),
+                  node.get("disabled").isTrue() ? "disabled" : "", partsIn(node)});
+    for (json::Value const& child : node.get("children").toArray())
+        addBranch(table, child.toObject(), depth + 1);
+}
+
+int showTree(Options const& options, Terminal const& terminal) {
+    auto const service = connectToService(options.service, terminal);
+    json::Object const tree = requireAnswer(service->call<Ipc::CfgIdsTree>()->resp());
+    if (options.json) {
+        terminal.out << tree << '\n';
+        return FINE;
+    }
+    TextTable table({{"node"}, {"description"}, {"state"}, {"own settings"}});
+    addBranch(table, tree, 0);
+    table.print(terminal.out);
+    return FINE;
+}
+
+int showIds(Options const& options, Terminal const& terminal) {
+    auto const service = connectToService(options.service, terminal);
+    auto const answer = service->call<Ipc::CfgIdsForUser>(options.user);
+    if (options.json) {
+        terminal.out << static_cast<Ipc::JsonCmdBase const&>(*answer).serializeResp() << '\n';
+        return FINE;
+    }
+    TextTable table({{"node"}, {"description"}, {"state"}});
+    for (auto const& [id, description, disabled] : answer->resp())
+        table.addRow({id, description, disabled ? "disabled" : ""});
+    table.print(terminal.out);
+    return FINE;
+}
+
+} // namespace
+
+void addSettingsTreeCommand(CLI::App& settings, Task& task) {
+    auto const options = std::make_shared<Options>();
+    CLI::App* const tree = settings.add_subcommand("tree", "Shows all nodes");
+    CLI::App* const ids = settings.add_subcommand("ids", "Lists the nodes that a user may send for");
+    ids->add_option("USER", options->user, "The user's name [the nodes that are no user's]");
+    for (CLI::App* const command : {tree, ids}) {
+        command->add_flag("--json", options->json, "The service's answer as one JSON object");
+        addServiceOptions(*command, options->service);
+    }
+    tree->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showTree(*options, terminal); }; });
+    ids->callback(
+        [=, &task] { task = [=](Terminal const& terminal) { return showIds(*options, terminal); }; });
+}
+
+} // namespace VlMail

@@ -1,0 +1,21 @@
+#pragma once
+// A letter as the texts of its zones, written by hand, to test fields without a document:
+//
+//     [_Address]
+//     Jane Roe
+//     12 Long Street
+//     [Total]
+//     Total: 1,234.50
+
+#include "programs/vlmail/letters/reading.h"
+
+#include <string>
+
+namespace VlMail {
+
+/// Reads the letter as a document of that name would be; zones that the text leaves out have no fields.
+/// Throws Error, without the name of the file, when the text is not such a letter or the presets fail.
+DocumentReading readZonesText(std::string const& text, std::string const& documentName,
+                              Cfg::Presets const& presets);
+
+} // namespace VlMail

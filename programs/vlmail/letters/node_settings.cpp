@@ -1,0 +1,89 @@
+#include "programs/vlmail/letters/node_settings.h"
+
+#include "programs/base/digest.h"
+#include "programs/base/error.h"
+#include "programs/reader/document.h"
+#include "vlservice/cfg/app.h"
+#include "vlservice/cfg/departments.h"
+#include "vlservice/cfg/inet.h"
+#include "vlservice/cfg/po.h"
+#include "vlservice/cfg/profiles.h"
+#include "vlservice/json/json_text.h"
+
+#include <algorithm>
+#include <iterator>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+std::string quoted(fs::path const& file) { return '"' + file.string() + '"'; }
+
+bool isPartName(std::string const& name) {
+    std::string const* const names[] = {&Cfg::App::PART_NAME,      &Cfg::Inet::PART_NAME,
+                                        &Cfg::PO::PART_NAME,       &Cfg::Departments::PART_NAME,
+                                        &Cfg::Profiles::PART_NAME, &Cfg::Presets::PART_NAME};
+    return std::any_of(std::begin(names), std::end(names),
+                       [&](std::string const* part) { return *part == name; });
+}
+
+bool isPresetsPart(json::Object const& document) {
+    return document.get("extract_presets") || document.get("pack_presets");
+}
+
+/// A misspelt part would be passed over in silence, and with it all of its settings.
+void requirePartNames(json::Object const& document, fs::path const& file) {
+    for (auto const& [name, part] : document) {
+        if (!isPartName(name))
+            throw Base::Error(
+                "cannot use the settings in " + quoted(file) + ": \"" + name +
+                "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or "
+                "\"profiles\"");
+    }
+}
+
+} // namespace
+
+NodeSettings NodeSettings::fromFile(fs::path const& file) {
+    std::string const text = Reader::readFile(file);
+    NodeSettings settings;
+    settings.file_ = file;
+    settings.place_ = quoted(file);
+    settings.sha256_ = Base::sha256(text);
+    try {
+        settings.parts_ = json::strToObject(text.data(), text.size());
+    } catch (json::Exc const& wrong) {
+        throw Base::Error("cannot read the settings in " + quoted(file) + ": " + wrong.what() +
+                          "; correct the file there");
+    }
+    if (isPresetsPart(settings.parts_))
+        settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};
+    requirePartNames(settings.parts_, file);
+    settings.presets();
+    return settings;
+}
+
+NodeSettings NodeSettings::fromFileIfNamed(std::string const& file) {
+    return file.empty() ? NodeSettings() : fromFile(file);
+}
+
+NodeSettings NodeSettings::resolved(json::Object parts, std::string place) {
+    NodeSettings settings;
+    settings.parts_ = std::move(parts);
+    settings.place_ = std::move(place);
+    // Own presets stand in front of inherited ones, whatever their order.
+    settings.sorted_ = false;
+    return settings;
+}
+
+Cfg::Presets NodeSettings::presets() const {
+    try {
+        return Cfg::Presets(part(Cfg::Presets::PART_NAME), true, sorted_);
+    } catch (std::exception const& wrong) {
+        throw Base::Error("cannot use the presets in " + place_ + ": " + wrong.what() +
+                          "; correct them there");
+    }
+}
+
+} // namespace VlMail

@@ -1,0 +1,46 @@
+#pragma once
+// The settings that a command works with, from a JSON document on disk.
+
+#include "vlservice/json/json.h"
+#include "vlservice/presets/presets.h"
+
+#include <filesystem>
+#include <string>
+
+namespace VlMail {
+
+/// A node's settings parts as JSON. The document holds parts under their names, {"presets": {...}, "app":
+/// {...}}, or is the part "presets" itself.
+class NodeSettings {
+public:
+    /// Nothing set: the global defaults apply.
+    NodeSettings() = default;
+    /// Throws std::runtime_error with a line for people when the file cannot be read or is not such a
+    /// document.
+    static NodeSettings fromFile(std::filesystem::path const& file);
+    /// The same, or the global defaults for an empty name.
+    static NodeSettings fromFileIfNamed(std::string const& file);
+    /// What counts at a node, {"presets": ...} and so on, in the order in which a service has resolved it.
+    static NodeSettings resolved(json::Object parts, std::string place);
+
+    /// Completed by the global defaults, so that a pair of presets exists for every document's name.
+    /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
+    Cfg::Presets presets() const;
+    /// The part's JSON as it stands in the document; the empty handle when it is not there.
+    json::Value part(std::string const& name) const { return parts_.get(name); }
+    /// Empty for settings that are not from a file.
+    std::filesystem::path const& file() const { return file_; }
+    /// Where they come from, as messages say it.
+    std::string const& place() const { return place_; }
+    /// Of the file as it was read; empty for the defaults.
+    std::string const& sha256() const { return sha256_; }
+
+private:
+    std::filesystem::path file_;
+    std::string sha256_;
+    std::string place_ = "the settings";
+    bool sorted_ = true;
+    json::Object parts_;
+};
+
+} // namespace VlMail

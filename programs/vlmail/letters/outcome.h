@@ -1,0 +1,36 @@
+#pragma once
+// How a batch ended: what was done, and the exit status that follows.
+
+#include "programs/vlmail/letters/reading.h"
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+namespace VlMail {
+
+class Outcome {
+public:
+    void count(DocumentReading const& reading);
+    /// Something beside the documents failed.
+    void fail() { failed_ = true; }
+
+    /// "20 documents, 24 letters: 21 ready, 3 cannot go out; 1 document failed".
+    std::string inWords() const;
+    int exitStatus() const;
+
+private:
+    std::size_t documents_ = 0;
+    std::size_t failedDocuments_ = 0;
+    std::size_t letters_ = 0;
+    std::size_t readyLetters_ = 0;
+    bool failed_ = false;
+};
+
+/// "page 1", "pages 2-4", "pages 1, 3".
+std::string pagesInWords(std::vector<int> const& pages);
+
+/// "1 letter", "2 letters".
+std::string counted(std::size_t count, std::string const& noun);
+
+} // namespace VlMail

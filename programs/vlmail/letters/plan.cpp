@@ -1,0 +1,129 @@
+#include "programs/vlmail/letters/plan.h"
+
+#include "programs/base/digest.h"
+#include "programs/base/error.h"
+#include "programs/reader/document.h"
+#include "vlservice/json/json_text.h"
+
+#include <sstream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+/// Of the form of the document; another one is refused.
+constexpr int PLAN_VERSION = 1;
+
+constexpr char const* VERSION_KEY = "plan";
+constexpr char const* SETTINGS_KEY = "settings";
+constexpr char const* DOCUMENTS_KEY = "documents";
+constexpr char const* OUTCOME_KEY = "outcome";
+constexpr char const* DIGEST_KEY = "digest";
+constexpr char const* FILE_KEY = "file";
+constexpr char const* SHA256_KEY = "sha256";
+
+std::string textOf(json::Object const& object) {
+    std::ostringstream text;
+    text << object;
+    return std::move(text).str();
+}
+
+/// All members but the digest itself, which is the last.
+std::string digestOf(json::Object const& plan) {
+    json::Object rest;
+    for (auto const& [key, member] : plan) {
+        if (std::string_view(key) != DIGEST_KEY)
+            rest.set(key, member);
+    }
+    return Base::sha256(textOf(rest));
+}
+
+json::Object fileToJson(fs::path const& file, std::string const& digest) {
+    return {{FILE_KEY, file.string()}, {SHA256_KEY, digest}};
+}
+
+/// What is wrong with a file now, or nothing.
+std::string changeOf(fs::path const& file, std::string const& digest) {
+    try {
+        return Base::sha256(Reader::readFile(file)) == digest ? std::string()
+                                                              : '"' + file.string() + "\" has changed";
+    } catch (Base::Error const&) {
+        return '"' + file.string() + "\" cannot be read any more";
+    }
+}
+
+} // namespace
+
+Plan::Plan(NodeSettings const& settings) {
+    if (settings.file().empty())
+        return;
+    settingsFile_ = fs::absolute(settings.file());
+    settingsSha256_ = settings.sha256();
+}
+
+Plan Plan::fromFile(fs::path const& file) {
+    std::string const text = Reader::readFile(file);
+    try {
+        json::Object const object = json::strToObject(text.data(), text.size());
+        if (object.get(VERSION_KEY).intOrZero() != PLAN_VERSION)
+            throw Base::Error("it is no plan of this version");
+        if (object.get(DIGEST_KEY).textOrEmpty() != digestOf(object))
+            throw Base::Error("it was changed since it was made");
+        Plan plan;
+        if (json::Value const settings = object.get(SETTINGS_KEY); settings.isObject()) {
+            plan.settingsFile_ = settings.toObject().get(FILE_KEY).toString();
+            plan.settingsSha256_ = settings.toObject().get(SHA256_KEY).toString();
+        }
+        for (json::Value const& value : object.get(DOCUMENTS_KEY).toArray()) {
+            json::Object const& document = value.toObject();
+            plan.add({document.get(FILE_KEY).toString(), document.get(SHA256_KEY).textOrEmpty(),
+                      DocumentReading::fromJson(document)});
+        }
+        return plan;
+    } catch (std::exception const& wrong) {
+        throw Base::Error("cannot use the plan \"" + file.string() + "\": " + wrong.what() +
+                          "; make it again with vlmail plan");
+    }
+}
+
+std::string Plan::toText(json::Object const& outcome) const {
+    json::Array documents;
+    for (Document const& document : documents_) {
+        json::Object object = fileToJson(document.file, document.sha256);
+        for (auto const& [key, member] : document.reading.toJson())
+            object.set(key, member);
+        documents.append(object);
+    }
+    json::Object plan{{VERSION_KEY, PLAN_VERSION},
+                      {SETTINGS_KEY, settingsFile_.empty() ? json::Value(json_null())
+                                                           : fileToJson(settingsFile_, settingsSha256_)},
+                      {DOCUMENTS_KEY, documents},
+                      {OUTCOME_KEY, outcome}};
+    plan.set(DIGEST_KEY, digestOf(plan));
+    return textOf(plan) + '\n';
+}
+
+void Plan::requireUnchanged() const {
+    std::string changes;
+    auto const check = [&](fs::path const& file, std::string const& digest) {
+        std::string const change = changeOf(file, digest);
+        if (!change.empty())
+            changes += (changes.empty() ? "" : ", ") + change;
+    };
+    if (!settingsFile_.empty())
+        check(settingsFile_, settingsSha256_);
+    for (Document const& document : documents_) {
+        if (!document.reading.failed())
+            check(document.file, document.sha256);
+    }
+    if (!changes.empty())
+        throw Base::Error("cannot carry out the plan: " + changes + "; make it again with vlmail plan");
+}
+
+NodeSettings Plan::settings() const {
+    return settingsFile_.empty() ? NodeSettings() : NodeSettings::fromFile(settingsFile_);
+}
+
+} // namespace VlMail

@@ -1,0 +1,52 @@
+#pragma once
+// A batch that is decided and not yet carried out, as a JSON document.
+
+#include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/reading.h"
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace VlMail {
+
+/// What was read from each document under which settings, with digests of all of them, so that it can be
+/// carried out later exactly as decided, or refused when something has changed.
+///
+/// In JSON {"plan", "settings": {"file", "sha256"}, "documents": [{"file", "sha256", ...}], "outcome",
+/// "digest"}: a document has beside its file the keys of DocumentReading::toJson(), "outcome" is that of
+/// Dispatch::toJson() and is there to be read by people and programs, and "digest" is over all the rest.
+class Plan {
+public:
+    struct Document {
+        /// Absolute.
+        std::filesystem::path file;
+        std::string sha256;
+        DocumentReading reading;
+    };
+
+    /// The settings may be the global defaults, which have no file.
+    explicit Plan(NodeSettings const& settings);
+    /// Throws Error when the file is no plan or was changed.
+    static Plan fromFile(std::filesystem::path const& file);
+
+    void add(Document document) { documents_.push_back(std::move(document)); }
+    std::vector<Document> const& documents() const { return documents_; }
+
+    /// The whole document as text; `outcome` comes from Dispatch::toJson().
+    std::string toText(json::Object const& outcome) const;
+
+    /// Throws Error that names every document and settings file that is gone or has changed since.
+    void requireUnchanged() const;
+    NodeSettings settings() const;
+
+private:
+    Plan() = default;
+
+    /// Empty for the global defaults.
+    std::filesystem::path settingsFile_;
+    std::string settingsSha256_;
+    std::vector<Document> documents_;
+};
+
+} // namespace VlMail

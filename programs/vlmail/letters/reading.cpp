@@ -1,0 +1,247 @@
+#include "programs/vlmail/letters/reading.h"
+
+#include "programs/base/digest.h"
+#include "programs/base/error.h"
+#include "programs/base/utf8.h"
+#include "programs/reader/document.h"
+#include "programs/reader/letters.h"
+#include "programs/vlmail/explain/explain.h"
+#include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/report/describe.h"
+
+#include "vlservice/pack/page_saver.h"
+
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr char const* DOCUMENT_KEY = "document";
+constexpr char const* ERROR_KEY = "error";
+constexpr char const* EXTRACT_PRESET_KEY = "extract_preset";
+constexpr char const* PACK_PRESET_KEY = "pack_preset";
+constexpr char const* LETTERS_KEY = "letters";
+constexpr char const* PAGES_KEY = "pages";
+constexpr char const* FIELDS_KEY = "fields";
+constexpr char const* READY_KEY = "production_ready";
+constexpr char const* MESSAGE_KEY = "message";
+constexpr char const* MISSING_KEY = "missing";
+constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
+constexpr char const* TRACE_KEY = "trace";
+
+json::Value nameOrNull(Cfg::ExtractedField const* field) {
+    return field ? json::Value(field->name()) : json::Value(json_null());
+}
+
+json::Object toJson(LetterReading const& letter) {
+    std::string message;
+    bool const ready = letter.isProductionReady(message);
+    json::Object object{{PAGES_KEY, toJsonArray(letter.pages)},
+                        {FIELDS_KEY, letter.fields.serialize()},
+                        {READY_KEY, ready},
+                        {MESSAGE_KEY, message},
+                        {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
+    if (letter.missing.empty())
+        return object;
+    json::Array missing;
+    for (std::string const& name : letter.missing)
+        missing.append(name);
+    object.set(MISSING_KEY, missing);
+    return object;
+}
+
+json::Value lettersToJson(std::vector<LetterReading> const& letters) {
+    json::Array array;
+    for (LetterReading const& letter : letters)
+        array.append(toJson(letter));
+    return array;
+}
+
+LetterReading letterFrom(json::Object const& object) {
+    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()), {}};
+    for (json::Value const& page : object.get(PAGES_KEY).toArray())
+        letter.pages.push_back(static_cast<int>(page.toInt()));
+    if (json::Value const missing = object.get(MISSING_KEY)) {
+        for (json::Value const& name : missing.toArray())
+            letter.missing.push_back(name.toString());
+    }
+    return letter;
+}
+
+std::string quoted(std::string const& text) { return '"' + text + '"'; }
+
+/// The library takes a field with a bad pattern for one that was not found; here it is said instead.
+void requirePattern(std::string const& pattern, std::string const& whose, NodeSettings const& settings) {
+    try {
+        Cfg::ExtractPreset::match(pattern, std::string());
+    } catch (std::exception const& bad) {
+        throw Base::Error("the pattern " + quoted(pattern) + " of " + whose +
+                          " cannot be used: " + bad.what() + "; correct it in " + settings.place());
+    }
+}
+
+void requirePatterns(Cfg::ExtractPreset const& preset, NodeSettings const& settings) {
+    for (Cfg::ExtractZone const& zone : preset.zones()) {
+        for (Cfg::ExtractField const& field : zone.fields()) {
+            std::string const whose = "field " + quoted(field.name()) + " in zone " + quoted(zone.name()) +
+                                      " of the preset for " + quoted(preset.strRegex());
+            requirePattern(field.strRegex(), whose, settings);
+            requirePattern(field.validation().strRegex(), whose, settings);
+        }
+    }
+}
+
+std::pair<Cfg::ExtractPreset const&, Cfg::PackPreset const&>
+findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings const& settings) {
+    try {
+        return presets.findMatch(name);
+    } catch (std::exception const& failure) {
+        throw Base::Error(std::string(failure.what()) + "; correct the presets in " + settings.place());
+    }
+}
+
+std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPreset const& preset,
+                                     Reader::Trace* trace) {
+    std::vector<LetterReading> letters;
+    for (Reader::Letter& letter : Reader::readLetters(document, preset, trace))
+        letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing)});
+    return letters;
+}
+
+void addPages(json::Value& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
+              Reader::Trace const& trace) {
+    json::Object object = explanation.toObject();
+    explainPages(object, document, preset, trace);
+    explanation = object;
+}
+
+std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& letter) {
+    std::vector<PageBlob> blobs;
+    if (!letter.whyNot().empty())
+        return blobs;
+    for (int const page : letter.pages) {
+        std::string const pdf = document.singlePagePdf(page);
+        blobs.push_back({page, PageSaverI::zipDbData(pdf.data(), pdf.size())});
+    }
+    return blobs;
+}
+
+std::vector<std::vector<PageBlob>> pagesOf(Reader::Document& document, DocumentReading const& reading) {
+    std::vector<std::vector<PageBlob>> pages;
+    for (LetterReading const& letter : *reading.letters)
+        pages.push_back(blobsOf(document, letter));
+    return pages;
+}
+
+void fail(ReadResult& result, std::exception const& failure) {
+    result.reading.document = Base::validUtf8(result.reading.document);
+    result.reading.error = Base::validUtf8(failure.what());
+    result.pages.clear();
+    result.report.clear();
+}
+
+} // namespace
+
+json::Array toJsonArray(std::vector<int> const& numbers) {
+    json::Array array;
+    for (int const number : numbers)
+        array.append(number);
+    return array;
+}
+
+std::string LetterReading::whyNot() const {
+    std::string message;
+    if (isProductionReady(message))
+        return {};
+    if (message.empty())
+        return "no address to go to";
+    return message;
+}
+
+json::Object DocumentReading::toJson() const {
+    json::Object object{{DOCUMENT_KEY, document}};
+    if (failed()) {
+        object.set(ERROR_KEY, error);
+    } else {
+        object.set(EXTRACT_PRESET_KEY, extractPreset);
+        object.set(PACK_PRESET_KEY, packPreset);
+        object.set(LETTERS_KEY, letters ? lettersToJson(*letters) : json::Value(json_null()));
+    }
+    if (trace)
+        object.set(TRACE_KEY, trace);
+    return object;
+}
+
+DocumentReading DocumentReading::fromJson(json::Object const& object) {
+    DocumentReading reading;
+    reading.document = object.get(DOCUMENT_KEY).toString();
+    reading.error = object.get(ERROR_KEY).textOrEmpty();
+    reading.trace = object.get(TRACE_KEY);
+    if (reading.failed())
+        return reading;
+    reading.extractPreset = object.get(EXTRACT_PRESET_KEY).toString();
+    reading.packPreset = object.get(PACK_PRESET_KEY).toString();
+    json::Value const letters = object.get(LETTERS_KEY);
+    if (!letters.isArray())
+        return reading;
+    reading.letters.emplace();
+    for (json::Value const& letter : letters.toArray())
+        reading.letters->push_back(letterFrom(letter.toObject()));
+    return reading;
+}
+
+ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
+                        Along along, std::size_t place) {
+    ReadResult result;
+    DocumentReading& reading = result.reading;
+    reading.document = file.filename().string();
+    try {
+        if (contains(along, Along::Trace))
+            reading.trace = explainPresets(presets, reading.document);
+        std::string bytes = Reader::readFile(file);
+        result.sha256 = Base::sha256(bytes);
+        Reader::Document document = Reader::openDocument(std::move(bytes), file);
+        auto const& [extractPreset, packPreset] = findPresets(reading.document, presets, settings);
+        reading.extractPreset = extractPreset.strRegex();
+        reading.packPreset = packPreset.name();
+        if (extractPreset.isForAttachemnt())
+            return result;
+        requirePatterns(extractPreset, settings);
+        bool const withReport = contains(along, Along::Report);
+        bool const withTrace = contains(along, Along::Trace);
+        Reader::Trace trace;
+        reading.letters = lettersOf(document, extractPreset, withReport || withTrace ? &trace : nullptr);
+        if (withTrace)
+            addPages(reading.trace, document, extractPreset, trace);
+        if (withReport)
+            result.report = Report::section(Report::describe(reading, document, trace), place);
+        if (contains(along, Along::Pages))
+            result.pages = pagesOf(document, reading);
+        else
+            result.pages.resize(reading.letters->size());
+    } catch (std::exception const& failure) {
+        fail(result, failure);
+    }
+    return result;
+}
+
+ReadResult splitDocument(fs::path const& file, std::string const& digest, DocumentReading reading) {
+    ReadResult result{std::move(reading)};
+    if (!result.reading.letters)
+        return result;
+    try {
+        std::string bytes = Reader::readFile(file);
+        result.sha256 = Base::sha256(bytes);
+        if (result.sha256 != digest)
+            throw Base::Error('"' + file.string() + "\" has changed; make the plan again");
+        Reader::Document document = Reader::openDocument(std::move(bytes), file);
+        result.pages = pagesOf(document, result.reading);
+    } catch (std::exception const& failure) {
+        fail(result, failure);
+    }
+    return result;
+}
+
+} // namespace VlMail

@@ -1,0 +1,206 @@
+#include "programs/vlmail/letters/worker_pool.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <poll.h>
+#include <sched.h>
+#include <sys/socket.h>
+#include <sys/wait.h>
+#include <system_error>
+#include <unistd.h>
+#include <utility>
+#include <vector>
+
+namespace VlMail {
+namespace {
+
+// What goes over a worker's socket: the job's number one way, the result's length and bytes the other.
+using Number = std::uint64_t;
+
+bool writeAll(int file, void const* data, std::size_t size) {
+    auto at = static_cast<char const*>(data);
+    while (size > 0) {
+        ssize_t const step = ::send(file, at, size, MSG_NOSIGNAL);
+        if (step < 0 && errno == EINTR)
+            continue;
+        if (step <= 0)
+            return false;
+        at += step;
+        size -= static_cast<std::size_t>(step);
+    }
+    return true;
+}
+
+bool readAll(int file, void* data, std::size_t size) {
+    auto at = static_cast<char*>(data);
+    while (size > 0) {
+        ssize_t const step = ::read(file, at, size);
+        if (step < 0 && errno == EINTR)
+            continue;
+        if (step <= 0)
+            return false;
+        at += step;
+        size -= static_cast<std::size_t>(step);
+    }
+    return true;
+}
+
+class Worker {
+public:
+    /// `others` are closed in the new process, so that their workers see this process end.
+    Worker(Job const& job, std::vector<std::unique_ptr<Worker>> const& others) {
+        int ends[2];
+        if (::socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends) != 0)
+            fail("cannot connect to a worker process");
+        process_ = ::fork();
+        if (process_ < 0) {
+            ::close(ends[0]);
+            ::close(ends[1]);
+            fail("cannot start a worker process");
+        }
+        if (process_ == 0) {
+            ::close(ends[0]);
+            for (auto const& other : others)
+                if (other)
+                    ::close(other->socket_);
+            serve(ends[1], job);
+        }
+        ::close(ends[1]);
+        socket_ = ends[0];
+    }
+    ~Worker() {
+        ::close(socket_);
+        while (::waitpid(process_, nullptr, 0) < 0 && errno == EINTR) {
+        }
+    }
+    Worker(Worker const&) = delete;
+    Worker& operator=(Worker const&) = delete;
+
+    int socket() const { return socket_; }
+    std::optional<std::size_t> job() const { return job_; }
+
+    void start(std::size_t index) {
+        job_ = index;
+        Number const number = index;
+        // A worker that is gone is noticed when its result is read.
+        writeAll(socket_, &number, sizeof number);
+    }
+
+    /// The result of the job that was started; nothing when the worker is dead.
+    std::optional<std::string> finish() {
+        job_.reset();
+        Number length = 0;
+        if (!readAll(socket_, &length, sizeof length))
+            return std::nullopt;
+        std::string result(length, '\0');
+        if (!readAll(socket_, result.data(), result.size()))
+            return std::nullopt;
+        return result;
+    }
+
+private:
+    [[noreturn]] static void fail(char const* what) {
+        throw std::system_error(errno, std::generic_category(), what);
+    }
+
+    /// The life of the worker process; ends when the other side closes.
+    [[noreturn]] static void serve(int socket, Job const& job) {
+        for (Number index = 0; readAll(socket, &index, sizeof index);) {
+            std::string const result = job(index);
+            Number const length = result.size();
+            if (!writeAll(socket, &length, sizeof length) || !writeAll(socket, result.data(), result.size()))
+                break;
+        }
+        // Nothing of the parent's is flushed or destroyed here.
+        ::_exit(0);
+    }
+
+    pid_t process_ = -1;
+    int socket_ = -1;
+    std::optional<std::size_t> job_;
+};
+
+class Pool {
+public:
+    Pool(std::size_t count, std::size_t workers, Job const& job, Consumer const& consume,
+         Progress const& progress)
+        : count_(count), job_(job), consume_(consume), progress_(progress), workers_(workers) {}
+
+    void run() {
+        for (auto& worker : workers_) {
+            worker = std::make_unique<Worker>(job_, workers_);
+            startNext(*worker);
+        }
+        while (consumed_ < count_) {
+            std::unique_ptr<Worker>& worker = waitForResult();
+            take(worker);
+        }
+    }
+
+private:
+    void startNext(Worker& worker) {
+        if (started_ < count_)
+            worker.start(started_++);
+    }
+
+    std::unique_ptr<Worker>& waitForResult() {
+        std::vector<pollfd> polled;
+        for (auto const& worker : workers_)
+            polled.push_back({worker->job() ? worker->socket() : -1, POLLIN, 0});
+        while (::poll(polled.data(), polled.size(), -1) < 0) {
+            if (errno != EINTR)
+                throw std::system_error(errno, std::generic_category(), "cannot wait for worker processes");
+        }
+        std::size_t ready = 0;
+        while (polled[ready].revents == 0)
+            ++ready;
+        return workers_[ready];
+    }
+
+    void take(std::unique_ptr<Worker>& worker) {
+        std::size_t const index = *worker->job();
+        std::optional<std::string> result = worker->finish();
+        if (!result) {
+            worker.reset();
+            worker = std::make_unique<Worker>(job_, workers_);
+        }
+        startNext(*worker);
+        results_.emplace(index, std::move(result));
+        if (progress_)
+            progress_(++done_);
+        for (auto next = results_.find(consumed_); next != results_.end(); next = results_.find(consumed_)) {
+            consume_(consumed_, std::move(next->second));
+            results_.erase(next);
+            ++consumed_;
+        }
+    }
+
+    std::size_t count_;
+    Job const& job_;
+    Consumer const& consume_;
+    Progress const& progress_;
+    std::vector<std::unique_ptr<Worker>> workers_;
+    std::map<std::size_t, std::optional<std::string>> results_;
+    std::size_t started_ = 0;
+    std::size_t done_ = 0;
+    std::size_t consumed_ = 0;
+};
+
+} // namespace
+
+void runJobs(std::size_t count, std::size_t workers, Job const& job, Consumer const& consume,
+             Progress const& progress) {
+    if (count == 0)
+        return;
+    Pool(count, std::max<std::size_t>(1, std::min(workers, count)), job, consume, progress).run();
+}
+
+std::size_t processorCount() {
+    cpu_set_t set;
+    return ::sched_getaffinity(0, sizeof set, &set) == 0 ? static_cast<std::size_t>(CPU_COUNT(&set)) : 1;
+}
+
+} // namespace VlMail

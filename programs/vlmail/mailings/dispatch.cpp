@@ -1,0 +1,157 @@
+#include "programs/vlmail/mailings/dispatch.h"
+
+#include "programs/base/error.h"
+#include "programs/vlmail/mailings/price.h"
+#include "programs/vlmail/terminal/text_table.h"
+
+#include <algorithm>
+#include <ostream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+/// The one that Presets::findMatch has found: the first of the name.
+Cfg::PackPreset const& presetNamed(std::string const& name, Cfg::Presets const& presets) {
+    auto const& all = presets.elements<Cfg::PresetFieldIdxs::PackPresets>();
+    auto const found = std::find_if(all.begin(), all.end(),
+                                    [&](auto const& element) { return element.value.name() == name; });
+    if (found == all.end())
+        throw Base::Error("there is no pack preset \"" + name + "\"; add it to the settings");
+    return found->value;
+}
+
+} // namespace
+
+Dispatch::Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal const& terminal)
+    : presets_(presets), begin_(std::move(begin)), terminal_(terminal) {}
+
+void Dispatch::take(ReadResult result) {
+    DocumentReading& reading = result.reading;
+    outcome_.count(reading);
+    if (reading.failed()) {
+        fail(reading.document, reading.error);
+    } else if (reading.isAttachment()) {
+        attachments_.push_back(reading.document);
+    } else {
+        mailLetters(std::move(reading), result.pages);
+    }
+}
+
+void Dispatch::mailLetters(DocumentReading reading, std::vector<std::vector<PageBlob>> const& pages) {
+    std::string name;
+    for (std::size_t i = 0; i < reading.letters->size(); ++i) {
+        LetterReading& letter = (*reading.letters)[i];
+        std::string const why = letter.whyNot();
+        if (!why.empty()) {
+            leftOut_.push_back({reading.document, letter.pages, why});
+            continue;
+        }
+        MailingBuilder& mailing = mailingFor(reading.packPreset).builder();
+        if (name.empty())
+            name = mailing.nameFor(reading.document);
+        mailing.add(name, std::move(letter), pages[i]);
+    }
+}
+
+OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
+    auto& mailing = mailings_[packPreset];
+    if (!mailing)
+        mailing = begin_(presetNamed(packPreset, presets_));
+    return *mailing;
+}
+
+void Dispatch::finish() {
+    for (auto const& [packPreset, mailing] : mailings_) {
+        try {
+            mailing->finish();
+            arrived_.push_back(mailing.get());
+        } catch (std::exception const& failure) {
+            outcome_.fail();
+            fail(packPreset, failure.what());
+        }
+    }
+}
+
+void Dispatch::estimate(Channel::Client& service) {
+    for (auto const& [packPreset, mailing] : mailings_)
+        prices_[mailing.get()] =
+            estimatePrice(service, pricedLettersOf(mailing->builder().metadata()), false);
+}
+
+void Dispatch::fail(std::string const& name, std::string const& reason) {
+    failures_.push_back({name, {}, reason});
+    terminal_.complain(reason);
+}
+
+void Dispatch::print() const {
+    auto const number = [](std::size_t n) { return std::to_string(n); };
+    constexpr auto RIGHT = TextTable::Align::Right;
+    std::vector<TextTable::Column> columns{
+        {"pack preset"}, {"letters", RIGHT}, {"sent as", RIGHT}, {"pages", RIGHT}};
+    columns.push_back(prices_.empty() ? TextTable::Column{"mailing"} : TextTable::Column{"price", RIGHT});
+    TextTable table(columns);
+    for (OutgoingMailing* const mailing : arrived_) {
+        MailingBuilder const& builder = mailing->builder();
+        table.addRow({builder.metadata().packPreset.name(), number(builder.letterCount()),
+                      number(builder.metadata().letters.size()), number(builder.pageCount()),
+                      prices_.empty() ? mailing->place() : priceInWords(mailing)});
+    }
+    if (!table.empty())
+        table.print(terminal_.out);
+    for (std::string const& document : attachments_)
+        terminal_.out << "not a letter: " << document << ", an attachment\n";
+    for (LeftBehind const& letter : leftOut_)
+        terminal_.out << "left out: " << letter.name << ", " << pagesInWords(letter.pages) << ": "
+                      << letter.reason << '\n';
+    terminal_.out << outcome_.inWords() << '\n';
+}
+
+std::string Dispatch::priceInWords(OutgoingMailing const* mailing) const {
+    auto const found = prices_.find(mailing);
+    if (found == prices_.end())
+        return {};
+    return money(found->second.get("total").intOrZero()) + ' ' + found->second.get("currency").textOrEmpty();
+}
+
+json::Object Dispatch::toJson() const {
+    json::Array mailings;
+    for (OutgoingMailing* const mailing : arrived_)
+        mailings.append(toJson(*mailing));
+    json::Array attachments;
+    for (std::string const& document : attachments_)
+        attachments.append(document);
+    return {{"mailings", mailings},
+            {"left_out", toJson(leftOut_)},
+            {"attachments", attachments},
+            {"failures", toJson(failures_)}};
+}
+
+json::Array Dispatch::toJson(std::vector<LeftBehind> const& all) {
+    json::Array array;
+    for (LeftBehind const& left : all) {
+        json::Object object{{"name", left.name}};
+        if (!left.pages.empty())
+            object.set("pages", toJsonArray(left.pages));
+        object.set("reason", left.reason);
+        array.append(object);
+    }
+    return array;
+}
+
+json::Object Dispatch::toJson(OutgoingMailing& mailing) const {
+    Mailing::Metadata const& metadata = mailing.builder().metadata();
+    json::Object object{{"pack_preset", metadata.packPreset.name()},
+                        {"letters", mailing.builder().letterCount()},
+                        {"sent_as", metadata.letters.size()},
+                        {"pages", mailing.builder().pageCount()}};
+    if (!metadata.id.empty()) {
+        object.set("id", metadata.id);
+        object.set("place", mailing.place());
+    }
+    if (auto const price = prices_.find(&mailing); price != prices_.end())
+        object.set("price", price->second);
+    return object;
+}
+
+} // namespace VlMail

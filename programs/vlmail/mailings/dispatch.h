@@ -1,0 +1,65 @@
+#pragma once
+// Sorts the letters of a batch into mailings, one a pack preset, and keeps account of what stays behind.
+
+#include "programs/channel/client.h"
+#include "programs/vlmail/letters/outcome.h"
+#include "programs/vlmail/letters/reading.h"
+#include "programs/vlmail/mailings/outgoing_mailing.h"
+#include "programs/vlmail/terminal/terminal.h"
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace VlMail {
+
+class Dispatch {
+public:
+    /// `presets` are those that the documents were read by.
+    Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal const& terminal);
+
+    /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
+    /// of.
+    void take(ReadResult result);
+    /// Asks what the mailings would cost. Throws std::exception with a line for people.
+    void estimate(Channel::Client& service);
+    /// Lets all mailings arrive; one that fails does not stop the others.
+    void finish();
+
+    /// A table of the mailings, and a line for each document and letter that stays behind.
+    void print() const;
+    /// {"mailings", "left_out", "attachments", "failures"}.
+    json::Object toJson() const;
+    int exitStatus() const { return outcome_.exitStatus(); }
+
+private:
+    /// A letter, or all of a document, that stays behind.
+    struct LeftBehind {
+        std::string name;
+        std::vector<int> pages;
+        std::string reason;
+    };
+
+    void mailLetters(DocumentReading reading, std::vector<std::vector<PageBlob>> const& pages);
+    OutgoingMailing& mailingFor(std::string const& packPreset);
+    std::string priceInWords(OutgoingMailing const* mailing) const;
+    void fail(std::string const& name, std::string const& reason);
+    static json::Array toJson(std::vector<LeftBehind> const& all);
+    json::Object toJson(OutgoingMailing& mailing) const;
+
+    Cfg::Presets const& presets_;
+    BeginMailing begin_;
+    Terminal const& terminal_;
+    /// By the pack preset's name, so that the same documents give the same order of mailings.
+    std::map<std::string, std::unique_ptr<OutgoingMailing>> mailings_;
+    std::vector<OutgoingMailing*> arrived_;
+    /// By mailing; empty when nobody has asked.
+    std::map<OutgoingMailing const*, json::Object> prices_;
+    std::vector<LeftBehind> leftOut_;
+    std::vector<LeftBehind> failures_;
+    std::vector<std::string> attachments_;
+    Outcome outcome_;
+};
+
+} // namespace VlMail

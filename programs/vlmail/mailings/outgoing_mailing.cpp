@@ -1,0 +1,141 @@
+#include "programs/vlmail/mailings/outgoing_mailing.h"
+
+#include "programs/base/error.h"
+#include "programs/base/pending_file.h"
+#include "programs/mailing/pack_database.h"
+#include "programs/vlmail/service/service_client.h"
+#include "vlservice/pack/pack_wrapper.h"
+
+#include <chrono>
+#include <iomanip>
+#include <random>
+#include <sstream>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr char const* MAILING_ENDING = ".mailing";
+
+class MailingFile : public OutgoingMailing {
+public:
+    MailingFile(fs::path const& folder, Cfg::PackPreset const& preset, std::time_t now)
+        : MailingFile(folder, preset, now, newMailingId(now)) {}
+
+    MailingBuilder& builder() override { return builder_; }
+
+    void finish() override {
+        if (!container_.finalizeOutput(builder_.metadata().toBlob()))
+            throw Base::Error("cannot write the mailing " + place() +
+                              ": the line above says why; make room on the disk and mail again");
+        file_.commit();
+    }
+
+    std::string place() const override { return file_.target().string(); }
+
+private:
+    MailingFile(fs::path const& folder, Cfg::PackPreset const& preset, std::time_t now, std::string const& id)
+        : file_(folder / (id + MAILING_ENDING)),
+          container_(file_.temporary().string(), PackWrapper::PURPOSE_OUTPUT, id),
+          builder_(container_, id, preset, now) {}
+
+    Base::PendingFile file_;
+    PackWrapper container_;
+    MailingBuilder builder_;
+};
+
+class SentMailing : public OutgoingMailing {
+public:
+    SentMailing(Channel::Client& service, fs::path const& database, std::string const& nodeId, bool upload,
+                Cfg::PackPreset const& preset, std::time_t now)
+        : service_(service), database_(database), upload_(upload), id_(newMailingId(now)),
+          pack_(database, {id_, nodeId, preset.title()}), builder_(pack_, id_, preset, now) {}
+
+    MailingBuilder& builder() override { return builder_; }
+
+    void finish() override {
+        pack_.finish(builder_.metadata().toBlob());
+        sendPack(service_, database_, id_, upload_);
+        json::Object const job = awaitJob(service_, id_, PATIENCE);
+        state_ = job.get("state").textOrEmpty();
+        if (json::Value const problem = job.get("problem"))
+            throw Base::Error("the service has trouble with mailing " + id_ + ": " + problem.textOrEmpty() +
+                              "; see vlmail status");
+    }
+
+    std::string place() const override { return id_ + ", " + state_; }
+
+private:
+    /// For a job that is only waiting for its turn; it goes on without us.
+    static constexpr std::chrono::seconds PATIENCE{10};
+
+    Channel::Client& service_;
+    fs::path database_;
+    bool upload_;
+    std::string id_;
+    std::string state_;
+    Mailing::PackDatabaseWriter pack_;
+    MailingBuilder builder_;
+};
+
+class PlannedMailing : public OutgoingMailing {
+public:
+    explicit PlannedMailing(Cfg::PackPreset const& preset) : builder_(nowhere_, {}, preset, 0) {}
+
+    MailingBuilder& builder() override { return builder_; }
+    void finish() override {}
+    std::string place() const override { return {}; }
+
+private:
+    struct Nowhere : PageSaverI {
+        Nowhere() : PageSaverI({}) {}
+        void savePage(std::string const&, std::string const&, SharedMemBuffer) override {}
+    };
+
+    Nowhere nowhere_;
+    MailingBuilder builder_;
+};
+
+void makeFolder(fs::path const& folder, char const* remedy) {
+    std::error_code failure;
+    fs::create_directories(folder, failure);
+    if (failure)
+        throw Base::Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() + "; " +
+                          remedy);
+}
+
+} // namespace
+
+OutgoingMailing::~OutgoingMailing() = default;
+
+BeginMailing mailingsIntoFolder(fs::path const& folder) {
+    makeFolder(folder, "name another with -o");
+    return [folder](Cfg::PackPreset const& preset) {
+        return std::make_unique<MailingFile>(folder, preset, std::time(nullptr));
+    };
+}
+
+BeginMailing mailingsToService(Channel::Client& service, std::string const& nodeId, bool upload) {
+    fs::path const database = packDatabaseOf(service, nodeId);
+    makeFolder(database.parent_path(), "name another in the settings \"db_host\" of the node");
+    return [&service, nodeId, upload, database](Cfg::PackPreset const& preset) {
+        return std::make_unique<SentMailing>(service, database, nodeId, upload, preset, std::time(nullptr));
+    };
+}
+
+BeginMailing mailingsNowhere() {
+    return [](Cfg::PackPreset const& preset) { return std::make_unique<PlannedMailing>(preset); };
+}
+
+std::string newMailingId(std::time_t now) {
+    std::tm utc{};
+    gmtime_r(&now, &utc);
+    std::random_device random;
+    std::ostringstream id;
+    id << std::put_time(&utc, "%Y%m%dT%H%M%SZ-") << std::hex << std::setfill('0') << std::setw(8) << random();
+    return id.str();
+}
+
+} // namespace VlMail

@@ -1,0 +1,213 @@
+#include "programs/vlmail/service/service_client.h"
+
+#include "programs/base/error.h"
+#include "programs/channel/token.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
+#include "vlservice/ipc/discovery_base.h"
+#include "vlservice/ipc/discovery_cli.h"
+#include "vlservice/ipc/gui_fwd.h"
+#include "vlservice/ipc/process_pack.h"
+#include "vlservice/ipc/upload_queued.h"
+
+#include <CLI/CLI.hpp>
+#include <boost/asio/io_context.hpp>
+
+#include <algorithm>
+#include <charconv>
+#include <cstdlib>
+#include <iostream>
+#include <ostream>
+#include <thread>
+#include <unistd.h>
+#include <utility>
+
+namespace VlMail {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr char const* DEFAULT_PACK_DATABASE = "packs.db";
+constexpr std::chrono::milliseconds POLL_TIME{100};
+constexpr std::size_t MAX_HOST_BYTES = 255;
+
+fs::path personalFolder(char const* variable, char const* belowHome) {
+    char const* const folder = std::getenv(variable);
+    if (folder && fs::path(folder).is_absolute())
+        return fs::path(folder) / "vlmail";
+    char const* const home = std::getenv("HOME");
+    return fs::path(home ? home : "/") / belowHome / "vlmail";
+}
+
+bool isHost(std::string const& text) {
+    return !text.empty() && text.size() <= MAX_HOST_BYTES &&
+           std::all_of(text.begin(), text.end(), [](unsigned char c) {
+               return std::isalnum(c) || c == '.' || c == '-' || c == '_' || c == ':' || c == '%';
+           });
+}
+
+std::optional<std::uint16_t> portIn(std::string const& text) {
+    unsigned number = 0;
+    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end != text.data() + text.size() || number == 0 || number > 65535)
+        return std::nullopt;
+    return static_cast<std::uint16_t>(number);
+}
+
+/// Keeps what discovery has found.
+class Finder : public Ipc::CmdProcessorI {
+public:
+    void submit(std::shared_ptr<Ipc::CmdI> cmd) override {
+        answer = dynamic_cast<Ipc::GuiFwd const&>(*cmd).params();
+    }
+
+    json::Object answer;
+};
+
+/// Puts the question to the person, when one is there.
+bool acceptsCertificate(std::string const& service, std::string const& fingerprint,
+                        Terminal const& terminal) {
+    terminal.err << "The service " << service << " shows a certificate that is new here:\n  " << fingerprint
+                 << "\nCompare it with what the service printed when it started.\n";
+    if (!::isatty(STDIN_FILENO)) {
+        terminal.err << "To accept it, add --accept-certificate " << fingerprint << '\n';
+        return false;
+    }
+    terminal.err << "Accept it from now on? (yes/no) " << std::flush;
+    std::string reply;
+    return std::getline(std::cin, reply) && reply == "yes";
+}
+
+std::string textIn(json::Object const& settings, char const* key) {
+    return settings.get("parts")
+        .toObject()
+        .get("app")
+        .toObject()
+        .get("values")
+        .toObject()
+        .get(key)
+        .textOrEmpty();
+}
+
+} // namespace
+
+std::string ServiceAddress::text() const {
+    bool const isIp6 = host.find(':') != std::string::npos;
+    return (isIp6 ? '[' + host + ']' : host) + ':' + std::to_string(port);
+}
+
+ServiceAddress parseServiceAddress(std::string const& text) {
+    auto const colon = text.rfind(':');
+    std::string host = text.substr(0, colon);
+    std::optional<std::uint16_t> const port =
+        colon == std::string::npos ? std::nullopt : portIn(text.substr(colon + 1));
+    bool const inBrackets = host.size() > 2 && host.front() == '[' && host.back() == ']';
+    if (inBrackets)
+        host = host.substr(1, host.size() - 2);
+    bool const bareIp6 = !inBrackets && host.find(':') != std::string::npos;
+    if (!port || !isHost(host) || bareIp6)
+        throw Base::Error("\"" + text +
+                          "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
+    return {std::move(host), *port};
+}
+
+ServiceAddress addressInAnswer(json::Object const& answer) {
+    std::string host = answer.get(Ipc::DiscoveryBase::SVC_HOST_FLD_NAME).textOrEmpty();
+    long long const port = answer.get(Ipc::DiscoveryBase::SVC_PORT_FLD_NAME).intOrZero();
+    if (!isHost(host) || port < 1 || port > 65535)
+        throw Base::Error(
+            "something on the network answered as a service and named no address; name one with "
+            "--service HOST:PORT");
+    return {std::move(host), static_cast<std::uint16_t>(port)};
+}
+
+std::optional<json::Object> askNetwork() {
+    boost::asio::io_context io(1);
+    auto const finder = std::make_shared<Finder>();
+    Ipc::DiscoveryCli const search(finder, io);
+    io.run();
+    return finder->answer.empty() ? std::nullopt : std::optional(finder->answer);
+}
+
+ServiceAddress findService(ServiceOptions const& options) {
+    if (!options.service.empty())
+        return parseServiceAddress(options.service);
+    std::optional<json::Object> const answer = askNetwork();
+    if (!answer)
+        throw Base::Error(
+            "no service answered on the network; name one with --service HOST:PORT, or see what "
+            "\"vlmail discover --doctor\" says");
+    return addressInAnswer(*answer);
+}
+
+std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
+                                                  ServiceOptions const& options, Terminal const& terminal) {
+    Channel::ClientSettings settings;
+    settings.host = address.host;
+    settings.port = address.port;
+    settings.token = Channel::readToken(options.tokenFile.empty() ? (configFolder() / "token").string()
+                                                                  : options.tokenFile);
+    settings.pinFile = options.pinFile.empty() ? (configFolder() / "services").string() : options.pinFile;
+    settings.acceptNew = [&options, &terminal](std::string const& service, std::string const& fingerprint) {
+        return options.certificate.empty() ? acceptsCertificate(service, fingerprint, terminal)
+                                           : options.certificate == fingerprint;
+    };
+    return std::make_unique<Channel::Client>(std::move(settings));
+}
+
+std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, Terminal const& terminal) {
+    return connectToService(findService(options), options, terminal);
+}
+
+json::Object const& requireAnswer(json::Object const& answer) {
+    requireNoError(answer.get("err").textOrEmpty());
+    return answer;
+}
+
+void requireNoError(std::string const& error) {
+    if (!error.empty())
+        throw Base::Error(error);
+}
+
+json::Object ask(Channel::Client& service, json::Object const& query) {
+    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query)->resp());
+}
+
+fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
+    json::Array parts;
+    parts.append("app");
+    json::Object const settings = ask(service, {{"query", "settings"}, {"id", nodeId}, {"parts", parts}});
+    fs::path const folder = textIn(settings, "db_host");
+    std::string const name = textIn(settings, "db_name");
+    return (folder.is_absolute() ? folder : dataFolder()) / (name.empty() ? DEFAULT_PACK_DATABASE : name);
+}
+
+void sendPack(Channel::Client& service, fs::path const& database, std::string const& packId, bool upload) {
+    fs::path const file = fs::absolute(database);
+    std::string const folder = file.parent_path().string();
+    std::string const name = file.filename().string();
+    service.call<Ipc::ProcessPack>(folder, name, packId);
+    if (upload)
+        service.call<Ipc::UploadQueued>(folder, name);
+}
+
+json::Object awaitJob(Channel::Client& service, std::string const& packId, std::chrono::milliseconds time) {
+    json::Array ids;
+    ids.append(packId);
+    auto const end = std::chrono::steady_clock::now() + time;
+    for (;;) {
+        json::Value const job = ask(service, {{"query", "jobs"}, {"ids", ids}}).get("jobs").toArray().at(0);
+        if (!job)
+            throw Base::Error("the service has no job of pack " + packId + "; send it again");
+        bool const waits =
+            job.toObject().get("state").textOrEmpty() == "accepted" && !job.toObject().get("problem");
+        if (!waits || std::chrono::steady_clock::now() >= end)
+            return job.toObject();
+        std::this_thread::sleep_for(POLL_TIME);
+    }
+}
+
+fs::path configFolder() { return personalFolder("XDG_CONFIG_HOME", ".config"); }
+
+fs::path dataFolder() { return personalFolder("XDG_DATA_HOME", ".local/share"); }
+
+} // namespace VlMail

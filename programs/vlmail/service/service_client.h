@@ -1,0 +1,73 @@
+#pragma once
+// How the subcommands reach the service: by a name or by discovery, with the access token.
+
+#include "programs/channel/client.h"
+#include "programs/vlmail/terminal/terminal.h"
+#include "vlservice/json/json.h"
+
+#include <cstdint>
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace VlMail {
+
+/// The options of every subcommand that talks to the service.
+struct ServiceOptions {
+    /// HOST:PORT; empty to look for a service on the network.
+    std::string service;
+    /// Empty for "token" in configFolder().
+    std::string tokenFile;
+    /// Empty for "services" in configFolder().
+    std::string pinFile;
+    /// The fingerprint of a certificate to accept without a question.
+    std::string certificate;
+};
+
+struct ServiceAddress {
+    std::string host;
+    std::uint16_t port = 0;
+
+    /// HOST:PORT, with brackets around an IPv6 address.
+    std::string text() const;
+};
+
+/// Reads HOST:PORT; an IPv6 address stands in brackets. Throws Error.
+ServiceAddress parseServiceAddress(std::string const& text);
+/// The address in a service's answer. Throws Error when there is none in it that could be one.
+ServiceAddress addressInAnswer(json::Object const& answer);
+/// The first answer on the network; nothing when none comes within two seconds.
+std::optional<json::Object> askNetwork();
+
+/// Finds the service that the options mean. Throws Error when there is none.
+ServiceAddress findService(ServiceOptions const& options);
+/// Connects to it. A certificate that is new is shown to the person, who decides.
+/// Throws std::exception with one line for a person.
+std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, Terminal const& terminal);
+std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
+                                                  ServiceOptions const& options, Terminal const& terminal);
+
+/// The answer itself, unless it is an error of the service. Throws Error with the service's line.
+json::Object const& requireAnswer(json::Object const& answer);
+/// Throws Error when the text is not empty.
+void requireNoError(std::string const& error);
+/// Asks one of the questions of CSConfigIdsList, whose parameters are described in docs/service.md.
+json::Object ask(Channel::Client& service, json::Object const& query);
+
+/// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
+/// otherwise "packs.db" in dataFolder().
+std::filesystem::path packDatabaseOf(Channel::Client& service, std::string const& nodeId);
+/// Has a finished pack processed and, with `upload`, handed on. Returns when the pack is on record; it has to
+/// stay in the database until its job is beyond "accepted". Sending a pack again changes nothing.
+void sendPack(Channel::Client& service, std::filesystem::path const& database, std::string const& packId,
+              bool upload);
+/// What the service knows of a pack's job, as soon as the job has left "accepted" or has a problem, or when
+/// the time is up. Throws Error when there is no such job.
+json::Object awaitJob(Channel::Client& service, std::string const& packId, std::chrono::milliseconds time);
+
+/// The person's folders for this program, by the usual variables or below the home folder.
+std::filesystem::path configFolder();
+std::filesystem::path dataFolder();
+
+} // namespace VlMail

@@ -1,0 +1,42 @@
+#include "programs/base/safe_name.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+struct Case {
+    char const* what;
+    std::string name;
+    std::string safe;
+};
+
+TEST(SafeFileName, KeepsAFileInsideItsFolder) {
+    Case const cases[] = {
+        {"an ordinary name", "Rechnung_Müller & Söhne.pdf", "Rechnung_Müller & Söhne.pdf"},
+        {"Greek", "Επιστολή 4.pdf", "Επιστολή 4.pdf"},
+        {"nothing", "", "_"},
+        {"the folder itself", ".", "_"},
+        {"the folder above", "..", "_."},
+        {"a way up", "../../etc/passwd", "_._.._etc_passwd"},
+        {"an absolute path", "/etc/passwd", "_etc_passwd"},
+        {"a path of another system", "C:\\temp\\x", "C__temp_x"},
+        {"a hidden file", ".bashrc", "_bashrc"},
+        {"a leading blank", " x", "_x"},
+        {"a line break", "a\nb\rc", "a_b_c"},
+        {"an embedded zero", std::string("a\0b", 3), "a_b"},
+        {"a control character beyond ASCII", "a\xC2\x85z", "a_z"},
+        {"broken UTF-8", "a\xFFz\xC3", "a_z_"},
+    };
+    for (Case const& c : cases)
+        EXPECT_EQ(Base::safeFileName(c.name), c.safe) << c.what;
+}
+
+TEST(SafeFileName, CutsLongNamesBetweenCharacters) {
+    std::string name;
+    for (int i = 0; i < 150; ++i)
+        name += "ü";
+    EXPECT_EQ(Base::safeFileName(name), name.substr(0, 200));
+    EXPECT_EQ(Base::safeFileName("a" + name), "a" + name.substr(0, 198));
+}
+
+} // namespace

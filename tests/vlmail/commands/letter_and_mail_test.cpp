@@ -1,0 +1,306 @@
+// The road of letters as a person walks it: documents and settings in a folder, the program, what it says.
+#include "programs/mailing/metadata.h"
+#include "programs/vlmail/commands/command.h"
+#include "vlservice/json/json_text.h"
+#include "vlservice/pack/pack_wrapper.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <sched.h>
+#include <sstream>
+#include <sys/mount.h>
+#include <vector>
+
+namespace {
+
+namespace fs = std::filesystem;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::MatchesRegex;
+using testing::StartsWith;
+
+constexpr char const* SETTINGS = R"({
+    "extract_presets": [
+        {"match": "invoice.*", "pack_preset": "Invoices", "zones": [
+            {"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
+                {"name": "number", "value_extract": "^No (?<VAL>\\d+)$", "value_type": 1, "obligatory": true},
+                {"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 1, "send_to_server": true}]}]},
+        {"match": "terms.*", "pack_preset": "Invoices", "type": 1},
+        {"match": "broken.*", "pack_preset": "Invoices", "zones": [
+            {"name": "Page", "fields": [{"name": "total", "value_extract": "(", "priority": 0}]}]},
+        {"match": "homeless.*", "pack_preset": "Nowhere"}],
+    "pack_presets": [{"name": "Invoices", "duplex": true}]})";
+
+class VlMailTest : public testing::Test {
+protected:
+    VlMailTest() {
+        std::string name = (fs::temp_directory_path() / "vlmail.XXXXXX").string();
+        folder_ = ::mkdtemp(name.data());
+        write("node.json", SETTINGS);
+    }
+    ~VlMailTest() override { fs::remove_all(folder_); }
+
+    std::string path(std::string const& name) const { return (folder_ / name).string(); }
+    void write(std::string const& name, std::string const& text) {
+        fs::create_directories((folder_ / name).parent_path());
+        std::ofstream(folder_ / name, std::ios::binary) << text;
+    }
+
+    /// Runs the program; what it printed is in out_ and err_.
+    int vlmail(std::vector<std::string> arguments) {
+        arguments.insert(arguments.begin(), "vlmail");
+        std::vector<char const*> argv;
+        for (std::string const& argument : arguments)
+            argv.push_back(argument.c_str());
+        std::ostringstream out;
+        std::ostringstream err;
+        int const status =
+            VlMail::run(static_cast<int>(argv.size()), argv.data(), VlMail::Terminal{out, err});
+        out_ = out.str();
+        err_ = err.str();
+        return status;
+    }
+    int vlmail(std::string const& command, std::vector<std::string> const& documents,
+               std::vector<std::string> more = {}) {
+        std::vector<std::string> arguments{command, "--settings", path("node.json")};
+        arguments.insert(arguments.end(), more.begin(), more.end());
+        for (std::string const& document : documents)
+            arguments.push_back(path(document));
+        return vlmail(arguments);
+    }
+
+    std::vector<fs::path> mailings() const {
+        std::vector<fs::path> files;
+        for (auto const& entry : fs::directory_iterator(folder_ / "out"))
+            files.push_back(entry.path());
+        return files;
+    }
+    Mailing::Metadata metadataOf(fs::path const& file) {
+        PackWrapper container(file.string(), PackWrapper::PURPOSE_IMPORT, {});
+        return Mailing::Metadata::fromBlob(container.inputFullMeta());
+    }
+
+    fs::path folder_;
+    std::string out_;
+    std::string err_;
+};
+
+TEST_F(VlMailTest, ShowsPresetsFieldsAndWhetherALetterCanGoOut) {
+    write("invoice 1.txt", "No 17\nTo: Ada\n");
+    EXPECT_EQ(vlmail("letter", {"invoice 1.txt"}), VlMail::FINE);
+    EXPECT_EQ(out_, "invoice 1.txt\n"
+                    "  read by the preset for  invoice.*\n"
+                    "  sent by the pack preset Invoices\n"
+                    "  letter 1 of 1, page 1: ready\n"
+                    "    field   value  state  address\n"
+                    "    postal  Ada    ok     recipient, this one counts\n"
+                    "    number  17     ok\n"
+                    "\n");
+    EXPECT_EQ(err_, "");
+}
+
+TEST_F(VlMailTest, GivesOneJsonObjectADocument) {
+    write("invoice 1.txt", "No 17\nTo: Ada\n");
+    write("terms.txt", "Terms\n");
+    EXPECT_EQ(vlmail("letter", {"invoice 1.txt", "terms.txt"}, {"--json"}), VlMail::FINE);
+    EXPECT_EQ(
+        out_,
+        R"({"document":"invoice 1.txt","extract_preset":"invoice.*","pack_preset":"Invoices","letters":[)"
+        R"({"pages":[1],"fields":[{"name":"postal","value":"Ada","priority":1,"send_to_server":true},)"
+        R"({"name":"number","value":17}],"production_ready":true,"message":"",)"
+        R"("primary_address":"postal"}]})"
+        "\n"
+        R"({"document":"terms.txt","extract_preset":"terms.*","pack_preset":"Invoices","letters":null})"
+        "\n");
+}
+
+TEST_F(VlMailTest, SaysWhyALetterCannotGoOut) {
+    write("invoice 1.txt", "To: nobody in particular\n");
+    write("invoice 2.txt", "No 17\n");
+    write("invoice 3.txt", "No 99999999999999999999999\nTo: Ada\n");
+    EXPECT_EQ(vlmail("letter", {"invoice 1.txt"}), VlMail::FINE);
+    EXPECT_THAT(out_, HasSubstr("    missing, although obligatory: number\n"));
+    EXPECT_EQ(vlmail("letter", {"invoice 2.txt"}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr("letter 1 of 1, page 1: cannot go out: no address to go to\n"));
+    EXPECT_EQ(vlmail("letter", {"invoice 3.txt"}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr("cannot go out: Field name: \"number\"\n"));
+    EXPECT_THAT(out_, HasSubstr("number  99999999999999999999999  INVALID\n"));
+}
+
+TEST_F(VlMailTest, AppliesTheGlobalDefaultsWithoutSettings) {
+    write("some letter.txt", "Ada Lovelace\n12 St James's Square\nLondon\n");
+    EXPECT_EQ(vlmail({"letter", path("some letter.txt")}), VlMail::FINE);
+    EXPECT_THAT(out_, HasSubstr("sent by the pack preset GLOBAL"));
+    EXPECT_THAT(out_, HasSubstr("postal  Ada Lovelace / 12 St James's Square / London"));
+}
+
+TEST_F(VlMailTest, SaysInOneLineWhatCannotBeReadAndGoesOnWithTheRest) {
+    write("invoice 1.txt", "To: Ada\n");
+    write("empty.txt", "");
+    write("noise.bin", std::string("\0\1\2\3\xFF\xFE\0\0", 8));
+    write("cut.pdf", "%PDF-1.5\nnothing more");
+    write("broken.txt", "x\n");
+    write("homeless.txt", "x\n");
+    EXPECT_EQ(vlmail("letter", {"missing.pdf", "empty.txt", "noise.bin", "cut.pdf", "broken.txt",
+                                "homeless.txt", "", "invoice 1.txt"}),
+              VlMail::FAILED);
+    EXPECT_THAT(out_, StartsWith("invoice 1.txt\n"));
+    EXPECT_THAT(out_, HasSubstr("8 documents, 1 letter: 1 ready, 0 cannot go out; 7 documents failed\n"));
+    std::vector<std::string> lines;
+    std::istringstream err(err_);
+    for (std::string line; std::getline(err, line);)
+        lines.push_back(line);
+    EXPECT_THAT(
+        lines,
+        ElementsAre(HasSubstr("missing.pdf: there is no such file"), HasSubstr("empty.txt"),
+                    HasSubstr("noise.bin"), HasSubstr("cut.pdf"),
+                    MatchesRegex("vlmail: the pattern \"\\(\" of field \"total\" in zone \"Page\" of the "
+                                 "preset for \"broken.\\*\" cannot be used: .*; correct it in \".*\""),
+                    HasSubstr("Failed to find pack preset for extraction preset for homeless.txt"),
+                    HasSubstr("folder")));
+}
+
+TEST_F(VlMailTest, RefusesACommandLineInOneLine) {
+    EXPECT_EQ(vlmail({"mail", "x.pdf"}), VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: --output or --send is required; --help explains\n");
+    EXPECT_EQ(vlmail({"mail", "-o", path("out")}), VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: FILE or --plan is required; --help explains\n");
+    EXPECT_EQ(vlmail({"letter", "--settings", path("gone.json"), "x.pdf"}), VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: " + path("gone.json") + ": there is no such file; check the name\n");
+}
+
+TEST_F(VlMailTest, WritesOneMailingAPackPreset) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2.txt", "No 2\nTo: Ada\n");
+    write("other.txt", "Charles Babbage\n1 Dorset Street\nLondon\n");
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt", "invoice 2.txt", "other.txt"}, {"-o", path("out")}),
+              VlMail::FINE)
+        << err_;
+    ASSERT_EQ(mailings().size(), 2u);
+    for (fs::path const& file : mailings()) {
+        Mailing::Metadata const metadata = metadataOf(file);
+        EXPECT_EQ(file.filename().string(), metadata.id + ".mailing");
+        PackWrapper container(file.string(), PackWrapper::PURPOSE_IMPORT, {});
+        EXPECT_EQ(container.packId(), metadata.id);
+        EXPECT_EQ(metadata.packPreset.duplex(), metadata.packPreset.name() == "Invoices");
+        for (Mailing::MailedLetter const& letter : metadata.letters) {
+            for (Mailing::DocumentPages const& document : letter.documents) {
+                SharedMemBuffer page;
+                container.requestPageData(document.document, "1", [&](SharedMemBuffer data) {
+                    page = PageLoaderI::unzipDbData(data);
+                });
+                ASSERT_GT(page.size(), 5u);
+                EXPECT_EQ(std::string(page.data(), page.data() + 5), "%PDF-");
+            }
+        }
+    }
+}
+
+TEST_F(VlMailTest, GroupsLettersThatAgree) {
+    write("a/invoice 1.txt", "No 1\nTo: Ada\n");
+    write("b/invoice 1.txt", "No 1\nTo: Ada\n");
+    EXPECT_EQ(vlmail("mail", {"a/invoice 1.txt", "b/invoice 1.txt"}, {"-o", path("out")}), VlMail::FINE);
+    ASSERT_EQ(mailings().size(), 1u);
+    Mailing::Metadata const metadata = metadataOf(mailings()[0]);
+    ASSERT_EQ(metadata.letters.size(), 1u);
+    ASSERT_EQ(metadata.letters[0].documents.size(), 2u);
+    EXPECT_EQ(metadata.letters[0].documents[0].document, "invoice 1.txt");
+    EXPECT_EQ(metadata.letters[0].documents[1].document, "invoice 1 (2).txt");
+}
+
+TEST_F(VlMailTest, LeavesOutWhatIsNotReadyAndLosesNothingElse) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2.txt", "No 2\n");
+    write("terms.txt", "Terms\n");
+    EXPECT_EQ(vlmail("mail", {"invoice 2.txt", "terms.txt", "invoice 1.txt"}, {"-o", path("out")}),
+              VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr("left out: invoice 2.txt, page 1: no address to go to\n"));
+    EXPECT_THAT(out_, HasSubstr("not a letter: terms.txt, an attachment\n"));
+    ASSERT_EQ(mailings().size(), 1u);
+    EXPECT_EQ(metadataOf(mailings()[0]).letters.size(), 1u);
+    EXPECT_EQ(vlmail("mail", {"invoice 2.txt", "invoice 1.txt"}, {"-o", path("out"), "--json"}),
+              VlMail::INCOMPLETE);
+    json::Object const outcome = json::strToObject(out_.data(), out_.size());
+    std::ostringstream leftOut;
+    leftOut << outcome.get("left_out").toArray();
+    EXPECT_EQ(leftOut.str(), R"([{"name":"invoice 2.txt","pages":[1],"reason":"no address to go to"}])");
+}
+
+TEST_F(VlMailTest, RefusesAFolderThatCannotBeMade) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("out", "a file where the folder should be");
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FAILED);
+    EXPECT_THAT(err_, MatchesRegex("vlmail: cannot make the folder \".*out\": .*; name another with -o\n"));
+}
+
+TEST_F(VlMailTest, LeavesNoHalfFileOnAFullDisk) {
+    fs::create_directory(path("out"));
+    if (::unshare(CLONE_NEWNS) != 0 || ::mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
+        ::mount("tmpfs", path("out").c_str(), "tmpfs", 0, "size=8k") != 0)
+        GTEST_SKIP() << "no right to mount a small disk: " << std::strerror(errno);
+    std::string pages;
+    for (int i = 0; i < 20; ++i)
+        pages += "No 1\nTo: Ada\n\f";
+    write("invoice 1.txt", pages);
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FAILED);
+    EXPECT_THAT(err_, HasSubstr("make room on the disk and mail again\n"));
+    EXPECT_TRUE(fs::is_empty(path("out")));
+    ::umount(path("out").c_str());
+}
+
+TEST_F(VlMailTest, GivesTheSameOutputOnAnyNumberOfProcesses) {
+    std::vector<std::string> documents;
+    for (int i = 0; i < 12; ++i) {
+        documents.push_back("invoice " + std::to_string(i) + ".txt");
+        write(documents.back(), "No " + std::to_string(i) + "\nTo: Ada\n");
+    }
+    vlmail("letter", documents, {"--json", "--jobs", "1"});
+    std::string const alone = out_;
+    vlmail("letter", documents, {"--json", "--jobs", "4"});
+    EXPECT_EQ(out_, alone);
+}
+
+TEST_F(VlMailTest, CarriesOutAPlan) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2.txt", "No 2\n");
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt", "invoice 2.txt"}, {"-o", path("plan.json")}),
+              VlMail::INCOMPLETE);
+    EXPECT_FALSE(fs::exists(path("out"))) << "a plan has no effect";
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::INCOMPLETE) << err_;
+    ASSERT_EQ(mailings().size(), 1u);
+    EXPECT_EQ(metadataOf(mailings()[0]).letters.size(), 1u);
+}
+
+TEST_F(VlMailTest, RefusesAPlanWhoseInputsHaveChangedAndSaysWhich) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2.txt", "No 2\nTo: Ada\n");
+    write("invoice 3.txt", "No 3\nTo: Ada\n");
+    vlmail("plan", {"invoice 1.txt", "invoice 2.txt", "invoice 3.txt"}, {"-o", path("plan.json")});
+    write("invoice 2.txt", "No 2\nTo: Bob\n");
+    fs::remove(path("invoice 3.txt"));
+    write("node.json", std::string(SETTINGS) + '\n');
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: cannot carry out the plan: \"" + path("node.json") + "\" has changed, \"" +
+                        path("invoice 2.txt") + "\" has changed, \"" + path("invoice 3.txt") +
+                        "\" cannot be read any more; make it again with vlmail plan\n");
+    EXPECT_FALSE(fs::exists(path("out")));
+}
+
+TEST_F(VlMailTest, RefusesAPlanThatWasEdited) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json")});
+    std::ifstream in(path("plan.json"));
+    std::string text{std::istreambuf_iterator<char>(in), {}};
+    text.replace(text.find("Ada"), 3, "Bob");
+    write("plan.json", text);
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: cannot use the plan \"" + path("plan.json") +
+                        "\": it was changed since it was made; make it again with vlmail plan\n");
+}
+
+} // namespace
