@@ -1,13 +1,10 @@
 #pragma once
 // What the subcommands of vlmail share: how they are registered.
 
+#include "programs/base/command_line.h"
 #include "programs/vlmail/terminal/terminal.h"
 
 #include <functional>
-
-namespace CLI {
-class App;
-}
 
 namespace VlMail {
 
@@ -16,16 +13,16 @@ using Task = std::function<int(Terminal const&)>;
 
 // Each adds its subcommand to `app` and, when the command line names it, leaves its task in `task`.
 // One source file a subcommand.
-void addDiscoverCommand(CLI::App& app, Task& task);
-void addLetterCommand(CLI::App& app, Task& task);
-void addMailCommand(CLI::App& app, Task& task);
-void addPackCommand(CLI::App& app, Task& task);
-void addPlanCommand(CLI::App& app, Task& task);
-void addPresetsCommand(CLI::App& app, Task& task);
-void addPriceCommand(CLI::App& app, Task& task);
-void addSettingsCommand(CLI::App& app, Task& task);
-void addStatusCommand(CLI::App& app, Task& task);
-void addUploadCommand(CLI::App& app, Task& task);
+void addDiscoverCommand(Base::Command const& app, Task& task);
+void addLetterCommand(Base::Command const& app, Task& task);
+void addMailCommand(Base::Command const& app, Task& task);
+void addPackCommand(Base::Command const& app, Task& task);
+void addPlanCommand(Base::Command const& app, Task& task);
+void addPresetsCommand(Base::Command const& app, Task& task);
+void addPriceCommand(Base::Command const& app, Task& task);
+void addSettingsCommand(Base::Command const& app, Task& task);
+void addStatusCommand(Base::Command const& app, Task& task);
+void addUploadCommand(Base::Command const& app, Task& task);
 
 /// Parses the command line, carries it out and gives the exit status. Throws nothing derived from
 /// std::exception.

@@ -7,8 +7,6 @@
 #include "vlservice/ipc/discovery_cli.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 
@@ -86,14 +84,14 @@ int examine(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addDiscoverCommand(CLI::App& app, Task& task) {
+void addDiscoverCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = app.add_subcommand("discover", "Looks for the service on the network");
-    command->add_flag("--doctor", options->doctor,
-                      "Show what goes out and comes back on each network interface");
-    command->add_flag("--json", options->json, "The result as one JSON object");
-    addServiceOptions(*command, options->service);
-    command->callback([=, &task] {
+    Base::Command const command = app.addCommand("discover", "Looks for the service on the network");
+    command.addFlag("--doctor", options->doctor,
+                    "Show what goes out and comes back on each network interface");
+    command.addFlag("--json", options->json, "The result as one JSON object");
+    addServiceOptions(command, options->service);
+    command.whenNamed([=, &task] {
         task = [=](Terminal const& terminal) {
             return options->doctor ? examine(*options, terminal) : discover(*options, terminal);
         };

@@ -10,8 +10,6 @@
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <memory>
 #include <optional>
@@ -119,19 +117,19 @@ int showLetters(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addLetterCommand(CLI::App& app, Task& task) {
+void addLetterCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const letter = app.add_subcommand(
+    Base::Command const letter = app.addCommand(
         "letter", "Shows the letters in documents: presets, fields, and whether they can go out");
-    letter->add_option("FILE", options->files, "PDF or text documents")->required();
-    letter->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
-    letter->add_flag("--json", options->json, "One JSON object a document, each on a line");
-    letter->add_flag("--explain", options->explain,
-                     "Tells how each field came about, and why one was not found; with --json as \"trace\"");
-    letter->add_option("--report", options->report,
-                       "Writes an HTML page with the pages' pictures and what was found where");
-    letter->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);
-    letter->callback(
+    letter.addOption("FILE", options->files, "PDF or text documents").required();
+    letter.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    letter.addFlag("--json", options->json, "One JSON object a document, each on a line");
+    letter.addFlag("--explain", options->explain,
+                   "Tells how each field came about, and why one was not found; with --json as \"trace\"");
+    letter.addOption("--report", options->report,
+                     "Writes an HTML page with the pages' pictures and what was found where");
+    letter.addCount("--jobs", options->jobs, "Processes to read with");
+    letter.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showLetters(*options, terminal); }; });
 }
 

@@ -13,8 +13,6 @@
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <filesystem>
 #include <memory>
 #include <ostream>
@@ -111,54 +109,54 @@ int makePlan(Options const& options, Terminal const& terminal) {
     return report(dispatch, options, terminal);
 }
 
-void addBatchOptions(CLI::App& command, Options& options) {
-    command.add_flag("--json", options.json, "The outcome as one JSON object");
-    command.add_option("--jobs", options.jobs, "Processes to read with")->check(CLI::PositiveNumber);
+void addBatchOptions(Base::Command const& command, Options& options) {
+    command.addFlag("--json", options.json, "The outcome as one JSON object");
+    command.addCount("--jobs", options.jobs, "Processes to read with");
 }
 
 } // namespace
 
-void addMailCommand(CLI::App& app, Task& task) {
+void addMailCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const mail =
-        app.add_subcommand("mail", "Packs the letters in documents, one mailing file a pack preset");
-    auto* const files = mail->add_option("FILE", options->files, "PDF or text documents");
-    auto* const settings =
-        mail->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
-    mail->add_option("--plan", options->plan, "Carries out what vlmail plan has decided")
-        ->excludes(files)
-        ->excludes(settings);
-    auto* const output = mail->add_option("-o,--output", options->output,
-                                          "The folder for the mailing files; made when missing");
-    auto* const send = mail->add_flag("--send", options->send, "Gives the mailings to the service instead")
-                           ->excludes(output);
-    mail->add_option("--node", options->node, "The node to send for, whose settings apply without --settings")
-        ->needs(send);
-    mail->add_flag("--upload", options->upload, "Has the service hand the mailings on at once")->needs(send);
-    addServiceOptions(*mail, options->service);
-    addBatchOptions(*mail, *options);
-    mail->callback([=, &task] {
+    Base::Command const mail =
+        app.addCommand("mail", "Packs the letters in documents, one mailing file a pack preset");
+    auto const files = mail.addOption("FILE", options->files, "PDF or text documents");
+    auto const settings =
+        mail.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    mail.addOption("--plan", options->plan, "Carries out what vlmail plan has decided")
+        .excludes(files)
+        .excludes(settings);
+    auto const output =
+        mail.addOption("-o,--output", options->output, "The folder for the mailing files; made when missing");
+    auto const send =
+        mail.addFlag("--send", options->send, "Gives the mailings to the service instead").excludes(output);
+    mail.addOption("--node", options->node, "The node to send for, whose settings apply without --settings")
+        .needs(send);
+    mail.addFlag("--upload", options->upload, "Has the service hand the mailings on at once").needs(send);
+    addServiceOptions(mail, options->service);
+    addBatchOptions(mail, *options);
+    mail.whenNamed([=, &task] {
         if (options->files.empty() && options->plan.empty())
-            throw CLI::RequiredError("FILE or --plan");
+            throw Base::UsageError("FILE or --plan is required");
         if (options->output.empty() && !options->send)
-            throw CLI::RequiredError("--output or --send");
+            throw Base::UsageError("--output or --send is required");
         task = [=](Terminal const& terminal) {
             return options->plan.empty() ? mailDocuments(*options, terminal) : mailPlan(*options, terminal);
         };
     });
 }
 
-void addPlanCommand(CLI::App& app, Task& task) {
+void addPlanCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const plan =
-        app.add_subcommand("plan", "Decides a batch without any effect, for vlmail mail --plan");
-    plan->add_option("FILE", options->files, "PDF or text documents")->required();
-    plan->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
-    plan->add_option("-o,--output", options->output, "The file for the plan")->required();
-    plan->add_flag("--price", options->price, "Asks the service what the mailings would cost");
-    addServiceOptions(*plan, options->service);
-    addBatchOptions(*plan, *options);
-    plan->callback(
+    Base::Command const plan =
+        app.addCommand("plan", "Decides a batch without any effect, for vlmail mail --plan");
+    plan.addOption("FILE", options->files, "PDF or text documents").required();
+    plan.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    plan.addOption("-o,--output", options->output, "The file for the plan").required();
+    plan.addFlag("--price", options->price, "Asks the service what the mailings would cost");
+    addServiceOptions(plan, options->service);
+    addBatchOptions(plan, *options);
+    plan.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return makePlan(*options, terminal); }; });
 }
 

@@ -5,9 +5,9 @@
 
 namespace VlMail {
 
-void addPackListCommand(CLI::App& pack, Task& task);
-void addPackVerifyCommand(CLI::App& pack, Task& task);
-void addPackExtractCommand(CLI::App& pack, Task& task);
-void addPackSalvageCommand(CLI::App& pack, Task& task);
+void addPackListCommand(Base::Command const& pack, Task& task);
+void addPackVerifyCommand(Base::Command const& pack, Task& task);
+void addPackExtractCommand(Base::Command const& pack, Task& task);
+void addPackSalvageCommand(Base::Command const& pack, Task& task);
 
 } // namespace VlMail

@@ -6,8 +6,6 @@
 #include "programs/vlmail/pack/container_file.h"
 #include "vlservice/pack/page_loader.h"
 
-#include <CLI/CLI.hpp>
-
 #include <filesystem>
 #include <fstream>
 #include <memory>
@@ -95,13 +93,13 @@ int extract(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPackExtractCommand(CLI::App& pack, Task& task) {
+void addPackExtractCommand(Base::Command const& pack, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = pack.add_subcommand(
+    Base::Command const command = pack.addCommand(
         "extract", "Writes the pages of a mailing file and its metadata into a folder, expanded");
-    command->add_option("FILE", options->file, "A mailing file")->required();
-    command->add_option("-o,--output", options->folder, "A new or empty folder")->required();
-    command->callback(
+    command.addOption("FILE", options->file, "A mailing file").required();
+    command.addOption("-o,--output", options->folder, "A new or empty folder").required();
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return extract(*options, terminal); }; });
 }
 

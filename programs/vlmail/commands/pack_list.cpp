@@ -6,8 +6,6 @@
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <cstdio>
 #include <memory>
 #include <ostream>
@@ -70,12 +68,12 @@ int list(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPackListCommand(CLI::App& pack, Task& task) {
+void addPackListCommand(Base::Command const& pack, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = pack.add_subcommand("list", "Shows the index of a mailing file");
-    command->add_option("FILE", options->file, "A mailing file")->required();
-    command->add_flag("--json", options->json, "One JSON object: id, and items in file order");
-    command->callback(
+    Base::Command const command = pack.addCommand("list", "Shows the index of a mailing file");
+    command.addOption("FILE", options->file, "A mailing file").required();
+    command.addFlag("--json", options->json, "One JSON object: id, and items in file order");
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return list(*options, terminal); }; });
 }
 

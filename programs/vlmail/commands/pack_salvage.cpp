@@ -9,8 +9,6 @@
 #include "programs/vlmail/pack/salvage_plan.h"
 #include "programs/vlmail/terminal/text_table.h"
 
-#include <CLI/CLI.hpp>
-
 #include <charconv>
 #include <ctime>
 #include <filesystem>
@@ -126,14 +124,14 @@ int salvage(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPackSalvageCommand(CLI::App& pack, Task& task) {
+void addPackSalvageCommand(Base::Command const& pack, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = pack.add_subcommand(
+    Base::Command const command = pack.addCommand(
         "salvage",
         "Saves what is whole in a damaged mailing file into a new one; exit status 2 when not all was");
-    command->add_option("FILE", options->file, "A damaged mailing file; it is only read")->required();
-    command->add_option("-o,--output", options->target, "The new mailing file")->required();
-    command->callback(
+    command.addOption("FILE", options->file, "A damaged mailing file; it is only read").required();
+    command.addOption("-o,--output", options->target, "The new mailing file").required();
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return salvage(*options, terminal); }; });
 }
 

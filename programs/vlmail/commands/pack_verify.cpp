@@ -5,8 +5,6 @@
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/pack/container_file.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 #include <set>
@@ -59,12 +57,12 @@ int verifyAll(std::vector<std::string> const& files, Terminal const& terminal) {
 
 } // namespace
 
-void addPackVerifyCommand(CLI::App& pack, Task& task) {
+void addPackVerifyCommand(Base::Command const& pack, Task& task) {
     auto const files = std::make_shared<std::vector<std::string>>();
-    CLI::App* const command =
-        pack.add_subcommand("verify", "Checks that every page of mailing files is whole and can be expanded");
-    command->add_option("FILE", *files, "Mailing files")->required();
-    command->callback(
+    Base::Command const command =
+        pack.addCommand("verify", "Checks that every page of mailing files is whole and can be expanded");
+    command.addOption("FILE", *files, "Mailing files").required();
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return verifyAll(*files, terminal); }; });
 }
 

@@ -5,8 +5,8 @@
 
 namespace VlMail {
 
-void addPresetsMatchCommand(CLI::App& presets, Task& task);
-void addPresetsLintCommand(CLI::App& presets, Task& task);
-void addPresetsTestCommand(CLI::App& presets, Task& task);
+void addPresetsMatchCommand(Base::Command const& presets, Task& task);
+void addPresetsLintCommand(Base::Command const& presets, Task& task);
+void addPresetsTestCommand(Base::Command const& presets, Task& task);
 
 } // namespace VlMail

@@ -8,8 +8,6 @@
 #include "programs/vlmail/presets/words.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <memory>
 #include <ostream>
@@ -71,14 +69,14 @@ int lintSettings(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPresetsLintCommand(CLI::App& presets, Task& task) {
+void addPresetsLintCommand(Base::Command const& presets, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = presets.add_subcommand(
+    Base::Command const command = presets.addCommand(
         "lint", "Looks settings over: what would go wrong, where, and what to do about it");
-    command->add_option("NODE.json", options->settings, "A JSON document with settings parts of a node")
-        ->required();
-    command->add_flag("--json", options->json, "One JSON object with all findings");
-    command->callback(
+    command.addOption("NODE.json", options->settings, "A JSON document with settings parts of a node")
+        .required();
+    command.addFlag("--json", options->json, "One JSON object with all findings");
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return lintSettings(*options, terminal); }; });
 }
 

@@ -9,8 +9,6 @@
 #include "programs/vlmail/presets/words.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <filesystem>
 #include <memory>
@@ -180,15 +178,15 @@ int match(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPresetsMatchCommand(CLI::App& presets, Task& task) {
+void addPresetsMatchCommand(Base::Command const& presets, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = presets.add_subcommand(
+    Base::Command const command = presets.addCommand(
         "match", "Tells which presets documents get by their names, and why not the others");
-    command->add_option("NAME", options->names, "Names of documents; folders in front of them are left out")
-        ->required();
-    command->add_option("--settings", options->settings, "A JSON document with settings parts of a node");
-    command->add_flag("--json", options->json, "One JSON object a name, each on a line");
-    command->callback(
+    command.addOption("NAME", options->names, "Names of documents; folders in front of them are left out")
+        .required();
+    command.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    command.addFlag("--json", options->json, "One JSON object a name, each on a line");
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return match(*options, terminal); }; });
 }
 

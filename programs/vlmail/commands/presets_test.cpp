@@ -7,8 +7,6 @@
 #include "programs/vlmail/letters/worker_pool.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <array>
 #include <filesystem>
@@ -108,20 +106,19 @@ int test(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPresetsTestCommand(CLI::App& presets, Task& task) {
+void addPresetsTestCommand(Base::Command const& presets, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command = presets.add_subcommand(
+    Base::Command const command = presets.addCommand(
         "test", "Tells whether the documents in a folder still give what is expected of them");
-    command->add_option("FOLDER", options->folder, "Documents, each with a file NAME.expected.json beside it")
-        ->required();
-    command->add_option(
+    command.addOption("FOLDER", options->folder, "Documents, each with a file NAME.expected.json beside it")
+        .required();
+    command.addOption(
         "--settings", options->settings,
         "A JSON document with settings parts of a node; node.json in the folder when none is named");
-    command->add_flag("--update", options->update,
-                      "Write what is found as what is expected, where it differs");
-    command->add_flag("--json", options->json, "One JSON object a case, each on a line");
-    command->add_option("--jobs", options->jobs, "Processes to read with")->check(CLI::PositiveNumber);
-    command->callback(
+    command.addFlag("--update", options->update, "Write what is found as what is expected, where it differs");
+    command.addFlag("--json", options->json, "One JSON object a case, each on a line");
+    command.addCount("--jobs", options->jobs, "Processes to read with");
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return test(*options, terminal); }; });
 }
 

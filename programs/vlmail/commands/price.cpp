@@ -9,8 +9,6 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/pack/pack_wrapper.h"
 
-#include <CLI/CLI.hpp>
-
 #include <charconv>
 #include <memory>
 #include <optional>
@@ -97,19 +95,19 @@ int showPrice(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addPriceCommand(CLI::App& app, Task& task) {
+void addPriceCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const price =
-        app.add_subcommand("price", "Estimates what letters cost, by the service's tariff");
-    price->add_option("WHAT", options->what, "Mailing files, or letters and pages of each: 20x3")->required();
-    price->add_flag("--colour", options->colour, "Printed in colour");
-    price->add_flag("--duplex", options->duplex,
-                    "Printed on both sides, also where the mailing does not say so");
-    price->add_flag("--priority", options->priority,
-                    "Delivered with priority, also where the mailing does not say so");
-    price->add_flag("--json", options->json, "The service's answer as one JSON object");
-    addServiceOptions(*price, options->service);
-    price->callback(
+    Base::Command const price =
+        app.addCommand("price", "Estimates what letters cost, by the service's tariff");
+    price.addOption("WHAT", options->what, "Mailing files, or letters and pages of each: 20x3").required();
+    price.addFlag("--colour", options->colour, "Printed in colour");
+    price.addFlag("--duplex", options->duplex,
+                  "Printed on both sides, also where the mailing does not say so");
+    price.addFlag("--priority", options->priority,
+                  "Delivered with priority, also where the mailing does not say so");
+    price.addFlag("--json", options->json, "The service's answer as one JSON object");
+    addServiceOptions(price, options->service);
+    price.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showPrice(*options, terminal); }; });
 }
 

@@ -1,39 +1,39 @@
 #include "programs/vlmail/commands/command.h"
 
-#include <CLI/CLI.hpp>
-
 #include <ostream>
 
 namespace VlMail {
+namespace {
+
+void addCommands(Base::Command const& command, Task& task) {
+    command.requireCommand();
+    addDiscoverCommand(command, task);
+    addLetterCommand(command, task);
+    addMailCommand(command, task);
+    addPackCommand(command, task);
+    addPlanCommand(command, task);
+    addPresetsCommand(command, task);
+    addPriceCommand(command, task);
+    addSettingsCommand(command, task);
+    addStatusCommand(command, task);
+    addUploadCommand(command, task);
+}
+
+} // namespace
 
 int run(int argc, char const* const* argv, Terminal const& terminal) {
-    CLI::App app("Sends letters out of documents: reads them, says what was found, and packs mailings.",
-                 "vlmail");
-    app.require_subcommand(1);
+    Base::CommandLine line(
+        "Sends letters out of documents: reads them, says what was found, and packs mailings.", "vlmail");
     Task task;
-    addDiscoverCommand(app, task);
-    addLetterCommand(app, task);
-    addMailCommand(app, task);
-    addPackCommand(app, task);
-    addPlanCommand(app, task);
-    addPresetsCommand(app, task);
-    addPriceCommand(app, task);
-    addSettingsCommand(app, task);
-    addStatusCommand(app, task);
-    addUploadCommand(app, task);
+    addCommands(line.command(), task);
     try {
-        app.parse(argc, argv);
-        return task(terminal);
-    } catch (CLI::ParseError const& wrong) {
-        // Asking for help is one of them.
-        if (wrong.get_exit_code() == 0)
-            return app.exit(wrong, terminal.out, terminal.err);
+        return line.read(argc, argv, terminal.out) ? task(terminal) : FINE;
+    } catch (Base::UsageError const& wrong) {
         terminal.complain(std::string(wrong.what()) + "; --help explains");
-        return FAILED;
     } catch (std::exception const& failure) {
         terminal.complain(failure.what());
-        return FAILED;
     }
+    return FAILED;
 }
 
 } // namespace VlMail

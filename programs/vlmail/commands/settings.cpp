@@ -5,8 +5,6 @@
 #include "vlservice/cfg/id.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <fstream>
 #include <iostream>
 #include <iterator>
@@ -67,14 +65,14 @@ json::Object readDocument(std::string const& file) {
     }
 }
 
-void addSettingsCommand(CLI::App& app, Task& task) {
-    CLI::App* const settings =
-        app.add_subcommand("settings", "Shows and changes the settings that the service keeps");
-    settings->require_subcommand(1);
-    addSettingsShowCommand(*settings, task);
-    addSettingsChangeCommands(*settings, task);
-    addSettingsTreeCommand(*settings, task);
-    addSettingsServiceCommands(*settings, task);
+void addSettingsCommand(Base::Command const& app, Task& task) {
+    Base::Command const settings =
+        app.addCommand("settings", "Shows and changes the settings that the service keeps");
+    settings.requireCommand();
+    addSettingsShowCommand(settings, task);
+    addSettingsChangeCommands(settings, task);
+    addSettingsTreeCommand(settings, task);
+    addSettingsServiceCommands(settings, task);
 }
 
 } // namespace VlMail

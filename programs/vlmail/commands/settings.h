@@ -11,12 +11,12 @@
 namespace VlMail {
 
 // Each adds its subcommand to `settings`. One source file a subcommand, but for those that are a few lines.
-void addSettingsShowCommand(CLI::App& settings, Task& task);
-void addSettingsTreeCommand(CLI::App& settings, Task& task);
+void addSettingsShowCommand(Base::Command const& settings, Task& task);
+void addSettingsTreeCommand(Base::Command const& settings, Task& task);
 /// set, reset and remove.
-void addSettingsChangeCommands(CLI::App& settings, Task& task);
+void addSettingsChangeCommands(Base::Command const& settings, Task& task);
 /// The settings of the service itself, and what it holds back.
-void addSettingsServiceCommands(CLI::App& settings, Task& task);
+void addSettingsServiceCommands(Base::Command const& settings, Task& task);
 
 /// The id of a node as a person writes it: "/" is the root, a path with types (u=bob/a=acme) is taken as it
 /// is, and a path of names (bob/sales/acme) is completed.

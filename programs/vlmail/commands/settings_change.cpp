@@ -7,8 +7,6 @@
 #include "vlservice/ipc/set_part_tmpl.h"
 #include "vlservice/ipc/update_cfg.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 #include <utility>
@@ -142,38 +140,39 @@ int remove(Options const& options, Terminal const& terminal) {
     return FINE;
 }
 
-CLI::App* addCommand(CLI::App& settings, Task& task, char const* name, char const* description,
-                     int (*run)(Options const&, Terminal const&), std::shared_ptr<Options> const& options) {
-    CLI::App* const command = settings.add_subcommand(name, description);
+Base::Command addCommand(Base::Command const& settings, Task& task, char const* name, char const* description,
+                         int (*run)(Options const&, Terminal const&),
+                         std::shared_ptr<Options> const& options) {
+    Base::Command const command = settings.addCommand(name, description);
     command
-        ->add_option("NODE", options->node,
-                     "A node like u=bob/ou=sales/a=acme, or bob/sales/acme; / is the root")
-        ->required();
-    addServiceOptions(*command, options->service);
-    command->callback(
+        .addOption("NODE", options->node,
+                   "A node like u=bob/ou=sales/a=acme, or bob/sales/acme; / is the root")
+        .required();
+    addServiceOptions(command, options->service);
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return run(*options, terminal); }; });
     return command;
 }
 
 } // namespace
 
-void addSettingsChangeCommands(CLI::App& settings, Task& task) {
+void addSettingsChangeCommands(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
     char const* const part = "app, inet, po, deps, profiles or presets";
-    CLI::App* const setting =
+    Base::Command const setting =
         addCommand(settings, task, "set", "Gives a node values of its own; the node is added when it is new",
                    &set, options);
-    setting->add_option("PART", options->part, part)->required();
+    setting.addOption("PART", options->part, part).required();
     setting
-        ->add_option(
+        .addOption(
             "WHAT", options->what,
             "KEY=VALUE for each value to change, or a JSON file (- is standard input) that replaces all "
             "values of the part that the node has")
-        ->required();
-    CLI::App* const resetting = addCommand(
+        .required();
+    Base::Command const resetting = addCommand(
         settings, task, "reset", "Lets a node inherit again what it has of its own", &reset, options);
-    resetting->add_option("PART", options->part, std::string(part) + " [all]");
-    resetting->add_option("KEY", options->what, "Settings of the part [all]");
+    resetting.addOption("PART", options->part, std::string(part) + " [all]");
+    resetting.addOption("KEY", options->what, "Settings of the part [all]");
     addCommand(settings, task, "remove", "Removes a node that has none below it", &remove, options);
 }
 

@@ -9,8 +9,6 @@
 #include "vlservice/ipc/set_svc_cfg.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 #include <utility>
@@ -98,22 +96,22 @@ int suspend(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addSettingsServiceCommands(CLI::App& settings, Task& task) {
+void addSettingsServiceCommands(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const service =
-        settings.add_subcommand("service", "Shows or changes the settings of the service itself");
-    service->add_option(
+    Base::Command const service =
+        settings.addCommand("service", "Shows or changes the settings of the service itself");
+    service.addOption(
         "KEY=VALUE", options->assignments,
         "upload_folder=PATH, tariff=FILE, disabled=[NODE...]; nothing behind the sign erases it");
-    service->add_flag("--json", options->json, "The settings as one JSON object");
-    addServiceOptions(*service, options->service);
-    service->callback(
+    service.addFlag("--json", options->json, "The settings as one JSON object");
+    addServiceOptions(service, options->service);
+    service.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return serviceSettings(*options, terminal); }; });
-    CLI::App* const suspending =
-        settings.add_subcommand("suspend", "Has the service hold back changes or jobs");
-    suspending->add_option("WHAT", options->suspended, "settings, jobs, all or nothing")->required();
-    addServiceOptions(*suspending, options->service);
-    suspending->callback(
+    Base::Command const suspending =
+        settings.addCommand("suspend", "Has the service hold back changes or jobs");
+    suspending.addOption("WHAT", options->suspended, "settings, jobs, all or nothing").required();
+    addServiceOptions(suspending, options->service);
+    suspending.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return suspend(*options, terminal); }; });
 }
 

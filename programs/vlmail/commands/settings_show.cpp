@@ -5,8 +5,6 @@
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 #include <utility>
@@ -103,18 +101,18 @@ int showSettings(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addSettingsShowCommand(CLI::App& settings, Task& task) {
+void addSettingsShowCommand(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const show = settings.add_subcommand("show", "Shows what counts at a node");
-    show->add_option("NODE", options->node,
-                     "A node like u=bob/ou=sales/a=acme, or bob/sales/acme; / is the root")
-        ->required();
-    show->add_option("PART", options->parts, "app, inet, po, deps, profiles, presets [all]");
-    show->add_flag("--origin", options->origin, "Show which node each value comes from");
-    show->add_flag("--json", options->json,
-                   "The service's answer, with all values and origins, as one JSON object");
-    addServiceOptions(*show, options->service);
-    show->callback(
+    Base::Command const show = settings.addCommand("show", "Shows what counts at a node");
+    show.addOption("NODE", options->node,
+                   "A node like u=bob/ou=sales/a=acme, or bob/sales/acme; / is the root")
+        .required();
+    show.addOption("PART", options->parts, "app, inet, po, deps, profiles, presets [all]");
+    show.addFlag("--origin", options->origin, "Show which node each value comes from");
+    show.addFlag("--json", options->json,
+                 "The service's answer, with all values and origins, as one JSON object");
+    addServiceOptions(show, options->service);
+    show.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showSettings(*options, terminal); }; });
 }
 

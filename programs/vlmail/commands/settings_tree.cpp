@@ -7,8 +7,6 @@
 #include "vlservice/ipc/cfg_ids_tree.h"
 #include "vlservice/json/json_text.h"
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <ostream>
 
@@ -65,18 +63,18 @@ int showIds(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addSettingsTreeCommand(CLI::App& settings, Task& task) {
+void addSettingsTreeCommand(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const tree = settings.add_subcommand("tree", "Shows all nodes");
-    CLI::App* const ids = settings.add_subcommand("ids", "Lists the nodes that a user may send for");
-    ids->add_option("USER", options->user, "The user's name [the nodes that are no user's]");
-    for (CLI::App* const command : {tree, ids}) {
-        command->add_flag("--json", options->json, "The service's answer as one JSON object");
-        addServiceOptions(*command, options->service);
+    Base::Command const tree = settings.addCommand("tree", "Shows all nodes");
+    Base::Command const ids = settings.addCommand("ids", "Lists the nodes that a user may send for");
+    ids.addOption("USER", options->user, "The user's name [the nodes that are no user's]");
+    for (Base::Command const command : {tree, ids}) {
+        command.addFlag("--json", options->json, "The service's answer as one JSON object");
+        addServiceOptions(command, options->service);
     }
-    tree->callback(
+    tree.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showTree(*options, terminal); }; });
-    ids->callback(
+    ids.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showIds(*options, terminal); }; });
 }
 

@@ -7,8 +7,6 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/local_time.h"
 
-#include <CLI/CLI.hpp>
-
 #include <filesystem>
 #include <memory>
 #include <ostream>
@@ -82,17 +80,17 @@ int showStatus(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addStatusCommand(CLI::App& app, Task& task) {
+void addStatusCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const status =
-        app.add_subcommand("status", "Shows how far the service has brought the mailings");
-    status->add_option("MAILING", options->packs, "Ids of mailings [all]");
-    status->add_option("--database", options->database, "Only mailings from this pack database")
-        ->type_name("FILE");
-    status->add_flag("--update", options->update, "Have the service look first at what the carrier has done");
-    status->add_flag("--json", options->json, "The service's answer as one JSON object");
-    addServiceOptions(*status, options->service);
-    status->callback(
+    Base::Command const status =
+        app.addCommand("status", "Shows how far the service has brought the mailings");
+    status.addOption("MAILING", options->packs, "Ids of mailings [all]");
+    status.addOption("--database", options->database, "Only mailings from this pack database")
+        .valueName("FILE");
+    status.addFlag("--update", options->update, "Have the service look first at what the carrier has done");
+    status.addFlag("--json", options->json, "The service's answer as one JSON object");
+    addServiceOptions(status, options->service);
+    status.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showStatus(*options, terminal); }; });
 }
 

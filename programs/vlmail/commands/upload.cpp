@@ -4,8 +4,6 @@
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/ipc/upload_queued.h"
 
-#include <CLI/CLI.hpp>
-
 #include <filesystem>
 #include <memory>
 #include <ostream>
@@ -28,14 +26,14 @@ int upload(Options const& options, Terminal const& terminal) {
 
 } // namespace
 
-void addUploadCommand(CLI::App& app, Task& task) {
+void addUploadCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
-    CLI::App* const command =
-        app.add_subcommand("upload", "Has the service hand finished mailings on to its upload folder");
-    command->add_option("--database", options->database, "Only mailings from this pack database")
-        ->type_name("FILE");
-    addServiceOptions(*command, options->service);
-    command->callback(
+    Base::Command const command =
+        app.addCommand("upload", "Has the service hand finished mailings on to its upload folder");
+    command.addOption("--database", options->database, "Only mailings from this pack database")
+        .valueName("FILE");
+    addServiceOptions(command, options->service);
+    command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return upload(*options, terminal); }; });
 }
 

@@ -9,7 +9,6 @@
 #include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/upload_queued.h"
 
-#include <CLI/CLI.hpp>
 #include <boost/asio/io_context.hpp>
 
 #include <algorithm>

@@ -1,0 +1,92 @@
+#pragma once
+// The command line of a program: options, subcommands and the help that explains them. One source stands on
+// the parsing library, which costs seconds to compile.
+
+#include "programs/base/error.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <iosfwd>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace CLI {
+class App;
+class Option;
+} // namespace CLI
+
+namespace Base {
+
+/// What is wrong with a command line, such as "--output or --send is required".
+class UsageError : public Error {
+public:
+    using Error::Error;
+};
+
+/// An option that was added to a command; a handle, valid as long as its CommandLine. Changes give the option
+/// again.
+class Option {
+public:
+    explicit Option(CLI::Option& option) : option_(&option) {}
+
+    Option const& required() const;
+    /// What the help calls its value, such as "FILE".
+    Option const& valueName(char const* name) const;
+    /// The help shows what the value is without the option.
+    Option const& showDefault() const;
+    Option const& needs(Option const& other) const;
+    Option const& excludes(Option const& other) const;
+
+private:
+    CLI::Option* option_;
+};
+
+/// A command or subcommand; a handle, valid as long as its CommandLine. What an option is read into has to
+/// outlive the reading. Names are like "-o,--output", or "FILE" for what is told by its place.
+class Command {
+public:
+    explicit Command(CLI::App& app) : app_(&app) {}
+
+    Command addCommand(std::string const& name, std::string const& description) const;
+    /// The command line has to name one of the subcommands.
+    void requireCommand() const;
+
+    Option addOption(std::string const& names, std::string& value, std::string const& help) const;
+    Option addOption(std::string const& names, std::filesystem::path& value, std::string const& help) const;
+    /// Takes one value or more.
+    Option addOption(std::string const& names, std::vector<std::string>& values,
+                     std::string const& help) const;
+    Option addOption(std::string const& names, std::uint16_t& value, std::string const& help) const;
+    /// Takes numbers above 0.
+    Option addCount(std::string const& names, std::size_t& value, std::string const& help) const;
+    /// Sets `value`.
+    Option addFlag(std::string const& names, bool& value, std::string const& help) const;
+    /// Clears `value`.
+    Option addOffFlag(std::string const& names, bool& value, std::string const& help) const;
+
+    /// What is called when the command line names this command and its options are read. It may throw
+    /// UsageError.
+    void whenNamed(std::function<void()> call) const;
+
+private:
+    CLI::App* app_;
+};
+
+class CommandLine {
+public:
+    CommandLine(std::string const& description, std::string const& program);
+    ~CommandLine();
+
+    Command command() const { return Command(*app_); }
+    /// Whether there is something to do: false when help was asked for, which stands in `out` then. Throws
+    /// UsageError.
+    bool read(int argc, char const* const* argv, std::ostream& out);
+
+private:
+    std::unique_ptr<CLI::App> app_;
+};
+
+} // namespace Base
