@@ -59,6 +59,21 @@ ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) 
     return zone;
 }
 
+ZoneText ZoneText::given(std::string const& text) {
+    ZoneText zone;
+    for (std::size_t begin = 0; begin <= text.size();) {
+        std::size_t const end = std::min(text.find('\n', begin), text.size());
+        std::string_view const line =
+            cutToLetters(std::string_view(text).substr(begin, end - begin), MAX_LINE_LENGTH);
+        if (!zone.lines_.empty())
+            zone.text_ += '\n';
+        zone.text_ += line;
+        zone.lines_.push_back({{}, line.size()});
+        begin = end + 1;
+    }
+    return zone;
+}
+
 void ZoneText::addBlock(Page const& page, Layout const& layout, Block const& block, Box const* location) {
     std::optional<Box> seen;
     for (std::size_t i = block.firstLine; i < block.endLine; ++i) {

@@ -30,6 +30,8 @@ public:
     static ZoneText inside(Page const& page, Layout const& layout, Box const& location);
     /// The block nearest to the point.
     static ZoneText nearest(Page const& page, Layout const& layout, Point point);
+    /// Text that stands on no page; its lines are cut as those of a page are.
+    static ZoneText given(std::string const& text);
 
     std::string const& text() const { return text_; }
     /// For a search that wants a reference it could write to; only cutLines() changes the text.

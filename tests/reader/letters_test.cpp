@@ -6,6 +6,8 @@
 
 #include <gmock/gmock.h>
 
+#include <vector>
+
 namespace Reader {
 namespace {
 
@@ -287,10 +289,73 @@ TEST(Traces, TellWhatWasSeenAndWhatCameOfIt) {
     EXPECT_EQ(zone.fields[3].value, nullptr);
 }
 
+TEST(Traces, SayWhichFieldOfANameCounts) {
+    Trace trace;
+    lettersOf("Tel 1\nPhone 2", presetWith(R"([
+        {"name": "phone", "value_extract": "^Fon (?<VAL>.*)$", "default_value": "none"},
+        {"name": "phone", "value_extract": "^Tel (?<VAL>.*)$"},
+        {"name": "phone", "value_extract": "^Phone (?<VAL>.*)$"},
+        {"name": "land", "value_extract": "^In (?<VAL>.*)$", "default_value": "UK"},
+        {"name": "land", "value_extract": "^To (?<VAL>.*)$", "default_value": "NZ"},
+        {"name": "fax", "value_extract": "^Fax (?<VAL>.*)$"}])"),
+              &trace);
+    PageTrace const& page = trace.pages.at(0);
+    std::vector<FieldTrace> const& fields = page.zones.at(0).fields;
+    std::vector<bool> counts;
+    for (FieldTrace const& field : fields)
+        counts.push_back(field.counts);
+    EXPECT_THAT(counts, ElementsAre(false, true, false, true, false, false));
+    EXPECT_EQ(page.counting("phone"), &fields[1]);
+    EXPECT_EQ(page.counting("land"), &fields[3]);
+    EXPECT_EQ(page.counting("fax"), nullptr);
+}
+
 TEST(Traces, OfOneLetterHoldItsFirstPageOnly) {
     Trace trace;
     lettersOf("a\fb\fc", presetWith("[]"), &trace);
     EXPECT_THAT(trace.pages, SizeIs(1));
+}
+
+/// What fields find in a text that is given for their zone.
+Letter letterOfGiven(std::string const& given, Cfg::ExtractPreset const& preset, PageTrace* trace = nullptr) {
+    return readGivenTexts("a", std::vector{GivenText{&preset.zones()[0], given}}, trace);
+}
+
+TEST(GivenTexts, AreSearchedAsThoseOfAPageAre) {
+    Cfg::ExtractPreset const preset = presetWith(R"([
+        {"name": "email", "value_extract": "(?<VAL>\\S+@\\S+)$"},
+        {"name": "ref", "value_extract": "^Ref: (?<VAL>.*)$", "obligatory": true},
+        {"name": "none", "value_extract": "(?<VAL>)^"},
+        {"name": "rest", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}])");
+    for (std::string const document :
+         {"write to a@b.example\nLena Brandt\nLeeds", "Lena Brandt\nwrite to a@b.example\nLeeds",
+          "Lena Brandt\nLeeds\nwrite to a@b.example"}) {
+        Letter const given = letterOfGiven(document, preset);
+        EXPECT_EQ(valuesOf(given), valuesOf(lettersOf(document, preset).at(0))) << document;
+        EXPECT_THAT(valuesOf(given), testing::Contains(Pair("rest", "\"Lena Brandt\nLeeds\"")));
+        EXPECT_THAT(given.missing, ElementsAre("ref"));
+        EXPECT_THAT(given.pages, IsEmpty());
+    }
+}
+
+TEST(GivenTexts, KeepTheirEmptyLinesUntilALineIsTaken) {
+    Cfg::ExtractPreset const preset = presetWith(R"([
+        {"name": "name", "value_extract": "^(?<VAL>Lena .*)$"},
+        {"name": "rest", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}])");
+    EXPECT_THAT(valuesOf(letterOfGiven("\n\nLena Brandt\n\nLeeds\n", preset)),
+                ElementsAre(Pair("name", "\"Lena Brandt\""), Pair("rest", "\"\n\n\nLeeds\n\"")));
+    EXPECT_THAT(valuesOf(letterOfGiven("", preset)), ElementsAre(Pair("rest", "\"\"")));
+}
+
+TEST(GivenTexts, HaveNoWidthAndTheirLinesAreCut) {
+    Cfg::ExtractPreset const preset =
+        presetWith(R"([{"name": "all", "width": 1, "value_extract": "^(?<VAL>.*)$"}])");
+    PageTrace trace;
+    letterOfGiven(std::string(1001, 'x'), preset, &trace);
+    FieldTrace const& all = trace.zones.at(0).fields.at(0);
+    EXPECT_EQ(all.rawText, std::string(MAX_LINE_LENGTH, 'x'));
+    EXPECT_FALSE(all.isTooWide);
+    EXPECT_TRUE(all.counts);
 }
 
 } // namespace

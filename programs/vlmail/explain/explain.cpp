@@ -79,42 +79,17 @@ std::string objection(FieldTrace const& trace) {
     return refusal ? refusal->says : std::string();
 }
 
-/// The values of one letter's first page, by the rule by which the letter takes one of each name.
-class TakenValues {
-public:
-    explicit TakenValues(PageTrace const& page) : page_(page) {}
-
-    bool isTaken(FieldTrace const& trace) const { return taken(trace) == &trace; }
-    /// The letter has a valid value of this name that was read on the page.
-    bool isFound(FieldTrace const& trace) const {
-        FieldTrace const* const one = taken(trace);
-        return one && one->rawText && one->value->isValid();
-    }
-
-private:
-    /// The first that was found, or else the first default.
-    FieldTrace const* taken(FieldTrace const& like) const {
-        FieldTrace const* firstDefault = nullptr;
-        for (ZoneTrace const& zone : page_.zones) {
-            for (FieldTrace const& trace : zone.fields) {
-                if (!trace.value || trace.definition->name() != like.definition->name())
-                    continue;
-                if (trace.rawText)
-                    return &trace;
-                firstDefault = firstDefault ? firstDefault : &trace;
-            }
-        }
-        return firstDefault;
-    }
-
-    PageTrace const& page_;
-};
+/// The letter has a valid value of this name that was read on the page.
+bool isFoundOn(PageTrace const& page, std::string const& name) {
+    FieldTrace const* const counting = page.counting(name);
+    return counting && counting->isFound() && counting->value->isValid();
+}
 
 class PageExplainer {
 public:
     PageExplainer(PageTrace const& trace, std::vector<int> otherPages, Cfg::ExtractPreset const& preset,
                   ReadPages& pages)
-        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages), taken_(trace) {}
+        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages) {}
 
     json::Object explain() const {
         json::Array zones;
@@ -174,11 +149,11 @@ private:
         object.set(IS_DEFAULT, !trace.rawText);
         object.set(VALUE, trace.value->rawValue());
         object.set(SHOWN, trace.value->valueToStr());
-        object.set(IS_PASSED_OVER, trace_.beginsLetter && !taken_.isTaken(trace));
+        object.set(IS_PASSED_OVER, trace_.beginsLetter && !trace.counts);
     }
 
     void addNearMisses(json::Object& object, ZoneTrace const& zone, FieldTrace const& trace) const {
-        if (!trace_.beginsLetter || taken_.isFound(trace))
+        if (!trace_.beginsLetter || isFoundOn(trace_, trace.definition->name()))
             return;
         json::Array misses;
         for (NearMiss const& miss : nearMissesOf({preset_, zone, trace, trace_.page, otherPages_}, pages_))
@@ -191,7 +166,6 @@ private:
     std::vector<int> otherPages_;
     Cfg::ExtractPreset const& preset_;
     ReadPages& pages_;
-    TakenValues taken_;
 };
 
 /// The pages behind the first of a letter, up to the next letter, and one that is skipped in front of it.

@@ -2,6 +2,7 @@
 // Why a field was not found, or found and refused: what would have to be different on the page or in the
 // settings. Every answer was tried: the field's pattern, on text as reading makes it.
 
+#include "programs/reader/field_search.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/explain/read_pages.h"
 

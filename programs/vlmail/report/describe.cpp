@@ -6,7 +6,6 @@
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
-#include <map>
 #include <string>
 
 namespace VlMail::Report {
@@ -20,40 +19,14 @@ using State = Field::State;
 /// Text can be read, and a page is some 100 KB.
 constexpr double DOTS_PER_INCH = 110;
 
-/// Tells which of several fields of a name counts: the first that was found, or else the first default.
-class Counting {
-public:
-    explicit Counting(std::vector<ZoneTrace> const& zones) {
-        for (ZoneTrace const& zone : zones) {
-            for (FieldTrace const& field : zone.fields)
-                consider(field);
-        }
-    }
-    bool counts(FieldTrace const& field) const {
-        auto const known = counting_.find(field.definition->name());
-        return known != counting_.end() && known->second == &field;
-    }
-
-private:
-    void consider(FieldTrace const& field) {
-        if (!field.value)
-            return;
-        FieldTrace const*& known = counting_[field.definition->name()];
-        if (!known || (field.rawText && !known->rawText))
-            known = &field;
-    }
-
-    std::map<std::string, FieldTrace const*> counting_;
-};
-
-State stateOf(FieldTrace const& field, bool counts) {
+State stateOf(FieldTrace const& field) {
     if (!field.value)
         return field.definition->mustHave() ? State::Missing : State::NotFound;
-    if (!counts)
+    if (!field.counts)
         return State::Unused;
     if (field.value->valueType() == Cfg::ExtractedField::ValueType::Invalid)
         return State::Invalid;
-    return field.rawText ? State::Found : State::Default;
+    return field.isFound() ? State::Found : State::Default;
 }
 
 void addNote(std::string& notes, std::string const& note) {
@@ -94,10 +67,9 @@ Field::Tag tagFor(Box const& match, std::string const& name, Reader::Page const&
     return Field::Tag::Above;
 }
 
-Field fieldOf(FieldTrace const& trace, Counting const& counting, Cfg::ExtractedField const* primary,
-              Reader::Page const& page) {
+Field fieldOf(FieldTrace const& trace, Cfg::ExtractedField const* primary, Reader::Page const& page) {
     Field field{trace.definition->name()};
-    field.state = stateOf(trace, counting.counts(trace));
+    field.state = stateOf(trace);
     field.note = noteOf(trace, field.state, primary);
     if (trace.value)
         field.value = trace.value->valueToStr();
@@ -120,13 +92,12 @@ Box boxOf(ZoneTrace const& zone) {
 
 std::vector<Zone> zonesOf(Reader::PageTrace const& trace, LetterReading const& letter,
                           Reader::Page const& page) {
-    Counting const counting(trace.zones);
     std::vector<Zone> zones;
     for (ZoneTrace const& seen : trace.zones) {
         Zone zone{seen.definition->name(), boxOf(seen), seen.definition->hasAddress(),
                   !seen.definition->hasLocation()};
         for (FieldTrace const& field : seen.fields)
-            zone.fields.push_back(fieldOf(field, counting, letter.fields.primaryAddressField(), page));
+            zone.fields.push_back(fieldOf(field, letter.fields.primaryAddressField(), page));
         zones.push_back(std::move(zone));
     }
     return zones;

@@ -1,0 +1,65 @@
+#pragma once
+// The fields of one letter, searched zone by zone.
+
+#include "programs/reader/trace.h"
+
+#include "vlservice/extract/extracted_fields.h"
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace Reader {
+
+/// What the search for one letter's fields has given.
+struct FieldsFound {
+    /// Validated.
+    Cfg::ExtractedFields fields;
+    /// The obligatory fields that were not found and have no default.
+    std::vector<std::string> missing;
+    /// A field that separates letters was found.
+    bool isMarked = false;
+};
+
+class FieldSearch {
+public:
+    /// `document` names it in messages. With a trace the search says there how it came about.
+    explicit FieldSearch(std::string document, PageTrace* trace = nullptr);
+
+    /// Searches the zone's fields, which take their lines out of the text one after the other. Throws Error
+    /// when a field's validation pattern fails; a failing extraction pattern is logged by the library and
+    /// finds nothing.
+    void search(Cfg::ExtractZone const& zone, ZoneText text);
+
+    FieldsFound finish();
+
+private:
+    /// What one field yields, and where the trace has it.
+    struct Yield {
+        std::shared_ptr<Cfg::ExtractedField> value;
+        bool isFound = false;
+        std::size_t zone = 0;
+        std::size_t field = 0;
+    };
+
+    void search(Cfg::ExtractField const& field, ZoneText& text);
+    void validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
+    void take(Yield yield);
+    void traceWhatCounts();
+
+    std::string document_;
+    PageTrace* trace_;
+    std::vector<Yield> yields_;
+    FieldsFound found_;
+};
+
+/// Whether finding the field begins a letter.
+bool separatesLetters(Cfg::ExtractField const& field);
+
+/// Takes one field out of a zone's text: not validated, or its default, or null. Fills a trace but for its
+/// value and whether it counts.
+std::shared_ptr<Cfg::ExtractedField> cutField(Cfg::ExtractField const& field, ZoneText& text,
+                                              FieldTrace* trace = nullptr);
+
+} // namespace Reader

@@ -1,0 +1,61 @@
+#pragma once
+// How letters came about: what was seen in each zone, and what became of each field. Definitions and zones
+// point into the preset.
+
+#include "programs/reader/zone_text.h"
+
+#include "vlservice/extract/extract_zone.h"
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace Reader {
+
+/// The search for one field in one zone.
+struct FieldTrace {
+    Cfg::ExtractField const* definition = nullptr;
+    /// Where the pattern matched, and how wide that is.
+    std::optional<Stretch> match;
+    /// The match is wider than the definition allows: it stays in the text and gives no value.
+    bool isTooWide = false;
+    /// The lines that the match took out of the zone's text.
+    std::string cut;
+    /// The text of the value before it was validated; nothing when the value is the default.
+    std::optional<std::string> rawText;
+    /// The value, a copy; null when the field yields nothing.
+    std::shared_ptr<Cfg::ExtractedField const> value;
+    /// The value is the one of its name that a letter takes: the first that was found, or else the first
+    /// default.
+    bool counts = false;
+
+    /// The value was read on the page and is not the default.
+    bool isFound() const { return rawText.has_value(); }
+};
+
+struct ZoneTrace {
+    Cfg::ExtractZone const* definition = nullptr;
+    /// What was seen before the first field was searched.
+    std::string text;
+    Box box;
+    std::vector<Box> blocks;
+    std::vector<FieldTrace> fields;
+};
+
+struct PageTrace {
+    int page = 0;
+    bool beginsLetter = false;
+    std::vector<ZoneTrace> zones;
+
+    /// The field of that name whose value counts; null when none of them has a value.
+    FieldTrace const* counting(std::string const& name) const;
+};
+
+/// The pages that were searched: the first of each letter, and every page where letters are told apart by a
+/// mark.
+struct Trace {
+    std::vector<PageTrace> pages;
+};
+
+} // namespace Reader
