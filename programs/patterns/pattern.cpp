@@ -1,90 +1,20 @@
 #include "programs/patterns/pattern.h"
 
-#include <boost/regex/icu.hpp>
+#include "programs/patterns/paying_iterator.h"
+#include "vlservice/extract/compile_pattern.h"
 
-#include <iterator>
+#include <algorithm>
 #include <utility>
 
 namespace Patterns {
 namespace {
 
-using CodePoints = std::vector<UChar32>;
-using Decoder = boost::u8_to_u32_iterator<char const*, UChar32>;
-
-/// The engine's parser looks a little ahead of the end of a malformed pattern.
-constexpr std::size_t PADDING = 16;
-
-CodePoints decode(std::string_view utf8) {
-    char const* const first = utf8.data();
-    char const* const last = first + utf8.size();
-    return {Decoder(first, first, last), Decoder(last, first, last)};
-}
-
-struct BudgetSpent {};
-
-/// What all iterators over one text share.
-struct Budget {
-    std::size_t left;
-
-    void look() {
-        if (left == 0)
-            throw BudgetSpent();
-        --left;
-    }
-};
-
-/// An iterator over code points that pays for every look. The matcher compares at each of its steps, so looks
-/// count steps, the same on every machine.
-class PayingIterator {
-public:
-    using iterator_category = std::bidirectional_iterator_tag;
-    using value_type = UChar32;
-    using difference_type = std::ptrdiff_t;
-    using pointer = UChar32 const*;
-    using reference = UChar32 const&;
-
-    PayingIterator() = default;
-    PayingIterator(UChar32 const* at, Budget& budget) : at_(at), budget_(&budget) {}
-
-    reference operator*() const {
-        budget_->look();
-        return *at_;
-    }
-    PayingIterator& operator++() {
-        ++at_;
-        return *this;
-    }
-    PayingIterator operator++(int) {
-        PayingIterator const before = *this;
-        ++at_;
-        return before;
-    }
-    PayingIterator& operator--() {
-        --at_;
-        return *this;
-    }
-    PayingIterator operator--(int) {
-        PayingIterator const before = *this;
-        --at_;
-        return before;
-    }
-    friend bool operator==(PayingIterator const& a, PayingIterator const& b) { return a.at_ == b.at_; }
-    friend bool operator!=(PayingIterator const& a, PayingIterator const& b) { return a.at_ != b.at_; }
-
-private:
-    UChar32 const* at_ = nullptr;
-    Budget* budget_ = nullptr;
-};
-
 using Groups = boost::match_results<PayingIterator>;
 
 boost::u32regex compile(std::string_view pattern, Pattern::Use use) {
-    CodePoints points = decode(pattern);
-    std::size_t const length = points.size();
-    points.resize(length + PADDING);
     boost::regex_constants::syntax_option_type const caseless =
         use == Pattern::Use::Name ? boost::regex_constants::icase : 0;
-    return {points.data(), points.data() + length, boost::regex_constants::perl | caseless};
+    return Cfg::compilePattern(pattern, boost::regex_constants::perl | caseless);
 }
 
 /// The engine's words go on with the pattern around the fault, which is said by its position instead.
@@ -101,7 +31,7 @@ std::string reasonOf(boost::regex_error const& error) {
 struct Pattern::Compiled {
     boost::u32regex regex;
 
-    Answer run(Use use, CodePoints const& text, Budget& budget, Groups& groups) const {
+    Answer run(Use use, Cfg::CodePoints const& text, Budget& budget, Groups& groups) const {
         PayingIterator const first(text.data(), budget);
         PayingIterator const last(text.data() + text.size(), budget);
         auto const flags = use == Use::Name ? boost::match_default : boost::match_not_dot_newline;
@@ -122,9 +52,9 @@ Pattern::Pattern(std::string_view pattern, Use use) : text_(pattern), use_(use) 
     try {
         compiled_.reset(new Compiled{compile(pattern, use)});
     } catch (boost::regex_error const& error) {
-        throw BrokenPattern(reasonOf(error), static_cast<std::size_t>(error.position()));
+        throw Broken(reasonOf(error), static_cast<std::size_t>(error.position()));
     } catch (std::out_of_range const& error) {
-        throw BrokenPattern(error.what(), 0);
+        throw Broken(error.what(), 0);
     }
 }
 
@@ -145,7 +75,7 @@ Pattern::Answer Pattern::fits(std::string_view text, std::size_t budget) const {
     try {
         Budget purse{budget};
         Groups groups;
-        return compiled_->run(use_, decode(text), purse, groups);
+        return compiled_->run(use_, Cfg::decode(text), purse, groups);
     } catch (std::out_of_range const&) {
         return Answer::No;
     }
@@ -154,7 +84,7 @@ Pattern::Answer Pattern::fits(std::string_view text, std::size_t budget) const {
 std::size_t Pattern::cost(std::string_view text, std::size_t budget) const {
     Budget purse{budget};
     Groups groups;
-    compiled_->run(use_, decode(text), purse, groups);
+    compiled_->run(use_, Cfg::decode(text), purse, groups);
     return budget - purse.left;
 }
 
@@ -162,7 +92,7 @@ bool Pattern::fitsWithGroup(std::string_view text, std::string const& group) con
     try {
         Budget purse{DEFAULT_BUDGET};
         Groups groups;
-        return compiled_->run(use_, decode(text), purse, groups) == Answer::Yes &&
+        return compiled_->run(use_, Cfg::decode(text), purse, groups) == Answer::Yes &&
                groups[group.c_str()].matched;
     } catch (std::out_of_range const&) {
         return false;

@@ -3,19 +3,19 @@
 // hard it works for that. The settings' own classes run the same engine with the same options, but answer
 // with yes or no.
 
+#include "programs/base/error.h"
+
 #include <cstddef>
 #include <memory>
-#include <stdexcept>
 #include <string>
 #include <string_view>
-#include <vector>
 
 namespace Patterns {
 
-/// In the engine's words; `position` counts characters from the pattern's start.
-class BrokenPattern : public std::runtime_error {
+/// A pattern that cannot be compiled, in the engine's words; `position` counts characters from its start.
+class Broken : public Base::Error {
 public:
-    BrokenPattern(std::string const& reason, std::size_t at) : std::runtime_error(reason), position(at) {}
+    Broken(std::string const& reason, std::size_t at) : Error(reason), position(at) {}
 
     std::size_t position;
 };
@@ -40,7 +40,7 @@ public:
     /// More than any text needs that a pattern takes in linear or quadratic time.
     static constexpr std::size_t DEFAULT_BUDGET = 2'000'000;
 
-    /// Throws BrokenPattern.
+    /// Throws Broken.
     Pattern(std::string_view pattern, Use use);
     Pattern(Pattern&&) noexcept;
     ~Pattern();

@@ -1,6 +1,8 @@
-#include "programs/patterns/outline.h"
+#include "programs/patterns/hard_lines.h"
 #include "programs/patterns/pattern.h"
+#include "programs/patterns/samples.h"
 #include "programs/vlmail/presets/why_not.h"
+#include "tests/support/time_limit.h"
 
 #include <gmock/gmock.h>
 
@@ -12,21 +14,6 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using Use = Patterns::Pattern::Use;
 using Answer = Patterns::Pattern::Answer;
-
-namespace {
-
-std::vector<std::string> textsOf(Patterns::PatternSequence const& pieces) {
-    std::vector<std::string> texts;
-    for (Patterns::PatternPiece const& piece : pieces)
-        texts.push_back(piece.text);
-    return texts;
-}
-
-std::vector<std::string> piecesOf(std::string const& pattern) {
-    return textsOf(Patterns::outlineOf(pattern).front());
-}
-
-} // namespace
 
 TEST(PatternUse, DecidesCaseLineBreaksAndExtent) {
     EXPECT_EQ(Patterns::Pattern("invoice.*", Use::Name).fits("INVOICE\n1"), Answer::Yes);
@@ -47,7 +34,7 @@ TEST(PatternUse, SaysWhereAPatternIsBroken) {
     try {
         Patterns::Pattern("invoice(.*", Use::Name);
         FAIL() << "no failure";
-    } catch (Patterns::BrokenPattern const& broken) {
+    } catch (Patterns::Broken const& broken) {
         EXPECT_STREQ(broken.what(), "Unmatched marking parenthesis ( or \\(");
         EXPECT_EQ(broken.position, 10u);
     }
@@ -71,48 +58,20 @@ TEST(PatternUse, EndsWithinItsBudget) {
     EXPECT_LT(Patterns::Pattern("a+b", Use::Validate).cost(run), 5000u);
 }
 
-TEST(PatternOutline, CutsAPatternIntoPieces) {
-    struct {
-        char const* pattern;
-        std::vector<std::string> pieces;
-    } const cases[] = {
-        {"", {}},
-        {"ab", {"a", "b"}},
-        {"a+?b*+c{2,3}?d{2}", {"a+?", "b*+", "c{2,3}?", "d{2}"}},
-        {"a{b", {"a", "{", "b"}},
-        {R"(\d+\.\x41\p{Lu}*)", {R"(\d+)", R"(\.)", R"(\x41)", R"(\p{Lu}*)"}},
-        {R"([]a]+[^]]x[[:alpha:]]?[\]]*)", {"[]a]+", "[^]]", "x", "[[:alpha:]]?", R"([\]]*)"}},
-        {R"((a|b(c))*(?:d)(?i)(?i:e)?(?<n>f)(?=g)(?<!h))",
-         {"(a|b(c))*", "(?:d)", "(?i)", "(?i:e)?", "(?<n>f)", "(?=g)", "(?<!h)"}},
-        {R"(\Qa.b\Ec)", {R"(\Qa.b\E)", "c"}},
-        {"^a$", {"^", "a", "$"}},
-        {"\xC3\xA4+", {"\xC3\xA4+"}},
-        {"(a", {"(a"}},
-        {"[a", {"[a"}},
-        {"a\\", {"a", "\\"}},
-    };
-    for (auto const& [pattern, pieces] : cases)
-        EXPECT_EQ(piecesOf(pattern), pieces) << pattern;
-}
-
-TEST(PatternOutline, KnowsAlternativesAndNamedGroups) {
-    auto const outline = Patterns::outlineOf("a|b(?<VAL>c|d)|");
-    ASSERT_EQ(outline.size(), 3u);
-    EXPECT_THAT(textsOf(outline[1]), ElementsAre("b", "(?<VAL>c|d)"));
-    ASSERT_TRUE(Patterns::findGroup(outline, "VAL"));
-    EXPECT_EQ(Patterns::findGroup(outline, "VAL")->alternatives.size(), 2u);
-    EXPECT_FALSE(Patterns::findGroup(outline, "val"));
-}
-
-TEST(PatternOutline, JoinsPlainCharacters) {
-    EXPECT_THAT(textsOf(Patterns::withJoinedLiterals(Patterns::outlineOf(R"(ab\.c+de)").front())),
-                ElementsAre(R"(ab\.)", "c+", "de"));
-}
-
-TEST(PatternOutline, SurvivesDeepAndMalformedNesting) {
-    EXPECT_EQ(Patterns::outlineOf(std::string(100'000, '(')).size(), 1u);
-    EXPECT_EQ(piecesOf("a)b").size(), 1u);
-    EXPECT_EQ(Patterns::outlineOf("a)b").size(), 2u);
+// Each is written wrongly, and the engine's parser would go on with it for ever.
+TEST(PatternUse, RefusesACommentBehindAPossessiveRepeat) {
+    TimeLimit const limit(20);
+    for (char const* text : {"a?+(?#why)b", "a*+(?#why)b", "a{2}+(?#why)b", "a++(?#why)b"}) {
+        for (Use const use : {Use::Name, Use::Extract, Use::Validate}) {
+            try {
+                Patterns::Pattern(text, use);
+                FAIL() << text;
+            } catch (Patterns::Broken const& broken) {
+                EXPECT_STREQ(broken.what(), "A comment stands behind a possessive repeat") << text;
+                EXPECT_EQ(broken.position, std::string(text).find('(')) << text;
+            }
+        }
+    }
 }
 
 TEST(PatternSamples, FitTheirPatternSimplestFirst) {

@@ -1,16 +1,12 @@
 #include "vlservice/extract/regex.h"
 
-#include <boost/regex/icu.hpp>
-#include <unicode/uchar.h>
+#include "vlservice/extract/compile_pattern.h"
+
 #include <unicode/uclean.h>
 
-#include <algorithm>
-#include <array>
 #include <cstddef>
 #include <cstdlib>
-#include <iterator>
 #include <utility>
-#include <vector>
 
 extern "C" {
 static void releaseUnicodeTables() { u_cleanup(); }
@@ -23,59 +19,6 @@ namespace {
 // Registered at load, so that it runs behind the destructors of everything that was built by the library's
 // users.
 [[maybe_unused]] int const CLEANUP_AT_EXIT = std::atexit(releaseUnicodeTables);
-
-using CodePoints = std::vector<UChar32>;
-using Decoder = boost::u8_to_u32_iterator<char const*, UChar32>;
-
-/// Zeroes behind the last code point that do not count as part of it.
-constexpr std::size_t NO_PADDING = 0;
-// The parser of patterns looks ahead of a malformed one's end without asking for it.
-constexpr std::size_t PATTERN_PADDING = 16;
-
-CodePoints decode(std::string_view utf8, std::size_t padding) {
-    char const* const first = utf8.data();
-    char const* const last = first + utf8.size();
-    CodePoints points;
-    points.reserve(utf8.size() + padding);
-    std::copy(Decoder(first, first, last), Decoder(last, first, last), std::back_inserter(points));
-    points.resize(points.size() + padding);
-    return points;
-}
-
-/// Whether the parser of patterns would run for ever: it does when a comment stands behind a possessive
-/// repeat, as in "a?+(?#why)b". Blanks between them count for nothing, since a pattern may switch them off.
-bool hangsTheParser(CodePoints const& pattern) {
-    constexpr std::array<UChar32, 3> COMMENT{'(', '?', '#'};
-    auto const first = pattern.begin();
-    auto const behindLastSolid = [first](auto at) {
-        while (at != first && u_isspace(at[-1]))
-            --at;
-        return at;
-    };
-    auto const endsIn = [first](auto at, std::string_view characters) {
-        return at != first && at[-1] < 0x80 && characters.find(static_cast<char>(at[-1])) != characters.npos;
-    };
-    auto const comment = [&](auto from) {
-        return std::search(from, pattern.end(), COMMENT.begin(), COMMENT.end());
-    };
-    for (auto at = comment(first); at != pattern.end(); at = comment(at + 1)) {
-        auto const plus = behindLastSolid(at);
-        if (endsIn(plus, "+") && endsIn(behindLastSolid(plus - 1), "*+?}"))
-            return true;
-    }
-    return false;
-}
-
-boost::u32regex compile(std::string_view pattern, boost::regex_constants::syntax_option_type options) {
-    CodePoints const points = decode(pattern, PATTERN_PADDING);
-    if (hangsTheParser(points))
-        throw boost::regex_error("A comment stands behind a possessive repeat.",
-                                 boost::regex_constants::error_badrepeat, 0);
-    // Pointers to const, which are parsed where they point; any other iterators are copied first, without
-    // padding.
-    UChar32 const* const first = points.data();
-    return boost::u32regex(first, first + points.size() - PATTERN_PADDING, options);
-}
 
 // The matchers run on decoding iterators as they are: the engine's own wrappers for UTF-8 copy all groups
 // once more.
@@ -112,7 +55,7 @@ struct FieldRegex::Compiled {
 };
 
 FieldRegex::FieldRegex(std::string_view pattern)
-    : compiled_(new Compiled{compile(pattern, boost::regex_constants::perl)}) {}
+    : compiled_(new Compiled{compilePattern(pattern, boost::regex_constants::perl)}) {}
 FieldRegex::~FieldRegex() = default;
 
 std::optional<FieldRegex::Found> FieldRegex::search(std::string_view text, std::string_view group) const {
@@ -141,11 +84,11 @@ struct NameRegex::Compiled {
 
 NameRegex::NameRegex(std::string_view pattern)
     : compiled_(
-          new Compiled{compile(pattern, boost::regex_constants::perl | boost::regex_constants::icase)}) {}
+          new Compiled{compilePattern(pattern, boost::regex_constants::perl | boost::regex_constants::icase)}) {}
 NameRegex::~NameRegex() = default;
 
 bool NameRegex::matches(std::string_view name) const {
-    CodePoints const points = decode(name, NO_PADDING);
+    CodePoints const points = decode(name);
     return boost::regex_match(points.data(), points.data() + points.size(), compiled_->regex);
 }
 

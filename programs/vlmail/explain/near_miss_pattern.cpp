@@ -1,5 +1,5 @@
 // Near misses in which the pattern, or the writing of the text, would have to be another.
-#include "programs/patterns/pattern_parts.h"
+#include "programs/patterns/parts.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
@@ -196,7 +196,7 @@ std::optional<Found> standingSomewhere(Search const& search) {
 
 /// Whether it says anything that the front of a pattern fits: a pattern that begins with ".*" fits
 /// everywhere.
-bool isTelling(Patterns::PatternCut const& cut) {
+bool isTelling(Patterns::Cut const& cut) {
     return !Patterns::literalsOf(cut.front).empty() || Patterns::literalsOf(cut.rest).empty();
 }
 
@@ -348,7 +348,7 @@ std::optional<Found> literal(Search const& search) {
 std::optional<Found> rest(Search const& search) {
     ZoneText const text = search.searchedText();
     std::string_view const all = text.text();
-    for (Patterns::PatternCut const& cut : Patterns::cutsOf(search.pattern())) {
+    for (Patterns::Cut const& cut : Patterns::cutsOf(search.pattern())) {
         if (!isTelling(cut))
             continue;
         auto const hit =

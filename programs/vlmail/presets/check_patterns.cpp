@@ -1,4 +1,5 @@
 // Patterns: whether they compile, how hard they work, and whether they can fit what is read.
+#include "programs/patterns/hard_lines.h"
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
@@ -121,7 +122,7 @@ void checkPattern(std::string const& text, Use use, Place const& place, Findings
             findings.add(RunawayPattern, place, {startOf(trial.line), consequenceOfGivingUp(use)});
         else if (trial.burden == Burden::Slow)
             findings.add(SlowPattern, place, {startOf(trial.line)});
-    } catch (Patterns::BrokenPattern const& broken) {
+    } catch (Patterns::Broken const& broken) {
         findings.add(PatternBroken, place,
                      {std::to_string(broken.position + 1), broken.what(), consequenceOfBreaking(use)});
     }
@@ -147,7 +148,7 @@ void checkValueGroups(PresetsDocument const& document, Findings& findings) {
             if (!text.empty() &&
                 !Patterns::Pattern(text, Use::Extract).hasGroup(Cfg::ExtractField::REGEX_VALUE_GROUP_MARK))
                 findings.add(ValueGroupMissing, field.place / "value_extract");
-        } catch (Patterns::BrokenPattern const&) {
+        } catch (Patterns::Broken const&) {
             // Told by checkPatterns.
         }
     });

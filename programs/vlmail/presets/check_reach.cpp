@@ -1,6 +1,7 @@
 // Which extraction preset a document gets to, and which ones none gets to.
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
+#include "programs/patterns/samples.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/words.h"
 
@@ -55,15 +56,15 @@ struct Reachable {
 std::optional<Patterns::Pattern> compiled(std::string const& text) {
     try {
         return Patterns::Pattern(text, Patterns::Pattern::Use::Name);
-    } catch (Patterns::BrokenPattern const&) {
+    } catch (Patterns::Broken const&) {
         return std::nullopt;
     }
 }
 
-bool isOneName(std::vector<Patterns::PatternSequence> const& outline) {
+bool isOneName(std::vector<Patterns::Sequence> const& outline) {
     return outline.size() == 1 &&
-           std::ranges::all_of(outline.front(), [](Patterns::PatternPiece const& piece) {
-               return piece.kind == Patterns::PatternPiece::Kind::Literal && piece.least == piece.most;
+           std::ranges::all_of(outline.front(), [](Patterns::Piece const& piece) {
+               return piece.kind == Patterns::Piece::Kind::Literal && piece.least == piece.most;
            });
 }
 

@@ -1,6 +1,7 @@
 // Limits and defaults: whether they are read, and what they let through.
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
+#include "programs/patterns/samples.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/words.h"
 #include "vlservice/json/json_text.h"
@@ -126,12 +127,12 @@ std::optional<std::string> dateWithoutYear(Cfg::ExtractField const& field) {
 /// Whether the group of the value fits that text; taken for granted where that cannot be told.
 bool mayExtract(Cfg::ExtractField const& field, char const* text) {
     auto const outline = Patterns::outlineOf(field.strRegex());
-    Patterns::PatternPiece const* const group =
+    Patterns::Piece const* const group =
         Patterns::findGroup(outline, Cfg::ExtractField::REGEX_VALUE_GROUP_MARK);
     try {
         return !group || Patterns::Pattern(group->body, Patterns::Pattern::Use::Validate).fits(text) ==
                              Patterns::Pattern::Answer::Yes;
-    } catch (Patterns::BrokenPattern const&) {
+    } catch (Patterns::Broken const&) {
         return true;
     }
 }
@@ -167,7 +168,7 @@ void checkDatesWithoutYear(PresetsDocument const& document, Findings& findings) 
         try {
             if (auto const date = dateWithoutYear(field))
                 findings.add(DateWithoutYear, listed.place, {inQuotes(*date)});
-        } catch (Patterns::BrokenPattern const&) {
+        } catch (Patterns::Broken const&) {
             // Told by checkPatterns.
         }
     });

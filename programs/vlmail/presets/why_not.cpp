@@ -24,7 +24,7 @@ std::optional<std::string> fittedBy(std::string const& beginning, std::string co
     try {
         return longestBeginning(Patterns::Pattern("(?:" + beginning + ")", Patterns::Pattern::Use::Name),
                                 name);
-    } catch (Patterns::BrokenPattern const&) {
+    } catch (Patterns::Broken const&) {
         return std::nullopt;
     }
 }
@@ -41,10 +41,10 @@ WhyNot failsAt(std::string const& part, std::string const& fitted) {
 }
 
 /// How far the pieces get, one after the other.
-WhyNot whyNot(Patterns::PatternSequence const& pieces, std::string const& name) {
+WhyNot whyNot(Patterns::Sequence const& pieces, std::string const& name) {
     std::string beginning;
     std::string fitted;
-    for (Patterns::PatternPiece const& piece : pieces) {
+    for (Patterns::Piece const& piece : pieces) {
         beginning += piece.text;
         auto const longer = fittedBy(beginning, name);
         if (!longer)
@@ -60,7 +60,7 @@ WhyNot whyNot(std::string const& expression, std::string const& name) {
     if (expression.empty())
         return {"an empty expression fits no name", {}, {}};
     std::optional<WhyNot> best;
-    for (Patterns::PatternSequence const& pieces : Patterns::outlineOf(expression)) {
+    for (Patterns::Sequence const& pieces : Patterns::outlineOf(expression)) {
         WhyNot why = whyNot(Patterns::withJoinedLiterals(pieces), name);
         if (!best || why.fitted.size() > best->fitted.size())
             best = std::move(why);

@@ -1,4 +1,4 @@
-#include "programs/patterns/pattern_parts.h"
+#include "programs/patterns/parts.h"
 #include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
 
@@ -86,7 +86,7 @@ TEST(PatternParts, FindsTheLiteralsThatATextMustHave) {
 
 TEST(PatternParts, CutsAPatternBetweenItsSteps) {
     std::vector<std::string> cuts;
-    for (Patterns::PatternCut const& cut : Patterns::cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
+    for (Patterns::Cut const& cut : Patterns::cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
         cuts.push_back(cut.front + "|" + cut.rest);
     EXPECT_THAT(cuts, ElementsAre(R"(^Ref:\h*(?<VAL>\d+)|$)", R"(^Ref:\h*|(?<VAL>\d+)$)",
                                   R"(^Ref:|\h*(?<VAL>\d+)$)", R"(^|Ref:\h*(?<VAL>\d+)$)"));

@@ -13,11 +13,11 @@ namespace Patterns {
 std::vector<std::string> literalsOf(std::string_view pattern);
 
 /// The pattern cut into two, at every place between its steps, the longest front first.
-struct PatternCut {
+struct Cut {
     std::string front;
     std::string rest;
 };
-std::vector<PatternCut> cutsOf(std::string_view pattern);
+std::vector<Cut> cutsOf(std::string_view pattern);
 
 /// A pattern without "^" at its front and "$" at its end, and these where it has them.
 struct Anchors {

@@ -1,4 +1,4 @@
-#include "programs/patterns/pattern_parts.h"
+#include "programs/patterns/parts.h"
 
 #include "programs/patterns/outline.h"
 
@@ -10,13 +10,13 @@
 namespace Patterns {
 namespace {
 
-using Kind = PatternPiece::Kind;
+using Kind = Piece::Kind;
 
 /// Joins literals that stand next to each other in every text, also across the brackets of groups.
 class LiteralCollector {
 public:
-    void add(PatternSequence const& pieces) {
-        for (PatternPiece const& piece : pieces)
+    void add(Sequence const& pieces) {
+        for (Piece const& piece : pieces)
             add(piece);
     }
 
@@ -26,7 +26,7 @@ public:
     }
 
 private:
-    void add(PatternPiece const& piece) {
+    void add(Piece const& piece) {
         bool const isOnce = piece.least == 1 && piece.most == 1;
         if (piece.least == 0)
             endRun();
@@ -60,7 +60,7 @@ std::array<std::string, 2> valueGroups() {
 } // namespace
 
 std::vector<std::string> literalsOf(std::string_view pattern) {
-    std::vector<PatternSequence> const alternatives = outlineOf(pattern);
+    std::vector<Sequence> const alternatives = outlineOf(pattern);
     LiteralCollector collector;
     if (alternatives.size() == 1)
         collector.add(alternatives.front());
@@ -70,13 +70,13 @@ std::vector<std::string> literalsOf(std::string_view pattern) {
     return literals;
 }
 
-std::vector<PatternCut> cutsOf(std::string_view pattern) {
-    std::vector<PatternSequence> const alternatives = outlineOf(pattern);
-    std::vector<PatternCut> cuts;
+std::vector<Cut> cutsOf(std::string_view pattern) {
+    std::vector<Sequence> const alternatives = outlineOf(pattern);
+    std::vector<Cut> cuts;
     if (alternatives.size() != 1)
         return cuts;
     std::size_t at = 0;
-    for (PatternPiece const& piece : withJoinedLiterals(alternatives.front())) {
+    for (Piece const& piece : withJoinedLiterals(alternatives.front())) {
         if (at > 0)
             cuts.push_back({std::string(pattern.substr(0, at)), std::string(pattern.substr(at))});
         at += piece.text.size();
@@ -86,7 +86,7 @@ std::vector<PatternCut> cutsOf(std::string_view pattern) {
 }
 
 Anchors anchorsOf(std::string_view pattern) {
-    std::vector<PatternSequence> const alternatives = outlineOf(pattern);
+    std::vector<Sequence> const alternatives = outlineOf(pattern);
     Anchors anchors{{}, std::string(pattern), {}};
     if (alternatives.size() != 1 || alternatives.front().empty())
         return anchors;
