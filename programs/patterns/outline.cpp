@@ -309,9 +309,8 @@ std::vector<Sequence> outlineOf(std::string_view pattern) { return OutlineParser
 
 bool hasRepetition(std::vector<Sequence> const& outline) {
     return std::ranges::any_of(outline, [](Sequence const& pieces) {
-        return std::ranges::any_of(pieces, [](Piece const& piece) {
-            return piece.most > 1 || hasRepetition(piece.alternatives);
-        });
+        return std::ranges::any_of(
+            pieces, [](Piece const& piece) { return piece.most > 1 || hasRepetition(piece.alternatives); });
     });
 }
 

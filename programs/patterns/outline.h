@@ -1,6 +1,6 @@
 #pragma once
-// The outline of a pattern in Perl syntax: its pieces in order. It is made for advice: the engine decides what
-// a pattern means, and everything that comes from here is tried on the engine first.
+// The outline of a pattern in Perl syntax: its pieces in order. It is made for advice: the engine decides
+// what a pattern means, and everything that comes from here is tried on the engine first.
 
 #include <cstddef>
 #include <string>

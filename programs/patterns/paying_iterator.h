@@ -1,6 +1,7 @@
 #pragma once
-// An iterator over code points that pays for every look out of a budget, so that the matcher ends soon whatever
-// the pattern. The matcher compares at each of its steps, so looks count steps, the same on every machine.
+// An iterator over code points that pays for every look out of a budget, so that the matcher ends soon
+// whatever the pattern. The matcher compares at each of its steps, so looks count steps, the same on every
+// machine.
 
 #include <unicode/umachine.h>
 

@@ -135,7 +135,7 @@ TEST(OutlineTree, HasWhatCanBeToldOfAMalformedPattern) {
         {"a\\", "cat{lit{a}other{\\}}"},
         {"a)b", "alt{lit{a}|lit{b}}"},
         {"*a", "cat{lit{*}lit{a}}"},
-        {"(?<n", "grp:{cat{}}"},
+        {"(?<n", "grp{cat{}}"},
         {"(?P<n>a)", "other{(?P<n>a)}"},
         {R"(\x{41)", R"(other{\x{41})"},
     });
@@ -170,6 +170,4 @@ TEST(Outline, JoinsPlainCharacters) {
                 ElementsAre(R"(ab\.)", "c+", "de"));
 }
 
-TEST(Outline, SurvivesDeepNesting) {
-    EXPECT_EQ(Patterns::outlineOf(std::string(100'000, '(')).size(), 1u);
-}
+TEST(Outline, SurvivesDeepNesting) { EXPECT_EQ(Patterns::outlineOf(std::string(100'000, '(')).size(), 1u); }

@@ -49,8 +49,7 @@ CodePoints decode(std::string_view utf8) {
     return points;
 }
 
-boost::u32regex compilePattern(std::string_view pattern,
-                               boost::regex_constants::syntax_option_type options) {
+boost::u32regex compilePattern(std::string_view pattern, boost::regex_constants::syntax_option_type options) {
     CodePoints points = decode(pattern);
     if (auto const place = placeThatHangs(points))
         throw boost::regex_error("A comment stands behind a possessive repeat.",

@@ -62,8 +62,7 @@ std::optional<Patterns::Pattern> compiled(std::string const& text) {
 }
 
 bool isOneName(std::vector<Patterns::Sequence> const& outline) {
-    return outline.size() == 1 &&
-           std::ranges::all_of(outline.front(), [](Patterns::Piece const& piece) {
+    return outline.size() == 1 && std::ranges::all_of(outline.front(), [](Patterns::Piece const& piece) {
                return piece.kind == Patterns::Piece::Kind::Literal && piece.least == piece.most;
            });
 }
