@@ -141,6 +141,21 @@ bool isNumber(FieldValueType type) {
     return type == FieldValueType::Integer || type == FieldValueType::Float;
 }
 
+/// A number with a decimal comma that the field takes, and what it reads.
+struct Misread {
+    std::string text;
+    json::Value number;
+};
+
+std::optional<Misread> misreadDecimalComma(Cfg::ExtractField const& field) {
+    for (char const* text : {"1.234,56", "1234,56", "1 234,56", "12,50", "1,5", "1'234,56", "12,50 EUR"}) {
+        auto const value = validated(field, text);
+        if (value && value->isValid() && mayExtract(field, text))
+            return Misread{text, value->rawValue()};
+    }
+    return std::nullopt;
+}
+
 } // namespace
 
 void checkLimits(PresetsDocument const& document, Findings& findings) {
@@ -184,6 +199,18 @@ void checkNumbersWithoutMinimum(PresetsDocument const& document, Findings& findi
                 return findings.add(NumberWithoutMinimum, listed.place,
                                     {inQuotes(text), shown(value->rawValue())});
         }
+    });
+}
+
+void checkDecimalCommas(PresetsDocument const& document, Findings& findings) {
+    forEachReadableField(document, [&](ListedField const& listed, Cfg::ExtractField const& field) {
+        // The pattern that holds where none is written takes commas for separators of thousands.
+        bool const hasOwnPattern = !listed.json.get("value_match").textOrEmpty().empty();
+        if (!isNumber(field.validation().valueType()) || !hasOwnPattern)
+            return;
+        if (auto const misread = misreadDecimalComma(field))
+            findings.add(DecimalComma, listed.place / "value_match",
+                         {inQuotes(misread->text), shown(misread->number)});
     });
 }
 

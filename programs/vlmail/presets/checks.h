@@ -45,6 +45,7 @@ void checkLimits(PresetsDocument const& document, Findings& findings);
 void checkDefaults(PresetsDocument const& document, Findings& findings);
 void checkDatesWithoutYear(PresetsDocument const& document, Findings& findings);
 void checkNumbersWithoutMinimum(PresetsDocument const& document, Findings& findings);
+void checkDecimalCommas(PresetsDocument const& document, Findings& findings);
 
 /// Calls `look` with each preset, zone and field.
 template<typename Look>

@@ -187,6 +187,10 @@ constexpr FindingWords WORDS[] = {
     {NumberWithoutMinimum, "number-without-minimum", Warning,
      "the text {0} passes as a number, the lowest there is: {1}",
      "set a \"value_min\", such as 0"},
+    {DecimalComma, "decimal-comma", Warning,
+     "a number with a decimal comma, such as {0}, passes and is read as {1}: commas are skipped, and reading ends at what "
+     "is no number",
+     "let \"value_match\" take a comma only in front of three digits"},
     // clang-format on
 };
 

@@ -73,6 +73,7 @@ enum class FindingKind {
     LimitsCrossed,
     DateWithoutYear,
     NumberWithoutMinimum,
+    DecimalComma,
     COUNT_,
 };
 

@@ -14,6 +14,7 @@ constexpr Check CHECKS[] = {
     checkZonesApart,      checkZoneFields,       checkFieldsCoexist,
     checkAddresses,       checkFieldAttributes,  checkLimits,
     checkDefaults,        checkDatesWithoutYear, checkNumbersWithoutMinimum,
+    checkDecimalCommas,
 };
 
 } // namespace

@@ -1,4 +1,5 @@
 #include "programs/vlmail/presets/finding.h"
+#include "tests/support/time_limit.h"
 #include "tests/vlmail/presets/settings_file.h"
 #include "tests/vlmail/run_vlmail.h"
 #include "vlservice/json/json_text.h"
@@ -288,6 +289,20 @@ std::vector<Case> const CASES{
       "error /extract_presets/0/zones/0/fields/1/value_match: the pattern is broken at character 3 "
       "(Unmatched [ or [^ in character class declaration): no document that gets this preset can be read | "
       "correct the pattern [broken-pattern]"}},
+    {"AnExpressionWithACommentBehindAPossessiveRepeat",
+     R"_({"extract_presets": [{"match": "a?+(?#why)b", "pack_preset": "P", "type": 1}], "pack_presets": [{"name": "P"}]})_",
+     {"error /extract_presets/0/match: the pattern is broken at character 4 (A comment stands behind a "
+      "possessive repeat): every document whose name is tried on it fails | correct the pattern "
+      "[broken-pattern]"}},
+    {"PatternsWithACommentBehindAPossessiveRepeat",
+     partWithField(
+         R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>a{2}+(?#why)b)$", "value_match": "a++ (?#why)b"})_"),
+     {"error /extract_presets/0/zones/0/fields/1/value_extract: the pattern is broken at character 19 (A "
+      "comment stands behind a possessive repeat): no document that gets this preset can be read | correct "
+      "the pattern [broken-pattern]",
+      "error /extract_presets/0/zones/0/fields/1/value_match: the pattern is broken at character 5 (A "
+      "comment stands behind a possessive repeat): no document that gets this preset can be read | correct "
+      "the pattern [broken-pattern]"}},
     {"PatternsThatRunAway",
      partWithField(
          R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>(\\w+\\s?)*);$", "value_match": "(a|a)*b"})_"),
@@ -482,6 +497,28 @@ std::vector<Case> const CASES{
      partWithField(R"_({"name": "total", "value_extract": "^Total: (?<VAL>.*)$", "value_type": 2})_"),
      {"warning /extract_presets/0/zones/0/fields/1: the text \" \" passes as a number, the lowest there is: "
       "-1.79769e+308 | set a \"value_min\", such as 0 [number-without-minimum]"}},
+    {"ADecimalCommaInAReal",
+     partWithField(
+         R"_({"name": "total", "value_extract": "^Total: (?<VAL>\\S+)$", "value_type": 2, "value_match": "[\\d.,]+", "value_min": 0})_"),
+     {"warning /extract_presets/0/zones/0/fields/1/value_match: a number with a decimal comma, such as "
+      "\"1.234,56\", passes and is read as 1.23456: commas are skipped, and reading ends at what is no "
+      "number | "
+      "let \"value_match\" take a comma only in front of three digits [decimal-comma]"}},
+    {"ADecimalCommaInAnInteger",
+     partWithField(
+         R"_({"name": "cents", "value_extract": "^Total: (?<VAL>\\d+,\\d\\d)$", "value_type": 1, "value_match": "\\d+,\\d\\d", "value_min": 0})_"),
+     {"warning /extract_presets/0/zones/0/fields/1/value_match: a number with a decimal comma, such as "
+      "\"1234,56\", passes and is read as 123456: commas are skipped, and reading ends at what is no number "
+      "| "
+      "let \"value_match\" take a comma only in front of three digits [decimal-comma]"}},
+    {"NothingInARealWhoseCommasSeparateThousands",
+     partWithField(
+         R"_({"name": "total", "value_extract": "^Total: (?<VAL>.*)$", "value_type": 2, "value_match": "\\d{1,3}(,\\d{3})*(\\.\\d\\d)?", "value_min": 0})_"),
+     {}},
+    {"NothingInARealThatNoDecimalCommaReaches",
+     partWithField(
+         R"_({"name": "total", "value_extract": "^Total: (?<VAL>[\\d.]+)$", "value_type": 2, "value_match": ".*", "value_min": 0})_"),
+     {}},
     {"NothingInANumberThatCannotBeBlank",
      partWithField(R"_({"name": "cents", "value_extract": "^Total: (?<VAL>\\d+)$", "value_type": 1})_"),
      {}},
@@ -491,7 +528,10 @@ class LintFindings : public testing::TestWithParam<Case> {};
 
 } // namespace
 
-TEST_P(LintFindings, NameTheCause) { EXPECT_EQ(findingsIn(GetParam().json), GetParam().findings); }
+TEST_P(LintFindings, NameTheCause) {
+    TimeLimit const limit(60);
+    EXPECT_EQ(findingsIn(GetParam().json), GetParam().findings);
+}
 
 INSTANTIATE_TEST_SUITE_P(All, LintFindings, testing::ValuesIn(CASES),
                          [](auto const& one) { return one.param.name; });
