@@ -4,12 +4,14 @@
 #include <netdb.h>
 #include <sched.h>
 #include <sys/socket.h>
+#include <unistd.h>
 
 #include <array>
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <fstream>
 #include <stdexcept>
 #include <system_error>
 #include <thread>
@@ -26,7 +28,7 @@ std::string failureOf(std::string const& command) {
     std::array<char, 256> buffer;
     while (std::size_t const got = std::fread(buffer.data(), 1, buffer.size(), pipe))
         output.append(buffer.data(), got);
-    return ::pclose(pipe) == 0 ? std::string() : command + ": " + output;
+    return ::pclose(pipe) == 0 ? std::string() : "ip: " + output;
 }
 
 void enter(int network) {
@@ -34,12 +36,8 @@ void enter(int network) {
         throw std::system_error(errno, std::generic_category(), "setns");
 }
 
-int openOrThrow(std::string const& path) {
-    int const file = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (file < 0)
-        throw std::system_error(errno, std::generic_category(), path);
-    return file;
-}
+/// The namespace of this thread; below 0 when it cannot be opened.
+int openOwn() { return ::open("/proc/thread-self/ns/net", O_RDONLY | O_CLOEXEC); }
 
 /// Whether a datagram to that group's discard port leaves the namespace of this thread.
 bool canSendTo(char const* group) {
@@ -58,58 +56,77 @@ bool canSendTo(char const* group) {
 
 } // namespace
 
-TwoNetworks::TwoNetworks() { make(); }
+TwoNetworks::TwoNetworks() {
+    makeNetwork(client_);
+    makeNetwork(service_);
+    if (whyNot_.empty())
+        connect();
+}
 
 TwoNetworks::~TwoNetworks() {
     // The interfaces go with their namespaces.
-    for (std::string const& network : {client_, service_})
-        failureOf("ip netns del " + network);
+    for (int const network : {client_, service_})
+        ::close(network);
 }
 
-void TwoNetworks::make() {
-    run("ip netns add " + client_);
-    run("ip netns add " + service_);
-    run("ip -n " + client_ + " link add vl0 type veth peer name vl0 netns " + service_);
-    std::pair<std::string, std::string> const ends[] = {{client_, "1"}, {service_, "2"}};
+void TwoNetworks::makeNetwork(int& network) {
+    std::thread([&] {
+        if (::unshare(CLONE_NEWNET) == 0)
+            network = openOwn();
+        if (network < 0)
+            whyNot_ = std::generic_category().message(errno);
+    }).join();
+}
+
+void TwoNetworks::connect() {
+    // A namespace without a name is told by the file that keeps it alive.
+    std::string const peer = "/proc/" + std::to_string(::getpid()) + "/fd/" + std::to_string(service_);
+    ip(client_, "link add vl0 type veth peer name vl0 netns " + peer);
+    std::pair<int, std::string> const ends[] = {{client_, "1"}, {service_, "2"}};
     for (auto const& [network, number] : ends) {
-        run("ip -n " + network + " link set lo up");
-        run("ip -n " + network + " address add 10.77.0." + number + "/24 dev vl0");
-        run("ip -n " + network + " address add fd77::" + number + "/64 dev vl0 nodad");
-        run("ip netns exec " + network + " sysctl -qw net.ipv6.conf.vl0.accept_dad=0");
-        run("ip -n " + network + " link set vl0 up");
-        run("ip -n " + network + " route add 239.0.0.0/8 dev vl0");
+        ip(network, "link set lo up");
+        ip(network, "address add 10.77.0." + number + "/24 dev vl0");
+        ip(network, "address add fd77::" + number + "/64 dev vl0 nodad");
+        set(network, "ipv6/conf/vl0/accept_dad", '0');
+        ip(network, "link set vl0 up");
+        ip(network, "route add 239.0.0.0/8 dev vl0");
     }
-    for (std::string const& network : {client_, service_})
+    for (int const network : {client_, service_})
         if (whyNot_.empty())
             awaitMulticast(network);
 }
 
-void TwoNetworks::awaitMulticast(std::string const& network) {
+void TwoNetworks::awaitMulticast(int network) {
     Inside const inside(network);
     auto const deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
     for (char const* const group : {"239.4.5.7", "ff45:6:45:6:45:6:45:7"}) {
         while (!canSendTo(group)) {
             if (std::chrono::steady_clock::now() > deadline)
-                throw std::runtime_error("The interfaces of " + network + " do not become ready.");
+                throw std::runtime_error("The interfaces do not become ready.");
             std::this_thread::yield();
         }
     }
 }
 
-void TwoNetworks::disableIp6(std::string const& network) {
-    run("ip netns exec " + network + " sysctl -qw net.ipv6.conf.all.disable_ipv6=1");
+void TwoNetworks::disableIp6(int network) { set(network, "ipv6/conf/all/disable_ipv6", '1'); }
+
+void TwoNetworks::ip(int network, std::string const& arguments) {
+    if (!whyNot_.empty())
+        return;
+    Inside const inside(network);
+    whyNot_ = failureOf("ip " + arguments);
 }
 
-void TwoNetworks::run(std::string const& command) {
-    if (whyNot_.empty())
-        whyNot_ = failureOf(command);
+void TwoNetworks::set(int network, std::string const& name, char value) {
+    if (!whyNot_.empty())
+        return;
+    Inside const inside(network);
+    std::string const file = "/proc/sys/net/" + name;
+    if (!(std::ofstream(file) << value << std::flush))
+        whyNot_ = "cannot write " + file;
 }
 
-TwoNetworks::Inside::Inside(std::string const& network) : before_(openOrThrow("/proc/thread-self/ns/net")) {
-    int const target = openOrThrow("/run/netns/" + network);
-    enter(target);
-    ::close(target);
-}
+TwoNetworks::Inside::Inside(int network) : before_(openOwn()) { enter(network); }
 
 TwoNetworks::Inside::~Inside() {
     enter(before_);

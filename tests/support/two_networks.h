@@ -1,8 +1,6 @@
 #pragma once
 // Two network namespaces that see each other over a pair of virtual interfaces, and nothing else.
 
-#include <unistd.h>
-
 #include <string>
 
 /// A socket belongs to the namespace that its thread was in when it was made; afterwards any thread may use
@@ -16,19 +14,20 @@ public:
     TwoNetworks& operator=(TwoNetworks const&) = delete;
 
     std::string const& whyNot() const { return whyNot_; }
-    std::string const& client() const { return client_; }
-    std::string const& service() const { return service_; }
+    /// The namespaces, as open files that keep them alive.
+    int client() const { return client_; }
+    int service() const { return service_; }
     /// Where the service is, by family.
     static constexpr char const* SERVICE_IP4 = "10.77.0.2";
     static constexpr char const* SERVICE_IP6 = "fd77::2";
 
     /// Switches IPv6 off in a namespace.
-    void disableIp6(std::string const& network);
+    void disableIp6(int network);
 
     /// While it lives, the thread is in that namespace.
     class Inside {
     public:
-        explicit Inside(std::string const& network);
+        explicit Inside(int network);
         ~Inside();
         Inside(Inside const&) = delete;
         Inside& operator=(Inside const&) = delete;
@@ -38,12 +37,16 @@ public:
     };
 
 private:
-    void make();
-    void run(std::string const& command);
+    void makeNetwork(int& network);
+    void connect();
+    /// Runs `ip` with these arguments in a namespace.
+    void ip(int network, std::string const& arguments);
+    /// Sets what the kernel keeps for each namespace by itself, as below /proc/sys/net.
+    void set(int network, std::string const& name, char value);
     /// An interface that was brought up is not ready at once.
-    void awaitMulticast(std::string const& network);
+    void awaitMulticast(int network);
 
-    std::string client_ = "vlc" + std::to_string(::getpid());
-    std::string service_ = "vls" + std::to_string(::getpid());
+    int client_ = -1;
+    int service_ = -1;
     std::string whyNot_;
 };

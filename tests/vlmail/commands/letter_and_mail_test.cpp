@@ -1,6 +1,7 @@
 // The road of letters as a person walks it: documents and settings in a folder, the program, what it says.
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/command.h"
+#include "tests/support/small_disk.h"
 #include "vlservice/json/json_text.h"
 #include "vlservice/pack/pack_wrapper.h"
 
@@ -8,12 +9,9 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
-#include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <sched.h>
 #include <sstream>
-#include <sys/mount.h>
 #include <vector>
 
 namespace {
@@ -239,18 +237,16 @@ TEST_F(VlMailTest, RefusesAFolderThatCannotBeMade) {
 }
 
 TEST_F(VlMailTest, LeavesNoHalfFileOnAFullDisk) {
-    fs::create_directory(path("out"));
-    if (::unshare(CLONE_NEWNS) != 0 || ::mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
-        ::mount("tmpfs", path("out").c_str(), "tmpfs", 0, "size=8k") != 0)
-        GTEST_SKIP() << "no right to mount a small disk: " << std::strerror(errno);
+    VLServiceTest::SmallDisk const disk;
+    if (!disk.whyNot().empty())
+        GTEST_SKIP() << "no right to make a small disk: " << disk.whyNot();
     std::string pages;
     for (int i = 0; i < 20; ++i)
         pages += "No 1\nTo: Ada\n\f";
     write("invoice 1.txt", pages);
-    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FAILED);
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", disk.path()}), VlMail::FAILED);
     EXPECT_THAT(err_, HasSubstr("make room on the disk and mail again\n"));
-    EXPECT_TRUE(fs::is_empty(path("out")));
-    ::umount(path("out").c_str());
+    EXPECT_TRUE(fs::is_empty(disk.path()));
 }
 
 TEST_F(VlMailTest, GivesTheSameOutputOnAnyNumberOfProcesses) {
