@@ -79,7 +79,7 @@ TEST(Clients, FindAServiceByItsName) {
     auto settings = server.clientSettings();
     settings.host = "localhost";
     Client client(settings);
-    client.call<Ipc::PriceEst>(json::Object{});
+    EXPECT_TRUE(client.call<Ipc::PriceEst>(json::Object{})->resp().get("asked"));
 }
 
 TEST_F(BrokenServices, ThatAreSilentAreLeftInTime) {

@@ -142,12 +142,16 @@ TEST(PageLoading, LetsACallbacksExceptionThroughAndForgetsTheRequest) {
 
 TEST(PageLoading, MayBeDeletedByDone) {
     struct Suicidal : Loader {
-        using Loader::Loader;
+        explicit Suicidal(std::vector<std::string>& seen) : Loader("m1"), seen_(seen) {}
+        ~Suicidal() override { seen_ = events; }
         void done() override { delete this; }
+        std::vector<std::string>& seen_;
     };
-    auto* const loader = new Suicidal("m1");
+    std::vector<std::string> seen;
+    auto* const loader = new Suicidal(seen);
     loader->request("a.pdf", "1", "f");
-    loader->arrive("a.pdf", "1");
+    loader->arrive("a.pdf", "1", "page");
+    EXPECT_THAT(seen, ElementsAre("f:page"));
 }
 
 TEST(PageLoading, CopiesTakeTheRequestsAlong) {

@@ -48,8 +48,25 @@ protected:
         boost::asio::io_context io;
         udp::socket socket(io, udp::v4());
         for (int i = 0; i < times; ++i)
-            socket.send_to(boost::asio::buffer(datagram),
-                           udp::endpoint(boost::asio::ip::make_address("239.4.5.6"), 45677));
+            socket.send_to(boost::asio::buffer(datagram), GROUP);
+    }
+    /// A socket in that network that hears what is sent to the IPv4 group.
+    static udp::socket member(boost::asio::io_context& io, int network) {
+        TwoNetworks::Inside const inside(network);
+        udp::socket socket(io, udp::v4());
+        socket.set_option(udp::socket::reuse_address(true));
+        socket.bind(udp::endpoint(udp::v4(), GROUP.port()));
+        socket.set_option(boost::asio::ip::multicast::join_group(GROUP.address()));
+        return socket;
+    }
+    /// Sends this to the group from the service's network as soon as anybody asks there.
+    void answerWith(std::vector<std::string> const& datagrams) {
+        noise_.emplace(member(io_, networks_.service()));
+        noise_->async_wait(udp::socket::wait_read, [this, datagrams](boost::system::error_code const&) {
+            for (std::string const& datagram : datagrams)
+                noise_->send_to(boost::asio::buffer(datagram), GROUP);
+        });
+        thread_ = std::thread([this] { io_.run(); });
     }
     /// What a client in its network finds.
     std::string found() {
@@ -66,11 +83,14 @@ protected:
         return {};
     }
 
+    static inline udp::endpoint const GROUP{boost::asio::ip::make_address("239.4.5.6"), 45677};
+
     TwoNetworks networks_;
     LogCapture log_;
     boost::asio::io_context io_;
     boost::asio::executor_work_guard<boost::asio::io_context::executor_type> work_{io_.get_executor()};
     std::optional<VlServiced::DiscoveryAnswer> answer_;
+    std::optional<udp::socket> noise_;
     std::thread thread_;
 };
 
@@ -102,13 +122,8 @@ TEST_F(DiscoveryAnswerTest, IsNotMultipliedByAFloodOfRequests) {
     std::thread flood([this] { send(R"({"#req":true})", 200); });
     int answers = 0;
     {
-        TwoNetworks::Inside const inside(networks_.client());
         boost::asio::io_context io;
-        udp::socket socket(io);
-        socket.open(udp::v4());
-        socket.set_option(udp::socket::reuse_address(true));
-        socket.bind(udp::endpoint(udp::v4(), 45677));
-        socket.set_option(boost::asio::ip::multicast::join_group(boost::asio::ip::make_address("239.4.5.6")));
+        udp::socket socket = member(io, networks_.client());
         boost::asio::steady_timer end(io, std::chrono::milliseconds(500));
         end.async_wait([&](boost::system::error_code const&) { socket.close(); });
         std::array<char, 2000> bytes;
@@ -149,13 +164,8 @@ TEST_F(DiscoveryAnswerTest, IsMissedByTheDoctorWhereNobodyGivesOne) {
 }
 
 TEST_F(DiscoveryAnswerTest, IsNotTakenFromDatagramsThatNameNoAddress) {
-    std::thread noise([this] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(200));
-        send("no JSON");
-        send(R"({"host":"","port":1})");
-    });
+    answerWith({"no JSON", R"({"host":"","port":1})"});
     VlMail::ProbeReport const ip4 = examined(false, std::chrono::milliseconds(1000));
-    noise.join();
     EXPECT_EQ(ip4.foreign, 2);
     EXPECT_THAT(ip4.answers, IsEmpty());
 }

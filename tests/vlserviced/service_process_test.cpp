@@ -16,6 +16,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <csignal>
 #include <fstream>
@@ -153,27 +154,40 @@ protected:
                 {"ASAN_OPTIONS", "verify_asan_link_order=0"}};
     }
 
+    void acknowledge(std::string const& what) {
+        acknowledged_.insert(what);
+        ++answers_;
+        answers_.notify_one();
+    }
+    /// Waits until a sender on another thread has had so many answers, or is through.
+    void awaitAnswers(int wanted) const {
+        for (int seen = answers_; seen < wanted; seen = answers_)
+            answers_.wait(seen);
+    }
+
     /// Sends settings and packs until the service is no longer there.
     void sendAll(ServiceProcess const& service) {
         try {
             auto const client = clientOf(service, data_);
             client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
-            acknowledged_.insert("upload folder");
+            acknowledge("upload folder");
             Cfg::PO part(json::Value(), false, false);
             part.setOwn<Cfg::POFieldIdxs::Code>("kept");
             client->call<Ipc::SetPO>(Cfg::Id("u=bob/a=acme", false), part);
-            acknowledged_.insert("settings");
+            acknowledge("settings");
             for (char const* id : {"p1", "p2"}) {
                 client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", id);
-                acknowledged_.insert(id);
+                acknowledge(id);
             }
             client->call<Ipc::UploadQueued>(folder_.path().string(), "packs.db");
-            acknowledged_.insert("upload");
+            acknowledge("upload");
             awaitStates(*client, {"submitted"});
-            acknowledged_.insert("end");
+            acknowledge("end");
         } catch (std::exception const&) {
             // It was killed in the middle of a command.
         }
+        answers_ = ALL_ANSWERS;
+        answers_.notify_one();
     }
 
     std::map<std::string, std::string> states(Channel::Client& client) {
@@ -194,7 +208,6 @@ protected:
                 settled &= wanted.contains(state);
             if (settled)
                 return;
-            std::this_thread::sleep_for(std::chrono::milliseconds(5));
         }
         FAIL() << "the jobs do not settle";
     }
@@ -248,6 +261,8 @@ protected:
     fs::path upload_ = folder_ / "upload";
     fs::path taken_ = folder_ / "taken";
     std::set<std::string> acknowledged_;
+    static constexpr int ALL_ANSWERS = 6;
+    std::atomic<int> answers_ = 0;
 };
 
 /// A run that is cut short in front of one of the calls that make something durable or visible.
@@ -285,11 +300,12 @@ TEST_P(ServiceThatIsKilled, LosesNothingThatItAcknowledgedAndHandsEachContainerO
 INSTANTIATE_TEST_SUITE_P(AtEveryCall, ServiceThatIsKilled, testing::Range(1, 5));
 
 TEST_F(KilledService, GoesOnAfterAKillAtAnyMoment) {
-    // Moments, not calls: between any two instructions.
-    for (int const milliseconds : {0, 3, 7, 15, 30}) {
+    // Moments, not calls: wherever it is with the next command, or with the jobs.
+    for (int wanted = 0; wanted < ALL_ANSWERS; ++wanted) {
         ServiceProcess service(arguments());
+        answers_ = 0;
         std::thread sender([&] { sendAll(service); });
-        std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
+        awaitAnswers(wanted);
         service.signal(SIGKILL);
         sender.join();
         service.wait();
