@@ -5,6 +5,11 @@ set(VLSERVICE_COMMON_HEADERS
     <algorithm> <chrono> <filesystem> <functional> <map> <memory> <optional> <ostream> <sstream> <stdexcept> <string>
     <string_view> <tuple> <utility> <vector> <jansson.h>)
 
+# What is costly in sources with sockets; goes behind the common headers, whose <utility> Asio needs.
+set(VLSERVICE_ASIO_HEADERS
+    <boost/asio/buffer.hpp> <boost/asio/connect.hpp> <boost/asio/io_context.hpp> <boost/asio/ip/tcp.hpp>
+    <boost/asio/post.hpp> <boost/asio/ssl/stream.hpp> <boost/asio/steady_timer.hpp> <boost/asio/write.hpp>)
+
 # vlservice_precompile(NAME [PIC] HEADERS...) makes a set of headers; its users are built alike.
 function(vlservice_precompile name)
     cmake_parse_arguments(ARG "PIC" "" "HEADERS" ${ARGN})

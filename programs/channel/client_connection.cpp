@@ -1,7 +1,6 @@
 #include "programs/channel/client_connection.h"
 
 #include "programs/base/error.h"
-#include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/pin_store.h"
 #include "programs/channel/token.h"
@@ -114,7 +113,7 @@ void ClientConnection::onHandshake() {
         fingerprint_ = link_->fingerprint();
         requirePinned();
     }
-    challenge();
+    greet();
 }
 
 void ClientConnection::requirePinned() const {
@@ -127,43 +126,29 @@ void ClientConnection::requirePinned() const {
                           ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
 }
 
-void ClientConnection::challenge() {
-    clientNonce_ = makeNonce();
+void ClientConnection::greet() {
+    greeting_.emplace(GreetingTerms{settings_.token, fingerprint_, makeNonce()});
     link_->limitText(MAX_GREETING);
     link_->allow(HEADER_SIZE + MAX_TEXT);
-    write({GREETING, Kind::Request, CHALLENGE, print({{NONCE, clientNonce_}})},
-          [this] { receive([this](Frame const& message) { onChallenged(message); }); });
+    auto const challenge = greeting_->challenge();
+    write(challenge.frame(), [this] { receive([this](Frame const& message) { onGreeting(message); }); });
 }
 
-namespace {
-
-json::Object greetingIn(Frame const& message, std::uint32_t sequence) {
-    if (message.kind == Kind::Error)
-        throw Base::Error("It refuses: " + reasonOf(message.text));
-    if (message.command != GREETING || message.kind != Kind::Response || message.sequence != sequence)
-        throw Base::Error("It does not greet.");
-    return parse(message.text);
-}
-
-} // namespace
-
-void ClientConnection::onChallenged(Frame const& message) {
-    json::Object const answer = greetingIn(message, CHALLENGE);
-    std::string const serviceNonce = answer.get(NONCE).toString();
-    if (!isSameProof(answer.get(PROOF).toString(),
-                     makeProof(Side::Service, settings_.token, clientNonce_, serviceNonce, fingerprint_)))
-        throw Base::Error("Whoever answers there does not know our access token.");
-    std::string const proof =
-        makeProof(Side::Client, settings_.token, clientNonce_, serviceNonce, fingerprint_);
-    write({GREETING, Kind::Request, PROVING, print({{PROOF, proof}})}, [this] {
-        receive([this](Frame const& welcome) {
-            greetingIn(welcome, PROVING);
-            onWelcome();
-        });
-    });
+void ClientConnection::onGreeting(Frame const& message) {
+    GreetingStep const step = greeting_->take(message);
+    switch (step.verdict) {
+    case GreetingStep::Verdict::GoesOn:
+        return write(step.reply->frame(),
+                     [this] { receive([this](Frame const& next) { onGreeting(next); }); });
+    case GreetingStep::Verdict::Welcome:
+        return onWelcome();
+    case GreetingStep::Verdict::Refused:
+        return fail(step.reason);
+    }
 }
 
 void ClientConnection::onWelcome() {
+    greeting_.reset();
     if (tls_)
         pinNew();
     link_->limitText(MAX_TEXT);

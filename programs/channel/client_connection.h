@@ -3,6 +3,7 @@
 
 #include "programs/channel/client.h"
 #include "programs/channel/deadline.h"
+#include "programs/channel/greeting.h"
 #include "programs/channel/link.h"
 
 #include <deque>
@@ -60,8 +61,8 @@ private:
     void connectTo(std::vector<tcp::endpoint> endpoints);
     void onConnected(tcp::socket socket);
     void onHandshake();
-    void challenge();
-    void onChallenged(Frame const& message);
+    void greet();
+    void onGreeting(Frame const& message);
     void onWelcome();
     void requirePinned() const;
     void pinNew();
@@ -69,7 +70,6 @@ private:
     // The queue.
     void pump();
     void begin();
-    void onAnswer(Received const& received);
     void takeAnswer(Frame const& message);
     void endRequest(std::string const& failure);
     void onDue();
@@ -96,9 +96,8 @@ private:
     std::shared_ptr<Link> link_;
     std::optional<Deadline> connectDeadline_;
     std::optional<Deadline> deadline_;
-    std::string clientNonce_;
+    std::optional<ClientGreeting> greeting_;
     std::string fingerprint_;
-    bool isNewCertificate_ = false;
     bool prefaceSent_ = false;
 
     /// The first is under way while isBusy_.

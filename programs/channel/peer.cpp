@@ -1,7 +1,6 @@
 #include "programs/channel/peer.h"
 
 #include "programs/base/error.h"
-#include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/token.h"
 
@@ -180,9 +179,7 @@ void Peer::onReserved(std::size_t size) {
 void Peer::onMessage(Frame const& message) {
     switch (state_) {
     case State::Greeting:
-        return onChallenge(message);
-    case State::Proving:
-        return onProof(message);
+        return onGreeting(message);
     case State::Ready:
         return onRequest(message);
     case State::Leaving:
@@ -193,50 +190,35 @@ void Peer::onMessage(Frame const& message) {
 
 // --- the greeting
 
-namespace {
-
-std::string textUnder(char const* key, Frame const& message, std::uint32_t sequence) {
-    if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
-        throw Base::Error("The greeting is missing.");
-    return parse(message.text).get(key).toString();
-}
-
-} // namespace
-
-void Peer::onChallenge(Frame const& message) {
+void Peer::onGreeting(Frame const& message) {
     try {
-        clientNonce_ = textUnder(NONCE, message, CHALLENGE);
-        serviceNonce_ = makeNonce();
-    } catch (std::exception const& e) {
+        if (!greeting_)
+            greeting_.emplace(
+                GreetingTerms{context_->settings().token, context_->fingerprint(), makeNonce()});
+    } catch (Base::Error const& e) {
         return refuse(e.what());
     }
-    state_ = State::Proving;
-    std::string const text = print({{NONCE, serviceNonce_},
-                                    {PROOF, makeProof(Side::Service, context_->settings().token, clientNonce_,
-                                                      serviceNonce_, context_->fingerprint())}});
-    write({GREETING, Kind::Response, CHALLENGE, text}, [this] { receive(); });
+    GreetingStep const step = greeting_->take(message);
+    switch (step.verdict) {
+    case GreetingStep::Verdict::GoesOn:
+        return write(step.reply->frame(), [this] { receive(); });
+    case GreetingStep::Verdict::Welcome:
+        return write(step.reply->frame(), [this] { onWelcome(); });
+    case GreetingStep::Verdict::Refused:
+        return refuse(step.reason);
+    }
 }
 
-void Peer::onProof(Frame const& message) {
-    std::string proof;
-    try {
-        proof = textUnder(PROOF, message, PROVING);
-    } catch (std::exception const& e) {
-        return refuse(e.what());
-    }
-    if (!isSameProof(proof, makeProof(Side::Client, context_->settings().token, clientNonce_, serviceNonce_,
-                                      context_->fingerprint())))
-        return refuse("Its access token is not the one of this service.");
-    write({GREETING, Kind::Response, PROVING, "{}"}, [this] {
-        state_ = State::Ready;
-        deadline_->clear();
-        link_->limitText(MAX_TEXT);
-        link_->onPart([weak = weak_from_this()] {
-            if (auto const self = weak.lock())
-                self->onPart();
-        });
-        receive();
+void Peer::onWelcome() {
+    greeting_.reset();
+    state_ = State::Ready;
+    deadline_->clear();
+    link_->limitText(MAX_TEXT);
+    link_->onPart([weak = weak_from_this()] {
+        if (auto const self = weak.lock())
+            self->onPart();
     });
+    receive();
 }
 
 // --- requests

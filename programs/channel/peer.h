@@ -2,6 +2,7 @@
 // One client as its service sees it: the greeting, then a request and its answer, one after the other.
 
 #include "programs/channel/deadline.h"
+#include "programs/channel/greeting.h"
 #include "programs/channel/link.h"
 #include "programs/channel/server.h"
 
@@ -57,7 +58,7 @@ public:
               std::function<void(json::Object const&)> taken) override;
 
 private:
-    enum class State { Greeting, Proving, Ready, Leaving, Closed };
+    enum class State { Greeting, Ready, Leaving, Closed };
 
     /// The request that is being handled.
     struct Request {
@@ -77,8 +78,8 @@ private:
     void onPart();
     void onLarge();
     void onMessage(Frame const& message);
-    void onChallenge(Frame const& message);
-    void onProof(Frame const& message);
+    void onGreeting(Frame const& message);
+    void onWelcome();
     void onRequest(Frame const& message);
     void takeRequest(std::uint8_t command);
 
@@ -103,8 +104,7 @@ private:
     /// What becomes of the connection when the deadline is due.
     std::string dueReason_;
     bool isInsideMessage_ = false;
-    std::string clientNonce_;
-    std::string serviceNonce_;
+    std::optional<ServiceGreeting> greeting_;
     bool prefaceSent_ = false;
     std::optional<Request> request_;
     std::size_t reserved_ = 0;

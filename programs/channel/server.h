@@ -2,10 +2,9 @@
 // The service's side of the connection: it listens, lets in who knows the access token, and hands over
 // commands.
 
-#include "programs/channel/tls.h"
+#include "programs/channel/server_settings.h"
 #include "vlservice/platform/cmd.h"
 
-#include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <functional>
@@ -17,27 +16,6 @@ class io_context;
 }
 
 namespace Channel {
-
-struct ServerSettings {
-    /// An IP address.
-    std::string address = "127.0.0.1";
-    /// 0 takes a free port.
-    std::uint16_t port = 0;
-    std::string token;
-    Tls tls = Tls::Auto;
-    /// PEM files that TLS wants. The key's must be private.
-    std::string certificateFile;
-    std::string keyFile;
-
-    /// More wait until one of these has left.
-    std::size_t maxConnections = 2000;
-    /// For TLS and the exchange of proofs.
-    std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
-    /// For the rest of a message whose first byte is there, and for a peer to take an answer.
-    std::chrono::milliseconds messageTime = std::chrono::seconds(60);
-    /// For all large requests at once; further ones wait.
-    std::size_t requestMemory = 64 * 1024 * 1024;
-};
 
 /// Ends the handling of one command; copies are the same answer. May be called from any thread, once: further
 /// calls do nothing. An answer that goes without a call is a failure. The command is not touched by the

@@ -57,12 +57,7 @@ protected:
 // --- connecting
 
 TEST(Clients, SayThatNobodyIsThere) {
-    std::uint16_t port = 0;
-    {
-        boost::asio::io_context io;
-        boost::asio::ip::tcp::acceptor const acceptor(io, {boost::asio::ip::address_v4::loopback(), 0});
-        port = acceptor.local_endpoint().port();
-    }
+    std::uint16_t const port = freePort();
     Channel::ClientSettings settings;
     settings.host = "127.0.0.1";
     settings.port = port;

@@ -6,8 +6,6 @@
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
 
-#include <boost/asio/post.hpp>
-
 #include <gmock/gmock.h>
 
 #include <atomic>

@@ -8,6 +8,8 @@
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/tcp.hpp>
 #include <boost/asio/post.hpp>
 #include <boost/asio/read.hpp>
 #include <boost/asio/write.hpp>
@@ -16,6 +18,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <thread>
 
 namespace ChannelTest {
 
@@ -31,25 +34,34 @@ constexpr auto PATIENCE = 60s;
 
 // --- RunningServer
 
-RunningServer::RunningServer(Channel::ServerSettings settings, Channel::Server::Handler handler) {
+struct RunningServer::Running {
+    asio::io_context io;
+    std::unique_ptr<Channel::Server> server;
+    std::thread thread;
+};
+
+RunningServer::RunningServer(Channel::ServerSettings settings, Channel::Server::Handler handler)
+    : running_(std::make_unique<Running>()) {
     if (settings.token.empty())
         settings.token = TOKEN;
     if (!handler)
         handler = Channel::acceptAtOnce(std::make_shared<Echo>());
-    server_ =
-        std::make_unique<Channel::Server>(io_, std::move(settings), Ipc::makeEmptyCmd, std::move(handler));
-    port_ = server_->port();
-    thread_ = std::thread([this] {
-        auto const work = asio::make_work_guard(io_);
-        io_.run();
+    running_->server = std::make_unique<Channel::Server>(running_->io, std::move(settings), Ipc::makeEmptyCmd,
+                                                         std::move(handler));
+    port_ = running_->server->port();
+    running_->thread = std::thread([this] {
+        auto const work = asio::make_work_guard(running_->io);
+        running_->io.run();
     });
 }
 
 RunningServer::~RunningServer() {
-    io_.stop();
-    thread_.join();
-    server_.reset();
+    running_->io.stop();
+    running_->thread.join();
+    running_->server.reset();
 }
+
+Channel::Server& RunningServer::server() { return *running_->server; }
 
 Channel::ClientSettings RunningServer::clientSettings() const {
     Channel::ClientSettings settings;
@@ -60,7 +72,7 @@ Channel::ClientSettings RunningServer::clientSettings() const {
     return settings;
 }
 
-void RunningServer::post(std::function<void()> work) { asio::post(io_, std::move(work)); }
+void RunningServer::post(std::function<void()> work) { asio::post(running_->io, std::move(work)); }
 
 std::size_t RunningServer::connections() {
     return onThread([](Channel::Server& server) { return server.connections(); });
@@ -108,32 +120,35 @@ std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std
     return bytes;
 }
 
-namespace {
+class RawPeer::Socket {
+public:
+    Socket() : socket(io) {}
 
-void setPatience(asio::ip::tcp::socket& socket) {
-    timeval const patience{std::chrono::seconds(PATIENCE).count(), 0};
-    ::setsockopt(socket.native_handle(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+    void setPatience() {
+        timeval const patience{std::chrono::seconds(PATIENCE).count(), 0};
+        ::setsockopt(socket.native_handle(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+    }
+
+    asio::io_context io;
+    asio::ip::tcp::socket socket;
+};
+
+RawPeer::RawPeer(std::uint16_t port) : socket_(std::make_unique<Socket>()) {
+    socket_->socket.connect({asio::ip::address_v4::loopback(), port});
+    socket_->setPatience();
 }
 
-} // namespace
+RawPeer::RawPeer(std::unique_ptr<Socket> socket) : socket_(std::move(socket)) { socket_->setPatience(); }
 
-RawPeer::RawPeer(std::uint16_t port) : socket_(io_) {
-    socket_.connect({asio::ip::address_v4::loopback(), port});
-    setPatience(socket_);
-}
+RawPeer::~RawPeer() = default;
 
-RawPeer::RawPeer(asio::ip::tcp::acceptor& acceptor) : socket_(io_) {
-    acceptor.accept(socket_);
-    setPatience(socket_);
-}
-
-void RawPeer::send(std::string const& bytes) { asio::write(socket_, asio::buffer(bytes)); }
+void RawPeer::send(std::string const& bytes) { asio::write(socket_->socket, asio::buffer(bytes)); }
 
 void RawPeer::send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text) {
     send(bytesOf(command, kind, sequence, text));
 }
 
-void RawPeer::finish() { socket_.shutdown(asio::ip::tcp::socket::shutdown_send); }
+void RawPeer::finish() { socket_->socket.shutdown(asio::ip::tcp::socket::shutdown_send); }
 
 void RawPeer::welcome() {
     std::string const nonce = Channel::makeNonce();
@@ -153,7 +168,7 @@ std::optional<Message> RawPeer::receive() {
             return Message{frame->command, frame->kind, frame->sequence, std::string(frame->text)};
         auto const room = decoder_.room();
         // Straight from the system: the library's reading would wait for longer than the socket's patience.
-        ssize_t const got = ::recv(socket_.native_handle(), room.data(), room.size(), 0);
+        ssize_t const got = ::recv(socket_->socket.native_handle(), room.data(), room.size(), 0);
         if (got < 0 && errno != ECONNRESET)
             throw std::runtime_error("The service says nothing.");
         if (got <= 0)
@@ -186,33 +201,46 @@ std::string RawPeer::refusal() {
 }
 
 void RawPeer::vanish() {
-    socket_.set_option(asio::socket_base::linger(true, 0));
-    socket_.close();
+    socket_->socket.set_option(asio::socket_base::linger(true, 0));
+    socket_->socket.close();
 }
 
 bool RawPeer::isClosed() { return !receive(); }
 
 // --- FakeService
 
-FakeService::FakeService(std::function<void(RawPeer&)> script)
-    : acceptor_(io_, {asio::ip::address_v4::loopback(), 0}), thread_([this, script = std::move(script)] {
-          RawPeer peer(acceptor_);
-          script(peer);
-      }) {}
+struct FakeService::Running {
+    asio::io_context io;
+    asio::ip::tcp::acceptor acceptor{io, {asio::ip::address_v4::loopback(), 0}};
+    std::thread thread;
+};
 
-FakeService::~FakeService() { thread_.join(); }
+FakeService::FakeService(std::function<void(RawPeer&)> script)
+    : running_(std::make_unique<Running>()), port_(running_->acceptor.local_endpoint().port()) {
+    running_->thread = std::thread([this, script = std::move(script)] {
+        auto socket = std::make_unique<RawPeer::Socket>();
+        running_->acceptor.accept(socket->socket);
+        RawPeer peer(std::move(socket));
+        script(peer);
+    });
+}
+
+FakeService::~FakeService() { running_->thread.join(); }
 
 Channel::ClientSettings FakeService::clientSettings() const {
     Channel::ClientSettings settings;
     settings.host = "127.0.0.1";
-    settings.port = acceptor_.local_endpoint().port();
+    settings.port = port_;
     settings.token = TOKEN;
     settings.connectTime = PATIENCE;
     return settings;
 }
 
-std::string FakeService::name() const {
-    return "127.0.0.1:" + std::to_string(acceptor_.local_endpoint().port());
+std::string FakeService::name() const { return "127.0.0.1:" + std::to_string(port_); }
+
+std::uint16_t freePort() {
+    asio::io_context io;
+    return asio::ip::tcp::acceptor(io, {asio::ip::address_v4::loopback(), 0}).local_endpoint().port();
 }
 
 } // namespace ChannelTest

@@ -11,11 +11,6 @@
 #include "vlservice/ipc/remove_cfg_node.h"
 #include "vlservice/platform/log.h"
 
-#include <utility>
-
-#include <boost/asio/io_context.hpp>
-#include <boost/asio/ip/tcp.hpp>
-
 #include <chrono>
 #include <condition_variable>
 #include <functional>
@@ -25,7 +20,7 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
-#include <thread>
+#include <utility>
 #include <vector>
 
 namespace ChannelTest {
@@ -55,7 +50,7 @@ public:
     template<typename Work>
     auto onThread(Work work) {
         std::packaged_task<decltype(work(std::declval<Channel::Server&>()))()> task(
-            [&] { return work(*server_); });
+            [&] { return work(server()); });
         auto result = task.get_future();
         post([&task] { task(); });
         return result.get();
@@ -64,15 +59,14 @@ public:
     /// Waits, within a minute, until so many are connected.
     bool hasConnections(std::size_t wanted);
 
-    boost::asio::io_context& io() { return io_; }
-
 private:
+    struct Running;
+
+    Channel::Server& server();
     void post(std::function<void()> work);
 
-    boost::asio::io_context io_;
-    std::unique_ptr<Channel::Server> server_;
+    std::unique_ptr<Running> running_;
     std::uint16_t port_ = 0;
-    std::thread thread_;
 };
 
 /// Collects what is logged as a failure, by all threads, while it lives.
@@ -118,8 +112,12 @@ class RawPeer {
 public:
     /// A client.
     explicit RawPeer(std::uint16_t port);
-    /// A service's end.
-    explicit RawPeer(boost::asio::ip::tcp::acceptor& acceptor);
+    /// One end of a socket that is connected already.
+    class Socket;
+    explicit RawPeer(std::unique_ptr<Socket> socket);
+    ~RawPeer();
+    RawPeer(RawPeer const&) = delete;
+    RawPeer& operator=(RawPeer const&) = delete;
 
     void send(std::string const& bytes);
     void send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
@@ -138,8 +136,7 @@ public:
     void vanish();
 
 private:
-    boost::asio::io_context io_;
-    boost::asio::ip::tcp::socket socket_;
+    std::unique_ptr<Socket> socket_;
     Channel::FrameDecoder decoder_;
 };
 
@@ -156,10 +153,14 @@ public:
     std::string name() const;
 
 private:
-    boost::asio::io_context io_;
-    boost::asio::ip::tcp::acceptor acceptor_;
-    std::thread thread_;
+    struct Running;
+
+    std::unique_ptr<Running> running_;
+    std::uint16_t port_;
 };
+
+/// A port that nobody listens on, as far as one can know.
+std::uint16_t freePort();
 
 /// The bytes of a message.
 std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);

@@ -63,7 +63,6 @@ public:
 
     json::Object const& json() const { return document_; }
     bool isPartAlone() const { return isPartAlone_; }
-    Place const& partPlace() const { return partPlace_; }
     /// The parser's words on the first key that stands twice in one object; empty when none does.
     std::string const& duplicateKey() const { return duplicateKey_; }
 

@@ -3,162 +3,173 @@
 #include "vlservice/ipc/discovery_base.h"
 #include "vlservice/json/json_text.h"
 
+#include <utility>
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/multicast.hpp>
+#include <boost/asio/ip/udp.hpp>
+#include <boost/asio/ip/v6_only.hpp>
+
 #include <algorithm>
-#include <arpa/inet.h>
 #include <array>
-#include <cerrno>
-#include <cstring>
 #include <ifaddrs.h>
 #include <memory>
 #include <net/if.h>
 #include <netinet/in.h>
 #include <optional>
-#include <poll.h>
 #include <set>
 #include <sstream>
-#include <sys/socket.h>
-#include <unistd.h>
-#include <utility>
 
 namespace VlMail {
 namespace {
+
+namespace asio = boost::asio;
+namespace multicast = asio::ip::multicast;
+using asio::ip::udp;
+using boost::system::error_code;
 
 // The groups of the discovery protocol.
 constexpr char const* GROUP_IP4 = "239.4.5.6";
 constexpr char const* GROUP_IP6 = "ff45:6:45:6:45:6:45:6";
 constexpr std::size_t MAX_DATAGRAM = 1024;
 
-std::string addressText(sockaddr const* address) {
-    char text[INET6_ADDRSTRLEN] = {};
-    if (address->sa_family == AF_INET)
-        ::inet_ntop(AF_INET, &reinterpret_cast<sockaddr_in const*>(address)->sin_addr, text, sizeof text);
-    else
-        ::inet_ntop(AF_INET6, &reinterpret_cast<sockaddr_in6 const*>(address)->sin6_addr, text, sizeof text);
-    return text;
+/// Without the zone, which other hosts name differently.
+asio::ip::address withoutZone(asio::ip::address const& address) {
+    return address.is_v6() ? asio::ip::address_v6(address.to_v6().to_bytes()) : address;
 }
+
+/// A socket hears the groups that it has joined itself, and not what others of this host have joined.
+template<int Level, int Name>
+class OwnGroupsOnly {
+public:
+    template<typename Protocol>
+    int level(Protocol const&) const {
+        return Level;
+    }
+    template<typename Protocol>
+    int name(Protocol const&) const {
+        return Name;
+    }
+    template<typename Protocol>
+    int const* data(Protocol const&) const {
+        return &hearsAll_;
+    }
+    template<typename Protocol>
+    std::size_t size(Protocol const&) const {
+        return sizeof hearsAll_;
+    }
+
+private:
+    int hearsAll_ = 0;
+};
+
+struct InterfaceAddress {
+    std::string interface;
+    asio::ip::address address;
+};
 
 /// A step of setting up or sending that failed.
 struct ProbeFailure {
     std::string what;
 };
 
-void require(int result, char const* step) {
-    if (result < 0)
-        throw ProbeFailure{std::string(step) + ": " + std::strerror(errno)};
-}
-
-template<typename Value>
-void setOption(int socket, int level, int name, Value const& value, char const* step) {
-    require(::setsockopt(socket, level, name, &value, sizeof value), step);
-}
-
 /// A socket of discovery that is bound to one interface.
 class Probe {
 public:
-    Probe(std::string interface, std::string address, bool isIp6) {
-        report.interface = std::move(interface);
-        report.address = std::move(address);
-        report.isIp6 = isIp6;
+    /// `ownAddresses` outlives it.
+    Probe(asio::io_context& io, InterfaceAddress const& at, std::set<asio::ip::address> const& ownAddresses)
+        : socket_(io), address_(at.address), ownAddresses_(ownAddresses) {
+        report.interface = at.interface;
+        report.address = at.address.to_string();
+        report.isIp6 = at.address.is_v6();
         try {
             open();
             join();
             send();
+            receive();
         } catch (ProbeFailure const& failure) {
             report.failure = failure.what;
         }
     }
-    ~Probe() {
-        if (socket_ >= 0)
-            ::close(socket_);
-    }
     Probe(Probe const&) = delete;
     Probe& operator=(Probe const&) = delete;
-
-    int socket() const { return report.failure.empty() ? socket_ : -1; }
-
-    void receive(std::set<std::string> const& ownAddresses) {
-        std::array<char, MAX_DATAGRAM> bytes;
-        sockaddr_storage sender{};
-        socklen_t length = sizeof sender;
-        ssize_t const size = ::recvfrom(socket_, bytes.data(), bytes.size(), MSG_DONTWAIT,
-                                        reinterpret_cast<sockaddr*>(&sender), &length);
-        if (size >= 0)
-            note(std::string(bytes.data(), static_cast<std::size_t>(size)),
-                 addressText(reinterpret_cast<sockaddr*>(&sender)), ownAddresses);
-    }
 
     ProbeReport report;
 
 private:
-    void open() {
-        socket_ = ::socket(report.isIp6 ? AF_INET6 : AF_INET, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-        require(socket_, "open");
-        setOption(socket_, SOL_SOCKET, SO_REUSEADDR, 1, "share the port");
-        if (report.isIp6)
-            setOption(socket_, IPPROTO_IPV6, IPV6_V6ONLY, 1, "keep to IPv6");
-        sockaddr_in6 any6{};
-        any6.sin6_family = AF_INET6;
-        any6.sin6_port = htons(Ipc::DiscoveryBase::DISCOVERY_PORT);
-        sockaddr_in any4{};
-        any4.sin_family = AF_INET;
-        any4.sin_port = any6.sin6_port;
-        require(report.isIp6 ? ::bind(socket_, reinterpret_cast<sockaddr*>(&any6), sizeof any6)
-                             : ::bind(socket_, reinterpret_cast<sockaddr*>(&any4), sizeof any4),
-                "bind to the port");
+    /// Does one step with an error code to fill.
+    template<typename Step>
+    static void require(char const* name, Step step) {
+        error_code ec;
+        step(ec);
+        if (ec)
+            throw ProbeFailure{std::string(name) + ": " + ec.message()};
+    }
+    template<typename Option>
+    void set(char const* name, Option const& option) {
+        require(name, [&](error_code& ec) { socket_.set_option(option, ec); });
     }
 
-    /// Only this interface's group: without that each socket hears what another one has joined.
+    void open() {
+        udp const family = report.isIp6 ? udp::v6() : udp::v4();
+        require("open", [&](error_code& ec) { socket_.open(family, ec); });
+        set("share the port", udp::socket::reuse_address(true));
+        if (report.isIp6)
+            set("keep to IPv6", asio::ip::v6_only(true));
+        require("bind to the port", [&](error_code& ec) {
+            socket_.bind(udp::endpoint(family, Ipc::DiscoveryBase::DISCOVERY_PORT), ec);
+        });
+    }
+
     void join() {
-        int const index = static_cast<int>(::if_nametoindex(report.interface.c_str()));
         if (report.isIp6) {
-            ipv6_mreq request{};
-            ::inet_pton(AF_INET6, GROUP_IP6, &request.ipv6mr_multiaddr);
-            request.ipv6mr_interface = static_cast<unsigned>(index);
-            setOption(socket_, IPPROTO_IPV6, IPV6_MULTICAST_ALL, 0, "separate the interfaces");
-            setOption(socket_, IPPROTO_IPV6, IPV6_JOIN_GROUP, request, "join the group");
-            setOption(socket_, IPPROTO_IPV6, IPV6_MULTICAST_IF, index, "choose the interface");
+            unsigned const index = ::if_nametoindex(report.interface.c_str());
+            set("separate the interfaces", OwnGroupsOnly<IPPROTO_IPV6, IPV6_MULTICAST_ALL>());
+            set("join the group", multicast::join_group(group().to_v6(), index));
+            set("choose the interface", multicast::outbound_interface(index));
         } else {
-            ip_mreqn request{};
-            ::inet_pton(AF_INET, GROUP_IP4, &request.imr_multiaddr);
-            request.imr_ifindex = index;
-            setOption(socket_, IPPROTO_IP, IP_MULTICAST_ALL, 0, "separate the interfaces");
-            setOption(socket_, IPPROTO_IP, IP_ADD_MEMBERSHIP, request, "join the group");
-            setOption(socket_, IPPROTO_IP, IP_MULTICAST_IF, request, "choose the interface");
+            set("separate the interfaces", OwnGroupsOnly<IPPROTO_IP, IP_MULTICAST_ALL>());
+            set("join the group", multicast::join_group(group().to_v4(), address_.to_v4()));
+            set("choose the interface", multicast::outbound_interface(address_.to_v4()));
         }
     }
+
+    asio::ip::address group() const { return asio::ip::make_address(report.isIp6 ? GROUP_IP6 : GROUP_IP4); }
 
     void send() {
         std::ostringstream text;
         text << Ipc::DiscoveryBase::makeReq();
         std::string const bytes = text.str();
-        sockaddr_in6 group6{};
-        group6.sin6_family = AF_INET6;
-        group6.sin6_port = htons(Ipc::DiscoveryBase::DISCOVERY_PORT);
-        ::inet_pton(AF_INET6, GROUP_IP6, &group6.sin6_addr);
-        sockaddr_in group4{};
-        group4.sin_family = AF_INET;
-        group4.sin_port = group6.sin6_port;
-        ::inet_pton(AF_INET, GROUP_IP4, &group4.sin_addr);
-        ssize_t const sent = report.isIp6 ? ::sendto(socket_, bytes.data(), bytes.size(), 0,
-                                                     reinterpret_cast<sockaddr*>(&group6), sizeof group6)
-                                          : ::sendto(socket_, bytes.data(), bytes.size(), 0,
-                                                     reinterpret_cast<sockaddr*>(&group4), sizeof group4);
-        require(static_cast<int>(sent), "send");
+        require("send", [&](error_code& ec) {
+            socket_.send_to(asio::buffer(bytes), udp::endpoint(group(), Ipc::DiscoveryBase::DISCOVERY_PORT),
+                            0, ec);
+        });
     }
 
-    void note(std::string const& text, std::string const& sender, std::set<std::string> const& ownAddresses) {
+    void receive() {
+        socket_.async_receive_from(asio::buffer(bytes_), sender_,
+                                   [this](error_code const& ec, std::size_t size) {
+                                       if (ec)
+                                           return;
+                                       note(std::string(bytes_.data(), size));
+                                       receive();
+                                   });
+    }
+
+    void note(std::string const& text) {
         try {
             json::Object const datagram = json::strToObject(text.data(), text.size());
             if (Ipc::DiscoveryBase::isReq(datagram))
-                report.heardItself |= ownAddresses.contains(sender);
+                report.heardItself |= ownAddresses_.contains(withoutZone(sender_.address()));
             else
-                noteAnswer(datagram, sender);
+                noteAnswer(datagram);
         } catch (json::Exc const&) {
             ++report.foreign;
         }
     }
 
-    void noteAnswer(json::Object const& datagram, std::string const& sender) {
+    void noteAnswer(json::Object const& datagram) {
         std::string const host = datagram.get(Ipc::DiscoveryBase::SVC_HOST_FLD_NAME).textOrEmpty();
         std::string const port =
             std::to_string(datagram.get(Ipc::DiscoveryBase::SVC_PORT_FLD_NAME).intOrZero());
@@ -166,60 +177,48 @@ private:
             ++report.foreign;
             return;
         }
-        std::string answer = host + ':' + port + " (from " + sender + ')';
+        std::string answer = host + ':' + port + " (from " + withoutZone(sender_.address()).to_string() + ')';
         if (std::find(report.answers.begin(), report.answers.end(), answer) == report.answers.end())
             report.answers.push_back(std::move(answer));
     }
 
-    int socket_ = -1;
+    udp::socket socket_;
+    asio::ip::address address_;
+    std::set<asio::ip::address> const& ownAddresses_;
+    udp::endpoint sender_;
+    std::array<char, MAX_DATAGRAM> bytes_;
 };
 
-using Probes = std::vector<std::unique_ptr<Probe>>;
-
-struct InterfaceAddress {
-    std::string interface;
-    std::string address;
-    bool isIp6;
-};
+std::optional<asio::ip::address> addressOf(sockaddr const* address) {
+    if (address && address->sa_family == AF_INET)
+        return asio::ip::address_v4(ntohl(reinterpret_cast<sockaddr_in const*>(address)->sin_addr.s_addr));
+    if (!address || address->sa_family != AF_INET6)
+        return std::nullopt;
+    asio::ip::address_v6::bytes_type bytes;
+    std::copy_n(reinterpret_cast<sockaddr_in6 const*>(address)->sin6_addr.s6_addr, bytes.size(),
+                bytes.begin());
+    return asio::ip::address_v6(bytes);
+}
 
 /// One address for each interface and IP version; all own addresses go into `own`.
-std::vector<InterfaceAddress> interfacesThatAreUp(std::set<std::string>& own) {
+std::vector<InterfaceAddress> interfacesThatAreUp(std::set<asio::ip::address>& own) {
     ifaddrs* list = nullptr;
     if (::getifaddrs(&list) != 0)
         return {};
     std::vector<InterfaceAddress> found;
     for (ifaddrs const* at = list; at; at = at->ifa_next) {
-        bool const isIp =
-            at->ifa_addr && (at->ifa_addr->sa_family == AF_INET || at->ifa_addr->sa_family == AF_INET6);
-        if (!isIp || (at->ifa_flags & IFF_UP) == 0)
+        std::optional<asio::ip::address> const address = addressOf(at->ifa_addr);
+        if (!address || (at->ifa_flags & IFF_UP) == 0)
             continue;
-        InterfaceAddress const address{at->ifa_name, addressText(at->ifa_addr),
-                                       at->ifa_addr->sa_family == AF_INET6};
-        own.insert(address.address);
+        own.insert(*address);
         bool const isKnown = std::any_of(found.begin(), found.end(), [&](InterfaceAddress const& other) {
-            return other.interface == address.interface && other.isIp6 == address.isIp6;
+            return other.interface == at->ifa_name && other.address.is_v6() == address->is_v6();
         });
         if (!isKnown)
-            found.push_back(address);
+            found.push_back({at->ifa_name, *address});
     }
     ::freeifaddrs(list);
     return found;
-}
-
-void listen(Probes const& probes, std::set<std::string> const& own, std::chrono::milliseconds time) {
-    auto const end = std::chrono::steady_clock::now() + time;
-    std::vector<pollfd> waiting;
-    for (auto const& probe : probes)
-        waiting.push_back({probe->socket(), POLLIN, 0});
-    for (;;) {
-        auto const left =
-            std::chrono::duration_cast<std::chrono::milliseconds>(end - std::chrono::steady_clock::now());
-        if (left.count() <= 0 || ::poll(waiting.data(), waiting.size(), static_cast<int>(left.count())) <= 0)
-            return;
-        for (std::size_t i = 0; i < waiting.size(); ++i)
-            if (waiting[i].revents != 0)
-                probes[i]->receive(own);
-    }
 }
 
 bool isLoopback(ProbeReport const& report) {
@@ -256,11 +255,13 @@ json::Array arrayOf(std::vector<std::string> const& texts) {
 } // namespace
 
 std::vector<ProbeReport> probeNetwork(std::chrono::milliseconds time) {
-    std::set<std::string> own;
-    Probes probes;
-    for (auto const& [interface, address, isIp6] : interfacesThatAreUp(own))
-        probes.push_back(std::make_unique<Probe>(interface, address, isIp6));
-    listen(probes, own, time);
+    asio::io_context io(1);
+    std::set<asio::ip::address> own;
+    std::vector<InterfaceAddress> const interfaces = interfacesThatAreUp(own);
+    std::vector<std::unique_ptr<Probe>> probes;
+    for (InterfaceAddress const& at : interfaces)
+        probes.push_back(std::make_unique<Probe>(io, at, own));
+    io.run_for(time);
     std::vector<ProbeReport> reports;
     for (auto const& probe : probes)
         reports.push_back(std::move(probe->report));

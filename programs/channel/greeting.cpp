@@ -1,0 +1,111 @@
+#include "programs/channel/greeting.h"
+
+#include "programs/base/error.h"
+#include "programs/channel/message_text.h"
+#include "programs/channel/token.h"
+
+#include <utility>
+
+namespace Channel {
+namespace {
+
+using Verdict = GreetingStep::Verdict;
+
+GreetingStep refusal(std::string reason) { return {Verdict::Refused, std::nullopt, std::move(reason)}; }
+
+GreetingStep goOn(Kind kind, std::uint32_t sequence, json::Object const& text) {
+    return {Verdict::GoesOn, GreetingStep::Reply{kind, sequence, print(text)}, {}};
+}
+
+std::string textUnder(char const* key, Frame const& message, std::uint32_t sequence) {
+    if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
+        throw Base::Error("The greeting is missing.");
+    return parse(message.text).get(key).toString();
+}
+
+json::Object answerIn(Frame const& message, std::uint32_t sequence) {
+    if (message.kind == Kind::Error)
+        throw Base::Error("It refuses: " + reasonOf(message.text));
+    if (message.command != GREETING || message.kind != Kind::Response || message.sequence != sequence)
+        throw Base::Error("It does not greet.");
+    return parse(message.text);
+}
+
+} // namespace
+
+// --- the service
+
+GreetingStep ServiceGreeting::take(Frame const& message) {
+    // Over, unless the step gets to its end.
+    State const state = std::exchange(state_, State::Over);
+    try {
+        switch (state) {
+        case State::Challenge:
+            return answerChallenge(message);
+        case State::Proof:
+            return checkProof(message);
+        case State::Over:
+            break;
+        }
+    } catch (std::exception const& e) {
+        return refusal(e.what());
+    }
+    return refusal("The greeting is over.");
+}
+
+GreetingStep ServiceGreeting::answerChallenge(Frame const& message) {
+    clientNonce_ = textUnder(NONCE, message, CHALLENGE);
+    GreetingStep step = goOn(
+        Kind::Response, CHALLENGE,
+        {{NONCE, terms_.nonce},
+         {PROOF, makeProof(Side::Service, terms_.token, clientNonce_, terms_.nonce, terms_.fingerprint)}});
+    state_ = State::Proof;
+    return step;
+}
+
+GreetingStep ServiceGreeting::checkProof(Frame const& message) {
+    std::string const expected =
+        makeProof(Side::Client, terms_.token, clientNonce_, terms_.nonce, terms_.fingerprint);
+    if (!isSameProof(textUnder(PROOF, message, PROVING), expected))
+        return refusal("Its access token is not the one of this service.");
+    return {Verdict::Welcome, GreetingStep::Reply{Kind::Response, PROVING, "{}"}, {}};
+}
+
+// --- the client
+
+GreetingStep::Reply ClientGreeting::challenge() const {
+    return {Kind::Request, CHALLENGE, print({{NONCE, terms_.nonce}})};
+}
+
+GreetingStep ClientGreeting::take(Frame const& message) {
+    State const state = std::exchange(state_, State::Over);
+    try {
+        switch (state) {
+        case State::Challenge:
+            return prove(message);
+        case State::Proof:
+            answerIn(message, PROVING);
+            return {Verdict::Welcome, std::nullopt, {}};
+        case State::Over:
+            break;
+        }
+    } catch (std::exception const& e) {
+        return refusal(e.what());
+    }
+    return refusal("The greeting is over.");
+}
+
+GreetingStep ClientGreeting::prove(Frame const& message) {
+    json::Object const answer = answerIn(message, CHALLENGE);
+    std::string const serviceNonce = answer.get(NONCE).toString();
+    auto const proof = [&](Side side) {
+        return makeProof(side, terms_.token, terms_.nonce, serviceNonce, terms_.fingerprint);
+    };
+    if (!isSameProof(answer.get(PROOF).toString(), proof(Side::Service)))
+        return refusal("Whoever answers there does not know our access token.");
+    GreetingStep step = goOn(Kind::Request, PROVING, {{PROOF, proof(Side::Client)}});
+    state_ = State::Proof;
+    return step;
+}
+
+} // namespace Channel
