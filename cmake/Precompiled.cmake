@@ -23,3 +23,10 @@ function(vlservice_precompile name)
 endfunction()
 
 vlservice_precompile(vlservice_precompiled PIC HEADERS ${VLSERVICE_COMMON_HEADERS})
+
+# Has an executable use the libraries' set, for which it has to be position independent as they are.
+function(vlservice_use_precompiled name)
+    set_target_properties(${name} PROPERTIES POSITION_INDEPENDENT_CODE OFF)
+    target_compile_options(${name} PRIVATE -fPIC)
+    target_precompile_headers(${name} REUSE_FROM vlservice_precompiled)
+endfunction()

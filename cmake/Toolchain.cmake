@@ -7,6 +7,13 @@ if(CCACHE_PROGRAM AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
         ${CMAKE_COMMAND} -E env CCACHE_SLOPPINESS=pch_defines,time_macros ${CCACHE_PROGRAM})
 endif()
 
+# What is built while developing is linked some sixty times; lld takes a quarter of the time. What is released comes from
+# the system's linker.
+find_program(LLD_PROGRAM ld.lld)
+if(LLD_PROGRAM AND CMAKE_BUILD_TYPE STREQUAL "Debug")
+    add_link_options(-fuse-ld=lld)
+endif()
+
 set(VLSERVICE_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize= takes them")
 if(VLSERVICE_SANITIZE)
     add_compile_options(-fsanitize=${VLSERVICE_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
