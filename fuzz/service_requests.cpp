@@ -48,7 +48,7 @@ struct MemoryService {
 
     void requireReadable() {
         for (VlServiced::SettingsNode const& node : store.nodes())
-            settings.effective(node.id, {});
+            settings.effective({node.id, {}});
         settings.tree();
     }
 };

@@ -2,8 +2,10 @@
 
 #include "programs/base/error.h"
 #include "programs/base/one_line.h"
+#include "programs/protocol/failure.h"
+#include "programs/protocol/query.h"
 #include "programs/vlserviced/jobs/job_list.h"
-#include "programs/vlserviced/settings/parts.h"
+#include "programs/vlserviced/settings/estimate.h"
 #include "vlservice/ipc/cfg_ids_for_user.h"
 #include "vlservice/ipc/cfg_ids_tree.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
@@ -42,16 +44,7 @@ template<typename Operation>
 json::Object answerOrError(Ipc::CmdI const& cmd, Operation operation) {
     json::Object answer;
     std::string const error = errorOf(cmd, [&] { answer = operation(); });
-    return error.empty() ? answer : json::Object{{"err", error}};
-}
-
-std::vector<std::string> partsIn(json::Object const& query) {
-    json::Value const parts = query.get("parts");
-    std::vector<std::string> names;
-    if (parts)
-        for (json::Value const& part : parts.toArray())
-            names.emplace_back(part.toString());
-    return names;
+    return error.empty() ? answer : Protocol::failureAnswer(error);
 }
 
 } // namespace
@@ -71,22 +64,17 @@ void Processor::visit(Ipc::CSConfigIdsList& cmd) {
     cmd.setResp(answerOrError(cmd, [&] { return answer(cmd.reqParams()); }));
 }
 
-/// The command has one payload for many questions: "query" says which.
-json::Object Processor::answer(json::Object const& query) const {
-    std::string const kind = query.get("query").textOrEmpty();
-    if (kind == "settings")
-        return settingsOf(query);
-    if (kind == "jobs")
-        return listJobs(query, jobs_, settings_, outbox_, now_());
-    throw Base::Error("there is no query \"" + kind + "\"; there are settings, jobs");
-}
-
-json::Object Processor::settingsOf(json::Object const& query) const {
-    json::Value const id = query.get("id");
-    // Anything but a text would read as the root.
-    if (!id.isString())
-        throw Base::Error("\"id\" of a query for settings has to be the id of a node");
-    return settings_.effective(id.toString(), partsIn(query));
+/// The command has one payload for many questions.
+json::Object Processor::answer(json::Object const& question) const {
+    using Protocol::JobsQuery;
+    using Protocol::SettingsQuery;
+    std::string const kind = Protocol::kindOf(question);
+    if (kind == SettingsQuery::KIND)
+        return settings_.effective(SettingsQuery(question)).serialize();
+    if (kind == JobsQuery::KIND)
+        return listJobs(JobsQuery(question), jobs_, settings_, outbox_, now_()).serialize();
+    throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
+                      JobsQuery::KIND);
 }
 
 void Processor::visit(Ipc::GuiFwd&) { throw Base::Error("the service forwards nothing to a user interface"); }
@@ -98,13 +86,10 @@ void Processor::visit(Ipc::GetSvcCfg& cmd) {
 }
 
 json::Object Processor::serviceOverview() const {
-    json::Object overview = settings_.service().stored();
-    overview.set("outbox", outbox_.string());
     json::Object counts;
     for (auto const& [state, count] : jobs_.counts())
-        counts.set(stateName(state), count);
-    overview.set("jobs", counts);
-    return overview;
+        counts.set(Protocol::stateName(state), count);
+    return Protocol::serviceOverview(settings_.service().stored(), outbox_.string(), counts);
 }
 
 void Processor::visit(Ipc::ProcessPack& cmd) {
@@ -112,7 +97,9 @@ void Processor::visit(Ipc::ProcessPack& cmd) {
 }
 
 void Processor::visit(Ipc::PriceEst& cmd) {
-    cmd.setResp(answerOrError(cmd, [&] { return estimate(cmd.reqParams(), settings_.service().tariff()); }));
+    cmd.setResp(answerOrError(cmd, [&] {
+        return estimate(Protocol::PriceRequest(cmd.reqParams()), settings_.service().tariff()).serialize();
+    }));
 }
 
 void Processor::visit(Ipc::UpdateCfg& cmd) {
@@ -124,7 +111,7 @@ void Processor::visit(Ipc::UpdateStatus& cmd) { runner_.updateStatus(cmd.dbHost(
 void Processor::visit(Ipc::UploadQueued& cmd) { runner_.upload(cmd.dbHost(), cmd.dbName()); }
 
 void Processor::visit(Ipc::CfgIdsTree& cmd) {
-    cmd.setResp(answerOrError(cmd, [&] { return settings_.tree(); }));
+    cmd.setResp(answerOrError(cmd, [&] { return settings_.tree().serialize(); }));
 }
 
 void Processor::visit(Ipc::CfgIdsForUser& cmd) {

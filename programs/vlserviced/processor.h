@@ -37,8 +37,7 @@ public:
     void visit(Ipc::SetPartBase& cmd) override;
 
 private:
-    json::Object answer(json::Object const& query) const;
-    json::Object settingsOf(json::Object const& query) const;
+    json::Object answer(json::Object const& question) const;
     json::Object serviceOverview() const;
 
     SettingsService& settings_;

@@ -4,10 +4,14 @@
 #include "programs/base/one_line.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
+#include "programs/protocol/query.h"
 #include "programs/vlserviced/discovery_answer.h"
+#include "programs/vlserviced/jobs/held_queries.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/schema.h"
+#include "vlservice/cfg/inet.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/platform/log.h"
 
@@ -63,6 +67,19 @@ void removeUnfinished(fs::path const& outbox) {
         fs::remove(file, ignored);
 }
 
+/// The question about jobs that a command asks and that may wait; one that does not when it asks none. What
+/// is wrong with a question is told when it is answered.
+Protocol::JobsQuery waitedFor(Ipc::CmdI const& cmd) {
+    auto const* const list = dynamic_cast<Ipc::CSConfigIdsList const*>(&cmd);
+    if (!list || Protocol::kindOf(list->reqParams()) != Protocol::JobsQuery::KIND)
+        return {};
+    try {
+        return Protocol::JobsQuery(list->reqParams());
+    } catch (std::exception const&) {
+        return {};
+    }
+}
+
 std::string announcedHost(Options const& options) {
     if (!options.announce.empty())
         return options.announce;
@@ -87,7 +104,10 @@ public:
         : data_(options.data), outbox_(preparedOutbox(options, data_)),
           database_(openServiceDatabase(data_.database())),
           server_(std::in_place, io_, serverSettings(options, data_), &Ipc::makeEmptyCmd,
-                  Channel::acceptAtOnce(processor_)) {
+                  [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+                      handle(cmd, answer);
+                  }) {
+        jobs_.onChange([this](std::string const& packId) { held_.onChange(packId); });
         removeUnfinished(outbox_);
         if (options.answersDiscovery)
             discovery_.emplace(io_, announcedHost(options), server_->port());
@@ -132,7 +152,20 @@ private:
         }
     }
 
+    /// What asks to wait for jobs is answered when they have moved; all else at once.
+    void handle(std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+        held_.hold(waitedFor(*cmd), [this, cmd, answer] {
+            try {
+                cmd->accept(*processor_);
+                answer();
+            } catch (std::exception const& failure) {
+                answer.fail(failure.what());
+            }
+        });
+    }
+
     void stop() {
+        held_.releaseAll();
         server_->stop();
         discovery_.reset();
         upkeep_.cancel();
@@ -159,9 +192,8 @@ private:
     }
 
     std::chrono::hours statusUpdateTime() const {
-        json::Object const inet =
-            settings_.effective("", {"inet"}).get("parts").toObject().get("inet").toObject();
-        long long const hours = inet.get("values").toObject().get("status_update_hours").intOrZero();
+        long long const hours =
+            settings_.values("", Cfg::Inet::PART_NAME).get("status_update_hours").intOrZero();
         return std::chrono::hours(hours > 0 ? hours : 1);
     }
 
@@ -180,6 +212,7 @@ private:
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
+    HeldQueries held_{io_, jobs_};
     JobRunner runner_{jobs_, surroundings()};
     std::shared_ptr<Processor> processor_ =
         std::make_shared<Processor>(settings_, jobs_, runner_, outbox_, &now);

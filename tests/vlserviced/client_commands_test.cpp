@@ -205,8 +205,8 @@ TEST_F(ClientCommands, AMailingIsSentHandedOnAndFollowed) {
     {
         auto const client = clientOf(service_, data_);
         VlMail::sendPack(*client, database, "p1", false);
-        EXPECT_EQ(VlMail::awaitJob(*client, "p1", std::chrono::seconds(60)).get("state"),
-                  json::Value("queued"));
+        EXPECT_EQ(VlMail::awaitJob(*client, "p1", std::chrono::seconds(60)).state,
+                  Protocol::JobState::Queued);
         EXPECT_EQ(failureOf([&] { VlMail::awaitJob(*client, "p2", std::chrono::seconds(60)); }),
                   "the service has no job of pack p2; send it again");
     }

@@ -47,10 +47,7 @@ TEST_F(ServiceDocument, HasExamplesThatAreAnsweredAsItSays) {
 
 TEST_F(ServiceDocument, NamesEveryStateAndEveryKeyOfAJob) {
     std::string const text = document();
-    using VlServiced::JobState;
-    for (JobState const state :
-         {JobState::Accepted, JobState::Queued, JobState::Submitting, JobState::Submitted, JobState::Lodged,
-          JobState::Delivered, JobState::Failed})
+    for (Protocol::JobState const state : Protocol::ALL_JOB_STATES)
         EXPECT_NE(text.find("| \"" + std::string(stateName(state)) + "\" |"), std::string::npos)
             << stateName(state);
     for (char const* key : {"problem", "alarm", "to_upload", "container", "accepted", "changed", "documents"})

@@ -57,8 +57,7 @@ struct Destination {
 /// What counts at the node, as the service tells it.
 NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
     std::string const& name = Cfg::Presets::PART_NAME;
-    json::Object const parts = fetchSettings(service, nodeId, {name}).get("parts").toObject();
-    json::Value const presets = parts.get(name).toObject().get("values");
+    json::Object const presets = fetchSettings(service, nodeId, {name}).part(name).values;
     return NodeSettings::resolved({{name.c_str(), presets}}, "the service, at " + nodeInWords(nodeId));
 }
 

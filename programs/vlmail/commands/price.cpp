@@ -9,6 +9,7 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/pack/pack_wrapper.h"
 
+#include <algorithm>
 #include <charconv>
 #include <memory>
 #include <optional>
@@ -29,14 +30,14 @@ struct Options {
 };
 
 /// "20x3" is 20 letters of 3 pages, "3" one letter of 3 pages.
-std::optional<PricedLetters> batchIn(std::string const& text) {
+std::optional<Protocol::LetterBatch> batchIn(std::string const& text) {
     auto const number = [](std::string const& digits) {
         long long value = 0;
         auto const [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), value);
         return error == std::errc() && end == digits.data() + digits.size() && value > 0 ? value : 0;
     };
     auto const cross = text.find('x');
-    PricedLetters batch;
+    Protocol::LetterBatch batch;
     batch.count = cross == std::string::npos ? 1 : number(text.substr(0, cross));
     batch.pages = number(cross == std::string::npos ? text : text.substr(cross + 1));
     return batch.count > 0 && batch.pages > 0 ? std::optional(batch) : std::nullopt;
@@ -50,46 +51,46 @@ Mailing::Metadata metadataOf(std::string const& file) {
     return Mailing::Metadata::fromBlob(container.inputFullMeta());
 }
 
-std::vector<PricedLetters> lettersIn(Options const& options) {
-    std::vector<PricedLetters> batches;
+std::vector<Protocol::LetterBatch> lettersIn(Options const& options) {
+    std::vector<Protocol::LetterBatch> batches;
     for (std::string const& text : options.what) {
-        if (std::optional<PricedLetters> const batch = batchIn(text)) {
+        if (std::optional<Protocol::LetterBatch> const batch = batchIn(text)) {
             batches.push_back(*batch);
         } else {
-            std::vector<PricedLetters> const ofMailing = pricedLettersOf(metadataOf(text));
+            std::vector<Protocol::LetterBatch> const ofMailing = pricedLettersOf(metadataOf(text));
             batches.insert(batches.end(), ofMailing.begin(), ofMailing.end());
         }
     }
-    for (PricedLetters& batch : batches) {
+    for (Protocol::LetterBatch& batch : batches) {
+        batch.colour |= options.colour;
         batch.duplex |= options.duplex;
         batch.priority |= options.priority;
     }
     return batches;
 }
 
-void print(std::ostream& out, std::vector<PricedLetters> const& batches, json::Object const& estimate) {
-    std::string const currency = estimate.get("currency").textOrEmpty();
+void print(std::ostream& out, std::vector<Protocol::LetterBatch> const& batches,
+           Protocol::Estimate const& estimate) {
     constexpr auto RIGHT = TextTable::Align::Right;
-    TextTable table({{"letters", RIGHT}, {"pages each", RIGHT}, {"sheets each", RIGHT}, {currency, RIGHT}});
-    json::Array const prices = estimate.get("letters").toArray();
-    for (std::size_t i = 0; i < batches.size(); ++i) {
-        json::Object const price = prices.at(i).toObject();
+    TextTable table(
+        {{"letters", RIGHT}, {"pages each", RIGHT}, {"sheets each", RIGHT}, {estimate.currency, RIGHT}});
+    for (std::size_t i = 0; i < std::min(batches.size(), estimate.letters.size()); ++i) {
+        auto const& [sheets, price] = estimate.letters[i];
         table.addRow({std::to_string(batches[i].count), std::to_string(batches[i].pages),
-                      std::to_string(price.get("sheets").intOrZero()),
-                      money(price.get("price").intOrZero())});
+                      std::to_string(sheets), money(price)});
     }
     table.print(out);
-    out << "in all " << money(estimate.get("total").intOrZero()) << ' ' << currency << '\n';
+    out << "in all " << money(estimate.total) << ' ' << estimate.currency << '\n';
 }
 
 int showPrice(Options const& options, Terminal const& terminal) {
-    std::vector<PricedLetters> const batches = lettersIn(options);
+    std::vector<Protocol::LetterBatch> const batches = lettersIn(options);
     auto const service = connectToService(options.service, terminal);
-    json::Object const prices = estimatePrice(*service, batches, options.colour);
+    json::Object const prices = estimatePrice(*service, batches);
     if (options.json)
         terminal.out << prices << '\n';
     else
-        print(terminal.out, batches, prices);
+        print(terminal.out, batches, Protocol::Estimate(prices));
     return FINE;
 }
 
@@ -100,7 +101,7 @@ void addPriceCommand(Base::Command const& app, Task& task) {
     Base::Command const price =
         app.addCommand("price", "Estimates what letters cost, by the service's tariff");
     price.addOption("WHAT", options->what, "Mailing files, or letters and pages of each: 20x3").required();
-    price.addFlag("--colour", options->colour, "Printed in colour");
+    price.addFlag("--colour", options->colour, "Printed in colour, also where the mailing does not say so");
     price.addFlag("--duplex", options->duplex,
                   "Printed on both sides, also where the mailing does not say so");
     price.addFlag("--priority", options->priority,

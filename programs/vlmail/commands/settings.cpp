@@ -21,12 +21,9 @@ std::string nodeIdIn(std::string const& text) {
 
 std::string nodeInWords(std::string const& id) { return id.empty() ? "the root" : id; }
 
-json::Object fetchSettings(Channel::Client& service, std::string const& nodeId,
-                           std::vector<std::string> const& parts) {
-    json::Array names;
-    for (std::string const& part : parts)
-        names.append(part);
-    return ask(service, {{"query", "settings"}, {"id", nodeId}, {"parts", names}});
+Protocol::SettingsAnswer fetchSettings(Channel::Client& service, std::string const& nodeId,
+                                       std::vector<std::string> const& parts) {
+    return Protocol::SettingsAnswer(ask(service, {nodeId, parts}));
 }
 
 std::string valueInWords(json::Value const& value) {

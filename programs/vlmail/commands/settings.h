@@ -24,9 +24,9 @@ std::string nodeIdIn(std::string const& text);
 /// "the root" or the id.
 std::string nodeInWords(std::string const& id);
 
-/// A node's settings as the service answers: "own", "values" and "origins" by part.
-json::Object fetchSettings(Channel::Client& service, std::string const& nodeId,
-                           std::vector<std::string> const& parts);
+/// A node's settings as the service answers.
+Protocol::SettingsAnswer fetchSettings(Channel::Client& service, std::string const& nodeId,
+                                       std::vector<std::string> const& parts);
 
 /// A value as JSON text, a string without its quotes.
 std::string valueInWords(json::Value const& value);

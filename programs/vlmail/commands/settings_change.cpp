@@ -53,16 +53,10 @@ void setPart(Channel::Client& service, std::string const& node, std::string cons
     throw Base::Error("there is no part \"" + part + "\"; name app, inet, po, deps, profiles or presets");
 }
 
-/// A part of a node: what it holds itself, and what counts there.
-struct PartSettings {
-    json::Object own;
-    json::Object values;
-};
+using Protocol::PartSettings;
 
 PartSettings fetchPart(Channel::Client& service, std::string const& node, std::string const& part) {
-    json::Object const settings =
-        fetchSettings(service, node, {part}).get("parts").toObject().get(part).toObject();
-    return {settings.get("own").toObject(), settings.get("values").toObject()};
+    return fetchSettings(service, node, {part}).part(part);
 }
 
 void requireKey(std::string const& part, std::string const& key, json::Object const& values) {

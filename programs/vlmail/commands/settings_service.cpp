@@ -2,6 +2,7 @@
 #include "programs/vlmail/commands/settings.h"
 
 #include "programs/base/error.h"
+#include "programs/protocol/service_settings.h"
 #include "programs/vlmail/commands/service_options.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/ipc/cs_config_srv_change.h"
@@ -23,27 +24,29 @@ struct Options {
     bool json = false;
 };
 
-enum class Kind { Text, List, Document };
+using Protocol::SettingForm;
 
-struct ServiceKey {
-    char const* key;
-    Kind kind;
-};
-constexpr ServiceKey SERVICE_KEYS[] = {
-    {"upload_folder", Kind::Text},
-    {"tariff", Kind::Document},
-    {"disabled", Kind::List},
-};
-
-json::Value parsed(std::string const& key, std::string const& text, Kind kind) {
+json::Value parsed(std::string const& key, std::string const& text, SettingForm form) {
     if (text.empty())
         return json::Value(json_null());
-    if (kind == Kind::Text)
+    if (form == SettingForm::Text)
         return text;
     // A document is given as it is or by its file.
-    if (kind == Kind::Document && text.front() != '{')
+    if (form == SettingForm::Document && text.front() != '{')
         return readDocument(text);
-    return valueIn(key, text, kind == Kind::List ? json::Value(json::Array()) : json::Value(json::Object()));
+    return valueIn(key, text,
+                   form == SettingForm::List ? json::Value(json::Array()) : json::Value(json::Object()));
+}
+
+/// "upload_folder=PATH, tariff=FILE or disabled=[...]".
+std::string assignmentsInWords() {
+    std::string words;
+    for (Protocol::ServiceSetting const& setting : Protocol::SETTABLE)
+        words += (words.empty()                                  ? ""
+                  : &setting == std::end(Protocol::SETTABLE) - 1 ? " or "
+                                                                 : ", ") +
+                 std::string(setting.key) + '=' + setting.placeholder;
+    return words;
 }
 
 json::Object changesIn(std::vector<std::string> const& assignments) {
@@ -51,12 +54,12 @@ json::Object changesIn(std::vector<std::string> const& assignments) {
     for (std::string const& assignment : assignments) {
         auto const equals = assignment.find('=');
         std::string const key = assignment.substr(0, equals);
-        auto const known = std::find_if(std::begin(SERVICE_KEYS), std::end(SERVICE_KEYS),
-                                        [&](ServiceKey const& row) { return key == row.key; });
-        if (equals == std::string::npos || known == std::end(SERVICE_KEYS))
-            throw Base::Error("\"" + assignment +
-                              "\" sets nothing; write upload_folder=PATH, tariff=FILE or disabled=[...]");
-        changes.set(key, parsed(key, assignment.substr(equals + 1), known->kind));
+        auto const known =
+            std::find_if(std::begin(Protocol::SETTABLE), std::end(Protocol::SETTABLE),
+                         [&](Protocol::ServiceSetting const& setting) { return key == setting.key; });
+        if (equals == std::string::npos || known == std::end(Protocol::SETTABLE))
+            throw Base::Error("\"" + assignment + "\" sets nothing; write " + assignmentsInWords());
+        changes.set(key, parsed(key, assignment.substr(equals + 1), known->form));
     }
     return changes;
 }
@@ -80,8 +83,11 @@ int serviceSettings(Options const& options, Terminal const& terminal) {
     return FINE;
 }
 
-constexpr std::pair<char const*, int> SUSPENSIONS[] = {
-    {"nothing", 0}, {"settings", 1}, {"jobs", 2}, {"all", 3}};
+constexpr std::pair<char const*, Protocol::Suspended> SUSPENSIONS[] = {
+    {"nothing", Protocol::Suspended::Nothing},
+    {"settings", Protocol::Suspended::SettingsChanges},
+    {"jobs", Protocol::Suspended::Jobs},
+    {"all", Protocol::Suspended::All}};
 
 int suspend(Options const& options, Terminal const& terminal) {
     auto const found = std::find_if(std::begin(SUSPENSIONS), std::end(SUSPENSIONS),

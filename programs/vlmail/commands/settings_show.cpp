@@ -44,10 +44,9 @@ class SettingsTable {
 public:
     explicit SettingsTable(bool withOrigin) : withOrigin_(withOrigin), table_(columns(withOrigin)) {}
 
-    void add(std::string const& part, json::Object const& settings) {
-        json::Object const origins = settings.get("origins").toObject();
-        for (auto const& [key, value] : settings.get("values").toObject()) {
-            json::Value const origin = origins.get(key);
+    void add(std::string const& part, Protocol::PartSettings const& settings) {
+        for (auto const& [key, value] : settings.values) {
+            json::Value const origin = settings.origins.get(key);
             // A list that is inherited by elements has an origin for each.
             if (origin.isArray())
                 addElements(part, key, value.toArray(), origin.toArray());
@@ -84,18 +83,17 @@ private:
 
 int showSettings(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal);
-    json::Object const answer = fetchSettings(*service, nodeIdIn(options.node), options.parts);
+    Protocol::SettingsAnswer const answer = fetchSettings(*service, nodeIdIn(options.node), options.parts);
     if (options.json) {
-        terminal.out << answer << '\n';
+        terminal.out << answer.serialize() << '\n';
         return FINE;
     }
     SettingsTable table(options.origin);
-    for (auto const& [part, settings] : answer.get("parts").toObject())
-        table.add(part, settings.toObject());
+    for (auto const& [part, settings] : answer.parts)
+        table.add(part, Protocol::PartSettings(settings.toObject()));
     table.print(terminal.out);
-    if (!answer.get("known").isTrue())
-        terminal.out << nodeInWords(answer.get("id").textOrEmpty())
-                     << " has no settings yet: all of this is inherited\n";
+    if (!answer.known)
+        terminal.out << nodeInWords(answer.id) << " has no settings yet: all of this is inherited\n";
     return FINE;
 }
 

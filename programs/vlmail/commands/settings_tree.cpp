@@ -19,19 +19,18 @@ struct Options {
     bool json = false;
 };
 
-std::string partsIn(json::Object const& node) {
+std::string partsIn(Protocol::TreeNode const& node) {
     std::string names;
-    for (json::Value const& part : node.get("parts").toArray())
-        names += (names.empty() ? "" : ", ") + part.textOrEmpty();
+    for (std::string const& part : node.parts)
+        names += (names.empty() ? "" : ", ") + part;
     return names;
 }
 
-void addBranch(TextTable& table, json::Object const& node, std::size_t depth) {
-    std::string const id = node.get("id").textOrEmpty();
-    table.addRow({std::string(2 * depth, ' ') + (id.empty() ? "/" : id), node.get("descr").textOrEmpty(),
-                  node.get("disabled").isTrue() ? "disabled" : "", partsIn(node)});
-    for (json::Value const& child : node.get("children").toArray())
-        addBranch(table, child.toObject(), depth + 1);
+void addBranch(TextTable& table, Protocol::TreeNode const& node, std::size_t depth) {
+    table.addRow({std::string(2 * depth, ' ') + (node.id.empty() ? "/" : node.id), node.description,
+                  node.disabled ? "disabled" : "", partsIn(node)});
+    for (Protocol::TreeNode const& child : node.children)
+        addBranch(table, child, depth + 1);
 }
 
 int showTree(Options const& options, Terminal const& terminal) {
@@ -42,7 +41,7 @@ int showTree(Options const& options, Terminal const& terminal) {
         return FINE;
     }
     TextTable table({{"node"}, {"description"}, {"state"}, {"own settings"}});
-    addBranch(table, tree, 0);
+    addBranch(table, Protocol::TreeNode(tree), 0);
     table.print(terminal.out);
     return FINE;
 }

@@ -7,6 +7,7 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/local_time.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <memory>
 #include <ostream>
@@ -23,54 +24,41 @@ struct Options {
 };
 
 /// What keeps a job from going on, and what should not take so long.
-std::string noteOn(json::Object const& job) {
-    std::string const problem = job.get("problem").textOrEmpty();
-    std::string const alarm = job.get("alarm").textOrEmpty();
-    return problem.empty() || alarm.empty() ? problem + alarm : problem + "; " + alarm;
+std::string noteOn(Protocol::JobReport const& job) {
+    return job.problem.empty() || job.alarm.empty() ? job.problem + job.alarm
+                                                    : job.problem + "; " + job.alarm;
 }
 
-void print(std::ostream& out, json::Array const& jobs) {
+void print(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
     constexpr auto RIGHT = TextTable::Align::Right;
     TextTable table(
         {{"mailing"}, {"state"}, {"since"}, {"documents", RIGHT}, {"pages", RIGHT}, {"title"}, {"note"}});
-    for (json::Value const& element : jobs) {
-        json::Object const& job = element.toObject();
-        table.addRow({job.get("id").textOrEmpty(), job.get("state").textOrEmpty(),
-                      LocalTime::toText(job.get("changed").intOrZero()),
-                      std::to_string(job.get("documents").intOrZero()),
-                      std::to_string(job.get("pages").intOrZero()), job.get("title").textOrEmpty(),
-                      noteOn(job)});
-    }
+    for (Protocol::JobReport const& job : jobs)
+        table.addRow({job.id, Protocol::stateName(job.state), LocalTime::toText(job.changed),
+                      std::to_string(job.documents), std::to_string(job.pages), job.title, noteOn(job)});
     if (table.empty())
         out << "the service has no such mailings\n";
     else
         table.print(out);
 }
 
-bool anyFailed(json::Array const& jobs) {
-    for (json::Value const& job : jobs)
-        if (job.toObject().get("state").textOrEmpty() == "failed")
-            return true;
-    return false;
+bool anyFailed(std::vector<Protocol::JobReport> const& jobs) {
+    return std::ranges::any_of(
+        jobs, [](Protocol::JobReport const& job) { return job.state == Protocol::JobState::Failed; });
 }
 
 int showStatus(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal);
     std::filesystem::path const database =
         options.database.empty() ? std::filesystem::path() : std::filesystem::absolute(options.database);
-    std::string const folder = database.parent_path().string();
-    std::string const name = database.filename().string();
+    Protocol::JobsQuery query;
+    query.folder = database.parent_path().string();
+    query.database = database.filename().string();
+    query.ids = options.packs;
     if (options.update)
-        service->call<Ipc::UpdateStatus>(folder, name);
-    json::Object query{{"query", "jobs"}, {"db_host", folder}, {"db_name", name}};
-    if (!options.packs.empty()) {
-        json::Array ids;
-        for (std::string const& pack : options.packs)
-            ids.append(pack);
-        query.set("ids", ids);
-    }
+        service->call<Ipc::UpdateStatus>(query.folder, query.database);
     json::Object const answer = ask(*service, query);
-    json::Array const jobs = answer.get("jobs").toArray();
+    std::vector<Protocol::JobReport> const jobs = Protocol::JobsAnswer(answer).jobs;
     if (options.json)
         terminal.out << answer << '\n';
     else

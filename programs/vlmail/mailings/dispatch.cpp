@@ -75,8 +75,7 @@ void Dispatch::finish() {
 
 void Dispatch::estimate(Channel::Client& service) {
     for (auto const& [packPreset, mailing] : mailings_)
-        prices_[mailing.get()] =
-            estimatePrice(service, pricedLettersOf(mailing->builder().metadata()), false);
+        prices_[mailing.get()] = estimatePrice(service, pricedLettersOf(mailing->builder().metadata()));
 }
 
 void Dispatch::fail(std::string const& name, std::string const& reason) {
@@ -111,7 +110,8 @@ std::string Dispatch::priceInWords(OutgoingMailing const* mailing) const {
     auto const found = prices_.find(mailing);
     if (found == prices_.end())
         return {};
-    return money(found->second.get("total").intOrZero()) + ' ' + found->second.get("currency").textOrEmpty();
+    Protocol::Estimate const estimate(found->second);
+    return money(estimate.total) + ' ' + estimate.currency;
 }
 
 json::Object Dispatch::toJson() const {

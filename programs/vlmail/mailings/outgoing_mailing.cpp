@@ -58,10 +58,10 @@ public:
     void finish() override {
         pack_.finish(builder_.metadata().toBlob());
         sendPack(service_, database_, id_, upload_);
-        json::Object const job = awaitJob(service_, id_, PATIENCE);
-        state_ = job.get("state").textOrEmpty();
-        if (json::Value const problem = job.get("problem"))
-            throw Base::Error("the service has trouble with mailing " + id_ + ": " + problem.textOrEmpty() +
+        Protocol::JobReport const job = awaitJob(service_, id_, PATIENCE);
+        state_ = Protocol::stateName(job.state);
+        if (!job.problem.empty())
+            throw Base::Error("the service has trouble with mailing " + id_ + ": " + job.problem +
                               "; see vlmail status");
     }
 

@@ -3,29 +3,20 @@
 
 #include "programs/channel/client.h"
 #include "programs/mailing/metadata.h"
-#include "vlservice/json/json.h"
+#include "programs/protocol/price.h"
 
 #include <string>
 #include <vector>
 
 namespace VlMail {
 
-/// Letters that cost the same each.
-struct PricedLetters {
-    long long count = 0;
-    long long pages = 0;
-    bool duplex = false;
-    bool priority = false;
-};
-
 /// The letters of a mailing, those of equal length together.
-std::vector<PricedLetters> pricedLettersOf(Mailing::Metadata const& mailing);
+std::vector<Protocol::LetterBatch> pricedLettersOf(Mailing::Metadata const& mailing);
 
-/// The service's estimate: {"currency", "total", "letters"}, amounts in hundredths. Throws std::exception
-/// with a line for people.
-json::Object estimatePrice(Channel::Client& service, std::vector<PricedLetters> const& letters, bool colour);
+/// The service's estimate as it answers it. Throws std::exception with a line for people.
+json::Object estimatePrice(Channel::Client& service, std::vector<Protocol::LetterBatch> const& letters);
 
-/// Hundredths as a person writes them.
+/// Hundredths as a person writes them: -0.05.
 std::string money(long long hundredths);
 
 } // namespace VlMail

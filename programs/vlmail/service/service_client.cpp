@@ -2,6 +2,8 @@
 
 #include "programs/base/error.h"
 #include "programs/channel/token.h"
+#include "programs/protocol/failure.h"
+#include "vlservice/cfg/app.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/discovery_base.h"
 #include "vlservice/ipc/discovery_cli.h"
@@ -16,7 +18,6 @@
 #include <cstdlib>
 #include <iostream>
 #include <ostream>
-#include <thread>
 #include <unistd.h>
 #include <utility>
 
@@ -26,7 +27,6 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr char const* DEFAULT_PACK_DATABASE = "packs.db";
-constexpr std::chrono::milliseconds POLL_TIME{100};
 constexpr std::size_t MAX_HOST_BYTES = 255;
 
 fs::path personalFolder(char const* variable, char const* belowHome) {
@@ -74,17 +74,6 @@ bool acceptsCertificate(std::string const& service, std::string const& fingerpri
     terminal.err << "Accept it from now on? (yes/no) " << std::flush;
     std::string reply;
     return std::getline(std::cin, reply) && reply == "yes";
-}
-
-std::string textIn(json::Object const& settings, char const* key) {
-    return settings.get("parts")
-        .toObject()
-        .get("app")
-        .toObject()
-        .get("values")
-        .toObject()
-        .get(key)
-        .textOrEmpty();
 }
 
 } // namespace
@@ -158,7 +147,7 @@ std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options,
 }
 
 json::Object const& requireAnswer(json::Object const& answer) {
-    requireNoError(answer.get("err").textOrEmpty());
+    requireNoError(Protocol::failureIn(answer));
     return answer;
 }
 
@@ -167,16 +156,19 @@ void requireNoError(std::string const& error) {
         throw Base::Error(error);
 }
 
-json::Object ask(Channel::Client& service, json::Object const& query) {
-    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query)->resp());
+json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query) {
+    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
+}
+
+json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query) {
+    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
 }
 
 fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
-    json::Array parts;
-    parts.append("app");
-    json::Object const settings = ask(service, {{"query", "settings"}, {"id", nodeId}, {"parts", parts}});
-    fs::path const folder = textIn(settings, "db_host");
-    std::string const name = textIn(settings, "db_name");
+    std::string const& app = Cfg::App::PART_NAME;
+    json::Object const values = Protocol::SettingsAnswer(ask(service, {nodeId, {app}})).part(app).values;
+    fs::path const folder = values.get("db_host").textOrEmpty();
+    std::string const name = values.get("db_name").textOrEmpty();
     return (folder.is_absolute() ? folder : dataFolder()) / (name.empty() ? DEFAULT_PACK_DATABASE : name);
 }
 
@@ -189,19 +181,20 @@ void sendPack(Channel::Client& service, fs::path const& database, std::string co
         service.call<Ipc::UploadQueued>(folder, name);
 }
 
-json::Object awaitJob(Channel::Client& service, std::string const& packId, std::chrono::milliseconds time) {
-    json::Array ids;
-    ids.append(packId);
+Protocol::JobReport awaitJob(Channel::Client& service, std::string const& packId,
+                             std::chrono::milliseconds time) {
     auto const end = std::chrono::steady_clock::now() + time;
+    Protocol::JobsQuery query;
+    query.ids = {packId};
     for (;;) {
-        json::Value const job = ask(service, {{"query", "jobs"}, {"ids", ids}}).get("jobs").toArray().at(0);
-        if (!job)
+        auto const left =
+            std::chrono::ceil<std::chrono::milliseconds>(end - std::chrono::steady_clock::now()).count();
+        query.wait = std::max<long long>(left, 0);
+        Protocol::JobsAnswer const answer(ask(service, query));
+        if (answer.jobs.empty())
             throw Base::Error("the service has no job of pack " + packId + "; send it again");
-        bool const waits =
-            job.toObject().get("state").textOrEmpty() == "accepted" && !job.toObject().get("problem");
-        if (!waits || std::chrono::steady_clock::now() >= end)
-            return job.toObject();
-        std::this_thread::sleep_for(POLL_TIME);
+        if (!waitsForPages(answer.jobs.front()) || left <= 0)
+            return answer.jobs.front();
     }
 }
 

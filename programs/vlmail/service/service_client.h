@@ -2,6 +2,8 @@
 // How the subcommands reach the service: by a name or by discovery, with the access token.
 
 #include "programs/channel/client.h"
+#include "programs/protocol/job.h"
+#include "programs/protocol/settings.h"
 #include "programs/vlmail/terminal/terminal.h"
 #include "vlservice/json/json.h"
 
@@ -52,8 +54,10 @@ std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
 json::Object const& requireAnswer(json::Object const& answer);
 /// Throws Error when the text is not empty.
 void requireNoError(std::string const& error);
-/// Asks one of the questions of CSConfigIdsList, whose parameters are described in docs/service.md.
-json::Object ask(Channel::Client& service, json::Object const& query);
+/// Asks a question and gives the answer as it came, in the form of the type that belongs to the question.
+/// Throws Error with the service's line.
+json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query);
+json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query);
 
 /// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
 /// otherwise "packs.db" in dataFolder().
@@ -64,7 +68,8 @@ void sendPack(Channel::Client& service, std::filesystem::path const& database, s
               bool upload);
 /// What the service knows of a pack's job, as soon as the job has left "accepted" or has a problem, or when
 /// the time is up. Throws Error when there is no such job.
-json::Object awaitJob(Channel::Client& service, std::string const& packId, std::chrono::milliseconds time);
+Protocol::JobReport awaitJob(Channel::Client& service, std::string const& packId,
+                             std::chrono::milliseconds time);
 
 /// The person's folders for this program, by the usual variables or below the home folder.
 std::filesystem::path configFolder();

@@ -2,7 +2,7 @@
 // From a pack in a client's database to a container in the outbox.
 
 #include "programs/base/error.h"
-#include "programs/vlserviced/jobs/job.h"
+#include "programs/vlserviced/store/job.h"
 
 #include <filesystem>
 

@@ -1,50 +1,13 @@
 #include "programs/vlserviced/jobs/job_list.h"
 
-#include "programs/base/error.h"
+#include "vlservice/cfg/inet.h"
 
 #include <algorithm>
-#include <optional>
+#include <map>
 #include <utility>
 
 namespace VlServiced {
 namespace {
-
-constexpr std::size_t MAX_JOBS = 1000;
-
-[[noreturn]] void refuse(char const* key, char const* wanted) {
-    throw Base::Error(std::string("\"") + key + "\" of a query for jobs has to be " + wanted);
-}
-
-std::string textIn(json::Object const& query, char const* key) {
-    json::Value const value = query.get(key);
-    if (value && !value.isString())
-        refuse(key, "a text");
-    return value.textOrEmpty();
-}
-
-std::vector<std::string> textsIn(json::Object const& query, char const* key) {
-    json::Value const value = query.get(key);
-    if (!value)
-        return {};
-    if (!value.isArray())
-        refuse(key, "an array of texts");
-    std::vector<std::string> texts;
-    for (json::Value const& element : value.toArray()) {
-        if (!element.isString())
-            refuse(key, "an array of texts");
-        texts.push_back(element.textOrEmpty());
-    }
-    return texts;
-}
-
-std::size_t limitIn(json::Object const& query) {
-    json::Value const value = query.get("limit");
-    if (!value)
-        return MAX_JOBS;
-    if (!value.isInt() || value.toInt() < 1)
-        refuse("limit", "an integer above 0");
-    return static_cast<std::size_t>(std::min(value.toInt(), static_cast<long long>(MAX_JOBS)));
-}
 
 /// How long a job may stay in a state, by the settings of its node.
 struct AlarmRule {
@@ -58,16 +21,35 @@ constexpr AlarmRule ALARM_RULES[] = {
     {JobState::Lodged, "lodged_alarm_hours", "the carrier has not reported for "},
 };
 
-std::string alarmOf(Job const& job, SettingsService const& settings, long long now) {
-    auto const rule = std::find_if(std::begin(ALARM_RULES), std::end(ALARM_RULES),
-                                   [&](AlarmRule const& r) { return r.state == job.state; });
-    if (rule == std::end(ALARM_RULES))
-        return {};
-    json::Value const inet = settings.effective(job.cfgId, {"inet"}).get("parts").toObject().get("inet");
-    long long const allowed = inet.toObject().get("values").toObject().get(rule->hoursKey).intOrZero();
-    long long const waited = (now - job.changedAt) / 3600;
-    return allowed > 0 && waited >= allowed ? rule->text + std::to_string(waited) + " hours" : std::string();
-}
+/// Tells what has taken too long. Jobs of one node are asked about together, so each node's settings are
+/// resolved once.
+class Alarms {
+public:
+    Alarms(SettingsService const& settings, long long now) : settings_(settings), now_(now) {}
+
+    std::string of(Job const& job) {
+        auto const rule = std::find_if(std::begin(ALARM_RULES), std::end(ALARM_RULES),
+                                       [&](AlarmRule const& r) { return r.state == job.state; });
+        if (rule == std::end(ALARM_RULES))
+            return {};
+        long long const allowed = settingsOf(job.cfgId).get(rule->hoursKey).intOrZero();
+        long long const waited = (now_ - job.changedAt) / 3600;
+        return allowed > 0 && waited >= allowed ? rule->text + std::to_string(waited) + " hours"
+                                                : std::string();
+    }
+
+private:
+    json::Object const& settingsOf(std::string const& node) {
+        auto const found = byNode_.find(node);
+        if (found != byNode_.end())
+            return found->second;
+        return byNode_.emplace(node, settings_.values(node, Cfg::Inet::PART_NAME)).first->second;
+    }
+
+    SettingsService const& settings_;
+    long long now_;
+    std::map<std::string, json::Object> byNode_;
+};
 
 std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
     switch (job.state) {
@@ -81,34 +63,37 @@ std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
     }
 }
 
-void setUnlessEmpty(json::Object& object, char const* key, std::string const& text) {
-    if (!text.empty())
-        object.set(key, text);
-}
-
-json::Object objectOf(Job const& job, std::string const& alarm, std::string const& container) {
-    json::Object object{{"id", job.pack.packId},      {"state", stateName(job.state)},
-                        {"title", job.title},         {"cfg_id", job.cfgId},
-                        {"db_host", job.pack.folder}, {"db_name", job.pack.database},
-                        {"documents", job.documents}, {"pages", job.pages},
-                        {"accepted", job.acceptedAt}, {"changed", job.changedAt}};
-    setUnlessEmpty(object, "problem", job.problem);
-    setUnlessEmpty(object, "alarm", alarm);
-    if (job.toUpload)
-        object.set("to_upload", true);
-    setUnlessEmpty(object, "container", container);
-    return object;
+Protocol::JobReport reportOf(Job const& job) {
+    Protocol::JobReport report;
+    report.id = job.pack.packId;
+    report.state = job.state;
+    report.title = job.title;
+    report.cfgId = job.cfgId;
+    report.folder = job.pack.folder;
+    report.database = job.pack.database;
+    report.documents = job.documents;
+    report.pages = job.pages;
+    report.accepted = job.acceptedAt;
+    report.changed = job.changedAt;
+    report.problem = job.problem;
+    report.toUpload = job.toUpload;
+    return report;
 }
 
 } // namespace
 
-json::Object listJobs(json::Object const& query, JobStore const& jobs, SettingsService const& settings,
-                      std::filesystem::path const& outbox, long long now) {
-    JobFilter const filter{textIn(query, "db_host"), textIn(query, "db_name"), textsIn(query, "ids")};
-    json::Array list;
-    for (Job const& job : jobs.matching(filter, limitIn(query)))
-        list.append(objectOf(job, alarmOf(job, settings, now), containerOf(job, outbox)));
-    return {{"jobs", list}};
+Protocol::JobsAnswer listJobs(Protocol::JobsQuery const& query, JobStore const& jobs,
+                              SettingsService const& settings, std::filesystem::path const& outbox,
+                              long long now) {
+    Alarms alarms(settings, now);
+    Protocol::JobsAnswer answer;
+    auto const limit = static_cast<std::size_t>(std::min(query.limit, Protocol::JobsQuery::MAX_JOBS));
+    for (Job const& job : jobs.matching({query.folder, query.database, query.ids}, limit)) {
+        Protocol::JobReport& report = answer.jobs.emplace_back(reportOf(job));
+        report.alarm = alarms.of(job);
+        report.container = containerOf(job, outbox);
+    }
+    return answer;
 }
 
 } // namespace VlServiced

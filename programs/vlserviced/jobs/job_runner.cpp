@@ -6,10 +6,9 @@
 #include "programs/mailing/pack_database.h"
 #include "programs/vlserviced/jobs/container.h"
 #include "programs/vlserviced/jobs/hand_over.h"
-#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/store/node_id.h"
 #include "vlservice/platform/log.h"
 
-#include <limits>
 #include <system_error>
 #include <utility>
 
@@ -19,7 +18,6 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr std::size_t MAX_TITLE_BYTES = 500;
-constexpr std::size_t ALL = std::numeric_limits<std::size_t>::max();
 
 /// One spelling for a folder, so that jobs are found again by it.
 std::string folderText(std::string const& folder) {
@@ -159,7 +157,7 @@ void JobRunner::upload(std::string const& folder, std::string const& database) {
 }
 
 void JobRunner::updateStatus(std::string const& folder, std::string const& database) {
-    for (Job const& job : jobs_.matching({folder.empty() ? folder : folderText(folder), database, {}}, ALL)) {
+    for (Job const& job : jobs_.unfinished(folder.empty() ? folder : folderText(folder), database)) {
         if (job.state == JobState::Submitted || job.state == JobState::Lodged)
             refresh(job);
         else

@@ -1,6 +1,7 @@
 #include "programs/vlserviced/settings/parts.h"
 
 #include "programs/base/error.h"
+#include "programs/protocol/settings.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/cfg/departments.h"
 #include "vlservice/cfg/inet.h"
@@ -175,20 +176,20 @@ json::Array originsOfElements(PartKind const& kind, char const* key, Chain const
 }
 
 json::Object resolvePart(PartKind const& kind, Chain const& chain) {
-    json::Object values;
-    json::Object origins;
+    Protocol::PartSettings settings;
     for (auto const& [key, written] : kind.effective(chain)) {
         if (kind.lists == Inheritance::ByElements) {
             json::Array const list = unwrappedElements(written.toArray());
-            origins.set(key, originsOfElements(kind, key, chain, list.size()));
-            values.set(key, list);
+            settings.origins.set(key, originsOfElements(kind, key, chain, list.size()));
+            settings.values.set(key, list);
         } else {
-            origins.set(key, originOfValue(kind, key, chain));
-            values.set(key, unwrapped(written));
+            settings.origins.set(key, originOfValue(kind, key, chain));
+            settings.values.set(key, unwrapped(written));
         }
     }
-    json::Value const own = chain.front().parts.get(kind.name);
-    return {{"own", own ? own : json::Object()}, {"values", values}, {"origins", origins}};
+    if (json::Value const own = chain.front().parts.get(kind.name))
+        settings.own = own.toObject();
+    return settings.serialize();
 }
 
 } // namespace

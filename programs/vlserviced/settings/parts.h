@@ -18,10 +18,8 @@ std::vector<std::string> const& partNames();
 /// Throws Error with one line when the part has a key that is not its own or a value of a wrong type.
 json::Value ownForm(std::string const& part, json::Value const& sent);
 
-/// The settings that count at the first node of a chain: for each wanted part an object of
-/// "own" (the node's own values, flat), "values" (key to effective value) and "origins" (key to the id of
-/// the node that the value comes from, JSON null for a built-in value; for a list that is inherited by
-/// elements, an array with one origin an element).
+/// The settings that count at the first node of a chain: the form of Protocol::PartSettings for each wanted
+/// part, by its name.
 /// Throws Error with one line that names node and part when a stored part cannot be read.
 json::Object resolve(std::vector<SettingsLevel> const& chain, std::vector<std::string> const& wantedParts);
 

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/settings/service_settings.h"
 
 #include "programs/base/error.h"
-#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/store/node_id.h"
 #include "vlservice/cfg/cfg_node_id.h"
 #include "vlservice/cfg/id.h"
 
@@ -12,22 +12,20 @@
 namespace VlServiced {
 namespace {
 
-constexpr char const* UPLOAD_FOLDER = "upload_folder";
-constexpr char const* TARIFF = "tariff";
-constexpr char const* DISABLED = "disabled";
-constexpr char const* SUSPENDED = "suspended";
+using Values = Protocol::ServiceSettings;
 
 void checkUploadFolder(json::Value const& value) {
     std::filesystem::path const folder = value.textOrEmpty();
     std::error_code error;
     if (!folder.is_absolute() || !std::filesystem::is_directory(folder, error))
-        throw Base::Error("\"upload_folder\" has to be the absolute path of a folder that is there");
+        throw Base::Error('"' + std::string(Values::UPLOAD_FOLDER) +
+                          "\" has to be the absolute path of a folder that is there");
 }
 
 void checkTariff(json::Value const& value) {
     if (!value.isObject())
         throw Base::Error("\"tariff\" has to be an object");
-    Tariff const readable(value.toObject());
+    Protocol::Tariff const readable(value.toObject());
 }
 
 void checkDisabled(json::Value const& value) {
@@ -41,49 +39,55 @@ void checkDisabled(json::Value const& value) {
     }
 }
 
-constexpr std::pair<char const*, void (*)(json::Value const&)> SETTABLE[] = {
-    {UPLOAD_FOLDER, &checkUploadFolder},
-    {TARIFF, &checkTariff},
-    {DISABLED, &checkDisabled},
-};
+void checkValue(std::string const& key, json::Value const& value) {
+    if (key == Values::UPLOAD_FOLDER)
+        checkUploadFolder(value);
+    else if (key == Values::TARIFF)
+        checkTariff(value);
+    else
+        checkDisabled(value);
+}
+
+bool isSettable(std::string const& key) {
+    return std::ranges::any_of(Protocol::SETTABLE,
+                               [&](Protocol::ServiceSetting const& setting) { return key == setting.key; });
+}
+
+std::string settableKeys() {
+    std::string keys;
+    for (Protocol::ServiceSetting const& setting : Protocol::SETTABLE)
+        keys += (keys.empty() ? "" : ", ") + std::string(setting.key);
+    return keys;
+}
 
 void checkChange(std::string const& key, json::Value const& value) {
-    auto const* const row =
-        std::find_if(std::begin(SETTABLE), std::end(SETTABLE), [&](auto const& r) { return key == r.first; });
-    if (row == std::end(SETTABLE))
-        throw Base::Error("the service has no setting \"" + key +
-                          "\"; there are upload_folder, tariff, disabled");
+    if (!isSettable(key))
+        throw Base::Error("the service has no setting \"" + key + "\"; there are " + settableKeys());
     if (!json_is_null(value.node()))
-        row->second(value);
+        checkValue(key, value);
 }
 
 } // namespace
 
-ServiceSettings::ServiceSettings(json::Object stored) : stored_(std::move(stored)) {}
+ServiceSettings::ServiceSettings(json::Object stored) : stored_(std::move(stored)), values_(stored_) {}
 
-std::string ServiceSettings::uploadFolder() const { return stored_.get(UPLOAD_FOLDER).textOrEmpty(); }
-
-Tariff ServiceSettings::tariff() const {
-    json::Value const tariff = stored_.get(TARIFF);
-    if (!tariff)
+Protocol::Tariff ServiceSettings::tariff() const {
+    if (values_.tariff.empty())
         throw Base::Error(
             "the service has no tariff yet: set one with \"vlmail settings service tariff=FILE\"");
-    return Tariff(tariff.toObject());
+    return Protocol::Tariff(values_.tariff);
 }
 
 bool ServiceSettings::isDisabled(std::string const& nodeId) const {
-    json::Value const disabled = stored_.get(DISABLED);
-    if (!disabled)
-        return false;
     Cfg::CfgNodeId const node{Cfg::Id(nodeId, false)};
-    return std::ranges::any_of(disabled.toArray(), [&](json::Value const& id) {
-        Cfg::CfgNodeId const listed{Cfg::Id(id)};
+    return std::ranges::any_of(values_.disabled, [&](std::string const& id) {
+        Cfg::CfgNodeId const listed{Cfg::Id(id, false)};
         return listed == node || listed.isParentOf(node);
     });
 }
 
 bool ServiceSettings::isSuspended(Suspended what) const {
-    return (stored_.get(SUSPENDED).intOrZero() & static_cast<int>(what)) != 0;
+    return (values_.suspended & static_cast<int>(what)) != 0;
 }
 
 ServiceSettings ServiceSettings::withChanges(json::Object const& changes) const {
@@ -100,12 +104,11 @@ ServiceSettings ServiceSettings::withChanges(json::Object const& changes) const 
 }
 
 ServiceSettings ServiceSettings::withSuspended(int bits) const {
-    constexpr int KNOWN = static_cast<int>(Suspended::SettingsChanges) | static_cast<int>(Suspended::Jobs);
-    if ((bits & ~KNOWN) != 0)
+    if ((bits & ~static_cast<int>(Suspended::All)) != 0)
         throw Base::Error("the service cannot be suspended by the number " + std::to_string(bits) +
                           ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
     json::Object changed = stored_;
-    changed.set(SUSPENDED, bits);
+    changed.set(Values::SUSPENDED, bits);
     return ServiceSettings(std::move(changed));
 }
 

@@ -1,8 +1,8 @@
 #include "programs/vlserviced/settings/settings_service.h"
 
 #include "programs/base/error.h"
-#include "programs/vlserviced/node_id.h"
 #include "programs/vlserviced/settings/parts.h"
+#include "programs/vlserviced/store/node_id.h"
 #include "vlservice/cfg/cfg_node_id.h"
 #include "vlservice/cfg/id.h"
 
@@ -15,24 +15,17 @@ namespace {
 
 using Children = std::map<std::string, std::vector<SettingsNode const*>>;
 
-json::Array arrayOf(std::vector<std::string> const& texts) {
-    json::Array array;
-    for (std::string const& text : texts)
-        array.append(text);
-    return array;
-}
-
-json::Object branch(SettingsNode const& node, Children const& children, ServiceSettings const& service) {
-    json::Object object{{"id", node.id}, {"descr", node.description}};
-    if (service.isDisabled(node.id))
-        object.set("disabled", true);
-    object.set("parts", arrayOf(node.parts));
-    json::Array below;
+Protocol::TreeNode branch(SettingsNode const& node, Children const& children,
+                          ServiceSettings const& service) {
+    Protocol::TreeNode branching;
+    branching.id = node.id;
+    branching.description = node.description;
+    branching.disabled = service.isDisabled(node.id);
+    branching.parts = node.parts;
     if (auto const found = children.find(node.id); found != children.end())
         for (SettingsNode const* child : found->second)
-            below.append(branch(*child, children, service));
-    object.set("children", below);
-    return object;
+            branching.children.push_back(branch(*child, children, service));
+    return branching;
 }
 
 bool isNodeOf(std::string const& user, std::string const& id) {
@@ -51,7 +44,7 @@ bool mayUse(std::vector<Cfg::CfgNodeId> const& nodesOfUser, std::string const& i
 
 SettingsService::SettingsService(SettingsStore& store) : store_(store) {}
 
-json::Object SettingsService::tree() const {
+Protocol::TreeNode SettingsService::tree() const {
     std::vector<SettingsNode> const nodes = store_.nodes();
     Children children;
     for (SettingsNode const& node : nodes)
@@ -77,17 +70,20 @@ std::vector<SettingsService::UsableNode> SettingsService::usableNodes(std::strin
     return usable;
 }
 
-json::Object SettingsService::effective(std::string const& id,
-                                        std::vector<std::string> const& wantedParts) const {
-    checkNodeId(id);
-    std::vector<SettingsLevel> const chain = store_.chain(id);
-    json::Array ids;
+Protocol::SettingsAnswer SettingsService::effective(Protocol::SettingsQuery const& query) const {
+    checkNodeId(query.id);
+    std::vector<SettingsLevel> const chain = store_.chain(query.id);
+    Protocol::SettingsAnswer answer;
+    answer.id = query.id;
+    answer.known = store_.contains(query.id);
     for (SettingsLevel const& level : chain)
-        ids.append(level.id);
-    return {{"id", id},
-            {"known", store_.contains(id)},
-            {"chain", ids},
-            {"parts", resolve(chain, wantedParts.empty() ? partNames() : wantedParts)}};
+        answer.chain.push_back(level.id);
+    answer.parts = resolve(chain, query.parts.empty() ? partNames() : query.parts);
+    return answer;
+}
+
+json::Object SettingsService::values(std::string const& id, std::string const& part) const {
+    return effective({id, {part}}).part(part).values;
 }
 
 void SettingsService::setPart(std::string const& id, std::string const& part, json::Value const& sent) {

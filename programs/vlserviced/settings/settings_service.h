@@ -1,6 +1,7 @@
 #pragma once
 // What the service does with settings, in terms of node ids and JSON.
 
+#include "programs/protocol/settings.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/settings_store.h"
 
@@ -16,9 +17,8 @@ public:
     /// The store has to outlive the service.
     explicit SettingsService(SettingsStore& store);
 
-    /// The root as an object of "id", "descr", "disabled" (only when true), "parts" (names of those with own
-    /// values) and "children", an array of the same.
-    json::Object tree() const;
+    /// The root, with all below it.
+    Protocol::TreeNode tree() const;
 
     struct UsableNode {
         std::string id;
@@ -29,9 +29,10 @@ public:
     /// nodes that are no user's, less the root.
     std::vector<UsableNode> usableNodes(std::string const& user) const;
 
-    /// The effective settings of a node, which need not be stored: "id", "known" (whether it is stored),
-    /// "chain" (ids from the node to the root) and "parts", as resolve() gives them. No wanted parts are all.
-    json::Object effective(std::string const& id, std::vector<std::string> const& wantedParts) const;
+    /// The effective settings of a node, which need not be stored. No wanted parts are all.
+    Protocol::SettingsAnswer effective(Protocol::SettingsQuery const& query) const;
+    /// The values of one part that count at a node.
+    json::Object values(std::string const& id, std::string const& part) const;
 
     /// Replaces the node's own values of a part by those of what was sent; nothing, or nothing of its own,
     /// leaves the node without own values.

@@ -1,34 +1,19 @@
 #include "programs/vlserviced/store/job_store.h"
 
-#include "programs/base/error.h"
+#include "vlservice/json/json_form.h"
+#include "vlservice/json/json_text.h"
 
 #include <SQLiteCpp/Statement.h>
 
 #include <algorithm>
-#include <array>
-#include <set>
+#include <sstream>
 #include <utility>
 
 namespace VlServiced {
 namespace {
 
-constexpr std::array<std::pair<JobState, char const*>, 7> STATE_NAMES{{
-    {JobState::Accepted, "accepted"},
-    {JobState::Queued, "queued"},
-    {JobState::Submitting, "submitting"},
-    {JobState::Submitted, "submitted"},
-    {JobState::Lodged, "lodged"},
-    {JobState::Delivered, "delivered"},
-    {JobState::Failed, "failed"},
-}};
-
-JobState stateNamed(std::string const& name) {
-    auto const found = std::find_if(STATE_NAMES.begin(), STATE_NAMES.end(),
-                                    [&](auto const& row) { return row.second == name; });
-    if (found == STATE_NAMES.end())
-        throw Base::Error("the service database holds a job in the unknown state \"" + name + "\"");
-    return found->first;
-}
+using Protocol::stateName;
+using Protocol::stateNamed;
 
 constexpr char const* SELECT_JOBS =
     "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
@@ -59,13 +44,36 @@ std::vector<Job> jobsIn(SQLite::Statement& query) {
     return jobs;
 }
 
-} // namespace
+/// What rows have to fulfil, with the texts that go into it.
+class Conditions {
+public:
+    /// An empty text is no restriction.
+    void add(std::string const& before, std::string const& value, std::string const& behind = "") {
+        if (value.empty())
+            return;
+        values_.push_back(value);
+        text_ += (text_.empty() ? "WHERE " : "AND ") + before + "(?" + std::to_string(values_.size()) + ")" +
+                 behind + ' ';
+    }
+    std::string const& text() const { return text_; }
+    void bind(SQLite::Statement& query) const {
+        for (std::size_t i = 0; i < values_.size(); ++i)
+            query.bind(static_cast<int>(i) + 1, values_[i]);
+    }
 
-char const* stateName(JobState state) {
-    return std::find_if(STATE_NAMES.begin(), STATE_NAMES.end(),
-                        [&](auto const& row) { return row.first == state; })
-        ->second;
+private:
+    std::string text_;
+    std::vector<std::string> values_;
+};
+
+/// As a JSON array.
+std::string textOf(std::vector<std::string> const& texts) {
+    std::ostringstream text;
+    text << Cfg::JsonForm<std::vector<std::string>>::write(texts);
+    return std::move(text).str();
 }
+
+} // namespace
 
 JobStore::JobStore(SQLite::Database& database) : database_(database) {}
 
@@ -85,18 +93,30 @@ std::vector<Job> JobStore::inState(JobState state) const {
 }
 
 std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) const {
-    SQLite::Statement query(database_, std::string(SELECT_JOBS) +
-                                           "WHERE ?1 IN ('', db_folder) AND ?2 IN ('', db_name) "
-                                           "ORDER BY accepted_at DESC, pack DESC");
-    query.bindNoCopy(1, filter.folder);
-    query.bindNoCopy(2, filter.database);
-    std::set<std::string> const wanted(filter.packIds.begin(), filter.packIds.end());
-    std::vector<Job> jobs;
-    while (jobs.size() < limit && query.executeStep())
-        if (wanted.empty() || wanted.contains(query.getColumn(0).getString()))
-            jobs.push_back(jobIn(query));
+    // Only the conditions that are wanted: one that may hold for every row would keep the indexes out.
+    Conditions wanted;
+    wanted.add("db_folder = ", filter.folder);
+    wanted.add("db_name = ", filter.database);
+    if (!filter.packIds.empty())
+        wanted.add("pack IN (SELECT value FROM json_each", textOf(filter.packIds), ")");
+    SQLite::Statement query(database_, SELECT_JOBS + wanted.text() +
+                                           "ORDER BY accepted_at DESC, pack DESC LIMIT " +
+                                           std::to_string(limit));
+    wanted.bind(query);
+    std::vector<Job> jobs = jobsIn(query);
     std::reverse(jobs.begin(), jobs.end());
     return jobs;
+}
+
+std::vector<Job> JobStore::unfinished(std::string const& folder, std::string const& database) const {
+    Conditions wanted;
+    wanted.add("db_folder = ", folder);
+    wanted.add("db_name = ", database);
+    wanted.add("state NOT IN (SELECT value FROM json_each",
+               textOf({stateName(JobState::Delivered), stateName(JobState::Failed)}), ")");
+    SQLite::Statement query(database_, SELECT_JOBS + wanted.text() + "ORDER BY accepted_at, pack");
+    wanted.bind(query);
+    return jobsIn(query);
 }
 
 bool JobStore::accept(Job const& job) {
@@ -123,7 +143,10 @@ bool JobStore::advance(std::string const& packId, JobState from, JobState to, lo
     change.bind(2, static_cast<std::int64_t>(now));
     change.bind(3, packId);
     change.bind(4, stateName(from));
-    return change.exec() == 1;
+    bool const moved = change.exec() == 1;
+    if (moved)
+        changed(packId);
+    return moved;
 }
 
 bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder, long long now) {
@@ -134,7 +157,10 @@ bool JobStore::beginSubmitting(std::string const& packId, std::string const& upl
     change.bind(3, static_cast<std::int64_t>(now));
     change.bind(4, packId);
     change.bind(5, stateName(JobState::Queued));
-    return change.exec() == 1;
+    bool const moved = change.exec() == 1;
+    if (moved)
+        changed(packId);
+    return moved;
 }
 
 void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
@@ -145,6 +171,7 @@ void JobStore::fail(std::string const& packId, std::string const& reason, long l
     change.bind(3, static_cast<std::int64_t>(now));
     change.bind(4, packId);
     change.exec();
+    changed(packId);
 }
 
 void JobStore::setProblem(std::string const& packId, std::string const& problem) {
@@ -152,6 +179,7 @@ void JobStore::setProblem(std::string const& packId, std::string const& problem)
     change.bind(1, problem);
     change.bind(2, packId);
     change.exec();
+    changed(packId);
 }
 
 void JobStore::wantUpload(std::string const& folder, std::string const& database) {
@@ -162,6 +190,11 @@ void JobStore::wantUpload(std::string const& folder, std::string const& database
     change.bind(3, stateName(JobState::Accepted));
     change.bind(4, stateName(JobState::Queued));
     change.exec();
+}
+
+void JobStore::changed(std::string const& packId) const {
+    if (tell_)
+        tell_(packId);
 }
 
 std::vector<std::pair<JobState, long long>> JobStore::counts() const {

@@ -1,10 +1,11 @@
 #pragma once
 // Jobs as the database keeps them: one for each pack id, whatever happens to the command that brought it.
 
-#include "programs/vlserviced/jobs/job.h"
+#include "programs/vlserviced/store/job.h"
 
 #include <SQLiteCpp/Database.h>
 
+#include <functional>
 #include <optional>
 #include <string>
 #include <utility>
@@ -28,8 +29,11 @@ public:
     std::optional<Job> find(std::string const& packId) const;
     /// In the order of their acceptance.
     std::vector<Job> inState(JobState state) const;
-    /// In the order of their acceptance, at most `limit`, the youngest when there are more.
+    /// In the order of their acceptance, at most `limit`, the youngest when there are more. Costs what the
+    /// answer is large, however many jobs there are.
     std::vector<Job> matching(JobFilter const& filter, std::size_t limit) const;
+    /// Those of a pack database that are neither delivered nor given up; empty texts are no restriction.
+    std::vector<Job> unfinished(std::string const& folder, std::string const& database) const;
 
     /// How many jobs are in each state that any is in.
     std::vector<std::pair<JobState, long long>> counts() const;
@@ -49,8 +53,14 @@ public:
     /// restriction.
     void wantUpload(std::string const& folder, std::string const& database);
 
+    /// Has a function called after each change of a job's state or problem, with the pack id.
+    void onChange(std::function<void(std::string const&)> tell) { tell_ = std::move(tell); }
+
 private:
+    void changed(std::string const& packId) const;
+
     SQLite::Database& database_;
+    std::function<void(std::string const&)> tell_;
 };
 
 } // namespace VlServiced

@@ -7,7 +7,7 @@ namespace {
 constexpr int APPLICATION_ID = 0x564C5344;
 
 /// Settings are a tree of nodes under the root, whose id is the empty text; a node's parts hold its own
-/// values alone. Service settings are one object. A job's states are those of jobs/job.h.
+/// values alone. Service settings are one object. A job's states are those of Protocol::JobState.
 constexpr char const* SCHEMA_1 = R"sql(
 CREATE TABLE nodes (
     id     TEXT NOT NULL PRIMARY KEY,
@@ -47,10 +47,18 @@ CREATE TABLE jobs (
 CREATE INDEX jobs_by_state ON jobs (state);
 )sql";
 
+/// Each index ends in what the jobs are ordered by.
+constexpr char const* SCHEMA_2 = R"sql(
+DROP INDEX jobs_by_state;
+CREATE INDEX jobs_by_state ON jobs (state, accepted_at, pack);
+CREATE INDEX jobs_by_acceptance ON jobs (accepted_at, pack);
+CREATE INDEX jobs_by_database ON jobs (db_folder, db_name, accepted_at, pack);
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
-    static Database::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1}};
+    static Database::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2}};
     return kind;
 }
 

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/store/settings_store.h"
 
 #include "programs/base/error.h"
-#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/store/node_id.h"
 #include "vlservice/cfg/id.h"
 #include "vlservice/json/json_text.h"
 

@@ -3,8 +3,10 @@
 #include "programs/vlserviced/store/schema.h"
 #include "tests/support/temporary_folder.h"
 
+#include <SQLiteCpp/Transaction.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 
 namespace {
 
@@ -141,15 +143,76 @@ TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
     EXPECT_FALSE(store_.find("submitted")->toUpload);
 }
 
-TEST_F(JobStoreTest, NamesEveryState) {
-    std::pair<JobState, char const*> const names[] = {
-        {JobState::Accepted, "accepted"},     {JobState::Queued, "queued"},
-        {JobState::Submitting, "submitting"}, {JobState::Submitted, "submitted"},
-        {JobState::Lodged, "lodged"},         {JobState::Delivered, "delivered"},
-        {JobState::Failed, "failed"},
+TEST_F(JobStoreTest, ListsWhatIsUnfinishedOfAPackDatabase) {
+    for (auto const* id : {"a", "b", "c"})
+        store_.accept(job(id));
+    store_.fail("b", "gone", 5);
+    store_.advance("c", JobState::Accepted, JobState::Delivered, 6);
+    EXPECT_THAT(ids(store_.unfinished("", "")), ElementsAre("a"));
+    EXPECT_THAT(ids(store_.unfinished("/srv/packs", "packs.db")), ElementsAre("a"));
+    EXPECT_THAT(ids(store_.unfinished("/srv/other", "")), IsEmpty());
+}
+
+TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
+    std::vector<std::string> told;
+    store_.onChange([&](std::string const& packId) { told.push_back(packId); });
+    store_.accept(job("p1"));
+    EXPECT_THAT(told, IsEmpty());
+    store_.advance("p1", JobState::Queued, JobState::Submitting, 1);
+    EXPECT_THAT(told, IsEmpty());
+    store_.advance("p1", JobState::Accepted, JobState::Queued, 2);
+    store_.beginSubmitting("p1", "/srv/upload", 3);
+    store_.setProblem("p1", "full");
+    store_.fail("p1", "gone", 4);
+    EXPECT_THAT(told, ElementsAre("p1", "p1", "p1", "p1"));
+}
+
+/// How many tens of steps the database takes for a question.
+class StepCounter {
+public:
+    explicit StepCounter(SQLite::Database& database) : database_(database) {
+        sqlite3_progress_handler(database.getHandle(), 10, &StepCounter::count, this);
+    }
+    ~StepCounter() { sqlite3_progress_handler(database_.getHandle(), 0, nullptr, nullptr); }
+    StepCounter(StepCounter const&) = delete;
+    StepCounter& operator=(StepCounter const&) = delete;
+    int steps() const { return steps_; }
+
+private:
+    static int count(void* self) {
+        ++static_cast<StepCounter*>(self)->steps_;
+        return 0;
+    }
+
+    SQLite::Database& database_;
+    int steps_ = 0;
+};
+
+TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
+    JobFilter const filters[] = {
+        {"", "", {"job 7", "job 8"}},
+        {"/srv/packs", "packs.db", {"job 7"}},
+        {},
+        {"/srv/packs", "packs.db", {}},
     };
-    for (auto const& [state, name] : names)
-        EXPECT_STREQ(VlServiced::stateName(state), name);
+    auto const addJobs = [this](int from, int to) {
+        SQLite::Transaction transaction(database_);
+        for (int i = from; i < to; ++i)
+            store_.accept(job("job " + std::to_string(i), i));
+        transaction.commit();
+    };
+    auto const steps = [this](JobFilter const& filter) {
+        StepCounter const counter(database_);
+        store_.matching(filter, 10);
+        return counter.steps();
+    };
+    addJobs(0, 50);
+    std::vector<int> few;
+    for (JobFilter const& filter : filters)
+        few.push_back(steps(filter));
+    addJobs(50, 3000);
+    for (std::size_t i = 0; i < few.size(); ++i)
+        EXPECT_NEAR(steps(filters[i]), few[i], 2) << i;
 }
 
 } // namespace

@@ -1,4 +1,4 @@
-#include "programs/vlserviced/node_id.h"
+#include "programs/vlserviced/store/node_id.h"
 
 #include "tests/support/failure_of.h"
 

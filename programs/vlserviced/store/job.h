@@ -1,28 +1,14 @@
 #pragma once
 // What the service knows of a mailing that it was given.
 
+#include "programs/protocol/job.h"
+
 #include <filesystem>
 #include <string>
 
 namespace VlServiced {
 
-/// The way of a job. The names, in job_store.cpp, are kept in the database and told to clients.
-enum class JobState {
-    /// On record; the pages still lie with the client alone.
-    Accepted,
-    /// The container is in the outbox.
-    Queued,
-    /// The container lies in the upload folder under a temporary name and is about to get its own.
-    Submitting,
-    /// The container is in the upload folder.
-    Submitted,
-    /// The container was taken from the upload folder.
-    Lodged,
-    /// The carrier reported that the mailing is done.
-    Delivered,
-    /// Given up; `problem` says why.
-    Failed,
-};
+using Protocol::JobState;
 
 /// Where a pack's pages lie.
 struct PackLocation {
@@ -55,7 +41,5 @@ struct Job {
     /// The name of its container in the outbox and in the upload folder.
     std::string containerName() const { return pack.packId + ".mailing"; }
 };
-
-char const* stateName(JobState state);
 
 } // namespace VlServiced

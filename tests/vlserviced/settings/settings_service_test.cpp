@@ -34,11 +34,11 @@ protected:
 };
 
 TEST_F(SettingsServiceTest, ShowsTheTreeFromTheRoot) {
-    EXPECT_EQ(print(service_.tree()), R"({"id":"","descr":"","parts":[],"children":[]})");
+    EXPECT_EQ(print(service_.tree().serialize()), R"({"id":"","descr":"","parts":[],"children":[]})");
     service_.setPart("a=acme", "app", parse(R"({"descr":"Acme Ltd"})"));
     add({"u=bob/a=acme", "u=eve/"});
     service_.changeService(parse(R"({"disabled":["u=bob/a=acme"]})"));
-    EXPECT_EQ(print(service_.tree()),
+    EXPECT_EQ(print(service_.tree().serialize()),
               R"({"id":"","descr":"","parts":[],"children":[)"
               R"({"id":"a=acme","descr":"Acme Ltd","parts":["app"],"children":[)"
               R"({"id":"u=bob/a=acme","descr":"","disabled":true,"parts":[],"children":[]}]},)"
@@ -63,15 +63,15 @@ TEST_F(SettingsServiceTest, WithoutAUserAllNodesButThoseOfUsersMayBeUsed) {
 TEST_F(SettingsServiceTest, TheEffectiveSettingsHaveChainValuesAndOrigins) {
     service_.setPart("", "po", parse(R"({"code":"R"})"));
     service_.setPart("u=bob/a=acme", "po", parse(R"({"expiry":5})"));
-    EXPECT_EQ(print(service_.effective("u=bob/a=acme", {"po"})),
+    EXPECT_EQ(print(service_.effective({"u=bob/a=acme", {"po"}}).serialize()),
               R"({"id":"u=bob/a=acme","known":true,"chain":["u=bob/a=acme","a=acme",""],"parts":{"po":{)"
               R"("own":{"expiry":5},"values":{"code":"R","expiry":5},)"
               R"("origins":{"code":"","expiry":"u=bob/a=acme"}}}})");
-    json::Object const unknown = service_.effective("u=eve/a=acme", {"po"});
+    json::Object const unknown = service_.effective({"u=eve/a=acme", {"po"}}).serialize();
     EXPECT_FALSE(unknown.get("known").isTrue());
     EXPECT_EQ(print(unknown.get("parts").toObject().get("po").toObject().get("values")),
               R"({"code":"R","expiry":0})");
-    EXPECT_EQ(service_.effective("", {}).get("parts").toObject().size(), 6u);
+    EXPECT_EQ(service_.effective({"", {}}).parts.size(), 6u);
 }
 
 TEST_F(SettingsServiceTest, APartThatIsSetToNothingIsInheritedAgain) {
@@ -115,7 +115,7 @@ TEST_F(SettingsServiceTest, IdsThatAreNotWellFormedReachNothing) {
         EXPECT_TRUE(failureOf([&] { service_.setPart(id, "po", {}); }).starts_with("node id \""));
         EXPECT_TRUE(failureOf([&] { service_.update(id, false); }).starts_with("node id \""));
         EXPECT_TRUE(failureOf([&] { service_.remove(id); }).starts_with("node id \""));
-        EXPECT_TRUE(failureOf([&] { service_.effective(id, {}); }).starts_with("node id \""));
+        EXPECT_TRUE(failureOf([&] { service_.effective({id, {}}); }).starts_with("node id \""));
     }
     EXPECT_EQ(store_.nodes().size(), 1u);
 }
@@ -128,7 +128,7 @@ TEST_F(SettingsServiceTest, NothingIsChangedWhileChangesAreHeldBack) {
     EXPECT_EQ(failureOf([&] { service_.update("a=acme", true); }), held);
     EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), held);
     EXPECT_EQ(failureOf([&] { service_.changeService({}); }), held);
-    EXPECT_EQ(failureOf([&] { service_.effective("a=acme", {}); }), "nothing was thrown");
+    EXPECT_EQ(failureOf([&] { service_.effective({"a=acme", {}}); }), "nothing was thrown");
     service_.suspend(0);
     EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), "nothing was thrown");
 }

@@ -1,0 +1,115 @@
+#pragma once
+// Jobs as client and service speak of them: their states, questions about them and the answers.
+
+#include "vlservice/json/json.h"
+
+#include <array>
+#include <string>
+#include <vector>
+
+namespace Protocol {
+
+/// The way of a job.
+enum class JobState {
+    /// On record; the pages still lie with the client alone.
+    Accepted,
+    /// The container is in the outbox.
+    Queued,
+    /// The container lies in the upload folder under a temporary name and is about to get its own.
+    Submitting,
+    /// The container is in the upload folder.
+    Submitted,
+    /// The container was taken from the upload folder.
+    Lodged,
+    /// The carrier reported that the mailing is done.
+    Delivered,
+    /// Given up; the problem says why.
+    Failed,
+};
+
+inline constexpr std::array ALL_JOB_STATES{JobState::Accepted,  JobState::Queued, JobState::Submitting,
+                                           JobState::Submitted, JobState::Lodged, JobState::Delivered,
+                                           JobState::Failed};
+
+/// The name under which a state is kept and told.
+char const* stateName(JobState state);
+/// Throws Error when no state has that name.
+JobState stateNamed(std::string const& name);
+
+/// A question about jobs; what is empty is no restriction.
+struct JobsQuery {
+    static constexpr char const* KIND = "jobs";
+    static constexpr char const* IN_WORDS = "a query for jobs";
+    /// How many jobs are told of at most.
+    static constexpr long long MAX_JOBS = 1000;
+    /// How long an answer is held at most, in milliseconds.
+    static constexpr long long MAX_WAIT = 20'000;
+
+    /// The pack database.
+    std::string folder;
+    std::string database;
+    /// Pack ids, MAX_JOBS at most.
+    std::vector<std::string> ids;
+    /// The youngest, when there are more.
+    long long limit = MAX_JOBS;
+    /// How long the answer may be held while one of the jobs of `ids` waits for its pages to be fetched and
+    /// nothing is in its way; milliseconds.
+    long long wait = 0;
+
+    JobsQuery() = default;
+    /// Throws Error on a wrong type.
+    explicit JobsQuery(json::Object const& object);
+    /// With "query", which says that it is one.
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+struct JobReport {
+    std::string id;
+    JobState state = JobState::Accepted;
+    std::string title;
+    /// The settings node that it is sent for.
+    std::string cfgId;
+    std::string folder;
+    std::string database;
+    long long documents = 0;
+    long long pages = 0;
+    /// Seconds since the epoch: when it was put on record, and since when it is in its state.
+    long long accepted = 0;
+    long long changed = 0;
+    /// Why it failed, or what keeps it where it is.
+    std::string problem;
+    /// What has taken longer than the node's settings allow.
+    std::string alarm;
+    /// Whether it is to be handed on.
+    bool toUpload = false;
+    /// Where the container lies.
+    std::string container;
+
+    JobReport() = default;
+    /// Throws Error on a state that is not known.
+    explicit JobReport(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// Whether a job, or what is told of it, waits for its pages to be fetched and nothing is in its way.
+template<typename Job>
+bool waitsForPages(Job const& job) {
+    return job.state == JobState::Accepted && job.problem.empty();
+}
+
+/// In the order of their acceptance.
+struct JobsAnswer {
+    std::vector<JobReport> jobs;
+
+    JobsAnswer() = default;
+    explicit JobsAnswer(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+} // namespace Protocol

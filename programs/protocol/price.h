@@ -1,0 +1,104 @@
+#pragma once
+// Prices as client and service speak of them: the tariff, the letters that are asked about, the estimate.
+
+#include "vlservice/json/json.h"
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+namespace Protocol {
+
+/// Amounts are integers, in hundredths of the currency. All but the currency default to 0.
+struct Tariff {
+    static constexpr char const* IN_WORDS = "the tariff";
+    /// Of each amount, either way.
+    static constexpr long long MAX_AMOUNT = 100'000'000;
+
+    /// Three capital letters.
+    std::string currency;
+    /// For each letter.
+    long long letter = 0;
+    /// For each sheet of paper.
+    long long sheet = 0;
+    /// Added for each page that is printed in colour.
+    long long colourPage = 0;
+    /// Added for each sheet that is printed on both sides; below 0 it is a discount.
+    long long duplexSheet = 0;
+    /// Added for each letter that is delivered with priority.
+    long long priorityLetter = 0;
+
+    /// Throws Error on an unknown key, a currency that is none, and amounts beyond MAX_AMOUNT either way.
+    explicit Tariff(json::Object const& object);
+
+    struct Keys;
+};
+
+/// Letters that cost the same each.
+struct LetterBatch {
+    static constexpr char const* IN_WORDS = "the letters";
+    static constexpr long long MAX_LETTERS = 1'000'000;
+    static constexpr long long MAX_PAGES = 10'000;
+
+    long long count = 1;
+    /// Of one letter.
+    long long pages = 1;
+    bool colour = false;
+    bool duplex = false;
+    bool priority = false;
+
+    LetterBatch() = default;
+    /// Throws Error on an unknown key, a wrong type, and counts below 1 or beyond their bounds.
+    explicit LetterBatch(json::Object const& object);
+    json::Object serialize() const;
+
+    /// Sheets of one letter: a sheet has two pages with duplex.
+    long long sheets() const { return duplex ? (pages + 1) / 2 : pages; }
+    /// Sheets of one letter that have something on both sides.
+    long long duplexSheets() const { return duplex ? pages / 2 : 0; }
+
+    struct Keys;
+};
+
+struct PriceRequest {
+    static constexpr std::size_t MAX_BATCHES = 10'000;
+
+    std::vector<LetterBatch> letters;
+
+    PriceRequest() = default;
+    explicit PriceRequest(std::vector<LetterBatch> batches);
+    /// Throws Error when there are none or too many, and with the first that is wrong.
+    explicit PriceRequest(json::Object const& object);
+    json::Object serialize() const;
+};
+
+/// What a batch costs.
+struct BatchPrice {
+    /// Of one letter.
+    long long sheets = 0;
+    /// Of all letters, in hundredths.
+    long long price = 0;
+
+    BatchPrice() = default;
+    BatchPrice(long long sheetsEach, long long priceOfAll);
+    explicit BatchPrice(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+struct Estimate {
+    std::string currency;
+    /// In hundredths.
+    long long total = 0;
+    /// One a batch, in the order of the request.
+    std::vector<BatchPrice> letters;
+
+    Estimate() = default;
+    explicit Estimate(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+} // namespace Protocol

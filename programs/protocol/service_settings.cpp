@@ -1,0 +1,26 @@
+#include "programs/protocol/service_settings.h"
+
+#include "programs/protocol/rows.h"
+
+namespace Protocol {
+
+struct ServiceSettings::Keys {
+    static constexpr std::tuple TABLE{
+        Always{UPLOAD_FOLDER, &ServiceSettings::uploadFolder},
+        Always{TARIFF, &ServiceSettings::tariff},
+        Always{DISABLED, &ServiceSettings::disabled},
+        Always{SUSPENDED, &ServiceSettings::suspended},
+    };
+};
+
+ServiceSettings::ServiceSettings(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
+
+json::Object serviceOverview(json::Object const& settings, std::string const& outbox,
+                             json::Object const& jobCounts) {
+    json::Object overview = settings;
+    overview.set("outbox", outbox);
+    overview.set("jobs", jobCounts);
+    return overview;
+}
+
+} // namespace Protocol

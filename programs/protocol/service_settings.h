@@ -1,0 +1,65 @@
+#pragma once
+// The service's own settings, beside those of the nodes, as client and service speak of them.
+
+#include "vlservice/json/json.h"
+
+#include <string>
+#include <vector>
+
+namespace Protocol {
+
+/// What is held back for the time being: the bits of CSConfigSrvChange's number.
+enum class Suspended : int {
+    Nothing = 0,
+    /// Settings can be read and not changed.
+    SettingsChanges = 1,
+    /// Jobs are accepted and wait.
+    Jobs = 2,
+    All = 3,
+};
+
+/// The service's settings. A change is an object with some of the keys, where JSON null erases one.
+struct ServiceSettings {
+    static constexpr char const* UPLOAD_FOLDER = "upload_folder";
+    static constexpr char const* TARIFF = "tariff";
+    static constexpr char const* DISABLED = "disabled";
+    static constexpr char const* SUSPENDED = "suspended";
+
+    /// Where finished containers are handed on; empty when nothing was set.
+    std::string uploadFolder;
+    /// The form of Tariff; empty when there is none.
+    json::Object tariff;
+    /// Ids of nodes that nobody may send for, with all below them.
+    std::vector<std::string> disabled;
+    /// Bits of Suspended.
+    int suspended = 0;
+
+    ServiceSettings() = default;
+    explicit ServiceSettings(json::Object const& object);
+
+    struct Keys;
+};
+
+/// What a value of a setting is.
+enum class SettingForm { Text, List, Document };
+
+/// A setting that a change may name, and its form.
+struct ServiceSetting {
+    char const* key;
+    SettingForm form;
+    /// How a command line gives it.
+    char const* placeholder;
+};
+
+inline constexpr ServiceSetting SETTABLE[] = {
+    {ServiceSettings::UPLOAD_FOLDER, SettingForm::Text, "PATH"},
+    {ServiceSettings::TARIFF, SettingForm::Document, "FILE"},
+    {ServiceSettings::DISABLED, SettingForm::List, "[...]"},
+};
+
+/// What the service tells of itself beside its settings: its outbox, and how many jobs are in each state that
+/// any is in, by the state's name.
+json::Object serviceOverview(json::Object const& settings, std::string const& outbox,
+                             json::Object const& jobCounts);
+
+} // namespace Protocol

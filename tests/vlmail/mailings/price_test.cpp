@@ -1,0 +1,56 @@
+#include "programs/vlmail/mailings/price.h"
+
+#include "vlservice/json/json_text.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+
+namespace {
+
+using VlMail::money;
+using VlMail::pricedLettersOf;
+
+Mailing::Metadata mailingWith(std::string const& presetKeys) {
+    std::string const preset = R"({"name": "P")" + presetKeys + "}";
+    Mailing::Metadata metadata;
+    metadata.packPreset = Cfg::PackPreset(json::strToObject(preset.data(), preset.size()), {});
+    metadata.letters = {
+        {{{"a.pdf", {1, 2}}, {"b.pdf", {1}}}, {}}, {{{"c.pdf", {1}}}, {}}, {{{"d.pdf", {4}}}, {}}};
+    return metadata;
+}
+
+TEST(PricedLetters, AreThoseOfEqualLengthTogether) {
+    std::vector<Protocol::LetterBatch> const batches = pricedLettersOf(mailingWith(""));
+    ASSERT_EQ(batches.size(), 2u);
+    EXPECT_EQ(batches[0].pages, 1);
+    EXPECT_EQ(batches[0].count, 2);
+    EXPECT_EQ(batches[1].pages, 3);
+    EXPECT_EQ(batches[1].count, 1);
+}
+
+TEST(PricedLetters, FollowThePackPreset) {
+    Protocol::LetterBatch const plain = pricedLettersOf(mailingWith("")).front();
+    EXPECT_FALSE(plain.colour || plain.duplex || plain.priority);
+    Protocol::LetterBatch const dear =
+        pricedLettersOf(mailingWith(R"(,"colour_model":2,"duplex":true,"priority_delivery":true)")).front();
+    EXPECT_TRUE(dear.colour && dear.duplex && dear.priority);
+    EXPECT_FALSE(pricedLettersOf(mailingWith(R"(,"colour_model":1)")).front().colour) << "grey";
+}
+
+TEST(Money, IsWrittenWithItsSignInFront) {
+    std::pair<long long, char const*> const cases[] = {
+        {0, "0.00"},
+        {5, "0.05"},
+        {123456, "1234.56"},
+        {-5, "-0.05"},
+        {-100, "-1.00"},
+        {-12345, "-123.45"},
+        {std::numeric_limits<long long>::max(), "92233720368547758.07"},
+        {std::numeric_limits<long long>::min(), "-92233720368547758.08"},
+    };
+    for (auto const& [hundredths, text] : cases)
+        EXPECT_EQ(money(hundredths), text);
+}
+
+} // namespace
