@@ -81,7 +81,7 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":["p"]})"),
               R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets"})");
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
-              R"({"err":"JSON error: Wrong type: string. Expected type: array"})");
+              R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
     EXPECT_EQ(send(29, R"({"query":"x"})"), R"({"err":"there is no query \"x\"; there are settings, jobs"})");
     EXPECT_EQ(send(29, "{}"), R"({"err":"there is no query \"\"; there are settings, jobs"})");
 }

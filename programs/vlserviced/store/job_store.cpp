@@ -95,8 +95,10 @@ std::vector<Job> JobStore::inState(JobState state) const {
 std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) const {
     // Only the conditions that are wanted: one that may hold for every row would keep the indexes out.
     Conditions wanted;
-    wanted.add("db_folder = ", filter.folder);
-    wanted.add("db_name = ", filter.database);
+    // Ids say more than all else: the sign keeps the other conditions from choosing the index.
+    std::string const sign = filter.packIds.empty() ? "" : "+";
+    wanted.add(sign + "db_folder = ", filter.folder);
+    wanted.add(sign + "db_name = ", filter.database);
     if (!filter.packIds.empty())
         wanted.add("pack IN (SELECT value FROM json_each", textOf(filter.packIds), ")");
     SQLite::Statement query(database_, SELECT_JOBS + wanted.text() +
