@@ -2,15 +2,17 @@
 
 #include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
+#include "programs/reader/font_file.h"
 #include "programs/reader/pdf_page.h"
-#include "programs/reader/true_type.h"
 #include "programs/reader/typed_page.h"
 
 #include <fstream>
 #include <iterator>
+#include <map>
 #include <optional>
 #include <set>
 #include <unicode/utf16.h>
+#include <utility>
 
 namespace Reader {
 namespace {
@@ -20,13 +22,13 @@ constexpr char const* FONT_PACKAGE = "fonts-dejavu-core";
 /// The six letters say that not all of the font is there.
 constexpr char const* FONT_NAME = "TYPING+DejaVuSansMono";
 
-TrueTypeFont const& wideFont() {
-    static TrueTypeFont const font = [] {
+FontFile const& wideFont() {
+    static FontFile const font = [] {
         std::ifstream in(FONT_FILE, std::ios::binary);
         if (!in)
             throw Base::Error(std::string("there is no font ") + FONT_FILE + "; install the package " +
                               FONT_PACKAGE);
-        return TrueTypeFont({std::istreambuf_iterator<char>(in), {}});
+        return FontFile({std::istreambuf_iterator<char>(in), {}});
     }();
     return font;
 }
@@ -56,16 +58,41 @@ std::string hex(std::string const& bytes) {
     return text;
 }
 
+template<typename Take>
+void forEachCharacter(std::string const& utf8, Take const& take) {
+    std::u16string const text = utf16Of(utf8).value_or(u"");
+    for (std::size_t i = 0; i < text.size();) {
+        UChar32 c = 0;
+        U16_NEXT(text.data(), i, text.size(), c);
+        take(static_cast<char32_t>(c));
+    }
+}
+
+/// The characters of words that Courier cannot show.
+std::set<char32_t> wideCharacters(Page const& page, std::string const& where) {
+    std::set<char32_t> characters;
+    for (Word const& word : page.words) {
+        if (windows1252Of(word.text))
+            continue;
+        forEachCharacter(word.text, [&](char32_t c) {
+            if (!wideFont().has(c))
+                throw Base::Error(where + ": page " + std::to_string(page.number) + ": no font for \"" +
+                                  word.text + "\"; export the document as PDF");
+            characters.insert(c);
+        });
+    }
+    return characters;
+}
+
 /// What a typed page shows.
 class Content {
 public:
-    Content(Page const& page, std::string const& where) : page_(page), where_(where) {
+    Content(Page const& page, std::map<char32_t, GlyphNumber> const& glyphs) : page_(page), glyphs_(glyphs) {
         for (Word const& word : page.words)
             show(word);
     }
 
     std::string text() const { return "BT\n" + text_ + "ET\n"; }
-    std::map<GlyphNumber, char32_t> const& wideCharacters() const { return wideCharacters_; }
 
 private:
     void show(Word const& word) {
@@ -74,52 +101,45 @@ private:
         if (std::optional<std::string> const narrow = windows1252Of(word.text))
             text_ += font("/Courier", 100) + "<" + hex(*narrow) + "> Tj\n";
         else // Its letters are a little wider than a column.
-            text_ += font("/Carried", 100.0 * TypedPage::LETTER / wideFont().advance()) + "<" + glyphs(word) +
-                     "> Tj\n";
+            text_ += font("/Carried", 100.0 * TypedPage::LETTER / wideFont().advance()) + "<" +
+                     glyphsOf(word) + "> Tj\n";
     }
 
     static std::string font(char const* name, double widthPerCent) {
         return name + (" " + decimal(TypedPage::POINTS)) + " Tf " + decimal(widthPerCent) + " Tz ";
     }
 
-    std::string glyphs(Word const& word) {
+    std::string glyphsOf(Word const& word) const {
         std::string numbers;
-        std::u16string const text = utf16Of(word.text).value_or(u"");
-        for (std::size_t i = 0; i < text.size();) {
-            UChar32 c = 0;
-            U16_NEXT(text.data(), i, text.size(), c);
-            GlyphNumber const glyph = wideFont().glyphOf(static_cast<char32_t>(c));
-            if (glyph == 0)
-                throw Base::Error(where_ + ": page " + std::to_string(page_.number) + ": no font for \"" +
-                                  word.text + "\"; export the document as PDF");
-            wideCharacters_.emplace(glyph, c);
-            numbers += hex(glyph, 4);
-        }
+        forEachCharacter(word.text, [&](char32_t c) { numbers += hex(glyphs_.at(c), 4); });
         return numbers;
     }
 
     Page const& page_;
-    std::string const& where_;
+    std::map<char32_t, GlyphNumber> const& glyphs_;
     std::string text_;
-    std::map<GlyphNumber, char32_t> wideCharacters_;
 };
 
-CarriedFont carry(std::map<GlyphNumber, char32_t> const& characters) {
-    std::set<GlyphNumber> glyphs;
-    for (auto const& [glyph, character] : characters)
-        glyphs.insert(glyph);
-    TrueTypeFont const& font = wideFont();
-    return {FONT_NAME, font.subset(glyphs), font.ascent(), font.descent(), font.advance(), characters};
+CarriedFont carried(FontSubset const& subset) {
+    std::map<GlyphNumber, char32_t> characters;
+    for (auto const& [character, glyph] : subset.glyphs)
+        characters.emplace(glyph, character);
+    FontFile const& font = wideFont();
+    return {FONT_NAME, subset.file, font.ascent(), font.descent(), font.advance(), std::move(characters)};
 }
 
 } // namespace
 
 std::string pdfOfTypedPage(Page const& page, std::string const& where) {
-    Content const content(page, where);
-    ShownPage shown{inPoints(page.width), inPoints(page.height), content.text(), nullptr};
-    if (content.wideCharacters().empty())
+    ShownPage shown{inPoints(page.width), inPoints(page.height), {}, nullptr};
+    std::set<char32_t> const wide = wideCharacters(page, where);
+    if (wide.empty()) {
+        shown.content = Content(page, {}).text();
         return pdfOf(shown);
-    CarriedFont const font = carry(content.wideCharacters());
+    }
+    FontSubset const subset = wideFont().subset(wide);
+    CarriedFont const font = carried(subset);
+    shown.content = Content(page, subset.glyphs).text();
     shown.carried = &font;
     return pdfOf(shown);
 }
