@@ -4,12 +4,14 @@
 #include "vlservice/cfg/geometry.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 namespace Reader {
 
-/// Points to 1/100 mm.
-constexpr double POINT = 2540.0 / 72.0;
+constexpr double INCH = 2540;
+/// The unit of PDFs.
+constexpr double PDF_POINT = INCH / 72;
 
 using Cfg::Point;
 
@@ -51,9 +53,26 @@ enum class Turn : unsigned char {
     Up = 3,
 };
 
+inline constexpr std::array TURNS = {Turn::Upright, Turn::Down, Turn::UpsideDown, Turn::Up};
+
 inline bool runsAcross(Turn turn) { return turn == Turn::Upright || turn == Turn::UpsideDown; }
 
 /// The extent of a box in the direction in which its text runs.
 inline int lengthAlong(Box const& box, Turn turn) { return runsAcross(turn) ? box.width() : box.height(); }
+
+/// A box turned so that its text runs from left to right and its lines from top to bottom.
+struct Frame {
+    int start = 0;
+    int end = 0;
+    int top = 0;
+    int bottom = 0;
+
+    int height() const { return std::max(bottom - top, 1); }
+};
+
+Frame frameOf(Box const& box, Turn turn);
+
+/// The part of a box that its text takes from one share of its length to another, both from 0 to 1.
+Box partAlong(Box const& box, Turn turn, double from, double to);
 
 } // namespace Reader

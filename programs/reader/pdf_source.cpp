@@ -60,7 +60,7 @@ void preparePoppler() {
 }
 
 int toHundredths(double points) {
-    double const value = points * POINT;
+    double const value = points * PDF_POINT;
     return std::isnan(value)
                ? 0
                : static_cast<int>(std::lround(std::clamp(value, -MAX_COORDINATE, MAX_COORDINATE)));

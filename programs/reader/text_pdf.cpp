@@ -41,7 +41,7 @@ std::string decimal(double value) {
     return (thousandths < 0 ? "-" : "") + std::to_string(std::abs(thousandths) / 1000) + "." + places;
 }
 
-std::string inPoints(double hundredths) { return decimal(hundredths / POINT); }
+std::string inPoints(double hundredths) { return decimal(hundredths / PDF_POINT); }
 
 std::string hex(unsigned value, int digits) {
     static constexpr char DIGITS[] = "0123456789ABCDEF";

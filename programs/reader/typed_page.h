@@ -11,8 +11,8 @@ constexpr int HEIGHT = 29700;
 constexpr int LEFT = 2500;
 constexpr int TOP = 1000;
 
-constexpr double COLUMN = 2540.0 / 12;
-constexpr double ROW = 2540.0 / 6;
+constexpr double COLUMN = INCH / 12;
+constexpr double ROW = INCH / 6;
 /// 10 points, of which a letter takes 6 in width, a column.
 constexpr double POINTS = 10;
 /// Width of a letter in thousandths of the font size.

@@ -24,21 +24,7 @@ Box partOf(Word const& word, std::size_t begin, std::size_t end) {
     double const letters = static_cast<double>(countLetters(text));
     double const from = static_cast<double>(countLetters(text.substr(0, begin))) / letters;
     double const to = static_cast<double>(countLetters(text.substr(0, end))) / letters;
-    auto const at = [](int zero, int one, double share) {
-        return static_cast<int>(std::lround(zero + (one - zero) * share));
-    };
-    Box const& box = word.box;
-    switch (word.turn) {
-    case Turn::Upright:
-        break;
-    case Turn::Down:
-        return {box.left, at(box.top, box.bottom, from), box.right, at(box.top, box.bottom, to)};
-    case Turn::UpsideDown:
-        return {at(box.right, box.left, to), box.top, at(box.right, box.left, from), box.bottom};
-    case Turn::Up:
-        return {box.left, at(box.bottom, box.top, to), box.right, at(box.bottom, box.top, from)};
-    }
-    return {at(box.left, box.right, from), box.top, at(box.left, box.right, to), box.bottom};
+    return partAlong(word.box, word.turn, from, to);
 }
 
 void unite(std::optional<Box>& sum, Box const& box) { sum = sum ? sum->united(box) : box; }
