@@ -70,8 +70,8 @@ void readLetters(benchmark::State& state) {
     VlMail::Terminal const terminal{nowhere, nowhere};
     std::size_t letters = 0;
     for (auto _ : state) {
-        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), VlMail::Along::Nothing,
-                          terminal, [&](std::size_t, VlMail::ReadResult result) {
+        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), {}, terminal,
+                          [&](std::size_t, VlMail::ReadResult result) {
                               letters += result.reading.letters.value().size();
                           });
     }

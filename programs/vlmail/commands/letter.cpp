@@ -1,11 +1,13 @@
 // vlmail letter: what the settings make of each document, for a person or as JSON.
 #include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/explain_text.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/field_words.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/worker_pool.h"
+#include "programs/vlmail/report/describe.h"
 #include "programs/vlmail/report/report_file.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_text.h"
@@ -88,26 +90,49 @@ void print(std::ostream& out, DocumentReading const& reading) {
     out << '\n';
 }
 
+void explain(ReadResult& result, OpenDocument const& read) {
+    json::Object explanation = result.reading.trace.toObject();
+    explainPages(explanation, read.document, read.preset, read.trace);
+    result.reading.trace = explanation;
+}
+
+/// What the options want to know beside the letters.
+Along alongFor(Options const& options) {
+    Along along;
+    if (options.explain)
+        along.beforeReading = [](ReadResult& result, Cfg::Presets const& presets) {
+            result.reading.trace = explainPresets(presets, result.reading.document);
+        };
+    if (options.explain || !options.report.empty())
+        along.afterReading = [=](ReadResult& result, OpenDocument const& read) {
+            if (options.explain)
+                explain(result, read);
+            if (!options.report.empty())
+                result.report =
+                    Report::section(Report::describe(result.reading, read.document, read.trace), read.place);
+        };
+    return along;
+}
+
 int showLetters(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Outcome outcome;
     std::optional<Report::File> report;
     if (!options.report.empty())
         report.emplace(options.report);
-    Along const along =
-        (report ? Along::Report : Along::Nothing) | (options.explain ? Along::Trace : Along::Nothing);
-    readBatch(options.files, settings, options.jobs, along, terminal, [&](std::size_t, ReadResult result) {
-        DocumentReading const& reading = result.reading;
-        outcome.count(reading);
-        if (options.json)
-            terminal.out << reading.toJson() << std::endl;
-        else
-            print(terminal.out, reading);
-        if (reading.failed())
-            terminal.complain(reading.error);
-        if (report)
-            report->take(result);
-    });
+    readBatch(options.files, settings, options.jobs, alongFor(options), terminal,
+              [&](std::size_t, ReadResult result) {
+                  DocumentReading const& reading = result.reading;
+                  outcome.count(reading);
+                  if (options.json)
+                      terminal.out << reading.toJson() << std::endl;
+                  else
+                      print(terminal.out, reading);
+                  if (reading.failed())
+                      terminal.complain(reading.error);
+                  if (report)
+                      report->take(result);
+              });
     if (report)
         report->write(outcome);
     if (!options.json && options.files.size() > 1)

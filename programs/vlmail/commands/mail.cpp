@@ -6,9 +6,9 @@
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/node_settings.h"
-#include "programs/vlmail/letters/plan.h"
 #include "programs/vlmail/letters/worker_pool.h"
 #include "programs/vlmail/mailings/dispatch.h"
+#include "programs/vlmail/mailings/plan.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/json/json_text.h"
@@ -72,7 +72,7 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = settingsFor(options, destination);
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
-    readBatch(options.files, settings, options.jobs, Along::Pages, terminal,
+    readBatch(options.files, settings, options.jobs, {.pages = Along::Pages::Yes}, terminal,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -96,11 +96,10 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
-    readBatch(options.files, settings, options.jobs, Along::Nothing, terminal,
-              [&](std::size_t index, ReadResult result) {
-                  plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
-                  dispatch.take(std::move(result));
-              });
+    readBatch(options.files, settings, options.jobs, {}, terminal, [&](std::size_t index, ReadResult result) {
+        plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
+        dispatch.take(std::move(result));
+    });
     dispatch.finish();
     if (options.price)
         dispatch.estimate(*connectToService(options.service, terminal));

@@ -43,7 +43,7 @@ void TestRun::readDocuments(std::vector<TestCase> const& cases, std::size_t work
     for (TestCase const& one : cases)
         if (one.hasDocument() && !one.isZonesText())
             files.push_back(one.document.string());
-    readBatch(files, settings_, workers, Along::Nothing, terminal, [&](std::size_t index, ReadResult result) {
+    readBatch(files, settings_, workers, {}, terminal, [&](std::size_t index, ReadResult result) {
         readings_[files[index]] = std::move(result.reading);
     });
 }

@@ -46,6 +46,24 @@ private:
     std::size_t at_ = 0;
 };
 
+void put(Message& message, std::vector<PageBlob> const& blobs) {
+    message.put(blobs.size());
+    for (PageBlob const& blob : blobs) {
+        message.put(static_cast<std::uint64_t>(blob.number));
+        message.put(blob.data.data(), blob.data.size());
+    }
+}
+
+std::vector<PageBlob> takeBlobs(Message& message) {
+    std::vector<PageBlob> blobs(message.number());
+    for (PageBlob& blob : blobs) {
+        blob.number = static_cast<int>(message.number());
+        auto const [data, size] = message.bytes();
+        blob.data = SharedMemBuffer::copyOf(data, size);
+    }
+    return blobs;
+}
+
 std::string pack(ReadResult const& result) {
     Message message;
     std::ostringstream text;
@@ -54,14 +72,9 @@ std::string pack(ReadResult const& result) {
     message.put(json.data(), json.size());
     message.put(result.sha256.data(), result.sha256.size());
     message.put(result.report.data(), result.report.size());
-    message.put(result.pages.size());
-    for (auto const& letter : result.pages) {
-        message.put(letter.size());
-        for (PageBlob const& blob : letter) {
-            message.put(static_cast<std::uint64_t>(blob.number));
-            message.put(blob.data.data(), blob.data.size());
-        }
-    }
+    if (result.reading.letters)
+        for (LetterReading const& letter : *result.reading.letters)
+            put(message, letter.blobs);
     return message.take();
 }
 
@@ -73,15 +86,9 @@ ReadResult unpack(std::string bytes) {
     result.sha256.assign(digest, digestLength);
     auto const [report, reportLength] = message.bytes();
     result.report.assign(report, reportLength);
-    result.pages.resize(message.number());
-    for (auto& letter : result.pages) {
-        letter.resize(message.number());
-        for (PageBlob& blob : letter) {
-            blob.number = static_cast<int>(message.number());
-            auto const [data, size] = message.bytes();
-            blob.data = SharedMemBuffer::copyOf(data, size);
-        }
-    }
+    if (result.reading.letters)
+        for (LetterReading& letter : *result.reading.letters)
+            letter.blobs = takeBlobs(message);
     return result;
 }
 
@@ -114,7 +121,7 @@ void runBatch(std::size_t count, std::size_t workers, Terminal const& terminal,
 } // namespace
 
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               Along along, Terminal const& terminal,
+               Along const& along, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
     runBatch(
@@ -123,14 +130,11 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
         [&](std::size_t index) { return files[index]; }, take);
 }
 
-void splitBatch(std::vector<Plan::Document> const& documents, std::size_t workers, Terminal const& terminal,
+void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, Terminal const& terminal,
                 std::function<void(std::size_t, ReadResult)> const& take) {
     runBatch(
         documents.size(), workers, terminal,
-        [&](std::size_t index) {
-            Plan::Document const& document = documents[index];
-            return splitDocument(document.file, document.sha256, document.reading);
-        },
+        [&](std::size_t index) { return splitDocument(documents[index]); },
         [&](std::size_t index) { return documents[index].file.string(); }, take);
 }
 

@@ -1,7 +1,6 @@
 #pragma once
 // Reading many documents at once.
 
-#include "programs/vlmail/letters/plan.h"
 #include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/terminal/terminal.h"
 
@@ -15,11 +14,11 @@ class NodeSettings;
 /// the files. Shows progress where a person watches. A document that brings its reader down has that for its
 /// error.
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               Along along, Terminal const& terminal,
+               Along const& along, Terminal const& terminal,
                std::function<void(std::size_t, ReadResult)> const& take);
 
 /// The same with the pages of documents that were read before, as splitDocument() gives them.
-void splitBatch(std::vector<Plan::Document> const& documents, std::size_t workers, Terminal const& terminal,
+void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, Terminal const& terminal,
                 std::function<void(std::size_t, ReadResult)> const& take);
 
 } // namespace VlMail

@@ -5,9 +5,7 @@
 #include "programs/base/utf8.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
-#include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/letters/node_settings.h"
-#include "programs/vlmail/report/describe.h"
 
 #include "vlservice/pack/page_saver.h"
 
@@ -60,7 +58,7 @@ json::Value lettersToJson(std::vector<LetterReading> const& letters) {
 }
 
 LetterReading letterFrom(json::Object const& object) {
-    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()), {}};
+    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
     for (json::Value const& page : object.get(PAGES_KEY).toArray())
         letter.pages.push_back(static_cast<int>(page.toInt()));
     if (json::Value const missing = object.get(MISSING_KEY)) {
@@ -110,13 +108,6 @@ std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPre
     return letters;
 }
 
-void addPages(json::Value& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
-              Reader::Trace const& trace) {
-    json::Object object = explanation.toObject();
-    explainPages(object, document, preset, trace);
-    explanation = object;
-}
-
 std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& letter) {
     std::vector<PageBlob> blobs;
     if (!letter.whyNot().empty())
@@ -128,17 +119,32 @@ std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& l
     return blobs;
 }
 
-std::vector<std::vector<PageBlob>> pagesOf(Reader::Document& document, DocumentReading const& reading) {
-    std::vector<std::vector<PageBlob>> pages;
-    for (LetterReading const& letter : *reading.letters)
-        pages.push_back(blobsOf(document, letter));
-    return pages;
+void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document) {
+    for (LetterReading& letter : letters)
+        letter.blobs = blobsOf(document, letter);
+}
+
+void readLetters(ReadResult& result, Reader::Document& document, Cfg::Presets const& presets,
+                 NodeSettings const& settings, Along const& along, std::size_t place) {
+    DocumentReading& reading = result.reading;
+    auto const& [extractPreset, packPreset] = findPresets(reading.document, presets, settings);
+    reading.extractPreset = extractPreset.strRegex();
+    reading.packPreset = packPreset.name();
+    if (extractPreset.isForAttachemnt())
+        return;
+    requirePatterns(extractPreset, settings);
+    Reader::Trace trace;
+    reading.letters = lettersOf(document, extractPreset, along.afterReading ? &trace : nullptr);
+    if (along.afterReading)
+        along.afterReading(result, {document, extractPreset, trace, place});
+    if (along.pages == Along::Pages::Yes)
+        addBlobs(*reading.letters, document);
 }
 
 void fail(ReadResult& result, std::exception const& failure) {
     result.reading.document = Base::validUtf8(result.reading.document);
     result.reading.error = Base::validUtf8(failure.what());
-    result.pages.clear();
+    result.reading.letters.reset();
     result.report.clear();
 }
 
@@ -193,51 +199,33 @@ DocumentReading DocumentReading::fromJson(json::Object const& object) {
 }
 
 ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
-                        Along along, std::size_t place) {
+                        Along const& along, std::size_t place) {
     ReadResult result;
-    DocumentReading& reading = result.reading;
-    reading.document = file.filename().string();
+    result.reading.document = file.filename().string();
     try {
-        if (contains(along, Along::Trace))
-            reading.trace = explainPresets(presets, reading.document);
+        if (along.beforeReading)
+            along.beforeReading(result, presets);
         std::string bytes = Reader::readFile(file);
         result.sha256 = Base::sha256(bytes);
         Reader::Document document = Reader::openDocument(std::move(bytes), file);
-        auto const& [extractPreset, packPreset] = findPresets(reading.document, presets, settings);
-        reading.extractPreset = extractPreset.strRegex();
-        reading.packPreset = packPreset.name();
-        if (extractPreset.isForAttachemnt())
-            return result;
-        requirePatterns(extractPreset, settings);
-        bool const withReport = contains(along, Along::Report);
-        bool const withTrace = contains(along, Along::Trace);
-        Reader::Trace trace;
-        reading.letters = lettersOf(document, extractPreset, withReport || withTrace ? &trace : nullptr);
-        if (withTrace)
-            addPages(reading.trace, document, extractPreset, trace);
-        if (withReport)
-            result.report = Report::section(Report::describe(reading, document, trace), place);
-        if (contains(along, Along::Pages))
-            result.pages = pagesOf(document, reading);
-        else
-            result.pages.resize(reading.letters->size());
+        readLetters(result, document, presets, settings, along, place);
     } catch (std::exception const& failure) {
         fail(result, failure);
     }
     return result;
 }
 
-ReadResult splitDocument(fs::path const& file, std::string const& digest, DocumentReading reading) {
-    ReadResult result{std::move(reading)};
+ReadResult splitDocument(DecidedDocument decided) {
+    ReadResult result{std::move(decided.reading)};
     if (!result.reading.letters)
         return result;
     try {
-        std::string bytes = Reader::readFile(file);
+        std::string bytes = Reader::readFile(decided.file);
         result.sha256 = Base::sha256(bytes);
-        if (result.sha256 != digest)
-            throw Base::Error('"' + file.string() + "\" has changed; make the plan again");
-        Reader::Document document = Reader::openDocument(std::move(bytes), file);
-        result.pages = pagesOf(document, result.reading);
+        if (result.sha256 != decided.sha256)
+            throw Base::Error('"' + decided.file.string() + "\" has changed; make the plan again");
+        Reader::Document document = Reader::openDocument(std::move(bytes), decided.file);
+        addBlobs(*result.reading.letters, document);
     } catch (std::exception const& failure) {
         fail(result, failure);
     }

@@ -6,14 +6,27 @@
 #include "vlservice/pack/shared_mem_buffer.h"
 #include "vlservice/presets/presets.h"
 
+#include <cstddef>
 #include <filesystem>
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
 
+namespace Reader {
+class Document;
+struct Trace;
+} // namespace Reader
+
 namespace VlMail {
 
 class NodeSettings;
+
+/// A page of a document, compressed as containers and databases keep it.
+struct PageBlob {
+    int number = 0;
+    SharedMemBuffer data;
+};
 
 struct LetterReading {
     /// From 1.
@@ -21,6 +34,8 @@ struct LetterReading {
     Cfg::ExtractedFields fields;
     /// The obligatory fields that the letter does not have. They do not keep it from going out.
     std::vector<std::string> missing = {};
+    /// Its pages in their order, when they were asked for; none of a letter that cannot go out.
+    std::vector<PageBlob> blobs = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -53,50 +68,53 @@ struct DocumentReading {
     static DocumentReading fromJson(json::Object const& object);
 };
 
-/// A page of a document, compressed as containers and databases keep it.
-struct PageBlob {
-    int number = 0;
-    SharedMemBuffer data;
-};
-
-/// A document as read, and on request the pages of its letters.
+/// A document as read.
 struct ReadResult {
     DocumentReading reading;
     /// Of the file; empty when it could not be read.
     std::string sha256 = {};
-    /// For each letter of the reading the blobs of its pages, when they were asked for; none for a letter
-    /// that cannot go out.
-    std::vector<std::vector<PageBlob>> pages = {};
-    /// The document's section of a report, when it was asked for and there are letters.
+    /// The document's section of a report, when Along::afterReading makes one.
     std::string report = {};
 };
 
 json::Array toJsonArray(std::vector<int> const& numbers);
 
-/// What comes along with the letters, as a set.
-enum class Along : unsigned {
-    Nothing = 0,
-    Pages = 1,
-    Report = 2,
-    /// How the letters came about, as the reading's `trace`.
-    Trace = 4,
+/// A document where it has been read, with how its letters came about.
+struct OpenDocument {
+    Reader::Document& document;
+    Cfg::ExtractPreset const& preset;
+    Reader::Trace const& trace;
+    /// Among those of the batch, from 1.
+    std::size_t place;
 };
 
-constexpr Along operator|(Along one, Along other) {
-    return static_cast<Along>(static_cast<unsigned>(one) | static_cast<unsigned>(other));
-}
-constexpr bool contains(Along set, Along one) {
-    return (static_cast<unsigned>(set) & static_cast<unsigned>(one)) != 0;
-}
+/// What comes along with a document's letters. The functions run where the document is read, which may be a
+/// worker process: they change the result and nothing else. What they throw is the reading's `error`.
+struct Along {
+    enum class Pages : bool { No, Yes };
 
-/// Reads a document as the settings say; `place` is its place in a report, from 1. Failures are the reading's
-/// `error`; nothing derived from std::exception is thrown.
+    Pages pages = Pages::No;
+    /// Called with the document's name alone, before it is opened.
+    std::function<void(ReadResult&, Cfg::Presets const&)> beforeReading = {};
+    /// Called when its letters are there; an attachment has none.
+    std::function<void(ReadResult&, OpenDocument const&)> afterReading = {};
+};
+
+/// Reads a document as the settings say; `place` is among those of the batch, from 1. Failures are the
+/// reading's `error`; nothing derived from std::exception is thrown.
 ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
-                        NodeSettings const& settings, Along along, std::size_t place);
+                        NodeSettings const& settings, Along const& along, std::size_t place);
 
-/// The pages of a document that was read before, for the letters that can go out. A document that is not the
-/// one with that digest any more is a failure, said in the reading's `error`.
-ReadResult splitDocument(std::filesystem::path const& file, std::string const& sha256,
-                         DocumentReading reading);
+/// A document whose letters have been decided on.
+struct DecidedDocument {
+    /// Absolute.
+    std::filesystem::path file;
+    std::string sha256;
+    DocumentReading reading;
+};
+
+/// The pages of those of its letters that can go out. A document that is not the one with that digest any
+/// more is a failure, said in the reading's `error`.
+ReadResult splitDocument(DecidedDocument decided);
 
 } // namespace VlMail

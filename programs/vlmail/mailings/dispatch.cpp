@@ -34,14 +34,13 @@ void Dispatch::take(ReadResult result) {
     } else if (reading.isAttachment()) {
         attachments_.push_back(reading.document);
     } else {
-        mailLetters(std::move(reading), result.pages);
+        mailLetters(std::move(reading));
     }
 }
 
-void Dispatch::mailLetters(DocumentReading reading, std::vector<std::vector<PageBlob>> const& pages) {
+void Dispatch::mailLetters(DocumentReading reading) {
     std::string name;
-    for (std::size_t i = 0; i < reading.letters->size(); ++i) {
-        LetterReading& letter = (*reading.letters)[i];
+    for (LetterReading& letter : *reading.letters) {
         std::string const why = letter.whyNot();
         if (!why.empty()) {
             leftOut_.push_back({reading.document, letter.pages, why});
@@ -50,7 +49,7 @@ void Dispatch::mailLetters(DocumentReading reading, std::vector<std::vector<Page
         MailingBuilder& mailing = mailingFor(reading.packPreset).builder();
         if (name.empty())
             name = mailing.nameFor(reading.document);
-        mailing.add(name, std::move(letter), pages[i]);
+        mailing.add(name, std::move(letter));
     }
 }
 

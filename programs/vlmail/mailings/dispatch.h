@@ -41,7 +41,7 @@ private:
         std::string reason;
     };
 
-    void mailLetters(DocumentReading reading, std::vector<std::vector<PageBlob>> const& pages);
+    void mailLetters(DocumentReading reading);
     OutgoingMailing& mailingFor(std::string const& packPreset);
     std::string priceInWords(OutgoingMailing const* mailing) const;
     void fail(std::string const& name, std::string const& reason);

@@ -39,9 +39,8 @@ std::string MailingBuilder::nameFor(std::string const& document) {
     return name;
 }
 
-void MailingBuilder::add(std::string const& document, LetterReading letter,
-                         std::vector<PageBlob> const& blobs) {
-    for (PageBlob const& blob : blobs)
+void MailingBuilder::add(std::string const& document, LetterReading letter) {
+    for (PageBlob const& blob : letter.blobs)
         pages_.savePage(document, std::to_string(blob.number), blob.data);
     pageCount_ += letter.pages.size();
     ++letterCount_;

@@ -22,10 +22,10 @@ public:
     /// folders.
     std::string nameFor(std::string const& document);
 
-    /// Adds a letter under a name from nameFor(), with the blobs of its pages in their order.
+    /// Adds a letter under a name from nameFor(), and its pages.
     /// A letter that equals an earlier one in all that must agree joins it, unless the pack preset forbids
     /// grouping; one whose other values cannot be merged stays alone.
-    void add(std::string const& document, LetterReading letter, std::vector<PageBlob> const& blobs);
+    void add(std::string const& document, LetterReading letter);
 
     Mailing::Metadata const& metadata() const { return metadata_; }
     std::size_t letterCount() const { return letterCount_; }

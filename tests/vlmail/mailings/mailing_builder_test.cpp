@@ -10,7 +10,6 @@ namespace {
 
 using VlMail::LetterReading;
 using VlMail::MailingBuilder;
-using VlMail::PageBlob;
 
 struct SavedPages : PageSaverI {
     SavedPages() : PageSaverI("id") {}
@@ -27,7 +26,7 @@ protected:
     static LetterReading letter(std::string const& address, std::string const& otherFields = "") {
         std::string const text = R"({"f": [{"name": "postal", "value": ")" + address +
                                  R"(", "priority": 1, "send_to_server": true})" + otherFields + "]}";
-        return {{1}, Cfg::ExtractedFields(parse(text).get("f").toArray())};
+        return {{1}, Cfg::ExtractedFields(parse(text).get("f").toArray()), {}, {{1, {}}}};
     }
     static Cfg::PackPreset preset(std::string const& more = "") {
         return Cfg::PackPreset(parse(R"({"name": "P")" + more + "}"), {});
@@ -42,22 +41,21 @@ protected:
         return text.str();
     }
 
-    std::vector<PageBlob> const onePage_{{1, {}}};
     SavedPages saved_;
 };
 
 TEST_F(MailingBuilderTest, StoresPagesUnderTheirNumbers) {
     MailingBuilder mailing = builder();
-    mailing.add("a.pdf", {{2, 3}, letter("x").fields}, {{2, {}}, {3, {}}});
+    mailing.add("a.pdf", {{2, 3}, letter("x").fields, {}, {{2, {}}, {3, {}}}});
     EXPECT_EQ(saved_.names, (std::vector<std::string>{"a.pdf:2", "a.pdf:3"}));
     EXPECT_EQ(mailing.metadata().letters.at(0).documents.at(0).pages, (std::vector<int>{2, 3}));
 }
 
 TEST_F(MailingBuilderTest, GroupsLettersThatAgree) {
     MailingBuilder mailing = builder();
-    mailing.add("a.pdf", letter("x"), onePage_);
-    mailing.add("b.pdf", letter("y"), onePage_);
-    mailing.add("c.pdf", letter("x"), onePage_);
+    mailing.add("a.pdf", letter("x"));
+    mailing.add("b.pdf", letter("y"));
+    mailing.add("c.pdf", letter("x"));
     ASSERT_EQ(mailing.metadata().letters.size(), 2u);
     EXPECT_EQ(mailing.metadata().letters[0].documents.size(), 2u);
     EXPECT_EQ(mailing.metadata().letters[0].documents[1].document, "c.pdf");
@@ -66,8 +64,8 @@ TEST_F(MailingBuilderTest, GroupsLettersThatAgree) {
 
 TEST_F(MailingBuilderTest, GroupsNothingWhenThePackPresetSaysSo) {
     MailingBuilder mailing = builder(preset(R"(, "no_group": true)"));
-    mailing.add("a.pdf", letter("x"), onePage_);
-    mailing.add("c.pdf", letter("x"), onePage_);
+    mailing.add("a.pdf", letter("x"));
+    mailing.add("c.pdf", letter("x"));
     EXPECT_EQ(mailing.metadata().letters.size(), 2u);
 }
 
@@ -75,8 +73,8 @@ TEST_F(MailingBuilderTest, MergesTheValuesOfAGroup) {
     MailingBuilder mailing = builder();
     std::string const two = R"(,{"name": "n", "value": 2, "ignore_on_group": 1})";
     std::string const three = R"(,{"name": "n", "value": 3, "ignore_on_group": 1})";
-    mailing.add("a.pdf", letter("x", two), onePage_);
-    mailing.add("b.pdf", letter("x", three), onePage_);
+    mailing.add("a.pdf", letter("x", two));
+    mailing.add("b.pdf", letter("x", three));
     EXPECT_EQ(fieldsOf(mailing, 0), R"([{"name":"postal","value":"x","priority":1,"send_to_server":true},)"
                                     R"({"name":"n","value":5,"ignore_on_group":1}])");
 }
@@ -84,10 +82,9 @@ TEST_F(MailingBuilderTest, MergesTheValuesOfAGroup) {
 TEST_F(MailingBuilderTest, LeavesALetterAloneWhoseValuesCannotBeMerged) {
     MailingBuilder mailing = builder();
     std::string const list = R"(,{"name": "l", "value": ["p"], "ignore_on_group": 6})";
-    mailing.add("a.pdf", letter("x", list + R"(,{"name": "n", "value": 2, "ignore_on_group": 1})"), onePage_);
+    mailing.add("a.pdf", letter("x", list + R"(,{"name": "n", "value": 2, "ignore_on_group": 1})"));
     std::string const before = fieldsOf(mailing, 0);
-    mailing.add("b.pdf", letter("x", list + R"(,{"name": "n", "value": "2", "ignore_on_group": 1})"),
-                onePage_);
+    mailing.add("b.pdf", letter("x", list + R"(,{"name": "n", "value": "2", "ignore_on_group": 1})"));
     ASSERT_EQ(mailing.metadata().letters.size(), 2u);
     EXPECT_EQ(fieldsOf(mailing, 0), before);
 }
@@ -102,7 +99,7 @@ TEST_F(MailingBuilderTest, TellsDocumentsOfOneNameApart) {
 
 TEST_F(MailingBuilderTest, WritesMetadataThatReadsBack) {
     MailingBuilder mailing = builder(preset(R"(, "duplex": true, "extra": 1)"));
-    mailing.add("a.pdf", letter("x"), onePage_);
+    mailing.add("a.pdf", letter("x"));
     Mailing::Metadata const back = Mailing::Metadata::fromBlob(mailing.metadata().toBlob());
     EXPECT_EQ(back.toJson(), mailing.metadata().toJson());
     EXPECT_EQ(back.packPreset, preset(R"(, "duplex": true, "extra": 1)"));

@@ -18,20 +18,13 @@ namespace VlMail {
 /// Dispatch::toJson() and is there to be read by people and programs, and "digest" is over all the rest.
 class Plan {
 public:
-    struct Document {
-        /// Absolute.
-        std::filesystem::path file;
-        std::string sha256;
-        DocumentReading reading;
-    };
-
     /// The settings may be the global defaults, which have no file.
     explicit Plan(NodeSettings const& settings);
     /// Throws Error when the file is no plan or was changed.
     static Plan fromFile(std::filesystem::path const& file);
 
-    void add(Document document) { documents_.push_back(std::move(document)); }
-    std::vector<Document> const& documents() const { return documents_; }
+    void add(DecidedDocument document) { documents_.push_back(std::move(document)); }
+    std::vector<DecidedDocument> const& documents() const { return documents_; }
 
     /// The whole document as text; `outcome` comes from Dispatch::toJson().
     std::string toText(json::Object const& outcome) const;
@@ -46,7 +39,7 @@ private:
     /// Empty for the global defaults.
     std::filesystem::path settingsFile_;
     std::string settingsSha256_;
-    std::vector<Document> documents_;
+    std::vector<DecidedDocument> documents_;
 };
 
 } // namespace VlMail

@@ -1,4 +1,4 @@
-#include "programs/vlmail/letters/plan.h"
+#include "programs/vlmail/mailings/plan.h"
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
@@ -90,7 +90,7 @@ Plan Plan::fromFile(fs::path const& file) {
 
 std::string Plan::toText(json::Object const& outcome) const {
     json::Array documents;
-    for (Document const& document : documents_) {
+    for (DecidedDocument const& document : documents_) {
         json::Object object = fileToJson(document.file, document.sha256);
         for (auto const& [key, member] : document.reading.toJson())
             object.set(key, member);
@@ -114,7 +114,7 @@ void Plan::requireUnchanged() const {
     };
     if (!settingsFile_.empty())
         check(settingsFile_, settingsSha256_);
-    for (Document const& document : documents_) {
+    for (DecidedDocument const& document : documents_) {
         if (!document.reading.failed())
             check(document.file, document.sha256);
     }

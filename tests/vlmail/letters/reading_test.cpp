@@ -1,0 +1,78 @@
+#include "programs/vlmail/letters/reading.h"
+
+#include "programs/reader/document.h"
+#include "programs/vlmail/letters/node_settings.h"
+#include "tests/support/temporary_folder.h"
+#include "vlservice/json/json_text.h"
+
+#include <gmock/gmock.h>
+
+#include <fstream>
+#include <stdexcept>
+
+namespace VlMail {
+namespace {
+
+using testing::ElementsAre;
+using testing::Field;
+using testing::IsEmpty;
+using testing::SizeIs;
+
+/// A document of two letters, of which the second has no address.
+class Readings : public testing::Test {
+protected:
+    Readings() {
+        std::ofstream(file_) << "Mail: a@b.example\nRef: 1\fmore\fRef: 2";
+        std::string const text = R"({"presets": {"extract_presets": [{"own": true, "match": ".*", "zones": [
+            {"name": "All", "location": {"right": 100000, "bottom": 100000}, "fields": [
+            {"name": "email", "priority": 2, "value_extract": "^Mail: (?<VAL>.*)$"},
+            {"name": "ref", "mark": 1, "value_extract": "^Ref: (?<VAL>.*)$"}]}]}]}})";
+        settings_ = NodeSettings::resolved(json::strToObject(text.data(), text.size()), "here");
+    }
+
+    ReadResult read(Along const& along) const {
+        return readDocument(file_, settings_.presets(), settings_, along, 1);
+    }
+
+    VLServiceTest::TemporaryFolder folder_;
+    std::filesystem::path const file_ = folder_.path() / "a.txt";
+    NodeSettings settings_;
+};
+
+TEST_F(Readings, HoldThePagesOfLettersThatCanGoOut) {
+    ReadResult const result = read({.pages = Along::Pages::Yes});
+    ASSERT_EQ(result.reading.error, "");
+    ASSERT_THAT(*result.reading.letters, SizeIs(2));
+    EXPECT_THAT((*result.reading.letters)[0].blobs,
+                ElementsAre(Field(&PageBlob::number, 1), Field(&PageBlob::number, 2)));
+    EXPECT_THAT((*result.reading.letters)[1].blobs, IsEmpty());
+}
+
+TEST_F(Readings, HoldNoPagesUnlessAsked) {
+    ReadResult const result = read({});
+    ASSERT_THAT(*result.reading.letters, SizeIs(2));
+    EXPECT_THAT((*result.reading.letters)[0].blobs, IsEmpty());
+}
+
+TEST_F(Readings, TakeWhatComesAlong) {
+    Along along;
+    along.beforeReading = [](ReadResult& result, Cfg::Presets const&) {
+        result.report = result.reading.document;
+    };
+    along.afterReading = [](ReadResult& result, OpenDocument const& read) {
+        result.report +=
+            ": " + std::to_string(read.document.pageCount()) + " pages, place " + std::to_string(read.place);
+    };
+    EXPECT_EQ(read(along).report, "a.txt: 3 pages, place 1");
+}
+
+TEST_F(Readings, FailWithWhatComesAlong) {
+    Along along;
+    along.afterReading = [](ReadResult&, OpenDocument const&) { throw std::runtime_error("no picture"); };
+    ReadResult const result = read(along);
+    EXPECT_EQ(result.reading.error, "no picture");
+    EXPECT_FALSE(result.reading.letters);
+}
+
+} // namespace
+} // namespace VlMail
