@@ -23,10 +23,12 @@ class Readings : public testing::Test {
 protected:
     Readings() {
         std::ofstream(file_) << "Mail: a@b.example\nRef: 1\fmore\fRef: 2";
-        std::string const text = R"({"presets": {"extract_presets": [{"own": true, "match": ".*", "zones": [
+        std::string const text =
+            R"({"presets": {"extract_presets": [{"own": true, "match": ".*", "pack_preset": "P", "zones": [
             {"name": "All", "location": {"right": 100000, "bottom": 100000}, "fields": [
-            {"name": "email", "priority": 2, "value_extract": "^Mail: (?<VAL>.*)$"},
-            {"name": "ref", "mark": 1, "value_extract": "^Ref: (?<VAL>.*)$"}]}]}]}})";
+            {"name": "email", "priority": 2, "send_to_server": true, "value_extract": "^Mail: (?<VAL>.*)$"},
+            {"name": "ref", "mark": 1, "value_extract": "^Ref: (?<VAL>.*)$"}]}]}],
+            "pack_presets": [{"own": true, "name": "P"}]}})";
         settings_ = NodeSettings::resolved(json::strToObject(text.data(), text.size()), "here");
     }
 
@@ -34,24 +36,24 @@ protected:
         return readDocument(file_, settings_.presets(), settings_, along, 1);
     }
 
-    VLServiceTest::TemporaryFolder folder_;
-    std::filesystem::path const file_ = folder_.path() / "a.txt";
+    TemporaryFolder folder_;
+    std::filesystem::path const file_ = folder_ / "a.txt";
     NodeSettings settings_;
 };
 
 TEST_F(Readings, HoldThePagesOfLettersThatCanGoOut) {
     ReadResult const result = read({.pages = Along::Pages::Yes});
     ASSERT_EQ(result.reading.error, "");
-    ASSERT_THAT(*result.reading.letters, SizeIs(2));
-    EXPECT_THAT((*result.reading.letters)[0].blobs,
+    ASSERT_THAT(result.reading.letters.value(), SizeIs(2));
+    EXPECT_THAT(result.reading.letters->at(0).blobs,
                 ElementsAre(Field(&PageBlob::number, 1), Field(&PageBlob::number, 2)));
-    EXPECT_THAT((*result.reading.letters)[1].blobs, IsEmpty());
+    EXPECT_THAT(result.reading.letters->at(1).blobs, IsEmpty());
 }
 
 TEST_F(Readings, HoldNoPagesUnlessAsked) {
     ReadResult const result = read({});
-    ASSERT_THAT(*result.reading.letters, SizeIs(2));
-    EXPECT_THAT((*result.reading.letters)[0].blobs, IsEmpty());
+    ASSERT_THAT(result.reading.letters.value(), SizeIs(2));
+    EXPECT_THAT(result.reading.letters->at(0).blobs, IsEmpty());
 }
 
 TEST_F(Readings, TakeWhatComesAlong) {
