@@ -13,7 +13,6 @@
 
 #include <filesystem>
 #include <memory>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -66,11 +65,10 @@ void popplerAlone(benchmark::State& state) {
 
 void readLetters(benchmark::State& state) {
     VlMail::NodeSettings const settings;
-    std::ostringstream nowhere;
-    VlMail::Terminal const terminal{nowhere, nowhere};
+    VlMail::BatchWatcher watcher;
     std::size_t letters = 0;
     for (auto _ : state) {
-        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), {}, terminal,
+        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), {}, watcher,
                           [&](std::size_t, VlMail::ReadResult result) {
                               letters += result.reading.letters.value().size();
                           });

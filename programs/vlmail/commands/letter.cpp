@@ -1,4 +1,5 @@
 // vlmail letter: what the settings make of each document, for a person or as JSON.
+#include "programs/vlmail/commands/batch_command.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/explain_text.h"
@@ -120,7 +121,8 @@ int showLetters(Options const& options, Terminal const& terminal) {
     std::optional<Report::File> report;
     if (!options.report.empty())
         report.emplace(options.report);
-    readBatch(options.files, settings, options.jobs, alongFor(options), terminal,
+    BatchProgress progress(terminal);
+    readBatch(options.files, settings, options.jobs, alongFor(options), progress,
               [&](std::size_t, ReadResult result) {
                   DocumentReading const& reading = result.reading;
                   outcome.count(reading);
@@ -137,7 +139,7 @@ int showLetters(Options const& options, Terminal const& terminal) {
         report->write(outcome);
     if (!options.json && options.files.size() > 1)
         terminal.out << outcome.inWords() << '\n';
-    return outcome.exitStatus();
+    return exitStatusOf(outcome.end());
 }
 
 } // namespace

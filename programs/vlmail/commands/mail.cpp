@@ -1,6 +1,7 @@
 // vlmail mail and plan: the whole road from documents to mailings, in one go or decided first and carried out
 // later.
 #include "programs/base/pending_file.h"
+#include "programs/vlmail/commands/batch_command.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/service_options.h"
 #include "programs/vlmail/commands/settings.h"
@@ -39,7 +40,7 @@ int report(Dispatch const& dispatch, Options const& options, Terminal const& ter
         terminal.out << dispatch.toJson() << '\n';
     else
         dispatch.print();
-    return dispatch.exitStatus();
+    return exitStatusOf(dispatch.end());
 }
 
 /// Where the mailings go, by the options. The connection is there when a service is to get them.
@@ -72,7 +73,8 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = settingsFor(options, destination);
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
-    readBatch(options.files, settings, options.jobs, {.pages = Along::Pages::Yes}, terminal,
+    BatchProgress progress(terminal);
+    readBatch(options.files, settings, options.jobs, {.pages = Along::Pages::Yes}, progress,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -85,7 +87,8 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = plan.settings();
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
-    splitBatch(plan.documents(), options.jobs, terminal,
+    BatchProgress progress(terminal);
+    splitBatch(plan.documents(), options.jobs, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -96,7 +99,8 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
-    readBatch(options.files, settings, options.jobs, {}, terminal, [&](std::size_t index, ReadResult result) {
+    BatchProgress progress(terminal);
+    readBatch(options.files, settings, options.jobs, {}, progress, [&](std::size_t index, ReadResult result) {
         plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
         dispatch.take(std::move(result));
     });

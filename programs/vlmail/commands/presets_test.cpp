@@ -1,4 +1,5 @@
 // vlmail presets test: whether documents still give what they are expected to give.
+#include "programs/vlmail/commands/batch_command.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/presets.h"
 #include "programs/vlmail/golden/test_run.h"
@@ -89,7 +90,8 @@ int test(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = settingsFor(options);
     std::vector<TestCase> const cases = testCasesIn(options.folder);
     TestRun run(settings, options.update ? UpdateExpectations::Yes : UpdateExpectations::No);
-    run.readDocuments(cases, options.jobs, terminal);
+    BatchProgress progress(terminal);
+    run.readDocuments(cases, options.jobs, progress);
     std::map<Verdict, std::size_t> counts;
     for (TestCase const& one : cases) {
         TestResult const result = run.run(one);

@@ -37,13 +37,12 @@ TestResult write(TestCase const& one, DocumentReading const& reading, std::vecto
 TestRun::TestRun(NodeSettings const& settings, UpdateExpectations update)
     : settings_(settings), presets_(settings.presets()), update_(update == UpdateExpectations::Yes) {}
 
-void TestRun::readDocuments(std::vector<TestCase> const& cases, std::size_t workers,
-                            Terminal const& terminal) {
+void TestRun::readDocuments(std::vector<TestCase> const& cases, std::size_t workers, BatchWatcher& watcher) {
     std::vector<std::string> files;
     for (TestCase const& one : cases)
         if (one.hasDocument() && !one.isZonesText())
             files.push_back(one.document.string());
-    readBatch(files, settings_, workers, {}, terminal, [&](std::size_t index, ReadResult result) {
+    readBatch(files, settings_, workers, {}, watcher, [&](std::size_t index, ReadResult result) {
         readings_[files[index]] = std::move(result.reading);
     });
 }

@@ -2,8 +2,8 @@
 // Runs test cases of presets.
 
 #include "programs/vlmail/golden/test_case.h"
+#include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/reading.h"
-#include "programs/vlmail/terminal/terminal.h"
 
 #include <cstddef>
 #include <map>
@@ -32,7 +32,7 @@ public:
     TestRun(NodeSettings const& settings, UpdateExpectations update);
 
     /// Reads the documents of the cases, all at once, on up to `workers` processes.
-    void readDocuments(std::vector<TestCase> const& cases, std::size_t workers, Terminal const& terminal);
+    void readDocuments(std::vector<TestCase> const& cases, std::size_t workers, BatchWatcher& watcher);
     /// One of the cases whose documents were read.
     TestResult run(TestCase const& one) const;
 

@@ -4,7 +4,6 @@
 #include "programs/reader/document.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/worker_pool.h"
-#include "programs/vlmail/terminal/progress.h"
 #include "vlservice/json/json_text.h"
 
 #include <cstdint>
@@ -101,39 +100,37 @@ ReadResult crashed(std::string const& file) {
     return result;
 }
 
-void runBatch(std::size_t count, std::size_t workers, Terminal const& terminal,
+void runBatch(std::size_t count, std::size_t workers, BatchWatcher& watcher,
               std::function<ReadResult(std::size_t)> const& work,
               std::function<std::string(std::size_t)> const& fileOf,
               std::function<void(std::size_t, ReadResult)> const& take) {
-    ProgressLine progress(terminal, count);
+    watcher.begins(count);
     auto const consume = [&](std::size_t index, std::optional<std::string> bytes) {
         ReadResult result = bytes ? unpack(std::move(*bytes)) : crashed(fileOf(index));
-        if (result.reading.letters)
-            progress.lettersFound(result.reading.letters->size());
-        progress.hide();
+        watcher.handsOver(result.reading.letters ? result.reading.letters->size() : 0);
         take(index, std::move(result));
     };
     runJobs(
         count, workers, [&](std::size_t index) { return pack(work(index)); }, consume,
-        [&](std::size_t done) { progress.documentsDone(done); });
+        [&](std::size_t done) { watcher.documentsDone(done); });
 }
 
 } // namespace
 
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               Along const& along, Terminal const& terminal,
+               Along const& along, BatchWatcher& watcher,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
     runBatch(
-        files.size(), workers, terminal,
+        files.size(), workers, watcher,
         [&](std::size_t index) { return readDocument(files[index], presets, settings, along, index + 1); },
         [&](std::size_t index) { return files[index]; }, take);
 }
 
-void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, Terminal const& terminal,
+void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, BatchWatcher& watcher,
                 std::function<void(std::size_t, ReadResult)> const& take) {
     runBatch(
-        documents.size(), workers, terminal,
+        documents.size(), workers, watcher,
         [&](std::size_t index) { return splitDocument(documents[index]); },
         [&](std::size_t index) { return documents[index].file.string(); }, take);
 }

@@ -2,7 +2,6 @@
 // Reading many documents at once.
 
 #include "programs/vlmail/letters/reading.h"
-#include "programs/vlmail/terminal/terminal.h"
 
 #include <functional>
 
@@ -10,15 +9,26 @@ namespace VlMail {
 
 class NodeSettings;
 
+/// Told how far a batch is.
+class BatchWatcher {
+public:
+    virtual ~BatchWatcher() = default;
+
+    virtual void begins(std::size_t /*documents*/) {}
+    /// In whatever order.
+    virtual void documentsDone(std::size_t /*done*/) {}
+    /// Before the result of a document with so many letters is handed over.
+    virtual void handsOver(std::size_t /*letters*/) {}
+};
+
 /// Reads the files by the settings, on up to `workers` processes, and hands each result over in the order of
-/// the files. Shows progress where a person watches. A document that brings its reader down has that for its
-/// error.
+/// the files. A document that brings its reader down has that for its error.
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
-               Along const& along, Terminal const& terminal,
+               Along const& along, BatchWatcher& watcher,
                std::function<void(std::size_t, ReadResult)> const& take);
 
 /// The same with the pages of documents that were read before, as splitDocument() gives them.
-void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, Terminal const& terminal,
+void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, BatchWatcher& watcher,
                 std::function<void(std::size_t, ReadResult)> const& take);
 
 } // namespace VlMail

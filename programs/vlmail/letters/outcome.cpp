@@ -1,7 +1,5 @@
 #include "programs/vlmail/letters/outcome.h"
 
-#include "programs/vlmail/terminal/terminal.h"
-
 namespace VlMail {
 
 void Outcome::count(DocumentReading const& reading) {
@@ -24,10 +22,10 @@ std::string Outcome::inWords() const {
     return text;
 }
 
-int Outcome::exitStatus() const {
+Outcome::End Outcome::end() const {
     if (failed_ || failedDocuments_ > 0)
-        return FAILED;
-    return readyLetters_ < letters_ ? INCOMPLETE : FINE;
+        return End::Failed;
+    return readyLetters_ < letters_ ? End::Incomplete : End::Fine;
 }
 
 std::string pagesInWords(std::vector<int> const& pages) {

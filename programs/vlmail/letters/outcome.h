@@ -1,5 +1,5 @@
 #pragma once
-// How a batch ended: what was done, and the exit status that follows.
+// How a batch ended.
 
 #include "programs/vlmail/letters/reading.h"
 
@@ -11,13 +11,20 @@ namespace VlMail {
 
 class Outcome {
 public:
+    enum class End {
+        Fine,
+        Failed,
+        /// Done, but some letters cannot go out.
+        Incomplete,
+    };
+
     void count(DocumentReading const& reading);
     /// Something beside the documents failed.
     void fail() { failed_ = true; }
 
     /// "20 documents, 24 letters: 21 ready, 3 cannot go out; 1 document failed".
     std::string inWords() const;
-    int exitStatus() const;
+    End end() const;
 
 private:
     std::size_t documents_ = 0;

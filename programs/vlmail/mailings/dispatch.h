@@ -31,7 +31,7 @@ public:
     void print() const;
     /// {"mailings", "left_out", "attachments", "failures"}.
     json::Object toJson() const;
-    int exitStatus() const { return outcome_.exitStatus(); }
+    Outcome::End end() const { return outcome_.end(); }
 
 private:
     /// A letter, or all of a document, that stays behind.
