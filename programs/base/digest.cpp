@@ -1,5 +1,7 @@
 #include "programs/base/digest.h"
 
+#include "programs/base/hex.h"
+
 #include <openssl/evp.h>
 
 #include <array>
@@ -12,13 +14,7 @@ std::string sha256(std::string_view bytes) {
     unsigned int size = 0;
     if (EVP_Digest(bytes.data(), bytes.size(), digest.data(), &size, EVP_sha256(), nullptr) != 1)
         throw std::runtime_error("cannot compute a SHA-256 digest");
-    constexpr char const* DIGITS = "0123456789abcdef";
-    std::string text;
-    for (unsigned int i = 0; i < size; ++i) {
-        text += DIGITS[digest[i] >> 4];
-        text += DIGITS[digest[i] & 15];
-    }
-    return text;
+    return toHex(digest.data(), size);
 }
 
 } // namespace Base

@@ -3,7 +3,7 @@
 // renamed.
 
 #include <filesystem>
-#include <string>
+#include <string_view>
 
 namespace Base {
 
@@ -33,6 +33,6 @@ private:
 };
 
 /// Writes a whole file by way of a PendingFile. Throws std::system_error.
-void writeFile(std::filesystem::path const& target, std::string const& bytes);
+void writeFile(std::filesystem::path const& target, std::string_view bytes);
 
 } // namespace Base

@@ -1,6 +1,7 @@
 #include "programs/channel/client_connection.h"
 
 #include "programs/base/error.h"
+#include "programs/base/host_port.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/pin_store.h"
 #include "programs/channel/token.h"
@@ -345,9 +346,6 @@ void ClientConnection::end(std::string const& reason) {
         failRequest(request, failure_);
 }
 
-std::string ClientConnection::service() const {
-    bool const isIp6 = settings_.host.find(':') != std::string::npos;
-    return (isIp6 ? '[' + settings_.host + ']' : settings_.host) + ':' + std::to_string(settings_.port);
-}
+std::string ClientConnection::service() const { return Base::hostPortText(settings_.host, settings_.port); }
 
 } // namespace Channel

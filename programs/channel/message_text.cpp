@@ -1,8 +1,8 @@
 #include "programs/channel/message_text.h"
 
+#include "programs/base/utf8.h"
 #include "vlservice/json/json_text.h"
 
-#include <algorithm>
 #include <sstream>
 
 namespace Channel {
@@ -20,15 +20,7 @@ std::string print(json::Object const& object) {
 
 json::Object parse(std::string_view text) { return json::strToObject(text.data(), text.size()); }
 
-std::string printError(std::string reason) {
-    try {
-        return print({{ERR, reason}});
-    } catch (json::Exc const&) {
-        std::replace_if(
-            reason.begin(), reason.end(), [](char c) { return static_cast<unsigned char>(c) >= 0x80; }, '?');
-        return print({{ERR, reason}});
-    }
-}
+std::string printError(std::string const& reason) { return print({{ERR, Base::validUtf8(reason)}}); }
 
 std::string reasonOf(std::string_view errorText) {
     try {

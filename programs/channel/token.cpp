@@ -27,7 +27,7 @@ std::string randomHex() {
     std::array<unsigned char, RANDOM_BYTES> bytes;
     if (RAND_bytes(bytes.data(), bytes.size()) != 1)
         throw Base::Error("The system gives no random numbers.");
-    return Base::toHex(bytes);
+    return Base::toHex(bytes.data(), bytes.size());
 }
 
 std::string_view trimmed(std::string_view text) {
@@ -66,7 +66,7 @@ std::string makeProof(Side side, std::string_view token, std::string_view client
     unsigned int length = 0;
     HMAC(EVP_sha256(), token.data(), static_cast<int>(token.size()),
          reinterpret_cast<unsigned char const*>(message.data()), message.size(), code.data(), &length);
-    return Base::toHex({code.data(), length});
+    return Base::toHex(code.data(), length);
 }
 
 bool isSameProof(std::string_view a, std::string_view b) {

@@ -1,5 +1,7 @@
 #include "programs/patterns/hard_lines.h"
 
+#include "programs/base/utf8.h"
+
 #include "programs/patterns/outline.h"
 #include "programs/patterns/sampler.h"
 
@@ -13,10 +15,7 @@
 namespace Patterns {
 namespace {
 
-std::size_t characterCount(std::string_view text) {
-    return static_cast<std::size_t>(
-        std::count_if(text.begin(), text.end(), [](char c) { return (c & 0xC0) != 0x80; }));
-}
+using Base::characterCount;
 
 /// A text that a pattern may take again and again, and what stands in front of it.
 struct Run {

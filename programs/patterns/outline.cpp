@@ -1,5 +1,7 @@
 #include "programs/patterns/outline.h"
 
+#include "programs/base/utf8.h"
+
 #include <algorithm>
 #include <cctype>
 #include <charconv>
@@ -13,11 +15,6 @@ using Kind = Piece::Kind;
 /// Deeper groups are not looked into.
 constexpr int MAX_DEPTH = 40;
 
-/// Bytes of the UTF-8 character that begins with this byte.
-std::size_t characterLength(char first) {
-    auto const byte = static_cast<unsigned char>(first);
-    return byte < 0xC0 ? 1 : byte < 0xE0 ? 2 : byte < 0xF0 ? 3 : 4;
-}
 
 class OutlineParser {
 public:
@@ -88,7 +85,7 @@ private:
     }
 
     Piece literal() {
-        std::string character(text_.substr(at_, characterLength(text_[at_])));
+        std::string character(Base::firstCharacters(text_.substr(at_), 1));
         at_ += character.size();
         return literalOf(std::move(character));
     }

@@ -1,6 +1,6 @@
 #include "programs/reader/blank_widths.h"
 
-#include "programs/reader/letters_of.h"
+#include "programs/base/utf8.h"
 
 #include <algorithm>
 
@@ -25,7 +25,7 @@ BlankWidths::BlankWidths(Page const& page) : page_(page), samples_(page.fonts.si
 }
 
 void BlankWidths::addWord(Sample& sample, Word const& word) {
-    std::size_t const characters = countLetters(word.text);
+    std::size_t const characters = Base::characterCount(word.text);
     if (characters < MIN_TYPED_CHARACTERS)
         return;
     double const width = lengthAlong(word.box, word.turn) / (static_cast<double>(characters) * word.size);

@@ -42,9 +42,6 @@ private:
     std::map<int, Page> pages_;
 };
 
-/// The bytes of a document, for openDocument() and for whoever else wants them. Throws Error.
-std::string readFile(std::filesystem::path const& path);
-
 /// Opens a PDF, or a text file whose pages end with form feeds. Throws Error.
 Document openDocument(std::filesystem::path const& path);
 

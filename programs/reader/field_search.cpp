@@ -105,8 +105,11 @@ bool separatesLetters(ExtractField const& field) {
 }
 
 std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
-    std::shared_ptr<ExtractedField> value =
-        field.extractField(text.searchedText(), measureFor(field, text, trace));
+    std::shared_ptr<ExtractedField> value = field.extractField(
+        text.searchedText(), measureFor(field, text, trace), [trace](std::string const& reason) {
+            if (trace)
+                trace->failure = reason;
+        });
     if (trace) {
         trace->definition = &field;
         if (value && !value->isValidated())

@@ -1,6 +1,7 @@
 #include "programs/reader/pdf_page.h"
 
 #include "programs/base/error.h"
+#include "programs/base/hex.h"
 
 #include <qpdf/Buffer.hh>
 #include <qpdf/QPDF.hh>
@@ -25,13 +26,7 @@ std::string bytesOf(QPDF& pdf) {
     return std::string(reinterpret_cast<char const*>(bytes->getBuffer()), bytes->getSize());
 }
 
-std::string hex(unsigned value) {
-    static constexpr char DIGITS[] = "0123456789ABCDEF";
-    std::string text;
-    for (int shift = 12; shift >= 0; shift -= 4)
-        text += DIGITS[value >> shift & 0xF];
-    return text;
-}
+std::string hex(unsigned value) { return Base::hexNumber(value, 4); }
 
 std::string utf16Hex(char32_t c) {
     if (c <= 0xFFFF)

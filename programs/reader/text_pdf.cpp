@@ -1,13 +1,14 @@
 #include "programs/reader/text_pdf.h"
 
 #include "programs/base/error.h"
+#include "programs/base/hex.h"
+#include "programs/base/read_file.h"
 #include "programs/reader/clean_text.h"
 #include "programs/reader/font_file.h"
 #include "programs/reader/pdf_page.h"
 #include "programs/reader/typed_page.h"
 
-#include <fstream>
-#include <iterator>
+#include <filesystem>
 #include <map>
 #include <optional>
 #include <set>
@@ -24,11 +25,10 @@ constexpr char const* FONT_NAME = "TYPING+DejaVuSansMono";
 
 FontFile const& wideFont() {
     static FontFile const font = [] {
-        std::ifstream in(FONT_FILE, std::ios::binary);
-        if (!in)
+        if (!std::filesystem::exists(FONT_FILE))
             throw Base::Error(std::string("there is no font ") + FONT_FILE + "; install the package " +
                               FONT_PACKAGE);
-        return FontFile({std::istreambuf_iterator<char>(in), {}});
+        return FontFile(Base::readFile(FONT_FILE));
     }();
     return font;
 }
@@ -42,21 +42,6 @@ std::string decimal(double value) {
 }
 
 std::string inPoints(double hundredths) { return decimal(hundredths / PDF_POINT); }
-
-std::string hex(unsigned value, int digits) {
-    static constexpr char DIGITS[] = "0123456789ABCDEF";
-    std::string text;
-    for (int shift = 4 * (digits - 1); shift >= 0; shift -= 4)
-        text += DIGITS[value >> shift & 0xF];
-    return text;
-}
-
-std::string hex(std::string const& bytes) {
-    std::string text;
-    for (char const byte : bytes)
-        text += hex(static_cast<unsigned char>(byte), 2);
-    return text;
-}
 
 template<typename Take>
 void forEachCharacter(std::string const& utf8, Take const& take) {
@@ -99,7 +84,7 @@ private:
         int const baseline = page_.height - word.box.top - TypedPage::ASCENT;
         text_ += "1 0 0 1 " + inPoints(word.box.left) + " " + inPoints(baseline) + " Tm ";
         if (std::optional<std::string> const narrow = windows1252Of(word.text))
-            text_ += font("/Courier", 100) + "<" + hex(*narrow) + "> Tj\n";
+            text_ += font("/Courier", 100) + "<" + Base::toHex(narrow->data(), narrow->size()) + "> Tj\n";
         else // Its letters are a little wider than a column.
             text_ += font("/Carried", 100.0 * TypedPage::LETTER / wideFont().advance()) + "<" +
                      glyphsOf(word) + "> Tj\n";
@@ -111,7 +96,7 @@ private:
 
     std::string glyphsOf(Word const& word) const {
         std::string numbers;
-        forEachCharacter(word.text, [&](char32_t c) { numbers += hex(glyphs_.at(c), 4); });
+        forEachCharacter(word.text, [&](char32_t c) { numbers += Base::hexNumber(glyphs_.at(c), 4); });
         return numbers;
     }
 

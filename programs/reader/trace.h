@@ -24,6 +24,8 @@ struct FieldTrace {
     std::string cut;
     /// The text of the value before it was validated; nothing when the value is the default.
     std::optional<std::string> rawText;
+    /// Why the pattern could not be searched, in the engine's words.
+    std::optional<std::string> failure = {};
     /// The value, a copy; null when the field yields nothing.
     std::shared_ptr<Cfg::ExtractedField const> value;
     /// The value is the one of its name that a letter takes: the first that was found, or else the first

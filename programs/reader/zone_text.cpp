@@ -1,6 +1,6 @@
 #include "programs/reader/zone_text.h"
 
-#include "programs/reader/letters_of.h"
+#include "programs/base/utf8.h"
 
 #include <algorithm>
 #include <optional>
@@ -10,20 +10,12 @@
 namespace Reader {
 namespace {
 
-/// At most so many letters from the front.
-std::string_view cutToLetters(std::string_view text, std::size_t letters) {
-    for (std::size_t i = 0; i < text.size(); ++i)
-        if (beginsLetter(text[i]) && letters-- == 0)
-            return text.substr(0, i);
-    return text;
-}
-
 /// The part of a word's box that some of its letters take, as if all were equally wide.
 Box partOf(Word const& word, std::size_t begin, std::size_t end) {
     std::string_view const text = word.text;
-    double const letters = static_cast<double>(countLetters(text));
-    double const from = static_cast<double>(countLetters(text.substr(0, begin))) / letters;
-    double const to = static_cast<double>(countLetters(text.substr(0, end))) / letters;
+    double const letters = static_cast<double>(Base::characterCount(text));
+    double const from = static_cast<double>(Base::characterCount(text.substr(0, begin))) / letters;
+    double const to = static_cast<double>(Base::characterCount(text.substr(0, end))) / letters;
     return partAlong(word.box, word.turn, from, to);
 }
 
@@ -50,7 +42,7 @@ ZoneText ZoneText::given(std::string const& text) {
     for (std::size_t begin = 0; begin <= text.size();) {
         std::size_t const end = std::min(text.find('\n', begin), text.size());
         std::string_view const line =
-            cutToLetters(std::string_view(text).substr(begin, end - begin), MAX_LINE_LENGTH);
+            Base::firstCharacters(std::string_view(text).substr(begin, end - begin), MAX_LINE_LENGTH);
         if (!zone.lines_.empty())
             zone.text_ += '\n';
         zone.text_ += line;
@@ -102,11 +94,11 @@ ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line, Box cons
             ++result.length;
             --lettersLeft;
         }
-        std::string_view const text = cutToLetters(word.text, lettersLeft);
+        std::string_view const text = Base::firstCharacters(word.text, lettersLeft);
         text_ += text;
         result.pieces.push_back({result.length, result.length + text.size(), &word});
         result.length += text.size();
-        lettersLeft -= countLetters(text);
+        lettersLeft -= Base::characterCount(text);
     }
     return result;
 }

@@ -1,4 +1,5 @@
-#include "programs/base/one_line.h"
+#include "programs/base/host_port.h"
+#include "programs/base/plain_text.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
 #include "vlservice/platform/log.h"
@@ -12,9 +13,7 @@ int serve(VlServiced::Options const& options) {
     try {
         g_LogVerbose = options.verbose;
         VlServiced::Service service(options);
-        bool const isIp6 = options.listen.find(':') != std::string::npos;
-        std::cout << "listening on " << (isIp6 ? '[' + options.listen + ']' : options.listen) << ':'
-                  << service.port() << '\n';
+        std::cout << "listening on " << Base::hostPortText(options.listen, service.port()) << '\n';
         if (!service.fingerprint().empty())
             std::cout << "certificate " << service.fingerprint() << '\n';
         std::cout << std::flush;

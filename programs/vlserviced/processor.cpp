@@ -1,7 +1,7 @@
 #include "programs/vlserviced/processor.h"
 
 #include "programs/base/error.h"
-#include "programs/base/one_line.h"
+#include "programs/base/plain_text.h"
 #include "programs/protocol/failure.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/jobs/job_list.h"

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/service.h"
 
 #include "programs/base/error.h"
-#include "programs/base/one_line.h"
+#include "programs/base/plain_text.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
 #include "programs/protocol/query.h"

@@ -26,6 +26,10 @@ TEST(SafeFileName, KeepsAFileInsideItsFolder) {
         {"an embedded zero", std::string("a\0b", 3), "a_b"},
         {"a control character beyond ASCII", "a\xC2\x85z", "a_z"},
         {"broken UTF-8", "a\xFFz\xC3", "a_z_"},
+        {"an overlong zero", "a\xE0\x80\x80z", "a___z"},
+        {"half a pair of UTF-16", "a\xED\xA0\x80z", "a___z"},
+        {"an overlong character of four bytes", "a\xF0\x80\x80\x80z", "a____z"},
+        {"a character beyond the last", "a\xF4\x90\x80\x80z", "a____z"},
     };
     for (Case const& c : cases)
         EXPECT_EQ(Base::safeFileName(c.name), c.safe) << c.what;

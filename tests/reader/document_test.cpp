@@ -62,8 +62,8 @@ std::string pdfOf(std::string const& text) { return openDocument(text, "made.txt
 
 TEST_F(Documents, ThatCannotBeOpenedSayWhyAndWhatToDo) {
     EXPECT_EQ(complaint(folder_ / "none.pdf"), "there is no such file; check the name");
-    EXPECT_EQ(complaint(folder_), "is a folder; name the documents in it");
-    EXPECT_EQ(complaint("/dev/null"), "is no ordinary file; save the document to one");
+    EXPECT_EQ(complaint(folder_), "is a folder; name the files in it");
+    EXPECT_EQ(complaint("/dev/null"), "is no ordinary file; save it to one");
     EXPECT_EQ(complaint(file("empty.pdf", "")), "is empty; export the document again");
     EXPECT_EQ(complaint(file("picture.pdf", std::string("GIF89a\0\0", 8))),
               "is neither a PDF nor text; export the document as PDF");

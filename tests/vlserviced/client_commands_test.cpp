@@ -153,7 +153,7 @@ TEST_F(ClientCommands, WhatCannotBeSetIsToldInOneLine) {
         {{"settings", "set", "a=acme", "po", "code=A", "B"},
          "vlmail: \"B\" is neither the only argument, a file, nor KEY=VALUE\n"},
         {{"settings", "set", "a=acme", "po", "/missing.json"},
-         "vlmail: cannot read \"/missing.json\"; check the name and the rights\n"},
+         "vlmail: /missing.json: there is no such file; check the name\n"},
         {{"settings", "remove", "a=acme"}, "vlmail: there is no node a=acme\n"},
         {{"settings", "remove", "/"}, "vlmail: the root cannot be removed\n"},
     };

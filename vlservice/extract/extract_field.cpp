@@ -49,6 +49,11 @@ ExtractField::ExtractField(json::Object const& object) {
 }
 
 std::shared_ptr<ExtractedField> ExtractField::extractField(std::string& text, Measure const& measure) const {
+    return extractField(text, measure, {});
+}
+
+std::shared_ptr<ExtractedField> ExtractField::extractField(std::string& text, Measure const& measure,
+                                                           OnFailure const& onFailure) const {
     try {
         if (auto found = find(text)) {
             if (!measure)
@@ -59,6 +64,8 @@ std::shared_ptr<ExtractedField> ExtractField::extractField(std::string& text, Me
         }
     } catch (std::exception const& error) {
         Log::Lock(3).logStreamLine() << "Extract field failed with " << error.what() << '\n';
+        if (onFailure)
+            onFailure(error.what());
     }
     auto const& standIn = sharedDefault();
     return standIn ? std::make_shared<ExtractedField>(*standIn) : nullptr;

@@ -52,6 +52,9 @@ public:
     using Measure = std::function<unsigned long long(std::string& text, unsigned long long offset,
                                                      unsigned long long length)>;
 
+    /// Learns why a search failed, in the words that are logged as well.
+    using OnFailure = std::function<void(std::string const& reason)>;
+
     /// The group of an extraction pattern that captures the value.
     static std::string const REGEX_VALUE_GROUP_MARK;
 
@@ -76,6 +79,8 @@ public:
     /// change the definition. Throws nothing derived from std::exception: a bad pattern, text that is not
     /// UTF-8 and a failing measure are logged and count as no match.
     std::shared_ptr<ExtractedField> extractField(std::string& text, Measure const& measure = {}) const;
+    std::shared_ptr<ExtractedField> extractField(std::string& text, Measure const& measure,
+                                                 OnFailure const& onFailure) const;
 
     /// Types a value that is not validated yet, or marks it invalid; leaves any other alone.
     /// Throws boost::regex_error for a bad pattern, std::out_of_range for text that is not UTF-8.

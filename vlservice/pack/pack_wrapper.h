@@ -57,6 +57,8 @@ public:
     PackWrapper& operator=(PackWrapper const&) = delete;
     ~PackWrapper() override;
 
+    /// A failure has happened, which is logged; nothing can be read or written.
+    bool failed() const { return !okSoFar(); }
     boost::filesystem::path const& pthFile() const { return pth_; }
     /// Blobs in the index, the metadata included; 0 after a failed import.
     unsigned long long szBins() const { return bins_.size(); }

@@ -1,4 +1,5 @@
 // vlmail pack list: the index of a mailing file, for a person or as JSON.
+#include "programs/base/hex.h"
 #include "programs/base/utf8.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -6,7 +7,6 @@
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_text.h"
 
-#include <cstdio>
 #include <memory>
 #include <ostream>
 
@@ -17,12 +17,6 @@ struct Options {
     std::string file;
     bool json = false;
 };
-
-std::string inHex(std::uint32_t crc) {
-    char text[9];
-    std::snprintf(text, sizeof text, "%08x", static_cast<unsigned>(crc));
-    return text;
-}
 
 void printTable(ContainerFile const& container, std::ostream& out) {
     using Align = TextTable::Align;
@@ -35,7 +29,7 @@ void printTable(ContainerFile const& container, std::ostream& out) {
     for (unsigned long long i = 0; i < container.size(); ++i) {
         ContainerFile::Entry const& entry = container.entry(i);
         table.addRow({entry.document, entry.name, entry.role, std::to_string(entry.offset),
-                      std::to_string(entry.length), inHex(entry.crc)});
+                      std::to_string(entry.length), Base::hexNumber(entry.crc, 8)});
     }
     out << "mailing " << Base::validUtf8(container.packId()) << ", " << counted(container.size(), "blob")
         << '\n';

@@ -1,7 +1,8 @@
 // vlmail pack salvage: a new mailing file out of what is whole in a damaged one.
 #include "programs/base/error.h"
+#include "programs/base/log_capture.h"
 #include "programs/base/pending_file.h"
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -43,7 +44,7 @@ SharedMemBuffer emptyMetadata(std::string const& packId) {
 }
 
 void write(ByteFile& file, SalvagePlan const& plan, fs::path const& target) {
-    QuietLog const quiet;
+    Base::LogCapture const quiet;
     Base::PendingFile pending(target);
     PackWrapper out(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, plan.packId);
     for (SavedPage const& page : plan.pages)
@@ -100,8 +101,8 @@ std::size_t documentCount(SalvagePlan const& plan) {
 void report(SalvagePlan const& plan, std::string const& target, std::ostream& out) {
     printPages(plan, out);
     for (LostPage const& page : plan.lost)
-        out << "lost: page " << Base::onOneLine(page.name.page) << " of \""
-            << Base::onOneLine(page.name.document)
+        out << "lost: page " << Base::plainLine(page.name.page) << " of \""
+            << Base::plainLine(page.name.document)
             << "\": " << (page.isDamaged ? "its data is damaged" : "it was not found") << '\n';
     for (std::uint64_t const position : plan.damagedAt)
         out << "lost: damaged data at byte " << position << ", of a page without a name\n";

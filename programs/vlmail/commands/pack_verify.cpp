@@ -1,6 +1,6 @@
 // vlmail pack verify: whether every blob of a mailing file is whole, and which page is damaged.
 #include "programs/base/error.h"
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/pack/container_file.h"
@@ -28,7 +28,7 @@ bool verify(std::string const& file, std::ostream& out) {
         if (damage.empty())
             continue;
         ++damaged;
-        out << file << ": damaged: " << Base::onOneLine(inWords(entry)) << ": " << damage << '\n';
+        out << file << ": damaged: " << Base::plainLine(inWords(entry)) << ": " << damage << '\n';
     }
     bool const hasMetadata = container.size() > pages;
     if (!hasMetadata)

@@ -1,5 +1,6 @@
 // vlmail presets lint: what would go wrong with settings, before a letter does.
 #include "programs/base/error.h"
+#include "programs/base/read_file.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/presets.h"
@@ -21,7 +22,7 @@ struct Options {
 };
 
 PresetsDocument readDocument(std::string const& file) {
-    std::string const text = Reader::readFile(file);
+    std::string const text = Base::readFile(file);
     try {
         return PresetsDocument(text);
     } catch (json::Exc const& wrong) {

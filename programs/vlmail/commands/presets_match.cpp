@@ -1,4 +1,5 @@
 // vlmail presets match: which presets a document's name gets, and why not the ones in front.
+#include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/commands/command.h"
@@ -160,7 +161,7 @@ void print(std::ostream& out, Found const& found) {
 int match(Options const& options, Terminal const& terminal) {
     bool const hasSettings = !options.settings.empty();
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
-    Finder const finder(settings, hasSettings ? Reader::readFile(options.settings) : "{}");
+    Finder const finder(settings, hasSettings ? Base::readFile(options.settings) : "{}");
     int status = FINE;
     for (std::string const& name : options.names) {
         Found const found = finder.find(Base::validUtf8(std::filesystem::path(name).filename().string()));

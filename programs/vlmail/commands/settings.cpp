@@ -1,13 +1,11 @@
 // vlmail settings: the settings of the nodes, as the service keeps them.
 #include "programs/vlmail/commands/settings.h"
 #include "programs/base/error.h"
+#include "programs/base/read_file.h"
 
 #include "vlservice/cfg/id.h"
 #include "vlservice/json/json_text.h"
 
-#include <fstream>
-#include <iostream>
-#include <iterator>
 #include <sstream>
 
 namespace VlMail {
@@ -48,13 +46,7 @@ json::Value valueIn(std::string const& key, std::string const& text, json::Value
 }
 
 json::Object readDocument(std::string const& file) {
-    std::ifstream in;
-    if (file != "-")
-        in.open(file, std::ios::binary);
-    std::istream& source = file == "-" ? std::cin : in;
-    std::string const text{std::istreambuf_iterator<char>(source), {}};
-    if (source.bad() || (file != "-" && !in.is_open()))
-        throw Base::Error("cannot read \"" + file + "\"; check the name and the rights");
+    std::string const text = file == "-" ? Base::readStandardInput() : Base::readFile(file);
     try {
         return json::strToObject(text.data(), text.size());
     } catch (json::Exc const& wrong) {

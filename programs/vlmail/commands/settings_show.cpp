@@ -1,4 +1,5 @@
 // vlmail settings show: what counts at a node, and where each value comes from.
+#include "programs/base/utf8.h"
 #include "programs/vlmail/commands/settings.h"
 
 #include "programs/vlmail/commands/service_options.h"
@@ -23,13 +24,9 @@ struct Options {
 /// Longer values are cut in tables.
 constexpr std::size_t MAX_VALUE_BYTES = 60;
 
-std::string cut(std::string text) {
-    if (text.size() <= MAX_VALUE_BYTES)
-        return text;
-    std::size_t end = MAX_VALUE_BYTES;
-    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
-        --end;
-    return text.substr(0, end) + "...";
+std::string cut(std::string const& text) {
+    std::string_view const start = Base::firstBytes(text, MAX_VALUE_BYTES);
+    return start.size() == text.size() ? text : std::string(start) + "...";
 }
 
 /// The id of a node, or JSON null for a value that is built in.

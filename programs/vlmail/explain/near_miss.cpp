@@ -1,5 +1,6 @@
 #include "programs/vlmail/explain/near_miss.h"
 
+#include "programs/base/log_capture.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 
 #include <array>
@@ -99,8 +100,9 @@ std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages) 
     LaidOutPage const* const page = pages.page(missed.page);
     if (!page || missed.field.definition->strRegex().empty())
         return {};
-    KeptLog const log;
-    Search const search(missed, pages, *page, log);
+    // Each pattern that fails would be a line on the terminal, beside the near miss that says so.
+    Base::LogCapture const quiet;
+    Search const search(missed, pages, *page);
     Collected collected;
     bool isExplained = false;
     for (Way const& way : WAYS) {

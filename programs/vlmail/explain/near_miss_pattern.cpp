@@ -1,4 +1,5 @@
 // Near misses in which the pattern, or the writing of the text, would have to be another.
+#include "programs/base/utf8.h"
 #include "programs/patterns/parts.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/text_forms.h"
@@ -134,7 +135,7 @@ public:
     /// Near enough to be what was meant.
     std::optional<Likest> likest(std::string const& literal) const {
         constexpr std::size_t MIN_LETTERS = 5;
-        std::size_t const letters = letterCount(literal);
+        std::size_t const letters = Base::characterCount(literal);
         if (letters < MIN_LETTERS)
             return std::nullopt;
         Likest best;
@@ -200,11 +201,8 @@ bool isTelling(Patterns::Cut const& cut) {
     return !Patterns::literalsOf(cut.front).empty() || Patterns::literalsOf(cut.rest).empty();
 }
 
-/// What the engine says, in the library's message.
+/// What the engine says, as part of a sentence.
 std::string reasonIn(std::string message) {
-    constexpr std::string_view LEAD = "Extract field failed with ";
-    if (message.starts_with(LEAD))
-        message.erase(0, LEAD.size());
     if (message.ends_with('.'))
         message.pop_back();
     return message;

@@ -33,11 +33,6 @@ bool isValid(ExtractField const& field, ExtractedField value) {
 
 } // namespace
 
-KeptLog::KeptLog()
-    : before_(Log::setSink([this](LogPriority, std::string const& line) { lines_.push_back(line); })) {}
-
-KeptLog::~KeptLog() { Log::setSink(std::move(before_)); }
-
 std::string Search::zoneName() const { return "zone " + inQuotes(zone().name()); }
 
 Box Search::location() const {
@@ -59,8 +54,7 @@ ZoneText Search::everythingOn(LaidOutPage const& page) {
 
 ZoneText Search::remaining(ZoneText text) const {
     for (FieldTrace const* const earlier : earlierFields())
-        if (!isGivenUp())
-            cutField(*earlier->definition, text);
+        cut(*earlier->definition, text);
     return text;
 }
 
@@ -85,9 +79,11 @@ std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const 
         return std::nullopt;
     FieldTrace trace;
     std::shared_ptr<ExtractedField> const value = cutField(field, text, &trace);
+    if (trace.failure)
+        failures_.push_back(*trace.failure);
     if (!trace.match)
         return std::nullopt;
-    return Hit{std::move(*trace.match), trace.rawText && isValid(field, *value)};
+    return Hit{std::move(*trace.match), trace.rawText && value && isValid(field, *value)};
 }
 
 std::optional<PlainHit> Search::find(ExtractField const& field, std::string text) const {
@@ -99,12 +95,13 @@ std::optional<PlainHit> Search::find(ExtractField const& field, std::string text
         hit = PlainHit{static_cast<std::size_t>(offset), static_cast<std::size_t>(offset + length), false};
         return 0;
     };
-    auto const value = field.extractField(text, remember);
+    auto const value = field.extractField(text, remember,
+                                          [this](std::string const& reason) { failures_.push_back(reason); });
     if (hit && value)
         hit->isValid = isValid(field, *value);
     return hit;
 }
 
-bool Search::isGivenUp() const { return log_.lines().size() >= MAX_FAILURES; }
+bool Search::isGivenUp() const { return failures_.size() >= MAX_FAILURES; }
 
 } // namespace VlMail

@@ -4,8 +4,6 @@
 
 #include "programs/vlmail/explain/near_miss.h"
 
-#include "vlservice/platform/log.h"
-
 #include <cstddef>
 #include <optional>
 #include <string>
@@ -15,22 +13,6 @@ namespace VlMail {
 
 /// Patterns are tried so often at most for one kind of near miss.
 constexpr std::size_t MAX_TRIES = 300;
-
-/// Keeps the library's messages from being written, as long as it lives. The library has one for each pattern
-/// that fails.
-class KeptLog {
-public:
-    KeptLog();
-    ~KeptLog();
-    KeptLog(KeptLog const&) = delete;
-    KeptLog& operator=(KeptLog const&) = delete;
-
-    std::vector<std::string> const& lines() const { return lines_; }
-
-private:
-    std::vector<std::string> lines_;
-    Log::Sink before_;
-};
 
 /// A match of the field somewhere else or in another way.
 struct Hit {
@@ -59,8 +41,8 @@ struct Found {
 class Search {
 public:
     /// All of them must live as long as the search.
-    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page, KeptLog const& log)
-        : missed_(missed), pages_(pages), page_(page), log_(log), searchedText_(remaining(textOn(page))) {}
+    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page)
+        : missed_(missed), pages_(pages), page_(page), searchedText_(remaining(textOn(page))) {}
 
     MissedField const& missed() const { return missed_; }
     Reader::FieldTrace const& trace() const { return missed_.field; }
@@ -99,8 +81,8 @@ public:
     // seconds.
 
     bool isGivenUp() const;
-    /// What the library said about patterns that failed.
-    std::vector<std::string> const& failures() const { return log_.lines(); }
+    /// Why patterns could not be searched, in the engine's words.
+    std::vector<std::string> const& failures() const { return failures_; }
 
     /// Takes the hit's lines out of the text, as reading does.
     std::optional<Hit> cut(Cfg::ExtractField const& field, Reader::ZoneText& text) const;
@@ -122,7 +104,8 @@ private:
     MissedField const& missed_;
     ReadPages& pages_;
     LaidOutPage const& page_;
-    KeptLog const& log_;
+    /// A search that fails is remembered, whoever asked for it.
+    mutable std::vector<std::string> failures_;
     Reader::ZoneText searchedText_;
 };
 

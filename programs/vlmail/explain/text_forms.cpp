@@ -145,9 +145,4 @@ Likeness likestPiece(std::string_view line, std::string_view wanted) {
 
 std::string foldedCase(std::string_view text) { return utf8(unicode(text).foldCase()); }
 
-std::size_t letterCount(std::string_view text) {
-    return static_cast<std::size_t>(
-        std::count_if(text.begin(), text.end(), [](char c) { return (c & 0xC0) != 0x80; }));
-}
-
 } // namespace VlMail

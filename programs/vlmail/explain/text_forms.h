@@ -35,6 +35,4 @@ Likeness likestPiece(std::string_view line, std::string_view wanted);
 /// Without regard to case.
 std::string foldedCase(std::string_view text);
 
-std::size_t letterCount(std::string_view text);
-
 } // namespace VlMail

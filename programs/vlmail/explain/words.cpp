@@ -1,4 +1,6 @@
 #include "programs/vlmail/presets/words.h"
+#include "programs/base/millimetres.h"
+#include "programs/base/utf8.h"
 #include "programs/vlmail/explain/words.h"
 
 #include <charconv>
@@ -9,28 +11,19 @@ namespace {
 
 constexpr char const* MORE = "…";
 
-bool beginsLetter(char byte) { return (static_cast<unsigned char>(byte) & 0xC0) != 0x80; }
-
 } // namespace
 
 std::string shortened(std::string_view text, std::size_t letters) {
+    std::string_view const shown = Base::firstCharacters(text, letters);
     std::string result;
-    for (char const c : text) {
-        if (beginsLetter(c) && letters-- == 0)
-            return result + MORE;
-        if (c == '\n')
-            result += " / ";
-        else
-            result += c;
-    }
-    return result;
+    for (char const c : shown)
+        result += c == '\n' ? " / " : std::string(1, c);
+    return shown.size() < text.size() ? result + MORE : result;
 }
 
 std::string excerpt(std::string_view text, std::size_t letters) { return inQuotes(shortened(text, letters)); }
 
-std::string millimetres(long long hundredths) {
-    return number(static_cast<double>(hundredths) / 100) + " mm";
-}
+std::string millimetres(long long hundredths) { return Base::withMillimetres(hundredths); }
 
 std::string number(double value) {
     char buffer[64];

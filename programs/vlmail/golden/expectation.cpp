@@ -1,7 +1,7 @@
 #include "programs/vlmail/golden/expectation.h"
 
 #include "programs/base/error.h"
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
 #include "programs/vlmail/explain/refusal.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/presets/words.h"
@@ -111,7 +111,7 @@ std::string shown(json::Value const& value) {
     }
     std::ostringstream text;
     text << value;
-    return Base::onOneLine(text.str());
+    return Base::plainLine(text.str());
 }
 
 /// Reals are written with 15 digits, so the last ones may differ.

@@ -2,6 +2,8 @@
 
 #include "programs/base/error.h"
 #include "programs/base/pending_file.h"
+#include "programs/base/plain_text.h"
+#include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/golden/expectation.h"
@@ -15,13 +17,11 @@
 namespace VlMail {
 namespace {
 
-TestResult failed(std::string const& why) {
-    return {Verdict::Failed, {}, Base::onOneLine(Base::validUtf8(why))};
-}
+TestResult failed(std::string const& why) { return {Verdict::Failed, {}, Base::plainLine(why)}; }
 
 json::Object expectationIn(std::filesystem::path const& file) {
     try {
-        return readExpectation(Reader::readFile(file));
+        return readExpectation(Base::readFile(file));
     } catch (Base::Error const& wrong) {
         throw Base::Error("its expectation cannot be used: " + std::string(wrong.what()));
     }
@@ -61,7 +61,7 @@ TestResult TestRun::run(TestCase const& one) const {
 DocumentReading TestRun::readingOf(TestCase const& one) const {
     if (!one.isZonesText())
         return readings_.at(one.document.string());
-    return readZonesText(Reader::readFile(one.document), Base::validUtf8(one.document.stem().string()),
+    return readZonesText(Base::readFile(one.document), Base::validUtf8(one.document.stem().string()),
                          presets_);
 }
 

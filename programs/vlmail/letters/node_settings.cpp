@@ -2,6 +2,8 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/quoting.h"
+#include "programs/base/read_file.h"
 #include "programs/reader/document.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/cfg/departments.h"
@@ -17,8 +19,6 @@ namespace VlMail {
 namespace {
 
 namespace fs = std::filesystem;
-
-std::string quoted(fs::path const& file) { return '"' + file.string() + '"'; }
 
 bool isPartName(std::string const& name) {
     std::string const* const names[] = {&Cfg::App::PART_NAME,      &Cfg::Inet::PART_NAME,
@@ -37,7 +37,7 @@ void requirePartNames(json::Object const& document, fs::path const& file) {
     for (auto const& [name, part] : document) {
         if (!isPartName(name))
             throw Base::Error(
-                "cannot use the settings in " + quoted(file) + ": \"" + name +
+                "cannot use the settings in " + Base::inQuotes(file.string()) + ": \"" + name +
                 "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or "
                 "\"profiles\"");
     }
@@ -46,16 +46,16 @@ void requirePartNames(json::Object const& document, fs::path const& file) {
 } // namespace
 
 NodeSettings NodeSettings::fromFile(fs::path const& file) {
-    std::string const text = Reader::readFile(file);
+    std::string const text = Base::readFile(file);
     NodeSettings settings;
     settings.file_ = file;
-    settings.place_ = quoted(file);
+    settings.place_ = Base::inQuotes(file.string());
     settings.sha256_ = Base::sha256(text);
     try {
         settings.parts_ = json::strToObject(text.data(), text.size());
     } catch (json::Exc const& wrong) {
-        throw Base::Error("cannot read the settings in " + quoted(file) + ": " + wrong.what() +
-                          "; correct the file there");
+        throw Base::Error("cannot read the settings in " + Base::inQuotes(file.string()) + ": " +
+                          wrong.what() + "; correct the file there");
     }
     if (isPresetsPart(settings.parts_))
         settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};

@@ -2,6 +2,8 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/quoting.h"
+#include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
@@ -68,14 +70,12 @@ LetterReading letterFrom(json::Object const& object) {
     return letter;
 }
 
-std::string quoted(std::string const& text) { return '"' + text + '"'; }
-
 /// The library takes a field with a bad pattern for one that was not found; here it is said instead.
 void requirePattern(std::string const& pattern, std::string const& whose, NodeSettings const& settings) {
     try {
         Cfg::ExtractPreset::match(pattern, std::string());
     } catch (std::exception const& bad) {
-        throw Base::Error("the pattern " + quoted(pattern) + " of " + whose +
+        throw Base::Error("the pattern " + Base::inQuotes(pattern) + " of " + whose +
                           " cannot be used: " + bad.what() + "; correct it in " + settings.place());
     }
 }
@@ -83,8 +83,9 @@ void requirePattern(std::string const& pattern, std::string const& whose, NodeSe
 void requirePatterns(Cfg::ExtractPreset const& preset, NodeSettings const& settings) {
     for (Cfg::ExtractZone const& zone : preset.zones()) {
         for (Cfg::ExtractField const& field : zone.fields()) {
-            std::string const whose = "field " + quoted(field.name()) + " in zone " + quoted(zone.name()) +
-                                      " of the preset for " + quoted(preset.strRegex());
+            std::string const whose = "field " + Base::inQuotes(field.name()) + " in zone " +
+                                      Base::inQuotes(zone.name()) + " of the preset for " +
+                                      Base::inQuotes(preset.strRegex());
             requirePattern(field.strRegex(), whose, settings);
             requirePattern(field.validation().strRegex(), whose, settings);
         }
@@ -205,7 +206,7 @@ ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeS
     try {
         if (along.beforeReading)
             along.beforeReading(result, presets);
-        std::string bytes = Reader::readFile(file);
+        std::string bytes = Base::readFile(file);
         result.sha256 = Base::sha256(bytes);
         Reader::Document document = Reader::openDocument(std::move(bytes), file);
         readLetters(result, document, presets, settings, along, place);
@@ -220,7 +221,7 @@ ReadResult splitDocument(DecidedDocument decided) {
     if (!result.reading.letters)
         return result;
     try {
-        std::string bytes = Reader::readFile(decided.file);
+        std::string bytes = Base::readFile(decided.file);
         result.sha256 = Base::sha256(bytes);
         if (result.sha256 != decided.sha256)
             throw Base::Error('"' + decided.file.string() + "\" has changed; make the plan again");

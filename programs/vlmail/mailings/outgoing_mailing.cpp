@@ -1,6 +1,7 @@
 #include "programs/vlmail/mailings/outgoing_mailing.h"
 
 #include "programs/base/error.h"
+#include "programs/base/hex.h"
 #include "programs/base/pending_file.h"
 #include "programs/mailing/pack_database.h"
 #include "programs/vlmail/service/service_client.h"
@@ -134,7 +135,7 @@ std::string newMailingId(std::time_t now) {
     gmtime_r(&now, &utc);
     std::random_device random;
     std::ostringstream id;
-    id << std::put_time(&utc, "%Y%m%dT%H%M%SZ-") << std::hex << std::setfill('0') << std::setw(8) << random();
+    id << std::put_time(&utc, "%Y%m%dT%H%M%SZ-") << Base::hexNumber(random(), 8);
     return id.str();
 }
 

@@ -2,6 +2,7 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/read_file.h"
 #include "programs/reader/document.h"
 #include "vlservice/json/json_text.h"
 
@@ -47,8 +48,8 @@ json::Object fileToJson(fs::path const& file, std::string const& digest) {
 /// What is wrong with a file now, or nothing.
 std::string changeOf(fs::path const& file, std::string const& digest) {
     try {
-        return Base::sha256(Reader::readFile(file)) == digest ? std::string()
-                                                              : '"' + file.string() + "\" has changed";
+        return Base::sha256(Base::readFile(file)) == digest ? std::string()
+                                                            : '"' + file.string() + "\" has changed";
     } catch (Base::Error const&) {
         return '"' + file.string() + "\" cannot be read any more";
     }
@@ -64,7 +65,7 @@ Plan::Plan(NodeSettings const& settings) {
 }
 
 Plan Plan::fromFile(fs::path const& file) {
-    std::string const text = Reader::readFile(file);
+    std::string const text = Base::readFile(file);
     try {
         json::Object const object = json::strToObject(text.data(), text.size());
         if (object.get(VERSION_KEY).intOrZero() != PLAN_VERSION)

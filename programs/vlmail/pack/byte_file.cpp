@@ -3,12 +3,9 @@
 #include "programs/base/error.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
 #include <fcntl.h>
 #include <sys/stat.h>
-#include <unistd.h>
-#include <utility>
+#include <system_error>
 
 namespace VlMail {
 namespace {
@@ -21,22 +18,24 @@ constexpr std::size_t STEP = std::size_t{1} << 12;
     throw Base::Error("cannot read \"" + path.string() + "\": " + why);
 }
 
-} // namespace
-
-ByteFile::ByteFile(std::filesystem::path path)
-    : path_(std::move(path)), number_(::open(path_.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK)) {
-    if (number_ < 0)
-        cannotRead(path_, std::string(std::strerror(errno)) + "; check the name");
-    struct stat status {};
-    ::fstat(number_, &status);
-    if (!S_ISREG(status.st_mode)) {
-        ::close(number_);
-        cannotRead(path_, "it is no file; name a mailing file");
+Base::FileDescriptor openForReading(std::filesystem::path const& path) {
+    try {
+        // Without waiting, should it be a pipe.
+        return Base::FileDescriptor(path, O_RDONLY | O_NONBLOCK);
+    } catch (std::system_error const& failure) {
+        cannotRead(path, failure.code().message() + "; check the name");
     }
-    size_ = static_cast<std::uint64_t>(status.st_size);
 }
 
-ByteFile::~ByteFile() { ::close(number_); }
+} // namespace
+
+ByteFile::ByteFile(std::filesystem::path const& path) : file_(openForReading(path)) {
+    struct stat status {};
+    ::fstat(file_.number(), &status);
+    if (!S_ISREG(status.st_mode))
+        cannotRead(path, "it is no file; name a mailing file");
+    size_ = static_cast<std::uint64_t>(status.st_size);
+}
 
 std::size_t ByteFile::read(std::uint64_t position, void* to, std::size_t count) {
     if (count > WINDOW)
@@ -75,16 +74,11 @@ void ByteFile::moveWindow(std::uint64_t position, std::size_t count) {
 }
 
 std::size_t ByteFile::readPast(std::uint64_t position, char* to, std::size_t count) const {
-    std::size_t done = 0;
-    while (done < count) {
-        ssize_t const step = ::pread(number_, to + done, count - done, static_cast<off_t>(position + done));
-        if (step < 0 && errno != EINTR)
-            cannotRead(path_, std::string(std::strerror(errno)) + "; copy the file to another disk");
-        if (step == 0)
-            break;
-        done += step > 0 ? static_cast<std::size_t>(step) : 0;
+    try {
+        return file_.readAt(position, to, count);
+    } catch (std::system_error const& failure) {
+        cannotRead(path(), failure.code().message() + "; copy the file to another disk");
     }
-    return done;
 }
 
 } // namespace VlMail

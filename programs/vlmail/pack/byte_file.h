@@ -1,6 +1,8 @@
 #pragma once
 // A file that is only read, anywhere in it.
 
+#include "programs/base/file_descriptor.h"
+
 #include <cstdint>
 #include <filesystem>
 #include <functional>
@@ -16,12 +18,9 @@ using ReadBytes = std::function<std::size_t(std::uint64_t position, void* to, st
 class ByteFile {
 public:
     /// Throws Error when it is no file that can be read.
-    explicit ByteFile(std::filesystem::path path);
-    ~ByteFile();
-    ByteFile(ByteFile const&) = delete;
-    ByteFile& operator=(ByteFile const&) = delete;
+    explicit ByteFile(std::filesystem::path const& path);
 
-    std::filesystem::path const& path() const { return path_; }
+    std::filesystem::path const& path() const { return file_.file(); }
     std::uint64_t size() const { return size_; }
 
     /// As ReadBytes. Throws Error when the disk fails, as the others do.
@@ -36,8 +35,7 @@ private:
     /// Past the window.
     std::size_t readPast(std::uint64_t position, char* to, std::size_t count) const;
 
-    std::filesystem::path path_;
-    int number_;
+    Base::FileDescriptor file_;
     std::uint64_t size_ = 0;
     /// A stretch of the file: what is asked for lies mostly close to what was asked for before.
     std::string window_;

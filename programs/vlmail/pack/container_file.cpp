@@ -30,7 +30,7 @@ bool isCompressed(SharedMemBuffer const& bytes) {
 
 ContainerFile::ContainerFile(std::string const& path) : fileSize_(ByteFile(path).size()) {
     container_.emplace(path, PackWrapper::PURPOSE_IMPORT, std::string());
-    if (!quiet_.empty())
+    if (container_->failed())
         throw Base::Error("cannot read \"" + path +
                           "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
                           "salvage\" saves what is left of it");

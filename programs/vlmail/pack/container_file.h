@@ -1,32 +1,13 @@
 #pragma once
 // A mailing file as the subcommands look into it.
 
+#include "programs/base/log_capture.h"
 #include "vlservice/pack/pack_wrapper.h"
-#include "vlservice/platform/log.h"
 
 #include <optional>
 #include <string>
 
 namespace VlMail {
-
-/// Keeps the library's log lines from the terminal while it lives: the subcommands say what failed in words
-/// of their own.
-class QuietLog {
-public:
-    QuietLog() {
-        before_ = Log::setSink([this](LogPriority, std::string const&) { isEmpty_ = false; });
-    }
-    ~QuietLog() { Log::setSink(before_); }
-    QuietLog(QuietLog const&) = delete;
-    QuietLog& operator=(QuietLog const&) = delete;
-
-    /// Whether nothing was logged.
-    bool empty() const { return isEmpty_; }
-
-private:
-    bool isEmpty_ = true;
-    Log::Sink before_;
-};
 
 /// Opened for reading. Its index is whole; its blobs may be damaged.
 class ContainerFile {
@@ -52,7 +33,8 @@ public:
 private:
     std::string damageOf(Entry const& entry, SharedMemBuffer const& blob) const;
 
-    QuietLog quiet_;
+    /// The subcommands say what failed in words of their own.
+    Base::LogCapture quiet_;
     std::uint64_t fileSize_;
     std::optional<PackWrapper> container_;
 };

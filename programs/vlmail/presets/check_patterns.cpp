@@ -1,4 +1,6 @@
 // Patterns: whether they compile, how hard they work, and whether they can fit what is read.
+#include "programs/base/plain_text.h"
+#include "programs/base/utf8.h"
 #include "programs/patterns/hard_lines.h"
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
@@ -96,13 +98,8 @@ Trial tryHardLines(Patterns::Pattern const& pattern) {
 /// The start of a line in quotes, with what cannot be seen as "\x01".
 std::string startOf(std::string const& line) {
     constexpr std::size_t SHOWN = 24;
-    std::string shown;
-    for (char const c : line.substr(0, SHOWN))
-        shown += static_cast<unsigned char>(c) < 0x20 ? ' ' : c;
-    // Not in the middle of a character.
-    while (shown.size() < line.size() && (line[shown.size()] & 0xC0) == 0x80)
-        shown += line[shown.size()];
-    return inQuotes(line.size() > shown.size() ? shown + "..." : shown);
+    std::string_view const start = Base::firstBytes(line, SHOWN);
+    return inQuotes(Base::plainLine(start) + (start.size() < line.size() ? "..." : ""));
 }
 
 bool isComposed(std::string const& text) {

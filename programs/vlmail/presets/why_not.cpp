@@ -1,5 +1,6 @@
 #include "programs/vlmail/presets/why_not.h"
 
+#include "programs/base/utf8.h"
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/presets_document.h"
@@ -13,8 +14,8 @@ namespace {
 /// The longest beginning of the name that the pattern fits; nothing when there is none.
 std::optional<std::string> longestBeginning(Patterns::Pattern const& pattern, std::string const& name) {
     for (std::size_t length = name.size() + 1; length-- > 0;) {
-        bool const splitsCharacter = length < name.size() && (name[length] & 0xC0) == 0x80;
-        if (!splitsCharacter && pattern.fits(name.substr(0, length)) == Patterns::Pattern::Answer::Yes)
+        if (Base::isBetweenCharacters(name, length) &&
+            pattern.fits(name.substr(0, length)) == Patterns::Pattern::Answer::Yes)
             return name.substr(0, length);
     }
     return std::nullopt;

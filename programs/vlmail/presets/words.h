@@ -1,16 +1,16 @@
 #pragma once
 // Lengths and numbers as advice says them.
 
+#include "programs/base/millimetres.h"
+#include "programs/base/quoting.h"
 #include "vlservice/cfg/geometry.h"
 
 #include <string>
 
 namespace VlMail {
 
-std::string inQuotes(std::string const& text);
-
-/// 1/100 mm as millimetres, with as many decimals as it has.
-std::string inMillimetres(long long hundredths);
+using Base::inMillimetres;
+using Base::inQuotes;
 
 /// "left 2000, top 4500, right 11000, bottom 9000".
 std::string inWords(Cfg::Rect const& rect);

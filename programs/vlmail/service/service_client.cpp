@@ -1,6 +1,7 @@
 #include "programs/vlmail/service/service_client.h"
 
 #include "programs/base/error.h"
+#include "programs/base/host_port.h"
 #include "programs/channel/token.h"
 #include "programs/protocol/failure.h"
 #include "vlservice/cfg/app.h"
@@ -14,7 +15,6 @@
 #include <boost/asio/io_context.hpp>
 
 #include <algorithm>
-#include <charconv>
 #include <cstdlib>
 #include <iostream>
 #include <ostream>
@@ -27,7 +27,6 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr char const* DEFAULT_PACK_DATABASE = "packs.db";
-constexpr std::size_t MAX_HOST_BYTES = 255;
 
 fs::path personalFolder(char const* variable, char const* belowHome) {
     char const* const folder = std::getenv(variable);
@@ -35,21 +34,6 @@ fs::path personalFolder(char const* variable, char const* belowHome) {
         return fs::path(folder) / "vlmail";
     char const* const home = std::getenv("HOME");
     return fs::path(home ? home : "/") / belowHome / "vlmail";
-}
-
-bool isHost(std::string const& text) {
-    return !text.empty() && text.size() <= MAX_HOST_BYTES &&
-           std::all_of(text.begin(), text.end(), [](unsigned char c) {
-               return std::isalnum(c) || c == '.' || c == '-' || c == '_' || c == ':' || c == '%';
-           });
-}
-
-std::optional<std::uint16_t> portIn(std::string const& text) {
-    unsigned number = 0;
-    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    if (error != std::errc() || end != text.data() + text.size() || number == 0 || number > 65535)
-        return std::nullopt;
-    return static_cast<std::uint16_t>(number);
 }
 
 /// Keeps what discovery has found.
@@ -78,30 +62,20 @@ bool acceptsCertificate(std::string const& service, std::string const& fingerpri
 
 } // namespace
 
-std::string ServiceAddress::text() const {
-    bool const isIp6 = host.find(':') != std::string::npos;
-    return (isIp6 ? '[' + host + ']' : host) + ':' + std::to_string(port);
-}
+std::string ServiceAddress::text() const { return Base::hostPortText(host, port); }
 
 ServiceAddress parseServiceAddress(std::string const& text) {
-    auto const colon = text.rfind(':');
-    std::string host = text.substr(0, colon);
-    std::optional<std::uint16_t> const port =
-        colon == std::string::npos ? std::nullopt : portIn(text.substr(colon + 1));
-    bool const inBrackets = host.size() > 2 && host.front() == '[' && host.back() == ']';
-    if (inBrackets)
-        host = host.substr(1, host.size() - 2);
-    bool const bareIp6 = !inBrackets && host.find(':') != std::string::npos;
-    if (!port || !isHost(host) || bareIp6)
+    auto address = Base::hostPortIn(text);
+    if (!address)
         throw Base::Error("\"" + text +
                           "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
-    return {std::move(host), *port};
+    return {std::move(address->host), address->port};
 }
 
 ServiceAddress addressInAnswer(json::Object const& answer) {
     std::string host = answer.get(Ipc::DiscoveryBase::SVC_HOST_FLD_NAME).textOrEmpty();
     long long const port = answer.get(Ipc::DiscoveryBase::SVC_PORT_FLD_NAME).intOrZero();
-    if (!isHost(host) || port < 1 || port > 65535)
+    if (!Base::isHost(host) || port < 1 || port > 65535)
         throw Base::Error(
             "something on the network answered as a service and named no address; name one with "
             "--service HOST:PORT");

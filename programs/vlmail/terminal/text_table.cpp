@@ -1,6 +1,6 @@
 #include "programs/vlmail/terminal/text_table.h"
 
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
 
 #include <unicode/uchar.h>
 #include <unicode/utf8.h>
@@ -39,7 +39,7 @@ TextTable::TextTable(std::vector<Column> columns) : columns_(std::move(columns))
 
 void TextTable::addRow(std::vector<std::string> cells) {
     cells.resize(columns_.size());
-    std::transform(cells.begin(), cells.end(), cells.begin(), Base::onOneLine);
+    std::transform(cells.begin(), cells.end(), cells.begin(), Base::plainLine);
     rows_.push_back(std::move(cells));
 }
 

@@ -1,5 +1,6 @@
 #include "programs/vlserviced/jobs/hand_over.h"
 
+#include "programs/base/file_descriptor.h"
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
@@ -8,7 +9,6 @@
 #include <fcntl.h>
 #include <fstream>
 #include <system_error>
-#include <unistd.h>
 
 namespace VlServiced {
 namespace {
@@ -21,18 +21,6 @@ constexpr std::size_t MAX_REPORT_BYTES = 64 << 10;
 fs::path temporaryOf(fs::path const& folder, std::string const& name) {
     return folder / ("." + name + ".part");
 }
-
-void syncFile(fs::path const& path, int flags) {
-    int const file = ::open(path.c_str(), flags | O_CLOEXEC);
-    bool const synced = file >= 0 && ::fsync(file) == 0;
-    int const error = errno;
-    if (file >= 0)
-        ::close(file);
-    if (!synced)
-        throw std::system_error(error, std::generic_category(), "cannot sync " + path.string());
-}
-
-void syncFolder(fs::path const& folder) { syncFile(folder, O_RDONLY | O_DIRECTORY); }
 
 /// A folder that is gone, say one that is not mounted, says nothing about what lies in it.
 void requireFolder(fs::path const& folder) {
@@ -47,8 +35,8 @@ void stage(fs::path const& container, fs::path const& folder) {
     requireFolder(folder);
     fs::path const temporary = temporaryOf(folder, container.filename().string());
     fs::copy_file(container, temporary, fs::copy_options::overwrite_existing);
-    syncFile(temporary, O_RDONLY);
-    syncFolder(folder);
+    Base::FileDescriptor(temporary, O_RDONLY).sync();
+    Base::syncFolder(folder);
 }
 
 void publish(std::string const& name, fs::path const& folder) {
@@ -57,7 +45,7 @@ void publish(std::string const& name, fs::path const& folder) {
     if (!fs::exists(temporary))
         return;
     fs::rename(temporary, folder / name);
-    syncFolder(folder);
+    Base::syncFolder(folder);
 }
 
 bool liesIn(fs::path const& folder, std::string const& name) {

@@ -1,7 +1,7 @@
 #include "programs/vlserviced/jobs/job_runner.h"
 
 #include "programs/base/error.h"
-#include "programs/base/one_line.h"
+#include "programs/base/plain_text.h"
 #include "programs/base/safe_name.h"
 #include "programs/mailing/pack_database.h"
 #include "programs/vlserviced/jobs/container.h"

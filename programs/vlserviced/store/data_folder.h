@@ -1,7 +1,10 @@
 #pragma once
 // The folder that holds everything the service keeps: who may use it, and what lies where in it.
 
+#include "programs/base/file_lock.h"
+
 #include <filesystem>
+#include <optional>
 
 namespace VlServiced {
 
@@ -11,7 +14,6 @@ public:
     /// Makes the folder, which only its owner may enter, unless it is there, and takes hold of it until
     /// destruction. Throws Error when it cannot be written or another process has it.
     explicit DataFolder(std::filesystem::path folder);
-    ~DataFolder();
     DataFolder(DataFolder const&) = delete;
     DataFolder& operator=(DataFolder const&) = delete;
 
@@ -23,7 +25,7 @@ public:
 
 private:
     std::filesystem::path folder_;
-    int lock_;
+    std::optional<Base::FileLock> lock_;
 };
 
 /// Makes a folder, with its parents, unless it is there, and tests that files can be made in it.

@@ -32,7 +32,7 @@ TEST(TextTable, KeepsACellOnItsLine) {
     table.addRow({"two\nlines\x1b[0m"});
     std::ostringstream out;
     table.print(out);
-    EXPECT_EQ(out.str(), "value\ntwo lines [0m\n");
+    EXPECT_EQ(out.str(), "value\ntwo lines\\u001b[0m\n");
 }
 
 } // namespace
