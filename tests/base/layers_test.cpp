@@ -58,18 +58,6 @@ programs/vlserviced: programs/vlserviced
 std::string const STANDS_ON = R"(vlservice/pack: vlservice/export.h vlservice/platform vlservice/pack
 )";
 
-/// Arrows that still go up.
-std::set<std::string> const EXCEPTIONS{
-    "programs/vlmail/explain/explain_text.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/explain/near_miss_pattern.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/explain/near_miss_place.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/explain/near_miss_search.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/explain/preset_walk.cpp includes programs/vlmail/presets/why_not.h",
-    "programs/vlmail/explain/refusal.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/explain/words.cpp includes programs/vlmail/presets/words.h",
-    "programs/vlmail/service/service_client.h includes programs/vlmail/terminal/terminal.h",
-};
-
 struct Include {
     std::string from;
     std::string to;
@@ -222,10 +210,7 @@ TEST(Layers, HaveARoomForEachSource) {
 
 TEST(Layers, IncludeOnlyWhatStandsBelow) {
     Layers const layers;
-    EXPECT_THAT(forbidden([&](Include const& include) {
-                    return !layers.mayInclude(include) && !EXCEPTIONS.contains(include.text());
-                }),
-                IsEmpty());
+    EXPECT_THAT(forbidden([&](Include const& include) { return !layers.mayInclude(include); }), IsEmpty());
 }
 
 TEST(Layers, AreIncludedOnlyByWhoMayUseThem) {

@@ -1,7 +1,7 @@
 #include "programs/patterns/hard_lines.h"
 #include "programs/patterns/pattern.h"
 #include "programs/patterns/samples.h"
-#include "programs/vlmail/presets/why_not.h"
+#include "programs/patterns/why_not.h"
 #include "tests/support/time_limit.h"
 
 #include <gmock/gmock.h>
@@ -9,7 +9,6 @@
 #include <string>
 #include <vector>
 
-using namespace VlMail;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using Use = Patterns::Pattern::Use;
@@ -124,7 +123,7 @@ TEST(WhyNot, NamesTheFirstPartThatDoesNotFit) {
         {"\xC3\xA4+x", "\xC3\xA4\xC3\xB6", "\"x\" does not fit behind \"\xC3\xA4\"", "x", "\xC3\xA4"},
     };
     for (auto const& [expression, name, words, failedPart, fitted] : cases) {
-        WhyNot const why = whyNot(expression, name);
+        Patterns::WhyNot const why = Patterns::whyNot(expression, name);
         EXPECT_EQ(why.words, words) << expression;
         EXPECT_EQ(why.failedPart, failedPart) << expression;
         EXPECT_EQ(why.fitted, fitted) << expression;

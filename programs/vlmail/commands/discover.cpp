@@ -22,7 +22,7 @@ struct Options {
 /// What became of a connection to it: an answer on the network proves nothing.
 std::string connectionTo(ServiceAddress const& address, Options const& options, Terminal const& terminal) {
     try {
-        connectToService(address, options.service, terminal);
+        connectToService(address, options.service, terminal.err);
         return "ok";
     } catch (std::exception const& failure) {
         return failure.what();

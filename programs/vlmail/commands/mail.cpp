@@ -46,7 +46,7 @@ int report(Dispatch const& dispatch, Options const& options, Terminal const& ter
 /// Where the mailings go, by the options. The connection is there when a service is to get them.
 struct Destination {
     Destination(Options const& options, Terminal const& terminal)
-        : service(options.send ? connectToService(options.service, terminal) : nullptr),
+        : service(options.send ? connectToService(options.service, terminal.err) : nullptr),
           nodeId(nodeIdIn(options.node)), begin(service ? mailingsToService(*service, nodeId, options.upload)
                                                         : mailingsIntoFolder(options.output)) {}
 
@@ -106,7 +106,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
     });
     dispatch.finish();
     if (options.price)
-        dispatch.estimate(*connectToService(options.service, terminal));
+        dispatch.estimate(*connectToService(options.service, terminal.err));
     Base::writeFile(options.output, plan.toText(dispatch.toJson()));
     return report(dispatch, options, terminal);
 }

@@ -1,12 +1,12 @@
 // vlmail presets match: which presets a document's name gets, and why not the ones in front.
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
+#include "programs/patterns/why_not.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/presets.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/presets/presets_document.h"
-#include "programs/vlmail/presets/why_not.h"
 #include "programs/vlmail/presets/words.h"
 #include "vlservice/json/json_text.h"
 
@@ -33,7 +33,7 @@ struct Tried {
     Cfg::ExtractPreset const* preset = nullptr;
     /// None for one that comes from the defaults.
     std::optional<Place> place;
-    WhyNot why;
+    Patterns::WhyNot why;
 };
 
 struct Found {
@@ -78,7 +78,7 @@ private:
                           "; correct it, or no later preset is reached";
             return true;
         }
-        tried.why = whyNot(preset.strRegex(), found.name);
+        tried.why = Patterns::whyNot(preset.strRegex(), found.name);
         found.earlier.push_back(std::move(tried));
         return false;
     }

@@ -85,7 +85,7 @@ void print(std::ostream& out, std::vector<Protocol::LetterBatch> const& batches,
 
 int showPrice(Options const& options, Terminal const& terminal) {
     std::vector<Protocol::LetterBatch> const batches = lettersIn(options);
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     json::Object const prices = estimatePrice(*service, batches);
     if (options.json)
         terminal.out << prices << '\n';

@@ -83,7 +83,7 @@ json::Object assigned(PartSettings settings, std::string const& part,
 }
 
 int set(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     std::string const node = nodeIdIn(options.node);
     bool const isFile = options.what.size() == 1 && options.what.front().find('=') == std::string::npos;
     PartSettings const settings = fetchPart(*service, node, options.part);
@@ -116,7 +116,7 @@ void resetNode(Channel::Client& service, std::string const& node) {
 }
 
 int reset(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     std::string const node = nodeIdIn(options.node);
     if (options.part.empty())
         resetNode(*service, node);
@@ -129,7 +129,7 @@ int reset(Options const& options, Terminal const& terminal) {
 }
 
 int remove(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     requireNoError(service->call<Ipc::RemoveCfgNode>(Cfg::Id(nodeIdIn(options.node), false))->resp());
     return FINE;
 }

@@ -66,7 +66,7 @@ json::Object changesIn(std::vector<std::string> const& assignments) {
 
 int serviceSettings(Options const& options, Terminal const& terminal) {
     json::Object const changes = changesIn(options.assignments);
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     if (!changes.empty()) {
         service->call<Ipc::SetSvcCfg>(changes);
         return FINE;
@@ -95,7 +95,7 @@ int suspend(Options const& options, Terminal const& terminal) {
     if (found == std::end(SUSPENSIONS))
         throw Base::Error("\"" + options.suspended +
                           "\" cannot be held back; name settings, jobs, all or nothing");
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     service->call<Ipc::CSConfigSrvChange>(static_cast<Ipc::CSConfigSrvChange::SuspendType>(found->second));
     return FINE;
 }

@@ -79,7 +79,7 @@ private:
 };
 
 int showSettings(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     Protocol::SettingsAnswer const answer = fetchSettings(*service, nodeIdIn(options.node), options.parts);
     if (options.json) {
         terminal.out << answer.serialize() << '\n';

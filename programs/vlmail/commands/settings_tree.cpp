@@ -34,7 +34,7 @@ void addBranch(TextTable& table, Protocol::TreeNode const& node, std::size_t dep
 }
 
 int showTree(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     json::Object const tree = requireAnswer(service->call<Ipc::CfgIdsTree>()->resp());
     if (options.json) {
         terminal.out << tree << '\n';
@@ -47,7 +47,7 @@ int showTree(Options const& options, Terminal const& terminal) {
 }
 
 int showIds(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     auto const answer = service->call<Ipc::CfgIdsForUser>(options.user);
     if (options.json) {
         terminal.out << static_cast<Ipc::JsonCmdBase const&>(*answer).serializeResp() << '\n';

@@ -48,7 +48,7 @@ bool anyFailed(std::vector<Protocol::JobReport> const& jobs) {
 }
 
 int showStatus(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     std::filesystem::path const database =
         options.database.empty() ? std::filesystem::path() : std::filesystem::absolute(options.database);
     Protocol::JobsQuery query;

@@ -17,7 +17,7 @@ struct Options {
 };
 
 int upload(Options const& options, Terminal const& terminal) {
-    auto const service = connectToService(options.service, terminal);
+    auto const service = connectToService(options.service, terminal.err);
     std::filesystem::path const database =
         options.database.empty() ? std::filesystem::path() : std::filesystem::absolute(options.database);
     service->call<Ipc::UploadQueued>(database.parent_path().string(), database.filename().string());

@@ -1,8 +1,8 @@
 #include "programs/vlmail/explain/explain_text.h"
 
+#include "programs/base/quoting.h"
 #include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/words.h"
-#include "programs/vlmail/presets/words.h"
 
 #include "vlservice/cfg/geometry.h"
 
@@ -82,7 +82,7 @@ private:
     }
 
     void printZone(json::Object const& zone) {
-        std::string const name = "zone " + inQuotes(textOf(zone, NAME)) + ", ";
+        std::string const name = "zone " + Base::inQuotes(textOf(zone, NAME)) + ", ";
         if (json::Value const location = zone.get(LOCATION)) {
             line(6, name + placeInWords(location));
         } else {

@@ -1,10 +1,10 @@
 // Near misses in which the pattern, or the writing of the text, would have to be another.
+#include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/parts.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
-#include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
 #include <limits>
@@ -55,12 +55,14 @@ std::optional<Found> byPattern(Search const& search, std::string const& pattern,
 }
 
 std::string lookAlikeAdvice(std::string const& matched, std::string const& pattern) {
-    auto const told = [](std::string const& mark) { return inQuotes(mark) + " (" + codePointOf(mark) + ")"; };
+    auto const told = [](std::string const& mark) {
+        return Base::inQuotes(mark) + " (" + codePointOf(mark) + ")";
+    };
     if (auto const mark = firstUnplainMark(matched))
-        return "the letter has " + told(*mark) + " where the pattern has " + inQuotes(withPlainMarks(*mark)) +
-               ": let the pattern take both";
+        return "the letter has " + told(*mark) + " where the pattern has " +
+               Base::inQuotes(withPlainMarks(*mark)) + ": let the pattern take both";
     std::string const mark = firstUnplainMark(pattern).value_or("");
-    return "the pattern has " + told(mark) + " where the letter has " + inQuotes(withPlainMarks(mark)) +
+    return "the pattern has " + told(mark) + " where the letter has " + Base::inQuotes(withPlainMarks(mark)) +
            ": correct the pattern";
 }
 
@@ -190,7 +192,7 @@ std::optional<Found> standingSomewhere(Search const& search) {
     if (absentLiteral(lookup, literals))
         return std::nullopt;
     auto const [page, line] = lookup.lineWith(literals.front());
-    return Found{inQuotes(literals.front()) + " of the pattern stands in " + excerpt(line.text) +
+    return Found{Base::inQuotes(literals.front()) + " of the pattern stands in " + excerpt(line.text) +
                      " on page " + std::to_string(page) + ", but the rest of the pattern does not fit there",
                  line.text, page, line.box, false};
 }
@@ -246,7 +248,7 @@ std::optional<Found> earlierField(Search const& search) {
             continue;
         return search.told(hit, search.pageNumber(), [&](Hit const& at) {
             return "would match " + excerpt(at.match.text) + ", but the field " +
-                   inQuotes(earlier->definition->name()) +
+                   Base::inQuotes(earlier->definition->name()) +
                    ", which is searched before it, takes that line: put this field in front of it, or into a "
                    "zone "
                    "of its own";
@@ -266,7 +268,7 @@ std::optional<Found> normalisation(Search const& search) {
         search, nfc,
         " after Unicode normalisation: the pattern has decomposed letters (NFD) and documents are "
         "read with composed ones (NFC); type it anew as " +
-            inQuotes(nfc));
+            Base::inQuotes(nfc));
 }
 
 std::optional<Found> lookAlike(Search const& search) {
@@ -330,11 +332,11 @@ std::optional<Found> literal(Search const& search) {
     std::optional<std::string> const absent = absentLiteral(lookup, Patterns::literalsOf(search.pattern()));
     if (!absent)
         return std::nullopt;
-    Found found{inQuotes(*absent) + " of the pattern occurs nowhere " + lookup.whereLooked()};
+    Found found{Base::inQuotes(*absent) + " of the pattern occurs nowhere " + lookup.whereLooked()};
     auto const likest = lookup.likest(*absent);
     if (!likest)
         return found;
-    found.says += "; the nearest is " + inQuotes(likest->stretch.text) + " on page " +
+    found.says += "; the nearest is " + Base::inQuotes(likest->stretch.text) + " on page " +
                   std::to_string(likest->page) + ": correct the pattern";
     found.text = likest->stretch.text;
     found.page = likest->page;
@@ -356,9 +358,9 @@ std::optional<Found> rest(Search const& search) {
         std::size_t const lineEnd = std::min(all.find('\n', hit->end), all.size());
         std::string_view const behind = all.substr(hit->end, lineEnd - hit->end);
         Stretch const stretch = text.stretch(hit->begin, lineEnd - hit->begin);
-        std::string says = excerpt(matchIn(all, *hit)) + " fits " + inQuotes(cut.front) + ", but " +
+        std::string says = excerpt(matchIn(all, *hit)) + " fits " + Base::inQuotes(cut.front) + ", but " +
                            (behind.empty() ? "the end of the line" : excerpt(behind)) +
-                           " behind it does not fit " + inQuotes(cut.rest);
+                           " behind it does not fit " + Base::inQuotes(cut.rest);
         return Found{std::move(says), stretch.text, search.pageNumber(), stretch.box, false};
     }
     return standingSomewhere(search);

@@ -1,8 +1,8 @@
 // Near misses in which the text stands elsewhere: beyond the zone, in another line or block, on another page.
+#include "programs/base/quoting.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/words.h"
 #include "programs/vlmail/explain/zone_change.h"
-#include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
 #include <array>
@@ -48,7 +48,7 @@ std::optional<Found> withRule(Search const& search, Rule const& rule, double val
     LaidOutPage const& page = search.pages().laidOut(*search.page().page, rules);
     return search.told(
         search.find(search.remaining(search.textOn(page))), search.pageNumber(), [&](Hit const& hit) {
-            return "would match " + excerpt(hit.match.text) + " with " + inQuotes(rule.key) + " at " +
+            return "would match " + excerpt(hit.match.text) + " with " + Base::inQuotes(rule.key) + " at " +
                    Words::number(value) + (value > current ? " or more" : " or less") + " instead of " +
                    Words::number(current);
         });
@@ -218,7 +218,7 @@ std::optional<Found> otherZone(Search const& search) {
             continue;
         auto const hit = search.find(textOf(*search.page().page, search.page().layout, zone));
         best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
-            return "would match " + excerpt(at.match.text) + " in the zone " + inQuotes(zone.name()) +
+            return "would match " + excerpt(at.match.text) + " in the zone " + Base::inQuotes(zone.name()) +
                    ": move the field there";
         }));
     }

@@ -1,6 +1,6 @@
 #include "programs/vlmail/explain/near_miss_search.h"
 
-#include "programs/vlmail/presets/words.h"
+#include "programs/base/quoting.h"
 
 #include <algorithm>
 #include <limits>
@@ -33,7 +33,7 @@ bool isValid(ExtractField const& field, ExtractedField value) {
 
 } // namespace
 
-std::string Search::zoneName() const { return "zone " + inQuotes(zone().name()); }
+std::string Search::zoneName() const { return "zone " + Base::inQuotes(zone().name()); }
 
 Box Search::location() const {
     Cfg::Rect const& at = zone().location();

@@ -1,7 +1,7 @@
 #include "programs/vlmail/explain/preset_walk.h"
 
+#include "programs/patterns/why_not.h"
 #include "programs/vlmail/explain/text_forms.h"
-#include "programs/vlmail/presets/why_not.h"
 
 namespace VlMail {
 namespace {
@@ -24,7 +24,7 @@ std::string wordsWhyNot(std::string const& pattern, std::string const& name) {
     if (changes && fits(composedPattern, composedName))
         return "would fit after Unicode normalisation: letters are composed in one and decomposed in the "
                "other";
-    return whyNot(pattern, name).words;
+    return Patterns::whyNot(pattern, name).words;
 }
 
 PresetStep take(Cfg::ArrValue<ExtractPreset> const& element, std::string const& document) {

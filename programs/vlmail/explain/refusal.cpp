@@ -1,7 +1,7 @@
 #include "programs/vlmail/explain/refusal.h"
 
+#include "programs/base/quoting.h"
 #include "programs/vlmail/explain/words.h"
-#include "programs/vlmail/presets/words.h"
 
 #include <string_view>
 
@@ -52,7 +52,7 @@ std::string const& defaultPattern(FieldValueType type) {
 std::string misfit(FieldValueType type, std::string const& pattern, std::string const& text) {
     std::string const subject = Words::excerpt(text);
     if (pattern != defaultPattern(type))
-        return subject + " does not match the validation pattern " + inQuotes(pattern);
+        return subject + " does not match the validation pattern " + Base::inQuotes(pattern);
     switch (type) {
     case FieldValueType::Integer:
         return subject + " is no integer";

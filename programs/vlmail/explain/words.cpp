@@ -1,7 +1,7 @@
-#include "programs/vlmail/presets/words.h"
-#include "programs/base/millimetres.h"
-#include "programs/base/utf8.h"
 #include "programs/vlmail/explain/words.h"
+#include "programs/base/millimetres.h"
+#include "programs/base/quoting.h"
+#include "programs/base/utf8.h"
 
 #include <charconv>
 #include <iterator>
@@ -21,7 +21,9 @@ std::string shortened(std::string_view text, std::size_t letters) {
     return shown.size() < text.size() ? result + MORE : result;
 }
 
-std::string excerpt(std::string_view text, std::size_t letters) { return inQuotes(shortened(text, letters)); }
+std::string excerpt(std::string_view text, std::size_t letters) {
+    return Base::inQuotes(shortened(text, letters));
+}
 
 std::string millimetres(long long hundredths) { return Base::withMillimetres(hundredths); }
 

@@ -47,15 +47,14 @@ public:
 };
 
 /// Puts the question to the person, when one is there.
-bool acceptsCertificate(std::string const& service, std::string const& fingerprint,
-                        Terminal const& terminal) {
-    terminal.err << "The service " << service << " shows a certificate that is new here:\n  " << fingerprint
-                 << "\nCompare it with what the service printed when it started.\n";
+bool acceptsCertificate(std::string const& service, std::string const& fingerprint, std::ostream& err) {
+    err << "The service " << service << " shows a certificate that is new here:\n  " << fingerprint
+        << "\nCompare it with what the service printed when it started.\n";
     if (!::isatty(STDIN_FILENO)) {
-        terminal.err << "To accept it, add --accept-certificate " << fingerprint << '\n';
+        err << "To accept it, add --accept-certificate " << fingerprint << '\n';
         return false;
     }
-    terminal.err << "Accept it from now on? (yes/no) " << std::flush;
+    err << "Accept it from now on? (yes/no) " << std::flush;
     std::string reply;
     return std::getline(std::cin, reply) && reply == "yes";
 }
@@ -102,22 +101,22 @@ ServiceAddress findService(ServiceOptions const& options) {
 }
 
 std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
-                                                  ServiceOptions const& options, Terminal const& terminal) {
+                                                  ServiceOptions const& options, std::ostream& err) {
     Channel::ClientSettings settings;
     settings.host = address.host;
     settings.port = address.port;
     settings.token = Channel::readToken(options.tokenFile.empty() ? (configFolder() / "token").string()
                                                                   : options.tokenFile);
     settings.pinFile = options.pinFile.empty() ? (configFolder() / "services").string() : options.pinFile;
-    settings.acceptNew = [&options, &terminal](std::string const& service, std::string const& fingerprint) {
-        return options.certificate.empty() ? acceptsCertificate(service, fingerprint, terminal)
+    settings.acceptNew = [&options, &err](std::string const& service, std::string const& fingerprint) {
+        return options.certificate.empty() ? acceptsCertificate(service, fingerprint, err)
                                            : options.certificate == fingerprint;
     };
     return std::make_unique<Channel::Client>(std::move(settings));
 }
 
-std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, Terminal const& terminal) {
-    return connectToService(findService(options), options, terminal);
+std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, std::ostream& err) {
+    return connectToService(findService(options), options, err);
 }
 
 json::Object const& requireAnswer(json::Object const& answer) {

@@ -4,11 +4,11 @@
 #include "programs/channel/client.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/settings.h"
-#include "programs/vlmail/terminal/terminal.h"
 #include "vlservice/json/json.h"
 
 #include <cstdint>
 #include <filesystem>
+#include <iosfwd>
 #include <memory>
 #include <optional>
 #include <string>
@@ -46,9 +46,9 @@ std::optional<json::Object> askNetwork();
 ServiceAddress findService(ServiceOptions const& options);
 /// Connects to it. A certificate that is new is shown to the person, who decides.
 /// Throws std::exception with one line for a person.
-std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, Terminal const& terminal);
+std::unique_ptr<Channel::Client> connectToService(ServiceOptions const& options, std::ostream& err);
 std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
-                                                  ServiceOptions const& options, Terminal const& terminal);
+                                                  ServiceOptions const& options, std::ostream& err);
 
 /// The answer itself, unless it is an error of the service. Throws Error with the service's line.
 json::Object const& requireAnswer(json::Object const& answer);

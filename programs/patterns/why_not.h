@@ -3,7 +3,7 @@
 
 #include <string>
 
-namespace VlMail {
+namespace Patterns {
 
 struct WhyNot {
     /// One sentence without its full stop.
@@ -17,4 +17,4 @@ struct WhyNot {
 /// For an expression that compiles and does not fit the name.
 WhyNot whyNot(std::string const& expression, std::string const& name);
 
-} // namespace VlMail
+} // namespace Patterns

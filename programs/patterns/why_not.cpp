@@ -1,21 +1,20 @@
-#include "programs/vlmail/presets/why_not.h"
+#include "programs/patterns/why_not.h"
 
+#include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
-#include "programs/vlmail/presets/presets_document.h"
-#include "programs/vlmail/presets/words.h"
 
 #include <optional>
 
-namespace VlMail {
+namespace Patterns {
 namespace {
 
 /// The longest beginning of the name that the pattern fits; nothing when there is none.
-std::optional<std::string> longestBeginning(Patterns::Pattern const& pattern, std::string const& name) {
+std::optional<std::string> longestBeginning(Pattern const& pattern, std::string const& name) {
     for (std::size_t length = name.size() + 1; length-- > 0;) {
         if (Base::isBetweenCharacters(name, length) &&
-            pattern.fits(name.substr(0, length)) == Patterns::Pattern::Answer::Yes)
+            pattern.fits(name.substr(0, length)) == Pattern::Answer::Yes)
             return name.substr(0, length);
     }
     return std::nullopt;
@@ -23,29 +22,29 @@ std::optional<std::string> longestBeginning(Patterns::Pattern const& pattern, st
 
 std::optional<std::string> fittedBy(std::string const& beginning, std::string const& name) {
     try {
-        return longestBeginning(Patterns::Pattern("(?:" + beginning + ")", Patterns::Pattern::Use::Name),
-                                name);
-    } catch (Patterns::Broken const&) {
+        return longestBeginning(Pattern("(?:" + beginning + ")", Pattern::Use::Name), name);
+    } catch (Broken const&) {
         return std::nullopt;
     }
 }
 
 WhyNot endsEarly(std::string const& fitted, std::string const& name) {
-    return {
-        "it must fit the whole name, and ends before " + inQuotes(name.substr(fitted.size())), {}, fitted};
+    return {"it must fit the whole name, and ends before " + Base::inQuotes(name.substr(fitted.size())),
+            {},
+            fitted};
 }
 
 WhyNot failsAt(std::string const& part, std::string const& fitted) {
     if (fitted.empty())
-        return {"the name does not begin with " + inQuotes(part), part, fitted};
-    return {inQuotes(part) + " does not fit behind " + inQuotes(fitted), part, fitted};
+        return {"the name does not begin with " + Base::inQuotes(part), part, fitted};
+    return {Base::inQuotes(part) + " does not fit behind " + Base::inQuotes(fitted), part, fitted};
 }
 
 /// How far the pieces get, one after the other.
-WhyNot whyNot(Patterns::Sequence const& pieces, std::string const& name) {
+WhyNot whyNot(Sequence const& pieces, std::string const& name) {
     std::string beginning;
     std::string fitted;
-    for (Patterns::Piece const& piece : pieces) {
+    for (Piece const& piece : pieces) {
         beginning += piece.text;
         auto const longer = fittedBy(beginning, name);
         if (!longer)
@@ -61,12 +60,12 @@ WhyNot whyNot(std::string const& expression, std::string const& name) {
     if (expression.empty())
         return {"an empty expression fits no name", {}, {}};
     std::optional<WhyNot> best;
-    for (Patterns::Sequence const& pieces : Patterns::outlineOf(expression)) {
-        WhyNot why = whyNot(Patterns::withJoinedLiterals(pieces), name);
+    for (Sequence const& pieces : outlineOf(expression)) {
+        WhyNot why = whyNot(withJoinedLiterals(pieces), name);
         if (!best || why.fitted.size() > best->fitted.size())
             best = std::move(why);
     }
     return *best;
 }
 
-} // namespace VlMail
+} // namespace Patterns
