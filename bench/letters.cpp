@@ -52,13 +52,17 @@ std::string wordsByPopplerAlone(std::string const& file) {
     return std::to_string(words);
 }
 
+VlMail::Workers workersIn(benchmark::State const& state) {
+    return {.count = static_cast<std::size_t>(state.range(0))};
+}
+
 /// In worker processes like the reader's, so that both pay for them.
 void popplerAlone(benchmark::State& state) {
     for (auto _ : state) {
         VlMail::runJobs(
-            batch().size(), static_cast<std::size_t>(state.range(0)),
+            batch().size(), workersIn(state),
             [](std::size_t index) { return wordsByPopplerAlone(batch()[index]); },
-            [](std::size_t, std::optional<std::string> words) { benchmark::DoNotOptimize(words); });
+            [](std::size_t, VlMail::JobResult words) { benchmark::DoNotOptimize(words); });
     }
     state.SetItemsProcessed(state.iterations() * static_cast<long long>(batch().size()));
 }
@@ -68,7 +72,7 @@ void readLetters(benchmark::State& state) {
     VlMail::BatchWatcher watcher;
     std::size_t letters = 0;
     for (auto _ : state) {
-        VlMail::readBatch(batch(), settings, static_cast<std::size_t>(state.range(0)), {}, watcher,
+        VlMail::readBatch(batch(), settings, workersIn(state), {}, watcher,
                           [&](std::size_t, VlMail::ReadResult result) {
                               letters += result.reading.letters.value().size();
                           });

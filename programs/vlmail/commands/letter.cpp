@@ -7,7 +7,6 @@
 #include "programs/vlmail/letters/field_words.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
-#include "programs/vlmail/letters/worker_pool.h"
 #include "programs/vlmail/report/describe.h"
 #include "programs/vlmail/report/report_file.h"
 #include "programs/vlmail/terminal/text_table.h"
@@ -27,7 +26,7 @@ struct Options {
     std::string report;
     bool json = false;
     bool explain = false;
-    std::size_t jobs = processorCount();
+    WorkerOptions reading;
 };
 
 std::string stateInWords(Cfg::ExtractedField const& field) {
@@ -122,7 +121,7 @@ int showLetters(Options const& options, Terminal const& terminal) {
     if (!options.report.empty())
         report.emplace(options.report);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.jobs, alongFor(options), progress,
+    readBatch(options.files, settings, options.reading.workers(), alongFor(options), progress,
               [&](std::size_t, ReadResult result) {
                   DocumentReading const& reading = result.reading;
                   outcome.count(reading);
@@ -155,7 +154,7 @@ void addLetterCommand(Base::Command const& app, Task& task) {
                    "Tells how each field came about, and why one was not found; with --json as \"trace\"");
     letter.addOption("--report", options->report,
                      "Writes an HTML page with the pages' pictures and what was found where");
-    letter.addCount("--jobs", options->jobs, "Processes to read with");
+    addWorkerOptions(letter, options->reading);
     letter.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return showLetters(*options, terminal); }; });
 }

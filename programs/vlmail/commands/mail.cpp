@@ -7,7 +7,6 @@
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/node_settings.h"
-#include "programs/vlmail/letters/worker_pool.h"
 #include "programs/vlmail/mailings/dispatch.h"
 #include "programs/vlmail/mailings/plan.h"
 #include "programs/vlmail/mailings/price.h"
@@ -32,7 +31,7 @@ struct Options {
     std::string node = "/";
     ServiceOptions service;
     bool json = false;
-    std::size_t jobs = processorCount();
+    WorkerOptions reading;
 };
 
 int report(Dispatch const& dispatch, Options const& options, Terminal const& terminal) {
@@ -74,7 +73,7 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.jobs, {.pages = Along::Pages::Yes}, progress,
+    readBatch(options.files, settings, options.reading.workers(), {.pages = Along::Pages::Yes}, progress,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -88,7 +87,7 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
-    splitBatch(plan.documents(), options.jobs, progress,
+    splitBatch(plan.documents(), options.reading.workers(), progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -100,10 +99,11 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.jobs, {}, progress, [&](std::size_t index, ReadResult result) {
-        plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
-        dispatch.take(std::move(result));
-    });
+    readBatch(options.files, settings, options.reading.workers(), {}, progress,
+              [&](std::size_t index, ReadResult result) {
+                  plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
+                  dispatch.take(std::move(result));
+              });
     dispatch.finish();
     if (options.price)
         dispatch.estimate(*connectToService(options.service, terminal.err));
@@ -113,7 +113,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
 
 void addBatchOptions(Base::Command const& command, Options& options) {
     command.addFlag("--json", options.json, "The outcome as one JSON object");
-    command.addCount("--jobs", options.jobs, "Processes to read with");
+    addWorkerOptions(command, options.reading);
 }
 
 } // namespace

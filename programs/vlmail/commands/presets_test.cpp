@@ -5,7 +5,6 @@
 #include "programs/vlmail/golden/test_run.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
-#include "programs/vlmail/letters/worker_pool.h"
 #include "vlservice/json/json_text.h"
 
 #include <algorithm>
@@ -28,7 +27,7 @@ struct Options {
     std::string settings;
     bool update = false;
     bool json = false;
-    std::size_t jobs = processorCount();
+    WorkerOptions reading;
 };
 
 struct VerdictWords {
@@ -91,7 +90,7 @@ int test(Options const& options, Terminal const& terminal) {
     std::vector<TestCase> const cases = testCasesIn(options.folder);
     TestRun run(settings, options.update ? UpdateExpectations::Yes : UpdateExpectations::No);
     BatchProgress progress(terminal);
-    run.readDocuments(cases, options.jobs, progress);
+    run.readDocuments(cases, options.reading.workers(), progress);
     std::map<Verdict, std::size_t> counts;
     for (TestCase const& one : cases) {
         TestResult const result = run.run(one);
@@ -119,7 +118,7 @@ void addPresetsTestCommand(Base::Command const& presets, Task& task) {
         "A JSON document with settings parts of a node; node.json in the folder when none is named");
     command.addFlag("--update", options->update, "Write what is found as what is expected, where it differs");
     command.addFlag("--json", options->json, "One JSON object a case, each on a line");
-    command.addCount("--jobs", options->jobs, "Processes to read with");
+    addWorkerOptions(command, options->reading);
     command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return test(*options, terminal); }; });
 }

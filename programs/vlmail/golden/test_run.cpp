@@ -37,7 +37,8 @@ TestResult write(TestCase const& one, DocumentReading const& reading, std::vecto
 TestRun::TestRun(NodeSettings const& settings, UpdateExpectations update)
     : settings_(settings), presets_(settings.presets()), update_(update == UpdateExpectations::Yes) {}
 
-void TestRun::readDocuments(std::vector<TestCase> const& cases, std::size_t workers, BatchWatcher& watcher) {
+void TestRun::readDocuments(std::vector<TestCase> const& cases, Workers const& workers,
+                            BatchWatcher& watcher) {
     std::vector<std::string> files;
     for (TestCase const& one : cases)
         if (one.hasDocument() && !one.isZonesText())

@@ -32,7 +32,7 @@ public:
     TestRun(NodeSettings const& settings, UpdateExpectations update);
 
     /// Reads the documents of the cases, all at once, on up to `workers` processes.
-    void readDocuments(std::vector<TestCase> const& cases, std::size_t workers, BatchWatcher& watcher);
+    void readDocuments(std::vector<TestCase> const& cases, Workers const& workers, BatchWatcher& watcher);
     /// One of the cases whose documents were read.
     TestResult run(TestCase const& one) const;
 

@@ -91,22 +91,41 @@ ReadResult unpack(std::string bytes) {
     return result;
 }
 
-ReadResult crashed(std::string const& file) {
+std::string inWords(JobFailure failure, JobLimits const& limits) {
+    auto const seconds = [&] {
+        std::string const milliseconds = std::to_string(limits.processor.count() % 1000);
+        return std::to_string(limits.processor.count() / 1000) +
+               (milliseconds == "0" ? "" : '.' + std::string(3 - milliseconds.size(), '0') + milliseconds);
+    };
+    switch (failure) {
+    case JobFailure::Died:
+        break;
+    case JobFailure::OutOfTime:
+        return "it took more than " + seconds() +
+               " s of processor time; print it to a new PDF, or give --document-seconds a larger number";
+    case JobFailure::OutOfMemory:
+        return "it took more than " + std::to_string(limits.memory >> 20) +
+               " MiB of memory; print it to a new PDF, or give --document-memory a larger number";
+    }
+    return "the reader broke down over it; the document is damaged, print it to a new PDF";
+}
+
+ReadResult unread(std::string const& file, JobFailure failure, JobLimits const& limits) {
     ReadResult result;
     result.reading.document = Base::validUtf8(std::filesystem::path(file).filename().string());
-    result.reading.error =
-        "cannot read \"" + Base::validUtf8(file) +
-        "\": the reader broke down over it; the document is damaged, print it to a new PDF";
+    result.reading.error = "cannot read \"" + Base::validUtf8(file) + "\": " + inWords(failure, limits);
     return result;
 }
 
-void runBatch(std::size_t count, std::size_t workers, BatchWatcher& watcher,
+void runBatch(std::size_t count, Workers const& workers, BatchWatcher& watcher,
               std::function<ReadResult(std::size_t)> const& work,
               std::function<std::string(std::size_t)> const& fileOf,
               std::function<void(std::size_t, ReadResult)> const& take) {
     watcher.begins(count);
-    auto const consume = [&](std::size_t index, std::optional<std::string> bytes) {
-        ReadResult result = bytes ? unpack(std::move(*bytes)) : crashed(fileOf(index));
+    auto const consume = [&](std::size_t index, JobResult job) {
+        auto const* const failure = std::get_if<JobFailure>(&job);
+        ReadResult result = failure ? unread(fileOf(index), *failure, workers.limits)
+                                    : unpack(std::get<std::string>(std::move(job)));
         watcher.handsOver(result.reading.letters ? result.reading.letters->size() : 0);
         take(index, std::move(result));
     };
@@ -117,7 +136,7 @@ void runBatch(std::size_t count, std::size_t workers, BatchWatcher& watcher,
 
 } // namespace
 
-void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
+void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, Workers const& workers,
                Along const& along, BatchWatcher& watcher,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
@@ -127,7 +146,7 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
         [&](std::size_t index) { return files[index]; }, take);
 }
 
-void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, BatchWatcher& watcher,
+void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, BatchWatcher& watcher,
                 std::function<void(std::size_t, ReadResult)> const& take) {
     runBatch(
         documents.size(), workers, watcher,

@@ -2,6 +2,7 @@
 // Reading many documents at once.
 
 #include "programs/vlmail/letters/reading.h"
+#include "programs/vlmail/letters/worker_pool.h"
 
 #include <functional>
 
@@ -21,14 +22,14 @@ public:
     virtual void handsOver(std::size_t /*letters*/) {}
 };
 
-/// Reads the files by the settings, on up to `workers` processes, and hands each result over in the order of
-/// the files. A document that brings its reader down has that for its error.
-void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, std::size_t workers,
+/// Reads the files by the settings in worker processes and hands each result over in the order of the files.
+/// A document that brings its reader down, or takes more than it may, has that for its error.
+void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, Workers const& workers,
                Along const& along, BatchWatcher& watcher,
                std::function<void(std::size_t, ReadResult)> const& take);
 
 /// The same with the pages of documents that were read before, as splitDocument() gives them.
-void splitBatch(std::vector<DecidedDocument> const& documents, std::size_t workers, BatchWatcher& watcher,
+void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, BatchWatcher& watcher,
                 std::function<void(std::size_t, ReadResult)> const& take);
 
 } // namespace VlMail

@@ -1,10 +1,14 @@
 #include "programs/vlmail/letters/worker_pool.h"
 
+#include "programs/vlmail/letters/process_usage.h"
+
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <cstdint>
 #include <map>
 #include <memory>
+#include <optional>
 #include <poll.h>
 #include <sched.h>
 #include <sys/socket.h>
@@ -84,26 +88,42 @@ public:
 
     void start(std::size_t index) {
         job_ = index;
+        begin_ = usageOf(process_);
+        failure_ = JobFailure::Died;
         Number const number = index;
         // A worker that is gone is noticed when its result is read.
         writeAll(socket_, &number, sizeof number);
     }
 
-    /// The result of the job that was started; nothing when the worker is dead.
-    std::optional<std::string> finish() {
+    /// Ends the worker when its job takes more than it may.
+    void hold(JobLimits const& limits) {
+        ProcessUsage const usage = usageOf(process_);
+        if (usage.processor > begin_.processor + limits.processor)
+            end(JobFailure::OutOfTime);
+        else if (usage.memory > begin_.memory + limits.memory)
+            end(JobFailure::OutOfMemory);
+    }
+
+    /// The result of the job that was started. Without one the worker is dead.
+    JobResult finish() {
         job_.reset();
         Number length = 0;
         if (!readAll(socket_, &length, sizeof length))
-            return std::nullopt;
+            return failure_;
         std::string result(length, '\0');
         if (!readAll(socket_, result.data(), result.size()))
-            return std::nullopt;
+            return failure_;
         return result;
     }
 
 private:
     [[noreturn]] static void fail(char const* what) {
         throw std::system_error(errno, std::generic_category(), what);
+    }
+
+    void end(JobFailure failure) {
+        failure_ = failure;
+        ::kill(process_, SIGKILL);
     }
 
     /// The life of the worker process; ends when the other side closes.
@@ -121,13 +141,21 @@ private:
     pid_t process_ = -1;
     int socket_ = -1;
     std::optional<std::size_t> job_;
+    /// What the process had used when the job began.
+    ProcessUsage begin_;
+    /// Why there is no result, if there is none.
+    JobFailure failure_ = JobFailure::Died;
 };
 
 class Pool {
+    /// Often enough that no job gets far beyond its limits meanwhile.
+    static constexpr int LOOK_EVERY_MS = 50;
+
 public:
-    Pool(std::size_t count, std::size_t workers, Job const& job, Consumer const& consume,
+    Pool(std::size_t count, Workers const& workers, Job const& job, Consumer const& consume,
          Progress const& progress)
-        : count_(count), job_(job), consume_(consume), progress_(progress), workers_(workers) {}
+        : count_(count), job_(job), consume_(consume), progress_(progress), limits_(workers.limits),
+          workers_(std::max<std::size_t>(1, std::min(workers.count, count))) {}
 
     void run() {
         for (auto& worker : workers_) {
@@ -150,9 +178,10 @@ private:
         std::vector<pollfd> polled;
         for (auto const& worker : workers_)
             polled.push_back({worker->job() ? worker->socket() : -1, POLLIN, 0});
-        while (::poll(polled.data(), polled.size(), -1) < 0) {
-            if (errno != EINTR)
-                throw std::system_error(errno, std::generic_category(), "cannot wait for worker processes");
+        int heard = 0;
+        while (heard == 0) {
+            heard = wait(polled);
+            holdToLimits();
         }
         std::size_t ready = 0;
         while (polled[ready].revents == 0)
@@ -160,10 +189,28 @@ private:
         return workers_[ready];
     }
 
+    /// How many workers are heard of before their use of the machine is to be looked at again.
+    static int wait(std::vector<pollfd>& polled) {
+        int const heard = ::poll(polled.data(), polled.size(), LOOK_EVERY_MS);
+        if (heard < 0 && errno != EINTR)
+            throw std::system_error(errno, std::generic_category(), "cannot wait for worker processes");
+        return std::max(heard, 0);
+    }
+
+    void holdToLimits() {
+        auto const now = std::chrono::steady_clock::now();
+        if (now < nextLook_)
+            return;
+        nextLook_ = now + std::chrono::milliseconds(LOOK_EVERY_MS);
+        for (auto const& worker : workers_)
+            if (worker->job())
+                worker->hold(limits_);
+    }
+
     void take(std::unique_ptr<Worker>& worker) {
         std::size_t const index = *worker->job();
-        std::optional<std::string> result = worker->finish();
-        if (!result) {
+        JobResult result = worker->finish();
+        if (std::holds_alternative<JobFailure>(result)) {
             worker.reset();
             worker = std::make_unique<Worker>(job_, workers_);
         }
@@ -182,8 +229,10 @@ private:
     Job const& job_;
     Consumer const& consume_;
     Progress const& progress_;
+    JobLimits const limits_;
+    std::chrono::steady_clock::time_point nextLook_;
     std::vector<std::unique_ptr<Worker>> workers_;
-    std::map<std::size_t, std::optional<std::string>> results_;
+    std::map<std::size_t, JobResult> results_;
     std::size_t started_ = 0;
     std::size_t done_ = 0;
     std::size_t consumed_ = 0;
@@ -191,11 +240,11 @@ private:
 
 } // namespace
 
-void runJobs(std::size_t count, std::size_t workers, Job const& job, Consumer const& consume,
+void runJobs(std::size_t count, Workers const& workers, Job const& job, Consumer const& consume,
              Progress const& progress) {
     if (count == 0)
         return;
-    Pool(count, std::max<std::size_t>(1, std::min(workers, count)), job, consume, progress).run();
+    Pool(count, workers, job, consume, progress).run();
 }
 
 std::size_t processorCount() {
