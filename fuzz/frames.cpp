@@ -12,7 +12,7 @@ namespace {
 
 struct Outcome {
     /// What the messages that were read are written as, the preface in front.
-    std::string rewritten = Channel::preface();
+    std::string rewritten;
     std::size_t messages = 0;
     bool isRefused = false;
 };
@@ -40,6 +40,7 @@ Outcome decode(std::string_view bytes, std::size_t piece) {
     } catch (Base::Error const&) {
         outcome.isRefused = true;
     }
+    outcome.rewritten.insert(0, Channel::preface(decoder.version()));
     return outcome;
 }
 

@@ -1,6 +1,6 @@
 // Messages from a stranger to either side of the greeting: he may say whatever he likes, and is never let in.
-// The first byte tells the side; then each message is its command, kind and sequence number, the size of its
-// text in two bytes, and the text.
+// The first byte tells the side and the version; then each message is its command, kind and sequence number,
+// the size of its text in two bytes, and the text.
 #include "programs/channel/greeting.h"
 
 #include <algorithm>
@@ -10,7 +10,12 @@
 
 namespace {
 
-Channel::GreetingTerms const TERMS{"0123456789abcdef0123456789abcdef", "", std::string(64, '0')};
+std::string const NONCE(64, '0');
+
+Channel::Terms terms(std::uint8_t first) {
+    std::uint16_t const version = first % 4 < 2 ? Channel::VERSION : Channel::VERSION_1;
+    return {version, "0123456789abcdef0123456789abcdef", "", "127.0.0.1:40000", "127.0.0.1:4711"};
+}
 
 template<typename Side>
 void tell(Side& side, std::string_view bytes) {
@@ -33,10 +38,10 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
         return 0;
     std::string_view const messages(reinterpret_cast<char const*>(data) + 1, size - 1);
     if (data[0] % 2 == 0) {
-        Channel::ServiceGreeting service(TERMS);
+        Channel::ServiceGreeting service(terms(data[0]), NONCE);
         tell(service, messages);
     } else {
-        Channel::ClientGreeting client(TERMS);
+        Channel::ClientGreeting client(terms(data[0]), NONCE);
         tell(client, messages);
     }
     return 0;

@@ -65,16 +65,22 @@ void ClientConnection::resolve() {
     auto const address = asio::ip::make_address(settings_.host, ec);
     if (!ec)
         return connectTo({tcp::endpoint(address, settings_.port)});
-    resolver_.emplace(*io_);
-    resolver_->async_resolve(
-        settings_.host, std::to_string(settings_.port),
-        [self = shared_from_this()](error_code const& resolved, tcp::resolver::results_type const& results) {
+    lookup_.emplace(
+        *io_, settings_.lookUp, settings_.host,
+        [self = shared_from_this()](std::string const& failure, std::vector<std::string> const& addresses) {
             if (self->state_ == State::Closed)
                 return;
-            if (resolved)
-                return self->fail("The host cannot be found: " + resolved.message() + '.');
-            self->connectTo({results.begin(), results.end()});
+            self->orFail([&] { self->onLookedUp(failure, addresses); });
         });
+}
+
+void ClientConnection::onLookedUp(std::string const& failure, std::vector<std::string> const& addresses) {
+    if (!failure.empty())
+        return fail(failure);
+    std::vector<tcp::endpoint> endpoints;
+    for (std::string const& address : addresses)
+        endpoints.emplace_back(asio::ip::make_address(address), settings_.port);
+    connectTo(std::move(endpoints));
 }
 
 void ClientConnection::connectTo(std::vector<tcp::endpoint> endpoints) {
@@ -93,6 +99,7 @@ void ClientConnection::connectTo(std::vector<tcp::endpoint> endpoints) {
 void ClientConnection::onConnected(tcp::socket socket) {
     socket.set_option(tcp::no_delay(true));
     socket.set_option(asio::socket_base::keep_alive(true));
+    ends_ = endsOf(socket);
     bool const isTls = settings_.tls == Tls::Always || !isLoopback(socket.remote_endpoint().address());
     if (isTls) {
         tls_ = makeClientContext();
@@ -100,6 +107,7 @@ void ClientConnection::onConnected(tcp::socket socket) {
     } else {
         link_ = std::make_shared<Link>(makePlainStream(std::move(socket)));
     }
+    link_->speak(version_);
     link_->handshake([self = shared_from_this()](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
@@ -128,28 +136,51 @@ void ClientConnection::requirePinned() const {
 }
 
 void ClientConnection::greet() {
-    greeting_.emplace(GreetingTerms{settings_.token, fingerprint_, makeNonce()});
+    greeting_.emplace(terms(), makeNonce());
     link_->limitText(MAX_GREETING);
-    link_->allow(HEADER_SIZE + MAX_TEXT);
+    link_->allow(HEADER_SIZE + MAX_TEXT + Seal::SIZE);
     auto const challenge = greeting_->challenge();
     write(challenge.frame(), [this] { receive([this](Frame const& message) { onGreeting(message); }); });
 }
 
+Terms ClientConnection::terms() const {
+    if (tls_)
+        return {version_, settings_.token, fingerprint_, {}, {}};
+    return {version_, settings_.token, {}, ends_.own, ends_.other};
+}
+
 void ClientConnection::onGreeting(Frame const& message) {
+    if (link_->heardVersion() < version_)
+        return onOldService(message);
     GreetingStep const step = greeting_->take(message);
     switch (step.verdict) {
     case GreetingStep::Verdict::GoesOn:
         return write(step.reply->frame(),
                      [this] { receive([this](Frame const& next) { onGreeting(next); }); });
     case GreetingStep::Verdict::Welcome:
-        return onWelcome();
+        return onWelcome(step.seals);
     case GreetingStep::Verdict::Refused:
         return fail(step.reason);
     }
 }
 
-void ClientConnection::onWelcome() {
+/// It has refused our version, or answers in another one than it was asked in.
+void ClientConnection::onOldService(Frame const& message) {
+    if (message.kind != Kind::Error)
+        return fail("It does not greet.");
+    if (!settings_.allowsVersion1)
+        return fail("It speaks version 1 of the connection alone, in which others on the way can speak for "
+                    "us; bring it up to date, or add --allow-channel-1 to go on with it.");
+    version_ = VERSION_1;
+    link_->close();
+    link_.reset();
+    resolve();
+}
+
+void ClientConnection::onWelcome(std::optional<SealKeys> const& seals) {
     greeting_.reset();
+    if (seals)
+        link_->seal(seals->client, seals->service);
     if (tls_)
         pinNew();
     link_->limitText(MAX_TEXT);
@@ -241,7 +272,7 @@ void ClientConnection::takeAnswer(Frame const& message) {
         if (message.kind == Kind::Error)
             failure = "The service refuses: " + reasonOf(message.text);
         else
-            taken_(parse(message.text));
+            taken_(parse(message.text, MAX_ANSWER_VALUES));
     } catch (std::exception const& e) {
         failure = std::string("The answer cannot be used: ") + e.what();
     }
@@ -290,10 +321,7 @@ void ClientConnection::onDue() {
 // --- the connection
 
 void ClientConnection::write(Frame const& message, std::function<void()> gone) {
-    std::string bytes = prefaceSent_ ? std::string() : preface();
-    appendFrame(bytes, message);
-    prefaceSent_ = true;
-    link_->send(std::move(bytes), [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
+    link_->send(message, [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
         if (ec)
@@ -333,7 +361,7 @@ void ClientConnection::end(std::string const& reason) {
     failure_ = reason;
     connectDeadline_.reset();
     deadline_.reset();
-    resolver_.reset();
+    lookup_.reset();
     socket_.reset();
     if (link_)
         link_->close();

@@ -1,6 +1,7 @@
 #pragma once
 // The client's side of the connection, for programs that run an io_context: the queue of its requests.
 
+#include "programs/channel/background_lookup.h"
 #include "programs/channel/client.h"
 #include "programs/channel/deadline.h"
 #include "programs/channel/greeting.h"
@@ -58,12 +59,15 @@ private:
 
     // Connecting, in this order.
     void resolve();
+    void onLookedUp(std::string const& failure, std::vector<std::string> const& addresses);
     void connectTo(std::vector<tcp::endpoint> endpoints);
     void onConnected(tcp::socket socket);
     void onHandshake();
     void greet();
+    Terms terms() const;
     void onGreeting(Frame const& message);
-    void onWelcome();
+    void onOldService(Frame const& message);
+    void onWelcome(std::optional<SealKeys> const& seals);
     void requirePinned() const;
     void pinNew();
 
@@ -91,14 +95,15 @@ private:
     std::string failure_;
     Done connected_;
     std::unique_ptr<boost::asio::ssl::context> tls_;
-    std::optional<tcp::resolver> resolver_;
+    std::optional<BackgroundLookup> lookup_;
     std::optional<tcp::socket> socket_;
     std::shared_ptr<Link> link_;
     std::optional<Deadline> connectDeadline_;
     std::optional<Deadline> deadline_;
+    std::uint16_t version_ = VERSION;
+    Ends ends_;
     std::optional<ClientGreeting> greeting_;
     std::string fingerprint_;
-    bool prefaceSent_ = false;
 
     /// The first is under way while isBusy_.
     std::deque<Request> requests_;

@@ -1,5 +1,7 @@
 #include "programs/channel/frame.h"
+
 #include "programs/base/error.h"
+#include "programs/channel/proof.h"
 
 #include <algorithm>
 
@@ -42,16 +44,22 @@ bool isKind(std::uint8_t kind) {
 
 } // namespace
 
-std::string preface() {
+std::string preface(std::uint16_t version) {
     std::string bytes(MAGIC);
-    appendNumber(bytes, VERSION);
+    appendNumber(bytes, version);
     return bytes;
+}
+
+std::optional<std::uint16_t> versionIn(std::string_view bytes) {
+    if (bytes.size() < PREFACE_SIZE || !bytes.starts_with(MAGIC))
+        return std::nullopt;
+    return numberAt<std::uint16_t>(bytes, MAGIC.size());
 }
 
 void appendFrame(std::string& bytes, Frame const& frame) {
     if (frame.text.size() > MAX_TEXT)
         refuseLength(frame.text.size(), MAX_TEXT);
-    bytes.reserve(bytes.size() + HEADER_SIZE + frame.text.size());
+    bytes.reserve(bytes.size() + HEADER_SIZE + frame.text.size() + Seal::SIZE);
     appendNumber(bytes, frame.command);
     appendNumber(bytes, static_cast<std::uint8_t>(frame.kind));
     appendNumber(bytes, frame.sequence);
@@ -75,12 +83,14 @@ std::span<char> FrameDecoder::room() {
 }
 
 std::optional<Frame> FrameDecoder::next() {
-    if (!hasPreface_ && !readPreface())
+    if (version_ == 0 && !readPreface())
         return std::nullopt;
     std::size_t const size = announced();
     if (size == 0 || unread().size() < size)
         return std::nullopt;
-    std::string_view const message = unread().substr(0, size);
+    std::size_t const sealSize = seal_ ? Seal::SIZE : 0;
+    std::string_view const message = unread().substr(0, size - sealSize);
+    requireSeal(message, unread().substr(message.size(), sealSize));
     begin_ += size;
     return Frame{numberAt<std::uint8_t>(message, COMMAND_AT),
                  static_cast<Kind>(numberAt<std::uint8_t>(message, KIND_AT)),
@@ -88,7 +98,7 @@ std::optional<Frame> FrameDecoder::next() {
 }
 
 std::size_t FrameDecoder::announced() const {
-    if (!hasPreface_ || unread().size() < HEADER_SIZE)
+    if (version_ == 0 || unread().size() < HEADER_SIZE)
         return 0;
     auto const kind = numberAt<std::uint8_t>(unread(), KIND_AT);
     if (!isKind(kind))
@@ -96,7 +106,12 @@ std::size_t FrameDecoder::announced() const {
     auto const length = numberAt<std::uint32_t>(unread(), LENGTH_AT);
     if (length > limit_)
         refuseLength(length, limit_);
-    return HEADER_SIZE + length;
+    return HEADER_SIZE + length + (seal_ ? Seal::SIZE : 0);
+}
+
+void FrameDecoder::requireSeal(std::string_view message, std::string_view seal) {
+    if (seal_ && !isSameProof(seal, seal_->next(message)))
+        throw Base::Error("A message is not sealed by the other side of this connection.");
 }
 
 bool FrameDecoder::readPreface() {
@@ -105,13 +120,13 @@ bool FrameDecoder::readPreface() {
         throw Base::Error("The first bytes are not those of this protocol.");
     if (unread().size() < PREFACE_SIZE)
         return false;
-    auto const version = numberAt<std::uint16_t>(unread(), MAGIC.size());
-    if (version != VERSION)
+    std::uint16_t const version = *versionIn(unread());
+    if (version < VERSION_1 || version > VERSION)
         throw Base::Error("Version " + std::to_string(version) +
-                          " of the protocol is not spoken here, only version " + std::to_string(VERSION) +
-                          ".");
+                          " of the protocol is not spoken here, only the versions " +
+                          std::to_string(VERSION_1) + " and " + std::to_string(VERSION) + '.');
     begin_ += PREFACE_SIZE;
-    hasPreface_ = true;
+    version_ = version;
     return true;
 }
 

@@ -4,12 +4,13 @@
 //
 //     preface = "VLCH" version:u16
 //     header  = command:u8 kind:u8 sequence:u32 length:u32
-//     message = header text, with `length` bytes of text
+//     message = header text seal, with `length` bytes of text
 //
-// Numbers are in network order. Command 0 is the greeting. A response or an error has its request's command
-// and sequence number; an error's text is an object with the key "err".
+// A seal of 32 bytes stands behind each message of version 2 on a connection without TLS, once the greeting
+// is over; else there is none. Numbers are in network order. Command 0 is the greeting. A response or an
+// error has its request's command and sequence number; an error's text is an object with the key "err".
 
-#include "programs/base/error.h"
+#include "programs/channel/seal.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -21,7 +22,8 @@
 namespace Channel {
 
 constexpr std::string_view MAGIC = "VLCH";
-constexpr std::uint16_t VERSION = 1;
+constexpr std::uint16_t VERSION_1 = 1;
+constexpr std::uint16_t VERSION = 2;
 constexpr std::size_t PREFACE_SIZE = 6;
 constexpr std::size_t HEADER_SIZE = 10;
 constexpr std::uint32_t MAX_TEXT = 16 * 1024 * 1024;
@@ -38,7 +40,9 @@ struct Frame {
 };
 
 /// The six bytes that each side begins with.
-std::string preface();
+std::string preface(std::uint16_t version = VERSION);
+/// The version in the first bytes of a connection, if they are a preface.
+std::optional<std::uint16_t> versionIn(std::string_view bytes);
 /// Appends a message. Throws Error when the text is too long.
 void appendFrame(std::string& bytes, Frame const& frame);
 
@@ -48,6 +52,10 @@ class FrameDecoder {
 public:
     /// Longer texts than this are refused; at most MAX_TEXT.
     void limitText(std::uint32_t limit) { limit_ = limit; }
+    /// From now on each message carries a seal, under this key.
+    void expectSeals(std::string key) { seal_.emplace(std::move(key)); }
+    /// In the preface; 0 before it is there.
+    std::uint16_t version() const { return version_; }
 
     /// Room for bytes to come: a small piece, or as much again as has come of a long text.
     std::span<char> room();
@@ -59,18 +67,20 @@ public:
 
     /// Whether a message has begun and is not complete.
     bool isInside() const { return filled_ > begin_; }
-    /// The size of the message that has begun, with its header, when the header is there; else 0.
+    /// The size of the message that has begun, with header and seal, when the header is there; else 0.
     std::size_t announced() const;
 
 private:
     std::string_view unread() const { return {bytes_.data() + begin_, filled_ - begin_}; }
     bool readPreface();
+    void requireSeal(std::string_view message, std::string_view seal);
 
     std::string bytes_;
     std::size_t begin_ = 0;
     std::size_t filled_ = 0;
     std::uint32_t limit_ = MAX_TEXT;
-    bool hasPreface_ = false;
+    std::uint16_t version_ = 0;
+    std::optional<Seal> seal_;
 };
 
 } // namespace Channel

@@ -2,7 +2,6 @@
 
 #include "programs/base/error.h"
 #include "programs/channel/message_text.h"
-#include "programs/channel/token.h"
 
 #include <utility>
 
@@ -21,6 +20,17 @@ std::string textUnder(char const* key, Frame const& message, std::uint32_t seque
     if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
         throw Base::Error("The greeting is missing.");
     return parse(message.text).get(key).toString();
+}
+
+/// Without TLS version 2 is held by the addresses of both ends and by seals.
+bool isHeldByAddresses(Terms const& terms) { return terms.version > VERSION_1 && terms.fingerprint.empty(); }
+
+std::optional<SealKeys> sealsFor(Terms const& terms, std::string const& clientNonce,
+                                 std::string const& serviceNonce) {
+    if (!isHeldByAddresses(terms))
+        return std::nullopt;
+    return SealKeys{makeSealKey(Side::Client, terms, clientNonce, serviceNonce),
+                    makeSealKey(Side::Service, terms, clientNonce, serviceNonce)};
 }
 
 json::Object answerIn(Frame const& message, std::uint32_t sequence) {
@@ -55,26 +65,27 @@ GreetingStep ServiceGreeting::take(Frame const& message) {
 
 GreetingStep ServiceGreeting::answerChallenge(Frame const& message) {
     clientNonce_ = textUnder(NONCE, message, CHALLENGE);
-    GreetingStep step = goOn(
-        Kind::Response, CHALLENGE,
-        {{NONCE, terms_.nonce},
-         {PROOF, makeProof(Side::Service, terms_.token, clientNonce_, terms_.nonce, terms_.fingerprint)}});
+    GreetingStep step =
+        goOn(Kind::Response, CHALLENGE,
+             {{NONCE, nonce_}, {PROOF, makeProof(Side::Service, terms_, clientNonce_, nonce_)}});
     state_ = State::Proof;
     return step;
 }
 
 GreetingStep ServiceGreeting::checkProof(Frame const& message) {
-    std::string const expected =
-        makeProof(Side::Client, terms_.token, clientNonce_, terms_.nonce, terms_.fingerprint);
+    std::string const expected = makeProof(Side::Client, terms_, clientNonce_, nonce_);
     if (!isSameProof(textUnder(PROOF, message, PROVING), expected))
         return refusal("Its access token is not the one of this service.");
-    return {Verdict::Welcome, GreetingStep::Reply{Kind::Response, PROVING, "{}"}, {}};
+    return {Verdict::Welcome,
+            GreetingStep::Reply{Kind::Response, PROVING, "{}"},
+            {},
+            sealsFor(terms_, clientNonce_, nonce_)};
 }
 
 // --- the client
 
 GreetingStep::Reply ClientGreeting::challenge() const {
-    return {Kind::Request, CHALLENGE, print({{NONCE, terms_.nonce}})};
+    return {Kind::Request, CHALLENGE, print({{NONCE, nonce_}})};
 }
 
 GreetingStep ClientGreeting::take(Frame const& message) {
@@ -85,7 +96,7 @@ GreetingStep ClientGreeting::take(Frame const& message) {
             return prove(message);
         case State::Proof:
             answerIn(message, PROVING);
-            return {Verdict::Welcome, std::nullopt, {}};
+            return {Verdict::Welcome, std::nullopt, {}, sealsFor(terms_, nonce_, serviceNonce_)};
         case State::Over:
             break;
         }
@@ -97,13 +108,13 @@ GreetingStep ClientGreeting::take(Frame const& message) {
 
 GreetingStep ClientGreeting::prove(Frame const& message) {
     json::Object const answer = answerIn(message, CHALLENGE);
-    std::string const serviceNonce = answer.get(NONCE).toString();
-    auto const proof = [&](Side side) {
-        return makeProof(side, terms_.token, terms_.nonce, serviceNonce, terms_.fingerprint);
-    };
-    if (!isSameProof(answer.get(PROOF).toString(), proof(Side::Service)))
-        return refusal("Whoever answers there does not know our access token.");
-    GreetingStep step = goOn(Kind::Request, PROVING, {{PROOF, proof(Side::Client)}});
+    serviceNonce_ = answer.get(NONCE).toString();
+    if (!isSameProof(answer.get(PROOF).toString(), makeProof(Side::Service, terms_, nonce_, serviceNonce_)))
+        return refusal(isHeldByAddresses(terms_)
+                           ? "Whoever answers there does not know our access token, or passes us on."
+                           : "Whoever answers there does not know our access token.");
+    GreetingStep step =
+        goOn(Kind::Request, PROVING, {{PROOF, makeProof(Side::Client, terms_, nonce_, serviceNonce_)}});
     state_ = State::Proof;
     return step;
 }

@@ -9,10 +9,13 @@
 // Each side is a machine without a socket or a clock: messages go in, messages and a verdict come out.
 
 #include "programs/channel/frame.h"
+#include "programs/channel/proof.h"
+#include "programs/channel/seal.h"
 
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace Channel {
 
@@ -25,15 +28,6 @@ constexpr std::uint32_t FIRST_COMMAND = 2;
 
 /// All that a stranger may send.
 constexpr std::uint32_t MAX_GREETING = 1024;
-
-/// What a side knows of the connection.
-struct GreetingTerms {
-    std::string token;
-    /// Of the service's certificate as this side sees it; empty without TLS.
-    std::string fingerprint;
-    /// New for each connection.
-    std::string nonce;
-};
 
 /// What follows from a message.
 struct GreetingStep {
@@ -52,12 +46,15 @@ struct GreetingStep {
     std::optional<Reply> reply;
     /// Why it is refused, one line for a person.
     std::string reason;
+    /// With a welcome in version 2 without TLS: what seals all that follows.
+    std::optional<SealKeys> seals = std::nullopt;
 };
 
 /// The side that lets in.
 class ServiceGreeting {
 public:
-    explicit ServiceGreeting(GreetingTerms terms) : terms_(std::move(terms)) {}
+    /// The nonce is new for each connection.
+    ServiceGreeting(Terms terms, std::string nonce) : terms_(std::move(terms)), nonce_(std::move(nonce)) {}
 
     /// Takes the client's next message. After a welcome or a refusal everything is refused.
     GreetingStep take(Frame const& message);
@@ -68,7 +65,8 @@ private:
     GreetingStep answerChallenge(Frame const& message);
     GreetingStep checkProof(Frame const& message);
 
-    GreetingTerms terms_;
+    Terms terms_;
+    std::string nonce_;
     std::string clientNonce_;
     State state_ = State::Challenge;
 };
@@ -76,7 +74,8 @@ private:
 /// The side that asks to be let in. It proves nothing to a service that has not proved itself.
 class ClientGreeting {
 public:
-    explicit ClientGreeting(GreetingTerms terms) : terms_(std::move(terms)) {}
+    /// The nonce is new for each connection.
+    ClientGreeting(Terms terms, std::string nonce) : terms_(std::move(terms)), nonce_(std::move(nonce)) {}
 
     /// What the greeting begins with.
     GreetingStep::Reply challenge() const;
@@ -88,7 +87,9 @@ private:
 
     GreetingStep prove(Frame const& message);
 
-    GreetingTerms terms_;
+    Terms terms_;
+    std::string nonce_;
+    std::string serviceNonce_;
     State state_ = State::Challenge;
 };
 

@@ -60,8 +60,18 @@ void Link::readMore(std::function<void(Received const&)> done) {
     });
 }
 
-void Link::send(std::string bytes, Stream::Done done) {
-    sending_ = std::move(bytes);
+void Link::seal(std::string sendKey, std::string receiveKey) {
+    seal_.emplace(std::move(sendKey));
+    decoder_.expectSeals(std::move(receiveKey));
+}
+
+void Link::send(Frame const& message, Stream::Done done) {
+    std::string bytes;
+    appendFrame(bytes, message);
+    if (seal_)
+        bytes += seal_->next(bytes);
+    sending_ = prefaceSent_ ? std::move(bytes) : preface(version_) + bytes;
+    prefaceSent_ = true;
     stream_->writeAll(sending_, [self = shared_from_this(), done = std::move(done)](error_code const& ec) {
         self->sending_ = std::string();
         done(ec);

@@ -6,6 +6,7 @@
 
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace Channel {
@@ -49,9 +50,19 @@ public:
     /// Called each time when only a part of a message is there.
     void onPart(std::function<void()> onPart) { onPart_ = std::move(onPart); }
 
+    /// What this side's preface says.
+    void speak(std::uint16_t version) { version_ = version; }
+    /// What the other side's preface says; 0 before it is there.
+    std::uint16_t heardVersion() const { return decoder_.version(); }
+    /// From the next message on, each one is sealed, in both directions.
+    void seal(std::string sendKey, std::string receiveKey);
+
     /// The message is valid until the next call.
     void receive(std::function<void(Received const&)> done);
-    void send(std::string bytes, Stream::Done done);
+    /// Throws Error when the message is too long or cannot be sealed.
+    void send(Frame const& message, Stream::Done done);
+    /// The bytes that are on their way.
+    std::size_t sending() const { return sending_.size(); }
     /// Says that nothing more will come, and throws away what still comes until the other side closes, so
     /// that it gets what was sent last.
     void finish(std::function<void()> done);
@@ -66,6 +77,9 @@ private:
     std::size_t allowed_ = SMALL;
     std::function<void()> onPart_;
     std::string sending_;
+    std::uint16_t version_ = VERSION;
+    bool prefaceSent_ = false;
+    std::optional<Seal> seal_;
 };
 
 } // namespace Channel

@@ -1,6 +1,8 @@
 #include "programs/channel/message_text.h"
 
-#include "programs/base/utf8.h"
+#include "programs/base/error.h"
+#include "programs/base/plain_text.h"
+
 #include "vlservice/json/json_text.h"
 
 #include <sstream>
@@ -9,6 +11,37 @@ namespace Channel {
 namespace {
 
 constexpr char const* ERR = "err";
+constexpr std::size_t MIB = 1024 * 1024;
+
+/// What a value takes, by the character that it begins with or stands behind.
+std::size_t memoryOf(char structural) {
+    switch (structural) {
+    case '{':
+        return 256;
+    case '[':
+        return 128;
+    case '"':
+    case ':':
+        return 64;
+    case ',':
+        return 48;
+    default:
+        return 0;
+    }
+}
+
+/// What the values in a text take, or somewhat more.
+std::size_t memoryOf(std::string_view text) {
+    std::size_t memory = text.size();
+    for (std::size_t at = 0; at < text.size(); ++at) {
+        memory += memoryOf(text[at]);
+        if (text[at] != '"')
+            continue;
+        for (++at; at < text.size() && text[at] != '"'; ++at)
+            at += text[at] == '\\' ? 1 : 0;
+    }
+    return memory;
+}
 
 } // namespace
 
@@ -18,14 +51,19 @@ std::string print(json::Object const& object) {
     return std::move(text).str();
 }
 
-json::Object parse(std::string_view text) { return json::strToObject(text.data(), text.size()); }
+json::Object parse(std::string_view text, std::size_t limit) {
+    if (memoryOf(text) > limit)
+        throw Base::Error("The values of a message of " + std::to_string(text.size()) +
+                          " bytes would take more than " + std::to_string(limit / MIB) + " MiB of memory.");
+    return json::strToObject(text.data(), text.size());
+}
 
-std::string printError(std::string const& reason) { return print({{ERR, Base::validUtf8(reason)}}); }
+std::string printError(std::string const& reason) { return print({{ERR, Base::oneLine(reason)}}); }
 
 std::string reasonOf(std::string_view errorText) {
     try {
         return parse(errorText).get(ERR).toString();
-    } catch (json::Exc const&) {
+    } catch (std::exception const&) {
         return "It gave no reason.";
     }
 }

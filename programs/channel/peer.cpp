@@ -11,6 +11,7 @@
 #include <boost/asio/error.hpp>
 #include <boost/asio/io_context.hpp>
 
+#include <array>
 #include <atomic>
 #include <sstream>
 
@@ -75,14 +76,24 @@ std::shared_ptr<Peer> Peer::make(asio::io_context& io, std::shared_ptr<PeerConte
 Peer::Peer(asio::io_context& io, std::shared_ptr<PeerContext> context, tcp::socket socket)
     : context_(std::move(context)), io_(io), name_(nameOf(socket)), socket_(std::move(socket)) {}
 
+Terms Peer::terms() const {
+    std::uint16_t const version = link_->heardVersion();
+    if (context_->tls())
+        return {version, context_->settings().token, context_->fingerprint(), {}, {}};
+    return {version, context_->settings().token, {}, ends_.other, ends_.own};
+}
+
 void Peer::start() {
     log(TRACE, "It connects.");
     setDeadline(context_->settings().greetingTime, "It does not greet.");
     if (context_->tls()) {
         expectTls();
     } else {
-        link_ = std::make_shared<Link>(makePlainStream(*std::exchange(socket_, std::nullopt)));
-        receive();
+        orGiveUp([&] {
+            ends_ = endsOf(*socket_);
+            link_ = std::make_shared<Link>(makePlainStream(*std::exchange(socket_, std::nullopt)));
+            receive();
+        });
     }
 }
 
@@ -94,12 +105,13 @@ void Peer::expectTls() {
 void Peer::onFirstByte(error_code const& waited) {
     if (state_ == State::Closed)
         return;
-    char first = 0;
+    std::array<char, PREFACE_SIZE> first{};
+    std::size_t size = 0;
     error_code ec = waited;
     if (!ec)
         socket_->non_blocking(true, ec);
     if (!ec)
-        socket_->receive(asio::buffer(&first, 1), tcp::socket::message_peek, ec);
+        size = socket_->receive(asio::buffer(first), tcp::socket::message_peek, ec);
     if (ec == asio::error::would_block)
         return expectTls();
     if (ec) {
@@ -107,11 +119,12 @@ void Peer::onFirstByte(error_code const& waited) {
         return close();
     }
     tcp::socket socket = *std::exchange(socket_, std::nullopt);
-    if (first == TLS_HANDSHAKE) {
+    if (first.front() == TLS_HANDSHAKE) {
         link_ = std::make_shared<Link>(makeTlsStream(std::move(socket), *context_->tls(), TlsRole::Service));
         shakeHands();
     } else {
         link_ = std::make_shared<Link>(makePlainStream(std::move(socket)));
+        link_->speak(versionIn({first.data(), size}).value_or(VERSION));
         refuse("This service speaks TLS alone.");
     }
 }
@@ -120,10 +133,8 @@ void Peer::shakeHands() {
     link_->handshake([self = shared_from_this()](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
-        if (ec) {
-            self->log(FAILED, "TLS failed: " + ec.message() + '.');
-            return self->close();
-        }
+        if (ec)
+            return self->giveUp("TLS failed: " + ec.message() + '.');
         self->receive();
     });
 }
@@ -133,7 +144,9 @@ void Peer::shakeHands() {
 void Peer::receive() {
     if (state_ == State::Greeting)
         link_->limitText(MAX_GREETING);
-    link_->receive([self = shared_from_this()](Received const& received) { self->onReceived(received); });
+    link_->receive([self = shared_from_this()](Received const& received) {
+        self->orGiveUp([&] { self->onReceived(received); });
+    });
 }
 
 void Peer::onReceived(Received const& received) {
@@ -151,8 +164,7 @@ void Peer::onReceived(Received const& received) {
         log(TRACE, received.reason);
         return close();
     case Received::What::Broken:
-        log(FAILED, received.reason);
-        return close();
+        return giveUp(received.reason);
     }
 }
 
@@ -191,26 +203,26 @@ void Peer::onMessage(Frame const& message) {
 // --- the greeting
 
 void Peer::onGreeting(Frame const& message) {
-    try {
-        if (!greeting_)
-            greeting_.emplace(
-                GreetingTerms{context_->settings().token, context_->fingerprint(), makeNonce()});
-    } catch (Base::Error const& e) {
-        return refuse(e.what());
+    if (!greeting_) {
+        link_->speak(link_->heardVersion());
+        greeting_.emplace(terms(), makeNonce());
     }
     GreetingStep const step = greeting_->take(message);
     switch (step.verdict) {
     case GreetingStep::Verdict::GoesOn:
         return write(step.reply->frame(), [this] { receive(); });
     case GreetingStep::Verdict::Welcome:
-        return write(step.reply->frame(), [this] { onWelcome(); });
+        context_->know(shared_from_this());
+        return write(step.reply->frame(), [this, seals = step.seals] { onWelcome(seals); });
     case GreetingStep::Verdict::Refused:
         return refuse(step.reason);
     }
 }
 
-void Peer::onWelcome() {
+void Peer::onWelcome(std::optional<SealKeys> const& seals) {
     greeting_.reset();
+    if (seals)
+        link_->seal(seals->service, seals->client);
     state_ = State::Ready;
     deadline_->clear();
     link_->limitText(MAX_TEXT);
@@ -315,23 +327,29 @@ void Peer::endRequest() {
 // --- writing
 
 void Peer::write(Frame const& message, std::function<void()> gone) {
-    std::string bytes = prefaceSent_ ? std::string() : preface();
-    appendFrame(bytes, message);
-    prefaceSent_ = true;
     // Greeting and leaving have a time as a whole.
     if (state_ == State::Ready)
         setDeadline(context_->settings().messageTime, "It does not take its answer.");
-    link_->send(std::move(bytes), [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
+    link_->send(message, [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
-        if (ec) {
-            self->log(FAILED, ec.message() + '.');
-            return self->close();
-        }
+        self->context_->holdAnswer(self, 0);
+        if (ec)
+            return self->giveUp(ec.message() + '.');
         if (self->state_ == State::Ready)
             self->deadline_->clear();
-        gone();
+        self->orGiveUp(gone);
     });
+    context_->holdAnswer(shared_from_this(), link_->sending());
+}
+
+template<typename Step>
+void Peer::orGiveUp(Step step) {
+    try {
+        step();
+    } catch (std::exception const& e) {
+        giveUp(e.what());
+    }
 }
 
 // --- the end
@@ -362,6 +380,7 @@ void Peer::close() {
         link_->close();
     link_.reset();
     context_->release(std::exchange(reserved_, 0));
+    context_->holdAnswer(self, 0);
     context_->leave(self);
 }
 
@@ -370,8 +389,16 @@ void Peer::setDeadline(std::chrono::milliseconds time, std::string reason) {
     deadline_->set(time);
 }
 
-void Peer::onDue() {
-    log(FAILED, dueReason_);
+void Peer::onDue() { giveUp(dueReason_); }
+
+void Peer::makeWay() {
+    // No failure: a flood of strangers is not to become one of lines.
+    log(TRACE, "It makes way for others before it has proved itself.");
+    close();
+}
+
+void Peer::giveUp(std::string const& reason) {
+    log(FAILED, reason);
     close();
 }
 

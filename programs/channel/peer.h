@@ -30,6 +30,10 @@ public:
     /// Takes memory for a large request and calls the peer's onReserved, now or as soon as there is some.
     virtual void reserve(std::size_t size, std::shared_ptr<Peer> peer) = 0;
     virtual void release(std::size_t size) = 0;
+    /// Counts an answer that is on its way, of a size or of none any more.
+    virtual void holdAnswer(std::shared_ptr<Peer> const& peer, std::size_t size) = 0;
+    /// The peer has proved itself.
+    virtual void know(std::shared_ptr<Peer> const& peer) = 0;
     virtual void leave(std::shared_ptr<Peer> const& peer) = 0;
 };
 
@@ -46,6 +50,10 @@ public:
     /// Closes at once, or when the command that is being handled has been answered.
     void stop();
     void close();
+    /// Closes for the sake of others before it has proved itself.
+    void makeWay();
+    /// Closes, with a line in the log.
+    void giveUp(std::string const& reason);
     /// The handling has ended, with the reason when it failed.
     void answered(std::optional<std::string> const& failure);
 
@@ -79,11 +87,15 @@ private:
     void onLarge();
     void onMessage(Frame const& message);
     void onGreeting(Frame const& message);
-    void onWelcome();
+    void onWelcome(std::optional<SealKeys> const& seals);
+    Terms terms() const;
     void onRequest(Frame const& message);
     void takeRequest(std::uint8_t command);
 
     void write(Frame const& message, std::function<void()> gone);
+    /// Runs a step; what it throws is the end of the connection.
+    template<typename Step>
+    void orGiveUp(Step step);
     void setDeadline(std::chrono::milliseconds time, std::string reason);
     void refuseRequest(std::string const& reason);
     void tellGone(std::function<void()> const& gone) const;
@@ -105,7 +117,7 @@ private:
     std::string dueReason_;
     bool isInsideMessage_ = false;
     std::optional<ServiceGreeting> greeting_;
-    bool prefaceSent_ = false;
+    Ends ends_;
     std::optional<Request> request_;
     std::size_t reserved_ = 0;
 };

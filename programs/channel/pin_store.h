@@ -7,8 +7,8 @@
 
 namespace Channel {
 
-/// A private text file with one line a service: its host and port, a blank, the fingerprint. Read anew for
-/// each question, so that a line may be removed by hand.
+/// A private text file with one line a service: its host and port, a blank, the fingerprint; a line without a
+/// whole fingerprint counts for nothing. Read anew for each question, so that a line may be removed by hand.
 class PinStore {
 public:
     /// The file need not exist yet.

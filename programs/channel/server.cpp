@@ -6,12 +6,14 @@
 
 #include "vlservice/platform/log.h"
 
+#include <boost/asio/error.hpp>
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/steady_timer.hpp>
 
 #include <sys/resource.h>
 
 #include <deque>
+#include <list>
 #include <sstream>
 #include <unordered_set>
 
@@ -89,13 +91,15 @@ public:
     void accept() {
         if (isStopping_ || isAccepting_)
             return;
-        if (peers_.size() >= settings_.maxConnections)
+        if (known() >= settings_.maxConnections)
             return;
         isAccepting_ = true;
         acceptor_->async_accept([self = shared_from_this()](error_code const& ec, tcp::socket socket) {
             self->isAccepting_ = false;
             if (self->isStopping_)
                 return;
+            if (ec == asio::error::operation_aborted)
+                return self->accept();
             if (ec)
                 return self->onAcceptFailed(ec);
             self->welcome(std::move(socket));
@@ -135,7 +139,22 @@ public:
         grantMemory();
     }
 
+    void holdAnswer(std::shared_ptr<Peer> const& peer, std::size_t size) override {
+        std::erase_if(answers_, [&](HeldAnswer const& held) { return held.peer == peer.get(); });
+        if (size > Link::SMALL)
+            answers_.push_back({peer.get(), size});
+        dropAnswers();
+    }
+
+    void know(std::shared_ptr<Peer> const& peer) override {
+        strangers_.remove(peer.get());
+        // One more may be on its way in; the next ones wait.
+        if (known() >= settings_.maxConnections && acceptor_)
+            acceptor_->cancel();
+    }
+
     void leave(std::shared_ptr<Peer> const& peer) override {
+        strangers_.remove(peer.get());
         peers_.erase(peer);
         accept();
     }
@@ -145,6 +164,27 @@ private:
         std::size_t size;
         std::weak_ptr<Peer> peer;
     };
+
+    struct HeldAnswer {
+        Peer* peer;
+        std::size_t size;
+    };
+
+    std::size_t known() const { return peers_.size() - strangers_.size(); }
+
+    /// The newest one stays: it has just begun.
+    void dropAnswers() {
+        std::size_t held = 0;
+        for (HeldAnswer const& answer : answers_)
+            held += answer.size;
+        if (answers_.size() > 1 && held > settings_.answerMemory)
+            answers_.front().peer->giveUp("Its answer made way for those of others.");
+    }
+
+    void dropStrangers() {
+        while (strangers_.size() > settings_.maxStrangers)
+            strangers_.front()->makeWay();
+    }
 
     /// In the order of asking. A request that is larger than all the memory gets it alone.
     void grantMemory() {
@@ -167,6 +207,8 @@ private:
         socket.set_option(asio::socket_base::keep_alive(true), ignored);
         auto const peer = Peer::make(io_, shared_from_this(), std::move(socket));
         peers_.insert(peer);
+        strangers_.push_back(peer.get());
+        dropStrangers();
         peer->start();
     }
 
@@ -192,6 +234,10 @@ private:
     std::optional<tcp::acceptor> acceptor_;
     std::optional<asio::steady_timer> retryTimer_;
     std::unordered_set<std::shared_ptr<Peer>> peers_;
+    /// Of the peers, those that have not proved themselves; the oldest first.
+    std::list<Peer*> strangers_;
+    /// Of the peers, those with a large answer on its way; the oldest first.
+    std::deque<HeldAnswer> answers_;
     std::size_t reserved_ = 0;
     std::deque<Waiting> waiting_;
     bool isAccepting_ = false;

@@ -21,14 +21,19 @@ struct ServerSettings {
     std::string certificateFile;
     std::string keyFile;
 
-    /// More wait until one of these has left.
+    /// Of clients that have proved themselves; more wait until one of these has left.
     std::size_t maxConnections = 2000;
+    /// Of strangers; when there are more, the one that has been here for the longest goes.
+    std::size_t maxStrangers = 256;
     /// For TLS and the exchange of proofs.
     std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
     /// For the rest of a message whose first byte is there, and for a peer to take an answer.
     std::chrono::milliseconds messageTime = std::chrono::seconds(60);
     /// For all large requests at once; further ones wait.
     std::size_t requestMemory = 64 * 1024 * 1024;
+    /// For all answers that their clients have not taken yet; when there are more, the oldest goes with its
+    /// connection.
+    std::size_t answerMemory = 64 * 1024 * 1024;
 };
 
 } // namespace Channel

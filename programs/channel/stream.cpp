@@ -9,6 +9,7 @@
 #include <boost/asio/write.hpp>
 
 #include <openssl/evp.h>
+#include <openssl/sha.h>
 #include <openssl/ssl.h>
 #include <openssl/x509.h>
 
@@ -16,6 +17,7 @@
 
 #include <array>
 #include <cerrno>
+#include <sstream>
 
 namespace Channel {
 
@@ -28,8 +30,10 @@ namespace {
 std::string fingerprintOf(X509 const* certificate) {
     std::array<unsigned char, EVP_MAX_MD_SIZE> digest;
     unsigned int length = 0;
-    if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1)
-        return {};
+    // Short of memory, the library may give the digest of another function and call that a success.
+    if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1 ||
+        length != SHA256_DIGEST_LENGTH)
+        throw Base::Error("The fingerprint of the certificate cannot be computed.");
     constexpr char const* DIGITS = "0123456789ABCDEF";
     std::string text;
     for (unsigned int i = 0; i < length; ++i) {
@@ -39,6 +43,18 @@ std::string fingerprintOf(X509 const* certificate) {
         text += DIGITS[digest[i] & 15];
     }
     return text;
+}
+
+asio::ip::address unmapped(asio::ip::address const& address) {
+    if (address.is_v6() && address.to_v6().is_v4_mapped())
+        return asio::ip::make_address_v4(asio::ip::v4_mapped, address.to_v6());
+    return address;
+}
+
+std::string textOf(tcp::endpoint const& end) {
+    std::ostringstream text;
+    text << tcp::endpoint(unmapped(end.address()), end.port());
+    return std::move(text).str();
 }
 
 class PlainStream : public Stream {
@@ -92,7 +108,8 @@ private:
 
 std::unique_ptr<ssl::context> makeContext(ssl::context::method method) {
     auto context = std::make_unique<ssl::context>(method);
-    SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_3_VERSION);
+    if (SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_3_VERSION) != 1)
+        throw Base::Error("TLS 1.3 is not to be had.");
     return context;
 }
 
@@ -139,10 +156,10 @@ std::unique_ptr<ssl::context> makeClientContext() {
     return context;
 }
 
-bool isLoopback(asio::ip::address const& address) {
-    if (address.is_v6() && address.to_v6().is_v4_mapped())
-        return asio::ip::make_address_v4(asio::ip::v4_mapped, address.to_v6()).is_loopback();
-    return address.is_loopback();
+bool isLoopback(asio::ip::address const& address) { return unmapped(address).is_loopback(); }
+
+Ends endsOf(tcp::socket const& socket) {
+    return {textOf(socket.local_endpoint()), textOf(socket.remote_endpoint())};
 }
 
 } // namespace Channel

@@ -31,7 +31,8 @@ public:
     virtual void handshake(Done done) = 0;
     virtual void readSome(std::span<char> room, Moved done) = 0;
     virtual void writeAll(std::string_view bytes, Done done) = 0;
-    /// Of the other side's certificate; empty without TLS.
+    /// Of the other side's certificate; empty without TLS. Throws Error when there is none or it cannot be
+    /// computed.
     virtual std::string fingerprint() = 0;
     virtual tcp::socket& socket() = 0;
 };
@@ -44,10 +45,17 @@ std::unique_ptr<Stream> makeTlsStream(tcp::socket socket, boost::asio::ssl::cont
 /// The context of a service that shows this certificate. Throws Error.
 std::unique_ptr<boost::asio::ssl::context> makeServiceContext(std::string const& certificateFile,
                                                               std::string const& keyFile);
-/// The fingerprint of the certificate that a context shows.
+/// The fingerprint of the certificate that a context shows. Throws Error.
 std::string fingerprintOf(boost::asio::ssl::context& context);
 /// The context of a client. It accepts any certificate: whose it is, is told by the fingerprint.
 std::unique_ptr<boost::asio::ssl::context> makeClientContext();
+
+/// The two ends of a connected socket as HOST:PORT, the same for both sides. Throws boost's system_error.
+struct Ends {
+    std::string own;
+    std::string other;
+};
+Ends endsOf(tcp::socket const& socket);
 
 /// Also for IPv4 addresses in the form of IPv6.
 bool isLoopback(boost::asio::ip::address const& address);

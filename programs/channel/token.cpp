@@ -4,15 +4,13 @@
 #include "programs/base/hex.h"
 #include "programs/base/private_file.h"
 
-#include <openssl/crypto.h>
-#include <openssl/evp.h>
-#include <openssl/hmac.h>
 #include <openssl/rand.h>
 
 #include <unistd.h>
 
 #include <algorithm>
 #include <array>
+#include <string_view>
 
 namespace Channel {
 namespace {
@@ -55,22 +53,5 @@ std::string readOrCreateToken(std::string const& file) {
 }
 
 std::string makeNonce() { return randomHex(); }
-
-std::string makeProof(Side side, std::string_view token, std::string_view clientNonce,
-                      std::string_view serviceNonce, std::string_view fingerprint) {
-    // Each part is ended by a byte that none of them holds.
-    std::string message(side == Side::Client ? "client" : "service");
-    for (std::string_view const part : {clientNonce, serviceNonce, fingerprint})
-        message.append(1, '\0').append(part);
-    std::array<unsigned char, EVP_MAX_MD_SIZE> code;
-    unsigned int length = 0;
-    HMAC(EVP_sha256(), token.data(), static_cast<int>(token.size()),
-         reinterpret_cast<unsigned char const*>(message.data()), message.size(), code.data(), &length);
-    return Base::toHex(code.data(), length);
-}
-
-bool isSameProof(std::string_view a, std::string_view b) {
-    return a.size() == b.size() && CRYPTO_memcmp(a.data(), b.data(), a.size()) == 0;
-}
 
 } // namespace Channel

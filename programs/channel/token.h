@@ -4,7 +4,6 @@
 
 #include <cstddef>
 #include <string>
-#include <string_view>
 
 namespace Channel {
 
@@ -18,14 +17,5 @@ std::string readOrCreateToken(std::string const& file);
 
 /// Fresh random bits for one greeting, as hexadecimal digits.
 std::string makeNonce();
-
-enum class Side { Client, Service };
-
-/// The proof of one side for one greeting. The fingerprint is that of the certificate as this side sees it,
-/// so that nobody can pass a proof on over a certificate of his own; it is empty without TLS.
-std::string makeProof(Side side, std::string_view token, std::string_view clientNonce,
-                      std::string_view serviceNonce, std::string_view fingerprint);
-/// Takes the same time wherever the two differ.
-bool isSameProof(std::string_view a, std::string_view b);
 
 } // namespace Channel

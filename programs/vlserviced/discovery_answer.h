@@ -1,41 +1,66 @@
 #pragma once
 // Answers clients that look for the service.
 
+#include "programs/vlserviced/network_changes.h"
 #include "vlservice/ipc/discovery_base.h"
 
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/steady_timer.hpp>
 
 #include <cstdint>
+#include <deque>
+#include <memory>
+#include <optional>
 #include <string>
 
 namespace VlServiced {
 
-/// Answers requests of both IP versions with host and port. An answer goes to the whole group, so one serves
-/// all who asked in the meantime, and a flood of requests does not become a flood of answers.
+/// Answers requests of both IP versions with host and port, and with a proof of the token where the request
+/// has a nonce. Answers go to the whole group, one without a proof serves all who asked in the meantime, and
+/// a flood of requests does not become a flood of answers.
 class DiscoveryAnswer {
 public:
-    /// Listens from now on, as far as the host has IPv6 and IPv4. The io_context is run by one thread.
-    DiscoveryAnswer(boost::asio::io_context& io, std::string const& host, std::uint16_t port);
+    /// Listens from now on, as far as the host has IPv6 and IPv4, and anew whenever the network has changed.
+    /// The io_context is run by one thread.
+    DiscoveryAnswer(boost::asio::io_context& io, std::string const& host, std::uint16_t port,
+                    std::string const& token);
 
 private:
+    struct Service {
+        std::string host;
+        std::uint16_t port;
+        std::string token;
+    };
+
     class Group {
     public:
-        Group(boost::asio::io_context& io, bool ipv4, json::Object answer);
+        Group(boost::asio::io_context& io, bool ipv4, Service const& service);
+
+        /// Joins on the interfaces as they are now.
+        void listen();
 
     private:
         void onDatagram(json::Object const& datagram);
         void answer();
+        void pause();
 
-        Ipc::DiscoveryBase base_;
+        boost::asio::io_context& io_;
+        bool ipv4_;
+        Service const& service_;
+        std::optional<Ipc::DiscoveryBase> base_;
         boost::asio::steady_timer pause_;
-        json::Object answer_;
         bool pausing_ = false;
         bool askedAgain_ = false;
+        /// Of the requests that wait for an answer; the oldest first.
+        std::deque<std::string> nonces_;
+        /// Expires first of all; the timer's handler watches it.
+        std::shared_ptr<void> alive_ = std::make_shared<char>();
     };
 
+    Service service_;
     Group v6_;
     Group v4_;
+    NetworkChanges changes_;
 };
 
 } // namespace VlServiced

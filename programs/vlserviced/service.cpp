@@ -110,7 +110,8 @@ public:
         jobs_.onChange([this](std::string const& packId) { held_.onChange(packId); });
         removeUnfinished(outbox_);
         if (options.answersDiscovery)
-            discovery_.emplace(io_, announcedHost(options), server_->port());
+            discovery_.emplace(io_, announcedHost(options), server_->port(),
+                               Channel::readToken(data_.token().string()));
     }
 
     ~Impl() {

@@ -13,6 +13,7 @@
 #include <gmock/gmock.h>
 
 #include <chrono>
+#include <future>
 
 using namespace testing;
 using namespace ChannelTest;
@@ -24,6 +25,8 @@ using VLServiceTest::messageOf;
 namespace {
 
 constexpr int PRICE = Ipc::PriceEst::CMD_ID;
+constexpr auto NO_KNOWLEDGE = "Whoever answers there does not know our access token, or passes us on.";
+constexpr auto NOT_SEALED = "A message is not sealed by the other side of this connection.";
 
 /// Waits until the client has gone.
 void wait(RawPeer& peer) {
@@ -77,6 +80,45 @@ TEST(Clients, FindAServiceByItsName) {
     EXPECT_TRUE(client.call<Ipc::PriceEst>(json::Object{})->resp().get("asked"));
 }
 
+TEST(Clients, GiveANameServerThatIsSilentUpInTime) {
+    std::promise<void> answer;
+    std::promise<void> answered;
+    Channel::ClientSettings settings;
+    settings.host = "service.example";
+    settings.port = 4711;
+    settings.token = TOKEN;
+    settings.connectTime = 50ms;
+    settings.lookUp = [&, wait = answer.get_future().share()](std::string const&) {
+        wait.wait();
+        answered.set_value();
+        return std::vector<std::string>();
+    };
+    EXPECT_EQ(messageOf<Base::Error>([&] { Client client(settings); }),
+              "service.example:4711: It does not let us in within 0.050 s.");
+    // The client has gone; its thread notices nothing.
+    answer.set_value();
+    answered.get_future().wait();
+}
+
+TEST(Clients, SayWhyAHostIsNotFound) {
+    Channel::ClientSettings settings;
+    settings.host = "service.example";
+    settings.port = 4711;
+    settings.token = TOKEN;
+    settings.lookUp = [](std::string const&) -> std::vector<std::string> {
+        throw Base::Error("The host cannot be found: Not today.");
+    };
+    EXPECT_EQ(messageOf<Base::Error>([&] { Client client(settings); }),
+              "service.example:4711: The host cannot be found: Not today.");
+    settings.lookUp = [](std::string const&) { return std::vector<std::string>(); };
+    EXPECT_THAT(messageOf<Base::Error>([&] { Client client(settings); }),
+                StartsWith("service.example:4711: Nobody answers there: "));
+    settings.lookUp = &Channel::lookUpHost;
+    settings.host = "no..name";
+    EXPECT_THAT(messageOf<Base::Error>([&] { Client client(settings); }),
+                StartsWith("no..name:4711: The host cannot be found: "));
+}
+
 TEST_F(BrokenServices, ThatAreSilentAreLeftInTime) {
     FakeService service([](RawPeer& peer) { wait(peer); });
     EXPECT_EQ(connectError(service, 50ms), "It does not let us in within 0.050 s.");
@@ -110,7 +152,7 @@ TEST_F(BrokenServices, ThatDoNotKnowTheTokenGetNoProof) {
         peer.send(Channel::preface() + bytesOf(0, Kind::Response, 0, R"({"nonce":"n","proof":"p"})"));
         EXPECT_TRUE(peer.isClosed());
     });
-    EXPECT_EQ(connectError(service), "Whoever answers there does not know our access token.");
+    EXPECT_EQ(connectError(service), NO_KNOWLEDGE);
 }
 
 TEST_F(BrokenServices, ThatGreetInAnotherWayAreLeft) {
@@ -131,7 +173,84 @@ TEST(Clients, WithAnotherTokenKnowThatItIsNotTheServices) {
     auto settings = server.clientSettings();
     settings.token = TOKEN + "x";
     EXPECT_THAT(messageOf<Base::Error>([&] { Client client(settings); }),
-                EndsWith(": Whoever answers there does not know our access token."));
+                EndsWith(std::string(": ") + NO_KNOWLEDGE));
+}
+
+// --- services of the first version
+
+void refuseVersion(RawPeer& peer) {
+    peer.receive();
+    peer.send(Channel::preface(Channel::VERSION_1) +
+              bytesOf(0, Kind::Error, 0,
+                      R"({"err":"Version 2 of the protocol is not spoken here, only version 1."})"));
+    peer.finish();
+    wait(peer);
+}
+
+TEST_F(BrokenServices, OfTheFirstVersionAreLeft) {
+    FakeService service(refuseVersion);
+    EXPECT_EQ(
+        connectError(service),
+        "It speaks version 1 of the connection alone, in which others on the way can speak for us; bring "
+        "it up to date, or add --allow-channel-1 to go on with it.");
+}
+
+TEST_F(BrokenServices, OfTheFirstVersionAreSpokenToWhereThatIsAllowed) {
+    int connection = 0;
+    FakeService service(
+        [&](RawPeer& peer) {
+            if (connection++ == 0)
+                return refuseVersion(peer);
+            peer.welcome(Channel::VERSION_1);
+            peer.receive();
+            peer.send(PRICE, Kind::Response, 2, R"({"cents":3})");
+            wait(peer);
+        },
+        2);
+    auto settings = service.clientSettings();
+    settings.allowsVersion1 = true;
+    Client client(settings);
+    EXPECT_EQ(client.call<Ipc::PriceEst>(json::Object{})->resp().get("cents").intOrZero(), 3);
+}
+
+TEST_F(BrokenServices, ThatAnswerInTheFirstVersionWithoutARefusalAreLeft) {
+    FakeService service([](RawPeer& peer) {
+        peer.receive();
+        peer.send(Channel::preface(Channel::VERSION_1) + bytesOf(0, Kind::Response, 0, "{}"));
+        wait(peer);
+    });
+    auto settings = service.clientSettings();
+    settings.allowsVersion1 = true;
+    EXPECT_EQ(withoutName(service, messageOf<Base::Error>([&] { Client client(settings); })),
+              "It does not greet.");
+}
+
+// --- strangers in between
+
+TEST_F(BrokenServices, ThatPassWhatIsSaidToTheRealOneLearnNothing) {
+    RunningServer real;
+    FakeService service([&](RawPeer& peer) {
+        RawPeer passedOn(real.port());
+        passedOn.send(Channel::preface());
+        ChannelTest::Message const challenge = peer.receive().value();
+        passedOn.send(challenge.command, challenge.kind, challenge.sequence, challenge.text);
+        ChannelTest::Message const answer = passedOn.receive().value();
+        peer.send(Channel::preface() + bytesOf(answer.command, answer.kind, answer.sequence, answer.text));
+        EXPECT_TRUE(peer.isClosed());
+    });
+    EXPECT_EQ(connectError(service), NO_KNOWLEDGE);
+}
+
+TEST_F(BrokenServices, WhoseAnswersHaveNoSealAreLeft) {
+    FakeService service([](RawPeer& peer) {
+        peer.welcome();
+        peer.receive();
+        peer.send(bytesOf(PRICE, Kind::Response, 2, R"({"cents":3})") + std::string(32, 's'));
+        wait(peer);
+    });
+    Client client(service.clientSettings());
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
+              service.name() + ": " + NOT_SEALED);
 }
 
 // --- requests
@@ -181,7 +300,8 @@ TEST_P(FatalAnswers, FailTheRequestAndWhatFollows) {
     FakeService service([](RawPeer& peer) {
         peer.welcome();
         peer.receive();
-        peer.send(GetParam().answer);
+        if (!GetParam().answer.empty())
+            peer.sendSealed(GetParam().answer);
         peer.finish();
         wait(peer);
     });
@@ -209,11 +329,11 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(BrokenServices, ThatBreakOffAnywhereInAnAnswerAreTold) {
     std::string const answer = bytesOf(PRICE, Kind::Response, 2, R"({"cents":3})");
-    for (std::size_t length = 1; length < answer.size(); ++length) {
+    for (std::size_t length = 1; length < answer.size() + Channel::Seal::SIZE; ++length) {
         FakeService service([&](RawPeer& peer) {
             peer.welcome();
             peer.receive();
-            peer.send(answer.substr(0, length));
+            peer.send(peer.sealed(answer).substr(0, length));
         });
         Client client(service.clientSettings());
         EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
@@ -256,10 +376,23 @@ TEST_P(HarmlessAnswers, LeaveTheConnectionInUse) {
     EXPECT_EQ(client.call<Ipc::PriceEst>(json::Object{})->resp().get("cents").intOrZero(), 3);
 }
 
+/// The longest text that a message can have, all of it empty objects.
+std::string manyObjects() {
+    std::string text = R"({"a":[{})";
+    while (text.size() < Channel::MAX_TEXT - 4)
+        text += ",{}";
+    text.resize(Channel::MAX_TEXT - 2, ' ');
+    return text + "]}";
+}
+
 INSTANTIATE_TEST_SUITE_P(
     Answers, HarmlessAnswers,
     Values(Harmless{"Error", Kind::Error, R"({"err":"No."})", "The service refuses: No."},
            Harmless{"ErrorWithoutAReason", Kind::Error, "{}", "The service refuses: It gave no reason."},
+           Harmless{
+               "TooManyValues", Kind::Response, manyObjects(),
+               "The answer cannot be used: The values of a message of 16777216 bytes would take more than "
+               "256 MiB of memory."},
            Harmless{"NoJson", Kind::Response, "x",
                     "The answer cannot be used: JSON error: '[' or '{' expected near 'x' (line 1, column 1)"},
            Harmless{"BodyThatTheCommandRefuses", Kind::Response, "{}",

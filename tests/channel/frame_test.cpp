@@ -64,7 +64,13 @@ std::string refusalOf(std::string_view bytes) {
 
 // --- writing
 
-TEST(Frames, BeginWithMagicAndVersion) { EXPECT_EQ(Channel::preface(), "VLCH\0\1"s); }
+TEST(Frames, BeginWithMagicAndVersion) {
+    EXPECT_EQ(Channel::preface(), "VLCH\0\2"s);
+    EXPECT_EQ(Channel::preface(1), "VLCH\0\1"s);
+    EXPECT_EQ(Channel::versionIn("VLCH\1\2"s), 0x102);
+    EXPECT_EQ(Channel::versionIn("VLCH\1"s), std::nullopt);
+    EXPECT_EQ(Channel::versionIn("VLCX\0\2"s), std::nullopt);
+}
 
 TEST(Frames, AreAHeaderInNetworkOrderAndTheText) {
     std::string bytes;
@@ -182,10 +188,12 @@ INSTANTIATE_TEST_SUITE_P(
            Refused{"LastByteOfTheMagic", "VLCX", OTHER_PROTOCOL},
            Refused{"AWebBrowser", "GET / HTTP/1.1\r\n\r\n", OTHER_PROTOCOL},
            Refused{"ATlsClient", "\x16\x03\x01\x02\x00"s, OTHER_PROTOCOL},
-           Refused{"TheNextVersion", "VLCH\0\2"s,
-                   "Version 2 of the protocol is not spoken here, only version 1."},
+           Refused{"TheNextVersion", "VLCH\0\3"s,
+                   "Version 3 of the protocol is not spoken here, only the versions 1 and 2."},
+           Refused{"VersionZero", "VLCH\0\0"s,
+                   "Version 0 of the protocol is not spoken here, only the versions 1 and 2."},
            Refused{"VersionInTheOtherOrder", "VLCH\1\0"s,
-                   "Version 256 of the protocol is not spoken here, only version 1."},
+                   "Version 256 of the protocol is not spoken here, only the versions 1 and 2."},
            Refused{"KindZero", "VLCH\0\1\x19\0\0\0\0\2\0\0\0\0"s, "There is no message of kind 0."},
            Refused{"KindFour", "VLCH\0\1\x19\4\0\0\0\2\0\0\0\0"s, "There is no message of kind 4."},
            Refused{"OneByteOverTheLimit", "VLCH\0\1\x19\1\0\0\0\2\1\0\0\1"s,
@@ -201,6 +209,81 @@ TEST(Frames, KeepToALowerLimit) {
     EXPECT_THROW(decoder.next(), Base::Error);
 }
 
+// --- sealed
+
+std::string const KEY(32, 'k');
+
+std::string sealed(std::vector<Owned> const& messages) {
+    Channel::Seal seal(KEY);
+    std::string bytes = Channel::preface();
+    for (Owned const& m : messages) {
+        std::string message;
+        Channel::appendFrame(message, {static_cast<std::uint8_t>(m.command), m.kind, m.sequence, m.text});
+        bytes += message + seal.next(message);
+    }
+    return bytes;
+}
+
+struct Read {
+    std::vector<Owned> messages;
+    std::string refusal;
+};
+
+Read readSealed(std::string const& bytes) {
+    FrameDecoder decoder;
+    decoder.expectSeals(KEY);
+    Read read;
+    try {
+        feed(decoder, bytes);
+        while (auto const frame = decoder.next())
+            read.messages.push_back({frame->command, frame->kind, frame->sequence, std::string(frame->text)});
+    } catch (Base::Error const& e) {
+        read.refusal = e.what();
+    }
+    return read;
+}
+
+constexpr auto NOT_SEALED = "A message is not sealed by the other side of this connection.";
+
+TEST(SealedFrames, ReadBackAsTheyWereWritten) {
+    Read const read = readSealed(sealed(THREE));
+    EXPECT_EQ(read.refusal, "");
+    EXPECT_EQ(read.messages, THREE);
+}
+
+TEST(SealedFrames, AreRefusedWhenAnyBitHasChanged) {
+    std::string const good = sealed({{25, Kind::Request, 2, "{}"}});
+    for (std::size_t bit = 8 * Channel::PREFACE_SIZE; bit < 8 * good.size(); ++bit) {
+        std::string bad = good;
+        bad[bit / 8] = static_cast<char>(bad[bit / 8] ^ 1 << bit % 8);
+        // A message that has become longer is never there as a whole.
+        EXPECT_THAT(readSealed(bad).messages, IsEmpty()) << bit;
+    }
+}
+
+TEST(SealedFrames, AreRefusedWhenOneIsLeftOutRepeatedOrMoved) {
+    Owned const first{24, Kind::Request, 2, "{}"};
+    Owned const second{24, Kind::Request, 3, "{}"};
+    std::string const both = sealed({first, second});
+    std::size_t const size = (both.size() - Channel::PREFACE_SIZE) / 2;
+    std::string const a = both.substr(Channel::PREFACE_SIZE, size);
+    std::string const b = both.substr(Channel::PREFACE_SIZE + size);
+    for (std::string const& bytes : {b, b + a, a + a}) {
+        Read const read = readSealed(Channel::preface() + bytes);
+        EXPECT_EQ(read.refusal, NOT_SEALED);
+        EXPECT_LE(read.messages.size(), 1u);
+    }
+}
+
+TEST(SealedFrames, CountTheirSealAsPartOfTheirSize) {
+    FrameDecoder decoder;
+    decoder.expectSeals(KEY);
+    feed(decoder,
+         sealed({{1, Kind::Request, 1, "{}"}}).substr(0, Channel::PREFACE_SIZE + Channel::HEADER_SIZE));
+    EXPECT_EQ(decoder.next(), std::nullopt);
+    EXPECT_EQ(decoder.announced(), Channel::HEADER_SIZE + 2 + 32);
+}
+
 // --- the description
 
 std::string block(std::string const& name) {
@@ -210,6 +293,12 @@ std::string block(std::string const& name) {
 TEST(FrameDescription, ShowsARequestBehindThePreface) {
     EXPECT_EQ(block("request"), VLServiceTest::hexDump(bytesOf(
                                     {{20, Kind::Request, 2, R"({"db_host":"db","db_name":"packs"})"}})));
+}
+
+TEST(FrameDescription, ShowsASealedResponse) {
+    std::string response;
+    Channel::appendFrame(response, {20, Kind::Response, 2, "{}"});
+    EXPECT_EQ(block("sealed"), VLServiceTest::hexDump(response + Channel::Seal(KEY).next(response)));
 }
 
 TEST(FrameDescription, ShowsItsAnswers) {

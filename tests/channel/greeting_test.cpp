@@ -2,7 +2,6 @@
 
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
-#include "programs/channel/token.h"
 
 #include <gmock/gmock.h>
 
@@ -19,51 +18,88 @@ std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 std::string const CLIENT_NONCE(64, '0');
 std::string const SERVICE_NONCE(64, 'f');
 
-GreetingTerms clientTerms(std::string const& token = TOKEN, std::string const& fingerprint = "AA") {
-    return {token, fingerprint, CLIENT_NONCE};
+/// As both sides of a connection without TLS see it.
+Terms plainTerms(std::uint16_t version = VERSION) {
+    return {version, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"};
 }
-GreetingTerms serviceTerms(std::string const& token = TOKEN, std::string const& fingerprint = "AA") {
-    return {token, fingerprint, SERVICE_NONCE};
-}
+Terms tlsTerms(std::uint16_t version = VERSION) { return {version, TOKEN, "AA", "", ""}; }
+
+ClientGreeting makeClient(Terms const& terms = plainTerms()) { return {terms, CLIENT_NONCE}; }
+ServiceGreeting makeService(Terms const& terms = plainTerms()) { return {terms, SERVICE_NONCE}; }
 
 /// What both sides think in the end, when each gets what the other one says.
 struct Outcome {
-    Verdict client = Verdict::GoesOn;
-    Verdict service = Verdict::GoesOn;
-    std::string reason;
-    friend bool operator==(Outcome const&, Outcome const&) = default;
+    GreetingStep client;
+    GreetingStep service;
 };
 
-Outcome greet(GreetingTerms const& ofClient, GreetingTerms const& ofService) {
-    ClientGreeting client(ofClient);
-    ServiceGreeting service(ofService);
-    Outcome outcome;
+Outcome greet(Terms const& ofClient, Terms const& ofService) {
+    ClientGreeting client = makeClient(ofClient);
+    ServiceGreeting service = makeService(ofService);
+    Outcome outcome{};
     std::optional<GreetingStep::Reply> said = client.challenge();
     while (said) {
-        GreetingStep const answer = service.take(said->frame());
-        outcome.service = answer.verdict;
-        if (answer.verdict == Verdict::Refused) {
-            outcome.reason = answer.reason;
-            return outcome;
-        }
-        GreetingStep const next = client.take(answer.reply->frame());
-        outcome.client = next.verdict;
-        outcome.reason = next.reason;
-        said = next.reply;
+        outcome.service = service.take(said->frame());
+        if (!outcome.service.reply)
+            break;
+        outcome.client = client.take(outcome.service.reply->frame());
+        said = outcome.client.reply;
     }
     return outcome;
 }
 
 TEST(Greetings, WelcomeWhoKnowsTheToken) {
-    EXPECT_EQ(greet(clientTerms(), serviceTerms()), (Outcome{Verdict::Welcome, Verdict::Welcome, ""}));
+    for (std::uint16_t const version : {VERSION_1, VERSION})
+        for (Terms const& terms : {plainTerms(version), tlsTerms(version)}) {
+            Outcome const outcome = greet(terms, terms);
+            EXPECT_EQ(outcome.client.verdict, Verdict::Welcome);
+            EXPECT_EQ(outcome.service.verdict, Verdict::Welcome);
+        }
+}
+
+TEST(Greetings, GiveBothSidesTheSameSealsInVersion2WithoutTls) {
+    Outcome const outcome = greet(plainTerms(), plainTerms());
+    ASSERT_TRUE(outcome.client.seals && outcome.service.seals);
+    EXPECT_EQ(outcome.client.seals->client, outcome.service.seals->client);
+    EXPECT_EQ(outcome.client.seals->service, outcome.service.seals->service);
+    EXPECT_NE(outcome.client.seals->client, outcome.client.seals->service);
+    for (Terms const& terms : {plainTerms(VERSION_1), tlsTerms(VERSION_1), tlsTerms()})
+        EXPECT_FALSE(greet(terms, terms).service.seals);
+}
+
+/// That the client refuses the service, which learns nothing.
+void expectNoProof(Terms const& ofClient, Terms const& ofService, std::string const& reason) {
+    Outcome const outcome = greet(ofClient, ofService);
+    EXPECT_EQ(outcome.client.verdict, Verdict::Refused);
+    EXPECT_EQ(outcome.client.reason, reason);
+    EXPECT_EQ(outcome.service.verdict, Verdict::GoesOn);
 }
 
 TEST(Greetings, EndAtTheClientWhenTokenOrCertificateDiffer) {
-    Outcome const refused{Verdict::Refused, Verdict::GoesOn,
-                          "Whoever answers there does not know our access token."};
-    EXPECT_EQ(greet(clientTerms(TOKEN + "x"), serviceTerms()), refused);
-    EXPECT_EQ(greet(clientTerms(TOKEN, "BB"), serviceTerms()), refused);
-    EXPECT_EQ(greet(clientTerms(TOKEN, ""), serviceTerms()), refused);
+    std::string const reason = "Whoever answers there does not know our access token.";
+    Terms other = tlsTerms();
+    other.token += 'x';
+    expectNoProof(other, tlsTerms(), reason);
+    other = tlsTerms();
+    other.fingerprint = "BB";
+    expectNoProof(other, tlsTerms(), reason);
+}
+
+constexpr auto NO_KNOWLEDGE = "Whoever answers there does not know our access token, or passes us on.";
+
+TEST(Greetings, EndAtTheClientWhenTheAddressesDifferWithoutTls) {
+    Terms other = plainTerms();
+    other.clientAddress = "127.0.0.1:40001";
+    expectNoProof(plainTerms(), other, NO_KNOWLEDGE);
+    other = plainTerms();
+    other.serviceAddress = "127.0.0.1:4712";
+    expectNoProof(plainTerms(), other, NO_KNOWLEDGE);
+}
+
+TEST(Greetings, EndAtTheClientWhenTheVersionsDiffer) {
+    expectNoProof(plainTerms(), plainTerms(VERSION_1), NO_KNOWLEDGE);
+    expectNoProof(plainTerms(VERSION_1), plainTerms(),
+                  "Whoever answers there does not know our access token.");
 }
 
 /// A message and what becomes of it.
@@ -95,7 +131,7 @@ void expectRefused(Side& side, Case const& bad) {
 
 class BadChallenges : public TestWithParam<Case> {};
 TEST_P(BadChallenges, AreRefusedByTheService) {
-    ServiceGreeting service(serviceTerms());
+    ServiceGreeting service = makeService();
     expectRefused(service, GetParam());
 }
 INSTANTIATE_TEST_SUITE_P(Messages, BadChallenges,
@@ -111,8 +147,8 @@ INSTANTIATE_TEST_SUITE_P(Messages, BadChallenges,
 
 class BadProofs : public TestWithParam<Case> {};
 TEST_P(BadProofs, AreRefusedByTheService) {
-    ServiceGreeting service(serviceTerms());
-    ASSERT_EQ(service.take(ClientGreeting(clientTerms()).challenge().frame()).verdict, Verdict::GoesOn);
+    ServiceGreeting service = makeService();
+    ASSERT_EQ(service.take(makeClient().challenge().frame()).verdict, Verdict::GoesOn);
     expectRefused(service, GetParam());
 }
 INSTANTIATE_TEST_SUITE_P(Messages, BadProofs,
@@ -125,16 +161,16 @@ INSTANTIATE_TEST_SUITE_P(Messages, BadProofs,
                          [](auto const& instance) { return instance.param.name; });
 
 TEST(Greetings, AreNotHeldByTheServicesOwnProof) {
-    ServiceGreeting service(serviceTerms());
-    GreetingStep const answer = service.take(ClientGreeting(clientTerms()).challenge().frame());
+    ServiceGreeting service = makeService();
+    GreetingStep const answer = service.take(makeClient().challenge().frame());
     json::Object const proof{{PROOF, parse(answer.reply->text).get(PROOF)}};
     std::string const text = print(proof);
     EXPECT_EQ(service.take({GREETING, Kind::Request, PROVING, text}).reason, OTHER_TOKEN);
 }
 
 TEST(Greetings, AreOverBehindTheWelcome) {
-    ClientGreeting client(clientTerms());
-    ServiceGreeting service(serviceTerms());
+    ClientGreeting client = makeClient();
+    ServiceGreeting service = makeService();
     auto const proof = client.take(service.take(client.challenge().frame()).reply->frame()).reply;
     ASSERT_EQ(service.take(proof->frame()).verdict, Verdict::Welcome);
     EXPECT_EQ(service.take(proof->frame()).reason, "The greeting is over.");
@@ -142,28 +178,27 @@ TEST(Greetings, AreOverBehindTheWelcome) {
 
 class BadAnswers : public TestWithParam<Case> {};
 TEST_P(BadAnswers, AreRefusedByTheClient) {
-    ClientGreeting client(clientTerms());
+    ClientGreeting client = makeClient();
     expectRefused(client, GetParam());
 }
-INSTANTIATE_TEST_SUITE_P(Messages, BadAnswers,
-                         Values(Case{"OtherCommand", 1, Kind::Response, 0, "{}", NO_ANSWER},
-                                Case{"OtherKind", 0, Kind::Request, 0, "{}", NO_ANSWER},
-                                Case{"OtherSequence", 0, Kind::Response, 1, "{}", NO_ANSWER},
-                                Case{"Refusal", 0, Kind::Error, 0, R"({"err":"Not today."})",
-                                     "It refuses: Not today."},
-                                Case{"NoNonce", 0, Kind::Response, 0, R"({"proof":"p"})", NO_TEXT},
-                                Case{"NoProof", 0, Kind::Response, 0, R"({"nonce":"n"})", NO_TEXT},
-                                Case{"EmptyProof", 0, Kind::Response, 0, R"({"nonce":"n","proof":""})",
-                                     "Whoever answers there does not know our access token."}),
-                         [](auto const& instance) { return instance.param.name; });
+INSTANTIATE_TEST_SUITE_P(
+    Messages, BadAnswers,
+    Values(Case{"OtherCommand", 1, Kind::Response, 0, "{}", NO_ANSWER},
+           Case{"OtherKind", 0, Kind::Request, 0, "{}", NO_ANSWER},
+           Case{"OtherSequence", 0, Kind::Response, 1, "{}", NO_ANSWER},
+           Case{"Refusal", 0, Kind::Error, 0, R"({"err":"Not today."})", "It refuses: Not today."},
+           Case{"NoNonce", 0, Kind::Response, 0, R"({"proof":"p"})", NO_TEXT},
+           Case{"NoProof", 0, Kind::Response, 0, R"({"nonce":"n"})", NO_TEXT},
+           Case{"EmptyProof", 0, Kind::Response, 0, R"({"nonce":"n","proof":""})", NO_KNOWLEDGE}),
+    [](auto const& instance) { return instance.param.name; });
 
 TEST(Greetings, AreRefusedByTheClientWhenTheWelcomeIsNone) {
     Case const answers[] = {{"", 0, Kind::Response, 0, "{}", NO_ANSWER},
                             {"", 24, Kind::Response, 1, "{}", NO_ANSWER},
                             {"", 0, Kind::Error, 0, R"({"err":"No."})", "It refuses: No."}};
     for (Case const& answer : answers) {
-        ClientGreeting client(clientTerms());
-        ServiceGreeting service(serviceTerms());
+        ClientGreeting client = makeClient();
+        ServiceGreeting service = makeService();
         ASSERT_EQ(client.take(service.take(client.challenge().frame()).reply->frame()).verdict,
                   Verdict::GoesOn);
         expectRefused(client, answer);

@@ -10,6 +10,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <stdexcept>
 #include <thread>
 
 using namespace testing;
@@ -74,7 +75,7 @@ INSTANTIATE_TEST_SUITE_P(
     Values(BadBeginning{"OtherMagic", "GET / HTTP/1.1\r\n",
                         "The first bytes are not those of this protocol."},
            BadBeginning{"OtherVersion", "VLCH\0\7"s,
-                        "Version 7 of the protocol is not spoken here, only version 1."},
+                        "Version 7 of the protocol is not spoken here, only the versions 1 and 2."},
            BadBeginning{"UnknownKind", "VLCH\0\1\0\x9\0\0\0\0\0\0\0\0"s, "There is no message of kind 9."},
            BadBeginning{"GreatLength", "VLCH\0\1\0\1\0\0\0\0\xff\xff\xff\xff"s,
                         "A message of 4294967295 bytes is over the limit of 1024."},
@@ -275,10 +276,10 @@ TEST_F(HostileClients, ThatStopReadingAreClosedAndHoldUpNobody) {
 TEST_F(HostileClients, MayBeAThousand) {
     serve();
     std::vector<std::unique_ptr<RawPeer>> peers;
-    for (int i = 0; i < 1000; ++i)
+    for (int i = 0; i < 1000; ++i) {
         peers.push_back(std::make_unique<RawPeer>(server->port()));
-    for (auto const& peer : peers)
-        peer->greet();
+        peers.back()->greet();
+    }
     EXPECT_EQ(server->connections(), 1000u);
     for (auto const& peer : peers)
         peer->send(PRICE, Kind::Request, 2, "{}");
@@ -362,6 +363,133 @@ TEST_F(HostileClients, ThatLeaveWhileTheyWaitForMemoryLeaveNothingBehind) {
     third.greet();
     third.send(large);
     EXPECT_TRUE(third.receive());
+}
+
+TEST_F(HostileClients, ThatSayNothingMakeWayForOthers) {
+    Channel::ServerSettings settings = patient();
+    settings.maxStrangers = 2;
+    serve(settings);
+    RawPeer known(server->port());
+    known.greet();
+    RawPeer first(server->port());
+    RawPeer second(server->port());
+    RawPeer third(server->port());
+    EXPECT_TRUE(first.isClosed());
+    EXPECT_TRUE(server->hasConnections(3));
+    known.send(PRICE, Kind::Request, 2, "{}");
+    EXPECT_TRUE(known.receive());
+}
+
+TEST_F(HostileClients, ThatAreManyAndSayNothingLockNobodyOut) {
+    serve();
+    std::vector<std::unique_ptr<RawPeer>> strangers;
+    for (int i = 0; i < 1000; ++i) {
+        strangers.push_back(std::make_unique<RawPeer>(server->port()));
+        if (i % 250 == 249)
+            expectService();
+    }
+    EXPECT_LE(server->connections(), 257u);
+    EXPECT_THAT(log.lines(), IsEmpty());
+}
+
+TEST_F(HostileClients, DoNotReachTheLimitOfConnectionsAsStrangers) {
+    Channel::ServerSettings settings = patient();
+    settings.maxConnections = 1;
+    serve(settings);
+    RawPeer stranger(server->port());
+    RawPeer other(server->port());
+    expectService();
+}
+
+// --- much
+
+TEST_F(HostileClients, GetARefusalThatIsLongerThanAMessageCutAndLeaveNothingReserved) {
+    Channel::ServerSettings settings = patient();
+    settings.requestMemory = 1024 * 1024;
+    serve(settings, [](std::shared_ptr<Ipc::CmdI> const&, Channel::Answer const&) {
+        throw std::runtime_error(std::string(Channel::MAX_TEXT, 'x'));
+    });
+    RawPeer peer(server->port());
+    peer.greet();
+    std::string const large = R"({"a":")" + std::string(900 * 1024, 'x') + "\"}";
+    for (std::uint32_t sequence : {2u, 3u}) {
+        peer.send(PRICE, Kind::Request, sequence, large);
+        auto const error = peer.receive();
+        ASSERT_TRUE(error);
+        EXPECT_EQ(error->sequence, sequence);
+        EXPECT_EQ(Channel::reasonOf(error->text), std::string(500, 'x'));
+    }
+}
+
+TEST_F(HostileClients, ThatDoNotTakeTheirAnswersHoldNoMoreMemoryThanAllMayHave) {
+    Channel::ServerSettings settings = patient();
+    settings.answerMemory = 20 * 1024 * 1024;
+    serve(settings, [](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+        if (auto* const remove = dynamic_cast<Ipc::RemoveCfgNode*>(cmd.get()))
+            remove->setResp(std::string(15 * 1024 * 1024, 'x'));
+        answer();
+    });
+    RawPeer first(server->port());
+    first.greet();
+    first.send(Ipc::RemoveCfgNode::CMD_ID, Kind::Request, 2, "{}");
+    RawPeer second(server->port());
+    second.greet();
+    second.send(Ipc::RemoveCfgNode::CMD_ID, Kind::Request, 2, "{}");
+    EXPECT_TRUE(log.hasLogged("Its answer made way for those of others."));
+    EXPECT_TRUE(server->hasConnections(1));
+    // Which of the two asked first is not known.
+    EXPECT_NE(bool(first.receive()), bool(second.receive()));
+    expectService();
+}
+
+TEST_F(HostileClients, GetNoTreeOfValuesThatIsLargerThanItsBounds) {
+    serve();
+    RawPeer peer(server->port());
+    peer.greet();
+    std::string text = R"({"a":[{})";
+    while (text.size() < Channel::MAX_TEXT - 4)
+        text += ",{}";
+    peer.send(PRICE, Kind::Request, 2, text + "]}");
+    EXPECT_EQ(Channel::reasonOf(peer.receive().value().text),
+              "The values of a message of 16777216 bytes would take more than 128 MiB of memory.");
+    // One large text is no tree.
+    peer.send(PRICE, Kind::Request, 3, R"({"a":")" + std::string(15 * 1024 * 1024, '{') + "\"}");
+    EXPECT_EQ(peer.receive().value().kind, Kind::Response);
+}
+
+// --- the second version
+
+TEST_F(HostileClients, OfTheSecondVersionAreServedWithSeals) {
+    serve();
+    RawPeer peer(server->port());
+    peer.greet(Channel::VERSION);
+    for (std::uint32_t sequence : {2u, 3u}) {
+        peer.send(PRICE, Kind::Request, sequence, "{}");
+        EXPECT_EQ(peer.receive().value().text, R"({"asked":{}})");
+    }
+}
+
+TEST_F(HostileClients, ThatTakeAConnectionOverHaveNoSeal) {
+    serve();
+    std::string const request = bytesOf(PRICE, Kind::Request, 2, "{}");
+    for (std::string const& seal : {std::string(32, '\0'), std::string(32, 's')}) {
+        RawPeer peer(server->port());
+        peer.greet(Channel::VERSION);
+        peer.send(request + seal);
+        EXPECT_EQ(peer.refusal(), "A message is not sealed by the other side of this connection.");
+    }
+    EXPECT_TRUE(server->hasConnections(0));
+}
+
+TEST_F(HostileClients, ThatRepeatAMessageAreRefused) {
+    serve();
+    RawPeer peer(server->port());
+    peer.greet(Channel::VERSION);
+    std::string const request = peer.sealed(bytesOf(PRICE, Kind::Request, 2, "{}"));
+    peer.send(request);
+    EXPECT_TRUE(peer.receive());
+    peer.send(request);
+    EXPECT_EQ(peer.refusal(), "A message is not sealed by the other side of this connection.");
 }
 
 // --- order

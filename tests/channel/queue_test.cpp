@@ -328,7 +328,7 @@ TEST_F(Handling, MayFailWithAReason) {
 TEST_F(Handling, MayFailWithBytesThatAreNoText) {
     RunningServer const server(patient(), [](std::shared_ptr<Ipc::CmdI> const&,
                                              Channel::Answer const& answer) { answer.fail("caf\xe9"); });
-    EXPECT_EQ(errorOf(server), "The service refuses: caf?");
+    EXPECT_EQ(errorOf(server), "The service refuses: caf\xEF\xBF\xBD");
 }
 
 TEST_F(Handling, ThatForgetsToAnswerIsAFailure) {

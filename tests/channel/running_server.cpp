@@ -2,6 +2,8 @@
 
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
+#include "programs/channel/proof.h"
+#include "programs/channel/stream.h"
 #include "programs/channel/token.h"
 
 #include "vlservice/ipc/make_empty_cmd.h"
@@ -144,22 +146,36 @@ RawPeer::~RawPeer() = default;
 
 void RawPeer::send(std::string const& bytes) { asio::write(socket_->socket, asio::buffer(bytes)); }
 
+std::string RawPeer::sealed(std::string const& bytes) { return bytes + seal_.value().next(bytes); }
+
+void RawPeer::sendSealed(std::string const& bytes) { send(seal_ ? sealed(bytes) : bytes); }
+
 void RawPeer::send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text) {
-    send(bytesOf(command, kind, sequence, text));
+    sendSealed(bytesOf(command, kind, sequence, text));
+}
+
+void RawPeer::takeSeals(std::string const& own, std::string const& other) {
+    seal_.emplace(own);
+    decoder_.expectSeals(other);
 }
 
 void RawPeer::finish() { socket_->socket.shutdown(asio::ip::tcp::socket::shutdown_send); }
 
-void RawPeer::welcome() {
+void RawPeer::welcome(std::uint16_t version) {
+    auto const ends = Channel::endsOf(socket_->socket);
+    Channel::Terms const terms{version, TOKEN, "", ends.other, ends.own};
     std::string const nonce = Channel::makeNonce();
     auto const challenge = receive();
     std::string const clientNonce = Channel::parse(challenge.value().text).get(Channel::NONCE).toString();
-    std::string const proof = Channel::makeProof(Channel::Side::Service, TOKEN, clientNonce, nonce, "");
-    send(Channel::preface());
+    std::string const proof = Channel::makeProof(Channel::Side::Service, terms, clientNonce, nonce);
+    send(Channel::preface(version));
     send(Channel::GREETING, Channel::Kind::Response, Channel::CHALLENGE,
          Channel::print({{Channel::NONCE, nonce}, {Channel::PROOF, proof}}));
     receive().value();
     send(Channel::GREETING, Channel::Kind::Response, Channel::PROVING, "{}");
+    if (version > Channel::VERSION_1)
+        takeSeals(makeSealKey(Channel::Side::Service, terms, clientNonce, nonce),
+                  makeSealKey(Channel::Side::Client, terms, clientNonce, nonce));
 }
 
 std::optional<Message> RawPeer::receive() {
@@ -177,18 +193,23 @@ std::optional<Message> RawPeer::receive() {
     }
 }
 
-void RawPeer::greet() {
+void RawPeer::greet(std::uint16_t version) {
+    auto const ends = Channel::endsOf(socket_->socket);
+    Channel::Terms const terms{version, TOKEN, "", ends.own, ends.other};
     std::string const nonce = Channel::makeNonce();
-    send(Channel::preface());
+    send(Channel::preface(version));
     send(Channel::GREETING, Channel::Kind::Request, Channel::CHALLENGE,
          Channel::print({{Channel::NONCE, nonce}}));
     auto const challenge = receive();
     std::string const serviceNonce = Channel::parse(challenge.value().text).get(Channel::NONCE).toString();
-    std::string const proof = Channel::makeProof(Channel::Side::Client, TOKEN, nonce, serviceNonce, "");
+    std::string const proof = Channel::makeProof(Channel::Side::Client, terms, nonce, serviceNonce);
     send(Channel::GREETING, Channel::Kind::Request, Channel::PROVING,
          Channel::print({{Channel::PROOF, proof}}));
     if (receive().value().text != "{}")
         throw std::runtime_error("The service does not welcome its peer.");
+    if (version > Channel::VERSION_1)
+        takeSeals(makeSealKey(Channel::Side::Client, terms, nonce, serviceNonce),
+                  makeSealKey(Channel::Side::Service, terms, nonce, serviceNonce));
 }
 
 std::string RawPeer::refusal() {
@@ -215,13 +236,15 @@ struct FakeService::Running {
     std::thread thread;
 };
 
-FakeService::FakeService(std::function<void(RawPeer&)> script)
+FakeService::FakeService(std::function<void(RawPeer&)> script, int connections)
     : running_(std::make_unique<Running>()), port_(running_->acceptor.local_endpoint().port()) {
-    running_->thread = std::thread([this, script = std::move(script)] {
-        auto socket = std::make_unique<RawPeer::Socket>();
-        running_->acceptor.accept(socket->socket);
-        RawPeer peer(std::move(socket));
-        script(peer);
+    running_->thread = std::thread([this, connections, script = std::move(script)] {
+        for (int i = 0; i < connections; ++i) {
+            auto socket = std::make_unique<RawPeer::Socket>();
+            running_->acceptor.accept(socket->socket);
+            RawPeer peer(std::move(socket));
+            script(peer);
+        }
     });
 }
 

@@ -123,9 +123,13 @@ public:
     void send(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
     /// Says that nothing more will come.
     void finish();
+    /// The same with a seal, once there are seals.
+    void sendSealed(std::string const& bytes);
+    /// The bytes and the seal behind them.
+    std::string sealed(std::string const& bytes);
     /// The preface and the exchange of proofs, as a client and as a service.
-    void greet();
-    void welcome();
+    void greet(std::uint16_t version = Channel::VERSION_1);
+    void welcome(std::uint16_t version = Channel::VERSION);
     /// The next message; none when the other side has closed the connection.
     std::optional<Message> receive();
     /// The reason in the error message that comes next, and that the connection is closed behind it.
@@ -136,14 +140,18 @@ public:
     void vanish();
 
 private:
+    void takeSeals(std::string const& own, std::string const& other);
+
     std::unique_ptr<Socket> socket_;
     Channel::FrameDecoder decoder_;
+    std::optional<Channel::Seal> seal_;
 };
 
-/// A service that does what the test says with the one connection that it accepts, on a thread of its own.
+/// A service that does what the test says with each of the connections that it accepts, on a thread of its
+/// own.
 class FakeService {
 public:
-    explicit FakeService(std::function<void(RawPeer&)> script);
+    explicit FakeService(std::function<void(RawPeer&)> script, int connections = 1);
     ~FakeService();
     FakeService(FakeService const&) = delete;
     FakeService& operator=(FakeService const&) = delete;

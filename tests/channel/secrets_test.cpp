@@ -1,8 +1,10 @@
 // Tokens, proofs, accepted certificates and the files that they lie in.
 
 #include "programs/base/error.h"
+#include "programs/base/hex.h"
 #include "programs/base/private_file.h"
 #include "programs/channel/pin_store.h"
+#include "programs/channel/proof.h"
 #include "programs/channel/token.h"
 
 #include "tests/support/format_document.h"
@@ -15,6 +17,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <set>
 
 using namespace testing;
 using namespace Channel;
@@ -163,33 +166,66 @@ TEST_F(PrivateFiles, KeepATokenThatOthersCanReadFromBeingUsed) {
 
 // --- proofs
 
+/// A connection without TLS.
+Terms plainTerms(std::uint16_t version) { return {version, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"}; }
+
 TEST(Proofs, AreTheDescribedOnes) {
     std::string const client(64, '0');
     std::string const service(64, 'f');
+    Terms const first = plainTerms(1);
+    Terms const second = plainTerms(2);
+    auto const hex = [](std::string const& key) {
+        return Base::toHex(key.data(), key.size());
+    };
     EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proofs"),
-              "P = " + makeProof(Side::Service, TOKEN, client, service, "") +
-                  "\nQ = " + makeProof(Side::Client, TOKEN, client, service, "") + '\n');
+              "P  = " + makeProof(Side::Service, second, client, service) +
+                  "\nQ  = " + makeProof(Side::Client, second, client, service) +
+                  "\nKC = " + hex(makeSealKey(Side::Client, second, client, service)) +
+                  "\nKS = " + hex(makeSealKey(Side::Service, second, client, service)) + '\n');
+    EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proofs 1"),
+              "P = " + makeProof(Side::Service, first, client, service) +
+                  "\nQ = " + makeProof(Side::Client, first, client, service) + '\n');
+    EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proof discovery"),
+              makeDiscoveryProof(TOKEN, client, "10.0.0.1", 4711) + '\n');
+}
+
+/// The same terms but for one of them, each time another one.
+std::vector<Terms> variants(Terms const& terms) {
+    std::vector<Terms> all(5, terms);
+    all[1].token += 'x';
+    all[2].fingerprint = "AA";
+    all[3].clientAddress = "127.0.0.1:40001";
+    all[4].serviceAddress = "127.0.0.1:4712";
+    return all;
 }
 
 TEST(Proofs, DependOnEverythingThatTheyProve) {
-    std::vector<std::string> const proofs = {
-        makeProof(Side::Client, TOKEN, "c", "s", "f"),       makeProof(Side::Service, TOKEN, "c", "s", "f"),
-        makeProof(Side::Client, TOKEN + "x", "c", "s", "f"), makeProof(Side::Client, TOKEN, "d", "s", "f"),
-        makeProof(Side::Client, TOKEN, "c", "t", "f"),       makeProof(Side::Client, TOKEN, "c", "s", "g"),
-        makeProof(Side::Client, TOKEN, "cs", "", "f"),       makeProof(Side::Client, TOKEN, "", "cs", "f"),
-        makeProof(Side::Client, TOKEN, "c", "s", ""),
-    };
-    for (std::size_t i = 0; i < proofs.size(); ++i)
-        for (std::size_t j = 0; j < proofs.size(); ++j)
-            EXPECT_EQ(isSameProof(proofs[i], proofs[j]), i == j) << i << ' ' << j;
+    std::vector<std::string> proofs;
+    for (Terms const& terms : variants(plainTerms(2)))
+        for (Side const side : {Side::Client, Side::Service})
+            for (auto const& [c, s] : {std::pair("c", "s"), std::pair("d", "s"), std::pair("c", "t"),
+                                       std::pair("cs", ""), std::pair("", "cs")}) {
+                proofs.push_back(makeProof(side, terms, c, s));
+                proofs.push_back(makeSealKey(side, terms, c, s));
+            }
+    proofs.push_back(makeDiscoveryProof(TOKEN, "c", "s", 1));
+    EXPECT_EQ(std::set(proofs.begin(), proofs.end()).size(), proofs.size());
+}
+
+TEST(Proofs, OfOneVersionDoNotServeInTheOther) {
+    for (Side const side : {Side::Client, Side::Service})
+        for (Side const other : {Side::Client, Side::Service})
+            EXPECT_NE(makeProof(side, plainTerms(1), "c", "s"), makeProof(other, plainTerms(2), "c", "s"));
 }
 
 TEST(Proofs, DifferInLengthOrInAnyCharacter) {
-    EXPECT_TRUE(isSameProof("", ""));
+    EXPECT_TRUE(isSameProof("abc", "abc"));
     EXPECT_FALSE(isSameProof("abc", "ab"));
     EXPECT_FALSE(isSameProof("abc", "abd"));
     EXPECT_FALSE(isSameProof("abc", "xbc"));
 }
+
+TEST(Proofs, ThatAreEmptyProveNothing) { EXPECT_FALSE(isSameProof("", "")); }
 
 TEST(Nonces, AreNewEachTime) {
     EXPECT_THAT(makeNonce(), MatchesRegex("[0-9a-f]{64}"));
@@ -198,27 +234,46 @@ TEST(Nonces, AreNewEachTime) {
 
 // --- accepted certificates
 
+/// 32 times the same two digits.
+std::string fingerprintOf(std::string const& digits) {
+    std::string text = digits;
+    for (int i = 1; i < 32; ++i)
+        text += ':' + digits;
+    return text;
+}
+
 TEST_F(PrivateFiles, KeepAcceptedCertificatesByService) {
     PinStore const pins(file);
     EXPECT_EQ(pins.find("a:1"), std::nullopt);
-    pins.add("a:1", "AA:BB");
-    pins.add("b:1", "CC:DD");
-    EXPECT_EQ(pins.find("a:1"), "AA:BB");
-    EXPECT_EQ(pins.find("b:1"), "CC:DD");
+    pins.add("a:1", fingerprintOf("AB"));
+    pins.add("b:1", fingerprintOf("CD"));
+    EXPECT_EQ(pins.find("a:1"), fingerprintOf("AB"));
+    EXPECT_EQ(pins.find("b:1"), fingerprintOf("CD"));
     EXPECT_EQ(pins.find("a:11"), std::nullopt);
     EXPECT_EQ(pins.find(":1"), std::nullopt);
     EXPECT_EQ(mode(), 0600u);
-    EXPECT_EQ(Base::readPrivateFile(file), "a:1 AA:BB\nb:1 CC:DD\n");
+    EXPECT_EQ(Base::readPrivateFile(file),
+              "a:1 " + fingerprintOf("AB") + "\nb:1 " + fingerprintOf("CD") + '\n');
 }
 
 TEST_F(PrivateFiles, LetLinesBeAddedAndRemovedByHand) {
-    write("\n# of the office\nhalf\n  a:1\t AA:BB  rest\nb:1 CC:DD");
-    EXPECT_EQ(PinStore(file).find("a:1"), "AA:BB");
-    EXPECT_EQ(PinStore(file).find("b:1"), "CC:DD");
+    write("\n# of the office\nhalf\n  a:1\t " + fingerprintOf("AB") + "  rest\nb:1 " + fingerprintOf("CD"));
+    EXPECT_EQ(PinStore(file).find("a:1"), fingerprintOf("AB"));
+    EXPECT_EQ(PinStore(file).find("b:1"), fingerprintOf("CD"));
     EXPECT_EQ(PinStore(file).find("half"), std::nullopt);
-    PinStore(file).add("c:1", "EE:FF");
-    EXPECT_EQ(PinStore(file).find("b:1"), "CC:DD");
-    EXPECT_EQ(PinStore(file).find("c:1"), "EE:FF");
+    PinStore(file).add("c:1", fingerprintOf("EF"));
+    EXPECT_EQ(PinStore(file).find("b:1"), fingerprintOf("CD"));
+    EXPECT_EQ(PinStore(file).find("c:1"), fingerprintOf("EF"));
+}
+
+TEST_F(PrivateFiles, PassOverALineThatAFullDiskHasCutAnywhere) {
+    std::string const line = "a:1 " + fingerprintOf("AB");
+    for (std::size_t length = 0; length < line.size(); ++length) {
+        write(line.substr(0, length));
+        EXPECT_EQ(PinStore(file).find("a:1"), std::nullopt) << length;
+        PinStore(file).add("a:1", fingerprintOf("CD"));
+        EXPECT_EQ(PinStore(file).find("a:1"), fingerprintOf("CD")) << length;
+    }
 }
 
 TEST_F(PrivateFiles, KeepNoCertificatesThatOthersCouldHaveWritten) {

@@ -278,6 +278,25 @@ TEST_F(DiscoveryHandlers, ReceivingAllGoesOnAfterGarbageAndAfterWhatTheFunctionT
     EXPECT_THAT(log.lines[1].second, StartsWith(std::string(BAD_MESSAGE) + "JSON error: "));
 }
 
+TEST_F(DiscoveryHandlers, ReceivingAllLogsAFloodOfGarbageInAFewLines) {
+    auto const base = makeBase();
+    base->recvAll(collect());
+    for (int i = 0; i < 10'000; ++i)
+        Access::receive(*base, "garbage");
+    EXPECT_EQ(log.lines.size(), 10u);
+    Access::receive(*base, "{}");
+    EXPECT_THAT(received, ElementsAre("{}"));
+}
+
+TEST_F(DiscoveryHandlers, ReceivingOneLogsEachDatagramThatIsDropped) {
+    auto const base = makeBase();
+    for (int i = 0; i < 20; ++i) {
+        base->recv(collect());
+        Access::receive(*base, "garbage");
+    }
+    EXPECT_EQ(log.lines.size(), 20u);
+}
+
 TEST_F(DiscoveryHandlers, ReceivingAllStartsAReceiveForEachDatagramUntilItIsClosed) {
     auto const base = makeBase();
     Line const failed{4, "Discovery receive operation failed. Bad file descriptor"};

@@ -78,6 +78,8 @@ void TwoNetworks::makeNetwork(int& network) {
     }).join();
 }
 
+void TwoNetworks::disconnect() { ip(client_, "link delete vl0"); }
+
 void TwoNetworks::connect() {
     // A namespace without a name is told by the file that keeps it alive.
     std::string const peer = "/proc/" + std::to_string(::getpid()) + "/fd/" + std::to_string(service_);

@@ -21,6 +21,10 @@ public:
     static constexpr char const* SERVICE_IP4 = "10.77.0.2";
     static constexpr char const* SERVICE_IP6 = "fd77::2";
 
+    /// Takes the pair of interfaces away, and makes another one.
+    void disconnect();
+    void connect();
+
     /// Switches IPv6 off in a namespace.
     void disableIp6(int network);
 
@@ -38,7 +42,6 @@ public:
 
 private:
     void makeNetwork(int& network);
-    void connect();
     /// Runs `ip` with these arguments in a namespace.
     void ip(int network, std::string const& arguments);
     /// Sets what the kernel keeps for each namespace by itself, as below /proc/sys/net.

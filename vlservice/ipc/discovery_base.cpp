@@ -24,6 +24,10 @@ constexpr LogPriority BROKEN = 3;
 constexpr LogPriority FAILED = 4;
 constexpr LogPriority TRACE = 7;
 
+/// What recvAll logs of datagrams that it drops, at the most, in a time.
+constexpr int MAX_LINES = 10;
+constexpr std::chrono::seconds LINES_TIME{10};
+
 void logFailure(LogPriority priority, std::string_view what, std::string_view reason) {
     Log::Lock log(priority);
     log.logStreamLine() << what << reason;
@@ -166,9 +170,20 @@ void DiscoveryBase::callRcvFunc(std::string const& text) {
         RcvFunc const func = rcvFunc_;
         func(json::strToObject(text.data(), text.size()));
     } catch (std::exception const& e) {
-        logFailure(BROKEN, "Discovery receive operation failed to deserialize or process the message. ",
-                   e.what());
+        logDropped(e.what());
     }
+}
+
+void DiscoveryBase::logDropped(char const* reason) {
+    auto const now = std::chrono::steady_clock::now();
+    if (now >= linesEnd_) {
+        linesEnd_ = now + LINES_TIME;
+        linesLogged_ = 0;
+    }
+    // Whoever is on the network may send as much as he likes to one who receives for ever.
+    if (allFunc_ && ++linesLogged_ > MAX_LINES)
+        return;
+    logFailure(BROKEN, "Discovery receive operation failed to deserialize or process the message. ", reason);
 }
 
 } // namespace Ipc

@@ -14,6 +14,7 @@
 
 #include <array>
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -48,7 +49,8 @@ public:
     /// on after a datagram: only another timed receive, or close, ends it.
     void recv(RcvFunc func, boost::posix_time::time_duration timeout);
     /// For a service: receives one datagram after another until close(). What is no JSON object, and what
-    /// `func` throws, is logged and passed over. A failure of the socket ends it.
+    /// `func` throws, is passed over and logged, at most ten times in ten seconds. A failure of the socket
+    /// ends it.
     void recvAll(RcvFunc func);
     /// Nothing is sent or received any more. A second call does nothing.
     void close();
@@ -74,6 +76,7 @@ private:
     void handleTimeout(boost::system::error_code const& ec);
     /// The callback may destroy this object.
     void callRcvFunc(std::string const& text);
+    void logDropped(char const* reason);
 
     boost::asio::io_context& io_;
     boost::asio::ip::address multicastAddr_;
@@ -84,6 +87,9 @@ private:
     RcvFunc rcvFunc_;
     /// Of recvAll: it is received for again after each datagram.
     RcvFunc allFunc_;
+    /// What recvAll has logged in the ten seconds that end then.
+    int linesLogged_ = 0;
+    std::chrono::steady_clock::time_point linesEnd_;
     std::unique_ptr<boost::asio::deadline_timer> timer_;
     /// Tells the newest timer's handler from that of a former one that had expired before it could be
     /// cancelled.

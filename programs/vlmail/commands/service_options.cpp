@@ -12,6 +12,8 @@ void addServiceOptions(Base::Command const& command, ServiceOptions& options) {
         .addOption("--accept-certificate", options.certificate,
                    "Accept a new certificate of this fingerprint without a question")
         .valueName("FINGERPRINT");
+    command.addFlag("--allow-channel-1", options.allowsChannel1,
+                    "Go on with a service that speaks version 1 of the connection alone");
 }
 
 } // namespace VlMail

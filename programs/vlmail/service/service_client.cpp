@@ -1,20 +1,14 @@
 #include "programs/vlmail/service/service_client.h"
 
 #include "programs/base/error.h"
-#include "programs/base/host_port.h"
 #include "programs/channel/token.h"
 #include "programs/protocol/failure.h"
+#include "programs/vlmail/service/service_search.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
-#include "vlservice/ipc/discovery_base.h"
-#include "vlservice/ipc/discovery_cli.h"
-#include "vlservice/ipc/gui_fwd.h"
 #include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/upload_queued.h"
 
-#include <boost/asio/io_context.hpp>
-
-#include <algorithm>
 #include <cstdlib>
 #include <iostream>
 #include <ostream>
@@ -36,16 +30,6 @@ fs::path personalFolder(char const* variable, char const* belowHome) {
     return fs::path(home ? home : "/") / belowHome / "vlmail";
 }
 
-/// Keeps what discovery has found.
-class Finder : public Ipc::CmdProcessorI {
-public:
-    void submit(std::shared_ptr<Ipc::CmdI> cmd) override {
-        answer = dynamic_cast<Ipc::GuiFwd const&>(*cmd).params();
-    }
-
-    json::Object answer;
-};
-
 /// Puts the question to the person, when one is there.
 bool acceptsCertificate(std::string const& service, std::string const& fingerprint, std::ostream& err) {
     err << "The service " << service << " shows a certificate that is new here:\n  " << fingerprint
@@ -59,45 +43,30 @@ bool acceptsCertificate(std::string const& service, std::string const& fingerpri
     return std::getline(std::cin, reply) && reply == "yes";
 }
 
+std::string tokenFile(ServiceOptions const& options) {
+    return options.tokenFile.empty() ? (configFolder() / "token").string() : options.tokenFile;
+}
+
+/// Empty without one: connecting says what is wrong with it.
+std::string tokenIfAny(ServiceOptions const& options) {
+    try {
+        return Channel::readToken(tokenFile(options));
+    } catch (Base::Error const&) {
+        return {};
+    }
+}
+
 } // namespace
-
-std::string ServiceAddress::text() const { return Base::hostPortText(host, port); }
-
-ServiceAddress parseServiceAddress(std::string const& text) {
-    auto address = Base::hostPortIn(text);
-    if (!address)
-        throw Base::Error("\"" + text +
-                          "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
-    return {std::move(address->host), address->port};
-}
-
-ServiceAddress addressInAnswer(json::Object const& answer) {
-    std::string host = answer.get(Ipc::DiscoveryBase::SVC_HOST_FLD_NAME).textOrEmpty();
-    long long const port = answer.get(Ipc::DiscoveryBase::SVC_PORT_FLD_NAME).intOrZero();
-    if (!Base::isHost(host) || port < 1 || port > 65535)
-        throw Base::Error(
-            "something on the network answered as a service and named no address; name one with "
-            "--service HOST:PORT");
-    return {std::move(host), static_cast<std::uint16_t>(port)};
-}
-
-std::optional<json::Object> askNetwork() {
-    boost::asio::io_context io(1);
-    auto const finder = std::make_shared<Finder>();
-    Ipc::DiscoveryCli const search(finder, io);
-    io.run();
-    return finder->answer.empty() ? std::nullopt : std::optional(finder->answer);
-}
 
 ServiceAddress findService(ServiceOptions const& options) {
     if (!options.service.empty())
         return parseServiceAddress(options.service);
-    std::optional<json::Object> const answer = askNetwork();
-    if (!answer)
+    std::optional<ServiceAddress> const found = searchNetwork(tokenIfAny(options));
+    if (!found)
         throw Base::Error(
             "no service answered on the network; name one with --service HOST:PORT, or see what "
             "\"vlmail discover --doctor\" says");
-    return addressInAnswer(*answer);
+    return *found;
 }
 
 std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
@@ -105,8 +74,8 @@ std::unique_ptr<Channel::Client> connectToService(ServiceAddress const& address,
     Channel::ClientSettings settings;
     settings.host = address.host;
     settings.port = address.port;
-    settings.token = Channel::readToken(options.tokenFile.empty() ? (configFolder() / "token").string()
-                                                                  : options.tokenFile);
+    settings.token = Channel::readToken(tokenFile(options));
+    settings.allowsVersion1 = options.allowsChannel1;
     settings.pinFile = options.pinFile.empty() ? (configFolder() / "services").string() : options.pinFile;
     settings.acceptNew = [&options, &err](std::string const& service, std::string const& fingerprint) {
         return options.certificate.empty() ? acceptsCertificate(service, fingerprint, err)

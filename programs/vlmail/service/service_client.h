@@ -4,9 +4,9 @@
 #include "programs/channel/client.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/settings.h"
+#include "programs/vlmail/service/service_address.h"
 #include "vlservice/json/json.h"
 
-#include <cstdint>
 #include <filesystem>
 #include <iosfwd>
 #include <memory>
@@ -25,22 +25,9 @@ struct ServiceOptions {
     std::string pinFile;
     /// The fingerprint of a certificate to accept without a question.
     std::string certificate;
+    /// Whether a service of the channel's first version will do.
+    bool allowsChannel1 = false;
 };
-
-struct ServiceAddress {
-    std::string host;
-    std::uint16_t port = 0;
-
-    /// HOST:PORT, with brackets around an IPv6 address.
-    std::string text() const;
-};
-
-/// Reads HOST:PORT; an IPv6 address stands in brackets. Throws Error.
-ServiceAddress parseServiceAddress(std::string const& text);
-/// The address in a service's answer. Throws Error when there is none in it that could be one.
-ServiceAddress addressInAnswer(json::Object const& answer);
-/// The first answer on the network; nothing when none comes within two seconds.
-std::optional<json::Object> askNetwork();
 
 /// Finds the service that the options mean. Throws Error when there is none.
 ServiceAddress findService(ServiceOptions const& options);

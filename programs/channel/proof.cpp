@@ -1,0 +1,74 @@
+#include "programs/channel/proof.h"
+
+#include "programs/base/error.h"
+#include "programs/base/hex.h"
+
+#include <openssl/crypto.h>
+#include <openssl/evp.h>
+#include <openssl/hmac.h>
+#include <openssl/sha.h>
+
+#include <array>
+#include <initializer_list>
+#include <utility>
+
+namespace Channel {
+namespace {
+
+std::string hex(std::string const& bytes) { return Base::toHex(bytes.data(), bytes.size()); }
+
+/// Each part is ended by a byte that none of them holds.
+std::string joined(std::string label, std::initializer_list<std::string_view> parts) {
+    for (std::string_view const part : parts)
+        label.append(1, '\0').append(part);
+    return label;
+}
+
+constexpr char const* nameOf(Side side) { return side == Side::Client ? "client" : "service"; }
+
+std::string versionLabel(Terms const& terms, char const* use, Side side) {
+    return "VLCH " + std::to_string(terms.version) + ' ' + use + ' ' + nameOf(side);
+}
+
+/// From version 2 on.
+std::string code(std::string label, Terms const& terms, std::string_view clientNonce,
+                 std::string_view serviceNonce) {
+    return hmac(terms.token, joined(std::move(label), {clientNonce, serviceNonce, terms.fingerprint,
+                                                       terms.clientAddress, terms.serviceAddress}));
+}
+
+} // namespace
+
+std::string makeProof(Side side, Terms const& terms, std::string_view clientNonce,
+                      std::string_view serviceNonce) {
+    if (terms.version == 1)
+        return hex(hmac(terms.token, joined(nameOf(side), {clientNonce, serviceNonce, terms.fingerprint})));
+    return hex(code(versionLabel(terms, "proof", side), terms, clientNonce, serviceNonce));
+}
+
+std::string makeSealKey(Side side, Terms const& terms, std::string_view clientNonce,
+                        std::string_view serviceNonce) {
+    return code(versionLabel(terms, "seal", side), terms, clientNonce, serviceNonce);
+}
+
+std::string makeDiscoveryProof(std::string_view token, std::string_view nonce, std::string_view host,
+                               std::uint16_t port) {
+    return hex(hmac(token, joined("VLCH 2 discovery", {nonce, host, std::to_string(port)})));
+}
+
+bool isSameProof(std::string_view a, std::string_view b) {
+    return !a.empty() && a.size() == b.size() && CRYPTO_memcmp(a.data(), b.data(), a.size()) == 0;
+}
+
+std::string hmac(std::string_view key, std::string_view message) {
+    std::array<unsigned char, EVP_MAX_MD_SIZE> bytes;
+    unsigned int length = 0;
+    if (!HMAC(EVP_sha256(), key.data(), static_cast<int>(key.size()),
+              reinterpret_cast<unsigned char const*>(message.data()), message.size(), bytes.data(),
+              &length) ||
+        length != SHA256_DIGEST_LENGTH)
+        throw Base::Error("The crypto library cannot compute a proof.");
+    return {reinterpret_cast<char const*>(bytes.data()), length};
+}
+
+} // namespace Channel
