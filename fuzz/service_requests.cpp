@@ -46,7 +46,7 @@ struct MemoryService {
         }
     }
 
-    void requireReadable() {
+    void requireReadable() const {
         for (VlServiced::SettingsNode const& node : store.nodes())
             settings.effective({node.id, {}});
         settings.tree();

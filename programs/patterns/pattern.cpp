@@ -50,7 +50,7 @@ struct Pattern::Compiled {
 
 Pattern::Pattern(std::string_view pattern, Use use) : text_(pattern), use_(use) {
     try {
-        compiled_.reset(new Compiled{compile(pattern, use)});
+        compiled_ = std::make_unique<Compiled>(Compiled{compile(pattern, use)});
     } catch (boost::regex_error const& error) {
         throw Broken(reasonOf(error), static_cast<std::size_t>(error.position()));
     } catch (std::out_of_range const& error) {

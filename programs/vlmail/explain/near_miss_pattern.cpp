@@ -272,7 +272,7 @@ std::optional<Found> normalisation(Search const& search) {
 }
 
 std::optional<Found> lookAlike(Search const& search) {
-    ZoneText const text = search.searchedText();
+    ZoneText const& text = search.searchedText();
     std::string const plainText = withPlainMarks(text.text());
     std::string const plainPattern = withPlainMarks(search.pattern());
     if (plainText == text.text() && plainPattern == search.pattern())
@@ -298,7 +298,7 @@ std::optional<Found> joinedLines(Search const& search) {
     // Joined lines are not measured.
     if (search.trace().isTooWide)
         return std::nullopt;
-    ZoneText const text = search.searchedText();
+    ZoneText const& text = search.searchedText();
     Best best;
     std::size_t at = text.text().find('\n');
     for (std::size_t tries = 0; at != std::string::npos && tries < MAX_TRIES && !best.isValid(); ++tries) {
@@ -346,7 +346,7 @@ std::optional<Found> literal(Search const& search) {
 }
 
 std::optional<Found> rest(Search const& search) {
-    ZoneText const text = search.searchedText();
+    ZoneText const& text = search.searchedText();
     std::string_view const all = text.text();
     for (Patterns::Cut const& cut : Patterns::cutsOf(search.pattern())) {
         if (!isTelling(cut))
