@@ -26,6 +26,14 @@ std::string reasonOf(boost::regex_error const& error) {
     return reason;
 }
 
+/// What so many characters at the text's start take.
+std::size_t bytesOf(std::string_view text, std::size_t characters) {
+    std::size_t bytes = 0;
+    while (bytes < text.size() && ((text[bytes] & 0xC0) == 0x80 || characters-- > 0))
+        ++bytes;
+    return bytes;
+}
+
 } // namespace
 
 struct Pattern::Compiled {
@@ -86,6 +94,20 @@ std::size_t Pattern::cost(std::string_view text, std::size_t budget) const {
     Groups groups;
     compiled_->run(use_, Cfg::decode(text), purse, groups);
     return budget - purse.left;
+}
+
+std::optional<Pattern::Place> Pattern::find(std::string_view text, std::size_t budget) const {
+    try {
+        Budget purse{budget};
+        Groups groups;
+        if (compiled_->run(use_, Cfg::decode(text), purse, groups) != Answer::Yes)
+            return std::nullopt;
+        std::size_t const begin = bytesOf(text, static_cast<std::size_t>(groups.position()));
+        std::size_t const length = bytesOf(text.substr(begin), static_cast<std::size_t>(groups.length()));
+        return Place{begin, length};
+    } catch (std::out_of_range const&) {
+        return std::nullopt;
+    }
 }
 
 bool Pattern::fitsWithGroup(std::string_view text, std::string const& group) const {

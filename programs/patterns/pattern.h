@@ -7,6 +7,7 @@
 
 #include <cstddef>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -54,6 +55,13 @@ public:
     Answer fits(std::string_view text, std::size_t budget = DEFAULT_BUDGET) const;
     /// How many looks at characters the answer takes, `budget` when it is not found within it.
     std::size_t cost(std::string_view text, std::size_t budget = DEFAULT_BUDGET) const;
+    /// Bytes of a text.
+    struct Place {
+        std::size_t offset;
+        std::size_t length;
+    };
+    /// Where it fits first; nothing when it does not, or not within the budget.
+    std::optional<Place> find(std::string_view text, std::size_t budget = DEFAULT_BUDGET) const;
     /// Whether the pattern fits with that group taking part.
     bool fitsWithGroup(std::string_view text, std::string const& group) const;
 

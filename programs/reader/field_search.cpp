@@ -1,6 +1,7 @@
 #include "programs/reader/field_search.h"
 
 #include "programs/base/error.h"
+#include "programs/reader/value_reading.h"
 
 #include <algorithm>
 #include <utility>
@@ -37,8 +38,8 @@ FieldTrace const* PageTrace::counting(std::string const& name) const {
     return nullptr;
 }
 
-FieldSearch::FieldSearch(std::string document, PageTrace* trace)
-    : document_(std::move(document)), trace_(trace) {}
+FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, PageTrace* trace)
+    : document_(std::move(document)), rules_(rules), trace_(trace) {}
 
 void FieldSearch::search(Cfg::ExtractZone const& zone, ZoneText text) {
     if (trace_)
@@ -57,8 +58,9 @@ void FieldSearch::search(ExtractField const& field, ZoneText& text) {
         return;
     }
     yield.isFound = !yield.value->isValidated();
-    validate(field, *yield.value);
+    yield.doubt = validate(field, *yield.value);
     if (trace) {
+        trace->doubt = yield.doubt;
         trace->value = std::make_shared<ExtractedField const>(*yield.value);
         yield.zone = trace_->zones.size() - 1;
         yield.field = trace_->zones.back().fields.size() - 1;
@@ -67,9 +69,9 @@ void FieldSearch::search(ExtractField const& field, ZoneText& text) {
     take(std::move(yield));
 }
 
-void FieldSearch::validate(ExtractField const& field, ExtractedField& value) const {
+std::string FieldSearch::validate(ExtractField const& field, ExtractedField& value) const {
     try {
-        field.validate(value);
+        return readValue(field, value, rules_);
     } catch (std::exception const& failure) {
         throw Base::Error(document_ + ": the value of field \"" + field.name() + "\" cannot be validated (" +
                           failure.what() + "); correct the field's value_match");
@@ -88,8 +90,11 @@ void FieldSearch::take(Yield yield) {
 }
 
 FieldsFound FieldSearch::finish() {
-    for (Yield const& yield : yields_)
+    for (Yield const& yield : yields_) {
         found_.fields.emplace(yield.value->priority(), *yield.value);
+        if (!yield.doubt.empty())
+            found_.warnings.push_back(yield.value->name() + ": " + yield.doubt);
+    }
     if (trace_)
         traceWhatCounts();
     return std::move(found_);

@@ -1,6 +1,7 @@
 #pragma once
 // The fields of one letter, searched zone by zone.
 
+#include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
 
 #include "vlservice/extract/extracted_fields.h"
@@ -18,14 +19,17 @@ struct FieldsFound {
     Cfg::ExtractedFields fields;
     /// The obligatory fields that were not found and have no default.
     std::vector<std::string> missing;
+    /// What a person should know of values, a line each that begins with the field's name.
+    std::vector<std::string> warnings;
     /// A field that separates letters was found.
     bool isMarked = false;
 };
 
 class FieldSearch {
 public:
-    /// `document` names it in messages. With a trace the search says there how it came about.
-    explicit FieldSearch(std::string document, PageTrace* trace = nullptr);
+    /// `document` names it in messages; the rules must live as long as the search. With a trace the search
+    /// says there how it came about.
+    explicit FieldSearch(std::string document, ReadingRules const& rules, PageTrace* trace = nullptr);
 
     /// Searches the zone's fields, which take their lines out of the text one after the other. Throws Error
     /// when a field's validation pattern fails; a failing extraction pattern is logged by the library and
@@ -39,16 +43,18 @@ private:
     struct Yield {
         std::shared_ptr<Cfg::ExtractedField> value;
         bool isFound = false;
+        std::string doubt;
         std::size_t zone = 0;
         std::size_t field = 0;
     };
 
     void search(Cfg::ExtractField const& field, ZoneText& text);
-    void validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
+    std::string validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
     void take(Yield yield);
     void traceWhatCounts();
 
     std::string document_;
+    ReadingRules const& rules_;
     PageTrace* trace_;
     std::vector<Yield> yields_;
     FieldsFound found_;

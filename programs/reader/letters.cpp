@@ -24,10 +24,11 @@ bool maySeparateLetters(Cfg::ExtractZones const& zones) {
            });
 }
 
-FieldsFound searchPage(Document& document, int number, Cfg::ExtractPreset const& preset, PageTrace* trace) {
+FieldsFound searchPage(Document& document, int number, Cfg::ExtractPreset const& preset,
+                       ReadingRules const& rules, PageTrace* trace) {
     Page const& page = document.page(number);
     Layout const layout = layOut(page, rulesOf(preset));
-    FieldSearch search(document.name(), trace);
+    FieldSearch search(document.name(), rules, trace);
     for (ExtractZone const& zone : preset.zones())
         search.search(zone, textOf(page, layout, zone));
     return search.finish();
@@ -37,18 +38,21 @@ PageTrace* traceOf(int page, Trace* trace) {
     return trace ? &trace->pages.emplace_back(PageTrace{page, false, {}}) : nullptr;
 }
 
-Letter letterOf(FieldsFound found) { return {{}, std::move(found.fields), std::move(found.missing)}; }
+Letter letterOf(FieldsFound found) {
+    return {{}, std::move(found.fields), std::move(found.missing), std::move(found.warnings)};
+}
 
 } // namespace
 
-std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace) {
+std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace,
+                                ReadingRules const& rules) {
     bool const severalLetters = maySeparateLetters(preset.zones());
     int const firstPage = preset.skipFirstPage() ? 2 : 1;
     std::vector<Letter> letters;
     for (int page = firstPage; page <= document.pageCount(); ++page) {
         if (letters.empty() || severalLetters) {
             PageTrace* const pageTrace = traceOf(page, trace);
-            FieldsFound found = searchPage(document, page, preset, pageTrace);
+            FieldsFound found = searchPage(document, page, preset, rules, pageTrace);
             bool const begins = letters.empty() || found.isMarked;
             if (pageTrace)
                 pageTrace->beginsLetter = begins;
@@ -60,8 +64,9 @@ std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& pr
     return letters;
 }
 
-Letter readGivenTexts(std::string const& document, std::span<GivenText const> texts, PageTrace* trace) {
-    FieldSearch search(document, trace);
+Letter readGivenTexts(std::string const& document, std::span<GivenText const> texts, PageTrace* trace,
+                      ReadingRules const& rules) {
+    FieldSearch search(document, rules, trace);
     for (GivenText const& given : texts)
         search.search(*given.zone, ZoneText::given(given.text));
     return letterOf(search.finish());

@@ -2,6 +2,7 @@
 // Letters out of a document: where they begin, and what an extraction preset finds in them.
 
 #include "programs/reader/document.h"
+#include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
 
 #include "vlservice/extract/extract_preset.h"
@@ -20,6 +21,8 @@ struct Letter {
     Cfg::ExtractedFields fields;
     /// The obligatory fields that it does not have.
     std::vector<std::string> missing;
+    /// What a person should know of its values, one line each.
+    std::vector<std::string> warnings;
 };
 
 /// Each field with a mark other than None and SingleLetter that is found on a page begins a letter there;
@@ -27,7 +30,8 @@ struct Letter {
 /// SingleLetter, the document is one letter. With skipFirstPage() the first page belongs to none. Without a
 /// trace none of its texts is made. Throws Error when a page cannot be read, and what
 /// FieldSearch::search() does.
-std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr);
+std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr,
+                                ReadingRules const& rules = {});
 
 /// The text that stands in a zone, instead of a page that has it there.
 struct GivenText {
@@ -38,7 +42,7 @@ struct GivenText {
 /// A letter out of the texts of its zones, searched as those of a page are. Nothing of such a text has a
 /// place or a width, so that no match is too wide. Throws what FieldSearch::search() does.
 Letter readGivenTexts(std::string const& document, std::span<GivenText const> texts,
-                      PageTrace* trace = nullptr);
+                      PageTrace* trace = nullptr, ReadingRules const& rules = {});
 
 /// What a preset says about lines and blocks.
 LayoutRules rulesOf(Cfg::ExtractPreset const& preset);

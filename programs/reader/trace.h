@@ -28,6 +28,8 @@ struct FieldTrace {
     std::optional<std::string> failure = {};
     /// The value, a copy; null when the field yields nothing.
     std::shared_ptr<Cfg::ExtractedField const> value;
+    /// What a person should know of how the text became the value, one line; mostly empty.
+    std::string doubt;
     /// The value is the one of its name that a letter takes: the first that was found, or else the first
     /// default.
     bool counts = false;

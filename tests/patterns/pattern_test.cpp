@@ -50,6 +50,16 @@ TEST(PatternUse, KnowsItsGroups) {
     EXPECT_FALSE(date.fitsWithGroup("x", "day"));
 }
 
+TEST(PatternUse, TellsWhereAPatternFitsInBytes) {
+    auto const place = Patterns::Pattern("\xC3\xA4+b?", Use::Extract).find("x\xC3\xB6\xC3\xA4\xC3\xA4 b");
+    ASSERT_TRUE(place);
+    EXPECT_EQ(place->offset, 3u);
+    EXPECT_EQ(place->length, 4u);
+    EXPECT_FALSE(Patterns::Pattern("b", Use::Extract).find("a"));
+    EXPECT_FALSE(Patterns::Pattern("(a+)+b", Use::Extract).find(std::string(1000, 'a')));
+    EXPECT_FALSE(Patterns::Pattern("a", Use::Extract).find("\xFF"));
+}
+
 TEST(PatternUse, EndsWithinItsBudget) {
     std::string const run(1000, 'a');
     EXPECT_EQ(Patterns::Pattern("(a+)+b", Use::Validate).fits(run), Answer::TooHard);

@@ -63,6 +63,8 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         table.print(out, 4);
     for (std::string const& name : letter.missing)
         out << "    missing, although obligatory: " << name << '\n';
+    for (std::string const& warning : letter.warnings)
+        out << "    look at " << warning << '\n';
 }
 
 void printLetters(std::ostream& out, DocumentReading const& reading) {

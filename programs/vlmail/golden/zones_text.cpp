@@ -66,12 +66,13 @@ DocumentReading readZonesText(std::string const& text, std::string const& docume
     std::vector<Reader::GivenText> texts;
     for (ZoneSection& section : sectionsOf(text))
         texts.push_back({&zoneNamed(section.name, extractPreset), std::move(section.text)});
-    Reader::Letter letter = Reader::readGivenTexts(documentName, texts);
+    Reader::Letter letter =
+        Reader::readGivenTexts(documentName, texts, nullptr, Reader::ReadingRules::of(packPreset));
     DocumentReading reading;
     reading.document = documentName;
     reading.extractPreset = extractPreset.strRegex();
     reading.packPreset = packPreset.name();
-    reading.letters = {{{}, std::move(letter.fields), std::move(letter.missing)}};
+    reading.letters = {{{}, std::move(letter.fields), std::move(letter.missing), std::move(letter.warnings)}};
     return reading;
 }
 

@@ -28,11 +28,29 @@ constexpr char const* FIELDS_KEY = "fields";
 constexpr char const* READY_KEY = "production_ready";
 constexpr char const* MESSAGE_KEY = "message";
 constexpr char const* MISSING_KEY = "missing";
+constexpr char const* WARNINGS_KEY = "warnings";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
 constexpr char const* TRACE_KEY = "trace";
 
 json::Value nameOrNull(Cfg::ExtractedField const* field) {
     return field ? json::Value(field->name()) : json::Value(json_null());
+}
+
+void setUnlessEmpty(json::Object& object, char const* key, std::vector<std::string> const& texts) {
+    if (texts.empty())
+        return;
+    json::Array array;
+    for (std::string const& text : texts)
+        array.append(text);
+    object.set(key, array);
+}
+
+std::vector<std::string> textsOf(json::Value const& array) {
+    std::vector<std::string> texts;
+    if (array)
+        for (json::Value const& text : array.toArray())
+            texts.push_back(text.toString());
+    return texts;
 }
 
 json::Object toJson(LetterReading const& letter) {
@@ -43,12 +61,8 @@ json::Object toJson(LetterReading const& letter) {
                         {READY_KEY, ready},
                         {MESSAGE_KEY, message},
                         {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
-    if (letter.missing.empty())
-        return object;
-    json::Array missing;
-    for (std::string const& name : letter.missing)
-        missing.append(name);
-    object.set(MISSING_KEY, missing);
+    setUnlessEmpty(object, MISSING_KEY, letter.missing);
+    setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
     return object;
 }
 
@@ -60,13 +74,13 @@ json::Value lettersToJson(std::vector<LetterReading> const& letters) {
 }
 
 LetterReading letterFrom(json::Object const& object) {
-    LetterReading letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
+    LetterReading letter{{},
+                         Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()),
+                         textsOf(object.get(MISSING_KEY)),
+                         {},
+                         textsOf(object.get(WARNINGS_KEY))};
     for (json::Value const& page : object.get(PAGES_KEY).toArray())
         letter.pages.push_back(static_cast<int>(page.toInt()));
-    if (json::Value const missing = object.get(MISSING_KEY)) {
-        for (json::Value const& name : missing.toArray())
-            letter.missing.push_back(name.toString());
-    }
     return letter;
 }
 
@@ -102,10 +116,12 @@ findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings c
 }
 
 std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPreset const& preset,
-                                     Reader::Trace* trace) {
+                                     Cfg::PackPreset const& packPreset, Reader::Trace* trace) {
     std::vector<LetterReading> letters;
-    for (Reader::Letter& letter : Reader::readLetters(document, preset, trace))
-        letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing)});
+    Reader::ReadingRules const rules = Reader::ReadingRules::of(packPreset);
+    for (Reader::Letter& letter : Reader::readLetters(document, preset, trace, rules))
+        letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing), {},
+                           std::move(letter.warnings)});
     return letters;
 }
 
@@ -135,7 +151,7 @@ void readLetters(ReadResult& result, Reader::Document& document, Cfg::Presets co
         return;
     requirePatterns(extractPreset, settings);
     Reader::Trace trace;
-    reading.letters = lettersOf(document, extractPreset, along.afterReading ? &trace : nullptr);
+    reading.letters = lettersOf(document, extractPreset, packPreset, along.afterReading ? &trace : nullptr);
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, trace, place});
     if (along.pages == Along::Pages::Yes)

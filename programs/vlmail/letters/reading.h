@@ -36,6 +36,8 @@ struct LetterReading {
     std::vector<std::string> missing = {};
     /// Its pages in their order, when they were asked for; none of a letter that cannot go out.
     std::vector<PageBlob> blobs = {};
+    /// What a person should know of the values, one line each.
+    std::vector<std::string> warnings = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -61,8 +63,8 @@ struct DocumentReading {
     bool isAttachment() const { return !failed() && !letters; }
 
     /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
-    /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and "missing" when
-    /// it misses obligatory fields.
+    /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and where there are
+    /// any "missing", the names of obligatory fields, and "warnings".
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);

@@ -136,6 +136,13 @@ void checkPatterns(PresetsDocument const& document, Findings& findings) {
         checkPattern(field.json.get("value_match").textOrEmpty(), Use::Validate, field.place / "value_match",
                      findings);
     });
+    for (ListedPackPreset const& pack : document.packPresets()) {
+        std::vector<Reader::RulesFault> faults;
+        auto const rules = Reader::ReadingRules::from(pack.json.get(Reader::ReadingRules::KEY), faults);
+        for (auto const& [name, zone] : rules.zones)
+            checkPattern(zone.anchor, Use::Extract,
+                         pack.place / Reader::ReadingRules::KEY / "zones" / name / "anchor", findings);
+    }
 }
 
 void checkValueGroups(PresetsDocument const& document, Findings& findings) {

@@ -203,15 +203,17 @@ void checkNumbersWithoutMinimum(PresetsDocument const& document, Findings& findi
 }
 
 void checkDecimalCommas(PresetsDocument const& document, Findings& findings) {
-    forEachReadableField(document, [&](ListedField const& listed, Cfg::ExtractField const& field) {
-        // The pattern that holds where none is written takes commas for separators of thousands.
-        bool const hasOwnPattern = !listed.json.get("value_match").textOrEmpty().empty();
-        if (!isNumber(field.validation().valueType()) || !hasOwnPattern)
-            return;
-        if (auto const misread = misreadDecimalComma(field))
-            findings.add(DecimalComma, listed.place / "value_match",
-                         {inQuotes(misread->text), shown(misread->number)});
-    });
+    forEachField(
+        document, [&](ListedExtractPreset const& preset, ListedZone const&, ListedField const& listed) {
+            // The pattern that holds where none is written takes commas for separators of thousands.
+            bool const hasOwnPattern = !listed.json.get("value_match").textOrEmpty().empty();
+            if (!hasOwnPattern || !listed.field || !isNumber(listed.field->validation().valueType()) ||
+                readingRulesFor(document, preset).numbers.kind != Reader::NumberRules::Decimal::Plain)
+                return;
+            if (auto const misread = misreadDecimalComma(*listed.field))
+                findings.add(DecimalComma, listed.place / "value_match",
+                             {inQuotes(misread->text), shown(misread->number)});
+        });
 }
 
 } // namespace VlMail

@@ -1,6 +1,7 @@
 #pragma once
 // The checks of settings. Each looks at the whole document and adds what it finds; none depends on another.
 
+#include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/finding.h"
 #include "programs/vlmail/presets/presets_document.h"
 
@@ -46,6 +47,12 @@ void checkDefaults(PresetsDocument const& document, Findings& findings);
 void checkDatesWithoutYear(PresetsDocument const& document, Findings& findings);
 void checkNumbersWithoutMinimum(PresetsDocument const& document, Findings& findings);
 void checkDecimalCommas(PresetsDocument const& document, Findings& findings);
+
+// check_reading.cpp
+void checkReadingRules(PresetsDocument const& document, Findings& findings);
+void checkReadingOfFields(PresetsDocument const& document, Findings& findings);
+/// How the documents that get this preset are read; what is wrong there counts as not said.
+Reader::ReadingRules readingRulesFor(PresetsDocument const& document, ListedExtractPreset const& preset);
 
 /// Calls `look` with each preset, zone and field.
 template<typename Look>

@@ -190,7 +190,18 @@ constexpr FindingWords WORDS[] = {
     {DecimalComma, "decimal-comma", Warning,
      "a number with a decimal comma, such as {0}, passes and is read as {1}: commas are skipped, and reading ends at what "
      "is no number",
-     "let \"value_match\" take a comma only in front of three digits"},
+     "say \"decimal\" in the \"reading\" of the pack preset, or let \"value_match\" take a comma only in front of three "
+     "digits"},
+
+    {ReadingRefused, "reading-refused", Error,
+     "{0}: no document that is sent by this pack preset can be read",
+     "{1}"},
+    {ReadingZoneMissing, "reading-zone-missing", Error,
+     "no extraction preset that names this pack preset has a zone {0}: what is said about it changes nothing",
+     "{1}"},
+    {ReadingAgainstMatch, "reading-against-match", Error,
+     "\"reading\" hands a number on as 1234.56, and the pattern fits no such number: every value with decimals is refused",
+     "remove \"value_match\", or write one for numbers with a decimal point and without separators"},
     // clang-format on
 };
 

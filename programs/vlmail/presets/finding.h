@@ -74,6 +74,10 @@ enum class FindingKind {
     DateWithoutYear,
     NumberWithoutMinimum,
     DecimalComma,
+    // How documents are read.
+    ReadingRefused,
+    ReadingZoneMissing,
+    ReadingAgainstMatch,
     COUNT_,
 };
 

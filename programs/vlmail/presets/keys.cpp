@@ -121,6 +121,8 @@ constexpr KeyRow PACK_PRESET_ROWS[] = {
     {"letterheads", Records, Checked, &LETTERHEAD},
     {"last_used", Int64},
     {"erase_me", Flag},
+    // Looked at by checkReadingRules.
+    {"reading", Any},
     {"purchase_order", Any, Dropped},
     {"add_docs", Any, Dropped},
     {"account", Any, Dropped},

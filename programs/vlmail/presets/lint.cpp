@@ -14,7 +14,7 @@ constexpr Check CHECKS[] = {
     checkZonesApart,      checkZoneFields,       checkFieldsCoexist,
     checkAddresses,       checkFieldAttributes,  checkLimits,
     checkDefaults,        checkDatesWithoutYear, checkNumbersWithoutMinimum,
-    checkDecimalCommas,
+    checkDecimalCommas,   checkReadingRules,     checkReadingOfFields,
 };
 
 } // namespace

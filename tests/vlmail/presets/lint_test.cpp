@@ -503,14 +503,16 @@ std::vector<Case> const CASES{
      {"warning /extract_presets/0/zones/0/fields/1/value_match: a number with a decimal comma, such as "
       "\"1.234,56\", passes and is read as 1.23456: commas are skipped, and reading ends at what is no "
       "number | "
-      "let \"value_match\" take a comma only in front of three digits [decimal-comma]"}},
+      "say \"decimal\" in the \"reading\" of the pack preset, or let \"value_match\" take a comma only in "
+      "front of three digits [decimal-comma]"}},
     {"ADecimalCommaInAnInteger",
      partWithField(
          R"_({"name": "cents", "value_extract": "^Total: (?<VAL>\\d+,\\d\\d)$", "value_type": 1, "value_match": "\\d+,\\d\\d", "value_min": 0})_"),
      {"warning /extract_presets/0/zones/0/fields/1/value_match: a number with a decimal comma, such as "
       "\"1234,56\", passes and is read as 123456: commas are skipped, and reading ends at what is no number "
       "| "
-      "let \"value_match\" take a comma only in front of three digits [decimal-comma]"}},
+      "say \"decimal\" in the \"reading\" of the pack preset, or let \"value_match\" take a comma only in "
+      "front of three digits [decimal-comma]"}},
     {"NothingInARealWhoseCommasSeparateThousands",
      partWithField(
          R"_({"name": "total", "value_extract": "^Total: (?<VAL>.*)$", "value_type": 2, "value_match": "\\d{1,3}(,\\d{3})*(\\.\\d\\d)?", "value_min": 0})_"),
@@ -519,6 +521,54 @@ std::vector<Case> const CASES{
      partWithField(
          R"_({"name": "total", "value_extract": "^Total: (?<VAL>[\\d.]+)$", "value_type": 2, "value_match": ".*", "value_min": 0})_"),
      {}},
+    {"NothingInADecimalCommaThatIsReadAsOne",
+     partOf(
+         presetWith(zoneWith(
+             R"_({"name": "total", "value_extract": "^Total: (?<VAL>\\S+)$", "value_type": 2, "value_match": "[\\d.,]+", "value_min": 0})_")),
+         R"_({"name": "P", "reading": {"decimal": ",", "grouping": ".", "months": "nl", "zones": {"Z": {"page": "last", "anchor": "^Sum", "column": true}}}})_"),
+     {}},
+    {"AReadingThatCannotBeUsed",
+     partOf(
+         presetWith(zoneWith("")),
+         R"_({"name": "P", "reading": {"decimal": ".", "grouping": ".'", "months": "Dutch", "zones": {"Z": {"page": 99999, "anchor": "(a+)+b", "colum": true}}}})_"),
+     {"error /pack_presets/0/reading/grouping: \".\" is the decimal character too: no document that is sent "
+      "by "
+      "this pack preset can be read | take it out of one of the two [reading-refused]",
+      "error /pack_presets/0/reading/months: is no language whose names of months are known: no document "
+      "that is "
+      "sent by this pack preset can be read | write its code, such as \"de\", \"fr\" or \"nl\" "
+      "[reading-refused]",
+      "error /pack_presets/0/reading/zones/Z/anchor: the pattern runs away on a text such as "
+      "\"aaaaaaaaaaaaaaaaaaaaaaaa...\": in such a letter the field is not found and yields its default, or "
+      "nothing | "
+      "repeat nothing that is repeated inside, and let neighbouring repetitions take different characters "
+      "[runaway-pattern]",
+      "error /pack_presets/0/reading/zones/Z/colum: \"colum\" is no key here: no document that is sent by "
+      "this pack "
+      "preset can be read | write one of \"page\", \"anchor\", \"column\" [reading-refused]",
+      "error /pack_presets/0/reading/zones/Z/page: is no page of a letter: no document that is sent by this "
+      "pack "
+      "preset can be read | write 1, 2 and so on, \"last\" or \"any\" [reading-refused]"}},
+    {"AZoneThatIsReadAndNotThere",
+     partOf(presetWith(zoneWith("")),
+            R"_({"name": "P", "reading": {"zones": {"z": {"page": 2}, "Other": {}}}})_"),
+     {"error /pack_presets/0/reading/zones/Other: no extraction preset that names this pack preset has a "
+      "zone "
+      "\"Other\": what is said about it changes nothing | write the name of a zone, or remove it "
+      "[reading-zone-missing]",
+      "error /pack_presets/0/reading/zones/z: no extraction preset that names this pack preset has a zone "
+      "\"z\": "
+      "what is said about it changes nothing | write \"Z\" [reading-zone-missing]"}},
+    {"AReadingAgainstAPattern",
+     partOf(
+         presetWith(zoneWith(
+             R"_({"name": "total", "value_extract": "^Total: (?<VAL>\\S+)$", "value_type": 2, "value_match": "\\d+,\\d\\d", "value_min": 0})_")),
+         R"_({"name": "P", "reading": {"decimal": "auto"}})_"),
+     {"error /extract_presets/0/zones/0/fields/1/value_match: \"reading\" hands a number on as 1234.56, and "
+      "the "
+      "pattern fits no such number: every value with decimals is refused | remove \"value_match\", or write "
+      "one for "
+      "numbers with a decimal point and without separators [reading-against-match]"}},
     {"NothingInANumberThatCannotBeBlank",
      partWithField(R"_({"name": "cents", "value_extract": "^Total: (?<VAL>\\d+)$", "value_type": 1})_"),
      {}},
