@@ -18,6 +18,7 @@
 #include "vlservice/extract/extracted_field.h"
 #include "vlservice/extract/extracted_fields.h"
 #include "vlservice/extract/ignore_on_group.h"
+#include "vlservice/extract/match_time.h"
 #include "vlservice/extract/regex_cache.h"
 #include "vlservice/ipc/cfg_ids_for_user.h"
 #include "vlservice/ipc/cfg_ids_tree.h"

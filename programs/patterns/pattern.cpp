@@ -1,5 +1,6 @@
 #include "programs/patterns/pattern.h"
 
+#include "programs/base/utf8.h"
 #include "programs/patterns/paying_iterator.h"
 #include "vlservice/extract/compile_pattern.h"
 
@@ -24,14 +25,6 @@ std::string reasonOf(boost::regex_error const& error) {
     if (reason.ends_with('.'))
         reason.pop_back();
     return reason;
-}
-
-/// What so many characters at the text's start take.
-std::size_t bytesOf(std::string_view text, std::size_t characters) {
-    std::size_t bytes = 0;
-    while (bytes < text.size() && ((text[bytes] & 0xC0) == 0x80 || characters-- > 0))
-        ++bytes;
-    return bytes;
 }
 
 } // namespace
@@ -102,9 +95,11 @@ std::optional<Pattern::Place> Pattern::find(std::string_view text, std::size_t b
         Groups groups;
         if (compiled_->run(use_, Cfg::decode(text), purse, groups) != Answer::Yes)
             return std::nullopt;
-        std::size_t const begin = bytesOf(text, static_cast<std::size_t>(groups.position()));
-        std::size_t const length = bytesOf(text.substr(begin), static_cast<std::size_t>(groups.length()));
-        return Place{begin, length};
+        auto const bytesOf = [](std::string_view in, std::ptrdiff_t characters) {
+            return Base::firstCharacters(in, static_cast<std::size_t>(characters)).size();
+        };
+        std::size_t const begin = bytesOf(text, groups.position());
+        return Place{begin, bytesOf(text.substr(begin), groups.length())};
     } catch (std::out_of_range const&) {
         return std::nullopt;
     }

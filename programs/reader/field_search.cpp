@@ -28,6 +28,11 @@ ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, Fiel
     };
 }
 
+std::string inSeconds(std::chrono::milliseconds time) {
+    std::string const rest = std::to_string(1000 + time.count() % 1000).substr(1);
+    return std::to_string(time.count() / 1000) + (rest == "000" ? "" : '.' + rest) + " s";
+}
+
 } // namespace
 
 FieldTrace const* PageTrace::counting(std::string const& name) const {
@@ -38,20 +43,22 @@ FieldTrace const* PageTrace::counting(std::string const& name) const {
     return nullptr;
 }
 
-FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, PageTrace* trace)
-    : document_(std::move(document)), rules_(rules), trace_(trace) {}
+FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time, PageTrace* trace)
+    : document_(std::move(document)), rules_(rules), time_(time), trace_(trace) {}
 
 void FieldSearch::search(Cfg::ExtractZone const& zone, ZoneText text) {
     if (trace_)
         trace_->zones.push_back({&zone, text.text(), text.box(), text.blocks(), {}});
-    for (ExtractField const& field : zone.fields())
+    for (ExtractField const& field : zone.fields()) {
         search(field, text);
+        requireTime(field);
+    }
 }
 
 void FieldSearch::search(ExtractField const& field, ZoneText& text) {
     FieldTrace* const trace = trace_ ? &trace_->zones.back().fields.emplace_back() : nullptr;
     Yield yield;
-    yield.value = cutField(field, text, trace);
+    yield.value = cutInTime(field, text, trace);
     if (!yield.value) {
         if (field.mustHave())
             found_.missing.push_back(field.name());
@@ -69,8 +76,28 @@ void FieldSearch::search(ExtractField const& field, ZoneText& text) {
     take(std::move(yield));
 }
 
+std::shared_ptr<ExtractedField> FieldSearch::cutInTime(ExtractField const& field, ZoneText& text,
+                                                       FieldTrace* trace) {
+    PatternTime::Turn turn(time_);
+    auto value = cutField(field, text, trace);
+    if (turn.isUp())
+        found_.warnings.push_back(field.name() + ": its pattern was given up, since it took longer than " +
+                                  inSeconds(time_.limits().field) +
+                                  "; \"vlmail presets lint\" tells what makes it slow");
+    return value;
+}
+
+/// The last field is as good as any to look at first: it took some of the time.
+void FieldSearch::requireTime(ExtractField const& field) const {
+    if (time_.isUp())
+        throw Base::Error(document_ + ": its patterns took longer than " +
+                          inSeconds(time_.limits().document) + ", that of the field \"" + field.name() +
+                          "\" last; run \"vlmail presets lint\" on the settings and correct the slow ones");
+}
+
 std::string FieldSearch::validate(ExtractField const& field, ExtractedField& value) const {
     try {
+        PatternTime::Turn turn(time_);
         return readValue(field, value, rules_);
     } catch (std::exception const& failure) {
         throw Base::Error(document_ + ": the value of field \"" + field.name() + "\" cannot be validated (" +

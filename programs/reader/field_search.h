@@ -1,6 +1,7 @@
 #pragma once
 // The fields of one letter, searched zone by zone.
 
+#include "programs/reader/pattern_time.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
 
@@ -27,13 +28,14 @@ struct FieldsFound {
 
 class FieldSearch {
 public:
-    /// `document` names it in messages; the rules must live as long as the search. With a trace the search
-    /// says there how it came about.
-    explicit FieldSearch(std::string document, ReadingRules const& rules, PageTrace* trace = nullptr);
+    /// `document` names it in messages; the rules and the time must live as long as the search. With a trace
+    /// the search says there how it came about.
+    FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time,
+                PageTrace* trace = nullptr);
 
     /// Searches the zone's fields, which take their lines out of the text one after the other. Throws Error
-    /// when a field's validation pattern fails; a failing extraction pattern is logged by the library and
-    /// finds nothing.
+    /// when a field's validation pattern fails, or the document's time for patterns is up; a failing
+    /// extraction pattern is logged by the library and finds nothing.
     void search(Cfg::ExtractZone const& zone, ZoneText text);
 
     FieldsFound finish();
@@ -49,12 +51,16 @@ private:
     };
 
     void search(Cfg::ExtractField const& field, ZoneText& text);
+    std::shared_ptr<Cfg::ExtractedField> cutInTime(Cfg::ExtractField const& field, ZoneText& text,
+                                                   FieldTrace* trace);
+    void requireTime(Cfg::ExtractField const& field) const;
     std::string validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
     void take(Yield yield);
     void traceWhatCounts();
 
     std::string document_;
     ReadingRules const& rules_;
+    PatternTime& time_;
     PageTrace* trace_;
     std::vector<Yield> yields_;
     FieldsFound found_;

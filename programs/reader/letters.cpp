@@ -25,10 +25,10 @@ bool maySeparateLetters(Cfg::ExtractZones const& zones) {
 }
 
 FieldsFound searchPage(Document& document, int number, Cfg::ExtractPreset const& preset,
-                       ReadingRules const& rules, PageTrace* trace) {
+                       ReadingRules const& rules, PatternTime& time, PageTrace* trace) {
     Page const& page = document.page(number);
     Layout const layout = layOut(page, rulesOf(preset));
-    FieldSearch search(document.name(), rules, trace);
+    FieldSearch search(document.name(), rules, time, trace);
     for (ExtractZone const& zone : preset.zones())
         search.search(zone, textOf(page, layout, zone));
     return search.finish();
@@ -45,14 +45,15 @@ Letter letterOf(FieldsFound found) {
 } // namespace
 
 std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace,
-                                ReadingRules const& rules) {
+                                ReadingRules const& rules, PatternLimits const& limits) {
+    PatternTime time(limits);
     bool const severalLetters = maySeparateLetters(preset.zones());
     int const firstPage = preset.skipFirstPage() ? 2 : 1;
     std::vector<Letter> letters;
     for (int page = firstPage; page <= document.pageCount(); ++page) {
         if (letters.empty() || severalLetters) {
             PageTrace* const pageTrace = traceOf(page, trace);
-            FieldsFound found = searchPage(document, page, preset, rules, pageTrace);
+            FieldsFound found = searchPage(document, page, preset, rules, time, pageTrace);
             bool const begins = letters.empty() || found.isMarked;
             if (pageTrace)
                 pageTrace->beginsLetter = begins;
@@ -66,7 +67,8 @@ std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& pr
 
 Letter readGivenTexts(std::string const& document, std::span<GivenText const> texts, PageTrace* trace,
                       ReadingRules const& rules) {
-    FieldSearch search(document, rules, trace);
+    PatternTime time;
+    FieldSearch search(document, rules, time, trace);
     for (GivenText const& given : texts)
         search.search(*given.zone, ZoneText::given(given.text));
     return letterOf(search.finish());

@@ -2,6 +2,7 @@
 // Letters out of a document: where they begin, and what an extraction preset finds in them.
 
 #include "programs/reader/document.h"
+#include "programs/reader/pattern_time.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
 
@@ -31,7 +32,7 @@ struct Letter {
 /// trace none of its texts is made. Throws Error when a page cannot be read, and what
 /// FieldSearch::search() does.
 std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr,
-                                ReadingRules const& rules = {});
+                                ReadingRules const& rules = {}, PatternLimits const& limits = {});
 
 /// The text that stands in a zone, instead of a page that has it there.
 struct GivenText {

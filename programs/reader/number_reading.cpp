@@ -1,9 +1,10 @@
 #include "programs/reader/number_reading.h"
 
+#include "programs/base/utf8.h"
+
 #include "vlservice/json/json_text.h"
 
 #include <unicode/uchar.h>
-#include <unicode/unistr.h>
 
 #include <algorithm>
 #include <optional>
@@ -15,11 +16,10 @@ namespace {
 
 using Text = std::u32string;
 
-Text decoded(std::string const& utf8) {
-    icu::UnicodeString const text = icu::UnicodeString::fromUTF8(utf8);
+Text decoded(std::string_view utf8) {
     Text points;
-    for (int at = 0; at < text.length(); at = text.moveIndex32(at, 1))
-        points += static_cast<char32_t>(text.char32At(at));
+    for (std::size_t at = 0; at < utf8.size();)
+        points += Base::nextCharacter(utf8, at);
     return points;
 }
 

@@ -1,10 +1,10 @@
 #include "programs/reader/reading_rules.h"
 
 #include "programs/base/error.h"
+#include "programs/base/quoting.h"
+#include "programs/base/utf8.h"
 #include "programs/patterns/pattern.h"
 #include "programs/reader/month_names.h"
-
-#include <unicode/unistr.h>
 
 #include <algorithm>
 #include <array>
@@ -26,13 +26,12 @@ constexpr char const* ANCHOR = "anchor";
 constexpr char const* COLUMN = "column";
 constexpr std::array ZONE_KEYS{PAGE, ANCHOR, COLUMN};
 
-std::string inQuotes(std::string const& text) { return '"' + text + '"'; }
+using Base::inQuotes;
 
-std::vector<std::string> charactersOf(std::string const& utf8) {
-    icu::UnicodeString const text = icu::UnicodeString::fromUTF8(utf8);
+std::vector<std::string> charactersOf(std::string_view text) {
     std::vector<std::string> characters;
-    for (int at = 0; at < text.length(); at = text.moveIndex32(at, 1))
-        icu::UnicodeString(text.char32At(at)).toUTF8String(characters.emplace_back());
+    for (; !text.empty(); text.remove_prefix(characters.back().size()))
+        characters.emplace_back(Base::firstCharacters(text, 1));
     return characters;
 }
 

@@ -1,6 +1,7 @@
 #include "programs/reader/value_reading.h"
 
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
+#include "programs/base/quoting.h"
 #include "programs/reader/month_names.h"
 #include "programs/reader/number_reading.h"
 
@@ -13,7 +14,7 @@ namespace {
 using Cfg::ExtractedField;
 using Cfg::ExtractField;
 
-std::string inQuotes(std::string const& text) { return '"' + Base::onOneLine(text) + '"'; }
+std::string inQuotes(std::string const& text) { return Base::inQuotes(Base::plainLine(text)); }
 
 /// Whether the field takes the value in that form; then it has it.
 bool take(ExtractField const& field, std::string const& form, ExtractedField& value) {
@@ -58,7 +59,7 @@ std::string readPlainNumber(ExtractField const& field, ExtractedField& value) {
     field.validate(value);
     std::string const doubt = value.isValid() ? doubtAbout(text, value.rawValue()) : std::string();
     return doubt.empty() ? doubt
-                         : inQuotes(text) + ' ' + Base::onOneLine(doubt) +
+                         : inQuotes(text) + ' ' + Base::plainLine(doubt) +
                                "; say in \"reading\" of the pack preset how numbers are written";
 }
 

@@ -6,6 +6,7 @@
 
 #include <gmock/gmock.h>
 
+#include <chrono>
 #include <vector>
 
 namespace Reader {
@@ -356,6 +357,42 @@ TEST(GivenTexts, HaveNoWidthAndTheirLinesAreCut) {
     EXPECT_EQ(all.rawText, std::string(MAX_LINE_LENGTH, 'x'));
     EXPECT_FALSE(all.isTooWide);
     EXPECT_TRUE(all.counts);
+}
+
+constexpr char const* RUNAWAY_FIELDS = R"_([
+    {"name": "a", "value_extract": "(?<VAL>.*.*.*.*.*:)"},
+    {"name": "b", "value_extract": "(?<VAL>.*.*.*.*.*:)"},
+    {"name": "c", "value_extract": "(?<VAL>x)"}])_";
+
+/// So long that a pattern tries more ways than there is time for.
+std::string longText() { return std::string(900, 'x'); }
+
+TEST(PatternTimes, EndAFieldAndGoOn) {
+    Cfg::ExtractPreset const preset = presetWith(RUNAWAY_FIELDS);
+    Document document = openDocument(longText(), "a.txt");
+    using std::chrono_literals::operator""ms;
+    auto const letters = readLetters(document, preset, nullptr, {}, {50ms, 60'000ms});
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("c", "\"x\"")));
+    EXPECT_THAT(
+        letters.at(0).warnings,
+        ElementsAre("a: its pattern was given up, since it took longer than 0.050 s; \"vlmail presets lint\" "
+                    "tells what makes it slow",
+                    "b: its pattern was given up, since it took longer than 0.050 s; \"vlmail presets lint\" "
+                    "tells what makes it slow"));
+}
+
+TEST(PatternTimes, EndADocumentInOneLine) {
+    Cfg::ExtractPreset const preset = presetWith(RUNAWAY_FIELDS);
+    Document document = openDocument(longText(), "a.txt");
+    using std::chrono_literals::operator""ms;
+    try {
+        readLetters(document, preset, nullptr, {}, {60'000ms, 50ms});
+        FAIL() << "no failure";
+    } catch (Base::Error const& error) {
+        EXPECT_STREQ(error.what(), "a.txt: its patterns took longer than 0.050 s, that of the field \"a\" "
+                                   "last; run \"vlmail presets "
+                                   "lint\" on the settings and correct the slow ones");
+    }
 }
 
 } // namespace

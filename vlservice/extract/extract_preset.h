@@ -54,6 +54,8 @@ public:
     bool match(std::string const& name) const;
     /// The same with an expression that is compiled for this one call.
     static bool match(std::string const& regex, std::string const& name);
+    /// Whether the expression was compiled, and so goes on answering whatever is set or assigned.
+    bool isCompiled() const { return compiledMatch_.isFilled(); }
 
     /// Equality of what the preset does: all but name, expression, order and pack preset. The time of the
     /// last use counts.

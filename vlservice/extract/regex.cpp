@@ -1,11 +1,13 @@
 #include "vlservice/extract/regex.h"
 
 #include "vlservice/extract/compile_pattern.h"
+#include "vlservice/extract/match_clock.h"
 
 #include <unicode/uclean.h>
 
 #include <cstddef>
 #include <cstdlib>
+#include <iterator>
 #include <utility>
 
 extern "C" {
@@ -20,11 +22,56 @@ namespace {
 // users.
 [[maybe_unused]] int const CLEANUP_AT_EXIT = std::atexit(releaseUnicodeTables);
 
-// The matchers run on decoding iterators as they are: the engine's own wrappers for UTF-8 copy all groups
-// once more.
-using Groups = boost::match_results<Decoder>;
+/// Decodes UTF-8 and tells the clock of each step. The matchers run on it as it is: the engine's own wrappers
+/// for UTF-8 copy all groups once more.
+class ClockedDecoder {
+public:
+    using iterator_category = std::bidirectional_iterator_tag;
+    using value_type = UChar32;
+    using difference_type = std::ptrdiff_t;
+    using pointer = UChar32 const*;
+    using reference = UChar32;
 
-std::string_view piece(boost::sub_match<Decoder> const& group) {
+    ClockedDecoder() = default;
+    ClockedDecoder(char const* at, char const* first, char const* last) : decoder_(at, first, last) {}
+
+    UChar32 operator*() const { return *decoder_; }
+    ClockedDecoder& operator++() {
+        matchClock.step();
+        ++decoder_;
+        return *this;
+    }
+    ClockedDecoder operator++(int) {
+        ClockedDecoder const before = *this;
+        ++*this;
+        return before;
+    }
+    ClockedDecoder& operator--() {
+        matchClock.step();
+        --decoder_;
+        return *this;
+    }
+    ClockedDecoder operator--(int) {
+        ClockedDecoder const before = *this;
+        --*this;
+        return before;
+    }
+    friend bool operator==(ClockedDecoder const& a, ClockedDecoder const& b) {
+        return a.decoder_ == b.decoder_;
+    }
+    friend bool operator!=(ClockedDecoder const& a, ClockedDecoder const& b) {
+        return a.decoder_ != b.decoder_;
+    }
+
+    char const* base() const { return decoder_.base(); }
+
+private:
+    Decoder decoder_;
+};
+
+using Groups = boost::match_results<ClockedDecoder>;
+
+std::string_view piece(boost::sub_match<ClockedDecoder> const& group) {
     char const* const first = group.first.base();
     return {first, static_cast<std::size_t>(group.second.base() - first)};
 }
@@ -62,7 +109,7 @@ std::optional<FieldRegex::Found> FieldRegex::search(std::string_view text, std::
     char const* const first = text.data();
     char const* const last = first + text.size();
     Groups groups;
-    if (!boost::regex_search(Decoder(first, first, last), Decoder(last, first, last), groups,
+    if (!boost::regex_search(ClockedDecoder(first, first, last), ClockedDecoder(last, first, last), groups,
                              compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return Found{piece(groups[0]), groupNamed(groups, group)};
@@ -72,8 +119,8 @@ std::optional<RegexGroups> FieldRegex::match(std::string_view text) const {
     char const* const first = text.data();
     char const* const last = first + text.size();
     auto found = std::make_unique<RegexGroups::Results>();
-    if (!boost::regex_match(Decoder(first, first, last), Decoder(last, first, last), found->groups,
-                            compiled_->regex, boost::match_not_dot_newline))
+    if (!boost::regex_match(ClockedDecoder(first, first, last), ClockedDecoder(last, first, last),
+                            found->groups, compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return RegexGroups(std::move(found));
 }
@@ -83,8 +130,8 @@ struct NameRegex::Compiled {
 };
 
 NameRegex::NameRegex(std::string_view pattern)
-    : compiled_(
-          new Compiled{compilePattern(pattern, boost::regex_constants::perl | boost::regex_constants::icase)}) {}
+    : compiled_(new Compiled{
+          compilePattern(pattern, boost::regex_constants::perl | boost::regex_constants::icase)}) {}
 NameRegex::~NameRegex() = default;
 
 bool NameRegex::matches(std::string_view name) const {

@@ -31,6 +31,7 @@ public:
     /// From here on by the other's compiled pattern, or by none if it has none.
     void shareWith(RegexCache const& other) noexcept { compiled_ = other.compiled_; }
     void clear() noexcept { compiled_.reset(); }
+    bool isFilled() const noexcept { return compiled_ != nullptr; }
 
 private:
     mutable std::shared_ptr<Regex const> compiled_;

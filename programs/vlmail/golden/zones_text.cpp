@@ -72,7 +72,8 @@ DocumentReading readZonesText(std::string const& text, std::string const& docume
     reading.document = documentName;
     reading.extractPreset = extractPreset.strRegex();
     reading.packPreset = packPreset.name();
-    reading.letters = {{{}, std::move(letter.fields), std::move(letter.missing), std::move(letter.warnings)}};
+    reading.letters = {
+        {{}, std::move(letter.fields), std::move(letter.missing), {}, std::move(letter.warnings)}};
     return reading;
 }
 

@@ -3,6 +3,7 @@
 #include "programs/base/utf8.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/letters/worker_pool.h"
 #include "vlservice/json/json_text.h"
 
@@ -140,9 +141,10 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
                Along const& along, BatchWatcher& watcher,
                std::function<void(std::size_t, ReadResult)> const& take) {
     Cfg::Presets const presets = settings.presets();
+    PresetIndex const presetIndex(presets);
     runBatch(
         files.size(), workers, watcher,
-        [&](std::size_t index) { return readDocument(files[index], presets, settings, along, index + 1); },
+        [&](std::size_t at) { return readDocument(files[at], presetIndex, settings, along, at + 1); },
         [&](std::size_t index) { return files[index]; }, take);
 }
 

@@ -8,6 +8,7 @@
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/preset_index.h"
 
 #include "vlservice/pack/page_saver.h"
 
@@ -107,7 +108,7 @@ void requirePatterns(Cfg::ExtractPreset const& preset, NodeSettings const& setti
 }
 
 std::pair<Cfg::ExtractPreset const&, Cfg::PackPreset const&>
-findPresets(std::string const& name, Cfg::Presets const& presets, NodeSettings const& settings) {
+findPresets(std::string const& name, PresetIndex const& presets, NodeSettings const& settings) {
     try {
         return presets.findMatch(name);
     } catch (std::exception const& failure) {
@@ -120,7 +121,10 @@ std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPre
     std::vector<LetterReading> letters;
     Reader::ReadingRules const rules = Reader::ReadingRules::of(packPreset);
     for (Reader::Letter& letter : Reader::readLetters(document, preset, trace, rules))
-        letters.push_back({std::move(letter.pages), std::move(letter.fields), std::move(letter.missing), {},
+        letters.push_back({std::move(letter.pages),
+                           std::move(letter.fields),
+                           std::move(letter.missing),
+                           {},
                            std::move(letter.warnings)});
     return letters;
 }
@@ -141,7 +145,7 @@ void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document) {
         letter.blobs = blobsOf(document, letter);
 }
 
-void readLetters(ReadResult& result, Reader::Document& document, Cfg::Presets const& presets,
+void readLetters(ReadResult& result, Reader::Document& document, PresetIndex const& presets,
                  NodeSettings const& settings, Along const& along, std::size_t place) {
     DocumentReading& reading = result.reading;
     auto const& [extractPreset, packPreset] = findPresets(reading.document, presets, settings);
@@ -215,13 +219,13 @@ DocumentReading DocumentReading::fromJson(json::Object const& object) {
     return reading;
 }
 
-ReadResult readDocument(fs::path const& file, Cfg::Presets const& presets, NodeSettings const& settings,
+ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSettings const& settings,
                         Along const& along, std::size_t place) {
     ReadResult result;
     result.reading.document = file.filename().string();
     try {
         if (along.beforeReading)
-            along.beforeReading(result, presets);
+            along.beforeReading(result, presets.presets());
         std::string bytes = Base::readFile(file);
         result.sha256 = Base::sha256(bytes);
         Reader::Document document = Reader::openDocument(std::move(bytes), file);

@@ -21,6 +21,7 @@ struct Trace;
 namespace VlMail {
 
 class NodeSettings;
+class PresetIndex;
 
 /// A page of a document, compressed as containers and databases keep it.
 struct PageBlob {
@@ -104,7 +105,7 @@ struct Along {
 
 /// Reads a document as the settings say; `place` is among those of the batch, from 1. Failures are the
 /// reading's `error`; nothing derived from std::exception is thrown.
-ReadResult readDocument(std::filesystem::path const& file, Cfg::Presets const& presets,
+ReadResult readDocument(std::filesystem::path const& file, PresetIndex const& presets,
                         NodeSettings const& settings, Along const& along, std::size_t place);
 
 /// A document whose letters have been decided on.

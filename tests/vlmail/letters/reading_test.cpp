@@ -2,6 +2,7 @@
 
 #include "programs/reader/document.h"
 #include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "tests/support/temporary_folder.h"
 #include "vlservice/json/json_text.h"
 
@@ -33,7 +34,8 @@ protected:
     }
 
     ReadResult read(Along const& along) const {
-        return readDocument(file_, settings_.presets(), settings_, along, 1);
+        Cfg::Presets const presets = settings_.presets();
+        return readDocument(file_, PresetIndex(presets), settings_, along, 1);
     }
 
     TemporaryFolder folder_;

@@ -1,0 +1,44 @@
+#pragma once
+// Finds a document's presets among many, as Cfg::Presets does.
+
+#include "vlservice/presets/presets.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <utility>
+#include <vector>
+
+namespace VlMail {
+
+/// An index by three-letter pieces of what must stand in a name, in front of the presets' own matching.
+/// Whatever it does not understand is tried in its place: a preset with such an expression, and every preset
+/// for such a name. The part must outlive it and stay as it is. Not for use on several threads, as presets
+/// are not.
+class PresetIndex {
+public:
+    explicit PresetIndex(Cfg::Presets const& presets);
+    PresetIndex(PresetIndex const&) = delete;
+    PresetIndex& operator=(PresetIndex const&) = delete;
+
+    Cfg::Presets const& presets() const { return presets_; }
+    /// Gives and throws what Cfg::Presets::findMatch() does.
+    std::pair<Cfg::ExtractPreset const&, Cfg::PackPreset const&> findMatch(std::string const& name) const;
+
+private:
+    using Positions = std::vector<std::uint32_t>;
+
+    void add(std::vector<std::vector<std::vector<std::string>>> const& wordsOfPresets);
+    Positions candidates(std::string const& name) const;
+
+    Cfg::Presets const& presets_;
+    std::vector<Cfg::ExtractPreset const*> extractPresets_;
+    /// Of presets that are tried for every name; rising.
+    Positions always_;
+    std::unordered_map<std::uint32_t, Positions> byPiece_;
+    std::unordered_map<std::string_view, Cfg::PackPreset const*> packPresets_;
+};
+
+} // namespace VlMail

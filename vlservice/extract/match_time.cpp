@@ -1,0 +1,35 @@
+#include "vlservice/extract/match_time.h"
+
+#include "vlservice/extract/match_clock.h"
+
+#include <stdexcept>
+
+namespace Cfg {
+
+constinit thread_local MatchClock matchClock;
+
+void MatchClock::look() {
+    // Some 100 microseconds.
+    constexpr int STEPS = 1 << 14;
+    stepsToLook = STEPS;
+    if (deadline == Time::max() || std::chrono::steady_clock::now() < deadline)
+        return;
+    isUp = true;
+    throw std::runtime_error("The time for matching the regular expression is up.");
+}
+
+MatchTime::MatchTime(std::chrono::steady_clock::duration limit)
+    : outerDeadline_(matchClock.deadline), outerIsUp_(matchClock.isUp) {
+    matchClock.deadline = std::chrono::steady_clock::now() + limit;
+    matchClock.isUp = false;
+    matchClock.stepsToLook = 0;
+}
+
+MatchTime::~MatchTime() {
+    matchClock.deadline = outerDeadline_;
+    matchClock.isUp = outerIsUp_;
+}
+
+bool MatchTime::isUp() const { return matchClock.isUp; }
+
+} // namespace Cfg
