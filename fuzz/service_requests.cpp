@@ -25,6 +25,7 @@ struct MemoryService {
     VlServiced::JobStore jobs{database};
     VlServiced::JobRunner runner{jobs,
                                  {[](VlServiced::JobSurroundings::Work const&) {},
+                                  [](VlServiced::JobSurroundings::Work const&) {},
                                   [](VlServiced::JobSurroundings::Work const&) {}, [] { return 1LL; },
                                   [this] { return settings.service(); }, "/missing/outbox"}};
     std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(

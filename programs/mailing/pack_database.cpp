@@ -6,6 +6,7 @@
 
 #include <SQLiteCpp/Exception.h>
 
+#include <chrono>
 #include <ctime>
 #include <unordered_set>
 #include <utility>
@@ -45,6 +46,10 @@ constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
 /// More than any page needs, and a bound for what a forged database makes its reader allocate.
 constexpr int MAX_BLOB_BYTES = 256 << 20;
 constexpr std::size_t MAX_PACK_ID_BYTES = 128;
+/// The names of all pages of a pack together: a few million pages.
+constexpr std::size_t MAX_NAMES_BYTES = 256 << 20;
+/// For one page, or for the names of all.
+constexpr std::chrono::seconds OPERATION_TIME{10};
 
 template<typename Operation>
 decltype(auto) orDatabaseError(fs::path const& file, Operation operation) {
@@ -163,28 +168,35 @@ void PackDatabaseWriter::eraseUnfinished() {
 }
 
 PackDatabaseReader::PackDatabaseReader(fs::path const& file, std::string const& packId)
-    : PageLoaderI(packId), file_(file),
-      database_(Database::openForReading(file, packDatabase(), MAX_BLOB_BYTES)) {
-    orDatabaseError(file_, [&] {
+    : PageLoaderI(packId), file_(file, packDatabase(), MAX_BLOB_BYTES, OPERATION_TIME) {
+    orDatabaseError(file_.path(), [&] {
         readInfo();
         readPageNames();
     });
 }
 
 void PackDatabaseReader::readInfo() {
-    SQLite::Statement query(database_, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
+    SQLite::Statement query(file_.begin(),
+                            "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
     query.bind(1, packId());
     if (!query.executeStep())
-        throw Database::DatabaseError("the pack database " + file_.string() + " has no finished pack " +
-                                      packId());
+        throw Database::DatabaseError("the pack database " + file_.path().string() +
+                                      " has no finished pack " + packId());
     info_ = {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
 }
 
 void PackDatabaseReader::readPageNames() {
-    SQLite::Statement query(database_, "SELECT document, page FROM pages WHERE pack = ? ORDER BY position");
+    SQLite::Statement query(file_.begin(),
+                            "SELECT document, page FROM pages WHERE pack = ? ORDER BY position");
     query.bind(1, packId());
-    while (query.executeStep())
-        pages_.push_back({query.getColumn(0).getString(), query.getColumn(1).getString()});
+    std::size_t bytes = 0;
+    while (query.executeStep()) {
+        PageName const& name =
+            pages_.emplace_back(query.getColumn(0).getString(), query.getColumn(1).getString());
+        bytes += sizeof name + name.document.size() + name.page.size();
+        if (bytes > MAX_NAMES_BYTES)
+            throw Database::DatabaseError("pack " + packId() + " has more pages than a mailing can hold");
+    }
 }
 
 std::size_t PackDatabaseReader::documentCount() const {
@@ -197,8 +209,8 @@ std::size_t PackDatabaseReader::documentCount() const {
 void PackDatabaseReader::requestPageData(std::string const& document, std::string const& page,
                                          PageFunc func) {
     PageLoaderI::requestPageData(document, page, std::move(func));
-    SharedMemBuffer data = orDatabaseError(file_, [&] {
-        SQLite::Statement query(database_,
+    SharedMemBuffer data = orDatabaseError(file_.path(), [&] {
+        SQLite::Statement query(file_.begin(),
                                 "SELECT data FROM pages WHERE pack = ? AND document = ? AND page = ?");
         query.bindNoCopy(1, packId());
         query.bindNoCopy(2, document);
@@ -209,8 +221,8 @@ void PackDatabaseReader::requestPageData(std::string const& document, std::strin
 }
 
 SharedMemBuffer PackDatabaseReader::metadata() {
-    return orDatabaseError(file_, [&] {
-        SQLite::Statement query(database_, "SELECT metadata FROM packs WHERE id = ?");
+    return orDatabaseError(file_.path(), [&] {
+        SQLite::Statement query(file_.begin(), "SELECT metadata FROM packs WHERE id = ?");
         query.bindNoCopy(1, packId());
         return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
     });
@@ -222,6 +234,27 @@ void removePack(fs::path const& file, std::string const& packId) {
         SQLite::Statement deletion(database, "DELETE FROM packs WHERE id = ?");
         deletion.bind(1, packId);
         deletion.exec();
+        if (database.execAndGet("SELECT count(*) FROM packs").getInt() == 0)
+            database.exec("VACUUM");
+    });
+}
+
+std::vector<StoredPack> finishedPacks(fs::path const& file) {
+    std::error_code error;
+    if (!fs::exists(file, error))
+        return {};
+    SQLite::Database database = Database::openDatabase(file, packDatabase(), Database::Journal::Rollback);
+    return orDatabaseError(file, [&] {
+        SQLite::Statement query(database, "SELECT id, cfg_id, title, created_at, (SELECT count(*) FROM pages "
+                                          "WHERE pack = id) FROM packs WHERE complete = 1 "
+                                          "ORDER BY created_at, id");
+        std::vector<StoredPack> packs;
+        while (query.executeStep())
+            packs.push_back({{query.getColumn(0).getString(), query.getColumn(1).getString(),
+                              query.getColumn(2).getString()},
+                             query.getColumn(3).getInt64(),
+                             query.getColumn(4).getInt64()});
+        return packs;
     });
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 // The pack database: where a client leaves the pages of its mailings until the service has fetched them.
 
+#include "programs/database/foreign_file.h"
 #include "programs/database/sqlite_file.h"
 #include "vlservice/pack/page_loader.h"
 #include "vlservice/pack/page_saver.h"
@@ -9,6 +10,7 @@
 
 #include <filesystem>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace Mailing {
@@ -68,12 +70,16 @@ private:
     bool finished_ = false;
 };
 
-/// The pages of one finished pack, each read when it is asked for and answered at once.
+/// The pages of one finished pack, each read when it is asked for and answered at once. The database is taken
+/// for one that somebody has forged; nobody can change it while it is being read.
 class PackDatabaseReader : public PageLoaderI {
 public:
     struct PageName {
         std::string document;
         std::string page;
+
+        PageName(std::string documentName, std::string pageName)
+            : document(std::move(documentName)), page(std::move(pageName)) {}
     };
 
     /// Throws Database::DatabaseError when there is no such finished pack.
@@ -93,14 +99,25 @@ private:
     void readInfo();
     void readPageNames();
 
-    std::filesystem::path file_;
-    SQLite::Database database_;
+    Database::ForeignFile file_;
     PackInfo info_;
     std::vector<PageName> pages_;
 };
 
-/// Erases a pack and gives its room back to the database. Nothing happens when there is none of that id.
+/// A finished pack in a list of them.
+struct StoredPack {
+    PackInfo info;
+    /// Seconds since the epoch.
+    long long created = 0;
+    long long pages = 0;
+};
+
+/// The finished packs of a database of the user's own, the oldest first; none when there is no such file.
 /// Throws Database::DatabaseError.
+std::vector<StoredPack> finishedPacks(std::filesystem::path const& file);
+
+/// Erases a pack, whose bytes are overwritten, and gives its room back to the database. Nothing happens when
+/// there is none of that id. Throws Database::DatabaseError.
 void removePack(std::filesystem::path const& file, std::string const& packId);
 
 } // namespace Mailing

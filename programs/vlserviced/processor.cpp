@@ -53,7 +53,22 @@ Processor::Processor(SettingsService& settings, JobStore& jobs, JobRunner& runne
                      std::filesystem::path outbox, std::function<long long()> now)
     : settings_(settings), jobs_(jobs), runner_(runner), outbox_(std::move(outbox)), now_(std::move(now)) {}
 
-void Processor::submit(std::shared_ptr<Ipc::CmdI> cmd) { cmd->accept(*this); }
+void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
+                         std::function<void(std::string const& failure)> done) {
+    done_ = std::move(done);
+    std::string failed;
+    try {
+        cmd->accept(*this);
+    } catch (std::exception const& failure) {
+        failed = failure.what();
+    }
+    if (auto const unfinished = std::exchange(done_, {}))
+        unfinished(failed);
+}
+
+void Processor::submit(std::shared_ptr<Ipc::CmdI> cmd) {
+    carryOut(cmd, [](std::string const&) {});
+}
 
 void Processor::visit(Ipc::CSConfigSrvChange& cmd) {
     settings_.suspend(static_cast<int>(cmd.suspend()));
@@ -89,11 +104,11 @@ json::Object Processor::serviceOverview() const {
     json::Object counts;
     for (auto const& [state, count] : jobs_.counts())
         counts.set(Protocol::stateName(state), count);
-    return Protocol::serviceOverview(settings_.service().stored(), outbox_.string(), counts);
+    return Protocol::serviceOverview(settings_.service().told(), outbox_.string(), counts);
 }
 
 void Processor::visit(Ipc::ProcessPack& cmd) {
-    runner_.accept({cmd.dbHostPort(), cmd.dbName(), cmd.packId()});
+    runner_.accept({cmd.dbHostPort(), cmd.dbName(), cmd.packId()}, std::exchange(done_, {}));
 }
 
 void Processor::visit(Ipc::PriceEst& cmd) {

@@ -11,14 +11,19 @@
 
 namespace VlServiced {
 
-/// A command is done when its visit returns. What fails is told in the command's own response where that has
-/// room for it, as one line under "err"; otherwise the visit throws Error.
+/// A command is done when its visit returns, unless the visit takes what is to be called then. What fails is
+/// told in the command's own response where that has room for it, as one line under "err"; otherwise the
+/// visit throws Error.
 class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI {
 public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, JobStore& jobs, JobRunner& runner, std::filesystem::path outbox,
               std::function<long long()> now);
 
+    /// Carries a command out. `done` is called once, on this thread, possibly later; with the reason, one
+    /// line, when the command failed and its response has no room for that.
+    void carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
+                  std::function<void(std::string const& failure)> done);
     void submit(std::shared_ptr<Ipc::CmdI> cmd) override;
 
     void visit(Ipc::CSConfigSrvChange& cmd) override;
@@ -45,6 +50,7 @@ private:
     JobRunner& runner_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
+    std::function<void(std::string const& failure)> done_;
 };
 
 } // namespace VlServiced

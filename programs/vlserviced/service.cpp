@@ -109,15 +109,13 @@ public:
                   }) {
         jobs_.onChange([this](std::string const& packId) { held_.onChange(packId); });
         removeUnfinished(outbox_);
+        recogniseUploadFolder();
         if (options.answersDiscovery)
             discovery_.emplace(io_, announcedHost(options), server_->port(),
                                Channel::readToken(data_.token().string()));
     }
 
-    ~Impl() {
-        worker_.stop();
-        worker_.join();
-    }
+    ~Impl() { endThreads(); }
 
     Channel::Server const& server() const { return *server_; }
 
@@ -130,8 +128,7 @@ public:
         awaitUpkeep();
         runHandlers();
         // What the worker has finished by now goes on record; the rest is taken up at the next start.
-        worker_.stop();
-        worker_.join();
+        endThreads();
         io_.restart();
         runHandlers();
     }
@@ -141,6 +138,21 @@ public:
     }
 
 private:
+    void endThreads() {
+        for (asio::thread_pool* const threads : {&worker_, &reader_}) {
+            threads->stop();
+            threads->join();
+        }
+    }
+
+    void recogniseUploadFolder() {
+        try {
+            settings_.recogniseUploadFolder();
+        } catch (std::exception const& failure) {
+            Log::Lock(4).logStreamLine() << "The upload folder is not known yet. " << failure.what();
+        }
+    }
+
     void runHandlers() {
         for (;;) {
             try {
@@ -156,12 +168,9 @@ private:
     /// What asks to wait for jobs is answered when they have moved; all else at once.
     void handle(std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
         held_.hold(waitedFor(*cmd), [this, cmd, answer] {
-            try {
-                cmd->accept(*processor_);
-                answer();
-            } catch (std::exception const& failure) {
-                answer.fail(failure.what());
-            }
+            processor_->carryOut(cmd, [cmd, answer](std::string const& failure) {
+                failure.empty() ? answer() : answer.fail(failure);
+            });
         });
     }
 
@@ -200,8 +209,11 @@ private:
 
     JobSurroundings surroundings() {
         return {[this](JobSurroundings::Work work) { asio::post(worker_, std::move(work)); },
-                [this](JobSurroundings::Work work) { asio::post(io_, std::move(work)); }, &now,
-                [this] { return settings_.service(); }, outbox_};
+                [this](JobSurroundings::Work work) { asio::post(reader_, std::move(work)); },
+                [this](JobSurroundings::Work work) { asio::post(io_, std::move(work)); },
+                &now,
+                [this] { return settings_.service(); },
+                outbox_};
     }
 
     DataFolder data_;
@@ -213,6 +225,7 @@ private:
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
+    asio::thread_pool reader_{2};
     HeldQueries held_{io_, jobs_};
     JobRunner runner_{jobs_, surroundings()};
     std::shared_ptr<Processor> processor_ =

@@ -6,6 +6,9 @@
 #include <SQLiteCpp/Exception.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <fstream>
+
 namespace {
 
 namespace fs = std::filesystem;
@@ -185,13 +188,55 @@ TEST_F(PackDatabase, RemovesAPackWithItsPages) {
     EXPECT_EQ(SQLite::Database(file_).execAndGet("SELECT count(*) FROM pages").getInt(), 3);
 }
 
+TEST_F(PackDatabase, WithoutItsTablesIsNone) {
+    storePack("p1");
+    run("DROP TABLE pages");
+    EXPECT_EQ(readingFailure("p1"), file_.string() + " is not a pack database");
+}
+
 TEST_F(PackDatabase, TellsWhenItCannotBeRead) {
     storePack("p1");
-    PackDatabaseReader reader(file_, "p1");
-    run("DROP TABLE pages");
-    EXPECT_EQ(failureOf([&] { page(reader, "one.pdf", "1"); }),
-              "the pack database " + file_.string() + " failed: no such table: pages");
-    EXPECT_EQ(readingFailure("p1"), "the pack database " + file_.string() + " failed: no such table: pages");
+    std::string const bytes(4096, '\xFF');
+    std::fstream(file_).seekp(static_cast<long>(fs::file_size(file_)) - 4096) << bytes;
+    EXPECT_TRUE(readingFailure("p1").starts_with("the pack database " + file_.string() + " failed: ") ||
+                readingFailure("p1").starts_with("the pack database " + file_.string() + " is damaged"))
+        << readingFailure("p1");
+}
+
+TEST_F(PackDatabase, IsForItsOwnerAlone) {
+    storePack("p1");
+    EXPECT_EQ(fs::status(file_).permissions(), fs::perms(0600));
+}
+
+TEST_F(PackDatabase, KeepsNothingOfThePacksThatWereRemoved) {
+    {
+        PackDatabaseWriter writer(file_, {"p1", "a=acme", "A secret title"});
+        SharedMemBuffer page;
+        page.resize(1 << 20);
+        std::fill(page.data(), page.data() + page.size(), static_cast<unsigned char>('s'));
+        writer.savePage("doc", "1", std::move(page));
+        writer.finish(zipped("metadata"));
+    }
+    Mailing::removePack(file_, "p1");
+    EXPECT_LT(fs::file_size(file_), 100'000u);
+    std::ifstream in(file_, std::ios::binary);
+    std::string const bytes{std::istreambuf_iterator<char>(in), {}};
+    EXPECT_EQ(bytes.find("A secret title"), std::string::npos);
+    EXPECT_EQ(bytes.find("ssssssss"), std::string::npos);
+}
+
+TEST_F(PackDatabase, ListsItsFinishedPacks) {
+    EXPECT_TRUE(Mailing::finishedPacks(file_).empty());
+    EXPECT_FALSE(fs::exists(file_));
+    storePack("p1");
+    PackDatabaseWriter const unfinished(file_, {"p2", "", ""});
+    std::vector<Mailing::StoredPack> const packs = Mailing::finishedPacks(file_);
+    ASSERT_EQ(packs.size(), 1u);
+    EXPECT_EQ(packs[0].info.id, "p1");
+    EXPECT_EQ(packs[0].info.cfgId, "u=bob/a=acme");
+    EXPECT_EQ(packs[0].info.title, "Bills");
+    EXPECT_EQ(packs[0].pages, 3);
+    EXPECT_GT(packs[0].created, 0);
 }
 
 } // namespace

@@ -32,8 +32,10 @@ protected:
             Ipc::makeEmptyCmd(static_cast<unsigned char>(id), processor_);
         try {
             static_cast<Ipc::JsonCmdBase&>(*cmd).deserializeReq(parse(request));
-            processor_->submit(cmd);
-            return print(static_cast<Ipc::JsonCmdBase&>(*cmd).serializeResp());
+            std::string told = "never told";
+            processor_->carryOut(cmd, [&](std::string const& failure) { told = failure; });
+            return told.empty() ? print(static_cast<Ipc::JsonCmdBase&>(*cmd).serializeResp())
+                                : "failed: " + told;
         } catch (std::exception const& failure) {
             return std::string("failed: ") + failure.what();
         }
@@ -53,6 +55,7 @@ protected:
     VlServiced::SettingsService settings_{store_};
     VlServiced::JobStore jobs_{database_};
     VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
+                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                              [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                              [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                              [] { return 1000LL; },

@@ -4,11 +4,13 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
-#include <array>
 #include <cerrno>
 #include <fcntl.h>
-#include <fstream>
+#include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
+#include <utility>
+#include <vector>
 
 namespace VlServiced {
 namespace {
@@ -17,59 +19,90 @@ namespace fs = std::filesystem;
 
 /// A report is a line; a larger file is none.
 constexpr std::size_t MAX_REPORT_BYTES = 64 << 10;
+constexpr std::size_t COPY_BYTES = 1 << 20;
 
-fs::path temporaryOf(fs::path const& folder, std::string const& name) {
-    return folder / ("." + name + ".part");
+std::string temporaryOf(std::string const& name) { return "." + name + ".part"; }
+
+[[noreturn]] void fail(std::string const& what) {
+    throw std::system_error(errno, std::generic_category(), what);
 }
 
-/// A folder that is gone, say one that is not mounted, says nothing about what lies in it.
-void requireFolder(fs::path const& folder) {
-    if (!fs::is_directory(folder))
-        throw std::system_error(ENOENT, std::generic_category(),
-                                "there is no upload folder " + folder.string());
+void syncFolder(UploadFolder const& folder) {
+    if (::fsync(folder.descriptor()) != 0)
+        fail("cannot sync " + folder.path().string());
+}
+
+bool isThere(UploadFolder const& folder, std::string const& name) {
+    struct stat status {};
+    if (::fstatat(folder.descriptor(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0)
+        return true;
+    if (errno != ENOENT)
+        fail("cannot look for " + (folder.path() / name).string());
+    return false;
+}
+
+/// A new file: whatever had its name, a link to some other file say, is gone and was not written to.
+Base::FileDescriptor newFileIn(UploadFolder const& folder, std::string const& name) {
+    ::unlinkat(folder.descriptor(), name.c_str(), 0);
+    int const file = ::openat(folder.descriptor(), name.c_str(),
+                              O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600);
+    if (file < 0)
+        fail("cannot write " + (folder.path() / name).string());
+    return {file, folder.path() / name};
+}
+
+mode_t modeOf(Base::FileDescriptor const& file) {
+    struct stat status {};
+    ::fstat(file.number(), &status);
+    return status.st_mode;
 }
 
 } // namespace
 
-void stage(fs::path const& container, fs::path const& folder) {
-    requireFolder(folder);
-    fs::path const temporary = temporaryOf(folder, container.filename().string());
-    fs::copy_file(container, temporary, fs::copy_options::overwrite_existing);
-    Base::FileDescriptor(temporary, O_RDONLY).sync();
-    Base::syncFolder(folder);
+void stage(fs::path const& container, UploadFolder const& folder) {
+    Base::FileDescriptor source(container, O_RDONLY);
+    Base::FileDescriptor target = newFileIn(folder, temporaryOf(container.filename().string()));
+    std::vector<char> buffer(COPY_BYTES);
+    while (std::size_t const size = source.read(buffer.data(), buffer.size()))
+        target.writeAll({buffer.data(), size});
+    ::fchmod(target.number(), modeOf(source) & 0777);
+    target.sync();
+    target.close();
+    syncFolder(folder);
 }
 
-void publish(std::string const& name, fs::path const& folder) {
-    requireFolder(folder);
-    fs::path const temporary = temporaryOf(folder, name);
-    if (!fs::exists(temporary))
+void publish(std::string const& name, UploadFolder const& folder) {
+    std::string const temporary = temporaryOf(name);
+    if (!isThere(folder, temporary))
         return;
-    fs::rename(temporary, folder / name);
-    Base::syncFolder(folder);
+    if (::renameat(folder.descriptor(), temporary.c_str(), folder.descriptor(), name.c_str()) != 0)
+        fail("cannot write " + (folder.path() / name).string());
+    syncFolder(folder);
 }
 
-bool liesIn(fs::path const& folder, std::string const& name) {
-    requireFolder(folder);
-    return fs::exists(folder / name);
-}
+bool liesIn(UploadFolder const& folder, std::string const& name) { return isThere(folder, name); }
 
-std::optional<CarrierReport> carrierReport(fs::path const& folder, std::string const& name) {
-    fs::path const file = folder / (name + ".status");
+std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::string const& name) {
+    std::string const file = name + ".status";
     // A pipe of that name would hold up its reader.
-    std::error_code error;
-    if (!fs::is_regular_file(file, error))
+    int const descriptor =
+        ::openat(folder.descriptor(), file.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+    if (descriptor < 0)
         return std::nullopt;
-    std::ifstream in(file, std::ios::binary);
-    std::string text(MAX_REPORT_BYTES, '\0');
-    in.read(text.data(), static_cast<std::streamsize>(text.size()));
+    fs::path const path = folder.path() / file;
+    Base::FileDescriptor in(descriptor, path);
+    if (!S_ISREG(modeOf(in)))
+        return std::nullopt;
+    std::vector<char> text(MAX_REPORT_BYTES);
+    std::size_t const size = in.read(text.data(), text.size());
     try {
-        json::Object const report = json::strToObject(text.data(), static_cast<std::size_t>(in.gcount()));
+        json::Object const report = json::strToObject(text.data(), size);
         std::string const state = report.get("state").textOrEmpty();
         if (state == "delivered" || state == "failed")
             return CarrierReport{state == "delivered", report.get("text").textOrEmpty()};
-        Log::Lock(4).logStreamLine() << "The report " << file << " has no state that is known";
+        Log::Lock(4).logStreamLine() << "The report " << path << " has no state that is known";
     } catch (json::Exc const& failure) {
-        Log::Lock(4).logStreamLine() << "The report " << file << " cannot be read. " << failure.what();
+        Log::Lock(4).logStreamLine() << "The report " << path << " cannot be read. " << failure.what();
     }
     return std::nullopt;
 }

@@ -1,6 +1,8 @@
 #pragma once
 // Handing a container on to the upload folder: exactly once, whatever ends the program in between.
 
+#include "programs/vlserviced/settings/upload_folder.h"
+
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -10,17 +12,18 @@ namespace VlServiced {
 // The steps, between which the caller records where it stands:
 //
 //     stage    the container is copied into the folder under a temporary name
-//              (on record: Submitting)
+//              (on record: Submitting, and the folder's identity)
 //     publish  the temporary name becomes the container's own
 //              (on record: Submitted)
 //
-// Whoever finds "Submitting" on record calls publish again: it does something exactly when the temporary file
-// is still there. Whoever takes containers away leaves names alone that begin with a dot.
+// Whoever finds "Submitting" on record calls publish again, in the very same folder: it does something
+// exactly when the temporary file is still there. Whoever takes containers away leaves names alone that begin
+// with a dot.
 
-/// Throws std::system_error when the copy cannot be made.
-void stage(std::filesystem::path const& container, std::filesystem::path const& folder);
-/// Throws std::system_error, also when the folder itself is not there.
-void publish(std::string const& name, std::filesystem::path const& folder);
+/// Throws std::system_error when the copy cannot be made. What lies under the temporary name goes.
+void stage(std::filesystem::path const& container, UploadFolder const& folder);
+/// Throws std::system_error.
+void publish(std::string const& name, UploadFolder const& folder);
 
 /// What the carrier says of a container: NAME.status in the folder, one JSON object with "state" ("delivered"
 /// or "failed") and "text".
@@ -29,9 +32,9 @@ struct CarrierReport {
     std::string text;
 };
 
-/// Whether the container still lies in the folder. Throws std::system_error when the folder is not there.
-bool liesIn(std::filesystem::path const& folder, std::string const& name);
+/// Whether the container still lies in the folder. Throws std::system_error when the folder cannot be read.
+bool liesIn(UploadFolder const& folder, std::string const& name);
 /// Nothing when there is no report, or none that can be read: that is logged.
-std::optional<CarrierReport> carrierReport(std::filesystem::path const& folder, std::string const& name);
+std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::string const& name);
 
 } // namespace VlServiced

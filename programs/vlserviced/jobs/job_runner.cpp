@@ -46,45 +46,88 @@ void requireSamePack(Job const& known, PackLocation const& pack) {
         throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
 }
 
+PackSummary summaryOf(PackLocation const& pack) {
+    Mailing::PackDatabaseReader const pages(pack.file(), pack.packId);
+    PackSummary const summary{pages.info().cfgId, pages.info().title,
+                              static_cast<long long>(pages.documentCount()),
+                              static_cast<long long>(pages.pages().size())};
+    if (summary.pages == 0)
+        throw Base::Error("pack " + pack.packId + " has no pages");
+    if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
+        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
+                          std::to_string(MAX_TITLE_BYTES) + " bytes");
+    checkNodeId(summary.cfgId);
+    return summary;
+}
+
+/// Whether a container that is in the outbox was handed on.
+bool isHandedOn(JobState state) {
+    return state == JobState::Submitted || state == JobState::Lodged || state == JobState::Delivered;
+}
+
 } // namespace
 
 JobRunner::JobRunner(JobStore& jobs, JobSurroundings surroundings)
     : jobs_(jobs), surroundings_(std::move(surroundings)) {}
 
 void JobRunner::resume() {
+    sweepOutbox();
     for (JobState const state : {JobState::Submitting, JobState::Queued, JobState::Accepted})
         for (Job const& job : jobs_.inState(state))
             proceed(job);
 }
 
-void JobRunner::accept(PackLocation pack) {
-    pack = checkedLocation(pack);
+void JobRunner::accept(PackLocation const& pack, std::function<void(std::string const& failure)> done) {
+    auto const finish = [done = std::move(done)](std::function<void()> const& step) {
+        Outcome const outcome = outcomeOf(step);
+        done(outcome.why);
+    };
+    PackLocation location;
+    std::optional<Job> known;
+    Outcome const checked = outcomeOf([&] {
+        location = checkedLocation(pack);
+        if ((known = jobs_.find(location.packId)))
+            requireSamePack(*known, location);
+    });
+    if (checked.kind != Outcome::Kind::Done)
+        return finish([&] { throw Base::Error(checked.why); });
+    if (known)
+        return finish([&] { proceed(*known); });
+    surroundings_.onReader([this, location, finish, onOwnThread = surroundings_.onOwnThread] {
+        auto const summary = std::make_shared<PackSummary>();
+        Outcome const read = outcomeOf([&] { *summary = summaryOf(location); });
+        onOwnThread([this, location, finish, summary, read] {
+            finish([&] {
+                if (read.kind != Outcome::Kind::Done)
+                    throw Base::Error(read.why);
+                admit(location, *summary);
+            });
+        });
+    });
+}
+
+void JobRunner::admit(PackLocation const& pack, PackSummary const& summary) {
+    // Somebody else may have sent it meanwhile.
     std::optional<Job> job = jobs_.find(pack.packId);
-    if (job)
+    if (job) {
         requireSamePack(*job, pack);
-    else
-        jobs_.accept(*(job = newJob(pack)));
+    } else {
+        requireNotDisabled(pack.packId, summary.cfgId);
+        job.emplace();
+        job->pack = pack;
+        job->cfgId = summary.cfgId;
+        job->title = summary.title;
+        job->documents = summary.documents;
+        job->pages = summary.pages;
+        job->acceptedAt = surroundings_.now();
+        jobs_.accept(*job);
+    }
     proceed(*job);
 }
 
-Job JobRunner::newJob(PackLocation const& pack) const {
-    Mailing::PackDatabaseReader const pages(pack.file(), pack.packId);
-    Job job;
-    job.pack = pack;
-    job.cfgId = pages.info().cfgId;
-    job.title = pages.info().title;
-    job.documents = static_cast<long long>(pages.documentCount());
-    job.pages = static_cast<long long>(pages.pages().size());
-    job.acceptedAt = surroundings_.now();
-    if (job.pages == 0)
-        throw Base::Error("pack " + pack.packId + " has no pages");
-    if (!Base::isPlainText(job.title, MAX_TITLE_BYTES))
-        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
-                          std::to_string(MAX_TITLE_BYTES) + " bytes");
-    checkNodeId(job.cfgId);
-    if (surroundings_.settings().isDisabled(job.cfgId))
-        throw Base::Error("node " + job.cfgId + " is disabled: pack " + pack.packId + " is not taken");
-    return job;
+void JobRunner::requireNotDisabled(std::string const& packId, std::string const& cfgId) const {
+    if (surroundings_.settings().isDisabled(cfgId))
+        throw Base::Error("node " + cfgId + " is disabled: pack " + packId + " is not taken");
 }
 
 void JobRunner::proceed(Job const& job) {
@@ -123,29 +166,60 @@ void JobRunner::startStaging(Job const& job) {
     std::string const folder = surroundings_.settings().uploadFolder();
     if (folder.empty())
         return noteProblem(job.pack.packId, "the service has no upload folder");
+    auto const identity = std::make_shared<std::string>(surroundings_.settings().uploadFolderIdentity());
     inBackground(
         job.pack.packId,
-        [container = surroundings_.outbox / job.containerName(), folder] { stage(container, folder); },
-        [this, packId = job.pack.packId, folder](Outcome const& outcome) {
-            onStaged(packId, folder, outcome);
+        [container = surroundings_.outbox / job.containerName(), folder, identity] {
+            UploadFolder const target(folder, *identity);
+            stage(container, target);
+            *identity = target.identity().text();
+        },
+        [this, packId = job.pack.packId, folder, identity](Outcome const& outcome) {
+            onStaged(packId, folder, *identity, outcome);
         });
 }
 
-void JobRunner::onStaged(std::string const& packId, std::string const& folder, Outcome const& outcome) {
+void JobRunner::onStaged(std::string const& packId, std::string const& folder, std::string const& identity,
+                         Outcome const& outcome) {
     if (outcome.kind != Outcome::Kind::Done)
         return noteProblem(packId, outcome.why);
-    jobs_.beginSubmitting(packId, folder, surroundings_.now());
+    jobs_.beginSubmitting(packId, folder, identity, surroundings_.now());
     finishSubmitting(jobs_.find(packId).value());
 }
 
 void JobRunner::finishSubmitting(Job const& job) {
-    Outcome const outcome = outcomeOf([&] { publish(job.containerName(), job.uploadFolder); });
+    Outcome const outcome = outcomeOf(
+        [&] { publish(job.containerName(), UploadFolder(job.uploadFolder, job.uploadFolderIdentity)); });
     if (outcome.kind != Outcome::Kind::Done)
         return noteProblem(job.pack.packId, outcome.why);
     // While the job is on record as Submitting, so that a container that stays behind is seen to again.
-    std::error_code ignored;
-    fs::remove(surroundings_.outbox / job.containerName(), ignored);
+    removeFromOutbox(job.containerName());
     jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
+}
+
+void JobRunner::removeFromOutbox(std::string const& containerName) {
+    std::error_code failure;
+    fs::remove(surroundings_.outbox / containerName, failure);
+    if (!failure)
+        leftInOutbox_.erase(containerName);
+    else if (leftInOutbox_.insert(containerName).second)
+        Log::Lock(4).logStreamLine()
+            << "The container " << containerName
+            << " was handed on and cannot be removed from the outbox, which is tried "
+               "again: "
+            << failure.message();
+}
+
+/// What could not be removed is tried again; the first time, with all that an earlier process left.
+void JobRunner::sweepOutbox() {
+    std::error_code unreadable;
+    if (!std::exchange(isSwept_, true))
+        for (fs::directory_entry const& entry : fs::directory_iterator(surroundings_.outbox, unreadable))
+            if (std::optional<Job> const job = jobs_.find(entry.path().stem().string());
+                job && isHandedOn(job->state) && entry.path().filename() == job->containerName())
+                leftInOutbox_.insert(job->containerName());
+    for (std::string const& name : std::set<std::string>(leftInOutbox_))
+        removeFromOutbox(name);
 }
 
 void JobRunner::upload(std::string const& folder, std::string const& database) {
@@ -167,8 +241,9 @@ void JobRunner::updateStatus(std::string const& folder, std::string const& datab
 
 void JobRunner::refresh(Job const& job) {
     Outcome const outcome = outcomeOf([&] {
-        bool const waits = liesIn(job.uploadFolder, job.containerName());
-        std::optional<CarrierReport> const report = carrierReport(job.uploadFolder, job.containerName());
+        UploadFolder const folder(job.uploadFolder, job.uploadFolderIdentity);
+        bool const waits = liesIn(folder, job.containerName());
+        std::optional<CarrierReport> const report = carrierReport(folder, job.containerName());
         if (report && !report->delivered)
             jobs_.fail(job.pack.packId, "the carrier: " + Base::oneLine(report->text), surroundings_.now());
         else if (report)

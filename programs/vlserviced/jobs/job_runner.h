@@ -18,6 +18,8 @@ struct JobSurroundings {
 
     /// Runs long work, one after another, away from the caller's thread.
     std::function<void(Work)> onWorker;
+    /// Runs short work that may have to wait for a file, away from the caller's thread and from long work.
+    std::function<void(Work)> onReader;
     /// Runs work on the runner's own thread; may be called from any.
     std::function<void(Work)> onOwnThread;
     /// Seconds since the epoch.
@@ -25,6 +27,14 @@ struct JobSurroundings {
     /// The service's settings as they are at that moment.
     std::function<ServiceSettings()> settings;
     std::filesystem::path outbox;
+};
+
+/// What a pack's job says of it.
+struct PackSummary {
+    std::string cfgId;
+    std::string title;
+    long long documents = 0;
+    long long pages = 0;
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -39,9 +49,9 @@ public:
     /// Takes up every job that can go on: at the start, and when jobs are no longer held back.
     void resume();
     /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
-    /// nothing. The pages are fetched later. Throws Error or Database::DatabaseError when the pack cannot be
-    /// taken.
-    void accept(PackLocation pack);
+    /// nothing. The pages are fetched later. `done` is called on the own thread, with the reason as one line
+    /// when the pack cannot be taken, which is empty otherwise.
+    void accept(PackLocation const& pack, std::function<void(std::string const& failure)> done);
     /// Has the containers of these jobs handed on, those that are not there yet as soon as they are.
     /// Throws Error when there is no upload folder.
     void upload(std::string const& folder, std::string const& database);
@@ -60,10 +70,14 @@ private:
     void startStaging(Job const& job);
     void finishSubmitting(Job const& job);
     void onPacked(std::string const& packId, Outcome const& outcome);
-    void onStaged(std::string const& packId, std::string const& folder, Outcome const& outcome);
+    void onStaged(std::string const& packId, std::string const& folder, std::string const& identity,
+                  Outcome const& outcome);
     void refresh(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
-    Job newJob(PackLocation const& pack) const;
+    void admit(PackLocation const& pack, PackSummary const& summary);
+    void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
+    void removeFromOutbox(std::string const& containerName);
+    void sweepOutbox();
     /// Runs `work` on the worker and hands its outcome to `then` on the own thread.
     void inBackground(std::string const& packId, std::function<void()> work,
                       std::function<void(Outcome)> then);
@@ -73,6 +87,9 @@ private:
     JobSurroundings surroundings_;
     /// Pack ids that the worker is busy with, or will be.
     std::set<std::string> busy_;
+    /// Containers that were handed on and are still in the outbox.
+    std::set<std::string> leftInOutbox_;
+    bool isSwept_ = false;
 };
 
 } // namespace VlServiced

@@ -2,17 +2,18 @@
 
 #include "programs/base/error.h"
 #include "programs/vlserviced/store/node_id.h"
-#include "vlservice/cfg/cfg_node_id.h"
-#include "vlservice/cfg/id.h"
 
 #include <algorithm>
 #include <filesystem>
+#include <string_view>
 #include <utility>
 
 namespace VlServiced {
 namespace {
 
 using Values = Protocol::ServiceSettings;
+
+constexpr char const* FOLDER_IDENTITY = "upload_folder_identity";
 
 void checkUploadFolder(json::Value const& value) {
     std::filesystem::path const folder = value.textOrEmpty();
@@ -69,7 +70,30 @@ void checkChange(std::string const& key, json::Value const& value) {
 
 } // namespace
 
-ServiceSettings::ServiceSettings(json::Object stored) : stored_(std::move(stored)), values_(stored_) {}
+ServiceSettings::ServiceSettings(json::Object stored)
+    : stored_(std::move(stored)), values_(stored_),
+      disabled_(values_.disabled.begin(), values_.disabled.end()) {}
+
+json::Object ServiceSettings::told() const { return without(FOLDER_IDENTITY); }
+
+std::string ServiceSettings::uploadFolderIdentity() const {
+    return stored_.get(FOLDER_IDENTITY).textOrEmpty();
+}
+
+json::Object ServiceSettings::without(char const* key) const {
+    json::Object less;
+    for (auto const& [name, value] : stored_)
+        if (name != std::string_view(key))
+            less.set(name, value);
+    return less;
+}
+
+ServiceSettings ServiceSettings::withFolderIdentity(std::string const& identity) const {
+    json::Object changed = without(FOLDER_IDENTITY);
+    if (!identity.empty())
+        changed.set(FOLDER_IDENTITY, identity);
+    return ServiceSettings(std::move(changed));
+}
 
 Protocol::Tariff ServiceSettings::tariff() const {
     if (values_.tariff.empty())
@@ -79,11 +103,10 @@ Protocol::Tariff ServiceSettings::tariff() const {
 }
 
 bool ServiceSettings::isDisabled(std::string const& nodeId) const {
-    Cfg::CfgNodeId const node{Cfg::Id(nodeId, false)};
-    return std::ranges::any_of(values_.disabled, [&](std::string const& id) {
-        Cfg::CfgNodeId const listed{Cfg::Id(id, false)};
-        return listed == node || listed.isParentOf(node);
-    });
+    for (std::string at = nodeId; !at.empty(); at = parentNodeId(at))
+        if (disabled_.contains(at))
+            return true;
+    return false;
 }
 
 bool ServiceSettings::isSuspended(Suspended what) const {

@@ -6,6 +6,7 @@
 #include "vlservice/json/json.h"
 
 #include <string>
+#include <unordered_set>
 
 namespace VlServiced {
 
@@ -18,8 +19,12 @@ public:
     explicit ServiceSettings(json::Object stored);
 
     json::Object const& stored() const { return stored_; }
+    /// Without what is nobody's affair but the service's.
+    json::Object told() const;
     /// Where finished containers are handed on; empty when nothing was set.
     std::string const& uploadFolder() const { return values_.uploadFolder; }
+    /// Which of all folders of that name it is, as FolderIdentity tells it; empty when that is not known.
+    std::string uploadFolderIdentity() const;
     /// Throws Error when there is none yet.
     Protocol::Tariff tariff() const;
     /// Whether the node, or one above it, is among the disabled ones.
@@ -29,12 +34,18 @@ public:
     /// The settings with the keys of `changes` replaced; JSON null erases a key.
     /// Throws Error on keys that are none of Protocol::SETTABLE, and on bad values.
     ServiceSettings withChanges(json::Object const& changes) const;
+    /// The empty text is none.
+    ServiceSettings withFolderIdentity(std::string const& identity) const;
     /// Throws Error when the number has bits that mean nothing.
     ServiceSettings withSuspended(int bits) const;
 
 private:
+    /// The settings less one key.
+    json::Object without(char const* key) const;
+
     json::Object stored_;
     Protocol::ServiceSettings values_;
+    std::unordered_set<std::string> disabled_;
 };
 
 } // namespace VlServiced

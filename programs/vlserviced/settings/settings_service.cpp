@@ -2,12 +2,12 @@
 
 #include "programs/base/error.h"
 #include "programs/vlserviced/settings/parts.h"
+#include "programs/vlserviced/settings/upload_folder.h"
 #include "programs/vlserviced/store/node_id.h"
-#include "vlservice/cfg/cfg_node_id.h"
 #include "vlservice/cfg/id.h"
 
-#include <algorithm>
 #include <map>
+#include <unordered_set>
 #include <utility>
 
 namespace VlServiced {
@@ -29,15 +29,12 @@ Protocol::TreeNode branch(SettingsNode const& node, Children const& children,
 }
 
 bool isNodeOf(std::string const& user, std::string const& id) {
-    std::vector<std::string> const tokens = Cfg::Id(id, false).tokens();
-    return !tokens.empty() && tokens.front() == Cfg::Id::USER_PREFIX + user;
+    return id.substr(0, id.find(Cfg::Id::CFG_ID_DELIM)) == Cfg::Id::USER_PREFIX + user;
 }
 
-/// Who may use a node is a question of tokens, never of how the texts end.
-bool mayUse(std::vector<Cfg::CfgNodeId> const& nodesOfUser, std::string const& id) {
-    Cfg::CfgNodeId const asked{Cfg::Id(id, false)};
-    return std::ranges::any_of(
-        nodesOfUser, [&](Cfg::CfgNodeId const& own) { return asked == own || asked.isParentOf(own); });
+/// The empty text for no folder.
+std::string identityOf(std::string const& uploadFolder) {
+    return uploadFolder.empty() ? std::string() : UploadFolder(uploadFolder, {}).identity().text();
 }
 
 } // namespace
@@ -56,14 +53,16 @@ Protocol::TreeNode SettingsService::tree() const {
 
 std::vector<SettingsService::UsableNode> SettingsService::usableNodes(std::string const& user) const {
     std::vector<SettingsNode> const nodes = store_.nodes();
-    std::vector<Cfg::CfgNodeId> ofUser;
+    // Who may use a node is a question of tokens: his nodes and what stands above them, token by token.
+    std::unordered_set<std::string> ofUser;
     for (SettingsNode const& node : nodes)
         if (!user.empty() && isNodeOf(user, node.id))
-            ofUser.emplace_back(Cfg::Id(node.id, false));
+            for (std::string at = node.id; !at.empty() && ofUser.insert(at).second;)
+                at = parentNodeId(at);
     ServiceSettings const settings = service();
     std::vector<UsableNode> usable;
     for (SettingsNode const& node : nodes) {
-        bool const isUsable = user.empty() ? Cfg::Id::isParentIdStr(node.id) : mayUse(ofUser, node.id);
+        bool const isUsable = user.empty() ? Cfg::Id::isParentIdStr(node.id) : ofUser.contains(node.id);
         if (isUsable && !node.id.empty())
             usable.push_back({node.id, node.description, settings.isDisabled(node.id)});
     }
@@ -115,7 +114,16 @@ ServiceSettings SettingsService::service() const { return ServiceSettings(store_
 
 void SettingsService::changeService(json::Object const& changes) {
     requireChangeable();
-    store_.setServiceSettings(service().withChanges(changes).stored());
+    ServiceSettings changed = service().withChanges(changes);
+    if (changes.get(Protocol::ServiceSettings::UPLOAD_FOLDER))
+        changed = changed.withFolderIdentity(identityOf(changed.uploadFolder()));
+    store_.setServiceSettings(changed.stored());
+}
+
+void SettingsService::recogniseUploadFolder() {
+    ServiceSettings const settings = service();
+    if (!settings.uploadFolder().empty() && settings.uploadFolderIdentity().empty())
+        store_.setServiceSettings(settings.withFolderIdentity(identityOf(settings.uploadFolder())).stored());
 }
 
 void SettingsService::suspend(int bits) { store_.setServiceSettings(service().withSuspended(bits).stored()); }

@@ -43,7 +43,11 @@ public:
     void remove(std::string const& id);
 
     ServiceSettings service() const;
+    /// An upload folder gets a mark, and its identity goes on record with it.
     void changeService(json::Object const& changes);
+    /// Puts the identity of the upload folder on record when it is not. Throws std::exception when the folder
+    /// is not there.
+    void recogniseUploadFolder();
     /// Works while changes are held back: it is what lifts that.
     void suspend(int bits);
 

@@ -28,6 +28,19 @@ Base::FileLock takeHold(fs::path const& folder) {
                       ": stop that one or name another folder");
 }
 
+/// Who may write here could put another token, database or container in place.
+void requireOwn(fs::path const& folder) {
+    struct stat status {};
+    if (::stat(folder.c_str(), &status) != 0)
+        throw Base::Error("cannot read the data folder " + folder.string() + ": " + std::strerror(errno));
+    if (status.st_uid != ::geteuid())
+        throw Base::Error("the data folder " + folder.string() +
+                          " belongs to another user: start vlserviced as that user or name another folder");
+    if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
+        throw Base::Error("others may write into the data folder " + folder.string() +
+                          ": take their right away (chmod go-w)");
+}
+
 } // namespace
 
 void makeWritableFolder(fs::path const& folder) {
@@ -43,6 +56,7 @@ void makeWritableFolder(fs::path const& folder) {
 
 DataFolder::DataFolder(fs::path folder) : folder_(std::move(folder)) {
     makeWritableFolder(folder_);
+    requireOwn(folder_);
     lock_ = takeHold(folder_);
 }
 

@@ -12,7 +12,8 @@ namespace VlServiced {
 class DataFolder {
 public:
     /// Makes the folder, which only its owner may enter, unless it is there, and takes hold of it until
-    /// destruction. Throws Error when it cannot be written or another process has it.
+    /// destruction. Throws Error when it cannot be written, when another process has it, and when it belongs to
+    /// another user or others may write it.
     explicit DataFolder(std::filesystem::path folder);
     DataFolder(DataFolder const&) = delete;
     DataFolder& operator=(DataFolder const&) = delete;

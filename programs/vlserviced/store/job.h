@@ -34,6 +34,8 @@ struct Job {
     bool toUpload = false;
     /// Where the container goes, or went; empty before Submitting.
     std::string uploadFolder;
+    /// Which of all folders of that name it is, as FolderIdentity tells it.
+    std::string uploadFolderIdentity;
     /// Seconds since the epoch.
     long long acceptedAt = 0;
     long long changedAt = 0;

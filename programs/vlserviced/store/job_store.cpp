@@ -17,7 +17,7 @@ using Protocol::stateNamed;
 
 constexpr char const* SELECT_JOBS =
     "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
-    "problem, to_upload, upload_folder, accepted_at, changed_at FROM jobs ";
+    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity FROM jobs ";
 
 Job jobIn(SQLite::Statement& row) {
     Job job;
@@ -34,6 +34,7 @@ Job jobIn(SQLite::Statement& row) {
     job.uploadFolder = row.getColumn(10).getString();
     job.acceptedAt = row.getColumn(11).getInt64();
     job.changedAt = row.getColumn(12).getInt64();
+    job.uploadFolderIdentity = row.getColumn(13).getString();
     return job;
 }
 
@@ -151,14 +152,16 @@ bool JobStore::advance(std::string const& packId, JobState from, JobState to, lo
     return moved;
 }
 
-bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder, long long now) {
+bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder,
+                               std::string const& identity, long long now) {
     SQLite::Statement change(database_, "UPDATE jobs SET state = ?, problem = '', upload_folder = ?, "
-                                        "changed_at = ? WHERE pack = ? AND state = ?");
+                                        "upload_identity = ?, changed_at = ? WHERE pack = ? AND state = ?");
     change.bind(1, stateName(JobState::Submitting));
     change.bind(2, uploadFolder);
-    change.bind(3, static_cast<std::int64_t>(now));
-    change.bind(4, packId);
-    change.bind(5, stateName(JobState::Queued));
+    change.bind(3, identity);
+    change.bind(4, static_cast<std::int64_t>(now));
+    change.bind(5, packId);
+    change.bind(6, stateName(JobState::Queued));
     bool const moved = change.exec() == 1;
     if (moved)
         changed(packId);

@@ -43,8 +43,10 @@ public:
     /// Moves a job on and clears its problem. The container's way is irreversible, so `from` has to be the
     /// job's state; false, and no change, when it is not.
     bool advance(std::string const& packId, JobState from, JobState to, long long now);
-    /// Moves a queued job on to Submitting, into that folder; false, and no change, when it is not queued.
-    bool beginSubmitting(std::string const& packId, std::string const& uploadFolder, long long now);
+    /// Moves a queued job on to Submitting, into that very folder; false, and no change, when it is not
+    /// queued.
+    bool beginSubmitting(std::string const& packId, std::string const& uploadFolder,
+                         std::string const& identity, long long now);
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.

@@ -55,10 +55,16 @@ CREATE INDEX jobs_by_acceptance ON jobs (accepted_at, pack);
 CREATE INDEX jobs_by_database ON jobs (db_folder, db_name, accepted_at, pack);
 )sql";
 
+/// An empty identity is one from a service that kept none.
+constexpr char const* SCHEMA_3 = R"sql(
+ALTER TABLE jobs ADD COLUMN upload_identity TEXT NOT NULL DEFAULT '';
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
-    static Database::DatabaseKind const kind{"service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2}};
+    static Database::DatabaseKind const kind{
+        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3}};
     return kind;
 }
 

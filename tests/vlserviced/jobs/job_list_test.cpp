@@ -76,7 +76,7 @@ TEST_F(JobList, NamesTheContainerWhereItLies) {
     EXPECT_FALSE(keyOf("p1", "container", 0));
     jobs_.advance("p1", JobState::Accepted, JobState::Queued, 2);
     EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/var/outbox/p1.mailing"));
-    jobs_.beginSubmitting("p1", "/srv/upload", 3);
+    jobs_.beginSubmitting("p1", "/srv/upload", "", 3);
     EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/var/outbox/p1.mailing"));
     jobs_.advance("p1", JobState::Submitting, JobState::Submitted, 4);
     EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/srv/upload/p1.mailing"));

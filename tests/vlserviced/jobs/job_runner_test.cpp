@@ -19,6 +19,7 @@ namespace fs = std::filesystem;
 
 using VlServiced::JobRunner;
 using VlServiced::JobState;
+using VlServiced::UploadFolder;
 
 /// A runner whose worker does what it was given only when the test says so. Whatever was not done by then is
 /// lost when a new runner takes over, as it is with a process.
@@ -37,6 +38,7 @@ protected:
             jobs_, VlServiced::JobSurroundings{
                        [this](VlServiced::JobSurroundings::Work work) { work_.push_back(std::move(work)); },
                        [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                       [](VlServiced::JobSurroundings::Work const& work) { work(); },
                        [this] { return now_; },
                        [this] { return VlServiced::ServiceSettings(settings_); },
                        outbox_,
@@ -46,7 +48,9 @@ protected:
         for (; !work_.empty(); work_.pop_front())
             work_.front()();
     }
-    void accept(std::string const& packId) { runner_->accept({folder_.path().string(), "packs.db", packId}); }
+    void accept(std::string const& packId) {
+        EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", packId), "nothing was thrown");
+    }
     void acceptStored(std::string const& packId) {
         storePack(packs_, packId);
         accept(packId);
@@ -57,7 +61,23 @@ protected:
     }
     std::string acceptFailure(std::string const& folder, std::string const& database,
                               std::string const& packId) {
-        return failureOf([&] { runner_->accept({folder, database, packId}); });
+        std::string told = "never told";
+        runner_->accept({folder, database, packId}, [&](std::string const& failure) {
+            told = failure.empty() ? "nothing was thrown" : failure;
+        });
+        return told;
+    }
+    void stageOnRecord() {
+        UploadFolder const upload(upload_, {});
+        VlServiced::stage(outbox_ / "p1.mailing", upload);
+        jobs_.beginSubmitting("p1", upload_.string(), upload.identity().text(), now_);
+    }
+    /// Less the folder's mark.
+    std::ptrdiff_t filesInUpload() const { return std::distance(fs::directory_iterator(upload_), {}) - 1; }
+    /// The mark that the line of another folder asks for.
+    std::string anotherFolder(std::string const& mark) const {
+        return "the upload folder " + upload_.string() +
+               " is another one than before: mount the one whose file .vlserviced reads " + mark;
     }
     void run(char const* sql) { SQLite::Database(packs_, SQLite::OPEN_READWRITE).exec(sql); }
     void setSettings(std::string const& text) { settings_ = parse(text); }
@@ -205,7 +225,7 @@ TEST_F(JobRunnerTest, HandsOnWhatIsQueuedAndWhatWillBe) {
     doWork();
     acceptStored("p2");
     storePack(folder_ / "other.db", "p3");
-    runner_->accept({folder_.path().string(), "other.db", "p3"});
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "other.db", "p3"), "nothing was thrown");
     runner_->upload(folder_.path().string(), "packs.db");
     doWork();
     EXPECT_EQ(state("p1"), "submitted");
@@ -321,8 +341,7 @@ TEST_F(JobRunnerTest, GoesOnBehindAnUploadThatWasOnlyWanted) {
 TEST_F(JobRunnerTest, GoesOnBehindAStagedContainer) {
     acceptStored("p1");
     doWork();
-    VlServiced::stage(outbox_ / "p1.mailing", upload_);
-    jobs_.beginSubmitting("p1", upload_.string(), now_);
+    stageOnRecord();
     startRunner();
     runner_->resume();
     EXPECT_EQ(state("p1"), "submitted");
@@ -333,15 +352,14 @@ TEST_F(JobRunnerTest, GoesOnBehindAStagedContainer) {
 TEST_F(JobRunnerTest, DoesNotSubmitAgainWhatWasPublishedAndTakenAlready) {
     acceptStored("p1");
     doWork();
-    VlServiced::stage(outbox_ / "p1.mailing", upload_);
-    jobs_.beginSubmitting("p1", upload_.string(), now_);
-    VlServiced::publish("p1.mailing", upload_);
+    stageOnRecord();
+    VlServiced::publish("p1.mailing", UploadFolder(upload_, {}));
     fs::remove(upload_ / "p1.mailing");
     startRunner();
     runner_->resume();
     doWork();
     EXPECT_EQ(state("p1"), "submitted");
-    EXPECT_TRUE(fs::is_empty(upload_));
+    EXPECT_EQ(filesInUpload(), 0);
     runner_->updateStatus("", "");
     EXPECT_EQ(state("p1"), "lodged");
 }
@@ -349,13 +367,86 @@ TEST_F(JobRunnerTest, DoesNotSubmitAgainWhatWasPublishedAndTakenAlready) {
 TEST_F(JobRunnerTest, SubmitsIntoTheFolderThatItWasStagedIn) {
     acceptStored("p1");
     doWork();
-    VlServiced::stage(outbox_ / "p1.mailing", upload_);
-    jobs_.beginSubmitting("p1", upload_.string(), now_);
+    stageOnRecord();
     setSettings(R"({"upload_folder":"/elsewhere"})");
     startRunner();
     runner_->resume();
     EXPECT_EQ(state("p1"), "submitted");
     EXPECT_TRUE(fs::exists(upload_ / "p1.mailing"));
+}
+
+TEST_F(JobRunnerTest, WaitsForTheFolderThatItWasStagedIn) {
+    acceptStored("p1");
+    doWork();
+    stageOnRecord();
+    std::string const mark = UploadFolder(upload_, {}).identity().mark;
+    fs::rename(upload_, folder_ / "unmounted");
+    fs::create_directory(upload_);
+    startRunner();
+    runner_->resume();
+    EXPECT_EQ(state("p1"), "submitting: " + anotherFolder(mark));
+    EXPECT_TRUE(fs::exists(outbox_ / "p1.mailing")) << "the container is lost";
+    fs::remove(upload_);
+    fs::rename(folder_ / "unmounted", upload_);
+    runner_->resume();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, TakesNothingForLodgedThatIsMissingInAnotherFolder) {
+    acceptStored("p1");
+    runner_->upload("", "");
+    doWork();
+    std::string const mark = UploadFolder(upload_, {}).identity().mark;
+    fs::rename(upload_, folder_ / "unmounted");
+    fs::create_directory(upload_);
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("p1"), "submitted: " + anotherFolder(mark));
+    fs::remove(upload_);
+    fs::rename(folder_ / "unmounted", upload_);
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, StagesNothingIntoAnotherFolderThanTheOneThatWasSet) {
+    UploadFolder const set(upload_, {});
+    settings_.set("upload_folder_identity", set.identity().text());
+    fs::rename(upload_, folder_ / "unmounted");
+    fs::create_directory(upload_);
+    acceptStored("p1");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "queued: " + anotherFolder(set.identity().mark));
+    EXPECT_TRUE(fs::is_empty(upload_));
+}
+
+TEST_F(JobRunnerTest, RemovesLaterWhatStayedInTheOutbox) {
+    acceptStored("p1");
+    doWork();
+    // A folder that is not empty stands where the container is, and cannot be removed.
+    fs::path const container = outbox_ / "p1.mailing";
+    stageOnRecord();
+    fs::remove(container);
+    fs::create_directories(container / "below");
+    runner_->resume();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_TRUE(fs::exists(container));
+    fs::remove(container / "below");
+    runner_->resume();
+    EXPECT_FALSE(fs::exists(container));
+}
+
+TEST_F(JobRunnerTest, RemovesWhatAnEarlierProcessLeftInTheOutbox) {
+    acceptStored("p1");
+    acceptStored("p2");
+    doWork();
+    database_.exec("UPDATE jobs SET state = 'lodged' WHERE pack = 'p1'");
+    std::ofstream(outbox_ / "stranger.mailing") << "x";
+    startRunner();
+    runner_->resume();
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_TRUE(fs::exists(outbox_ / "p2.mailing"));
+    EXPECT_TRUE(fs::exists(outbox_ / "stranger.mailing"));
 }
 
 } // namespace

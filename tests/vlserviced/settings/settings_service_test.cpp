@@ -1,14 +1,19 @@
 #include "programs/vlserviced/settings/settings_service.h"
 
+#include "programs/vlserviced/settings/upload_folder.h"
 #include "programs/vlserviced/store/schema.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
+#include "vlservice/cfg/cfg_node_id.h"
+#include "vlservice/cfg/id.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 namespace {
+
+namespace fs = std::filesystem;
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -131,6 +136,60 @@ TEST_F(SettingsServiceTest, NothingIsChangedWhileChangesAreHeldBack) {
     EXPECT_EQ(failureOf([&] { service_.effective({"a=acme", {}}); }), "nothing was thrown");
     service_.suspend(0);
     EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), "nothing was thrown");
+}
+
+/// As the rule on tokens says it, pair by pair.
+TEST_F(SettingsServiceTest, ListsTheUsableNodesAsTheRuleOnTokensSays) {
+    std::vector<std::string> const ids{"u=bob/ou=north/ou=sales/a=acme",
+                                       "u=bob/ou=sales/a=acme",
+                                       "u=bob/a=acme",
+                                       "u=bob/ou=sales/",
+                                       "u=bobby/ou=sales/a=acme",
+                                       "ou=presales/a=acme",
+                                       "u=eve/ou=north/ou=sales/a=acme",
+                                       "u=bob/ou=sales/a=other"};
+    for (std::string const& id : ids)
+        service_.update(id, false);
+    std::vector<std::string> expected;
+    for (VlServiced::SettingsNode const& node : store_.nodes()) {
+        Cfg::CfgNodeId const asked{Cfg::Id(node.id, false)};
+        for (VlServiced::SettingsNode const& other : store_.nodes()) {
+            Cfg::CfgNodeId const own{Cfg::Id(other.id, false)};
+            if (!node.id.empty() && other.id.starts_with("u=bob/") &&
+                (asked == own || asked.isParentOf(own))) {
+                expected.push_back(node.id);
+                break;
+            }
+        }
+    }
+    std::vector<std::string> found;
+    for (auto const& node : service_.usableNodes("bob"))
+        found.push_back(node.id);
+    EXPECT_EQ(found, expected);
+    EXPECT_EQ(found.size(), 11u);
+}
+
+TEST_F(SettingsServiceTest, PutsTheIdentityOfTheUploadFolderOnRecord) {
+    TemporaryFolder upload;
+    service_.changeService({{"upload_folder", upload.path().string()}});
+    std::string const identity = service_.service().uploadFolderIdentity();
+    EXPECT_EQ(identity, VlServiced::UploadFolder(upload.path(), {}).identity().text());
+    EXPECT_FALSE(service_.service().told().get("upload_folder_identity"));
+    service_.changeService(parse(R"({"disabled":[]})"));
+    EXPECT_EQ(service_.service().uploadFolderIdentity(), identity);
+    service_.changeService(parse(R"({"upload_folder":null})"));
+    EXPECT_EQ(service_.service().uploadFolderIdentity(), "");
+}
+
+TEST_F(SettingsServiceTest, RecognisesAnUploadFolderThatWasSetWithoutAnIdentity) {
+    TemporaryFolder upload;
+    store_.setServiceSettings({{"upload_folder", upload.path().string()}});
+    service_.recogniseUploadFolder();
+    std::string const identity = service_.service().uploadFolderIdentity();
+    EXPECT_NE(identity, "");
+    fs::remove(upload / ".vlserviced");
+    service_.recogniseUploadFolder();
+    EXPECT_EQ(service_.service().uploadFolderIdentity(), identity) << "what is on record stays";
 }
 
 } // namespace

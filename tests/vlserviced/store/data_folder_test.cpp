@@ -1,5 +1,6 @@
 #include "programs/vlserviced/store/data_folder.h"
 
+#include "programs/vlserviced/store/schema.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 
@@ -56,6 +57,44 @@ TEST(DataFolder, ThatCannotBeWrittenIsNamed) {
     fs::path const folder = ::geteuid() == 0 ? fs::path("/proc/self") : fs::path("/");
     std::string const text = failureOf([&] { DataFolder data(folder); });
     EXPECT_TRUE(text.starts_with("cannot write into the folder " + folder.string() + ": ")) << text;
+}
+
+TEST(DataFolder, ThatOthersMayWriteIsRefused) {
+    for (auto const rights : {0777, 0770, 0702}) {
+        TemporaryFolder temporary;
+        fs::permissions(temporary.path(), fs::perms(rights));
+        EXPECT_EQ(failureOf([&] { DataFolder folder(temporary.path()); }),
+                  "others may write into the data folder " + temporary.path().string() +
+                      ": take their right away (chmod go-w)");
+    }
+}
+
+TEST(DataFolder, OfAnotherUserIsRefused) {
+    if (::geteuid() != 0)
+        GTEST_SKIP() << "only root can give a folder to another user";
+    TemporaryFolder temporary;
+    ASSERT_EQ(::chown(temporary.path().c_str(), 12345, 12345), 0);
+    EXPECT_EQ(failureOf([&] { DataFolder folder(temporary.path()); }),
+              "the data folder " + temporary.path().string() +
+                  " belongs to another user: start vlserviced as that user or name another folder");
+}
+
+TEST(DataFolder, TakesNoEmptyDatabaseForANewOne) {
+    TemporaryFolder temporary;
+    fs::path const file = temporary / "service.db";
+    std::ofstream(file).close();
+    EXPECT_EQ(failureOf([&] { VlServiced::openServiceDatabase(file); }),
+              "the service database " + file.string() +
+                  " is damaged (it is empty): restore it from a backup, or move it away to begin anew");
+    EXPECT_EQ(fs::file_size(file), 0u);
+}
+
+TEST(DataFolder, HoldsADatabaseForItsOwnerAlone) {
+    TemporaryFolder temporary;
+    fs::path const file = temporary / "service.db";
+    SQLite::Database const database = VlServiced::openServiceDatabase(file);
+    EXPECT_EQ(fs::status(file).permissions(), fs::perms(0600));
+    EXPECT_EQ(fs::status(file.string() + "-wal").permissions(), fs::perms(0600));
 }
 
 } // namespace

@@ -80,12 +80,13 @@ TEST_F(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
 
 TEST_F(JobStoreTest, RecordsWhereAContainerGoesBeforeItGoesThere) {
     store_.accept(job("p1"));
-    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/upload", 140));
+    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/upload", "2 7 mark", 140));
     store_.advance("p1", JobState::Accepted, JobState::Queued, 150);
-    EXPECT_TRUE(store_.beginSubmitting("p1", "/srv/upload", 160));
-    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/other", 170));
+    EXPECT_TRUE(store_.beginSubmitting("p1", "/srv/upload", "2 7 mark", 160));
+    EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/other", "", 170));
     EXPECT_EQ(store_.find("p1")->state, JobState::Submitting);
     EXPECT_EQ(store_.find("p1")->uploadFolder, "/srv/upload");
+    EXPECT_EQ(store_.find("p1")->uploadFolderIdentity, "2 7 mark");
     EXPECT_EQ(store_.find("p1")->changedAt, 160);
 }
 
@@ -161,7 +162,7 @@ TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
     store_.advance("p1", JobState::Queued, JobState::Submitting, 1);
     EXPECT_THAT(told, IsEmpty());
     store_.advance("p1", JobState::Accepted, JobState::Queued, 2);
-    store_.beginSubmitting("p1", "/srv/upload", 3);
+    store_.beginSubmitting("p1", "/srv/upload", "", 3);
     store_.setProblem("p1", "full");
     store_.fail("p1", "gone", 4);
     EXPECT_THAT(told, ElementsAre("p1", "p1", "p1", "p1"));
