@@ -19,6 +19,7 @@ public:
     Impl& operator=(Impl const&) = delete;
 
     std::shared_ptr<Ipc::CmdProcessorI> processor() const { return connection_; }
+    bool isOpen() const { return connection_->isOpen(); }
     void send(std::shared_ptr<Ipc::CmdI> const& cmd) {
         wait([&](ClientConnection::Done done) {
             connection_->submit(cmd, std::move(done));
@@ -47,6 +48,7 @@ Client::Client(ClientSettings settings) : impl_(std::make_unique<Impl>(std::move
 Client::~Client() = default;
 
 std::shared_ptr<Ipc::CmdProcessorI> Client::processor() const { return impl_->processor(); }
+bool Client::isOpen() const { return impl_->isOpen(); }
 void Client::send(std::shared_ptr<Ipc::CmdI> const& cmd) { impl_->send(cmd); }
 
 } // namespace Channel

@@ -31,6 +31,10 @@ public:
         return cmd;
     }
 
+    /// Whether it can be used further: a failure that leaves it open is one that the service has answered
+    /// with.
+    bool isOpen() const;
+
 private:
     class Impl;
     std::unique_ptr<Impl> impl_;

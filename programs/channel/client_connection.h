@@ -38,6 +38,8 @@ public:
     void sendNext();
     /// What is waiting fails.
     void close();
+    /// Whether requests can still be answered on it.
+    bool isOpen() const { return state_ != State::Closed; }
 
     Ipc::CmdTransferI* transfer() override { return this; }
     void send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json::Object const& message,

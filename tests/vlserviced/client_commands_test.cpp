@@ -1,6 +1,7 @@
 // The client's subcommands against a service: the command line in, text and exit status out.
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/settings.h"
+#include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/multicast_probe.h"
 #include "programs/vlmail/service/service_client.h"
 #include "tests/support/failure_of.h"
@@ -12,6 +13,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <fstream>
 #include <sstream>
 #include <thread>
@@ -224,6 +226,93 @@ TEST_F(ClientCommands, AMailingIsSentHandedOnAndFollowed) {
         << R"({"state":"failed","text":"no street"})";
     EXPECT_EQ(vlmail({"status", "--update"}).status, VlMail::INCOMPLETE);
     EXPECT_THAT(vlmail({"status"}).out, HasSubstr("the carrier: no street"));
+}
+
+TEST_F(ClientCommands, AMailingIsSentOverANewConnectionWhenTheOldOneBreaks) {
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1");
+    ServiceProcess* service = &service_;
+    VlMail::ServiceLine line([&] { return clientOf(*service, data_); });
+    service_.signal(SIGKILL);
+    service_.wait();
+    ServiceProcess next({"--data", data_.string(), "--no-discovery"});
+    service = &next;
+    EXPECT_EQ(VlMail::deliverPack(line, database, "p1", false).state, Protocol::JobState::Queued);
+    EXPECT_EQ(contentOf(data_ / "outbox" / "p1.mailing"), contentOfPack("p1"));
+    EXPECT_TRUE(Mailing::finishedPacks(database).empty()) << "it stays with the client";
+}
+
+TEST_F(ClientCommands, AMailingThatCannotBeSentIsNamedWithWhatCanBeDone) {
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1");
+    VlMail::ServiceLine line([this] { return clientOf(service_, data_); });
+    service_.signal(SIGKILL);
+    service_.wait();
+    std::string const text = failureOf([&] { VlMail::deliverPack(line, database, "p1", false); });
+    EXPECT_THAT(text, testing::StartsWith("mailing p1: "));
+    EXPECT_THAT(text, testing::EndsWith("; \"vlmail status p1\" tells what the service knows of it, \"vlmail "
+                                        "resume p1\" sends it again, never twice, and \"vlmail discard p1\" "
+                                        "erases it"));
+    EXPECT_EQ(Mailing::finishedPacks(database).size(), 1u);
+}
+
+TEST_F(ClientCommands, WhatTheServiceRefusesIsNotRepeated) {
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1", "acme");
+    int connections = 0;
+    VlMail::ServiceLine line([&] {
+        ++connections;
+        return clientOf(service_, data_);
+    });
+    EXPECT_THAT(failureOf([&] { VlMail::deliverPack(line, database, "p1", false); }),
+                HasSubstr("mailing p1: node id \"acme\" is not valid"));
+    EXPECT_EQ(connections, 1);
+}
+
+TEST_F(ClientCommands, StrandedMailingsAreListedResumedAndDiscarded) {
+    fs::path const database = folder_ / "packs.db";
+    for (char const* id : {"p1", "p2", "p3"})
+        storePack(database, id);
+    std::string const file = database.string();
+    EXPECT_EQ(output({"resume", "p1", "--database", file}), "p1, queued\n");
+    Result const stranded = vlmail({"status", "--stranded", "--database", file});
+    EXPECT_EQ(stranded.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(stranded.out, HasSubstr("p2 "));
+    EXPECT_THAT(stranded.out, HasSubstr("  Title of p3\n"));
+    EXPECT_THAT(stranded.out, testing::Not(HasSubstr("p1 ")));
+    output({"discard", "p2", "--database", file});
+    EXPECT_THAT(vlmail({"status", "--stranded", "--json", "--database", file}).out,
+                testing::StartsWith("{\"stranded\":[{\"id\":\"p3\",\"title\":\"Title of "
+                                    "p3\",\"cfg_id\":\"a=acme\",\"created\":"));
+    EXPECT_EQ(complaint({"discard", "p2", "--database", file}),
+              "vlmail: the pack database " + file +
+                  " has no mailing p2; \"vlmail status --stranded\" lists those that it has\n");
+    output({"discard", "p3", "--database", file});
+    EXPECT_EQ(output({"status", "--stranded", "--database", file}), "no mailing is stranded\n");
+    EXPECT_EQ(output({"status", "p2"}), "the service has no such mailings\n");
+}
+
+TEST_F(ClientCommands, AMailingThatTheServiceIsAboutToFetchIsNotDiscarded) {
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1");
+    output({"settings", "suspend", "jobs"});
+    {
+        auto const client = clientOf(service_, data_);
+        VlMail::sendPack(*client, database, "p1", false);
+    }
+    EXPECT_EQ(complaint({"discard", "p1", "--database", database.string()}),
+              "vlmail: the service is about to fetch mailing p1 and its letters will go out: it cannot be "
+              "discarded\n");
+    EXPECT_EQ(output({"status", "--stranded", "--database", database.string()}), "no mailing is stranded\n");
+    EXPECT_EQ(Mailing::finishedPacks(database).size(), 1u);
+}
+
+TEST_F(ClientCommands, ThePackDatabaseNeverLeavesItsFolder) {
+    auto const client = clientOf(service_, data_);
+    output({"settings", "set", "a=acme", "app", "db_host=/srv/packs", "db_name=../../etc/packs.db"});
+    EXPECT_EQ(failureOf([&] { VlMail::packDatabaseOf(*client, "a=acme"); }),
+              "the setting \"db_name\" of node \"a=acme\" has to be the name of a file, and "
+              "\"../../etc/packs.db\" is none");
 }
 
 TEST_F(ClientCommands, ThePackDatabaseIsThatOfTheNodesSettings) {

@@ -21,6 +21,8 @@ void addPlanCommand(Base::Command const& app, Task& task);
 void addPresetsCommand(Base::Command const& app, Task& task);
 void addPriceCommand(Base::Command const& app, Task& task);
 void addSettingsCommand(Base::Command const& app, Task& task);
+/// resume and discard.
+void addStrandedCommands(Base::Command const& app, Task& task);
 void addStatusCommand(Base::Command const& app, Task& task);
 void addUploadCommand(Base::Command const& app, Task& task);
 

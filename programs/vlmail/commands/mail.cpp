@@ -45,11 +45,12 @@ int report(Dispatch const& dispatch, Options const& options, Terminal const& ter
 /// Where the mailings go, by the options. The connection is there when a service is to get them.
 struct Destination {
     Destination(Options const& options, Terminal const& terminal)
-        : service(options.send ? connectToService(options.service, terminal.err) : nullptr),
+        : service(options.send ? std::make_unique<ServiceLine>(lineToService(options.service, terminal))
+                               : nullptr),
           nodeId(nodeIdIn(options.node)), begin(service ? mailingsToService(*service, nodeId, options.upload)
                                                         : mailingsIntoFolder(options.output)) {}
 
-    std::unique_ptr<Channel::Client> service;
+    std::unique_ptr<ServiceLine> service;
     std::string nodeId;
     BeginMailing begin;
 };
@@ -63,7 +64,7 @@ NodeSettings settingsFromService(Channel::Client& service, std::string const& no
 
 NodeSettings settingsFor(Options const& options, Destination const& destination) {
     return options.settings.empty() && destination.service
-               ? settingsFromService(*destination.service, destination.nodeId)
+               ? settingsFromService(destination.service->client(), destination.nodeId)
                : NodeSettings::fromFileIfNamed(options.settings);
 }
 

@@ -16,6 +16,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addPriceCommand(command, task);
     addSettingsCommand(command, task);
     addStatusCommand(command, task);
+    addStrandedCommands(command, task);
     addUploadCommand(command, task);
 }
 

@@ -1,5 +1,7 @@
 #include "programs/vlmail/commands/service_options.h"
 
+#include "programs/vlmail/commands/settings.h"
+
 namespace VlMail {
 
 void addServiceOptions(Base::Command const& command, ServiceOptions& options) {
@@ -14,6 +16,20 @@ void addServiceOptions(Base::Command const& command, ServiceOptions& options) {
         .valueName("FINGERPRINT");
     command.addFlag("--allow-channel-1", options.allowsChannel1,
                     "Go on with a service that speaks version 1 of the connection alone");
+}
+
+ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal) {
+    return ServiceLine([&options, &terminal] { return connectToService(options, terminal.err); });
+}
+
+void addPackDatabaseOptions(Base::Command const& command, PackDatabaseOptions& options) {
+    command.addOption("--database", options.file, "The pack database [that of the node]").valueName("FILE");
+    command.addOption("--node", options.node, "The node that the mailing was sent for").showDefault();
+}
+
+std::filesystem::path databaseFor(PackDatabaseOptions const& options, Channel::Client& service) {
+    return options.file.empty() ? packDatabaseOf(service, nodeIdIn(options.node))
+                                : std::filesystem::absolute(options.file);
 }
 
 } // namespace VlMail

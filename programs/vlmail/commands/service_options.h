@@ -3,10 +3,29 @@
 
 #include "programs/base/command_line.h"
 #include "programs/vlmail/service/service_client.h"
+#include "programs/vlmail/service/service_line.h"
+
+#include <filesystem>
+#include <string>
 
 namespace VlMail {
 
 /// `options` has to outlive the parsing of the command line.
 void addServiceOptions(Base::Command const& command, ServiceOptions& options);
+
+/// A connection that is made again when it breaks. The options and the terminal have to outlive it.
+ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal);
+
+/// Which pack database a subcommand is about.
+struct PackDatabaseOptions {
+    /// Empty for the one of the node.
+    std::string file;
+    std::string node = "/";
+};
+
+/// `options` has to outlive the parsing of the command line.
+void addPackDatabaseOptions(Base::Command const& command, PackDatabaseOptions& options);
+/// The file that the options mean, by the settings that the service keeps.
+std::filesystem::path databaseFor(PackDatabaseOptions const& options, Channel::Client& service);
 
 } // namespace VlMail

@@ -1,6 +1,7 @@
 // vlmail status: how far the service has brought the mailings.
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/ipc/update_status.h"
@@ -18,8 +19,9 @@ namespace {
 struct Options {
     ServiceOptions service;
     std::vector<std::string> packs;
-    std::string database;
+    PackDatabaseOptions database;
     bool update = false;
+    bool stranded = false;
     bool json = false;
 };
 
@@ -47,10 +49,36 @@ bool anyFailed(std::vector<Protocol::JobReport> const& jobs) {
         jobs, [](Protocol::JobReport const& job) { return job.state == Protocol::JobState::Failed; });
 }
 
+/// The packs that wait in the pack database and that the service knows nothing of.
+int showStranded(Options const& options, Terminal const& terminal) {
+    auto const service = connectToService(options.service, terminal.err);
+    std::vector<Mailing::StoredPack> const packs =
+        settlePacks(*service, databaseFor(options.database, *service));
+    constexpr auto RIGHT = TextTable::Align::Right;
+    TextTable table({{"mailing"}, {"since"}, {"pages", RIGHT}, {"title"}});
+    json::Array list;
+    for (auto const& [info, created, pages] : packs) {
+        table.addRow({info.id, LocalTime::toText(created), std::to_string(pages), info.title});
+        list.append(json::Object{{"id", info.id},
+                                 {"title", info.title},
+                                 {"cfg_id", info.cfgId},
+                                 {"created", created},
+                                 {"pages", pages}});
+    }
+    if (options.json)
+        terminal.out << json::Object{{"stranded", list}} << '\n';
+    else if (packs.empty())
+        terminal.out << "no mailing is stranded\n";
+    else
+        table.print(terminal.out);
+    return packs.empty() ? FINE : INCOMPLETE;
+}
+
 int showStatus(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal.err);
-    std::filesystem::path const database =
-        options.database.empty() ? std::filesystem::path() : std::filesystem::absolute(options.database);
+    std::filesystem::path const database = options.database.file.empty()
+                                               ? std::filesystem::path()
+                                               : std::filesystem::absolute(options.database.file);
     Protocol::JobsQuery query;
     query.folder = database.parent_path().string();
     query.database = database.filename().string();
@@ -73,13 +101,20 @@ void addStatusCommand(Base::Command const& app, Task& task) {
     Base::Command const status =
         app.addCommand("status", "Shows how far the service has brought the mailings");
     status.addOption("MAILING", options->packs, "Ids of mailings [all]");
-    status.addOption("--database", options->database, "Only mailings from this pack database")
+    status.addOption("--database", options->database.file, "Only mailings from this pack database")
         .valueName("FILE");
+    status.addFlag("--stranded", options->stranded,
+                   "Mailings in the pack database that the service has no job of");
+    status.addOption("--node", options->database.node, "The node whose pack database --stranded looks into")
+        .showDefault();
     status.addFlag("--update", options->update, "Have the service look first at what the carrier has done");
     status.addFlag("--json", options->json, "The service's answer as one JSON object");
     addServiceOptions(status, options->service);
-    status.whenNamed(
-        [=, &task] { task = [=](Terminal const& terminal) { return showStatus(*options, terminal); }; });
+    status.whenNamed([=, &task] {
+        task = [=](Terminal const& terminal) {
+            return options->stranded ? showStranded(*options, terminal) : showStatus(*options, terminal);
+        };
+    });
 }
 
 } // namespace VlMail

@@ -4,10 +4,10 @@
 #include "programs/base/hex.h"
 #include "programs/base/pending_file.h"
 #include "programs/mailing/pack_database.h"
+#include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/pack/pack_wrapper.h"
 
-#include <chrono>
 #include <iomanip>
 #include <random>
 #include <sstream>
@@ -49,7 +49,7 @@ private:
 
 class SentMailing : public OutgoingMailing {
 public:
-    SentMailing(Channel::Client& service, fs::path const& database, std::string const& nodeId, bool upload,
+    SentMailing(ServiceLine& service, fs::path const& database, std::string const& nodeId, bool upload,
                 Cfg::PackPreset const& preset, std::time_t now)
         : service_(service), database_(database), upload_(upload), id_(newMailingId(now)),
           pack_(database, {id_, nodeId, preset.title()}), builder_(pack_, id_, preset, now) {}
@@ -58,21 +58,13 @@ public:
 
     void finish() override {
         pack_.finish(builder_.metadata().toBlob());
-        sendPack(service_, database_, id_, upload_);
-        Protocol::JobReport const job = awaitJob(service_, id_, PATIENCE);
-        state_ = Protocol::stateName(job.state);
-        if (!job.problem.empty())
-            throw Base::Error("the service has trouble with mailing " + id_ + ": " + job.problem +
-                              "; see vlmail status");
+        state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_).state);
     }
 
     std::string place() const override { return id_ + ", " + state_; }
 
 private:
-    /// For a job that is only waiting for its turn; it goes on without us.
-    static constexpr std::chrono::seconds PATIENCE{10};
-
-    Channel::Client& service_;
+    ServiceLine& service_;
     fs::path database_;
     bool upload_;
     std::string id_;
@@ -99,9 +91,13 @@ private:
     MailingBuilder builder_;
 };
 
-void makeFolder(fs::path const& folder, char const* remedy) {
+enum class ForOwner { Alone, AndOthers };
+
+void makeFolder(fs::path const& folder, ForOwner forOwner, char const* remedy) {
     std::error_code failure;
-    fs::create_directories(folder, failure);
+    bool const isNew = fs::create_directories(folder, failure);
+    if (isNew && forOwner == ForOwner::Alone)
+        fs::permissions(folder, fs::perms::owner_all, failure);
     if (failure)
         throw Base::Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() + "; " +
                           remedy);
@@ -112,15 +108,17 @@ void makeFolder(fs::path const& folder, char const* remedy) {
 OutgoingMailing::~OutgoingMailing() = default;
 
 BeginMailing mailingsIntoFolder(fs::path const& folder) {
-    makeFolder(folder, "name another with -o");
+    makeFolder(folder, ForOwner::AndOthers, "name another with -o");
     return [folder](Cfg::PackPreset const& preset) {
         return std::make_unique<MailingFile>(folder, preset, std::time(nullptr));
     };
 }
 
-BeginMailing mailingsToService(Channel::Client& service, std::string const& nodeId, bool upload) {
-    fs::path const database = packDatabaseOf(service, nodeId);
-    makeFolder(database.parent_path(), "name another in the settings \"db_host\" of the node");
+BeginMailing mailingsToService(ServiceLine& service, std::string const& nodeId, bool upload) {
+    fs::path const database = packDatabaseOf(service.client(), nodeId);
+    makeFolder(database.parent_path(), ForOwner::Alone,
+               "name another in the settings \"db_host\" of the node");
+    settlePacks(service.client(), database);
     return [&service, nodeId, upload, database](Cfg::PackPreset const& preset) {
         return std::make_unique<SentMailing>(service, database, nodeId, upload, preset, std::time(nullptr));
     };

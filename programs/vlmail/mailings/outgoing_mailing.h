@@ -1,8 +1,8 @@
 #pragma once
 // A mailing on its way to where it goes: a file, a service, or nowhere while only a plan is made.
 
-#include "programs/channel/client.h"
 #include "programs/vlmail/mailings/mailing_builder.h"
+#include "programs/vlmail/service/service_line.h"
 
 #include <ctime>
 #include <filesystem>
@@ -31,9 +31,9 @@ using BeginMailing = std::function<std::unique_ptr<OutgoingMailing>(Cfg::PackPre
 BeginMailing mailingsIntoFolder(std::filesystem::path const& folder);
 
 /// Mailings that a service is to process: stored in the pack database of a node and announced to the service,
-/// which must outlive the function. With `upload` the service hands them on at once. Throws std::exception
-/// with a line for people.
-BeginMailing mailingsToService(Channel::Client& service, std::string const& nodeId, bool upload);
+/// which must outlive the function. With `upload` the service hands them on at once. What the service has
+/// fetched meanwhile of earlier packs is erased. Throws std::exception with a line for people.
+BeginMailing mailingsToService(ServiceLine& service, std::string const& nodeId, bool upload);
 
 /// Mailings that are only decided: their pages are thrown away.
 BeginMailing mailingsNowhere();

@@ -1,6 +1,8 @@
 #include "programs/vlmail/service/service_client.h"
 
 #include "programs/base/error.h"
+#include "programs/base/plain_text.h"
+#include "programs/base/safe_name.h"
 #include "programs/channel/token.h"
 #include "programs/protocol/failure.h"
 #include "programs/vlmail/service/service_search.h"
@@ -111,6 +113,9 @@ fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
     json::Object const values = Protocol::SettingsAnswer(ask(service, {nodeId, {app}})).part(app).values;
     fs::path const folder = values.get("db_host").textOrEmpty();
     std::string const name = values.get("db_name").textOrEmpty();
+    if (!name.empty() && Base::safeFileName(name) != name)
+        throw Base::Error("the setting \"db_name\" of node \"" + nodeId +
+                          "\" has to be the name of a file, and \"" + Base::plainLine(name) + "\" is none");
     return (folder.is_absolute() ? folder : dataFolder()) / (name.empty() ? DEFAULT_PACK_DATABASE : name);
 }
 

@@ -47,7 +47,7 @@ json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query)
 json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query);
 
 /// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
-/// otherwise "packs.db" in dataFolder().
+/// otherwise "packs.db" in dataFolder(). Throws Error when the name is not that of a file.
 std::filesystem::path packDatabaseOf(Channel::Client& service, std::string const& nodeId);
 /// Has a finished pack processed and, with `upload`, handed on. Returns when the pack is on record; it has to
 /// stay in the database until its job is beyond "accepted". Sending a pack again changes nothing.

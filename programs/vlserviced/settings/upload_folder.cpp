@@ -11,7 +11,6 @@
 #include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
-#include <utility>
 
 namespace VlServiced {
 namespace {
@@ -25,23 +24,29 @@ std::string newMark() {
     std::array<unsigned char, MARK_BYTES / 2> bytes{};
     for (unsigned char& byte : bytes)
         byte = static_cast<unsigned char>(random());
-    return Base::toHex(bytes);
+    return Base::toHex(bytes.data(), bytes.size());
 }
 
 [[noreturn]] void fail(std::string const& what) {
     throw std::system_error(errno, std::generic_category(), what);
 }
 
+Base::FileDescriptor openFolder(fs::path const& folder) {
+    int const number = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (number < 0)
+        fail("there is no upload folder " + folder.string());
+    return {number, folder};
+}
+
 /// The text of the mark; empty when there is none that could be one.
 std::string markIn(int folder) {
-    int const file =
+    int const number =
         ::openat(folder, UploadFolder::MARK_FILE, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
-    if (file < 0)
+    if (number < 0)
         return {};
+    Base::FileDescriptor file(number, UploadFolder::MARK_FILE);
     std::string text(MARK_BYTES, '\0');
-    ssize_t const size = ::read(file, text.data(), text.size());
-    ::close(file);
-    bool const isWhole = size == static_cast<ssize_t>(MARK_BYTES);
+    bool const isWhole = file.read(text.data(), text.size()) == MARK_BYTES;
     return isWhole && text.find_first_not_of("0123456789abcdef") == std::string::npos ? text : std::string();
 }
 
@@ -57,60 +62,50 @@ FolderIdentity FolderIdentity::fromText(std::string const& text) {
     return identity;
 }
 
-UploadFolder::UploadFolder(fs::path folder, std::string const& identity) : path_(std::move(folder)) {
-    open();
-    try {
-        readIdentity();
-        if (!identity.empty())
-            requireIdentity(FolderIdentity::fromText(identity));
-        else if (identity_.mark.empty())
-            mark();
-    } catch (...) {
-        ::close(descriptor_);
-        throw;
-    }
-}
-
-UploadFolder::~UploadFolder() { ::close(descriptor_); }
-
-void UploadFolder::open() {
-    descriptor_ = ::open(path_.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (descriptor_ < 0)
-        fail("there is no upload folder " + path_.string());
+UploadFolder::UploadFolder(fs::path const& folder, std::string const& identity)
+    : folder_(openFolder(folder)) {
+    readIdentity();
+    if (!identity.empty())
+        requireIdentity(FolderIdentity::fromText(identity));
+    else if (identity_.mark.empty())
+        mark();
 }
 
 void UploadFolder::readIdentity() {
     struct stat status {};
-    ::fstat(descriptor_, &status);
-    identity_ = {status.st_dev, status.st_ino, markIn(descriptor_)};
+    ::fstat(descriptor(), &status);
+    identity_ = {status.st_dev, status.st_ino, markIn(descriptor())};
 }
 
 void UploadFolder::requireIdentity(FolderIdentity const& wanted) const {
     if (!identity_.isSameAs(wanted))
-        throw Base::Error("the upload folder " + path_.string() +
+        throw Base::Error("the upload folder " + path().string() +
                           " is another one than before: mount the one whose file " + MARK_FILE + " reads " +
                           wanted.mark);
 }
 
-/// A mark that a crash left empty is written anew.
+/// It appears whole, in place of whatever had its name.
 void UploadFolder::mark() {
-    std::string const temporary = std::string(MARK_FILE) + '.' + newMark();
-    int const file =
-        ::openat(descriptor_, temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0644);
-    if (file < 0)
-        fail("cannot write into the upload folder " + path_.string());
-    std::string const text = newMark();
-    bool const isWritten =
-        ::write(file, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && ::fsync(file) == 0;
-    int const error = errno;
-    ::close(file);
-    if (!isWritten || ::renameat(descriptor_, temporary.c_str(), descriptor_, MARK_FILE) != 0) {
-        ::unlinkat(descriptor_, temporary.c_str(), 0);
-        errno = isWritten ? errno : error;
-        fail("cannot write into the upload folder " + path_.string());
+    std::string const cannotWrite = "cannot write into the upload folder " + path().string();
+    std::string const temporary = std::string(MARK_FILE) + ".part";
+    ::unlinkat(descriptor(), temporary.c_str(), 0);
+    int const number =
+        ::openat(descriptor(), temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0644);
+    if (number < 0)
+        fail(cannotWrite);
+    try {
+        Base::FileDescriptor file(number, path() / temporary);
+        file.writeAll(newMark());
+        file.sync();
+        file.close();
+        if (::renameat(descriptor(), temporary.c_str(), descriptor(), MARK_FILE) != 0)
+            fail(cannotWrite);
+    } catch (...) {
+        ::unlinkat(descriptor(), temporary.c_str(), 0);
+        throw;
     }
-    ::fsync(descriptor_);
-    identity_.mark = markIn(descriptor_);
+    ::fsync(descriptor());
+    identity_.mark = markIn(descriptor());
 }
 
 } // namespace VlServiced

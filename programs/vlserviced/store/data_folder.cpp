@@ -3,8 +3,12 @@
 #include "programs/base/error.h"
 #include "programs/base/pending_file.h"
 
+#include <cerrno>
+#include <cstring>
 #include <string>
+#include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
 #include <utility>
 
 namespace VlServiced {
