@@ -58,14 +58,27 @@ json::Object SettingsStore::parts(std::string const& id) const {
     return parts;
 }
 
+long long SettingsStore::bytesOf(std::string const& id) const {
+    SQLite::Statement query(database_, "SELECT ifnull(sum(length(json)), 0) FROM parts WHERE node = ?");
+    query.bindNoCopy(1, id);
+    query.executeStep();
+    return query.getColumn(0).getInt64();
+}
+
 std::vector<SettingsLevel> SettingsStore::chain(std::string const& id) const {
     // One state of the tree for all levels.
     SQLite::Transaction const reading(database_);
     std::vector<SettingsLevel> levels;
+    long long bytes = 0;
     for (Cfg::Id const& level : Cfg::Id(id, false).allIds()) {
         // An id that ends in a slash has the root twice in its chain.
-        if (levels.empty() || levels.back().id != level.str())
-            levels.push_back({level.str(), parts(level.str())});
+        if (!levels.empty() && levels.back().id == level.str())
+            continue;
+        // Before anything is parsed: a tree of JSON takes many times what its text does.
+        if ((bytes += bytesOf(level.str())) > MAX_CHAIN_BYTES)
+            throw Base::Error("the settings that count at node " + id + " are too large, more than " +
+                              std::to_string(MAX_CHAIN_BYTES) + " bytes of JSON: let its nodes hold less");
+        levels.push_back({level.str(), parts(level.str())});
     }
     return levels;
 }
@@ -91,6 +104,11 @@ void SettingsStore::add(std::string const& id) {
 }
 
 void SettingsStore::setPart(std::string const& id, std::string const& part, json::Value const& value) {
+    std::string const text = value ? textOf(value.toObject()) : std::string();
+    if (text.size() > MAX_PART_BYTES)
+        throw Base::Error("the settings \"" + part + "\" of node " + id + " are too large: they have " +
+                          std::to_string(text.size()) + " bytes, and " + std::to_string(MAX_PART_BYTES) +
+                          " are possible");
     SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
     addChain(id);
     SQLite::Statement change(database_, value ? "INSERT INTO parts (node, part, json) VALUES (?1, ?2, ?3) "
@@ -99,7 +117,7 @@ void SettingsStore::setPart(std::string const& id, std::string const& part, json
     change.bind(1, id);
     change.bind(2, part);
     if (value)
-        change.bind(3, textOf(value.toObject()));
+        change.bind(3, text);
     change.exec();
     transaction.commit();
 }

@@ -37,12 +37,14 @@ public:
     std::vector<SettingsNode> nodes() const;
     /// An object from part name to the node's own value, in flat form.
     json::Object parts(std::string const& id) const;
-    /// The node and all above it, the root last. Nodes that are not stored are levels without parts.
+    /// The node and all above it, the root last. Nodes that are not stored are levels without parts. Throws
+    /// Error when they hold more than MAX_CHAIN_BYTES.
     std::vector<SettingsLevel> chain(std::string const& id) const;
 
     /// Adds the node, and those above it that are not there yet.
     void add(std::string const& id);
     /// Replaces the node's own value of a part, adding the node when it is new. The empty handle erases it.
+    /// Throws Error for more than MAX_PART_BYTES.
     void setPart(std::string const& id, std::string const& part, json::Value const& value);
     /// Erases all own values of the node, and adds it when it is new.
     void clear(std::string const& id);
@@ -53,8 +55,14 @@ public:
     json::Object serviceSettings() const;
     void setServiceSettings(json::Object const& settings);
 
+    /// Of the JSON of one part of one node, and of all that a chain holds: an answer has to carry it.
+    static constexpr std::size_t MAX_PART_BYTES = 4 << 20;
+    static constexpr long long MAX_CHAIN_BYTES = 8 << 20;
+
 private:
     void addChain(std::string const& id);
+    /// How long the JSON texts of a node's parts are.
+    long long bytesOf(std::string const& id) const;
 
     SQLite::Database& database_;
 };

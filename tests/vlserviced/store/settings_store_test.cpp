@@ -136,4 +136,23 @@ TEST_F(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
     EXPECT_THAT(nodeIds(), ElementsAre(""));
 }
 
+TEST_F(SettingsStoreTest, KeepsPartsOfABoundedSize) {
+    json::Object const part{{"descr", std::string(5 << 20, 'x')}};
+    EXPECT_EQ(failureOf([&] { store_.setPart("a=acme", "app", part); }),
+              "the settings \"app\" of node a=acme are too large: they have 5242892 bytes, and 4194304 are "
+              "possible");
+    EXPECT_FALSE(store_.contains("a=acme"));
+}
+
+TEST_F(SettingsStoreTest, ReadsChainsOfABoundedSize) {
+    json::Object const part{{"descr", std::string(3 << 20, 'x')}};
+    for (char const* node : {"", "a=acme", "u=bob/a=acme"})
+        store_.setPart(node, "app", part);
+    EXPECT_EQ(store_.chain("a=acme").size(), 2u);
+    EXPECT_EQ(
+        failureOf([&] { store_.chain("u=bob/a=acme"); }),
+        "the settings that count at node u=bob/a=acme are too large, more than 8388608 bytes of JSON: let "
+        "its nodes hold less");
+}
+
 } // namespace
