@@ -265,7 +265,7 @@ TEST_F(ClientCommands, WhatTheServiceRefusesIsNotRepeated) {
         return clientOf(service_, data_);
     });
     EXPECT_THAT(failureOf([&] { VlMail::deliverPack(line, database, "p1", false); }),
-                HasSubstr("mailing p1: node id \"acme\" is not valid"));
+                HasSubstr("mailing p1: The service refuses: node id \"acme\" is not valid"));
     EXPECT_EQ(connections, 1);
 }
 

@@ -4,6 +4,7 @@
 #include "programs/base/command_line.h"
 #include "programs/vlmail/service/service_client.h"
 #include "programs/vlmail/service/service_line.h"
+#include "programs/vlmail/terminal/terminal.h"
 
 #include <filesystem>
 #include <string>
