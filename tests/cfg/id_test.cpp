@@ -223,6 +223,13 @@ TEST(IdQueries, LookAtTheTextAlone) {
     }
 }
 
+TEST(IdQueries, OfTextsCanBeHandedAround) {
+    bool (*const hasUser)(std::string) = &Id::hasUserStr;
+    bool (*const isParent)(std::string const&) = &Id::isParentIdStr;
+    EXPECT_TRUE(hasUser("u=bob/"));
+    EXPECT_FALSE(isParent("u=bob/"));
+}
+
 struct NameCase {
     char const* id;
     char const* account;

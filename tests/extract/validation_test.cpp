@@ -6,6 +6,8 @@
 #include <gmock/gmock.h>
 
 #include <clocale>
+#include <cstddef>
+#include <cstring>
 #include <limits>
 #include <locale>
 #include <memory>
@@ -569,6 +571,23 @@ TEST(ValidatorWriting, WritesKeysInOrderAndLeavesOutDefaults) {
     };
     for (auto const& row : rows)
         EXPECT_EQ(written(definition(row.keys)), row.written) << row.keys;
+}
+
+/// The place of a virtual operation in its class's table.
+template<typename Operation>
+std::ptrdiff_t slotOf(Operation operation) {
+    std::ptrdiff_t parts[2];
+    static_assert(sizeof operation == sizeof parts);
+    std::memcpy(parts, &operation, sizeof parts);
+    return (parts[0] - 1) / static_cast<std::ptrdiff_t>(sizeof(void*));
+}
+
+// Part of the binary interface: a destructor takes the first two places, the private ones lie between and behind.
+TEST(ValidatorOperations, KeepTheirPlacesForProgramsThatAreBuiltAlready) {
+    EXPECT_EQ(slotOf(&Validation::valueType), 2);
+    EXPECT_EQ(slotOf(&Validation::minVal), 3);
+    EXPECT_EQ(slotOf(&Validation::maxVal), 4);
+    EXPECT_EQ(slotOf(&Validation::clone), 6);
 }
 
 TEST(ValidatorCloning, CopiesClassLimitsAndADefaultOfItsOwn) {

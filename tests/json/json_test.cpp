@@ -41,6 +41,7 @@ static_assert(std::is_convertible_v<double, json::Value>);
 static_assert(std::is_convertible_v<char const*, json::Value>);
 static_assert(std::is_convertible_v<std::string, json::Value>);
 static_assert(std::is_base_of_v<std::runtime_error, json::Exc>);
+static_assert(std::is_convertible_v<std::string, json::Exc>);
 static_assert(std::is_nothrow_move_constructible_v<json::Value>);
 static_assert(sizeof(json::Value) == sizeof(json_t*) && sizeof(json::Object) == sizeof(json_t*));
 

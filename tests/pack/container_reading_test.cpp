@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <functional>
+#include <limits>
 
 namespace {
 
@@ -40,7 +41,7 @@ TEST_F(ReadingContainers, GivePagesAndMetadataOfWhatWasWritten) {
     EXPECT_EQ(page(in, "a.pdf", "1"), PAGE_1);
     EXPECT_EQ(page(in, "a.pdf", "2"), PAGE_2) << "again";
     EXPECT_EQ(textOf(in.inputFullMeta()), METADATA);
-    EXPECT_FALSE(in.outputFinished());
+    EXPECT_FALSE(in.outputFinalished());
     EXPECT_THAT(log_.take(), IsEmpty());
 }
 
@@ -136,12 +137,21 @@ TEST_F(ReadingContainers, FallThroughFromATrailerThatPointsBehindTheIndex) {
     }
 }
 
-TEST_F(ReadingContainers, LogATrailerThatPointsBeforeTheFile) {
-    std::string bytes = trailingLayout(PAGE_1, indexOf(item("1", 0, PAGE_1)));
-    write(bytes.replace(bytes.size() - 8, 8, littleEndian(~std::uint64_t{0})));
-    EXPECT_THAT(failToOpen(),
-                ElementsAre(LogLine{4, "Failed to read from file " + quoted() +
-                                           ". Import failed, system error code " + std::to_string(EINVAL)}));
+TEST_F(ReadingContainers, LogAnIndexThatWouldBeginBeforeTheFileHoweverFar) {
+    LogLine const line{4, "Failed to read from file " + quoted() + ". Import failed, system error code " +
+                              std::to_string(EINVAL)};
+    std::int64_t const gigabytes4 = std::int64_t{1} << 32;
+    std::string trailing = trailingLayout(PAGE_1, indexOf(item("1", 0, PAGE_1)));
+    std::string leading = leadingLayout(PAGE_1, indexOf(item("1", 8, PAGE_1)));
+    for (std::int64_t position :
+         {std::int64_t{-1}, 1 - gigabytes4, -gigabytes4, -gigabytes4 - 1, -2 * gigabytes4,
+          std::numeric_limits<std::int64_t>::min()}) {
+        std::string const number = littleEndian(static_cast<std::uint64_t>(position));
+        write(trailing.replace(trailing.size() - 8, 8, number));
+        EXPECT_THAT(failToOpen(), ElementsAre(line)) << "trailing offset " << position;
+        write(leading.replace(0, 8, number));
+        EXPECT_THAT(failToOpen(), ElementsAre(line)) << "leading offset " << position;
+    }
 }
 
 TEST_F(ReadingContainers, LogAWideHeaderCutShort) {
@@ -258,6 +268,12 @@ TEST_F(ReadingContainers, LeaveMissingAndUnreadableAttributesEmpty) {
     EXPECT_THAT(log_.take(), IsEmpty());
 }
 
+TEST_F(ReadingContainers, CannotReadAnItemWithoutLengthWhereNoFileCanReach) {
+    write(trailingLayout(PAGE_1, indexOf("<mailitem name='1' offset='9223372036854775808'/>")));
+    EXPECT_EQ(page(open(), "", "1"), "");
+    EXPECT_THAT(log_.take(), ElementsAre(LogLine{4, "Failed to read binary 1 from import file"}));
+}
+
 TEST_F(ReadingContainers, FindAnItemWithoutADocumentByTheEmptyName) {
     std::string const bare = "<mailitem name=\"1\" offset=\"0\" length=\"" + std::to_string(PAGE_1.size()) +
                              "\" role=\"page\" crc=\"" + std::to_string(crcOf(PAGE_1)) + "\"/>";
@@ -313,7 +329,7 @@ TEST_F(ReadingContainers, FailAsAWholeOnARequestForAnUnknownPage) {
     EXPECT_THAT(log_.take(), ElementsAre(LogLine{4, "Failed to read binary 1 from import file"},
                                          LogLine{4, "Failed to read binary DDT440001.TDD from import file"}));
     EXPECT_EQ(in.szBins(), 3u);
-    EXPECT_FALSE(in.outputFinished());
+    EXPECT_FALSE(in.outputFinalished());
     EXPECT_TRUE(std::filesystem::exists(file_)) << "an imported file is never removed";
 }
 

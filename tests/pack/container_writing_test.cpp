@@ -42,13 +42,13 @@ TEST_F(WritingContainers, TellHowFarTheyAre) {
     PackWrapper& out = create();
     EXPECT_EQ(out.pthFile(), file_.string());
     EXPECT_EQ(out.szBins(), 0u);
-    EXPECT_FALSE(out.outputFinished());
+    EXPECT_FALSE(out.outputFinalished());
     out.savePage("a.pdf", "1", bufferOf(PAGE_1));
     EXPECT_EQ(out.szBins(), 1u);
-    EXPECT_FALSE(out.outputFinished());
+    EXPECT_FALSE(out.outputFinalished());
     EXPECT_TRUE(out.finalizeOutput(bufferOf(METADATA)));
     EXPECT_EQ(out.szBins(), 2u);
-    EXPECT_TRUE(out.outputFinished());
+    EXPECT_TRUE(out.outputFinalished());
 }
 
 TEST_F(WritingContainers, ShowTheirEntries) {
@@ -212,7 +212,7 @@ TEST_F(WritingContainers, LogAFileThatCannotBeCreated) {
     EXPECT_THAT(log_.take(),
                 ElementsAre(LogLine{3, "Mailing wrapper failed to create file \"" + folder_.path().string() +
                                            "/missing/a&\"b&&c.mailing\""}));
-    EXPECT_FALSE(out.outputFinished());
+    EXPECT_FALSE(out.outputFinalished());
     out.savePage("a.pdf", "1", bufferOf(PAGE_1));
     EXPECT_FALSE(out.finalizeOutput(bufferOf(METADATA)));
     EXPECT_EQ(out.szBins(), 0u);
@@ -241,7 +241,7 @@ TEST_F(WritingContainers, LogWhichPartDidNotFitOnTheDisk) {
             out.savePage("a.pdf", std::to_string(i), bufferOf(c.page));
         EXPECT_FALSE(out.finalizeOutput(bufferOf(c.metadata)));
         EXPECT_THAT(log_.take(), ElementsAre(LogLine{4, c.message}));
-        EXPECT_FALSE(out.outputFinished());
+        EXPECT_FALSE(out.outputFinalished());
     }
 }
 
@@ -262,7 +262,7 @@ TEST_F(WritingContainers, LeaveAFileWhoseWritingFailedOnTheDisk) {
     EXPECT_THAT(log_.take(),
                 ElementsAre(LogLine{4, "Mailing wrapper failed to save page data to " + quoted()}));
     EXPECT_EQ(wrapper_->szBins(), 2u);
-    EXPECT_FALSE(wrapper_->outputFinished());
+    EXPECT_FALSE(wrapper_->outputFinalished());
     EXPECT_EQ(read(), before);
 }
 
@@ -287,7 +287,7 @@ TEST_F(WritingContainers, AnswerARequestForAPageWithNothingAndWriteOn) {
     out.savePage("a.pdf", "1", bufferOf(PAGE_1));
     EXPECT_EQ(page(out, "a.pdf", "1"), "");
     EXPECT_THAT(log_.take(), ElementsAre(LogLine{4, "Failed to read binary 1 from import file"}));
-    EXPECT_FALSE(out.outputFinished());
+    EXPECT_FALSE(out.outputFinalished());
     out.savePage("a.pdf", "2", bufferOf(PAGE_2));
     EXPECT_TRUE(out.finalizeOutput(bufferOf(METADATA)));
     PackWrapper& in = open();
@@ -310,7 +310,7 @@ TEST_F(WritingContainers, KeepAFinishedFileOnARequestForAnUnknownPage) {
     EXPECT_TRUE(create().finalizeOutput(bufferOf(METADATA)));
     EXPECT_EQ(page(*wrapper_, "a.pdf", "2"), std::nullopt);
     EXPECT_TRUE(std::filesystem::exists(file_));
-    EXPECT_FALSE(wrapper_->outputFinished());
+    EXPECT_FALSE(wrapper_->outputFinalished());
 }
 
 TEST_F(WritingContainers, StandInAsASinkOfPages) {

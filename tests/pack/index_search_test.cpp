@@ -28,6 +28,7 @@ using namespace std::string_literals;
 
 constexpr std::int64_t LOWEST = std::numeric_limits<std::int64_t>::min();
 constexpr std::int64_t HIGHEST = std::numeric_limits<std::int64_t>::max();
+constexpr std::int64_t LIMIT = std::int64_t{1} << 32;
 
 /// A file whose end may be far behind its last byte; the rest reads as zeroes, as holes do.
 struct File {
@@ -114,14 +115,15 @@ TEST(IndexSearching, GivesTheCandidatesOfEachLayout) {
         {"trailing offset behind the trailer", {trailing(93)}, {}},
         {"trailing offset at the end of numbers", {trailing(HIGHEST)}, {}},
         {"trailing offset before the file", {trailing(-1)}, {{-1, 93, 0}}},
-        {"trailing offset too far before the file", {trailing(92 - (std::int64_t{1} << 32))}, {}},
-        {"trailing offset at the start of numbers", {trailing(LOWEST)}, {}},
+        {"trailing offset far before the file", {trailing(93 - LIMIT)}, {{93 - LIMIT, LIMIT - 1, 0}}},
+        {"trailing offset farther before it", {trailing(92 - LIMIT)}, {{92 - LIMIT, LIMIT - 1, 0}}},
+        {"trailing offset at the start of numbers", {trailing(LOWEST)}, {{LOWEST, LIMIT - 1, 0}}},
         {"leading offset", {leading(40)}, {{40, 60, 0}}},
         {"leading offset, the smallest index", {leading(99)}, {{99, 1, 0}}},
         {"leading offset at the end", {leading(100)}, {}},
         {"leading offset behind the end", {leading(HIGHEST)}, {}},
         {"leading offset before the file", {leading(-5)}, {{-5, 105, 0}}},
-        {"leading offset at the start of numbers", {leading(LOWEST)}, {}},
+        {"leading offset at the start of numbers", {leading(LOWEST)}, {{LOWEST, LIMIT - 1, 0}}},
         {"wide header", {wide(10)}, {{44, 40, 34}}},
         {"wide header, index at the start of the blobs", {wide(0)}, {{34, 50, 34}}},
         {"wide header, the smallest index", {wide(49)}, {{83, 1, 34}}},
@@ -151,7 +153,6 @@ TEST(IndexSearching, TriesALeadingOffsetBehindATrailingOne) {
 }
 
 TEST(IndexSearching, RefusesAnIndexOfFourGigabytes) {
-    std::int64_t const limit = std::int64_t{1} << 32;
     struct Case {
         char const* what;
         File file;
@@ -159,21 +160,21 @@ TEST(IndexSearching, RefusesAnIndexOfFourGigabytes) {
     };
     Case const cases[] = {
         {"trailing offset below the limit",
-         {.bytes = "TEZ", .end = limit + 107, .trailer = littleEndian(100)},
-         {{100, limit - 1, 0}}},
+         {.bytes = "TEZ", .end = LIMIT + 107, .trailer = littleEndian(100)},
+         {{100, LIMIT - 1, 0}}},
         {"trailing offset at the limit",
-         {.bytes = "TEZ", .end = limit + 108, .trailer = littleEndian(100)},
+         {.bytes = "TEZ", .end = LIMIT + 108, .trailer = littleEndian(100)},
          {}},
         {"trailing offset of twice the limit",
-         {.bytes = "TEZ", .end = 2 * limit + 108, .trailer = littleEndian(100)},
+         {.bytes = "TEZ", .end = 2 * LIMIT + 108, .trailer = littleEndian(100)},
          {}},
-        {"leading offset below the limit", {.bytes = leading(100), .end = limit + 99}, {{100, limit - 1, 0}}},
-        {"leading offset at the limit", {.bytes = leading(100), .end = limit + 100}, {}},
+        {"leading offset below the limit", {.bytes = leading(100), .end = LIMIT + 99}, {{100, LIMIT - 1, 0}}},
+        {"leading offset at the limit", {.bytes = leading(100), .end = LIMIT + 100}, {}},
         {"wide header below the limit",
-         {.bytes = wideHeader("iii"), .end = 34 + limit - 1 + 28, .trailer = wideTrailer(0)},
-         {{34, limit - 1, 34}}},
+         {.bytes = wideHeader("iii"), .end = 34 + LIMIT - 1 + 28, .trailer = wideTrailer(0)},
+         {{34, LIMIT - 1, 34}}},
         {"wide header at the limit",
-         {.bytes = wideHeader("iii"), .end = 34 + limit + 28, .trailer = wideTrailer(0)},
+         {.bytes = wideHeader("iii"), .end = 34 + LIMIT + 28, .trailer = wideTrailer(0)},
          {}},
     };
     for (Case const& c : cases)

@@ -36,7 +36,7 @@ private:
 
 TEST_F(LogLines, AreOneCallOfTheSinkMadeWhenTheLockGoes) {
     {
-        Log::Lock log(4);
+        Log::Lock log = 4;
         log.logStreamLine() << "a " << 1;
         log.logStreamLine() << " b";
         EXPECT_THAT(lines, IsEmpty());

@@ -8,7 +8,7 @@ std::string const App::PART_NAME = "app";
 
 AppFields const App::FLDS_INIT{"show_ctrls", "priority_delivery", "db_name", "db_host", "print_area", "descr",
                                "dep_alias", "auto_save_preset", "max_letter_sheets",
-                               // Spelt so in every stored document.
+                               // The odd spelling is the interface's: every stored document has it.
                                "enfoce_dep", "enforce_po", "enforce_profile", "loose_letter_deviation",
                                "debug_view", "m"};
 

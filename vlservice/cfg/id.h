@@ -52,11 +52,11 @@ public:
     bool valid() const { return !invalid(); }
     bool invalid() const { return text_.starts_with(CFG_ID_DELIM); }
 
-    bool hasUser() const { return hasUserStr(text_); }
-    static bool hasUserStr(std::string const& text) { return text.starts_with(USER_PREFIX); }
+    bool hasUser() const { return text_.starts_with(USER_PREFIX); }
+    static bool hasUserStr(std::string text) { return text.starts_with(USER_PREFIX); }
     /// True for everything that is no user, the root and the invalid id included.
     bool isParentId() const { return isParentIdStr(text_); }
-    static bool isParentIdStr(std::string const& text) { return !hasUserStr(text); }
+    static bool isParentIdStr(std::string const& text) { return !text.starts_with(USER_PREFIX); }
     /// Deliberately a search for "a=" anywhere, also inside a name: u=maria=1/ counts.
     bool accountLevelOrBelow() const;
 

@@ -132,6 +132,7 @@ public:
         strRegex_ = std::move(regex);
         compiledRegex_.clear();
     }
+    /// The odd spelling is the interface's.
     void setIgnoreFontMertics(bool ignore) { ignoreFontMetrics_ = ignore; }
     void setMustHave(bool mustHave) { mustHave_ = mustHave; }
     void setWidth(unsigned long long width) { width_ = width; }
@@ -203,11 +204,18 @@ public:
     /// the assignment of a pattern together with its compiled form, where ExtractField clones instead.
     Validation& operator=(Validation const& other);
 
+    // The order of the virtual operations is part of the binary interface.
+
     virtual FieldValueType valueType() const = 0;
     /// The least value that is accepted; the empty handle when there is no limit.
     virtual json::Value minVal() const;
     /// The greatest value that is accepted; the empty handle when there is no limit.
     virtual json::Value maxVal() const;
+
+private:
+    virtual void serialize(json::Object& object) const;
+
+public:
     /// A copy of the same class, owned by the caller. Its default value is a copy too, and its pattern is not
     /// compiled.
     virtual Validation* clone() const = 0;
@@ -225,7 +233,6 @@ private:
     explicit Validation(json::Object const& object);
     Validation(Validation const& other);
 
-    virtual void serialize(json::Object& object) const;
     virtual void validate(ExtractedField& value) const;
 
     bool valid(char const* text) const;

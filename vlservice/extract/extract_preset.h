@@ -74,6 +74,7 @@ public:
     std::string const& strRegex() const { return match_; }
     ExtractPresetType type() const { return type_; }
     bool isForLetters() const { return type_ == ExtractPresetType::Letters; }
+    /// The odd spelling is the interface's.
     bool isForAttachemnt() const { return type_ == ExtractPresetType::Attachments; }
     bool useFieldsOnly() const { return useFieldsOnly_; }
     OcrMode ocrMode() const { return ocrMode_; }

@@ -30,6 +30,7 @@ ExtractField const* ExtractZones::findField(std::string const& name) const {
 ExtractField const& ExtractZones::field(std::string const& name) const {
     auto const* const found = findField(name);
     if (!found)
+        // The odd spelling is the interface's: programs know the message so.
         throw std::runtime_error("Failed to fine field " + name + " in any zone");
     return *found;
 }

@@ -25,6 +25,7 @@ public:
     ExtractField const& field(std::string const& name) const;
 
     /// Whether the first zone holds the automatic single-letter field; other zones are not looked at.
+    /// The odd spelling is the interface's.
     bool hasSinlgeLetterField() const;
     /// Adds the automatic field to the first zone, which is made if there is none, or takes the first such
     /// field out of it. The other fields go on answering by their own patterns.

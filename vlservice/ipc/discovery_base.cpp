@@ -147,6 +147,7 @@ void DiscoveryBase::handleReceive(error_code const& ec, std::uint64_t bytes) {
         return;
     }
     std::string const text(rcvBuf_.data(), bytes);
+    // The odd spelling is the interface's: programs that read the log know the line so.
     trace(senderEndpoint_, " recevied msg: ", text);
     std::weak_ptr const alive(alive_);
     callRcvFunc(text);

@@ -24,7 +24,7 @@ class Object;
 /// their own.
 class VLSERVICE_EXPORT Exc : public std::runtime_error {
 public:
-    explicit Exc(std::string const& message) : std::runtime_error(message) {}
+    Exc(std::string const& message) : std::runtime_error(message) {}
 };
 
 namespace detail {

@@ -13,8 +13,9 @@ namespace Container {
 
 /// A stretch of the file that may be the index.
 struct IndexPlace {
-    /// May be negative: reading there is what fails then.
+    /// May be negative, however far: reading there is what fails then.
     std::int64_t position;
+    /// Below INDEX_SIZE_LIMIT; of a stretch from a negative position no more of it is told.
     std::int64_t size;
     /// Added to every offset of this index.
     std::int64_t blobStart;

@@ -13,6 +13,7 @@
 #include <cerrno>
 #include <cstring>
 #include <ios>
+#include <limits>
 #include <new>
 #include <optional>
 
@@ -72,7 +73,7 @@ PackWrapper::PackWrapper(fs::path path, Purpose purpose, std::string packId)
 
 PackWrapper::~PackWrapper() = default;
 
-bool PackWrapper::outputFinished() const { return okSoFar() && fileStream_.fail(); }
+bool PackWrapper::outputFinalished() const { return okSoFar() && fileStream_.fail(); }
 
 // Output
 
@@ -101,6 +102,7 @@ bool PackWrapper::finalizeOutput(SharedMemBuffer metadata) {
         return onFailureRetFalse();
     }
     if (!Container::writeIndex(fileStream_, savedPackId(), bins_)) {
+        // The odd spelling is the interface's: programs that read the log know the line so.
         Log::Lock(4).logStreamLine() << "Mailing wrapper failed to save bin offsetts to " << pth_;
         return onFailureRetFalse();
     }
@@ -126,7 +128,7 @@ bool PackWrapper::writeBin(std::string const& document, std::string const& name,
 
 void PackWrapper::closeFile() {
     fileStream_.close();
-    // Set in any case: deliberate, it is by this state that outputFinished() knows a finished file.
+    // Set in any case: deliberate, it is by this state that outputFinalished() knows a finished file.
     fileStream_.setstate(std::ios::failbit);
 }
 
@@ -265,8 +267,9 @@ bool PackWrapper::readBytes(BinEntry const& entry, SharedMemBuffer& data) {
     // Only an import reads: a request on an output must not move the position of its writing.
     if (purpose_ & PURPOSE_OUTPUT)
         return false;
+    // An offset that no file can have is refused also where there is nothing to be read.
     if (entry.length == 0)
-        return true;
+        return entry.offset <= static_cast<std::uint64_t>(std::numeric_limits<std::int64_t>::max());
     auto const end = static_cast<std::uint64_t>(fileEnd_);
     if (entry.offset > end || entry.length > end - entry.offset)
         return false;

@@ -64,8 +64,8 @@ public:
     unsigned long long szBins() const { return bins_.size(); }
     /// In file order. Throws std::out_of_range.
     BinEntry const& bin(unsigned long long index) const { return bins_.at(index); }
-    /// True once the file is whole and closed; false after a failure.
-    bool outputFinished() const;
+    /// True once the file is whole and closed; false after a failure. The odd spelling is the interface's.
+    bool outputFinalished() const;
 
     /// Calls `func` before it returns, with the blob of the first entry of that document and page, or with
     /// the empty buffer when it cannot be read or its checksum is wrong; the wrapper stays usable then. A

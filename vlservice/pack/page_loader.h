@@ -25,6 +25,7 @@ public:
     /// Stores a request. Several may wait for one page; each arrival answers one of them, the oldest first.
     virtual void requestPageData(std::string const& document, std::string const& page, PageFunc func);
     /// True when no request waits or is being answered.
+    /// The odd spelling is the interface's.
     virtual bool nothingPening() const;
     /// A hook that runs each time an answered request was the last one. It may delete the loader.
     virtual void done();

@@ -10,7 +10,7 @@ using namespace std::string_view_literals;
 
 constexpr bool isSpace(char c) { return " \t\n\v\f\r"sv.find(c) != std::string_view::npos; }
 constexpr char lower(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
-/// Every byte beyond ASCII is a letter.
+/// Every byte beyond ASCII may stand in a name.
 constexpr bool startsName(char c) {
     return (lower(c) >= 'a' && lower(c) <= 'z') || c == '_' || static_cast<unsigned char>(c) >= 0x7F;
 }

@@ -27,7 +27,7 @@ VLSERVICE_EXPORT Sink setSink(Sink sink);
 /// final end of line. Numbers are written with the classic locale. Lines of several threads do not mix.
 class VLSERVICE_EXPORT Lock {
 public:
-    explicit Lock(LogPriority priority);
+    Lock(LogPriority priority);
     ~Lock();
     Lock(Lock const&) = delete;
     Lock& operator=(Lock const&) = delete;

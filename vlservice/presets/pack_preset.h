@@ -113,6 +113,7 @@ public:
 
     void setName(std::string name) { name_ = std::move(name); }
     void setTitle(std::string title) { title_ = std::move(title); }
+    /// Of colorModel(); the odd name is the interface's.
     void setColourMode(PackColorModel model) { colorModel_ = model; }
     void setDuplex(bool duplex) { duplex_ = duplex; }
     void setOrientationForced(PackForcedOrientation orientation) { orientation_ = orientation; }
