@@ -5,6 +5,7 @@
 
 namespace VlMail {
 
+void addPresetsDraftCommand(Base::Command const& presets, Task& task);
 void addPresetsMatchCommand(Base::Command const& presets, Task& task);
 void addPresetsLintCommand(Base::Command const& presets, Task& task);
 void addPresetsTestCommand(Base::Command const& presets, Task& task);

@@ -1,8 +1,10 @@
 // Zones: where they lie, and whether they have something to do.
+#include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
+#include <array>
 #include <optional>
 #include <string>
 
@@ -61,6 +63,30 @@ Cfg::Point pointOf(ListedZone const& zone) {
     return zone.point.isZeroes() ? Cfg::ExtractZone::DEF_MOST_PROBABLE_POINT : zone.point;
 }
 
+bool contains(Cfg::Rect const& outer, Cfg::Rect const& inner) {
+    return outer.left <= inner.left && outer.top <= inner.top && outer.right >= inner.right &&
+           outer.bottom >= inner.bottom;
+}
+
+/// Whether the field's pattern is for no text in particular, so that it takes whatever stands in the zone.
+bool takesAnything(ListedField const& field) {
+    try {
+        Patterns::Pattern const pattern(field.json.get("value_extract").textOrEmpty(),
+                                        Patterns::Pattern::Use::Extract);
+        return std::ranges::all_of(
+            std::array{"Lena Brandt", "Total: 12.50", "x", "(4711)\n12 Long Street"},
+            [&](char const* text) { return pattern.fits(text) == Patterns::Pattern::Answer::Yes; });
+    } catch (Patterns::Broken const&) {
+        return false;
+    }
+}
+
+/// Whether what belongs to the other zone may be taken for a value here. A zone that lies within the other
+/// holds nothing that is the other's alone.
+bool mayTakeFrom(ListedZone const& zone, ListedZone const& other) {
+    return !contains(other.location, zone.location) && std::ranges::any_of(zone.fields, takesAnything);
+}
+
 void checkApart(ListedZone const& zone, ListedZone const& other, Findings& findings) {
     if (zone.hasLocation() != other.hasLocation())
         return;
@@ -70,7 +96,8 @@ void checkApart(ListedZone const& zone, ListedZone const& other, Findings& findi
             findings.add(ZonesAtOnePoint, zone.place,
                          {std::to_string(point.x), std::to_string(point.y), inQuotes(other.name),
                           other.place.pointer()});
-    } else if (auto const both = shared(zone.location, other.location)) {
+    } else if (auto const both = shared(zone.location, other.location);
+               both && (mayTakeFrom(zone, other) || mayTakeFrom(other, zone))) {
         findings.add(ZonesOverlap, zone.place / "location",
                      {inMillimetres(widthOf(*both)), inMillimetres(heightOf(*both)), inQuotes(other.name),
                       other.place.pointer()});

@@ -360,6 +360,16 @@ std::vector<Case> const CASES{
      {"warning /extract_presets/0/zones/1/location: the zone shares 10 mm by 4.5 mm with zone \"Z\" at "
       "/extract_presets/0/zones/0: what stands there is read in both | move the zones apart "
       "[zones-overlap]"}},
+    {"NothingInZonesThatOverlapWhereEachFieldLooksForItsOwnLine",
+     partOf(presetWith(
+         zoneWith("", R"_(, "location": {"left": 2000, "top": 4500, "right": 11000, "bottom": 9000})_") +
+         R"_(, {"name": "Y", "fields": [{"name": "ref", "value_extract": "^Ref: (?<VAL>.+)"}], "location": {"left": 10000, "top": 8550, "right": 20000, "bottom": 12000}})_")),
+     {}},
+    {"NothingInAnAddressWithinALargerZone",
+     partOf(presetWith(
+         zoneWith("", R"_(, "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700})_") +
+         R"_(, {"name": "Y", "fields": [{"name": "any", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}], "location": {"left": 2000, "top": 4500, "right": 11000, "bottom": 9000}})_")),
+     {}},
     {"ZonesAtOnePoint",
      partOf(presetWith(
          zoneWith("") +
