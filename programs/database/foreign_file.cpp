@@ -19,7 +19,7 @@ namespace {
 namespace fs = std::filesystem;
 using namespace std::chrono_literals;
 
-constexpr auto LOCK_TIME = 5s;
+constexpr auto LOCK_TIME = 2s;
 constexpr auto LOCK_PAUSE = 10ms;
 /// Steps of the database between two looks at the clock.
 constexpr int STEPS = 1000;

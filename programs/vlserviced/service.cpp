@@ -225,7 +225,8 @@ private:
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
-    asio::thread_pool reader_{2};
+    /// As many as may wait for databases that somebody holds, before others have to wait for them.
+    asio::thread_pool reader_{8};
     HeldQueries held_{io_, jobs_};
     JobRunner runner_{jobs_, surroundings()};
     std::shared_ptr<Processor> processor_ =

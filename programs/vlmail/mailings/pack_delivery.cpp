@@ -19,6 +19,16 @@ bool isFetched(Protocol::JobReport const& job) {
     return job.state != Protocol::JobState::Accepted && job.state != Protocol::JobState::Failed;
 }
 
+/// The letters are on their way, whatever becomes of their copy: what cannot be erased is erased another
+/// time.
+void eraseFetched(fs::path const& database, std::string const& packId) {
+    try {
+        Mailing::removePack(database, packId);
+    } catch (Database::DatabaseError const&) {
+        // The next mailing settles it.
+    }
+}
+
 using Jobs = std::map<std::string, Protocol::JobReport>;
 
 /// The service's jobs of these packs.
@@ -52,7 +62,7 @@ Protocol::JobReport deliverPack(ServiceLine& service, fs::path const& database, 
     try {
         Protocol::JobReport job = deliver(service, database, packId, upload);
         if (isFetched(job))
-            Mailing::removePack(database, packId);
+            eraseFetched(database, packId);
         return job;
     } catch (std::exception const& failure) {
         throw Base::Error("mailing " + packId + ": " + failure.what() + "; \"vlmail status " + packId +
@@ -70,7 +80,7 @@ std::vector<Mailing::StoredPack> settlePacks(Channel::Client& service, fs::path 
         if (job == jobs.end())
             stranded.push_back(pack);
         else if (isFetched(job->second))
-            Mailing::removePack(database, pack.info.id);
+            eraseFetched(database, pack.info.id);
     }
     return stranded;
 }

@@ -1,6 +1,7 @@
 #include "programs/vlserviced/jobs/hand_over.h"
 
 #include "programs/base/file_descriptor.h"
+#include "programs/protocol/job.h"
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
@@ -98,8 +99,9 @@ std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::stri
     try {
         json::Object const report = json::strToObject(text.data(), size);
         std::string const state = report.get("state").textOrEmpty();
-        if (state == "delivered" || state == "failed")
-            return CarrierReport{state == "delivered", report.get("text").textOrEmpty()};
+        bool const isDelivered = state == Protocol::stateName(Protocol::JobState::Delivered);
+        if (isDelivered || state == Protocol::stateName(Protocol::JobState::Failed))
+            return CarrierReport{isDelivered, report.get("text").textOrEmpty()};
         Log::Lock(4).logStreamLine() << "The report " << path << " has no state that is known";
     } catch (json::Exc const& failure) {
         Log::Lock(4).logStreamLine() << "The report " << path << " cannot be read. " << failure.what();

@@ -37,7 +37,9 @@ protected:
         runner_.emplace(
             jobs_, VlServiced::JobSurroundings{
                        [this](VlServiced::JobSurroundings::Work work) { work_.push_back(std::move(work)); },
-                       [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                       [this](VlServiced::JobSurroundings::Work const& work) {
+                           readersWork_ ? readersWork_->push_back(work) : work();
+                       },
                        [](VlServiced::JobSurroundings::Work const& work) { work(); },
                        [this] { return now_; },
                        [this] { return VlServiced::ServiceSettings(settings_); },
@@ -90,6 +92,8 @@ protected:
     VlServiced::JobStore jobs_{database_};
     json::Object settings_;
     std::deque<VlServiced::JobSurroundings::Work> work_;
+    /// When it is there, what the readers were given waits in it.
+    std::optional<std::deque<VlServiced::JobSurroundings::Work>> readersWork_;
     long long now_ = 1000;
     std::optional<JobRunner> runner_;
 };
@@ -447,6 +451,38 @@ TEST_F(JobRunnerTest, RemovesWhatAnEarlierProcessLeftInTheOutbox) {
     EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
     EXPECT_TRUE(fs::exists(outbox_ / "p2.mailing"));
     EXPECT_TRUE(fs::exists(outbox_ / "stranger.mailing"));
+}
+
+TEST_F(JobRunnerTest, NeverReadsAPackDatabaseOnItsOwnThread) {
+    storePack(packs_, "p1");
+    readersWork_.emplace();
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"), "never told");
+    EXPECT_EQ(acceptFailure("/dev", "null", "p2"), "never told");
+    EXPECT_EQ(state("p1"), "none");
+    EXPECT_EQ(readersWork_->size(), 2u);
+}
+
+TEST_F(JobRunnerTest, TakesAPackOnceThatIsSentTwiceBeforeItIsRead) {
+    storePack(packs_, "p1");
+    readersWork_.emplace();
+    std::vector<std::string> told;
+    for (int i = 0; i < 2; ++i)
+        runner_->accept({folder_.path().string(), "packs.db", "p1"},
+                        [&](std::string const& failure) { told.push_back(failure); });
+    for (auto const& work : *readersWork_)
+        work();
+    EXPECT_EQ(told, (std::vector<std::string>{"", ""}));
+    EXPECT_EQ(state("p1"), "accepted");
+    EXPECT_EQ(work_.size(), 1u);
+}
+
+TEST_F(JobRunnerTest, RefusesAPackDatabaseThatOthersMayWrite) {
+    storePack(packs_, "p1");
+    fs::permissions(folder_.path(), fs::perms(0770));
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
+              "the pack database " + packs_.string() + " is not read, because others may write " +
+                  folder_.path().string() + ": take their right away (chmod go-w)");
+    EXPECT_EQ(state("p1"), "none");
 }
 
 } // namespace
