@@ -63,7 +63,13 @@ Terms const TERMS{VERSION, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"};
 Terms const OLD_TERMS{VERSION_1, TOKEN, "", "", ""};
 std::string const NONCE_TEXT(64, '0');
 
-TEST(CryptoFailures, AreWatched) {
+class CryptoFailures : public Test {
+protected:
+    /// Its very first steps the library does not survive without memory.
+    CryptoFailures() { hmac("key", "message"); }
+};
+
+TEST_F(CryptoFailures, AreWatched) {
     ASSERT_TRUE(isWatching);
     int const allocations = withEachAllocationFailing([] {
         try {
@@ -74,7 +80,7 @@ TEST(CryptoFailures, AreWatched) {
     EXPECT_GT(allocations, 0);
 }
 
-TEST(CryptoFailures, AreToldWhenAProofIsComputed) {
+TEST_F(CryptoFailures, AreToldWhenAProofIsComputed) {
     std::string const proof = makeProof(Side::Client, TERMS, "c", "s");
     withEachAllocationFailing([&] {
         try {
@@ -85,7 +91,7 @@ TEST(CryptoFailures, AreToldWhenAProofIsComputed) {
     });
 }
 
-TEST(CryptoFailures, LetNoStrangerInAtTheService) {
+TEST_F(CryptoFailures, LetNoStrangerInAtTheService) {
     for (Terms const& terms : {TERMS, OLD_TERMS}) {
         int welcomes = 0;
         withEachAllocationFailing([&] {
@@ -98,7 +104,7 @@ TEST(CryptoFailures, LetNoStrangerInAtTheService) {
     }
 }
 
-TEST(CryptoFailures, LetAClientTrustNoStranger) {
+TEST_F(CryptoFailures, LetAClientTrustNoStranger) {
     for (Terms const& terms : {TERMS, OLD_TERMS}) {
         int proofs = 0;
         withEachAllocationFailing([&] {
@@ -111,7 +117,7 @@ TEST(CryptoFailures, LetAClientTrustNoStranger) {
     }
 }
 
-TEST(CryptoFailures, GiveNoEmptyFingerprint) {
+TEST_F(CryptoFailures, GiveNoEmptyFingerprint) {
     fs::path const folder = fs::temp_directory_path() / ("channel_crypto_" + std::to_string(::getpid()));
     fs::create_directory(folder);
     auto const files = ChannelTest::makeCertificate(folder.string(), "service");
