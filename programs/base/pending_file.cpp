@@ -1,18 +1,66 @@
 #include "programs/base/pending_file.h"
 
 #include "programs/base/file_descriptor.h"
+#include "vlservice/platform/log.h"
 
 #include <cerrno>
+#include <csignal>
 #include <cstdlib>
 #include <fcntl.h>
+#include <mutex>
+#include <set>
+#include <string>
 #include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
 #include <utility>
 
 namespace Base {
 namespace {
 
 namespace fs = std::filesystem;
+
+constexpr int ENDING_SIGNALS[]{SIGINT, SIGTERM, SIGHUP, SIGPIPE};
+
+/// Read by the handler, and changed only while that cannot run.
+std::set<std::string>& pendingNames() {
+    static std::set<std::string> names;
+    return names;
+}
+/// The process whose files they are; a child has a copy of the names.
+volatile pid_t owner = 0;
+
+class SignalsHeld {
+public:
+    SignalsHeld() : lock_(guard()) {
+        sigset_t ending;
+        ::sigemptyset(&ending);
+        for (int const number : ENDING_SIGNALS)
+            ::sigaddset(&ending, number);
+        ::pthread_sigmask(SIG_BLOCK, &ending, &before_);
+    }
+    ~SignalsHeld() { ::pthread_sigmask(SIG_SETMASK, &before_, nullptr); }
+    SignalsHeld(SignalsHeld const&) = delete;
+    SignalsHeld& operator=(SignalsHeld const&) = delete;
+
+private:
+    /// Against other threads; the handler, which must not wait, runs only in programs of one.
+    static std::mutex& guard() {
+        static std::mutex mutex;
+        return mutex;
+    }
+
+    std::lock_guard<std::mutex> lock_;
+    sigset_t before_;
+};
+
+extern "C" void removePendingFiles(int number) {
+    if (::getpid() == owner)
+        for (std::string const& name : pendingNames())
+            ::unlink(name.c_str());
+    std::signal(number, SIG_DFL);
+    std::raise(number);
+}
 
 [[noreturn]] void fail(std::string const& what) {
     throw std::system_error(errno, std::generic_category(), what);
@@ -25,37 +73,64 @@ void giveUsualRights(int file) {
     ::fchmod(file, 0666 & ~mask);
 }
 
+void trySyncFolder(fs::path const& target) {
+    try {
+        syncFolder(folderOf(target));
+    } catch (std::system_error const& failure) {
+        Log::Lock(4).logStreamLine() << failure.what() << "; a power failure may still undo "
+                                     << target.string();
+    }
+}
+
 } // namespace
 
 PendingFile::PendingFile(fs::path target) : target_(std::move(target)) {
+    SignalsHeld const held;
     std::string name = (folderOf(target_) / ".XXXXXX.part").string();
     FileDescriptor const file(::mkostemps(name.data(), 5, O_CLOEXEC), name);
     if (file.number() < 0)
         fail("cannot write into " + folderOf(target_).string());
     giveUsualRights(file.number());
     temporary_ = name;
+    pendingNames().insert(fs::absolute(temporary_).string());
 }
 
 PendingFile::~PendingFile() {
+    SignalsHeld const held;
+    pendingNames().erase(fs::absolute(temporary_).string());
     std::error_code ignored;
     if (pending_)
         fs::remove(temporary_, ignored);
 }
 
-void PendingFile::commit() {
-    FileDescriptor(temporary_, O_RDONLY).sync();
+void PendingFile::commit(Durability durability) {
+    if (durability == Durability::Synced)
+        FileDescriptor(temporary_, O_RDONLY).sync();
     if (::rename(temporary_.c_str(), target_.c_str()) != 0)
         fail("cannot write " + target_.string());
     pending_ = false;
-    syncFolder(folderOf(target_));
+    if (durability == Durability::Synced)
+        trySyncFolder(target_);
 }
 
-void writeFile(fs::path const& target, std::string_view bytes) {
+void writeFile(fs::path const& target, std::string_view bytes, PendingFile::Durability durability) {
     PendingFile pending(target);
     FileDescriptor file(pending.temporary(), O_WRONLY);
     file.writeAll(bytes);
     file.close();
-    pending.commit();
+    pending.commit(durability);
+}
+
+void removePendingFilesOnSignals() {
+    owner = ::getpid();
+    for (int const number : ENDING_SIGNALS) {
+        struct sigaction before {};
+        ::sigaction(number, nullptr, &before);
+        // Who started the program with a signal ignored wants it to go on.
+        if (before.sa_handler != SIG_IGN)
+            std::signal(number, removePendingFiles);
+    }
+    std::signal(SIGXFSZ, SIG_IGN);
 }
 
 } // namespace Base

@@ -1,8 +1,7 @@
 #include "programs/mailing/metadata.h"
 
+#include "programs/mailing/page_blob.h"
 #include "vlservice/json/json_text.h"
-#include "vlservice/pack/page_loader.h"
-#include "vlservice/pack/page_saver.h"
 
 #include <sstream>
 #include <stdexcept>
@@ -18,10 +17,12 @@ constexpr char const* DOCUMENTS_KEY = "documents";
 constexpr char const* NAME_KEY = "name";
 constexpr char const* PAGES_KEY = "pages";
 constexpr char const* FIELDS_KEY = "fields";
+constexpr char const* ENTRIES_DIGEST_KEY = "entries_digest";
 
 /// What is not the pack preset's in the object that it shares; its name's key is listed so that the name is
 /// not taken for an unknown key as well.
-std::unordered_set<std::string> const NOT_THE_PRESETS{ID_KEY, CREATED_KEY, LETTERS_KEY, "pack_preset"};
+std::unordered_set<std::string> const NOT_THE_PRESETS{ID_KEY, CREATED_KEY, LETTERS_KEY, ENTRIES_DIGEST_KEY,
+                                                      "pack_preset"};
 
 json::Object toJson(DocumentPages const& document) {
     json::Array pages;
@@ -51,6 +52,18 @@ MailedLetter letterFrom(json::Object const& object) {
     return letter;
 }
 
+SharedMemBuffer blobOf(json::Object const& object) {
+    std::ostringstream text;
+    text << object;
+    return compressed(text.str());
+}
+
+json::Object objectIn(SharedMemBuffer blob) {
+    SharedMemBuffer const text = expanded(std::move(blob));
+    std::string_view const json = viewOf(text);
+    return json::strToObject(json.data(), json.size());
+}
+
 } // namespace
 
 json::Object Metadata::toJson() const {
@@ -61,6 +74,8 @@ json::Object Metadata::toJson() const {
     for (MailedLetter const& letter : letters)
         all.append(Mailing::toJson(letter));
     object.set(LETTERS_KEY, all);
+    if (!entriesDigest.empty())
+        object.set(ENTRIES_DIGEST_KEY, entriesDigest);
     return object;
 }
 
@@ -71,21 +86,24 @@ Metadata Metadata::fromJson(json::Object const& object) {
                       {}};
     for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
         metadata.letters.push_back(letterFrom(letter.toObject()));
+    metadata.entriesDigest = object.get(ENTRIES_DIGEST_KEY).textOrEmpty();
     return metadata;
 }
 
-SharedMemBuffer Metadata::toBlob() const {
-    std::ostringstream text;
-    text << toJson();
-    std::string const bytes = std::move(text).str();
-    return PageSaverI::zipDbData(bytes.data(), bytes.size());
-}
+SharedMemBuffer Metadata::toBlob() const { return blobOf(toJson()); }
 
-Metadata Metadata::fromBlob(SharedMemBuffer blob) {
-    SharedMemBuffer const text = PageLoaderI::unzipDbData(std::move(blob));
-    if (text.empty())
-        throw std::runtime_error("the metadata cannot be expanded");
-    return fromJson(json::strToObject(reinterpret_cast<char const*>(text.data()), text.size()));
+Metadata Metadata::fromBlob(SharedMemBuffer blob) { return fromJson(objectIn(std::move(blob))); }
+
+SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& digest) {
+    try {
+        json::Object object = objectIn(metadata);
+        if (!object.get(ENTRIES_DIGEST_KEY).isString())
+            return metadata;
+        object.set(ENTRIES_DIGEST_KEY, digest);
+        return blobOf(object);
+    } catch (json::Exc const&) {
+        return metadata;
+    }
 }
 
 } // namespace Mailing

@@ -26,22 +26,28 @@ struct MailedLetter {
 };
 
 /// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
-/// its keys "id", "created" and "letters".
+/// its keys "id", "created", "letters" and "entries_digest".
 struct Metadata {
     std::string id;
     /// Seconds since the epoch, UTC.
     long long created = 0;
     Cfg::PackPreset packPreset;
     std::vector<MailedLetter> letters;
+    /// EntriesDigest of the pages, which is known when the last of them is stored; empty in older mailings.
+    std::string entriesDigest = {};
 
     json::Object toJson() const;
     /// Throws std::exception when a key has not the form above.
     static Metadata fromJson(json::Object const& object);
 
-    /// The compressed JSON text, as the container takes it.
+    /// The compressed JSON text, as the container takes it. Throws Error when there is no memory for it.
     SharedMemBuffer toBlob() const;
     /// Throws std::exception when the blob cannot be expanded or holds something else.
     static Metadata fromBlob(SharedMemBuffer blob);
 };
+
+/// The same metadata, whatever else is in it, with another digest, for pages that are stored anew. Metadata
+/// that has none stays as it is.
+SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& digest);
 
 } // namespace Mailing

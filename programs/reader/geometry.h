@@ -6,6 +6,9 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstdint>
+#include <limits>
+#include <numeric>
 
 namespace Reader {
 
@@ -21,9 +24,9 @@ struct Box {
     int right = 0;
     int bottom = 0;
 
-    int width() const { return right - left; }
-    int height() const { return bottom - top; }
-    Point centre() const { return {left + width() / 2, top + height() / 2}; }
+    int width() const { return difference(left, right); }
+    int height() const { return difference(top, bottom); }
+    Point centre() const { return {std::midpoint(left, right), std::midpoint(top, bottom)}; }
     /// The edges belong to the box.
     bool contains(Point point) const {
         return point.x >= left && point.x <= right && point.y >= top && point.y <= bottom;
@@ -41,7 +44,11 @@ struct Box {
     friend bool operator==(Box const&, Box const&) = default;
 
 private:
-    /// Points come from settings and may be anywhere: their differences need not fit an int.
+    /// Edges and points come from settings and may be anywhere: their differences need not fit an int.
+    static int difference(int from, int to) {
+        constexpr std::int64_t MOST = std::numeric_limits<int>::max();
+        return static_cast<int>(std::clamp(std::int64_t{to} - from, -MOST, MOST));
+    }
     static double distance(double from, double to, double at) { return std::max({from - at, 0.0, at - to}); }
 };
 

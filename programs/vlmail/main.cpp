@@ -1,11 +1,13 @@
 #include "programs/vlmail/commands/command.h"
 
+#include "programs/base/pending_file.h"
 #include "vlservice/platform/log.h"
 
 #include <iostream>
 #include <unistd.h>
 
 int main(int argc, char** argv) {
+    Base::removePendingFilesOnSignals();
     VlMail::Terminal const terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1};
     Log::setSink([&](LogPriority, std::string const& line) { terminal.complain(line); });
     int const status = VlMail::run(argc, argv, terminal);

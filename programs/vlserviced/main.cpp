@@ -1,4 +1,5 @@
 #include "programs/base/host_port.h"
+#include "programs/base/plain_log.h"
 #include "programs/base/plain_text.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
@@ -12,6 +13,7 @@ namespace {
 int serve(VlServiced::Options const& options) {
     try {
         g_LogVerbose = options.verbose;
+        Base::PlainLog const plainLog;
         VlServiced::Service service(options);
         std::cout << "listening on " << Base::hostPortText(options.listen, service.port()) << '\n';
         if (!service.fingerprint().empty())

@@ -1,11 +1,42 @@
 #include "programs/base/pending_file.h"
 
-#include <gtest/gtest.h>
+#include "programs/base/log_capture.h"
 
+#include <gmock/gmock.h>
+
+#include <cerrno>
+#include <csignal>
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
 #include <system_error>
+#include <unistd.h>
+
+namespace {
+
+bool foldersFail = false;
+
+/// While it lives, no folder can be synced.
+struct FailingFolders {
+    FailingFolders() { foldersFail = true; }
+    ~FailingFolders() { foldersFail = false; }
+};
+
+} // namespace
+
+/// In place of the system's.
+extern "C" int fsync(int file) {
+    struct stat status {};
+    if (foldersFail && ::fstat(file, &status) == 0 && S_ISDIR(status.st_mode)) {
+        errno = EIO;
+        return -1;
+    }
+    return static_cast<int>(::syscall(SYS_fsync, file));
+}
 
 namespace {
 
@@ -78,6 +109,70 @@ TEST_F(PendingFileTest, LeavesATargetAloneThatCannotBeReplaced) {
     EXPECT_THROW(Base::writeFile(folder_ / "taken", "bytes"), std::system_error);
     EXPECT_EQ(read(folder_ / "taken" / "inside"), "x");
     EXPECT_EQ(filesInFolder(), 1);
+}
+
+TEST_F(PendingFileTest, IsThereThoughItsFolderCannotBeSynced) {
+    Base::LogCapture const log;
+    {
+        FailingFolders const failing;
+        Base::writeFile(folder_ / "a.mailing", "whole");
+    }
+    EXPECT_EQ(read(folder_ / "a.mailing"), "whole");
+    EXPECT_THAT(log.lines(), testing::ElementsAre("cannot sync " + folder_.string() +
+                                                  ": Input/output error; a power failure may still undo " +
+                                                  (folder_ / "a.mailing").string()));
+}
+
+TEST_F(PendingFileTest, GoesWithTheProcessThatASignalEnds) {
+    for (int const number : {SIGINT, SIGTERM, SIGHUP, SIGPIPE}) {
+        pid_t const child = ::fork();
+        if (child == 0) {
+            Base::removePendingFilesOnSignals();
+            Base::PendingFile const first(folder_ / "a.mailing"), second(folder_ / "b.mailing");
+            std::raise(number);
+            std::_Exit(1);
+        }
+        int status = 0;
+        ::waitpid(child, &status, 0);
+        EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == number) << number;
+        EXPECT_EQ(filesInFolder(), 0) << number;
+    }
+}
+
+TEST_F(PendingFileTest, StaysWhenASignalEndsAnotherProcess) {
+    pid_t const child = ::fork();
+    if (child == 0) {
+        Base::removePendingFilesOnSignals();
+        Base::PendingFile const pending(folder_ / "a.mailing");
+        if (pid_t const grandchild = ::fork(); grandchild == 0) {
+            std::raise(SIGTERM);
+        } else {
+            ::waitpid(grandchild, nullptr, 0);
+            std::_Exit(fs::exists(pending.temporary()) ? 7 : 1);
+        }
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 7);
+}
+
+TEST_F(PendingFileTest, IsAFailureBeyondALimitOfSize) {
+    pid_t const child = ::fork();
+    if (child == 0) {
+        Base::removePendingFilesOnSignals();
+        rlimit const small{100, 100};
+        ::setrlimit(RLIMIT_FSIZE, &small);
+        try {
+            Base::writeFile(folder_ / "a.mailing", std::string(1000, 'x'));
+            std::_Exit(1);
+        } catch (std::system_error const& failure) {
+            std::_Exit(failure.code() == std::errc::file_too_large ? 7 : 2);
+        }
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 7);
+    EXPECT_EQ(filesInFolder(), 0);
 }
 
 } // namespace

@@ -4,6 +4,8 @@
 
 #include <gmock/gmock.h>
 
+#include <limits>
+
 namespace Reader {
 namespace {
 
@@ -139,6 +141,17 @@ TEST(ZoneText, UprightLinesComeBeforeThoseOnTheMargin) {
     EXPECT_EQ(zone.text(), "Dear resident,\nRand");
     EXPECT_EQ(zone.stretch(15, 4).width, 800);
     EXPECT_EQ(zone.stretch(15, 2).box, (Box{1000, 1400, 1200, 1800}));
+}
+
+TEST(Boxes, HaveAnExtentAndACentreWhereverTheirEdgesAre) {
+    constexpr int LEAST = std::numeric_limits<int>::min(), MOST = std::numeric_limits<int>::max();
+    Box const everywhere{LEAST, LEAST, MOST, MOST};
+    EXPECT_EQ(everywhere.width(), MOST);
+    EXPECT_EQ(everywhere.height(), MOST);
+    EXPECT_EQ(everywhere.centre(), Point(-1, -1));
+    Box const inverted{MOST, MOST, LEAST, LEAST};
+    EXPECT_EQ(inverted.width(), -MOST);
+    EXPECT_EQ((Box{1, 2, 4, 9}.centre()), Point(2, 5));
 }
 
 } // namespace

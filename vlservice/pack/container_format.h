@@ -9,6 +9,8 @@
 //
 // Offsets in the index count from the start of the file, under a wide header from the start of the blobs.
 
+#include "vlservice/export.h"
+
 #include <cstddef>
 #include <cstdint>
 #include <string_view>
@@ -56,5 +58,8 @@ inline constexpr char ITEM_DOCUMENT[] = "document";
 
 inline constexpr char ROLE_PAGE[] = "page";
 inline constexpr char ROLE_FRAMEWORK[] = "framework";
+
+/// Whether the index can hold that id or name: UTF-8 of characters that XML 1.0 has.
+VLSERVICE_EXPORT bool mayStandInIndex(std::string_view text);
 
 } // namespace Container

@@ -32,12 +32,6 @@ bool isUtf8(std::string_view text) {
     return allCodePoints(text, [](UChar32) { return true; });
 }
 
-bool mayStandInXml(std::string const& text) {
-    return allCodePoints(text, [](UChar32 c) {
-        return c >= 0x20 ? c != 0xFFFE && c != 0xFFFF : c == '\t' || c == '\n' || c == '\r';
-    });
-}
-
 std::string textAttribute(TiXmlElement const& element, char const* name) {
     std::string const* const value = element.Attribute(std::string(name));
     return value ? *value : std::string();
@@ -75,6 +69,12 @@ std::unique_ptr<TiXmlElement> makeMailing(std::string const& packId, std::deque<
 
 } // namespace
 
+bool mayStandInIndex(std::string_view text) {
+    return allCodePoints(text, [](UChar32 c) {
+        return c >= 0x20 ? c != 0xFFFE && c != 0xFFFF : c == '\t' || c == '\n' || c == '\r';
+    });
+}
+
 std::string parseIndex(TiXmlDocument& document, std::string text) {
     text.resize(std::min(text.find('\0'), text.size()));
     if (isNestedDeeperThan(MAX_XML_DEPTH, text))
@@ -99,8 +99,8 @@ BinEntry readItem(TiXmlElement const& item) {
 
 bool writeIndex(std::ostream& out, std::string const& packId, std::deque<BinEntry> const& items) {
     bool const printable =
-        mayStandInXml(packId) && std::all_of(items.begin(), items.end(), [](auto const& entry) {
-            return mayStandInXml(entry.name) && mayStandInXml(entry.document);
+        mayStandInIndex(packId) && std::all_of(items.begin(), items.end(), [](auto const& entry) {
+            return mayStandInIndex(entry.name) && mayStandInIndex(entry.document);
         });
     if (!printable)
         return false;

@@ -1,17 +1,20 @@
 // vlmail pack extract: the pages of a mailing file and its metadata as files of their own.
 #include "programs/base/error.h"
+#include "programs/base/pending_file.h"
+#include "programs/base/quoting.h"
 #include "programs/base/safe_name.h"
+#include "programs/mailing/page_blob.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/pack/container_file.h"
 #include "vlservice/pack/page_loader.h"
 
 #include <filesystem>
-#include <fstream>
 #include <memory>
 #include <ostream>
 #include <set>
 #include <string_view>
+#include <system_error>
 
 namespace VlMail {
 namespace {
@@ -22,10 +25,6 @@ struct Options {
     std::string file;
     std::string folder;
 };
-
-std::string_view viewOf(SharedMemBuffer const& data) {
-    return {reinterpret_cast<char const*>(data.data()), static_cast<std::size_t>(data.size())};
-}
 
 /// A new folder, or one in which nothing stands that could be overwritten.
 class OutputFolder {
@@ -45,10 +44,12 @@ public:
     /// Under a name made of `name`, which may be any text, and `ending`. Throws Error.
     void write(std::string const& name, std::string const& ending, std::string_view data) {
         fs::path const file = path_ / freeName(Base::safeFileName(name), ending);
-        std::ofstream out(file, std::ios::binary);
-        if (!out.write(data.data(), static_cast<std::streamsize>(data.size())).flush())
-            throw Base::Error("cannot write \"" + file.string() +
-                              "\"; make room on the disk or name another folder");
+        try {
+            Base::writeFile(file, data, Base::PendingFile::Durability::Lazy);
+        } catch (std::system_error const& failure) {
+            throw Base::Error("cannot write " + Base::inQuotes(file.string()) + ": " +
+                              failure.code().message() + "; make room on the disk or name another folder");
+        }
     }
 
 private:
@@ -73,18 +74,49 @@ void writeEntry(OutputFolder& folder, ContainerFile::Entry const& entry, std::st
     folder.write((stem.empty() ? "page" : stem) + '-' + entry.name, endingOf(data), data);
 }
 
+/// How much may come out of a mailing: more than any has, and less than one can be forged to give.
+class Room {
+public:
+    explicit Room(std::uint64_t fileSize) : limit_(BASE + TIMES * fileSize), left_(limit_) {}
+
+    /// Empty when there is room, which is taken then.
+    std::string whyNot(std::uint64_t size) {
+        if (size > left_)
+            return "the mailing expands to more than " + std::to_string(limit_) + " bytes";
+        left_ -= size;
+        return {};
+    }
+
+private:
+    static constexpr std::uint64_t BASE = std::uint64_t{16} << 20;
+    static constexpr std::uint64_t TIMES = 64;
+
+    std::uint64_t limit_;
+    std::uint64_t left_;
+};
+
+SharedMemBuffer expanded(ContainerFile::Entry const& entry, ContainerFile::Blob const& blob) {
+    try {
+        return Mailing::expanded(blob.bytes);
+    } catch (Base::Error const& failure) {
+        throw Base::Error("cannot extract " + inWords(entry) + ": " + failure.what());
+    }
+}
+
 int extract(Options const& options, Terminal const& terminal) {
     ContainerFile container(options.file);
     OutputFolder folder(options.folder);
+    Room room(container.fileSize());
     std::size_t written = 0;
     for (unsigned long long i = 0; i < container.size(); ++i) {
         ContainerFile::Entry const& entry = container.entry(i);
         ContainerFile::Blob const blob = container.blob(i);
-        if (!blob.damage.empty()) {
-            terminal.complain(inWords(entry) + " in \"" + options.file + "\" is left out: " + blob.damage);
+        std::string const why = blob.damage.empty() ? room.whyNot(blob.dataSize) : blob.damage;
+        if (!why.empty()) {
+            terminal.complain(inWords(entry) + " in \"" + options.file + "\" is left out: " + why);
             continue;
         }
-        writeEntry(folder, entry, viewOf(PageLoaderI::unzipDbData(blob.bytes)));
+        writeEntry(folder, entry, Mailing::viewOf(expanded(entry, blob)));
         ++written;
     }
     terminal.out << counted(written, "file") << " written into " << options.folder << '\n';

@@ -3,6 +3,7 @@
 #include "programs/base/log_capture.h"
 #include "programs/base/pending_file.h"
 #include "programs/base/plain_text.h"
+#include "programs/mailing/entries_digest.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -47,9 +48,15 @@ void write(ByteFile& file, SalvagePlan const& plan, fs::path const& target) {
     Base::LogCapture const quiet;
     Base::PendingFile pending(target);
     PackWrapper out(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, plan.packId);
-    for (SavedPage const& page : plan.pages)
-        out.savePage(page.name.document, page.name.page, salvagedBlob(file, page.blob));
-    if (!out.finalizeOutput(plan.metadata ? salvagedBlob(file, *plan.metadata) : emptyMetadata(plan.packId)))
+    Mailing::EntriesDigest digest(plan.packId);
+    for (SavedPage const& page : plan.pages) {
+        SharedMemBuffer const blob = salvagedBlob(file, page.blob);
+        digest.add(page.name.document, page.name.page, blob);
+        out.savePage(page.name.document, page.name.page, blob);
+    }
+    SharedMemBuffer const metadata =
+        plan.metadata ? salvagedBlob(file, *plan.metadata) : emptyMetadata(plan.packId);
+    if (!out.finalizeOutput(Mailing::withEntriesDigest(metadata, digest.text())))
         throw Base::Error("cannot write \"" + target.string() + "\"; make room on the disk and try again");
     pending.commit();
 }

@@ -1,44 +1,36 @@
 // vlmail pack verify: whether every blob of a mailing file is whole, and which page is damaged.
 #include "programs/base/error.h"
-#include "programs/base/plain_text.h"
 #include "programs/vlmail/commands/pack.h"
 #include "programs/vlmail/letters/outcome.h"
-#include "programs/vlmail/pack/container_file.h"
+#include "programs/vlmail/pack/container_check.h"
 
+#include <algorithm>
 #include <memory>
 #include <ostream>
-#include <set>
 #include <vector>
 
 namespace VlMail {
 namespace {
 
+/// More lines help nobody.
+constexpr std::size_t MOST_TOLD = 50;
+
 /// Prints what is damaged; false when anything is.
 bool verify(std::string const& file, std::ostream& out) {
     ContainerFile container(file);
-    std::set<std::string> documents;
-    std::size_t pages = 0, damaged = 0;
-    for (unsigned long long i = 0; i < container.size(); ++i) {
-        ContainerFile::Entry const& entry = container.entry(i);
-        if (isPage(entry)) {
-            ++pages;
-            documents.insert(entry.document);
-        }
-        std::string const damage = container.blob(i).damage;
-        if (damage.empty())
-            continue;
-        ++damaged;
-        out << file << ": damaged: " << Base::plainLine(inWords(entry)) << ": " << damage << '\n';
-    }
-    bool const hasMetadata = container.size() > pages;
-    if (!hasMetadata)
-        out << file << ": damaged: the metadata: it is missing\n";
-    out << file << ": " << counted(pages, "page") << " of " << counted(documents.size(), "document") << ", ";
-    if (damaged == 0 && hasMetadata)
+    ContainerCheck const check = checkContainer(container);
+    std::size_t const damages = check.damages.size();
+    for (std::size_t i = 0; i < std::min(damages, MOST_TOLD); ++i)
+        out << file << ": damaged: " << check.damages[i] << '\n';
+    if (damages > MOST_TOLD)
+        out << file << ": damaged: and " << damages - MOST_TOLD << " more\n";
+    out << file << ": " << counted(check.pages, "page") << " of " << counted(check.documents, "document")
+        << ", ";
+    if (damages == 0)
         out << "all whole\n";
     else
-        out << counted(damaged + (hasMetadata ? 0 : 1), "blob") << " damaged\n";
-    return damaged == 0 && hasMetadata;
+        out << counted(damages, "blob") << " damaged\n";
+    return damages == 0;
 }
 
 int verifyAll(std::vector<std::string> const& files, Terminal const& terminal) {

@@ -1,5 +1,8 @@
 #include "programs/vlmail/commands/command.h"
 
+#include "programs/base/plain_stream.h"
+
+#include <new>
 #include <ostream>
 
 namespace VlMail {
@@ -20,9 +23,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addUploadCommand(command, task);
 }
 
-} // namespace
-
-int run(int argc, char const* const* argv, Terminal const& terminal) {
+int runPlainly(int argc, char const* const* argv, Terminal const& terminal) {
     Base::CommandLine line(
         "Sends letters out of documents: reads them, says what was found, and packs mailings.", "vlmail");
     Task task;
@@ -31,10 +32,35 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
         return line.read(argc, argv, terminal.out) ? task(terminal) : FINE;
     } catch (Base::UsageError const& wrong) {
         terminal.complain(std::string(wrong.what()) + "; --help explains");
+    } catch (std::bad_alloc const&) {
+        throw;
     } catch (std::exception const& failure) {
         terminal.complain(failure.what());
     }
     return FAILED;
+}
+
+int runAndFlush(int argc, char const* const* argv, Terminal const& terminal) {
+    // Names and values from documents, mailings and services stand in what commands print.
+    Base::PlainStream out(terminal.out);
+    int const status = runPlainly(argc, argv, {out, terminal.err, terminal.showsProgress});
+    if (out.flush())
+        return status;
+    terminal.complain("the results cannot be written; make room on the disk, or send them elsewhere");
+    return FAILED;
+}
+
+} // namespace
+
+int run(int argc, char const* const* argv, Terminal const& terminal) {
+    try {
+        return runAndFlush(argc, argv, terminal);
+    } catch (std::bad_alloc const&) {
+        // Words that need no memory.
+        terminal.err << "vlmail: there is no memory for this; close other programs or raise the limit"
+                     << std::endl;
+        return FAILED;
+    }
 }
 
 } // namespace VlMail

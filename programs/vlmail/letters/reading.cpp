@@ -5,6 +5,7 @@
 #include "programs/base/quoting.h"
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
+#include "programs/mailing/page_blob.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/letters/node_settings.h"
@@ -135,7 +136,7 @@ std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& l
         return blobs;
     for (int const page : letter.pages) {
         std::string const pdf = document.singlePagePdf(page);
-        blobs.push_back({page, PageSaverI::zipDbData(pdf.data(), pdf.size())});
+        blobs.push_back({page, Mailing::compressed(pdf)});
     }
     return blobs;
 }

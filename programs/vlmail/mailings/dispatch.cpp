@@ -1,8 +1,10 @@
 #include "programs/vlmail/mailings/dispatch.h"
 
 #include "programs/base/error.h"
+#include "programs/base/quoting.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/pack/container_format.h"
 
 #include <algorithm>
 #include <ostream>
@@ -21,6 +23,15 @@ Cfg::PackPreset const& presetNamed(std::string const& name, Cfg::Presets const& 
     return found->value;
 }
 
+/// A document whose name a container cannot hold would fail all of its mailing in the end.
+void requireName(DocumentReading& reading) {
+    if (reading.failed() || !reading.letters || Container::mayStandInIndex(reading.document))
+        return;
+    reading.letters.reset();
+    reading.error = "cannot mail " + Base::inQuotes(reading.document) +
+                    ": its name has a character that a mailing cannot hold; rename the document";
+}
+
 } // namespace
 
 Dispatch::Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal const& terminal)
@@ -28,6 +39,7 @@ Dispatch::Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal con
 
 void Dispatch::take(ReadResult result) {
     DocumentReading& reading = result.reading;
+    requireName(reading);
     outcome_.count(reading);
     if (reading.failed()) {
         fail(reading.document, reading.error);

@@ -29,7 +29,7 @@ Cfg::ExtractedFields deepCopy(Cfg::ExtractedFields const& fields) {
 
 MailingBuilder::MailingBuilder(PageSaverI& pages, std::string id, Cfg::PackPreset packPreset,
                                long long created)
-    : pages_(pages), metadata_{std::move(id), created, std::move(packPreset), {}} {}
+    : pages_(pages), metadata_{std::move(id), created, std::move(packPreset), {}}, digest_(metadata_.id) {}
 
 std::string MailingBuilder::nameFor(std::string const& document) {
     std::filesystem::path const path(document);
@@ -40,8 +40,11 @@ std::string MailingBuilder::nameFor(std::string const& document) {
 }
 
 void MailingBuilder::add(std::string const& document, LetterReading letter) {
-    for (PageBlob const& blob : letter.blobs)
+    for (PageBlob const& blob : letter.blobs) {
         pages_.savePage(document, std::to_string(blob.number), blob.data);
+        digest_.add(document, std::to_string(blob.number), blob.data);
+    }
+    metadata_.entriesDigest = digest_.text();
     pageCount_ += letter.pages.size();
     ++letterCount_;
     Mailing::DocumentPages pages{document, letter.pages};

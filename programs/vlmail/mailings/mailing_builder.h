@@ -1,6 +1,7 @@
 #pragma once
 // Makes a mailing out of letters: stores their pages and groups those that go out as one.
 
+#include "programs/mailing/entries_digest.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/letters/reading.h"
 #include "vlservice/pack/page_saver.h"
@@ -36,6 +37,7 @@ private:
 
     PageSaverI& pages_;
     Mailing::Metadata metadata_;
+    Mailing::EntriesDigest digest_;
     std::unordered_set<std::string> documents_;
     /// Positions in metadata_.letters of those that a further letter may join, by what must agree.
     std::unordered_multimap<std::string, std::size_t> groups_;

@@ -4,7 +4,9 @@
 #include "programs/base/log_capture.h"
 #include "vlservice/pack/pack_wrapper.h"
 
+#include <cstdint>
 #include <optional>
+#include <set>
 #include <string>
 
 namespace VlMail {
@@ -16,6 +18,8 @@ public:
 
     struct Blob {
         SharedMemBuffer bytes;
+        /// Of the data in it.
+        std::uint64_t dataSize = 0;
         /// What is wrong with it, in words; empty when it is whole and can be expanded.
         std::string damage;
     };
@@ -23,6 +27,7 @@ public:
     /// Throws Error when there is no such file or its index cannot be read.
     explicit ContainerFile(std::string const& path);
 
+    std::uint64_t fileSize() const { return fileSize_; }
     std::string const& packId() const { return container_->packId(); }
     unsigned long long size() const { return container_->szBins(); }
     Entry const& entry(unsigned long long index) const { return container_->bin(index); }
@@ -31,12 +36,15 @@ public:
     Blob blob(unsigned long long index);
 
 private:
-    std::string damageOf(Entry const& entry, SharedMemBuffer const& blob) const;
+    void findOverlaps();
+    std::string damageOf(unsigned long long index, Blob& blob) const;
 
     /// The subcommands say what failed in words of their own.
     Base::LogCapture quiet_;
     std::uint64_t fileSize_;
     std::optional<PackWrapper> container_;
+    /// Entries whose bytes belong to an entry before them as well.
+    std::set<unsigned long long> overlapping_;
 };
 
 bool isPage(PackWrapper::BinEntry const& entry);

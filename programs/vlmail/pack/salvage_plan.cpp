@@ -1,12 +1,12 @@
 #include "programs/vlmail/pack/salvage_plan.h"
 
 #include "programs/mailing/metadata.h"
+#include "programs/mailing/page_blob.h"
 #include "programs/vlmail/pack/blob_extent.h"
 #include "programs/vlmail/pack/index_remains.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
 #include "vlservice/pack/little_endian.h"
-#include "vlservice/pack/page_saver.h"
 
 #include <zlib.h>
 
@@ -336,7 +336,7 @@ SalvagePlan planSalvage(ByteFile& file) { return Planner(file).plan(); }
 SharedMemBuffer salvagedBlob(ByteFile& file, FoundBlob const& blob) {
     SharedMemBuffer bytes = bytesOf(file, blob);
     if (blob.form == FoundBlob::Form::Plain)
-        return PageSaverI::zipDbData(bytes);
+        return Mailing::compressed(Mailing::viewOf(bytes));
     if (blob.form == FoundBlob::Form::WrongHeader)
         LittleEndian::store(blob.dataSize, bytes.data() + DB_ZIP_MAGIC.size());
     return bytes;

@@ -1,6 +1,6 @@
 #include "programs/vlmail/report/html.h"
 
-#include "programs/base/utf8.h"
+#include "programs/base/plain_text.h"
 
 #include <openssl/evp.h>
 
@@ -10,13 +10,6 @@
 
 namespace VlMail::Report {
 namespace {
-
-constexpr std::string_view REPLACEMENT = "\xEF\xBF\xBD";
-
-bool isForbidden(char c) {
-    auto const code = static_cast<unsigned char>(c);
-    return code == 0x7F || (code < 0x20 && c != '\n' && c != '\t');
-}
 
 void appendEscaped(std::string& html, char c) {
     switch (c) {
@@ -36,19 +29,15 @@ void appendEscaped(std::string& html, char c) {
         html += "&#39;";
         return;
     default:
-        break;
-    }
-    if (isForbidden(c))
-        html += REPLACEMENT;
-    else
         html += c;
+    }
 }
 
 } // namespace
 
 std::string escaped(std::string const& text) {
     std::string html;
-    for (char const c : Base::validUtf8(text))
+    for (char const c : Base::plainText(text))
         appendEscaped(html, c);
     return html;
 }

@@ -21,7 +21,7 @@ struct Terminal {
     /// Whether a person watches `err`: progress is shown then.
     bool showsProgress = false;
 
-    /// "vlmail: " and the text, as one line.
+    /// "vlmail: " and the text, as one line in which nothing acts.
     void complain(std::string const& text) const;
 };
 

@@ -4,6 +4,7 @@
 #include "programs/base/pending_file.h"
 #include "programs/mailing/pack_database.h"
 #include "vlservice/pack/blob_format.h"
+#include "vlservice/pack/container_format.h"
 #include "vlservice/pack/pack_wrapper.h"
 
 #include <algorithm>
@@ -20,6 +21,9 @@ bool isCompressed(SharedMemBuffer const& blob) {
 void copyPages(Mailing::PackDatabaseReader& pages, PackWrapper& container) {
     for (auto const& [document, page] : pages.pages()) {
         pages.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
+            if (!Container::mayStandInIndex(document) || !Container::mayStandInIndex(page))
+                throw BadPack("page \"" + page + "\" of \"" + document +
+                              "\" has a name that a container cannot hold");
             if (!isCompressed(blob))
                 throw BadPack("page \"" + page + "\" of \"" + document + "\" is not a compressed page");
             container.savePage(document, page, std::move(blob));

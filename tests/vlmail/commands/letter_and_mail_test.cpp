@@ -229,6 +229,22 @@ TEST_F(VlMailTest, LeavesOutWhatIsNotReadyAndLosesNothingElse) {
     EXPECT_EQ(leftOut.str(), R"([{"name":"invoice 2.txt","pages":[1],"reason":"no address to go to"}])");
 }
 
+TEST_F(VlMailTest, SaysAtTheDocumentThatAMailingCannotHoldItsName) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2\x01.txt", "No 2\nTo: Bob\n");
+    write("invoice 3\uFFFE.txt", "No 3\nTo: Eve\n");
+    EXPECT_EQ(
+        vlmail("mail", {"invoice 1.txt", "invoice 2\x01.txt", "invoice 3\uFFFE.txt"}, {"-o", path("out")}),
+        VlMail::FAILED);
+    EXPECT_EQ(err_, "vlmail: cannot mail \"invoice 2\\u0001.txt\": its name has a character that a mailing "
+                    "cannot hold; rename the document\n"
+                    "vlmail: cannot mail \"invoice 3\uFFFE.txt\": its name has a character that a mailing "
+                    "cannot hold; rename the document\n");
+    ASSERT_EQ(mailings().size(), 1u);
+    EXPECT_EQ(metadataOf(mailings()[0]).letters.size(), 1u);
+    EXPECT_NE(metadataOf(mailings()[0]).entriesDigest, "");
+}
+
 TEST_F(VlMailTest, RefusesAFolderThatCannotBeMade) {
     write("invoice 1.txt", "No 1\nTo: Ada\n");
     write("out", "a file where the folder should be");

@@ -1,12 +1,17 @@
 // vlmail pack as a person runs it: a container, a command line, what is printed and the exit status.
+#include "programs/base/error.h"
+#include "programs/mailing/entries_digest.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/pack/container_check.h"
 #include "programs/vlmail/pack/salvage_plan.h"
+#include "tests/support/small_disk.h"
 #include "tests/support/temporary_folder.h"
 #include "vlservice/json/json_text.h"
 #include "vlservice/pack/pack_wrapper.h"
 
 #include <gmock/gmock.h>
+#include <zlib.h>
 
 #include <algorithm>
 #include <filesystem>
@@ -24,6 +29,7 @@ using testing::ElementsAre;
 using testing::EndsWith;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using testing::Not;
 using testing::Pair;
 using testing::StartsWith;
 
@@ -63,6 +69,58 @@ protected:
         for (Page const& page : pages)
             out.savePage(page.document, page.name, zipped(page.content));
         ASSERT_TRUE(out.finalizeOutput(metadata));
+    }
+
+    /// As vlmail writes it.
+    void packWithDigest(std::vector<Page> const& pages) {
+        Mailing::EntriesDigest digest("m1");
+        for (Page const& page : pages)
+            digest.add(page.document, page.name, zipped(page.content));
+        Mailing::Metadata metadata = metadataOf(pages);
+        metadata.entriesDigest = digest.text();
+        pack(pages, metadata.toBlob());
+    }
+
+    /// A container of these items behind these bytes.
+    void forge(std::string bytes, std::string const& items) {
+        std::size_t const index = bytes.size();
+        bytes += "<?xml version=\"1.0\"?><vantelar><corbulet id=\"m1\">" + items + "</corbulet></vantelar>";
+        for (int i = 0; i < 8; ++i)
+            bytes += static_cast<char>(index >> 8 * i & 0xFF);
+        write(bytes);
+    }
+    static std::string item(std::string const& name, std::size_t offset, std::string const& blob,
+                            std::string const& role = "page") {
+        auto const crc = crc32_z(0, reinterpret_cast<Bytef const*>(blob.data()), blob.size());
+        return "<mailitem name=\"" + name + "\" offset=\"" + std::to_string(offset) + "\" length=\"" +
+               std::to_string(blob.size()) + "\" role=\"" + role + "\" crc=\"" + std::to_string(crc) +
+               "\" document=\"a.pdf\"/>";
+    }
+    static std::string textOf(SharedMemBuffer const& data) {
+        return {reinterpret_cast<char const*>(data.data()), data.size()};
+    }
+
+    /// As by "verify", but for the command line.
+    bool isToldAsDamaged() const {
+        try {
+            VlMail::ContainerFile container(file_.string());
+            return !VlMail::checkContainer(container).damages.empty();
+        } catch (Base::Error const&) {
+            return true;
+        }
+    }
+
+    /// What a reader learns from the index.
+    static std::string indexOf(fs::path const& file) {
+        PackWrapper in(file.string(), PackWrapper::PURPOSE_IMPORT, "");
+        std::ostringstream text;
+        text << in.packId();
+        for (unsigned long long i = 0; i < in.szBins(); ++i) {
+            PackWrapper::BinEntry const& bin = in.bin(i);
+            text << '|' << bin.name << ',' << bin.offset << ',' << bin.length << ',' << bin.role << ','
+                 << bin.crc << ',' << bin.document;
+        }
+        return text.str();
     }
 
     static std::string read(fs::path const& file) {
@@ -288,6 +346,144 @@ TEST_F(PackVerify, GoesOnWithTheNextFile) {
     EXPECT_EQ(run({"verify", "missing.mailing", file_.string()}), 1);
     EXPECT_EQ(err_, "vlmail: cannot read \"missing.mailing\": No such file or directory; check the name\n");
     EXPECT_THAT(out_, EndsWith("all whole\n"));
+}
+
+TEST_F(PackVerify, RefusesAPageOfNoBytes) {
+    PackWrapper out(file_.string(), PackWrapper::PURPOSE_OUTPUT, "m1");
+    out.savePage("a.pdf", "1", zipped(pdf("x")));
+    out.savePage("a.pdf", "2", {});
+    out.savePage("a.pdf", "3", zipped(""));
+    ASSERT_TRUE(out.finalizeOutput(
+        metadataOf({{"a.pdf", "1", ""}, {"a.pdf", "2", ""}, {"a.pdf", "3", ""}}).toBlob()));
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_EQ(out_, file_.string() + ": damaged: page 2 of \"a.pdf\": it is empty\n" + file_.string() +
+                        ": damaged: page 3 of \"a.pdf\": it is empty\n" + file_.string() +
+                        ": 3 pages of 1 document, 2 blobs damaged\n");
+    EXPECT_EQ(run({"extract", file_.string(), "-o", (folder_ / "out").string()}), 1);
+    EXPECT_THAT(filesIn(folder_ / "out"), testing::SizeIs(2));
+}
+
+TEST_F(PackVerify, FindsEveryBitThatChangesWhatTheIndexSays) {
+    packWithDigest(PAGES);
+    EXPECT_EQ(run({"verify", file_.string()}), 0);
+    std::string const before = indexOf(file_);
+    std::size_t const begin = positionOf("<?xml") * 8, end = read(file_).size() * 8;
+    for (std::size_t bit = begin; bit < end; ++bit) {
+        flip(bit);
+        bool const isTold = isToldAsDamaged();
+        ASSERT_TRUE(isTold || indexOf(file_) == before) << "bit " << bit - begin;
+        flip(bit);
+    }
+}
+
+TEST_F(PackVerify, HoldsTheIndexOfAnOlderMailingAgainstItsMetadata) {
+    pack({PAGES[0], PAGES[1], {"c.pdf", "1", pdf("c")}}, metadataOf(PAGES).toBlob());
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_EQ(out_, file_.string() + ": damaged: page 1 of \"c.pdf\": the metadata does not know it\n" +
+                        file_.string() + ": damaged: page 1 of \"b.pdf\": it is missing\n" + file_.string() +
+                        ": 3 pages of 2 documents, 2 blobs damaged\n");
+    Mailing::Metadata metadata = metadataOf(PAGES);
+    metadata.id = "m2";
+    pack(PAGES, metadata.toBlob());
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_THAT(out_, HasSubstr(": damaged: the id: the index says \"m1\", the metadata \"m2\"\n"));
+}
+
+TEST_F(PackVerify, TellsPagesThatChangedPlacesByTheDigest) {
+    packWithDigest(PAGES);
+    std::string bytes = read(file_);
+    std::size_t const first = bytes.find("name=\"1\""), second = bytes.find("name=\"2\"");
+    std::swap(bytes[first + 6], bytes[second + 6]);
+    write(bytes);
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_THAT(out_, StartsWith(file_.string() + ": damaged: the index: it is another than was written\n"));
+}
+
+TEST_F(PackVerify, LetsTheMetadataOfOtherProgramsBe) {
+    pack(PAGES, zipped("not of ours"));
+    EXPECT_EQ(run({"verify", file_.string()}), 0);
+    EXPECT_EQ(out_, file_.string() + ": 3 pages of 2 documents, all whole\n");
+}
+
+TEST_F(PackVerify, RefusesManyEmptyItemsInFewLines) {
+    std::string const blob = textOf(zipped(pdf("x")));
+    std::string items = item("1", 0, blob);
+    for (int i = 0; i < 20'000; ++i)
+        items += "<mailitem/>";
+    forge(blob, items);
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_EQ(std::count(out_.begin(), out_.end(), '\n'), 52);
+    EXPECT_THAT(out_, EndsWith(": 1 page of 1 document, 39999 blobs damaged\n"));
+}
+
+TEST_F(PackVerify, RefusesEntriesThatShareBytes) {
+    std::string const blob = textOf(zipped(std::string(1 << 20, 'x')));
+    std::string items;
+    for (int i = 1; i <= 30; ++i)
+        items += item(std::to_string(i), 0, blob);
+    forge(blob + textOf(metadataOf({}).toBlob()),
+          items + item("DDT440001.TDD", blob.size(), textOf(metadataOf({}).toBlob()), "framework"));
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_THAT(out_, HasSubstr("page 2 of \"a.pdf\": its bytes belong to another as well\n"));
+    EXPECT_THAT(out_, Not(HasSubstr("page 1 of \"a.pdf\": its bytes")));
+    EXPECT_EQ(run({"extract", file_.string(), "-o", (folder_ / "out").string()}), 1);
+    EXPECT_THAT(filesIn(folder_ / "out"), testing::SizeIs(2)) << "one page and the metadata";
+}
+
+TEST_F(PackExtract, LeavesOutWhatNoMailingExpandsTo) {
+    std::string const blob = textOf(zipped(std::string(8 << 20, 'x')));
+    std::string bytes, items;
+    for (int i = 1; i <= 3; ++i) {
+        items += item(std::to_string(i), bytes.size(), blob);
+        bytes += blob;
+    }
+    forge(bytes, items);
+    std::uint64_t const limit = (std::uint64_t{16} << 20) + 64 * fs::file_size(file_);
+    EXPECT_EQ(run({"extract", file_.string(), "-o", (folder_ / "out").string()}), 1);
+    EXPECT_EQ(err_, "vlmail: page 3 of \"a.pdf\" in \"" + file_.string() +
+                        "\" is left out: the mailing expands to more than " + std::to_string(limit) +
+                        " bytes\n");
+    EXPECT_EQ(filesIn(folder_ / "out").size(), 2U);
+}
+
+TEST_F(PackExtract, LeavesNoHalfFileOnAFullDisk) {
+    VLServiceTest::SmallDisk const disk;
+    if (!disk.whyNot().empty())
+        GTEST_SKIP() << "no small disk: " << disk.whyNot();
+    std::string noise;
+    for (std::uint32_t i = 0, value = 1; i < 20'000; ++i, value = value * 1664525 + 1013904223)
+        noise += static_cast<char>(value >> 24);
+    pack({PAGES[0], {"b.pdf", "1", pdf(noise)}});
+    EXPECT_EQ(run({"extract", file_.string(), "-o", disk.path()}), 1);
+    EXPECT_EQ(err_,
+              "vlmail: cannot write \"" + disk.path() +
+                  "/b-1.pdf\": No space left on device; make room on the disk or name another folder\n");
+    EXPECT_EQ(read(disk.path() + "/a-1.pdf"), PAGES[0].content);
+    EXPECT_EQ(std::distance(fs::directory_iterator(disk.path()), {}), 1);
+}
+
+TEST_F(PackList, IsAFailureWhenItCannotBeWritten) {
+    pack(PAGES);
+    std::ofstream full("/dev/full");
+    std::ostringstream err;
+    std::string const file = file_.string();
+    char const* const argv[]{"vlmail", "pack", "list", file.c_str()};
+    EXPECT_EQ(VlMail::run(4, argv, {full, err}), 1);
+    EXPECT_EQ(err.str(),
+              "vlmail: the results cannot be written; make room on the disk, or send them elsewhere\n");
+}
+
+TEST_F(PackList, ShowsNoControlOfATerminal) {
+    pack({{"a\u202Efdp.exe\xC2\x9B"
+           "2J",
+           "1", pdf("x")}});
+    EXPECT_EQ(run({"list", file_.string()}), 0);
+    EXPECT_THAT(out_, HasSubstr("a\\u202efdp.exe\\u009b2J"));
+    EXPECT_EQ(run({"list", "--json", file_.string()}), 0);
+    EXPECT_THAT(out_, HasSubstr("a\\u202efdp.exe\\u009b2J"));
+    EXPECT_THAT(out_, Not(HasSubstr("\xC2\x9B")));
+    EXPECT_EQ(run({"list", "no\x1b]0;x\x07"}), 1);
+    EXPECT_THAT(err_, HasSubstr("no\\u001b]0;x\\u0007"));
 }
 
 TEST_F(PackExtract, WritesPagesAndMetadataExpanded) {

@@ -75,11 +75,11 @@ TEST(ReportEscaping, ReplacesWhatHtmlReads) {
               "&lt;a href=&quot;x&quot;&gt;&#39;&amp;&#39;&lt;/a&gt;");
 }
 
-TEST(ReportEscaping, KeepsLineFeedsAndReplacesOtherControlsAndBadBytes) {
+TEST(ReportEscaping, KeepsLineFeedsAndShowsOtherControlsAndBadBytes) {
     EXPECT_EQ(Report::escaped("a\nb\tc\x01"
                               "d\x7F"
                               "e\xFF"),
-              "a\nb\tc\uFFFDd\uFFFDe\uFFFD");
+              "a\nb c\\u0001d\\u007fe\uFFFD");
 }
 
 TEST(ReportEscaping, LetsNoTextFromOutsideBecomeHtml) {

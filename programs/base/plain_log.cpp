@@ -1,0 +1,16 @@
+#include "programs/base/plain_log.h"
+
+#include "programs/base/plain_text.h"
+
+namespace Base {
+
+PlainLog::PlainLog() : before_(Log::setSink({})) {
+    Log::setSink([this](LogPriority priority, std::string const& line) {
+        if (before_)
+            before_(priority, plainLine(line));
+    });
+}
+
+PlainLog::~PlainLog() { Log::setSink(before_); }
+
+} // namespace Base
