@@ -376,28 +376,34 @@ TEST_P(HarmlessAnswers, LeaveTheConnectionInUse) {
     EXPECT_EQ(client.call<Ipc::PriceEst>(json::Object{})->resp().get("cents").intOrZero(), 3);
 }
 
-/// The longest text that a message can have, all of it empty objects.
-std::string manyObjects() {
-    std::string text = R"({"a":[{})";
-    while (text.size() < Channel::MAX_TEXT - 4)
-        text += ",{}";
-    text.resize(Channel::MAX_TEXT - 2, ' ');
-    return text + "]}";
-}
-
 INSTANTIATE_TEST_SUITE_P(
     Answers, HarmlessAnswers,
     Values(Harmless{"Error", Kind::Error, R"({"err":"No."})", "The service refuses: No."},
            Harmless{"ErrorWithoutAReason", Kind::Error, "{}", "The service refuses: It gave no reason."},
-           Harmless{
-               "TooManyValues", Kind::Response, manyObjects(),
-               "The answer cannot be used: The values of a message of 16777216 bytes would take more than "
-               "256 MiB of memory."},
            Harmless{"NoJson", Kind::Response, "x",
                     "The answer cannot be used: JSON error: '[' or '{' expected near 'x' (line 1, column 1)"},
            Harmless{"BodyThatTheCommandRefuses", Kind::Response, "{}",
                     "The answer cannot be used: JSON error: Wrong type: empty. Expected type: array"}),
     [](auto const& instance) { return instance.param.name; });
+
+TEST_F(BrokenServices, ThatAnswerWithATreeOfValuesOverItsBoundsLeaveTheConnectionInUse) {
+    FakeService service([](RawPeer& peer) {
+        peer.welcome();
+        peer.receive();
+        // The longest text that a message can have, nearly all of it lists.
+        std::string text(Channel::MAX_TEXT, '[');
+        text.replace(0, 5, R"({"a":)");
+        peer.send(PRICE, Kind::Response, 2, text);
+        peer.receive();
+        peer.send(PRICE, Kind::Response, 3, R"({"cents":3})");
+        wait(peer);
+    });
+    Client client(service.clientSettings());
+    EXPECT_EQ(messageOf<Base::Error>([&] { client.call<Ipc::PriceEst>(json::Object{}); }),
+              "The answer cannot be used: The values of a message of 16777216 bytes would take more than "
+              "256 MiB of memory.");
+    EXPECT_EQ(client.call<Ipc::PriceEst>(json::Object{})->resp().get("cents").intOrZero(), 3);
+}
 
 // --- commands that cannot be sent
 
