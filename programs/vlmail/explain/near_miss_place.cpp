@@ -1,4 +1,5 @@
 // Near misses in which the text stands elsewhere: beyond the zone, in another line or block, on another page.
+#include "programs/base/error.h"
 #include "programs/base/quoting.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/words.h"
@@ -7,6 +8,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <set>
 #include <span>
 
 namespace VlMail::NearMisses {
@@ -41,17 +43,56 @@ constexpr std::array SMALLER_DISTANCES{1.6, 1.4, 1.2};
 constexpr Rule LINE_DISTANCE{"max_line_distance", &LayoutRules::maxLineDistance, LARGER_DISTANCES,
                              SMALLER_DISTANCES};
 
+/// The names of the preset's fields that are found on the page as it is laid out; none when that fails.
+std::set<std::string> foundOn(LaidOutPage const& page, Cfg::ExtractPreset const& preset) {
+    Reader::PageTrace trace;
+    Reader::PatternTime time;
+    Reader::ReadingRules const rules;
+    Reader::FieldSearch fields({}, rules, time, &trace);
+    std::set<std::string> names;
+    try {
+        for (Cfg::ExtractZone const& zone : preset.zones())
+            fields.search(zone, Reader::textOf(*page.page, page.layout, zone));
+    } catch (Base::Error const&) {
+        return names;
+    }
+    for (Reader::ZoneTrace const& zone : trace.zones)
+        for (Reader::FieldTrace const& field : zone.fields)
+            if (field.isFound())
+                names.insert(field.definition->name());
+    return names;
+}
+
+/// What a layout that holds for the whole preset would lose, as the end of a sentence; empty when it loses
+/// nothing.
+std::string lossesBy(Search const& search, LaidOutPage const& changed) {
+    Cfg::ExtractPreset const& preset = search.missed().preset;
+    std::set<std::string> const after = foundOn(changed, preset);
+    std::string lost;
+    for (std::string const& name : foundOn(search.page(), preset))
+        if (!after.contains(name))
+            lost += (lost.empty() ? "" : ", ") + Base::inQuotes(name);
+    return lost.empty() ? lost : ", but would lose " + lost;
+}
+
 std::optional<Found> withRule(Search const& search, Rule const& rule, double value) {
     LayoutRules rules = search.pages().rules();
     double const current = rules.*rule.member;
     rules.*rule.member = value;
     LaidOutPage const& page = search.pages().laidOut(*search.page().page, rules);
-    return search.told(
+    auto found = search.told(
         search.find(search.remaining(search.textOn(page))), search.pageNumber(), [&](Hit const& hit) {
             return "would match " + excerpt(hit.match.text) + " with " + Base::inQuotes(rule.key) + " at " +
                    Words::number(value) + (value > current ? " or more" : " or less") + " instead of " +
                    Words::number(current);
         });
+    if (!found)
+        return found;
+    // The rule is the whole preset's: advice that harms other fields stands behind all that does not.
+    std::string const losses = lossesBy(search, page);
+    found->says += losses;
+    found->isValid = found->isValid && losses.empty();
+    return found;
 }
 
 std::optional<Found> byRule(Search const& search, Rule const& rule) {

@@ -72,6 +72,17 @@ TEST_F(NearMissTest, OfALineInTwoColumnsThatWereReadAsOneIsASmallerGap) {
                     StartsWith("anchor: ")));
 }
 
+TEST_F(NearMissTest, OfARuleOfThePresetThatOtherFieldsNeedSaysWhatItLosesAndStandsBehind) {
+    json::Object const reading = explainedFields("Ref: 17   Page 1\nTotal:   12\n",
+                                                 R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>\\d+)$"},
+                                                     {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"})_");
+    EXPECT_THAT(
+        nearMissesIn(fieldOf(reading, "ref")),
+        ElementsAre(StartsWith("anchor: "),
+                    "gaps: would match \"Ref: 17\" with \"max_spaces_between_fragments\" at 2.5 or less "
+                    "instead of 3, but would lose \"total\""));
+}
+
 TEST_F(NearMissTest, OfTextBesideItInItsLineIsTheAnchor) {
     EXPECT_THAT(
         missesOf("Our Ref: 17\n", "^Ref: (?<VAL>\\d+)$"),
