@@ -44,6 +44,7 @@
 #include "vlservice/json/json.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
+#include "vlservice/pack/index_tags.h"
 #include "vlservice/pack/pack_wrapper.h"
 #include "vlservice/pack/page_loader.h"
 #include "vlservice/pack/page_saver.h"

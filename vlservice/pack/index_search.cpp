@@ -100,8 +100,8 @@ std::optional<Unsigned> IndexSearch::readNumber(std::int64_t position) const {
     return LittleEndian::load<Unsigned>(bytes);
 }
 
-/// The candidate runs from the position to `indexEnd`. One that begins before the file is a candidate whatever
-/// its size: the import shall fail at reading it, not go on to another layout.
+/// The candidate runs from the position to `indexEnd`. One that begins before the file is a candidate
+/// whatever its size: the import shall fail at reading it, not go on to another layout.
 IndexSearch::Outcome IndexSearch::upTo(std::int64_t indexEnd) {
     std::int64_t const lowest = indexEnd - INDEX_SIZE_LIMIT + 1;
     if (place_.position >= 0 && place_.position < lowest)

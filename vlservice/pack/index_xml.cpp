@@ -1,6 +1,7 @@
 #include "vlservice/pack/index_xml.h"
 
 #include "vlservice/pack/container_format.h"
+#include "vlservice/pack/index_tags.h"
 #include "vlservice/pack/xml_depth.h"
 
 #include <unicode/utf8.h>
@@ -67,7 +68,33 @@ std::unique_ptr<TiXmlElement> makeMailing(std::string const& packId, std::deque<
     return mailing;
 }
 
+/// The tag alone as an element of that name; empty when it cannot be parsed or is another.
+std::unique_ptr<TiXmlDocument> parseTag(std::string tag, char const* name) {
+    if (tag.size() < 2 || tag.back() != '>')
+        return nullptr;
+    if (tag[tag.size() - 2] != '/')
+        tag.insert(tag.size() - 1, "/");
+    if (isNestedDeeperThan(1, tag))
+        return nullptr;
+    auto document = std::make_unique<TiXmlDocument>();
+    document->Parse(tag.c_str(), nullptr, TIXML_ENCODING_LEGACY);
+    bool const isWhole = !document->Error() && document->RootElement();
+    return isWhole && document->RootElement()->ValueStr() == name ? std::move(document) : nullptr;
+}
+
 } // namespace
+
+std::optional<BinEntry> itemInTag(std::string tag) {
+    auto const document = parseTag(std::move(tag), TAG_ITEM);
+    return document ? std::optional(readItem(*document->RootElement())) : std::nullopt;
+}
+
+std::optional<std::string> mailingIdInTag(std::string tag) {
+    auto const document = parseTag(std::move(tag), TAG_MAILING);
+    std::string const* const id =
+        document ? document->RootElement()->Attribute(std::string(MAILING_ID)) : nullptr;
+    return id ? std::optional(*id) : std::nullopt;
+}
 
 bool mayStandInIndex(std::string_view text) {
     return allCodePoints(text, [](UChar32 c) {
