@@ -42,6 +42,7 @@
 #include "vlservice/ipc/update_status.h"
 #include "vlservice/ipc/upload_queued.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/record_keys.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
 #include "vlservice/pack/index_tags.h"
@@ -58,3 +59,4 @@
 #include "vlservice/presets/pack_preset.h"
 #include "vlservice/presets/presets.h"
 #include "vlservice/presets/process_mode.h"
+#include "vlservice/presets/settings_parts.h"

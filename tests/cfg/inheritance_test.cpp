@@ -118,7 +118,7 @@ struct State {
 template<typename Part, std::size_t... I>
 std::vector<State> states(Part const& part, std::index_sequence<I...>) {
     auto const state = [](auto const& value, bool inh) {
-        return State{Cfg::JsonForm<std::remove_cvref_t<decltype(value)>>::write(value), inh};
+        return State{json::Form<std::remove_cvref_t<decltype(value)>>::write(value), inh};
     };
     return {state(part.template value<IdxsOf<Part>{I}>(), part.template isInherited<IdxsOf<Part>{I}>())...};
 }

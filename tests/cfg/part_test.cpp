@@ -54,7 +54,7 @@ private:
 } // namespace
 
 template<>
-struct Cfg::JsonForm<Ranked> {
+struct json::Form<Ranked> {
     static Ranked read(json::Value const& node) {
         json::Object const& object = node.toObject();
         return {static_cast<int>(object.get("order").intOrZero()), object.get("name").toString()};
@@ -74,12 +74,15 @@ using Fields = std::tuple<Cfg::Field<int, Cfg::Value<int>>, Cfg::Field<Named, Cf
 class Sample : public Cfg::Part<Idx, Fields> {
 public:
     explicit Sample(json::Value const& j = {}, bool global = false, bool sorted = false)
-        : Part(global, {"number", "plain", "ranked"}) {
+        : Part(global, {{"number", Cfg::RootDefault{NUMBER_OF_THE_ROOT}}, {"plain"}, {"ranked"}}) {
         deserialize(j, sorted);
     }
     using Part::addInherited;
     using Part::setDefault;
-    using Part::setDefaultIfInherited;
+    using Part::takeRootDefaults;
+
+private:
+    static constexpr int NUMBER_OF_THE_ROOT = 8;
 };
 
 /// The names in list order, inherited elements in brackets: "A B (C)".
@@ -408,13 +411,14 @@ TEST(PartAccess, SetsAnOwnValueAndResetsIt) {
 
 TEST(PartAccess, SetsADefaultThatIsInherited) {
     Sample part(R"({"number": 1})"_json);
-    part.setDefaultIfInherited<Idx::Number>(7);
+    part.takeRootDefaults();
     EXPECT_EQ(part.value<Idx::Number>(), 1);
     part.setDefault<Idx::Number>(7);
     EXPECT_EQ(part.value<Idx::Number>(), 7);
     EXPECT_TRUE(part.isInherited<Idx::Number>());
-    part.setDefaultIfInherited<Idx::Number>(8);
+    part.takeRootDefaults();
     EXPECT_EQ(part.value<Idx::Number>(), 8);
+    EXPECT_TRUE(part.isInherited<Idx::Number>());
 }
 
 TEST(PartAccess, AddsOwnElementsBehindTheLastOwnOne) {

@@ -49,13 +49,11 @@ std::vector<Row> describedFields(std::string const& part) {
     return rows(section(part), ROW);
 }
 
-/// Keys and values of the part of the root, in the order in which they are written.
 template<typename Part>
 std::vector<Row> fields() {
     std::vector<Row> fields;
-    json::Value const written = Part(json::Value(), true, false).serialize();
-    for (auto const& [key, value] : written.toObject())
-        fields.emplace_back(key, text(value.isObject() ? value.toObject().get("v") : value));
+    for (json::KeyRow const& row : Part::keys().rows)
+        fields.emplace_back(row.name, row.missing);
     return fields;
 }
 

@@ -100,4 +100,141 @@ TEST(JsonRecords, RefuseAMissingIdentifier) {
     expectWrongType([&] { json::readKeys(KEYS, parse(R"({"name":null})"), record); }, "null", "string");
 }
 
+struct Child {
+    std::string id;
+
+    Child() = default;
+    Child(json::Object const& object) : id(object.get("id").toString()) {}
+    json::Object serialize() const { return {{"id", id}}; }
+    bool operator==(Child const&) const = default;
+
+    static json::RecordKeys const& keys() {
+        static json::RecordKeys const keys{json::describeKeys(std::tuple{json::Required{"id", &Child::id}})};
+        return keys;
+    }
+};
+
+/// Rows with rules of their own.
+struct Parent {
+    std::vector<Child> children;
+    std::vector<std::string> names;
+    int place = -1;
+    int always = 0;
+    int doubled = 0;
+    bool kept = false;
+};
+
+int twice(json::Value const& node) { return static_cast<int>(2 * node.toInt()); }
+
+constexpr std::tuple PARENT_KEYS{
+    json::Required{"children", &Parent::children},
+    json::Key{"names", &Parent::names},
+    json::Key{"place", &Parent::place, -1}.checked(),
+    json::Key{"always", &Parent::always}.alwaysWritten(),
+    json::Key{"doubled", &Parent::doubled}.readBy(twice),
+    json::Key{"kept", &Parent::kept}.notClaimed(),
+    json::Dropped{"foreign"},
+};
+
+Parent parentOf(std::string const& text) {
+    Parent parent;
+    json::readKeys(PARENT_KEYS, parse(text), parent);
+    return parent;
+}
+
+std::string written(Parent const& parent) {
+    json::Object object;
+    json::writeKeys(PARENT_KEYS, parent, object);
+    return print(object);
+}
+
+TEST(JsonRecordRows, RefuseAMissingListThatIsRequired) {
+    expectWrongType([] { parentOf("{}"); }, "empty", "array");
+    expectWrongType([] { parentOf(R"({"children":{}})"); }, "object", "array");
+    expectWrongType([] { parentOf(R"({"children":[1]})"); }, "integer", "object");
+    EXPECT_EQ(parentOf(R"({"children":[{"id":"a"}]})").children.at(0).id, "a");
+}
+
+TEST(JsonRecordRows, RefuseAnotherTypeWhereItIsChecked) {
+    expectWrongType([] { parentOf(R"({"children":[],"place":1.5})"); }, "float", "integer");
+    expectWrongType([] { parentOf(R"({"children":[],"place":null})"); }, "null", "integer");
+    expectWrongType([] { parentOf(R"({"children":[],"names":"x"})"); }, "string", "array");
+    EXPECT_EQ(parentOf(R"({"children":[]})").place, -1);
+    EXPECT_EQ(parentOf(R"({"children":[],"place":0})").place, 0);
+}
+
+TEST(JsonRecordRows, WriteWhatIsRequiredOrAlwaysWritten) {
+    EXPECT_EQ(written(Parent()), R"({"children":[],"always":0})");
+}
+
+TEST(JsonRecordRows, ReadByTheFunctionThatTheyName) {
+    EXPECT_EQ(parentOf(R"({"children":[],"doubled":4})").doubled, 8);
+    EXPECT_EQ(parentOf(R"({"children":[],"doubled":"4"})").doubled, 0);
+    EXPECT_EQ(parentOf(R"({"children":[]})").doubled, 0);
+}
+
+TEST(JsonRecordRows, DropTheKeysOfOthers) {
+    EXPECT_EQ(written(parentOf(R"({"children":[],"foreign":1})")), R"({"children":[],"always":0})");
+}
+
+TEST(JsonRecordRows, ClaimTheirKeysUnlessTheySayOtherwise) {
+    for (char const* claimed : {"children", "names", "place", "always", "doubled", "foreign"})
+        EXPECT_TRUE(json::claimsKey(PARENT_KEYS, claimed)) << claimed;
+    for (char const* other : {"kept", "child", "childrens", ""})
+        EXPECT_FALSE(json::claimsKey(PARENT_KEYS, other)) << other;
+}
+
+std::string described(json::KeyRow const& row) {
+    char const* const types[] = {"text",   "flag",   "int32",   "uint32",  "int64", "uint64", "bits",
+                                 "number", "record", "records", "numbers", "texts", "any"};
+    char const* const uses[] = {"lenient", "checked", "required", "dropped"};
+    return row.name + ' ' + types[static_cast<int>(row.form.type)] + ' ' + uses[static_cast<int>(row.use)] +
+           ' ' + row.missing;
+}
+
+std::vector<std::string> described(std::vector<json::KeyRow> const& rows) {
+    std::vector<std::string> texts;
+    for (json::KeyRow const& row : rows)
+        texts.push_back(described(row));
+    return texts;
+}
+
+TEST(JsonRecordDescription, TellsTypeAndUseAndDefaultOfEachRow) {
+    struct Numbers {
+        std::uint32_t small = 0;
+        long long wide = 0;
+    };
+    constexpr std::tuple NUMBERS{json::Key{"small", &Numbers::small}, json::Key{"wide", &Numbers::wide, -5},
+                                 json::Named{"elsewhere", json::KeyType::Any}};
+    constexpr std::tuple RECORD{
+        json::Required{"name", &Record::name},
+        json::Key{"title", &Record::title},
+        json::Key{"flag", &Record::flag},
+        json::Key{"number", &Record::number, 7},
+        json::Key{"width", &Record::width},
+        json::Key{"colour", &Record::colour, Colour::Red},
+        json::Key{"distance", &Record::distance, 3.0},
+        json::Key{"any", &Record::any},
+    };
+    EXPECT_THAT(
+        described(json::describeKeys(RECORD, NUMBERS)),
+        testing::ElementsAre("name text required ", "title text lenient \"\"", "flag flag lenient false",
+                             "number int32 lenient 7", "width uint64 lenient 0", "colour int32 lenient 1",
+                             "distance number lenient 3.0", "any any checked ", "small uint32 lenient 0",
+                             "wide int64 lenient -5", "elsewhere any lenient "));
+    EXPECT_THAT(described(json::describeKeys(PARENT_KEYS)),
+                testing::ElementsAre("children records required ", "names texts checked []",
+                                     "place int32 checked -1", "always int32 lenient 0",
+                                     "doubled int32 lenient 0", "kept flag lenient false",
+                                     "foreign any dropped "));
+}
+
+TEST(JsonRecordDescription, LeadsToTheKeysOfInnerRecords) {
+    json::RecordKeys const keys{json::describeKeys(PARENT_KEYS)};
+    ASSERT_TRUE(keys.find("children"));
+    EXPECT_EQ(keys.find("children")->form.record, &Child::keys());
+    EXPECT_EQ(keys.find("names")->form.record, nullptr);
+    EXPECT_EQ(keys.find("child"), nullptr);
+}
+
 } // namespace

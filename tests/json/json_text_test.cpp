@@ -194,4 +194,26 @@ TEST(JsonTextInAForeignLocale, RefusesTheEmptyHandleWithAPlainSize) {
               "JSON error: array element can not be appended. Size: 1234. New value type: empty");
 }
 
+TEST(JsonTextOfAnyValue, IsCompactJson) {
+    std::pair<json::Value, char const*> const rows[] = {
+        {{}, ""},
+        {"a\"b", R"("a\"b")"},
+        {"", R"("")"},
+        {1, "1"},
+        {3.0, "3.0"},
+        {0.1, "0.1"},
+        {true, "true"},
+        {json::Value(json_null()), "null"},
+        {json::Array(), "[]"},
+        {json::Object{{"a", 1.5}}, R"({"a":1.5})"},
+    };
+    for (auto const& [value, text] : rows)
+        EXPECT_EQ(json::toText(value), text);
+}
+
+TEST(JsonTextOfAnyValue, RefusesTextThatIsNotUtf8) {
+    EXPECT_EQ(messageOf([] { json::toText("\xff"); }),
+              "JSON error: a text that is not valid UTF-8 cannot be printed");
+}
+
 } // namespace

@@ -47,6 +47,7 @@ extern template class VLSERVICE_EXPORT Part<AppFieldIdxs, AppFields>;
 class VLSERVICE_EXPORT App : public Part<AppFieldIdxs, AppFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
 
     /// Everything is inherited but "m", which is an own 0.
     App();
@@ -57,7 +58,9 @@ public:
 
 private:
     static AppFields const FLDS_INIT;
+    static ShowCtrls const DEF_SHOW_CTRLS;
     static constexpr Rect DEF_PRN_AREA{300, 300, 20700, 29300};
+    static constexpr bool DEF_AUTO_SAVE_PRESET = true;
     static constexpr int DEF_MAX_LETTER_SHEETS = 999;
 
     void setGlobalDefs();

@@ -1,18 +1,27 @@
 #include "vlservice/cfg/departments.h"
 
+#include "vlservice/json/json_record.h"
+
 namespace Cfg {
-namespace {
 
-constexpr char const* NAME_KEY = "name";
-constexpr char const* DESCRIPTION_KEY = "descrip";
+struct Department::Keys {
+    static constexpr std::tuple TABLE{
+        json::Required{"name", &Department::name_},
+        json::Key{"descrip", &Department::description_},
+    };
+};
 
-} // namespace
+json::RecordKeys const& Department::keys() {
+    static json::RecordKeys const keys{.rows = json::describeKeys(Keys::TABLE), .mayBeText = true};
+    return keys;
+}
 
 Department Department::read(json::Value const& node) {
     if (!node.isObject())
         return {node.toString(), {}};
-    json::Object const& object = node.toObject();
-    return {object.get(NAME_KEY).toString(), object.get(DESCRIPTION_KEY).textOrEmpty()};
+    Department department;
+    json::readKeys(Keys::TABLE, node.toObject(), department);
+    return department;
 }
 
 std::string Department::valForUI() const {
@@ -22,7 +31,9 @@ std::string Department::valForUI() const {
 json::Value Department::serialize() const {
     if (description_.empty())
         return name_;
-    return json::Object{{NAME_KEY, name_}, {DESCRIPTION_KEY, description_}};
+    json::Object object;
+    json::writeKeys(Keys::TABLE, *this, object);
+    return object;
 }
 
 template class Part<DepFieldIdxs, DepFields>;
@@ -30,6 +41,11 @@ template class Part<DepFieldIdxs, DepFields>;
 std::string const Departments::PART_NAME = "deps";
 
 DepFields const Departments::FLDS_INIT{"vals"};
+
+json::RecordKeys const& Departments::keys() {
+    static json::RecordKeys const keys = keysOf(FLDS_INIT);
+    return keys;
+}
 
 Departments::Departments(json::Value const& j, bool global, bool sorted) : Part(global, FLDS_INIT) {
     deserialize(j, sorted);

@@ -28,11 +28,14 @@ public:
     /// "name = description", or the name alone when there is no description.
     std::string valForUI() const;
     json::Value serialize() const;
+    static json::RecordKeys const& keys();
     friend bool operator==(Department const&, Department const&) = default;
 
     void changeName(std::string name) { name_ = std::move(name); }
 
 private:
+    struct Keys;
+
     static Department read(json::Value const& node);
 
     std::string name_;
@@ -49,6 +52,7 @@ extern template class VLSERVICE_EXPORT Part<DepFieldIdxs, DepFields>;
 class VLSERVICE_EXPORT Departments : public Part<DepFieldIdxs, DepFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
 
     Departments(json::Value const& j, bool global, bool sorted);
 

@@ -4,6 +4,8 @@
 
 #include "vlservice/json/json.h"
 #include "vlservice/json/json_form.h"
+#include "vlservice/json/json_text.h"
+#include "vlservice/json/record_keys.h"
 
 #include <algorithm>
 #include <concepts>
@@ -29,6 +31,20 @@ struct ArrValue {
     bool inh = false;
 };
 
+// On the wire an inherited value is wrapped: {"inh": true, "v": <plain value>}.
+inline constexpr char const* INH_KEY = "inh";
+inline constexpr char const* VALUE_KEY = "v";
+
+/// An object whose "inh" is anything but true is no wrapper.
+inline bool isWrapper(json::Value const& node) {
+    return node.isObject() && node.toObject().get(INH_KEY).isTrue();
+}
+/// The plain value of a wrapper; the empty handle when there is none in it.
+inline json::Value unwrap(json::Value const& wrapper) { return wrapper.toObject().get(VALUE_KEY); }
+inline json::Value wrap(json::Value plain) {
+    return json::Object{{INH_KEY, true}, {VALUE_KEY, std::move(plain)}};
+}
+
 namespace detail {
 
 /// Element types with an order of their own are kept sorted by it where a caller asks for that.
@@ -37,19 +53,14 @@ concept Ordered = requires(T const& element) {
     { element.order() } -> std::totally_ordered;
 };
 
-// On the wire an inherited value is wrapped: {"inh": true, "v": <plain value>}.
-inline constexpr char const* INH_KEY = "inh";
-inline constexpr char const* VALUE_KEY = "v";
-
-inline bool isWrapper(json::Value const& node) {
-    return node.isObject() && node.toObject().get(INH_KEY).isTrue();
-}
-inline json::Value unwrap(json::Value const& wrapper) { return wrapper.toObject().get(VALUE_KEY); }
-inline json::Value wrap(json::Value plain) {
-    return json::Object{{INH_KEY, true}, {VALUE_KEY, std::move(plain)}};
-}
-
 } // namespace detail
+
+/// What stands in the part of the global root where nobody has set a value. Refers to an object that outlives
+/// every part.
+template<typename T>
+struct RootDefault {
+    T const& value;
+};
 
 /// A setting or a list of settings with its key; V is Value<T> or ArrValue<T>. The key is static text and is
 /// not owned. In the reading operations the empty handle stands for a missing key. What is read is stored
@@ -63,25 +74,34 @@ struct Field<T, Value<T>> {
 
     char const* key;
     Value<T> setting;
+    /// Null when the initial value counts at the root too.
+    T const* rootDefault = nullptr;
 
     Field(char const* fieldKey, Value<T> initial = {}) : key(fieldKey), setting(std::move(initial)) {}
+    Field(char const* fieldKey, RootDefault<T> atRoot) : key(fieldKey), rootDefault(&atRoot.value) {}
+
+    json::KeyRow describe() const {
+        json::Value const missing = json::Form<T>::write(rootDefault ? *rootDefault : setting.value);
+        return {key, json::Form<T>::describe(), json::KeyUse::Checked, json::toText(missing),
+                json::Inheritance::Whole};
+    }
 
     /// Plain nodes are own values, wrapped ones inherited; a missing key keeps the value and makes it
     /// inherited.
     void deserialize(json::Value const& node, bool /*sorted*/) {
         if (!node)
             setting.inh = true;
-        else if (detail::isWrapper(node))
-            setting = {JsonForm<T>::read(detail::unwrap(node)), true};
+        else if (isWrapper(node))
+            setting = {json::Form<T>::read(unwrap(node)), true};
         else
-            setting = {JsonForm<T>::read(node), false};
+            setting = {json::Form<T>::read(node), false};
     }
 
     /// Takes a parent's plain value where the own one is missing. Deliberately without a look for the
     /// wrapper: ancestors' documents are in the flat form, and a wrapper is a value of the wrong type.
     void deserializeParent(json::Value const& node, bool /*sorted*/) {
         if (setting.inh && node)
-            setting.value = JsonForm<T>::read(node);
+            setting.value = json::Form<T>::read(node);
     }
 
     void combineParent(Field const& parent) {
@@ -89,11 +109,17 @@ struct Field<T, Value<T>> {
             setting.value = parent.setting.value;
     }
 
+    /// The value stays nobody's own.
+    void takeRootDefault() {
+        if (setting.inh && rootDefault)
+            setting.value = *rootDefault;
+    }
+
     /// The empty handle when there is nothing to write.
     json::Value serialize(bool global) const {
         if (!setting.inh)
-            return JsonForm<T>::write(setting.value);
-        return global ? detail::wrap(JsonForm<T>::write(setting.value)) : json::Value();
+            return json::Form<T>::write(setting.value);
+        return global ? wrap(json::Form<T>::write(setting.value)) : json::Value();
     }
 };
 
@@ -109,6 +135,14 @@ struct Field<T, ArrValue<T>> {
     Elements elements;
 
     Field(char const* fieldKey) : key(fieldKey) {}
+
+    json::KeyRow describe() const {
+        return {key,
+                {json::KeyType::Records, json::Form<T>::describe().record},
+                json::KeyUse::Checked,
+                "[]",
+                json::Inheritance::ByElements};
+    }
 
     /// Adds to the list and never clears it. With `sorted`, elements with an order are put in front of the
     /// first one of greater order, so that equal ones keep their order of arrival.
@@ -152,12 +186,15 @@ struct Field<T, ArrValue<T>> {
         json::Array array;
         for (ArrValue<T> const& element : elements) {
             if (!element.inh)
-                array.append(JsonForm<T>::write(element.value));
+                array.append(json::Form<T>::write(element.value));
             else if (global)
-                array.append(detail::wrap(JsonForm<T>::write(element.value)));
+                array.append(wrap(json::Form<T>::write(element.value)));
         }
         return array.empty() && !global ? json::Value() : array;
     }
+
+    /// A list of the root is filled by its part.
+    void takeRootDefault() {}
 
     void addOwn(T element) {
         auto const lastOwn = std::find_if(elements.rbegin(), elements.rend(), isOwn);
@@ -195,9 +232,9 @@ private:
     }
 
     static ArrValue<T> readElement(json::Object const& node) {
-        if (detail::isWrapper(node))
-            return {JsonForm<T>::read(detail::unwrap(node).toObject()), true};
-        return {JsonForm<T>::read(node), false};
+        if (isWrapper(node))
+            return {json::Form<T>::read(unwrap(node).toObject()), true};
+        return {json::Form<T>::read(node), false};
     }
 
     /// What inserting one element after the other gives, in one walk: a greater element never goes in front

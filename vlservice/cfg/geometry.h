@@ -23,6 +23,7 @@ struct VLSERVICE_EXPORT Point {
 
     constexpr bool isZeroes() const { return *this == Point(); }
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
 
     friend constexpr bool operator==(Point const&, Point const&) = default;
 };
@@ -41,15 +42,17 @@ struct VLSERVICE_EXPORT Rect {
 
     constexpr bool isZeroes() const { return *this == Rect(); }
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
 
     friend constexpr bool operator==(Rect const&, Rect const&) = default;
 };
 
+} // namespace Cfg
+
 /// As a setting a rectangle must be there: the empty handle is refused like everything that is no object.
 template<>
-struct JsonForm<Rect> {
-    static Rect read(json::Value const& node) { return node.toObject(); }
-    static json::Value write(Rect const& rect) { return rect.serialize(); }
+struct json::Form<Cfg::Rect> {
+    static Cfg::Rect read(Value const& node) { return node.toObject(); }
+    static Value write(Cfg::Rect const& rect) { return rect.serialize(); }
+    static KeyForm describe() { return {KeyType::Record, &Cfg::Rect::keys()}; }
 };
-
-} // namespace Cfg

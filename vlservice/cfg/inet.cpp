@@ -6,12 +6,20 @@ template class Part<InetFieldIdxs, InetFields>;
 
 std::string const Inet::PART_NAME = "inet";
 
-InetFields const Inet::FLDS_INIT{
-    "help_url",           "contact_url", "status_update_hours", "submitted_alarm_hours",
-    "lodged_alarm_hours", "wizard_image"};
-
 std::string const Inet::DEF_HELP_URL = "https://help.vlservice.example/";
 std::string const Inet::DEF_CONTACT_URL = "https://vlservice.example/contact";
+
+InetFields const Inet::FLDS_INIT{{"help_url", RootDefault{DEF_HELP_URL}},
+                                 {"contact_url", RootDefault{DEF_CONTACT_URL}},
+                                 {"status_update_hours", RootDefault{DEF_STATUS_UPDATE_HOURS}},
+                                 {"submitted_alarm_hours", RootDefault{DEF_SUBMITTED_ALARM_HOURS}},
+                                 {"lodged_alarm_hours", RootDefault{DEF_LODGED_ALARM_HOURS}},
+                                 {"wizard_image"}};
+
+json::RecordKeys const& Inet::keys() {
+    static json::RecordKeys const keys = keysOf(FLDS_INIT);
+    return keys;
+}
 
 Inet::Inet(json::Value const& j, bool global, bool sorted) : Part(global, FLDS_INIT) {
     deserialize(j, sorted);
@@ -19,13 +27,6 @@ Inet::Inet(json::Value const& j, bool global, bool sorted) : Part(global, FLDS_I
         setGlobalDefs();
 }
 
-void Inet::setGlobalDefs() {
-    using enum InetFieldIdxs;
-    setDefaultIfInherited<HelpUrl>(DEF_HELP_URL);
-    setDefaultIfInherited<ContactUrl>(DEF_CONTACT_URL);
-    setDefaultIfInherited<StatusUpdateHours>(DEF_STATUS_UPDATE_HOURS);
-    setDefaultIfInherited<SubmittedAlarmHours>(DEF_SUBMITTED_ALARM_HOURS);
-    setDefaultIfInherited<LodgedAlarmHours>(DEF_LODGED_ALARM_HOURS);
-}
+void Inet::setGlobalDefs() { takeRootDefaults(); }
 
 } // namespace Cfg

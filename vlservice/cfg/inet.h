@@ -28,6 +28,7 @@ extern template class VLSERVICE_EXPORT Part<InetFieldIdxs, InetFields>;
 class VLSERVICE_EXPORT Inet : public Part<InetFieldIdxs, InetFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
     static constexpr int DEF_STATUS_UPDATE_HOURS = 2;
 
     Inet(json::Value const& j, bool global, bool sorted);

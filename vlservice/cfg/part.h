@@ -4,15 +4,20 @@
 
 #include "vlservice/cfg/field.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/record_keys.h"
 
 #include <cstddef>
 #include <tuple>
 #include <utility>
+#include <vector>
 
 namespace Cfg {
 
 /// One part of a node's settings: a plain value, used by one thread at a time. FieldIdxs names the positions
 /// in the tuple of Field<T, Value<T>> (a setting) and Field<T, ArrValue<T>> (a list).
+///
+/// Each part is one table, FLDS_INIT: a row for each key, its member by position, its default. Its static
+/// `keys()` gives the rows to those who check, show or describe settings.
 ///
 /// A node's effective settings come about along Id::allIds, from the root towards the node, by one of two
 /// routes: by combineParent with the complete part of each parent, or by deserializeParent with the JSON of
@@ -107,15 +112,19 @@ public:
 protected:
     Part(bool global, Fields const& init) : global_(global), fields_(init) {}
 
+    /// A part's class gives these out by its static keys().
+    static json::RecordKeys keysOf(Fields const& init) {
+        return {std::apply([](auto const&... field) { return std::vector{field.describe()...}; }, init)};
+    }
+
     /// A value that is nobody's own: the field stays, or becomes, inherited.
     template<FieldIdxs I>
     void setDefault(TypeAt<I> newValue) {
         at<I>().setting = {std::move(newValue), true};
     }
-    template<FieldIdxs I>
-    void setDefaultIfInherited(TypeAt<I> newValue) {
-        if (isInherited<I>())
-            setDefault<I>(std::move(newValue));
+    /// Each inherited value of the root becomes its default, also where it came from a wrapper.
+    void takeRootDefaults() {
+        forEach([](auto& field) { field.takeRootDefault(); });
     }
     /// Puts an inherited element behind all others.
     template<FieldIdxs I>

@@ -19,6 +19,7 @@ extern template class VLSERVICE_EXPORT Part<POFieldIdxs, POFields>;
 class VLSERVICE_EXPORT PO : public Part<POFieldIdxs, POFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
 
     PO(json::Value const& j, bool global, bool sorted);
 

@@ -1,21 +1,27 @@
 #include "vlservice/cfg/profiles.h"
 
+#include "vlservice/json/json_record.h"
+
 namespace Cfg {
-namespace {
 
-constexpr char const* NAME_KEY = "name";
-constexpr char const* DESCRIPTION_KEY = "descrip";
+struct Profile::Keys {
+    static constexpr std::tuple TABLE{
+        json::Required{"name", &Profile::name_},
+        json::Key{"descrip", &Profile::descr_},
+    };
+};
 
-} // namespace
-
-Profile::Profile(json::Object const& object)
-    : name_(object.get(NAME_KEY).toString()), descr_(object.get(DESCRIPTION_KEY).textOrEmpty()) {}
+Profile::Profile(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
 
 json::Object Profile::serialize() const {
-    json::Object object{{NAME_KEY, name_}};
-    if (!descr_.empty())
-        object.set(DESCRIPTION_KEY, descr_);
+    json::Object object;
+    json::writeKeys(Keys::TABLE, *this, object);
     return object;
+}
+
+json::RecordKeys const& Profile::keys() {
+    static json::RecordKeys const keys{json::describeKeys(Keys::TABLE)};
+    return keys;
 }
 
 template class Part<ProfFieldIdxs, ProfFields>;
@@ -23,6 +29,11 @@ template class Part<ProfFieldIdxs, ProfFields>;
 std::string const Profiles::PART_NAME = "profiles";
 
 ProfFields const Profiles::FLDS_INIT{"vals"};
+
+json::RecordKeys const& Profiles::keys() {
+    static json::RecordKeys const keys = keysOf(FLDS_INIT);
+    return keys;
+}
 
 Profiles::Profiles(json::Value const& j, bool global, bool sorted) : Part(global, FLDS_INIT) {
     deserialize(j, sorted);

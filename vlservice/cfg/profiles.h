@@ -22,9 +22,12 @@ public:
     std::string const& name() const { return name_; }
     std::string const& descr() const { return descr_; }
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
     friend bool operator==(Profile const&, Profile const&) = default;
 
 private:
+    struct Keys;
+
     std::string name_;
     std::string descr_;
 };
@@ -39,6 +42,7 @@ extern template class VLSERVICE_EXPORT Part<ProfFieldIdxs, ProfFields>;
 class VLSERVICE_EXPORT Profiles : public Part<ProfFieldIdxs, ProfFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
 
     Profiles(json::Value const& j, bool global, bool sorted);
 

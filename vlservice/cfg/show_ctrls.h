@@ -3,6 +3,7 @@
 
 #include "vlservice/export.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/json_form.h"
 
 #include <bitset>
 #include <cstddef>
@@ -33,3 +34,10 @@ private:
 };
 
 } // namespace Cfg
+
+template<>
+struct json::Form<Cfg::ShowCtrls> {
+    static Cfg::ShowCtrls read(Value const& node) { return node; }
+    static Value write(Cfg::ShowCtrls const& controls) { return controls.serialize(); }
+    static KeyForm describe() { return {KeyType::Numbers}; }
+};

@@ -33,6 +33,14 @@ struct ExtractField::Keys {
         json::Key{"name_is_redirect_match", &ExtractField::nameIsRedirectMatch_},
         json::Key{"postal_match", &ExtractField::postalMatch_},
     };
+    /// Read and written by the validator. What limits and a default may be depends on the type of the value.
+    static constexpr std::tuple VALIDATION{
+        json::Named{Validation::MATCH_KEY, json::KeyType::Text},
+        json::Named{Validation::TYPE_KEY, json::KeyType::Int32},
+        json::Named{Validation::MIN_KEY, json::KeyType::Any},
+        json::Named{Validation::MAX_KEY, json::KeyType::Any},
+        json::Named{Validation::DEFAULT_KEY, json::KeyType::Any},
+    };
 };
 
 /// The group's bytes, and where the whole match stands in the text.
@@ -96,6 +104,11 @@ json::Object ExtractField::serialize() const {
     if (validation_)
         validation_->serialize(object);
     return object;
+}
+
+json::RecordKeys const& ExtractField::keys() {
+    static json::RecordKeys const keys{json::describeKeys(Keys::TABLE, Keys::VALIDATION)};
+    return keys;
 }
 
 bool ExtractField::operator==(ExtractField const& other) const {

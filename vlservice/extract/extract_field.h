@@ -7,6 +7,7 @@
 #include "vlservice/extract/ignore_on_group.h"
 #include "vlservice/extract/regex_cache.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/record_keys.h"
 
 #include <cstdint>
 #include <functional>
@@ -97,6 +98,7 @@ public:
 
     /// Keys that hold their default are left out; "name" is always there. The validator's keys come last.
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
 
     /// Of the validators only their patterns are compared.
     bool operator==(ExtractField const& other) const;
@@ -227,6 +229,12 @@ public:
 
 private:
     friend class ExtractField;
+
+    static constexpr char const* TYPE_KEY = "value_type";
+    static constexpr char const* MATCH_KEY = "value_match";
+    static constexpr char const* MIN_KEY = "value_min";
+    static constexpr char const* MAX_KEY = "value_max";
+    static constexpr char const* DEFAULT_KEY = "default_value";
 
     static Validation* createImpl(json::Object const& object, ExtractField const& field);
 

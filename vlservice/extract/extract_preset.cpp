@@ -1,7 +1,6 @@
 #include "vlservice/extract/extract_preset.h"
 
 #include "vlservice/extract/regex.h"
-#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_record.h"
 
 #include <ctime>
@@ -15,14 +14,15 @@ namespace Cfg {
 static_assert(std::is_nothrow_move_constructible_v<ExtractPreset>);
 static_assert(std::is_nothrow_move_assignable_v<ExtractPreset>);
 
-using ZoneList = JsonForm<std::vector<ExtractZone>>;
+using ZoneList = json::Form<std::vector<ExtractZone>>;
 
 int ExtractPreset::MAX_ORDER = std::numeric_limits<int>::max();
 
-/// In wire order, behind "match", which is always written.
+/// In wire order.
 struct ExtractPreset::Keys {
     /// All that is left of a preset that is marked for deletion.
     static constexpr std::tuple TOMBSTONE{
+        json::Key{"match", &ExtractPreset::match_}.alwaysWritten(),
         json::Key{"order", &ExtractPreset::order_},
         json::Key{"erase_me", &ExtractPreset::eraseMe_},
     };
@@ -60,7 +60,7 @@ ExtractPreset::ExtractPreset(bool useFieldsOnly, bool skipImages, bool skipFirst
     : useFieldsOnly_(useFieldsOnly), skipImages_(skipImages), skipFirstPage_(skipFirstPage),
       zones_(std::move(zones)) {}
 
-ExtractPreset::ExtractPreset(json::Object const& object) : match_(object.get("match").textOrEmpty()) {
+ExtractPreset::ExtractPreset(json::Object const& object) {
     json::readKeys(Keys::TOMBSTONE, object, *this);
     json::readKeys(Keys::NAMES, object, *this);
     json::readKeys(Keys::SETTINGS, object, *this);
@@ -81,18 +81,23 @@ bool ExtractPreset::compareSettings(ExtractPreset const& other) const {
 }
 
 bool ExtractPreset::operator==(ExtractPreset const& other) const {
-    return json::sameKeys(Keys::NAMES, *this, other) && match_ == other.match_ && order_ == other.order_ &&
+    return json::sameKeys(Keys::NAMES, *this, other) && json::sameKeys(Keys::TOMBSTONE, *this, other) &&
            compareSettings(other);
 }
 
 json::Object ExtractPreset::serialize() const {
-    json::Object object{{"match", match_}};
+    json::Object object;
     json::writeKeys(Keys::TOMBSTONE, *this, object);
     if (eraseMe_)
         return object;
     json::writeKeys(Keys::NAMES, *this, object);
     json::writeKeys(Keys::SETTINGS, *this, object);
     return object;
+}
+
+json::RecordKeys const& ExtractPreset::keys() {
+    static json::RecordKeys const keys{json::describeKeys(Keys::TOMBSTONE, Keys::NAMES, Keys::SETTINGS)};
+    return keys;
 }
 
 void ExtractPreset::resetLastUsed() const { lastUsed_ = std::time(nullptr); }

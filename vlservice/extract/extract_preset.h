@@ -65,6 +65,7 @@ public:
     /// "match" is always there; other keys that hold their default are left out. A preset that is marked for
     /// deletion is written as "match", "order" and the mark alone.
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
 
     /// Smaller is tried first.
     int order() const { return order_; }
@@ -146,6 +147,7 @@ private:
         ExtractZones& list() const;
         bool operator==(OwnedZones const& other) const;
         json::Value serialize() const;
+        static json::KeyForm describe() { return {json::KeyType::Records, &ExtractZone::keys()}; }
 
     private:
         mutable std::shared_ptr<ExtractZones> zones_;

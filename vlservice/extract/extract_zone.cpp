@@ -1,6 +1,5 @@
 #include "vlservice/extract/extract_zone.h"
 
-#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_record.h"
 
 #include <algorithm>
@@ -8,10 +7,10 @@
 
 namespace Cfg {
 
-using Fields = JsonForm<std::vector<ExtractField>>;
-
 struct ExtractZone::Keys {
     static constexpr std::tuple TABLE{
+        json::Required{"name", &ExtractZone::name_},
+        json::Required{"fields", &ExtractZone::fields_},
         json::Key{"location", &ExtractZone::location_},
         json::Key{"most_probable_point", &ExtractZone::mostProbablePoint_},
         json::Key{"combine_blocks", &ExtractZone::combineBlocks_},
@@ -29,10 +28,7 @@ ExtractZone::ExtractZone(std::string const& name, std::vector<ExtractField> fiel
     : name_(name), fields_(std::move(fields)), location_(location), combineBlocks_(combineBlocks),
       restrictToLocation_(restrictToLocation) {}
 
-ExtractZone::ExtractZone(json::Object const& object)
-    : name_(object.get("name").toString()), fields_(Fields::read(object.get("fields").toArray())) {
-    json::readKeys(Keys::TABLE, object, *this);
-}
+ExtractZone::ExtractZone(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
 
 bool ExtractZone::hasAddress() const {
     return std::any_of(fields_.begin(), fields_.end(),
@@ -40,13 +36,18 @@ bool ExtractZone::hasAddress() const {
 }
 
 bool ExtractZone::operator==(ExtractZone const& other) const {
-    return json::sameKeys(Keys::TABLE, *this, other) && name_ == other.name_ && fields_ == other.fields_;
+    return json::sameKeys(Keys::TABLE, *this, other);
 }
 
 json::Object ExtractZone::serialize() const {
-    json::Object object{{"name", name_}, {"fields", Fields::write(fields_)}};
+    json::Object object;
     json::writeKeys(Keys::TABLE, *this, object);
     return object;
+}
+
+json::RecordKeys const& ExtractZone::keys() {
+    static json::RecordKeys const keys{json::describeKeys(Keys::TABLE)};
+    return keys;
 }
 
 } // namespace Cfg

@@ -56,6 +56,7 @@ public:
 
     /// "name" and "fields" are always there; other keys that hold their default are left out.
     json::Object serialize() const;
+    static json::RecordKeys const& keys();
 
     void setName(std::string name) { name_ = std::move(name); }
     /// Leaves the most probable point alone.

@@ -159,26 +159,26 @@ ExtractField::Validation* ExtractField::Validation::create(FieldValueType type, 
                                                            json::Value min, json::Value max,
                                                            std::string const& def,
                                                            ExtractField const& field) {
-    json::Object object{{"value_type", static_cast<std::int32_t>(type)}};
+    json::Object object{{TYPE_KEY, static_cast<std::int32_t>(type)}};
     if (!regex.empty())
-        object.set("value_match", regex);
-    setIfAny(object, "value_min", std::move(min));
-    setIfAny(object, "value_max", std::move(max));
+        object.set(MATCH_KEY, regex);
+    setIfAny(object, MIN_KEY, std::move(min));
+    setIfAny(object, MAX_KEY, std::move(max));
     if (!def.empty())
-        object.set("default_value", def);
+        object.set(DEFAULT_KEY, def);
     return createImpl(object, field);
 }
 
 ExtractField::Validation* ExtractField::Validation::create(json::Value const& def,
                                                            ExtractField const& field) {
-    return createImpl(json::Object{{"default_value", def}}, field);
+    return createImpl(json::Object{{DEFAULT_KEY, def}}, field);
 }
 
 ExtractField::Validation* ExtractField::Validation::createImpl(json::Object const& object,
                                                                ExtractField const& field) {
     auto const kind = field.mark() == LetterSeparatorMark::SingleLetter
                           ? FieldValueType::Integer
-                          : static_cast<FieldValueType>(object.get("value_type").intOrZero());
+                          : static_cast<FieldValueType>(object.get(TYPE_KEY).intOrZero());
     switch (kind) {
     case FieldValueType::Integer:
         return new ValidateNum<long long>(object, field);
@@ -193,7 +193,7 @@ ExtractField::Validation* ExtractField::Validation::createImpl(json::Object cons
 }
 
 ExtractField::Validation::Validation(json::Object const& object)
-    : strRegex_(object.get("value_match").textOrEmpty()) {}
+    : strRegex_(object.get(MATCH_KEY).textOrEmpty()) {}
 
 ExtractField::Validation::Validation(Validation const& other)
     : defaultValue_(other.defaultValue_ ? std::make_shared<ExtractedField>(*other.defaultValue_) : nullptr),
@@ -213,15 +213,15 @@ json::Value ExtractField::Validation::maxVal() const { return {}; }
 
 void ExtractField::Validation::serialize(json::Object& object) const {
     if (defaultValue_)
-        object.set("default_value", defaultValue_->rawValue());
+        object.set(DEFAULT_KEY, defaultValue_->rawValue());
 }
 
 void ExtractField::Validation::serializeTyped(json::Object& object, char const* defaultPattern) const {
     if (strRegex_ != defaultPattern)
-        object.set("value_match", strRegex_);
-    object.set("value_type", static_cast<std::int32_t>(valueType()));
-    setIfAny(object, "value_min", minVal());
-    setIfAny(object, "value_max", maxVal());
+        object.set(MATCH_KEY, strRegex_);
+    object.set(TYPE_KEY, static_cast<std::int32_t>(valueType()));
+    setIfAny(object, MIN_KEY, minVal());
+    setIfAny(object, MAX_KEY, maxVal());
 }
 
 void ExtractField::Validation::validate(ExtractedField& value) const {
@@ -247,7 +247,7 @@ void ExtractField::Validation::setDefault(json::Value const& value, ExtractedFie
 
 ExtractField::ValidateString::ValidateString(json::Object const& object, ExtractField const& field)
     : Validation(object) {
-    auto const def = object.get("default_value");
+    auto const def = object.get(DEFAULT_KEY);
     if (!def.textOrEmpty().empty())
         setDefault(def, ExtractedField::ValueType::Plain, field);
 }
@@ -258,7 +258,7 @@ ExtractField::Validation* ExtractField::ValidateString::clone() const { return n
 
 void ExtractField::ValidateString::serialize(json::Object& object) const {
     if (!strRegex_.empty())
-        object.set("value_match", strRegex_);
+        object.set(MATCH_KEY, strRegex_);
     Validation::serialize(object);
 }
 
@@ -267,9 +267,9 @@ ExtractField::ValidateNum<T>::ValidateNum(json::Object const& object, ExtractFie
     : Validation(object) {
     if (strRegex_.empty())
         strRegex_ = DEFAULT_PATTERN<T>;
-    min_ = numberFrom<T>(object.get("value_min")).value_or(min_);
-    max_ = numberFrom<T>(object.get("value_max")).value_or(max_);
-    auto const def = numberFrom<T>(object.get("default_value"));
+    min_ = numberFrom<T>(object.get(MIN_KEY)).value_or(min_);
+    max_ = numberFrom<T>(object.get(MAX_KEY)).value_or(max_);
+    auto const def = numberFrom<T>(object.get(DEFAULT_KEY));
     if (def && *def != UNREADABLE<T>)
         setDefault(*def, ExtractedField::ValueType::Plain, field);
 }
@@ -318,9 +318,9 @@ ExtractField::ValidateDate::ValidateDate(json::Object const& object, ExtractFiel
     : Validation(object) {
     if (strRegex_.empty())
         strRegex_ = DATE_PATTERN;
-    min_ = dateFrom(object.get("value_min")).value_or(min_);
-    max_ = dateFrom(object.get("value_max")).value_or(max_);
-    auto const def = dateFrom(object.get("default_value"));
+    min_ = dateFrom(object.get(MIN_KEY)).value_or(min_);
+    max_ = dateFrom(object.get(MAX_KEY)).value_or(max_);
+    auto const def = dateFrom(object.get(DEFAULT_KEY));
     if (def && *def != UNREADABLE<long long>)
         setDefault(*def, ExtractedField::ValueType::Time, field);
 }

@@ -1,67 +1,105 @@
 #pragma once
 // Records as tables: each row binds a JSON key to a member and to the value that stands for a missing key.
-// The one reader and the one writer below walk the rows in wire order, so a new key is a new row.
+// The one reader, the one writer and the one description below walk the rows in wire order, so a new key is a
+// new row.
 //
 //     struct Person::Keys {
 //         static constexpr std::tuple TABLE{
 //             json::Required{"name", &Person::name_},
 //             json::Key{"colour", &Person::colour_, Colour::Red},
 //             json::Key{"age", &Person::age_},
+//             json::Dropped{"id"},
 //         };
 //     };
 
 #include "vlservice/json/json.h"
 #include "vlservice/json/json_form.h"
+#include "vlservice/json/json_text.h"
+#include "vlservice/json/record_keys.h"
 
 #include <concepts>
 #include <string>
+#include <string_view>
 #include <tuple>
 #include <type_traits>
 #include <utility>
+#include <vector>
 
 namespace json {
 
-/// Whether a node is read where a T is wanted. Anything else stands for a missing key, but a type with a form
-/// of its own reads whatever is there, and may refuse it.
+/// Whether a missing key's default may stand for a value of another type.
 template<typename T>
-bool passesFor(Value const& node) {
-    if constexpr (std::same_as<T, bool>)
-        return node.isTrue();
-    else if constexpr (std::integral<T> || std::is_enum_v<T>)
-        return node.isInt();
-    else if constexpr (std::floating_point<T>)
-        return node.isInt() || node.isReal();
-    else if constexpr (std::same_as<T, std::string>)
-        return node.isString();
-    else
-        return static_cast<bool>(node);
-}
+concept Lenient = requires(Value const& node) {
+    { Form<T>::fits(node) } -> std::same_as<bool>;
+};
 
 /// The default of a row that names none: the member's zero value.
 struct Zero {};
 
-/// A row for a key that may be missing. A T stands there in the form of Cfg::JsonForm; a member that equals
-/// the default is not written.
+/// A row for a key that may be missing. A T stands there in its Form; a member that equals the default is not
+/// written. What is of another type reads as the default where the form is Lenient, and is refused otherwise.
 template<typename Record, typename T, typename Missing = Zero>
 class Key {
 public:
     constexpr Key(char const* name, T Record::*member, Missing missing = {})
         : name_(name), member_(member), missing_(missing) {}
 
+    // Rows with a rule of their own.
+
+    /// Another type is refused although the form is lenient.
+    constexpr Key checked() const { return with(&Key::isChecked_); }
+    constexpr Key alwaysWritten() const { return with(&Key::isAlwaysWritten_); }
+    /// A record that keeps keys it does not know keeps this one among them too.
+    constexpr Key notClaimed() const { return with(&Key::isNotClaimed_); }
+    /// What stands there is read by this function.
+    constexpr Key readBy(T (*reader)(Value const&)) const {
+        Key row = *this;
+        row.read_ = reader;
+        return row;
+    }
+
     void read(Object const& from, Record& into) const {
         Value const node = from.get(name_);
-        into.*member_ = passesFor<T>(node) ? Cfg::JsonForm<T>::read(node) : missing();
+        into.*member_ = stands(node) ? read_(node) : missing();
     }
     void write(Record const& from, Object& into) const {
-        if (from.*member_ == missing())
+        if (!isAlwaysWritten_ && from.*member_ == missing())
             return;
         // A real without a JSON form gives the empty handle, which is nothing to write.
-        if (Value value = Cfg::JsonForm<T>::write(from.*member_))
+        if (Value value = Form<T>::write(from.*member_))
             into.set(name_, std::move(value));
     }
-    bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
+    bool same(Record const& a, Record const& b) const {
+        if constexpr (requires { Form<T>::same(a.*member_, b.*member_); })
+            return Form<T>::same(a.*member_, b.*member_);
+        else
+            return a.*member_ == b.*member_;
+    }
+    bool claims(std::string_view key) const { return !isNotClaimed_ && key == name_; }
+    KeyRow describe() const {
+        KeyUse const use = Lenient<T> && !isChecked_ ? KeyUse::Lenient : KeyUse::Checked;
+        return {name_, Form<T>::describe(), use, toText(Form<T>::write(missing()))};
+    }
 
 private:
+    constexpr Key with(bool Key::*rule) const {
+        Key row = *this;
+        row.*rule = true;
+        return row;
+    }
+    static constexpr auto formsReader() -> T (*)(Value const&) {
+        if constexpr (requires { &Form<T>::read; })
+            return &Form<T>::read;
+        else
+            return nullptr;
+    }
+    bool stands(Value const& node) const {
+        if constexpr (Lenient<T>) {
+            if (!isChecked_)
+                return Form<T>::fits(node);
+        }
+        return static_cast<bool>(node);
+    }
     constexpr T missing() const {
         if constexpr (std::same_as<Missing, Zero>)
             return T{};
@@ -72,21 +110,65 @@ private:
     char const* name_;
     T Record::*member_;
     Missing missing_;
+    T (*read_)(Value const&) = formsReader();
+    bool isChecked_ = false;
+    bool isAlwaysWritten_ = false;
+    bool isNotClaimed_ = false;
 };
 
-/// A row for the text that identifies the record: anything but a string throws Exc, and it is always written.
-template<typename Record>
+/// A row for what the record cannot be without, a text or a list: a missing key throws Exc as another type
+/// does, and it is always written.
+template<typename Record, typename T>
 class Required {
 public:
-    constexpr Required(char const* name, std::string Record::*member) : name_(name), member_(member) {}
+    constexpr Required(char const* name, T Record::*member) : name_(name), member_(member) {}
 
-    void read(Object const& from, Record& into) const { into.*member_ = from.get(name_).toString(); }
-    void write(Record const& from, Object& into) const { into.set(name_, from.*member_); }
+    void read(Object const& from, Record& into) const {
+        Value const node = from.get(name_);
+        if constexpr (!std::same_as<T, std::string>)
+            node.toArray();
+        into.*member_ = Form<T>::read(node);
+    }
+    void write(Record const& from, Object& into) const { into.set(name_, Form<T>::write(from.*member_)); }
     bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
+    bool claims(std::string_view key) const { return key == name_; }
+    KeyRow describe() const { return {name_, Form<T>::describe(), KeyUse::Required}; }
 
 private:
     char const* name_;
-    std::string Record::*member_;
+    T Record::*member_;
+};
+
+/// A row for a key of other programs: it is not read, and not kept among keys that the record does not know.
+class Dropped {
+public:
+    constexpr explicit Dropped(char const* name) : name_(name) {}
+
+    template<typename Record>
+    void read(Object const&, Record&) const {}
+    template<typename Record>
+    void write(Record const&, Object&) const {}
+    template<typename Record>
+    bool same(Record const&, Record const&) const {
+        return true;
+    }
+    bool claims(std::string_view key) const { return key == name_; }
+    KeyRow describe() const { return {name_, {KeyType::Any}, KeyUse::Dropped}; }
+
+private:
+    char const* name_;
+};
+
+/// A row for a key that is read and written by hand: it describes the key and no more.
+class Named {
+public:
+    constexpr Named(char const* name, KeyType type) : name_(name), type_(type) {}
+
+    KeyRow describe() const { return {name_, {type_}}; }
+
+private:
+    char const* name_;
+    KeyType type_;
 };
 
 /// Fills the members of `into` row by row, so a failure is that of the first bad row.
@@ -105,6 +187,21 @@ void writeKeys(std::tuple<Rows...> const& table, Record const& from, Object& int
 template<typename Record, typename... Rows>
 bool sameKeys(std::tuple<Rows...> const& table, Record const& a, Record const& b) {
     return std::apply([&](auto const&... rows) { return (rows.same(a, b) && ...); }, table);
+}
+
+/// Whether the key is one of the table's own, and so none of those that the record does not know.
+template<typename... Rows>
+bool claimsKey(std::tuple<Rows...> const& table, std::string_view key) {
+    return std::apply([&](auto const&... rows) { return (rows.claims(key) || ...); }, table);
+}
+
+/// The rows of several tables, one behind the other.
+template<typename... Tables>
+std::vector<KeyRow> describeKeys(Tables const&... tables) {
+    std::vector<KeyRow> described;
+    std::apply([&](auto const&... rows) { (described.push_back(rows.describe()), ...); },
+               std::tuple_cat(tables...));
+    return described;
 }
 
 } // namespace json

@@ -43,14 +43,20 @@ int prepare(Value const& value) {
     return digits;
 }
 
+using CText = std::unique_ptr<char, decltype(&std::free)>;
+
+CText compact(Value const& value) {
+    std::size_t const flags = JSON_COMPACT | JSON_ENCODE_ANY | JSON_REAL_PRECISION(prepare(value));
+    CText text(json_dumps(value.node(), flags), std::free);
+    if (!text)
+        throw Exc("JSON error: a text that is not valid UTF-8 cannot be printed");
+    return text;
+}
+
 std::ostream& print(std::ostream& out, Value const& container) {
     if (!container)
         throw Exc("JSON error: an empty handle cannot be printed");
-    std::size_t const flags = JSON_COMPACT | JSON_REAL_PRECISION(prepare(container));
-    std::unique_ptr<char, decltype(&std::free)> const text(json_dumps(container.node(), flags), std::free);
-    if (!text)
-        throw Exc("JSON error: a text that is not valid UTF-8 cannot be printed");
-    return out << text.get();
+    return out << compact(container).get();
 }
 
 /// Numbers for people do not follow the stream's or the process's locale.
@@ -103,5 +109,7 @@ std::ostream& operator<<(std::ostream& out, Value const& value) {
     }
     return out << "null";
 }
+
+std::string toText(Value const& value) { return value ? compact(value).get() : std::string(); }
 
 } // namespace json

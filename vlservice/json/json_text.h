@@ -6,6 +6,7 @@
 
 #include <cstddef>
 #include <iosfwd>
+#include <string>
 
 namespace json {
 
@@ -22,5 +23,8 @@ VLSERVICE_EXPORT std::ostream& operator<<(std::ostream& out, Array const& array)
 /// The form for people: "#absent#" for the empty handle, a string in double quotes as it stands, numbers in
 /// the default format of a stream with the classic locale, objects and arrays as above.
 VLSERVICE_EXPORT std::ostream& operator<<(std::ostream& out, Value const& value);
+
+/// Any value as compact JSON text; the empty text for the empty handle. Throws Exc as the operators above do.
+VLSERVICE_EXPORT std::string toText(Value const& value);
 
 } // namespace json

@@ -1,23 +1,22 @@
+#include "vlservice/json/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 #include "vlservice/presets/pack_preset.h"
 
-#include <algorithm>
-#include <array>
 #include <string_view>
+#include <tuple>
 
 namespace Cfg {
 namespace {
 
-constexpr char const* ID = "id";
-constexpr char const* PREFERRED_POS = "preferred_pos";
+using Attachment = PackPreset::Attachment;
 
-/// The last three are other programs' keys: they are dropped.
-constexpr std::array<std::string_view, 5> RESERVED{ID, PREFERRED_POS, "pdf_file_name", "doc_name",
-                                                   "is_letter"};
-
-bool isReserved(std::string_view key) {
-    return std::find(RESERVED.begin(), RESERVED.end(), key) != RESERVED.end();
-}
+constexpr std::tuple TABLE{
+    json::Required{"id", &Attachment::id},
+    json::Key{"preferred_pos", &Attachment::preferredPos, Attachment::NO_PREFERRED_POS}.checked(),
+    json::Dropped{"pdf_file_name"},
+    json::Dropped{"doc_name"},
+    json::Dropped{"is_letter"},
+};
 
 } // namespace
 
@@ -30,20 +29,23 @@ PackPreset::Attachment::Attachment(json::Value const& value) {
         return;
     }
     json::Object const& object = value.toObject();
-    id = object.get(ID).toString();
-    if (json::Value const position = object.get(PREFERRED_POS))
-        preferredPos = static_cast<int>(position.toInt());
-    additional = additionalKeys(object, isReserved);
+    json::readKeys(TABLE, object, *this);
+    additional = additionalKeys(object, [](std::string_view key) { return json::claimsKey(TABLE, key); });
 }
 
 json::Value PackPreset::Attachment::serialize() const {
     if (preferredPos == NO_PREFERRED_POS && !additional)
         return id;
-    json::Object object{{ID, id}};
-    if (preferredPos != NO_PREFERRED_POS)
-        object.set(PREFERRED_POS, preferredPos);
+    json::Object object;
+    json::writeKeys(TABLE, *this, object);
     addKeys(additional, object);
     return object;
+}
+
+json::RecordKeys const& PackPreset::Attachment::keys() {
+    static json::RecordKeys const keys{
+        .rows = json::describeKeys(TABLE), .keepsOthers = true, .mayBeText = true};
+    return keys;
 }
 
 } // namespace Cfg

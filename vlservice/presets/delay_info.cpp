@@ -1,28 +1,27 @@
-#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_record.h"
 #include "vlservice/presets/pack_preset.h"
 
 #include <tuple>
 
-namespace Cfg {
-
 /// Strict, unlike plain numbers: a delay that cannot be read must not become none.
 template<>
-struct JsonForm<std::set<int>> {
-    static std::set<int> read(json::Value const& node) { return PackPreset::DelayInfo::jArrToInts(node); }
-    static json::Value write(std::set<int> const& numbers) {
-        json::Array array;
+struct json::Form<std::set<int>> {
+    static std::set<int> read(Value const& node) { return Cfg::PackPreset::DelayInfo::jArrToInts(node); }
+    static Value write(std::set<int> const& numbers) {
+        Array array;
         for (int const number : numbers)
             array.append(number);
         return array;
     }
+    static KeyForm describe() { return {KeyType::Numbers}; }
 };
 
+namespace Cfg {
 namespace {
 
 using DelayInfo = PackPreset::DelayInfo;
 
-constexpr std::tuple KEYS{
+constexpr std::tuple TABLE{
     json::Key{"count", &DelayInfo::count},
     json::Key{"week_days", &DelayInfo::weekDays},
     json::Key{"month_days", &DelayInfo::monthDays},
@@ -31,12 +30,17 @@ constexpr std::tuple KEYS{
 
 } // namespace
 
-PackPreset::DelayInfo::DelayInfo(json::Object const& object) { json::readKeys(KEYS, object, *this); }
+PackPreset::DelayInfo::DelayInfo(json::Object const& object) { json::readKeys(TABLE, object, *this); }
 
 json::Object PackPreset::DelayInfo::serialize() const {
     json::Object object;
-    json::writeKeys(KEYS, *this, object);
+    json::writeKeys(TABLE, *this, object);
     return object;
+}
+
+json::RecordKeys const& PackPreset::DelayInfo::keys() {
+    static json::RecordKeys const keys{json::describeKeys(TABLE)};
+    return keys;
 }
 
 std::set<int> PackPreset::DelayInfo::jArrToInts(json::Value const& value) {

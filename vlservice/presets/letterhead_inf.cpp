@@ -1,11 +1,8 @@
 #include "vlservice/presets/letterhead_inf.h"
 
-#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 
-#include <algorithm>
-#include <array>
 #include <string_view>
 #include <tuple>
 #include <utility>
@@ -13,35 +10,20 @@
 namespace Cfg {
 namespace {
 
-using Texts = JsonForm<std::vector<std::string>>;
-
-constexpr std::tuple KEYS{
-    json::Required{"id", &LetterheadInf::id},
+constexpr std::tuple ID{json::Required{"id", &LetterheadInf::id}};
+/// What makes an object of the letterhead when it is written.
+constexpr std::tuple FLAGS{
     json::Key{"skip_letters", &LetterheadInf::skipLetters},
     json::Key{"skip_attachments", &LetterheadInf::skipAttachments},
     json::Key{"repeat_last_page", &LetterheadInf::repeatLastPage},
     json::Key{"apply_first_grouped_only", &LetterheadInf::applyFirstGroupedOnly},
     json::Key{"on_top", &LetterheadInf::onTop},
 };
+constexpr std::tuple LIST{json::Key{"which_attachments", &LetterheadInf::whichAttachments}};
+/// Names of files are other programs' affair.
+constexpr std::tuple DROPPED{json::Dropped{"file_name"}, json::Dropped{"pdf_file_name"}};
 
-constexpr char const* WHICH_ATTACHMENTS = "which_attachments";
-
-/// The names of files are other programs' keys: they are dropped.
-constexpr std::array<std::string_view, 9> RESERVED{
-    "id",
-    "file_name",
-    "pdf_file_name",
-    "skip_letters",
-    "skip_attachments",
-    WHICH_ATTACHMENTS,
-    "repeat_last_page",
-    "apply_first_grouped_only",
-    "on_top",
-};
-
-bool isReserved(std::string_view key) {
-    return std::find(RESERVED.begin(), RESERVED.end(), key) != RESERVED.end();
-}
+constexpr auto TABLE = std::tuple_cat(ID, FLAGS, LIST, DROPPED);
 
 } // namespace
 
@@ -56,29 +38,27 @@ LetterheadInf::LetterheadInf(json::Value const& value) {
         return;
     }
     json::Object const& object = value.toObject();
-    json::readKeys(KEYS, object, *this);
-    whichAttachments = Texts::read(object.get(WHICH_ATTACHMENTS));
-    additional = additionalKeys(object, isReserved);
+    json::readKeys(TABLE, object, *this);
+    additional = additionalKeys(object, [](std::string_view key) { return json::claimsKey(TABLE, key); });
 }
 
 json::Value LetterheadInf::serialize() const {
-    json::Object object;
-    json::writeKeys(KEYS, *this, object);
-    bool const hasFlags = object.size() > 1;
-    if (!hasFlags)
+    if (json::sameKeys(FLAGS, *this, LetterheadInf()))
         return id;
-    if (!whichAttachments.empty())
-        object.set(WHICH_ATTACHMENTS, Texts::write(whichAttachments));
+    json::Object object;
+    json::writeKeys(TABLE, *this, object);
     addKeys(additional, object);
     return object;
 }
 
+json::RecordKeys const& LetterheadInf::keys() {
+    static json::RecordKeys const keys{
+        .rows = json::describeKeys(TABLE), .keepsOthers = true, .mayBeText = true};
+    return keys;
+}
+
 bool LetterheadInf::operator==(LetterheadInf const& other) const {
-    auto const compared = [](LetterheadInf const& l) {
-        return std::tie(l.skipLetters, l.skipAttachments, l.whichAttachments, l.repeatLastPage,
-                        l.applyFirstGroupedOnly, l.onTop, l.id);
-    };
-    return compared(*this) == compared(other);
+    return json::sameKeys(TABLE, *this, other);
 }
 
 } // namespace Cfg

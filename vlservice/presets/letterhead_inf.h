@@ -3,6 +3,7 @@
 
 #include "vlservice/export.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/record_keys.h"
 
 #include <string>
 #include <vector>
@@ -24,6 +25,7 @@ struct VLSERVICE_EXPORT LetterheadInf {
     /// An object when one of the flags is set, otherwise the id as a string.
     /// Deliberate: the string form drops `whichAttachments` and `additional`.
     json::Value serialize() const;
+    static json::RecordKeys const& keys();
 
     /// `additional` is not compared.
     bool operator==(LetterheadInf const& other) const;

@@ -1,68 +1,14 @@
 #include "vlservice/presets/pack_preset.h"
 
-#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_record.h"
 #include "vlservice/presets/additional_keys.h"
 
-#include <algorithm>
-#include <array>
 #include <concepts>
 #include <ctime>
 #include <stdexcept>
-#include <string_view>
 #include <tuple>
 
-namespace Cfg {
-
-/// Words of flag bits: what is no integer reads as 0, and they are written unsigned.
-template<typename T>
-requires std::same_as<T, ProcessMode> || std::same_as<T, ProcessModeClient>
-struct JsonForm<T> {
-    static T read(json::Value const& node) { return T(static_cast<std::uint32_t>(node.intOrZero())); }
-    static json::Value write(T mode) { return mode.bits(); }
-};
-
-std::string const PackPreset::NAME_FLD_NAME = "name";
-std::string const PackPreset::PROC_MODE_FLD_NAME = "process_mode";
-
 namespace {
-
-constexpr char const* EMBEDDED_NAME = "pack_preset";
-constexpr char const* DELAY = "delay";
-constexpr char const* ATTACHMENTS = "attachments";
-constexpr char const* LETTERHEADS = "letterheads";
-
-/// Keys that never become additional ones. Some are read by nobody here; they belong to the object around an
-/// embedded preset and are dropped. Missing on purpose: "lock_pack_ui" and "pack_preset", which stay among
-/// the additional keys.
-constexpr std::array<std::string_view, 26> RESERVED{
-    "name",
-    "title",
-    "colour_model",
-    "department",
-    "duplex",
-    "orientation",
-    "no_group",
-    "process_mode",
-    "process_mode_client",
-    "profile",
-    "priority_delivery",
-    "purchase_order",
-    "confirmation_email",
-    "customer_email",
-    ATTACHMENTS,
-    "add_docs",
-    LETTERHEADS,
-    DELAY,
-    "account",
-    "user",
-    "_id",
-    "draft",
-    "version",
-    "covert",
-    "erase_me",
-    "last_used",
-};
 
 constexpr std::uint32_t MODE_WIDTH = 0xFF;
 /// Two bits that exclude each other.
@@ -75,75 +21,126 @@ bool isPlausible(std::uint32_t bits, std::uint32_t required) {
     return bits <= MODE_WIDTH && (bits == 0 || (bits & required) != 0);
 }
 
-void check(ProcessMode mode, ProcessModeClient clientMode) {
+bool mayStand(Cfg::ProcessMode mode) {
     bool const excludesItself = (mode.bits() & MODE_EXCLUSIVE) == MODE_EXCLUSIVE;
-    if (excludesItself || !isPlausible(mode.bits(), MODE_REQUIRED) ||
-        !isPlausible(clientMode.bits(), CLIENT_MODE_REQUIRED))
-        throw std::runtime_error("Invalid value for process_mode!");
+    return !excludesItself && isPlausible(mode.bits(), MODE_REQUIRED);
 }
+
+bool mayStand(Cfg::ProcessModeClient mode) { return isPlausible(mode.bits(), CLIENT_MODE_REQUIRED); }
 
 } // namespace
 
+namespace json {
+
+/// Words of flag bits: what is no integer reads as 0, and they are written unsigned.
+template<typename T>
+requires std::same_as<T, Cfg::ProcessMode> || std::same_as<T, Cfg::ProcessModeClient>
+struct Form<T> {
+    static bool fits(Value const& node) { return node.isInt(); }
+    static T read(Value const& node) {
+        T const mode(static_cast<std::uint32_t>(node.toInt()));
+        if (!mayStand(mode))
+            throw std::runtime_error("Invalid value for process_mode!");
+        return mode;
+    }
+    static Value write(T mode) { return mode.bits(); }
+    static KeyForm describe() { return {KeyType::Bits}; }
+};
+
+/// A record that may be missing. Copies of a preset share it; it is compared by what it says.
+template<>
+struct Form<std::shared_ptr<Cfg::PackPreset::DelayInfo const>> {
+    using Delay = Cfg::PackPreset::DelayInfo;
+    using Shared = std::shared_ptr<Delay const>;
+
+    static Value write(Shared const& delay) { return delay ? Value(delay->serialize()) : Value(); }
+    static bool same(Shared const& a, Shared const& b) { return a && b ? *a == *b : a == b; }
+    static KeyForm describe() { return {KeyType::Record, &Delay::keys()}; }
+};
+
+} // namespace json
+
+namespace Cfg {
+namespace {
+
+constexpr char const* NAME = "name";
+constexpr char const* PROCESS_MODE = "process_mode";
+
+} // namespace
+
+std::string const PackPreset::NAME_FLD_NAME = NAME;
+std::string const PackPreset::PROC_MODE_FLD_NAME = PROCESS_MODE;
+
+/// In wire order, which is also the order of reading: it decides which failure a bad object reports.
 struct PackPreset::Keys {
-    static constexpr std::tuple TABLE{
+    static constexpr json::Required CONFIGURED_NAME{NAME, &PackPreset::name_};
+    /// Of the embedded form. Deliberately no row of the table, so not claimed: whoever reads that form names
+    /// it among the further keys or gets it back among the additional ones.
+    static constexpr json::Required EMBEDDED_NAME{"pack_preset", &PackPreset::name_};
+    static constexpr std::tuple PRODUCTION{
         json::Key{"title", &PackPreset::title_},
         json::Key{"colour_model", &PackPreset::colorModel_},
         json::Key{"duplex", &PackPreset::duplex_},
         json::Key{"orientation", &PackPreset::orientation_},
         json::Key{"department", &PackPreset::department_},
         json::Key{"no_group", &PackPreset::noGroup_},
-        json::Key{"process_mode", &PackPreset::processMode_},
+        json::Key{PROCESS_MODE, &PackPreset::processMode_},
         json::Key{"process_mode_client", &PackPreset::processModeClient_},
         json::Key{"profile", &PackPreset::profile_},
         json::Key{"priority_delivery", &PackPreset::priorityDelivery_},
         json::Key{"confirmation_email", &PackPreset::confirmReceipt_},
         json::Key{"customer_email", &PackPreset::userEmailOverride_},
-        json::Key{"lock_pack_ui", &PackPreset::lockPackUI_},
-        json::Key{"last_used", &PackPreset::lastUsed_},
+        // Deliberately not claimed: stored presets hold it among the additional keys too, and on writing that
+        // one wins over the field.
+        json::Key{"lock_pack_ui", &PackPreset::lockPackUI_}.notClaimed(),
     };
-    /// Stands apart: it is written in the shortened form only.
-    static constexpr json::Key ERASE_ME{"erase_me", &PackPreset::eraseMe_};
+    static constexpr std::tuple LAST_USED{json::Key{"last_used", &PackPreset::lastUsed_}};
+    static constexpr std::tuple LISTS{
+        json::Key{"delay", &PackPreset::delay_}.readBy(&PackPreset::j2pDelayInf),
+        json::Key{"attachments", &PackPreset::attachments_}.readBy(&PackPreset::j2Attachments),
+        json::Key{"letterheads", &PackPreset::letterheads_}.readBy(&PackPreset::j2ltrheads),
+    };
+    /// Written in the shortened form only.
+    static constexpr std::tuple ERASE_ME{json::Key{"erase_me", &PackPreset::eraseMe_}};
+    /// They belong to the object around an embedded preset.
+    static constexpr std::tuple DROPPED{
+        json::Dropped{"purchase_order"}, json::Dropped{"add_docs"}, json::Dropped{"account"},
+        json::Dropped{"user"},           json::Dropped{"_id"},      json::Dropped{"draft"},
+        json::Dropped{"version"},        json::Dropped{"covert"},
+    };
+
+    /// Behind the name.
+    static constexpr auto WRITTEN = std::tuple_cat(PRODUCTION, LAST_USED, LISTS);
+    static constexpr auto ALL = std::tuple_cat(std::tuple{CONFIGURED_NAME}, WRITTEN, ERASE_ME, DROPPED);
 };
 
-// The order decides which failure a bad object reports: the name, then the process modes, then the lists.
 PackPreset::PackPreset(json::Object const& obj, std::unordered_set<std::string> const& extraFields) {
-    name_ = obj.get(extraFields.empty() ? NAME_FLD_NAME.c_str() : EMBEDDED_NAME).toString();
-    json::readKeys(Keys::TABLE, obj, *this);
-    check(processMode_, processModeClient_);
-    delay_ = j2pDelayInf(obj.get(DELAY));
-    attachments_ = j2Attachments(obj.get(ATTACHMENTS));
-    letterheads_ = j2ltrheads(obj.get(LETTERHEADS));
+    (extraFields.empty() ? Keys::CONFIGURED_NAME : Keys::EMBEDDED_NAME).read(obj, *this);
+    json::readKeys(Keys::WRITTEN, obj, *this);
+    json::readKeys(Keys::ERASE_ME, obj, *this);
     additional_ = j2jAddFields(obj, extraFields);
-    Keys::ERASE_ME.read(obj, *this);
 }
 
 json::Object PackPreset::serialize(bool embedded) const {
     json::Object object;
-    object.set(embedded ? EMBEDDED_NAME : NAME_FLD_NAME.c_str(), name_);
+    (embedded ? Keys::EMBEDDED_NAME : Keys::CONFIGURED_NAME).write(*this, object);
     if (eraseMe_ && !embedded) {
-        Keys::ERASE_ME.write(*this, object);
+        json::writeKeys(Keys::ERASE_ME, *this, object);
         return object;
     }
-    json::writeKeys(Keys::TABLE, *this, object);
-    if (delay_)
-        object.set(DELAY, delay_->serialize());
-    if (!attachments_.empty())
-        object.set(ATTACHMENTS, JsonForm<std::vector<Attachment>>::write(attachments_));
-    if (!letterheads_.empty())
-        object.set(LETTERHEADS, JsonForm<std::vector<LetterheadInf>>::write(letterheads_));
+    json::writeKeys(Keys::WRITTEN, *this, object);
     addKeys(additional_, object);
     return object;
 }
 
+json::RecordKeys const& PackPreset::keys() {
+    static json::RecordKeys const keys{.rows = json::describeKeys(Keys::ALL), .keepsOthers = true};
+    return keys;
+}
+
 bool PackPreset::compareSettings(PackPreset const& other) const {
-    auto const compared = [](PackPreset const& p) {
-        return std::tie(p.colorModel_, p.duplex_, p.orientation_, p.noGroup_, p.processMode_,
-                        p.processModeClient_, p.priorityDelivery_, p.confirmReceipt_, p.lockPackUI_, p.title_,
-                        p.department_, p.profile_, p.userEmailOverride_, p.attachments_, p.letterheads_,
-                        p.additional_, p.eraseMe_);
-    };
-    auto const sameDelay = [](DelayInfo const* a, DelayInfo const* b) { return a && b ? *a == *b : a == b; };
-    return compared(*this) == compared(other) && sameDelay(pDelayInfo(), other.pDelayInfo());
+    return json::sameKeys(Keys::PRODUCTION, *this, other) && json::sameKeys(Keys::LISTS, *this, other) &&
+           json::sameKeys(Keys::ERASE_ME, *this, other) && additional_ == other.additional_;
 }
 
 bool PackPreset::operator==(PackPreset const& other) const {
@@ -162,8 +159,7 @@ void PackPreset::resetLastUsed() { lastUsed_ = std::time(nullptr); }
 json::Value PackPreset::j2jAddFields(json::Object const& obj,
                                      std::unordered_set<std::string> const& extraFields) {
     return additionalKeys(obj, [&](std::string const& key) {
-        return std::find(RESERVED.begin(), RESERVED.end(), key) != RESERVED.end() ||
-               extraFields.contains(key);
+        return json::claimsKey(Keys::ALL, key) || extraFields.contains(key);
     });
 }
 
@@ -172,11 +168,11 @@ std::shared_ptr<PackPreset::DelayInfo const> PackPreset::j2pDelayInf(json::Value
 }
 
 std::vector<PackPreset::Attachment> PackPreset::j2Attachments(json::Value const& value) {
-    return JsonForm<std::vector<Attachment>>::read(value);
+    return json::Form<std::vector<Attachment>>::read(value);
 }
 
 std::vector<LetterheadInf> PackPreset::j2ltrheads(json::Value const& value) {
-    return JsonForm<std::vector<LetterheadInf>>::read(value);
+    return json::Form<std::vector<LetterheadInf>>::read(value);
 }
 
 } // namespace Cfg

@@ -3,6 +3,7 @@
 
 #include "vlservice/export.h"
 #include "vlservice/json/json.h"
+#include "vlservice/json/record_keys.h"
 #include "vlservice/presets/letterhead_inf.h"
 #include "vlservice/presets/process_mode.h"
 
@@ -40,6 +41,7 @@ public:
         /// The id as a string when nothing else is set, otherwise an object.
         /// Throws json::Exc when `additional` holds something that is no object.
         json::Value serialize() const;
+        static json::RecordKeys const& keys();
 
         bool operator==(Attachment const& other) const = default;
 
@@ -56,6 +58,7 @@ public:
 
         /// Without the members that are 0 or empty.
         json::Object serialize() const;
+        static json::RecordKeys const& keys();
 
         bool operator==(DelayInfo const& other) const = default;
 
@@ -83,6 +86,8 @@ public:
     /// Without `embedded` a preset marked for erasing is written as "name" and "erase_me" alone.
     /// Throws json::Exc when the additional value is neither the empty handle nor an object.
     json::Object serialize(bool embedded) const;
+    /// Those of the configuration form.
+    static json::RecordKeys const& keys();
 
     std::string const& name() const { return name_; }
     std::string const& title() const { return title_; }

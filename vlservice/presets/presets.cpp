@@ -47,6 +47,11 @@ std::string const Presets::CATCH_ALL_PACK_PRES_NAME = "GLOBAL";
 
 PresetFields const Presets::FLDS_INIT{"extract_presets", "pack_presets"};
 
+json::RecordKeys const& Presets::keys() {
+    static json::RecordKeys const keys = keysOf(FLDS_INIT);
+    return keys;
+}
+
 Presets::Presets(json::Value const& j, bool global, bool sorted) : Part(global, FLDS_INIT) {
     deserialize(j, sorted);
     if (global)

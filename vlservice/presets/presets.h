@@ -11,14 +11,15 @@
 #include <tuple>
 #include <utility>
 
-namespace Cfg {
-
 /// As elements of a settings list pack presets stand in their configuration form.
 template<>
-struct JsonForm<PackPreset> {
-    static PackPreset read(json::Value const& node) { return PackPreset(node.toObject(), {}); }
-    static json::Value write(PackPreset const& preset) { return preset.serialize(false); }
+struct json::Form<Cfg::PackPreset> {
+    static Cfg::PackPreset read(Value const& node) { return Cfg::PackPreset(node.toObject(), {}); }
+    static Value write(Cfg::PackPreset const& preset) { return preset.serialize(false); }
+    static KeyForm describe() { return {KeyType::Record, &Cfg::PackPreset::keys()}; }
 };
+
+namespace Cfg {
 
 enum class VLSERVICE_EXPORT PresetFieldIdxs { ExtractPresets, PackPresets };
 
@@ -37,6 +38,7 @@ extern template class VLSERVICE_EXPORT Part<PresetFieldIdxs, PresetFields>;
 class VLSERVICE_EXPORT Presets : public Part<PresetFieldIdxs, PresetFields> {
 public:
     static std::string const PART_NAME;
+    static json::RecordKeys const& keys();
     /// The text of the expression that makes an extraction preset the catch-all.
     static std::string const CATCH_ALL_PATTERN;
     /// The name of the default pack preset.
