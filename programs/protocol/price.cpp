@@ -94,7 +94,7 @@ PriceRequest::PriceRequest(json::Object const& object) {
 }
 
 json::Object PriceRequest::serialize() const {
-    return {{LETTERS, Cfg::JsonForm<std::vector<LetterBatch>>::write(letters)}};
+    return {{LETTERS, json::Form<std::vector<LetterBatch>>::write(letters)}};
 }
 
 BatchPrice::BatchPrice(long long sheetsEach, long long priceOfAll) : sheets(sheetsEach), price(priceOfAll) {}

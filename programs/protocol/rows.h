@@ -26,13 +26,13 @@ public:
         else if constexpr (std::same_as<T, json::Array>)
             into.*member_ = node.isArray() ? node.toArray() : json::Array();
         else
-            into.*member_ = json::passesFor<T>(node) ? Cfg::JsonForm<T>::read(node) : T{};
+            into.*member_ = json::passesFor<T>(node) ? json::Form<T>::read(node) : T{};
     }
     void write(Record const& from, json::Object& into) const {
         if constexpr (std::derived_from<T, json::Value>)
             into.set(name_, from.*member_);
         else
-            into.set(name_, Cfg::JsonForm<T>::write(from.*member_));
+            into.set(name_, json::Form<T>::write(from.*member_));
     }
     bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
 
@@ -56,7 +56,7 @@ public:
     }
     void write(Record const& from, json::Object& into) const {
         if (from.*member_ != missing())
-            into.set(name_, Cfg::JsonForm<T>::write(from.*member_));
+            into.set(name_, json::Form<T>::write(from.*member_));
     }
     bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
 
@@ -71,7 +71,7 @@ private:
         if (!form_.fits(node))
             throw Base::Error('"' + std::string(name_) + "\" of " + Record::IN_WORDS + " has to be " +
                               form_.wanted());
-        return Cfg::JsonForm<T>::read(node);
+        return json::Form<T>::read(node);
     }
 
     char const* name_;

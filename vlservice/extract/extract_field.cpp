@@ -35,8 +35,8 @@ struct ExtractField::Keys {
     };
     /// Read and written by the validator. What limits and a default may be depends on the type of the value.
     static constexpr std::tuple VALIDATION{
-        json::Named{Validation::MATCH_KEY, json::KeyType::Text},
-        json::Named{Validation::TYPE_KEY, json::KeyType::Int32},
+        json::Named{Validation::MATCH_KEY, json::KeyType::Text, R"("")"},
+        json::Named{Validation::TYPE_KEY, json::KeyType::Int32, "0"},
         json::Named{Validation::MIN_KEY, json::KeyType::Any},
         json::Named{Validation::MAX_KEY, json::KeyType::Any},
         json::Named{Validation::DEFAULT_KEY, json::KeyType::Any},

@@ -33,6 +33,15 @@ concept Lenient = requires(Value const& node) {
     { Form<T>::fits(node) } -> std::same_as<bool>;
 };
 
+/// Whether a node is read where a T is wanted; anything else stands for a missing key.
+template<typename T>
+bool passesFor(Value const& node) {
+    if constexpr (Lenient<T>)
+        return Form<T>::fits(node);
+    else
+        return static_cast<bool>(node);
+}
+
 /// The default of a row that names none: the member's zero value.
 struct Zero {};
 
@@ -93,13 +102,7 @@ private:
         else
             return nullptr;
     }
-    bool stands(Value const& node) const {
-        if constexpr (Lenient<T>) {
-            if (!isChecked_)
-                return Form<T>::fits(node);
-        }
-        return static_cast<bool>(node);
-    }
+    bool stands(Value const& node) const { return isChecked_ ? static_cast<bool>(node) : passesFor<T>(node); }
     constexpr T missing() const {
         if constexpr (std::same_as<Missing, Zero>)
             return T{};
@@ -162,13 +165,16 @@ private:
 /// A row for a key that is read and written by hand: it describes the key and no more.
 class Named {
 public:
-    constexpr Named(char const* name, KeyType type) : name_(name), type_(type) {}
+    /// `missing` as in KeyRow.
+    constexpr Named(char const* name, KeyType type, char const* missing = "")
+        : name_(name), type_(type), missing_(missing) {}
 
-    KeyRow describe() const { return {name_, {type_}}; }
+    KeyRow describe() const { return {name_, {type_}, KeyUse::Lenient, missing_}; }
 
 private:
     char const* name_;
     KeyType type_;
+    char const* missing_;
 };
 
 /// Fills the members of `into` row by row, so a failure is that of the first bad row.

@@ -1,7 +1,9 @@
 // Keys that nobody knows, and values that are not read as they stand.
+#include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/keys.h"
+#include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
+#include "vlservice/presets/settings_parts.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -12,38 +14,46 @@ namespace VlMail {
 namespace {
 
 using enum FindingKind;
+using json::Inheritance;
+using json::KeyRow;
+using json::KeyType;
+using json::KeyUse;
+using json::RecordKeys;
 
-/// What a type is called, and what reads where another type stands.
-struct TypeWords {
-    char const* missing;
-    char const* wanted;
-};
-
-TypeWords wordsOf(KeyType type) {
+/// What is to be written where another type stands.
+char const* wanted(KeyType type) {
     switch (type) {
     case KeyType::Text:
-        return {"the empty text", "a text in quotes"};
+        return "a text in quotes";
     case KeyType::Flag:
-        return {"false", "true or false"};
+        return "true or false";
     case KeyType::Int32:
     case KeyType::UInt32:
     case KeyType::Int64:
     case KeyType::UInt64:
-        return {"0", "an integer"};
+    case KeyType::Bits:
+        return "an integer";
     case KeyType::Number:
-        return {"0", "a number"};
+        return "a number";
     case KeyType::Record:
-        return {"nothing", "an object {...}"};
+        return "an object {...}";
     case KeyType::Records:
-        return {"nothing", "a list [...]"};
+        return "a list [...]";
     case KeyType::Numbers:
-        return {"nothing", "a list of integers"};
+        return "a list of integers";
     case KeyType::Texts:
-        return {"nothing", "a list of texts"};
+        return "a list of texts";
     case KeyType::Any:
         break;
     }
-    return {"nothing", "a value"};
+    return "a value";
+}
+
+/// What is read where another type stands.
+std::string readsAs(KeyRow const& row) {
+    if (row.missing.empty())
+        return "nothing";
+    return row.missing == R"("")" ? "the empty text" : row.missing;
 }
 
 bool isOfType(json::Value const& value, KeyType type) {
@@ -56,6 +66,7 @@ bool isOfType(json::Value const& value, KeyType type) {
     case KeyType::UInt32:
     case KeyType::Int64:
     case KeyType::UInt64:
+    case KeyType::Bits:
         return value.isInt();
     case KeyType::Number:
         return value.isInt() || value.isReal();
@@ -69,6 +80,12 @@ bool isOfType(json::Value const& value, KeyType type) {
         break;
     }
     return true;
+}
+
+/// Keys that the record keeps and that this program's reader knows; looked at by checkReadingRules.
+std::vector<std::string> keysOfReader(RecordKeys const& keys) {
+    return &keys == &Cfg::PackPreset::keys() ? std::vector<std::string>{Reader::ReadingRules::KEY}
+                                             : std::vector<std::string>();
 }
 
 class KeyChecker {
@@ -92,24 +109,27 @@ public:
 private:
     void checkKey(json::Object const& object, std::string const& key, json::Value const& value,
                   Place const& parent, RecordKeys const& keys) {
-        auto const row = std::ranges::find(keys.rows, key, &KeyRow::name);
-        if (row == keys.rows.end())
+        KeyRow const* const row = keys.find(key);
+        if (!row)
             return checkUnknown(object, key, parent / key, keys);
         if (row->use == KeyUse::Dropped)
             return findings_.add(DroppedKey, parent / key, {inQuotes(key)});
-        if (!keys.wrapsValues)
+        if (row->inheritance != Inheritance::Whole)
             return checkValue(value, parent / key, *row);
         Unwrapped const unwrapped = unwrap(value, parent / key);
         checkValue(unwrapped.node, unwrapped.place, *row);
     }
 
-    /// A known key that stands in the same object already is not what was meant.
     void checkUnknown(json::Object const& object, std::string const& key, Place const& place,
                       RecordKeys const& keys) {
-        std::vector<std::string> candidates;
+        std::vector<std::string> candidates = keysOfReader(keys);
+        if (std::ranges::find(candidates, key) != candidates.end())
+            return;
         for (KeyRow const& row : keys.rows)
-            if (row.use != KeyUse::Dropped && !object.get(row.name))
+            if (row.use != KeyUse::Dropped)
                 candidates.push_back(row.name);
+        // A known key that stands in the same object already is not what was meant.
+        std::erase_if(candidates, [&](std::string const& name) { return bool(object.get(name)); });
         std::string const nearest = nearestName(key, candidates);
         if (!nearest.empty())
             findings_.add(MisspeltKey, place, {inQuotes(key), inQuotes(nearest)});
@@ -118,17 +138,15 @@ private:
     }
 
     void checkValue(json::Value const& value, Place const& place, KeyRow const& row) {
-        TypeWords const words = wordsOf(row.type);
-        if (!isOfType(value, row.type)) {
+        if (!isOfType(value, row.form.type)) {
             if (row.use != KeyUse::Lenient)
-                return refuse(value, place, words.wanted);
-            return findings_.add(WrongType, place,
-                                 {value.typeName(), row.missing ? row.missing : words.missing, words.wanted});
+                return refuse(value, place, wanted(row.form.type));
+            return findings_.add(WrongType, place, {value.typeName(), readsAs(row), wanted(row.form.type)});
         }
         if (value.isInt())
-            checkRange(value.toInt(), place, row.type);
-        else if (row.type == KeyType::Record)
-            check(value, place, *row.record);
+            checkRange(value.toInt(), place, row.form.type);
+        else if (row.form.type == KeyType::Record)
+            check(value, place, *row.form.record);
         else if (value.isArray())
             checkElements(value.toArray(), place, row);
     }
@@ -136,20 +154,20 @@ private:
     void checkElements(json::Array const& array, Place const& place, KeyRow const& row) {
         for (std::size_t i = 0; i < array.size(); ++i) {
             json::Value const element = array.at(i);
-            if (row.type == KeyType::Numbers && !element.isInt())
+            if (row.form.type == KeyType::Numbers && !element.isInt())
                 refuse(element, place / i, "an integer");
-            else if (row.type == KeyType::Texts && !element.isString())
+            else if (row.form.type == KeyType::Texts && !element.isString())
                 refuse(element, place / i, "a text in quotes");
-            else if (row.type == KeyType::Records)
-                checkElement(element, place / i, *row.record);
+            else if (row.form.type == KeyType::Records)
+                checkElement(element, place / i, row);
         }
     }
 
-    void checkElement(json::Value const& element, Place const& place, RecordKeys const& keys) {
-        if (!keys.mayBeWrapped)
-            return check(element, place, keys);
+    void checkElement(json::Value const& element, Place const& place, KeyRow const& row) {
+        if (row.inheritance != Inheritance::ByElements)
+            return check(element, place, *row.form.record);
         Unwrapped const unwrapped = unwrap(element, place);
-        check(unwrapped.node, unwrapped.place, keys);
+        check(unwrapped.node, unwrapped.place, *row.form.record);
     }
 
     void refuse(json::Value const& value, Place const& place, char const* wanted) {
@@ -207,6 +225,15 @@ void checkNumbersOf(json::Object const& object, Place const& place, std::span<Nu
     }
 }
 
+/// `"a", "b" or "c"`.
+std::string namesOfParts() {
+    auto const parts = Cfg::settingsParts();
+    std::string names;
+    for (std::size_t i = 0; i < parts.size(); ++i)
+        names += (i == 0 ? "" : i + 1 < parts.size() ? ", " : " or ") + inQuotes(parts[i].name);
+    return names;
+}
+
 } // namespace
 
 void checkParts(PresetsDocument const& document, Findings& findings) {
@@ -214,8 +241,8 @@ void checkParts(PresetsDocument const& document, Findings& findings) {
         return;
     for (auto const& [key, part] : document.json()) {
         std::string const name = key;
-        if (std::ranges::none_of(partKeys(), [&](PartKeys const& keys) { return keys.name == name; }))
-            findings.add(UnknownPart, Place() / name, {inQuotes(name)});
+        if (!Cfg::findSettingsPart(name))
+            findings.add(UnknownPart, Place() / name, {inQuotes(name), namesOfParts()});
     }
 }
 
@@ -227,10 +254,10 @@ void checkDuplicateKeys(PresetsDocument const& document, Findings& findings) {
 void checkKeys(PresetsDocument const& document, Findings& findings) {
     KeyChecker checker(findings);
     if (document.isPartAlone())
-        return checker.check(document.json(), Place(), PRESETS_KEYS);
-    for (PartKeys const& part : partKeys())
+        return checker.check(document.json(), Place(), Cfg::Presets::keys());
+    for (Cfg::PartInfo const& part : Cfg::settingsParts())
         if (json::Value const node = document.json().get(part.name))
-            checker.check(node, Place() / part.name, *part.record);
+            checker.check(node, Place() / part.name, part.keys);
 }
 
 void checkNumbers(PresetsDocument const& document, Findings& findings) {

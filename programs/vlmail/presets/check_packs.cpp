@@ -1,6 +1,6 @@
 // Pack presets: whether each is found, used, and read as it is meant.
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/keys.h"
+#include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>

@@ -2,7 +2,7 @@
 #include "programs/patterns/pattern.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/checks.h"
-#include "programs/vlmail/presets/keys.h"
+#include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>

@@ -20,7 +20,7 @@ constexpr FindingWords WORDS[] = {
     // clang-format off
     {UnknownPart, "unknown-part", Error,
      "{0} is no settings part: the whole document is refused",
-     "name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or \"profiles\""},
+     "name the parts {1}"},
     {MisspeltKey, "misspelt-key", Error,
      "{0} is no known key and changes nothing",
      "write {1}"},

@@ -90,9 +90,9 @@ json::Array arrayOf(json::Object const& object, char const* key) {
 }
 
 Unwrapped unwrap(json::Value const& node, Place const& place) {
-    if (!node.isObject() || !node.toObject().get("inh").isTrue())
+    if (!Cfg::isWrapper(node))
         return {node, place, false};
-    return {node.toObject().get("v"), place / "v", true};
+    return {Cfg::unwrap(node), place / Cfg::VALUE_KEY, true};
 }
 
 std::string inWords(Cfg::ExtractPreset const& preset) {

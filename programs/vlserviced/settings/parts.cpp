@@ -2,12 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/protocol/settings.h"
-#include "vlservice/cfg/app.h"
-#include "vlservice/cfg/departments.h"
-#include "vlservice/cfg/inet.h"
-#include "vlservice/cfg/po.h"
-#include "vlservice/cfg/profiles.h"
-#include "vlservice/presets/presets.h"
+#include "vlservice/presets/settings_parts.h"
 
 #include <algorithm>
 #include <array>
@@ -94,30 +89,20 @@ json::Value readOwn<Cfg::Presets>(json::Value const& sent) {
     return presets.serialize();
 }
 
-enum class Inheritance { Whole, ByElements };
-
 struct PartKind {
     std::string name;
-    /// How the lists of the part are inherited.
-    Inheritance lists;
+    json::RecordKeys const& keys;
     json::Value (*own)(json::Value const& sent);
     json::Object (*effective)(Chain const& chain);
 };
 
-template<typename Part>
-PartKind kind(Inheritance lists) {
-    return {Part::PART_NAME, lists, &readOwn<Part>, &effective<Part>};
+template<typename... Parts>
+auto kindsOf(Cfg::PartList<Parts...>) {
+    return std::array{PartKind{Parts::PART_NAME, Parts::keys(), &readOwn<Parts>, &effective<Parts>}...};
 }
 
-std::array<PartKind, 6> const& kinds() {
-    static std::array<PartKind, 6> const all{
-        kind<Cfg::App>(Inheritance::Whole),
-        kind<Cfg::Inet>(Inheritance::Whole),
-        kind<Cfg::PO>(Inheritance::Whole),
-        kind<Cfg::Departments>(Inheritance::Whole),
-        kind<Cfg::Profiles>(Inheritance::ByElements),
-        kind<Cfg::Presets>(Inheritance::ByElements),
-    };
+auto const& kinds() {
+    static auto const all = kindsOf(Cfg::SettingsParts());
     return all;
 }
 
@@ -132,19 +117,13 @@ PartKind const& kindNamed(std::string const& name) {
     throw Base::Error("there are no settings \"" + name + "\"; there are " + known);
 }
 
-/// A global part writes every key that it has, whatever its values.
 void checkKeys(PartKind const& kind, json::Object const& sent) {
-    json::Object const known = kind.effective({SettingsLevel{}});
     for (auto const& [key, value] : sent)
-        if (!known.get(key))
+        if (!kind.keys.find(key))
             throw Base::Error("the settings \"" + kind.name + "\" have no key \"" + key + "\"");
 }
 
-bool isWrapper(json::Value const& value) { return value.isObject() && value.toObject().get("inh").isTrue(); }
-
-json::Value unwrapped(json::Value const& value) {
-    return isWrapper(value) ? value.toObject().get("v") : value;
-}
+json::Value unwrapped(json::Value const& value) { return Cfg::isWrapper(value) ? Cfg::unwrap(value) : value; }
 
 json::Array unwrappedElements(json::Array const& list) {
     json::Array plain;
@@ -178,7 +157,7 @@ json::Array originsOfElements(PartKind const& kind, char const* key, Chain const
 json::Object resolvePart(PartKind const& kind, Chain const& chain) {
     Protocol::PartSettings settings;
     for (auto const& [key, written] : kind.effective(chain)) {
-        if (kind.lists == Inheritance::ByElements) {
+        if (kind.keys.find(key)->inheritance == json::Inheritance::ByElements) {
             json::Array const list = unwrappedElements(written.toArray());
             settings.origins.set(key, originsOfElements(kind, key, chain, list.size()));
             settings.values.set(key, list);

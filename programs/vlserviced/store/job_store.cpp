@@ -70,7 +70,7 @@ private:
 /// As a JSON array.
 std::string textOf(std::vector<std::string> const& texts) {
     std::ostringstream text;
-    text << Cfg::JsonForm<std::vector<std::string>>::write(texts);
+    text << json::Form<std::vector<std::string>>::write(texts);
     return std::move(text).str();
 }
 

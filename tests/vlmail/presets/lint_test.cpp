@@ -46,7 +46,7 @@ std::vector<Case> const CASES{
     {"APartThatIsNone",
      R"_({"preset": {}})_",
      {"error /preset: \"preset\" is no settings part: the whole document is refused | name the parts "
-      "\"presets\", \"app\", \"inet\", \"po\", \"deps\" or \"profiles\" [unknown-part]"}},
+      "\"app\", \"inet\", \"po\", \"deps\", \"profiles\" or \"presets\" [unknown-part]"}},
     {"AMisspeltKey",
      partWithField(R"_({"name": "ref", "value_extrct": "^Ref: (?<VAL>.*)$", "default_value": "none"})_"),
      {"error /extract_presets/0/zones/0/fields/1/value_extrct: \"value_extrct\" is no known key and changes "
