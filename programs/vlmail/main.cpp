@@ -4,13 +4,27 @@
 #include "vlservice/platform/log.h"
 
 #include <iostream>
+#include <new>
 #include <unistd.h>
 
-int main(int argc, char** argv) {
+namespace {
+
+int runOnTerminal(int argc, char** argv) {
     Base::removePendingFilesOnSignals();
     VlMail::Terminal const terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1};
     Log::setSink([&](LogPriority, std::string const& line) { terminal.complain(line); });
     int const status = VlMail::run(argc, argv, terminal);
     Log::setSink({});
     return status;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return runOnTerminal(argc, argv);
+    } catch (std::bad_alloc const&) {
+        std::cerr << VlMail::OUT_OF_MEMORY;
+        return VlMail::FAILED;
+    }
 }

@@ -26,6 +26,9 @@ void addStrandedCommands(Base::Command const& app, Task& task);
 void addStatusCommand(Base::Command const& app, Task& task);
 void addUploadCommand(Base::Command const& app, Task& task);
 
+/// The line of a run that ends because memory does; it is written as it stands, without taking any.
+extern char const OUT_OF_MEMORY[];
+
 /// Parses the command line, carries it out and gives the exit status. Throws nothing derived from
 /// std::exception.
 int run(int argc, char const* const* argv, Terminal const& terminal);

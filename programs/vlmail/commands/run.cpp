@@ -6,6 +6,10 @@
 #include <ostream>
 
 namespace VlMail {
+
+char const OUT_OF_MEMORY[] =
+    "vlmail: there is not enough memory; close other programs, or name fewer documents at once\n";
+
 namespace {
 
 void addCommands(Base::Command const& command, Task& task) {
@@ -23,17 +27,18 @@ void addCommands(Base::Command const& command, Task& task) {
     addUploadCommand(command, task);
 }
 
+/// Lets std::bad_alloc out: telling of a failure takes memory, too.
 int runPlainly(int argc, char const* const* argv, Terminal const& terminal) {
-    Base::CommandLine line(
-        "Sends letters out of documents: reads them, says what was found, and packs mailings.", "vlmail");
-    Task task;
-    addCommands(line.command(), task);
     try {
+        Base::CommandLine line(
+            "Sends letters out of documents: reads them, says what was found, and packs mailings.", "vlmail");
+        Task task;
+        addCommands(line.command(), task);
         return line.read(argc, argv, terminal.out) ? task(terminal) : FINE;
-    } catch (Base::UsageError const& wrong) {
-        terminal.complain(std::string(wrong.what()) + "; --help explains");
     } catch (std::bad_alloc const&) {
         throw;
+    } catch (Base::UsageError const& wrong) {
+        terminal.complain(std::string(wrong.what()) + "; --help explains");
     } catch (std::exception const& failure) {
         terminal.complain(failure.what());
     }
@@ -56,9 +61,7 @@ int run(int argc, char const* const* argv, Terminal const& terminal) {
     try {
         return runAndFlush(argc, argv, terminal);
     } catch (std::bad_alloc const&) {
-        // Words that need no memory.
-        terminal.err << "vlmail: there is no memory for this; close other programs or raise the limit"
-                     << std::endl;
+        terminal.err << OUT_OF_MEMORY << std::flush;
         return FAILED;
     }
 }

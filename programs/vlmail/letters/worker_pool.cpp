@@ -77,6 +77,8 @@ public:
     }
     ~Worker() {
         ::close(socket_);
+        // It may be in the middle of a job that nobody waits for.
+        ::kill(process_, SIGKILL);
         while (::waitpid(process_, nullptr, 0) < 0 && errno == EINTR) {
         }
     }
@@ -91,8 +93,9 @@ public:
         begin_ = usageOf(process_);
         failure_ = JobFailure::Died;
         Number const number = index;
-        // A worker that is gone is noticed when its result is read.
-        writeAll(socket_, &number, sizeof number);
+        // A worker that is gone, or cannot be reached, is noticed when its result is read.
+        if (!writeAll(socket_, &number, sizeof number))
+            ::shutdown(socket_, SHUT_RDWR);
     }
 
     /// Ends the worker when its job takes more than it may.
@@ -126,16 +129,26 @@ private:
         ::kill(process_, SIGKILL);
     }
 
-    /// The life of the worker process; ends when the other side closes.
+    /// The life of the worker process. Whatever is thrown ends it, too: behind the constructor it would go on
+    /// as a second parent.
     [[noreturn]] static void serve(int socket, Job const& job) {
+        try {
+            answer(socket, job);
+        } catch (...) {
+            // The parent sees that this process has ended without a result.
+        }
+        // Nothing of the parent's is flushed or destroyed here.
+        ::_exit(0);
+    }
+
+    /// Ends when the other side closes.
+    static void answer(int socket, Job const& job) {
         for (Number index = 0; readAll(socket, &index, sizeof index);) {
             std::string const result = job(index);
             Number const length = result.size();
             if (!writeAll(socket, &length, sizeof length) || !writeAll(socket, result.data(), result.size()))
                 break;
         }
-        // Nothing of the parent's is flushed or destroyed here.
-        ::_exit(0);
     }
 
     pid_t process_ = -1;

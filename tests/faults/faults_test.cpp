@@ -1,0 +1,46 @@
+// Each command of vlmail while its calls fail, one after the other. scripts/torture goes through all of them.
+#include "tests/faults/scenario.h"
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+
+namespace {
+
+using namespace Faults;
+
+/// So many of the calls that are made often are tried, at even distances; of the others every one.
+constexpr long MAX_POINTS = 100;
+constexpr long MAX_POINTS_OF_OFTEN = 16;
+
+std::vector<long> pointsOf(std::string const& call, long calls) {
+    bool const isOften = call == "memory" || call == "read" || call == "open";
+    long const count = std::min(calls, isOften ? MAX_POINTS_OF_OFTEN : MAX_POINTS);
+    std::vector<long> points;
+    for (long i = 0; i < count; ++i)
+        points.push_back(1 + i * calls / count);
+    return points;
+}
+
+class CommandsWhoseCallsFail : public testing::TestWithParam<Command> {};
+
+TEST_P(CommandsWhoseCallsFail, KeepTheirPromises) {
+    Scenario scenario(GetParam());
+    long tried = 0;
+    for (std::string const& call : CALLS) {
+        std::vector<Fault> const faults = faultsOf(call);
+        for (long const point : pointsOf(call, scenario.callsOf(call))) {
+            Fault fault = faults[static_cast<std::size_t>(tried++) % faults.size()];
+            fault.number = point;
+            EXPECT_THAT(scenario.run(fault), testing::IsEmpty())
+                << "to repeat: scripts/torture --repeat " << GetParam().name << ' ' << fault.text();
+        }
+    }
+    // Every command opens and reads something at least.
+    EXPECT_GT(tried, 3);
+}
+
+INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsWhoseCallsFail, testing::ValuesIn(commands()),
+                         [](auto const& each) { return each.param.name; });
+
+} // namespace

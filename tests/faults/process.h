@@ -1,0 +1,30 @@
+#pragma once
+// A program that is run to its end with a call that fails.
+
+#include "tests/faults/fault.h"
+
+#include <filesystem>
+#include <map>
+
+namespace Faults {
+
+struct Ended {
+    /// The exit status, or minus the number of the signal that ended it.
+    int status = 0;
+    std::string out;
+    std::string err;
+    /// How many calls of the fault's kind there were, up to the end.
+    long calls = 0;
+    bool isLate = false;
+};
+
+/// The environment of a program in which that call fails. The counter is a file that is made anew.
+std::map<std::string, std::string> environmentOf(Fault const& fault, std::filesystem::path const& counter);
+long callsIn(std::filesystem::path const& counter);
+
+/// Runs it in the folder. What it writes and its count stand in files beside the folder meanwhile. After a
+/// minute it is late and killed.
+Ended runWith(Fault const& fault, std::filesystem::path const& program, std::vector<std::string> arguments,
+              std::filesystem::path const& folder);
+
+} // namespace Faults
