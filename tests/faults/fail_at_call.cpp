@@ -77,6 +77,12 @@ bool fails(char const* call) {
     return true;
 }
 
+/// What a disk does to writing happens to files alone, not to pipes and sockets.
+bool isFile(int descriptor) {
+    struct stat status {};
+    return ::fstat(descriptor, &status) == 0 && S_ISREG(status.st_mode);
+}
+
 template<typename Function>
 Function original(Function /* for its type */, char const* name) {
     return reinterpret_cast<Function>(::dlsym(RTLD_NEXT, name));
@@ -95,12 +101,15 @@ int countingMain(int argc, char** argv, char** environment) {
 
 } // namespace
 
-// Defines a function of the C library that fails with -1 or gives what the library's own gives.
-#define FAILING(Class, Result, name, parameters, arguments)                                                  \
+// Defines a function of the C library that fails with -1, where the condition holds, or gives what the
+// library's own gives.
+#define FAILING_IF(condition, Class, Result, name, parameters, arguments)                                    \
     EXPORTED Result name parameters {                                                                        \
         static auto const next = original(static_cast<Result(*) parameters>(nullptr), #name);                \
-        return fails(#Class) ? Result(-1) : next arguments;                                                  \
+        return (condition) && fails(#Class) ? Result(-1) : next arguments;                                   \
     }
+#define FAILING(Class, Result, name, parameters, arguments)                                                  \
+    FAILING_IF(true, Class, Result, name, parameters, arguments)
 
 extern "C" {
 
@@ -111,13 +120,15 @@ EXPORTED int __libc_start_main(Main main, int argc, char** argv, void (*init)(),
     return original(Start(nullptr), "__libc_start_main")(countingMain, argc, argv, init, fini, end, stack);
 }
 
-FAILING(write, ssize_t, write, (int file, void const* data, size_t size), (file, data, size))
-FAILING(write, ssize_t, writev, (int file, iovec const* parts, int count), (file, parts, count))
-FAILING(write, ssize_t, pwrite, (int file, void const* data, size_t size, off_t at), (file, data, size, at))
-FAILING(write, ssize_t, pwrite64, (int file, void const* data, size_t size, off64_t at),
-        (file, data, size, at))
-FAILING(write, int, ftruncate, (int file, off_t size), (file, size))
-FAILING(write, int, ftruncate64, (int file, off64_t size), (file, size))
+FAILING_IF(isFile(file), write, ssize_t, write, (int file, void const* data, size_t size), (file, data, size))
+FAILING_IF(isFile(file), write, ssize_t, writev, (int file, iovec const* parts, int count),
+           (file, parts, count))
+FAILING_IF(isFile(file), write, ssize_t, pwrite, (int file, void const* data, size_t size, off_t at),
+           (file, data, size, at))
+FAILING_IF(isFile(file), write, ssize_t, pwrite64, (int file, void const* data, size_t size, off64_t at),
+           (file, data, size, at))
+FAILING_IF(isFile(file), write, int, ftruncate, (int file, off_t size), (file, size))
+FAILING_IF(isFile(file), write, int, ftruncate64, (int file, off64_t size), (file, size))
 
 FAILING(read, ssize_t, read, (int file, void* data, size_t size), (file, data, size))
 FAILING(read, ssize_t, readv, (int file, iovec const* parts, int count), (file, parts, count))

@@ -1,4 +1,6 @@
-// Each command of vlmail while its calls fail, one after the other. scripts/torture goes through all of them.
+// Each command of vlmail, and vlserviced with one job, while their calls fail, one after the other.
+// scripts/torture goes through all of them.
+#include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
 
 #include <gmock/gmock.h>
@@ -12,6 +14,7 @@ using namespace Faults;
 /// So many of the calls that are made often are tried, at even distances; of the others every one.
 constexpr long MAX_POINTS = 100;
 constexpr long MAX_POINTS_OF_OFTEN = 16;
+constexpr long MAX_POINTS_OF_SERVICE = 12;
 
 std::vector<long> pointsOf(std::string const& call, long calls) {
     bool const isOften = call == "memory" || call == "read" || call == "open";
@@ -42,5 +45,24 @@ TEST_P(CommandsWhoseCallsFail, KeepTheirPromises) {
 
 INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsWhoseCallsFail, testing::ValuesIn(commands()),
                          [](auto const& each) { return each.param.name; });
+
+class AServiceWhoseCallsFail : public testing::TestWithParam<std::string> {};
+
+TEST_P(AServiceWhoseCallsFail, LosesNothingAndDoublesNothing) {
+    OneJob job;
+    std::vector<Fault> const faults = faultsOf(GetParam());
+    long const calls = job.callsOf(GetParam());
+    EXPECT_GT(calls, 0);
+    for (long i = 0; i < std::min(calls, MAX_POINTS_OF_SERVICE); ++i) {
+        Fault fault = faults[static_cast<std::size_t>(i) % faults.size()];
+        fault.number = 1 + i * calls / std::min(calls, MAX_POINTS_OF_SERVICE);
+        EXPECT_THAT(job.run(fault), testing::IsEmpty())
+            << "to repeat: scripts/torture --repeat service " << fault.text();
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(OfAKind, AServiceWhoseCallsFail,
+                         testing::Values("write", "sync", "rename", "remove", "open", "read"),
+                         [](auto const& each) { return each.param; });
 
 } // namespace

@@ -1,6 +1,8 @@
-// scripts/torture: commands of vlmail in which calls fail, at random and for as long as one likes.
+// scripts/torture: commands of vlmail, and vlserviced with one job ("service"), in which calls fail, at
+// random and for as long as one likes.
 //     torture MINUTES [SEED]           says each finding, and how to repeat it; status 1 when there was one
 //     torture --repeat COMMAND FAULT   runs one, such as "mail write:28:3+"
+#include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
 
 #include <algorithm>
@@ -13,6 +15,8 @@ namespace {
 using namespace Faults;
 using Clock = std::chrono::steady_clock;
 
+constexpr char const* SERVICE = "service";
+
 bool say(std::string const& command, Fault const& fault, std::vector<std::string> const& findings) {
     for (std::string const& finding : findings)
         std::cout << command << " with " << fault.text() << ' ' << finding
@@ -23,48 +27,55 @@ bool say(std::string const& command, Fault const& fault, std::vector<std::string
 
 int repeat(std::string const& name, std::string const& text) {
     auto const command = std::ranges::find(commands(), name, &Command::name);
+    bool const isService = name == SERVICE;
     auto const fault = Fault::parse(text);
-    if (command == commands().end() || !fault) {
+    if ((command == commands().end() && !isService) || !fault) {
         std::cerr << "torture: there is no command " << name << " or no fault " << text << '\n';
         return 1;
     }
-    return say(name, *fault, Scenario(*command).run(*fault)) ? 1 : 0;
+    auto const findings = isService ? OneJob().run(*fault) : Scenario(*command).run(*fault);
+    return say(name, *fault, findings) ? 1 : 0;
 }
 
-/// A command and how often it makes calls of each kind.
+/// What may be run with a fault, and how often it makes calls of each kind.
 struct Subject {
-    explicit Subject(Command const& command) : name(command.name), scenario(command) {
-        for (std::string const& call : CALLS)
-            calls[call] = scenario.callsOf(call);
-    }
-
     std::string name;
-    Scenario scenario;
-    std::map<std::string, long> calls;
+    std::function<long(std::string const& call)> count;
+    std::function<std::vector<std::string>(Fault const& fault)> run;
+    std::map<std::string, long> calls = {};
 };
+
+template<typename Runner>
+Subject subjectOf(std::string const& name, std::shared_ptr<Runner> const& runner) {
+    return {name, [=](std::string const& call) { return runner->callsOf(call); },
+            [=](Fault const& fault) { return runner->run(fault); }};
+}
 
 class Sweep {
 public:
     explicit Sweep(unsigned seed) : random_(seed) {
         for (Command const& command : commands())
-            subjects_.push_back(std::make_unique<Subject>(command));
+            subjects_.push_back(subjectOf(command.name, std::make_shared<Scenario>(command)));
+        subjects_.push_back(subjectOf(SERVICE, std::make_shared<OneJob>()));
     }
 
     /// One run; whether there was a finding.
     bool step() {
-        Subject& subject = *subjects_[upTo(subjects_.size())];
-        std::string const& call = CALLS[upTo(CALLS.size())];
+        Subject& subject = subjects_[below(subjects_.size())];
+        std::string const& call = CALLS[below(CALLS.size())];
+        if (!subject.calls.contains(call))
+            subject.calls[call] = subject.count(call);
         std::vector<Fault> const faults = faultsOf(call);
-        Fault fault = faults[upTo(faults.size())];
-        fault.number = 1 + static_cast<long>(upTo(static_cast<std::size_t>(subject.calls[call]) + 1));
-        return say(subject.name, fault, subject.scenario.run(fault));
+        Fault fault = faults[below(faults.size())];
+        fault.number = 1 + static_cast<long>(below(static_cast<std::size_t>(subject.calls[call]) + 1));
+        return say(subject.name, fault, subject.run(fault));
     }
 
 private:
-    std::size_t upTo(std::size_t count) { return random_() % std::max<std::size_t>(count, 1); }
+    std::size_t below(std::size_t limit) { return random_() % limit; }
 
     std::mt19937 random_;
-    std::vector<std::unique_ptr<Subject>> subjects_;
+    std::vector<Subject> subjects_;
 };
 
 int torture(double minutes, unsigned seed) {
