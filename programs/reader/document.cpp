@@ -2,8 +2,11 @@
 
 #include "programs/base/error.h"
 #include "programs/base/read_file.h"
+#include "programs/reader/file_kind.h"
 #include "programs/reader/page_source.h"
 
+#include <algorithm>
+#include <optional>
 #include <stdexcept>
 #include <string_view>
 #include <utility>
@@ -13,11 +16,15 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// A PDF may have other bytes in front of its header, up to here.
-constexpr std::size_t PDF_HEADER_WITHIN = 1024;
+/// A page of words is some 100,000 points then.
+constexpr double CHECKED_DOTS_PER_INCH = 36;
 
-bool isPdf(std::string_view bytes) {
-    return bytes.substr(0, PDF_HEADER_WITHIN).find("%PDF-") != std::string_view::npos;
+bool isNamedPdf(fs::path const& name) {
+    std::string ending = name.extension().string();
+    std::transform(ending.begin(), ending.end(), ending.begin(), [](char c) {
+        return c == 'P' || c == 'D' || c == 'F' ? static_cast<char>(c - 'A' + 'a') : c;
+    });
+    return ending == ".pdf";
 }
 
 } // namespace
@@ -49,6 +56,18 @@ std::string Document::renderPage(int number, double dotsPerInch) {
     return source_->renderPage(number, dotsPerInch);
 }
 
+bool Document::showsTheSame(int number, std::string const& pdf) {
+    Page const& shown = page(number);
+    std::optional<Picture> const picture = source_->drawPage(number, CHECKED_DOTS_PER_INCH);
+    try {
+        std::unique_ptr<PageSource> const written = openPdf(pdf, name_);
+        return haveSameWords(shown, written->readPage(1)) &&
+               (!picture || lookTheSame(*picture, *written->drawPage(1, CHECKED_DOTS_PER_INCH)));
+    } catch (Base::Error const&) {
+        return false;
+    }
+}
+
 void Document::checkNumber(int number) const {
     if (number < 1 || number > pageCount())
         throw std::out_of_range("no page " + std::to_string(number));
@@ -60,8 +79,12 @@ Document openDocument(std::string bytes, fs::path const& name) {
     std::string const where = name.string();
     if (bytes.empty())
         throw Base::Error(where + ": is empty; export the document again");
-    return Document(name.filename().string(),
-                    isPdf(bytes) ? openPdf(std::move(bytes), where) : openText(bytes, where));
+    if (isPdf(bytes))
+        return Document(name.filename().string(), openPdf(std::move(bytes), where));
+    if (isNamedPdf(name))
+        throw Base::Error(where + ": is named .pdf but seems to be " + std::string(kindInWords(bytes)) +
+                          "; get the document again");
+    return Document(name.filename().string(), openText(bytes, where));
 }
 
 } // namespace Reader

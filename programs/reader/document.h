@@ -31,6 +31,9 @@ public:
     Page const& page(int number);
     /// A PDF of this page alone. The same page gives the same bytes.
     std::string singlePagePdf(int number);
+    /// Whether a PDF of one page shows the words and, at 36 dots per inch, the picture of this page. One that
+    /// cannot be opened shows nothing. Throws Error when this page cannot be drawn.
+    bool showsTheSame(int number, std::string const& pdf);
     /// A PNG picture of the page.
     std::string renderPage(int number, double dotsPerInch);
 

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <limits>
+#include <numeric>
 #include <tuple>
 #include <utility>
 
@@ -17,28 +18,31 @@ Box boxOf(std::vector<Line> const& lines, LineChain const& block) {
     return box;
 }
 
-Turn mainTurnOf(Page const& page) {
-    std::array<std::size_t, TURNS.size()> letters{};
-    for (Word const& word : page.words)
-        letters[static_cast<std::size_t>(word.turn)] += word.text.size();
-    return static_cast<Turn>(std::max_element(letters.begin(), letters.end()) - letters.begin());
+Turn mainTurnOf(Page const& page, std::vector<std::size_t> const& words) {
+    std::array<std::size_t, TURNS.size()> bytes{};
+    for (std::size_t const word : words)
+        bytes[static_cast<std::size_t>(page.words[word].turn)] += page.words[word].text.size();
+    return static_cast<Turn>(std::max_element(bytes.begin(), bytes.end()) - bytes.begin());
 }
 
-} // namespace
+using Chained = std::vector<std::pair<Block, LineChain>>;
 
-Layout layOut(Page const& page, LayoutRules const& rules) {
-    Layout layout;
-    if (page.words.empty())
-        return layout;
-    layout.mainTurn = mainTurnOf(page);
-    std::vector<Line> lines = findLines(page, rules);
-
-    std::vector<std::pair<Block, LineChain>> blocks;
+Chained chainedBlocks(std::vector<Line> const& lines, double maxLineDistance) {
+    Chained blocks;
     for (Turn turn : TURNS)
-        for (LineChain& chain : findBlocks(lines, turn, rules.maxLineDistance)) {
+        for (LineChain& chain : findBlocks(lines, turn, maxLineDistance)) {
             Block const block{boxOf(lines, chain), 0, 0, turn};
             blocks.emplace_back(block, std::move(chain));
         }
+    return blocks;
+}
+
+Layout layOutWords(Page const& page, std::vector<std::size_t> const& words, Spacing const& spacing) {
+    Layout layout;
+    layout.spacing = spacing;
+    layout.mainTurn = mainTurnOf(page, words);
+    std::vector<Line> lines = findLines(page, words, spacing);
+    Chained blocks = chainedBlocks(lines, spacing.maxLineDistance);
     auto const readingOrder = [&](Block const& block) {
         return std::tuple(block.turn != layout.mainTurn, block.box.top, block.box.left, block.box.bottom,
                           block.box.right);
@@ -54,6 +58,22 @@ Layout layOut(Page const& page, LayoutRules const& rules) {
         layout.blocks.push_back(block);
     }
     return layout;
+}
+
+} // namespace
+
+Layout layOut(Page const& page, LayoutRules const& rules) {
+    std::vector<std::size_t> words(page.words.size());
+    std::iota(words.begin(), words.end(), std::size_t{0});
+    return layOutWords(page, words, spacingOf(page, rules));
+}
+
+Layout layOutInside(Page const& page, Spacing const& spacing, Box const& location) {
+    std::vector<std::size_t> words;
+    for (std::size_t i = 0; i < page.words.size(); ++i)
+        if (location.contains(page.words[i].box.centre()))
+            words.push_back(i);
+    return layOutWords(page, words, spacing);
 }
 
 Block const* Layout::nearestBlock(Point point) const {

@@ -23,6 +23,8 @@ struct Layout {
     std::vector<Block> blocks;
     /// The way most of the text runs.
     Turn mainTurn = Turn::Upright;
+    /// By which it was made.
+    Spacing spacing;
 
     /// The block whose box is nearest to the point, of those that run the main way; null on an empty page.
     Block const* nearestBlock(Point point) const;
@@ -31,5 +33,9 @@ struct Layout {
 /// Every word's font must be one of the page's. Costs n log n in the number of words. The same words in
 /// another order give the same layout.
 Layout layOut(Page const& page, LayoutRules const& rules = {});
+
+/// The words alone whose centre lies in the location: nothing outside changes what is inside. Gaps are
+/// judged as on the whole page.
+Layout layOutInside(Page const& page, Spacing const& spacing, Box const& location);
 
 } // namespace Reader

@@ -3,6 +3,7 @@
 #include "programs/reader/blank_widths.h"
 
 #include <map>
+#include <numeric>
 #include <optional>
 #include <tuple>
 #include <unordered_map>
@@ -60,8 +61,8 @@ using GapLimits = std::vector<double>;
 /// Joins the words of one turn to lines, from left to right.
 class LineFinder {
 public:
-    LineFinder(Page const& page, Turn turn) : page_(page) {
-        for (std::size_t i = 0; i < page.words.size(); ++i)
+    LineFinder(Page const& page, std::vector<std::size_t> const& words, Turn turn) : page_(page) {
+        for (std::size_t const i : words)
             if (page.words[i].turn == turn)
                 words_.push_back({frameOf(page.words[i].box, turn), i});
         std::sort(words_.begin(), words_.end(),
@@ -73,7 +74,7 @@ public:
     std::vector<OpenLine> find(GapLimits const& limits) {
         lines_.clear();
         cells_.clear();
-        reach_ = largestSize_ * *std::max_element(limits.begin(), limits.end());
+        reach_ = limits.empty() ? 0 : largestSize_ * *std::max_element(limits.begin(), limits.end());
         for (PlacedWord const& placed : words_)
             add(placed, limits);
         return std::move(lines_);
@@ -228,23 +229,25 @@ Line closed(Page const& page, OpenLine const& open, Turn turn, double minWordGap
 
 } // namespace
 
-std::vector<Line> findLines(Page const& page, LayoutRules const& rules) {
-    // The first search knows no fonts: it is there to learn how wide their blanks are.
+Spacing spacingOf(Page const& page, LayoutRules const& rules) {
+    std::vector<std::size_t> words(page.words.size());
+    std::iota(words.begin(), words.end(), std::size_t{0});
+    // This search knows no fonts: it is there to learn how wide their blanks are.
+    GapLimits const wide(page.fonts.size(), BlankWidths::MAX_GAP);
     BlankWidths blanks(page);
-    std::vector<LineFinder> finders;
-    for (Turn turn : TURNS) {
-        finders.emplace_back(page, turn);
-        sampleGaps(page, finders.back().find(GapLimits(page.fonts.size(), BlankWidths::MAX_GAP)), blanks);
-    }
-    GapLimits limits;
+    for (Turn turn : TURNS)
+        sampleGaps(page, LineFinder(page, words, turn).find(wide), blanks);
+    Spacing spacing{{}, MIN_WORD_GAP * (1 + rules.spaceAdjustPerc / 100.0), rules.maxLineDistance};
     for (std::size_t font = 0; font < page.fonts.size(); ++font)
-        limits.push_back(rules.maxSpaces * blanks.of(font));
-    double const minWordGap = MIN_WORD_GAP * (1 + rules.spaceAdjustPerc / 100.0);
+        spacing.gapLimits.push_back(rules.maxSpaces * blanks.of(font));
+    return spacing;
+}
 
+std::vector<Line> findLines(Page const& page, std::vector<std::size_t> const& words, Spacing const& spacing) {
     std::vector<Line> lines;
-    for (std::size_t i = 0; i < finders.size(); ++i)
-        for (OpenLine const& open : finders[i].find(limits))
-            lines.push_back(closed(page, open, TURNS[i], minWordGap));
+    for (Turn turn : TURNS)
+        for (OpenLine const& open : LineFinder(page, words, turn).find(spacing.gapLimits))
+            lines.push_back(closed(page, open, turn, spacing.minWordGap));
     return lines;
 }
 

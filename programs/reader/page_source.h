@@ -2,8 +2,10 @@
 // What a kind of document must be able to do; one source file for each kind.
 
 #include "programs/reader/page.h"
+#include "programs/reader/page_check.h"
 
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace Reader {
@@ -17,6 +19,8 @@ public:
     virtual Page readPage(int number) = 0;
     virtual std::string singlePagePdf(int number) = 0;
     virtual std::string renderPage(int number, double dotsPerInch) = 0;
+    /// Nothing where a page has no other picture than the PDF that is made of it.
+    virtual std::optional<Picture> drawPage(int number, double dotsPerInch) = 0;
 };
 
 // `where` names the document in messages.

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
+#include "programs/reader/page_parts.h"
 
 #include <qpdf/Buffer.hh>
 #include <qpdf/QPDF.hh>
@@ -94,18 +95,27 @@ std::string PdfPageWriter::write(int number, int pageCount) {
         if (parsed_->pages.size() != static_cast<std::size_t>(pageCount))
             throw std::runtime_error("Some pages are lost.");
         QPDFPageObjectHelper page = parsed_->pages.at(static_cast<std::size_t>(number - 1));
-        // Documents often list the fonts and pictures of all pages at each of them.
-        page.removeUnreferencedResources();
+        dropUnusedResources(page);
+        separateFormFields(page);
 
         QPDF single;
         single.setSuppressWarnings(true);
         single.emptyPDF();
-        QPDFPageDocumentHelper(single).addPage(page, false);
+        QPDFPageDocumentHelper added(single);
+        added.addPage(page, false);
+        carryCatalog(parsed_->pdf, single, added.getAllPages().at(0));
         return bytesOf(single);
+    } catch (QPDFExc const& failure) {
+        if (failure.getErrorCode() == qpdf_e_password)
+            throw Base::Error(where_ + ": is a PDF whose encryption is not known; save it without one");
+        failToWrite(number);
     } catch (std::exception const&) {
-        throw Base::Error(where_ + ": page " + std::to_string(number) +
-                          " is damaged; export the document again");
+        failToWrite(number);
     }
+}
+
+void PdfPageWriter::failToWrite(int number) const {
+    throw Base::Error(where_ + ": page " + std::to_string(number) + " is damaged; export the document again");
 }
 
 std::string pdfOf(ShownPage const& page) {

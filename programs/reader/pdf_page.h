@@ -24,6 +24,8 @@ public:
 private:
     struct Parsed;
 
+    [[noreturn]] void failToWrite(int number) const;
+
     std::string_view pdf_;
     std::string where_;
     std::unique_ptr<Parsed> parsed_;

@@ -144,6 +144,9 @@ std::string pngOf(poppler::image const& image) {
     return bytes;
 }
 
+/// Of a PDF that cannot be opened: whether it is because of its encryption.
+bool saysEncrypted(std::string_view bytes) { return bytes.find("/Encrypt") != std::string_view::npos; }
+
 class PdfSource : public PageSource {
 public:
     PdfSource(std::string bytes, std::string where)
@@ -156,7 +159,9 @@ public:
         if (document_ && document_->is_locked())
             throw Base::Error(where_ + ": is an encrypted PDF; save it without a password");
         if (!document_ || document_->pages() < 1)
-            throw Base::Error(where_ + ": is a damaged PDF; export the document again");
+            throw Base::Error(where_ + (saysEncrypted(bytes_)
+                                            ? ": is a PDF whose encryption is not known; save it without one"
+                                            : ": is a damaged PDF; export the document again"));
     }
 
     int pageCount() const override { return document_->pages(); }
@@ -186,6 +191,20 @@ public:
     }
 
     std::string renderPage(int number, double dotsPerInch) override {
+        return pngOf(draw(number, dotsPerInch));
+    }
+
+    std::optional<Picture> drawPage(int number, double dotsPerInch) override {
+        poppler::image const image = draw(number, dotsPerInch);
+        Picture picture{image.width(), image.height(), {}};
+        for (int row = 0; row < image.height(); ++row)
+            picture.points.append(image.const_data() + row * image.bytes_per_row(),
+                                  3 * static_cast<std::size_t>(image.width()));
+        return picture;
+    }
+
+private:
+    poppler::image draw(int number, double dotsPerInch) const {
         std::unique_ptr<poppler::page> const page = popplerPage(number);
         poppler::rectf const sheet = page->page_rect();
         double const scale = dotsPerInch / 72;
@@ -201,10 +220,9 @@ public:
         if (!image.is_valid())
             throw Base::Error(where_ + ": page " + std::to_string(number) +
                               " cannot be drawn; export the document again");
-        return pngOf(image);
+        return image;
     }
 
-private:
     std::unique_ptr<poppler::page> popplerPage(int number) const {
         std::unique_ptr<poppler::page> page(document_->create_page(number - 1));
         if (!page)

@@ -25,15 +25,16 @@ void unite(std::optional<Box>& sum, Box const& box) { sum = sum ? sum->united(bo
 
 ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location) {
     ZoneText zone;
-    for (Block const& block : layout.blocks)
-        zone.addBlock(page, layout, block, &location);
+    Layout const inside = layOutInside(page, layout.spacing, location);
+    for (Block const& block : inside.blocks)
+        zone.addBlock(page, inside, block);
     return zone;
 }
 
 ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) {
     ZoneText zone;
     if (Block const* const block = layout.nearestBlock(point))
-        zone.addBlock(page, layout, *block, nullptr);
+        zone.addBlock(page, layout, *block);
     return zone;
 }
 
@@ -52,41 +53,23 @@ ZoneText ZoneText::given(std::string const& text) {
     return zone;
 }
 
-void ZoneText::addBlock(Page const& page, Layout const& layout, Block const& block, Box const* location) {
-    std::optional<Box> seen;
+void ZoneText::addBlock(Page const& page, Layout const& layout, Block const& block) {
     for (std::size_t i = block.firstLine; i < block.endLine; ++i) {
-        bool const isFirst = lines_.empty();
-        std::size_t const before = text_.size();
-        if (!isFirst)
+        if (!lines_.empty())
             text_ += '\n';
-        TextLine line = lineOf(page, layout.lines[i], location);
-        if (line.pieces.empty()) {
-            text_.resize(before);
-            continue;
-        }
-        for (Piece const& piece : line.pieces)
-            unite(seen, piece.word->box);
-        lines_.push_back(std::move(line));
+        lines_.push_back(lineOf(page, layout.lines[i]));
     }
-    if (!seen)
-        return;
-    box_ = blocks_.empty() ? *seen : box_.united(*seen);
-    blocks_.push_back(*seen);
+    box_ = blocks_.empty() ? block.box : box_.united(block.box);
+    blocks_.push_back(block.box);
 }
 
 /// Adds the line's words to the text and tells where they are.
-ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line, Box const* location) {
+ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line) {
     TextLine result;
     std::size_t lettersLeft = MAX_LINE_LENGTH;
-    bool skipped = false;
     for (LineWord const& lineWord : line.words) {
         Word const& word = page.words[lineWord.word];
-        if (location && !location->contains(word.box.centre())) {
-            skipped = true;
-            continue;
-        }
-        bool const blank = !result.pieces.empty() && (lineWord.blankBefore || skipped);
-        skipped = false;
+        bool const blank = !result.pieces.empty() && lineWord.blankBefore;
         if (lettersLeft <= (blank ? 1U : 0U))
             break;
         if (blank) {

@@ -26,7 +26,7 @@ struct Stretch {
 /// Holds references to the page, which must live longer.
 class ZoneText {
 public:
-    /// The words whose centre lies in the location; a line of the page that has none of them leaves nothing.
+    /// The words whose centre lies in the location, laid out without the others.
     static ZoneText inside(Page const& page, Layout const& layout, Box const& location);
     /// The block nearest to the point.
     static ZoneText nearest(Page const& page, Layout const& layout, Point point);
@@ -66,8 +66,8 @@ private:
         std::size_t textEnd = 0;
     };
 
-    void addBlock(Page const& page, Layout const& layout, Block const& block, Box const* location);
-    TextLine lineOf(Page const& page, Line const& line, Box const* location);
+    void addBlock(Page const& page, Layout const& layout, Block const& block);
+    TextLine lineOf(Page const& page, Line const& line);
     LineRange linesAt(std::size_t offset, std::size_t length) const;
 
     std::string text_;

@@ -7,6 +7,7 @@
 
 #include <cstdlib>
 #include <fstream>
+#include <map>
 #include <set>
 #include <unistd.h>
 
@@ -66,7 +67,7 @@ TEST_F(Documents, ThatCannotBeOpenedSayWhyAndWhatToDo) {
     EXPECT_EQ(complaint("/dev/null"), "is no ordinary file; save it to one");
     EXPECT_EQ(complaint(file("empty.pdf", "")), "is empty; export the document again");
     EXPECT_EQ(complaint(file("picture.pdf", std::string("GIF89a\0\0", 8))),
-              "is neither a PDF nor text; export the document as PDF");
+              "is named .pdf but seems to be a picture; get the document again");
     EXPECT_EQ(complaint(file("damaged.pdf", "%PDF-1.5\nand nothing more")),
               "is a damaged PDF; export the document again");
     EXPECT_EQ(complaint(file("a.txt", "x") / "b.txt"), "there is no such file; check the name");
@@ -221,6 +222,34 @@ TEST(TextFiles, WithLettersThatNoFontHasSaySo) {
     } catch (Base::Error const& error) {
         EXPECT_STREQ(error.what(), "a.txt: page 2: no font for \"中文\"; export the document as PDF");
     }
+}
+
+TEST(FilesNamedPdf, ThatAreNoneSayWhatTheySeemToBe) {
+    auto const complaint = [](std::string bytes, char const* name) -> std::string {
+        try {
+            openDocument(std::move(bytes), name);
+        } catch (Base::Error const& error) {
+            return error.what();
+        }
+        return "nothing";
+    };
+    std::map<std::string, std::string> const kinds{
+        {"<!DOCTYPE HTML><title>404</title>", "a web page"},
+        {"\xEF\xBB\xBF\r\n  <html lang=en>", "a web page"},
+        {"<?xml version=\"1.0\"?>", "an XML document"},
+        {"{\\rtf1", "a word processor's document"},
+        {"PK\3\4abc", "a word processor's document or another ZIP archive"},
+        {"\x89PNG\r\n", "a picture"},
+        {"%!PS-Adobe", "PostScript"},
+        {"\x1F\x8B", "a compressed file"},
+        {"Not found", "plain text"},
+        {std::string("\0x", 2), "something else"},
+    };
+    for (auto const& [bytes, kind] : kinds)
+        for (char const* const name : {"a.pdf", "a.PDF"})
+            EXPECT_EQ(complaint(bytes, name), std::string(name) + ": is named .pdf but seems to be " + kind +
+                                                  "; get the document again");
+    EXPECT_EQ(complaint("<!DOCTYPE HTML><title>404</title>", "a.txt"), "nothing");
 }
 
 TEST(Pdfs, GiveTheSameSinglePageEveryTime) {

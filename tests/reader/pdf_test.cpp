@@ -179,6 +179,16 @@ TEST(EncryptedPdfs, ThatOpenWithoutAPasswordAreReadAndWritten) {
     EXPECT_THAT(textsOf(single.page(1)), ElementsAre("Herrn"));
 }
 
+TEST(EncryptedPdfs, InAnUnknownWayAreNotCalledDamaged) {
+    std::string pdf = PdfMaker().page(shown(72, 770, "Herrn")).encrypted("");
+    pdf.replace(pdf.find("/Filter /Standard"), 17, "/Filter /Novelty ");
+    EXPECT_EQ(complaint([&] { openDocument(pdf, "a.pdf"); }),
+              "a.pdf: is an encrypted PDF; save it without a password");
+    EXPECT_EQ(
+        complaint([&] { openDocument(std::string("%PDF-1.5\ntrailer << /Encrypt 5 0 R >>"), "a.pdf"); }),
+        "a.pdf: is a PDF whose encryption is not known; save it without one");
+}
+
 TEST(DamagedPdfs, WithoutPagesSaySo) {
     PdfMaker maker;
     EXPECT_EQ(complaint([&] { documentOf(maker); }), "made.pdf: is a damaged PDF; export the document again");

@@ -33,6 +33,24 @@ TEST_F(Address, LinesAreJoinedByLineFeeds) {
     EXPECT_EQ(zone().box(), (Box{2500, 5600, 6000, 7040}));
 }
 
+TEST(ZoneLocations, KeepTextOutsideFromChangingTheOrderInside) {
+    Typesetter alone;
+    alone.line(2500, 6000, "Lena Brandt");
+    alone.line(2500, 6480, "3 Orchard Close");
+    alone.line(2500, 6960, "Whitstable");
+    Typesetter crowded = alone;
+    // A heading that reaches down from above, and a column that begins higher and stands close.
+    crowded.line(2500, 5520, "To whom it may concern, at the place of the customer");
+    crowded.line(6200, 6100, "Date: today");
+    crowded.line(6200, 6580, "No: 5");
+    Box const location{2000, 5600, 6100, 7200};
+    auto const text = [&](Typesetter const& set) {
+        return ZoneText::inside(set.page, layOut(set.page), location).text();
+    };
+    EXPECT_EQ(text(alone), "Lena Brandt\n3 Orchard Close\nWhitstable");
+    EXPECT_EQ(text(crowded), text(alone));
+}
+
 TEST_F(Address, AStretchIsAsWideAsItsWidestLine) {
     Stretch const all = zone().stretch(0, zone().text().size());
     EXPECT_EQ(all.width, 17 * Typesetter::LETTER + 100);

@@ -32,6 +32,7 @@ struct Options {
     ServiceOptions service;
     bool json = false;
     WorkerOptions reading;
+    std::size_t checkEvery = 1;
 };
 
 int report(Dispatch const& dispatch, Options const& options, Terminal const& terminal) {
@@ -74,7 +75,8 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.reading.workers(), {.pages = Along::Pages::Yes}, progress,
+    readBatch(options.files, settings, options.reading.workers(),
+              {.pages = Along::Pages::Yes, .checkEvery = options.checkEvery}, progress,
               [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -88,7 +90,7 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
-    splitBatch(plan.documents(), options.reading.workers(), progress,
+    splitBatch(plan.documents(), options.reading.workers(), options.checkEvery, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -138,6 +140,9 @@ void addMailCommand(Base::Command const& app, Task& task) {
     mail.addFlag("--upload", options->upload, "Has the service hand the mailings on at once").needs(send);
     addServiceOptions(mail, options->service);
     addBatchOptions(mail, *options);
+    mail.addCount("--check-every", options->checkEvery,
+                  "Holds each N-th page that is written against the document's; 1 is every page")
+        .showDefault();
     mail.whenNamed([=, &task] {
         if (options->files.empty() && options->plan.empty())
             throw Base::UsageError("FILE or --plan is required");

@@ -148,11 +148,11 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
         [&](std::size_t index) { return files[index]; }, take);
 }
 
-void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, BatchWatcher& watcher,
-                std::function<void(std::size_t, ReadResult)> const& take) {
+void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, std::size_t checkEvery,
+                BatchWatcher& watcher, std::function<void(std::size_t, ReadResult)> const& take) {
     runBatch(
         documents.size(), workers, watcher,
-        [&](std::size_t index) { return splitDocument(documents[index]); },
+        [&](std::size_t index) { return splitDocument(documents[index], checkEvery); },
         [&](std::size_t index) { return documents[index].file.string(); }, take);
 }
 

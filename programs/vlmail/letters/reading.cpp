@@ -9,9 +9,8 @@
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/letters/node_settings.h"
+#include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
-
-#include "vlservice/pack/page_saver.h"
 
 #include <utility>
 
@@ -31,6 +30,7 @@ constexpr char const* READY_KEY = "production_ready";
 constexpr char const* MESSAGE_KEY = "message";
 constexpr char const* MISSING_KEY = "missing";
 constexpr char const* WARNINGS_KEY = "warnings";
+constexpr char const* DIFFERING_KEY = "differing_pages";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
 constexpr char const* TRACE_KEY = "trace";
 
@@ -63,6 +63,8 @@ json::Object toJson(LetterReading const& letter) {
                         {READY_KEY, ready},
                         {MESSAGE_KEY, message},
                         {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
+    if (!letter.differingPages.empty())
+        object.set(DIFFERING_KEY, toJsonArray(letter.differingPages));
     setUnlessEmpty(object, MISSING_KEY, letter.missing);
     setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
     return object;
@@ -75,14 +77,21 @@ json::Value lettersToJson(std::vector<LetterReading> const& letters) {
     return array;
 }
 
+std::vector<int> numbersIn(json::Value const& array) {
+    std::vector<int> numbers;
+    for (json::Value const& number : array.toArray())
+        numbers.push_back(static_cast<int>(number.toInt()));
+    return numbers;
+}
+
 LetterReading letterFrom(json::Object const& object) {
-    LetterReading letter{{},
+    LetterReading letter{numbersIn(object.get(PAGES_KEY)),
                          Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()),
                          textsOf(object.get(MISSING_KEY)),
                          {},
                          textsOf(object.get(WARNINGS_KEY))};
-    for (json::Value const& page : object.get(PAGES_KEY).toArray())
-        letter.pages.push_back(static_cast<int>(page.toInt()));
+    if (json::Value const differing = object.get(DIFFERING_KEY))
+        letter.differingPages = numbersIn(differing);
     return letter;
 }
 
@@ -130,20 +139,35 @@ std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPre
     return letters;
 }
 
-std::vector<PageBlob> blobsOf(Reader::Document& document, LetterReading const& letter) {
-    std::vector<PageBlob> blobs;
-    if (!letter.whyNot().empty())
-        return blobs;
-    for (int const page : letter.pages) {
-        std::string const pdf = document.singlePagePdf(page);
-        blobs.push_back({page, Mailing::compressed(pdf)});
-    }
-    return blobs;
-}
+/// Writes the pages of letters that can go out.
+class PageWriting {
+public:
+    PageWriting(Reader::Document& document, std::size_t checkEvery)
+        : document_(document), checkEvery_(checkEvery) {}
 
-void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document) {
+    void addBlobs(LetterReading& letter) {
+        if (!letter.whyNot().empty())
+            return;
+        for (int const page : letter.pages) {
+            std::string const pdf = document_.singlePagePdf(page);
+            if (written_++ % checkEvery_ == 0 && !document_.showsTheSame(page, pdf))
+                letter.differingPages.push_back(page);
+            letter.blobs.push_back({page, Mailing::compressed(pdf)});
+        }
+        if (!letter.differingPages.empty())
+            letter.blobs.clear();
+    }
+
+private:
+    Reader::Document& document_;
+    std::size_t checkEvery_;
+    std::size_t written_ = 0;
+};
+
+void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document, std::size_t checkEvery) {
+    PageWriting writing(document, checkEvery);
     for (LetterReading& letter : letters)
-        letter.blobs = blobsOf(document, letter);
+        writing.addBlobs(letter);
 }
 
 void readLetters(ReadResult& result, Reader::Document& document, PresetIndex const& presets,
@@ -160,7 +184,7 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, trace, place});
     if (along.pages == Along::Pages::Yes)
-        addBlobs(*reading.letters, document);
+        addBlobs(*reading.letters, document, along.checkEvery);
 }
 
 void fail(ReadResult& result, std::exception const& failure) {
@@ -180,6 +204,9 @@ json::Array toJsonArray(std::vector<int> const& numbers) {
 }
 
 std::string LetterReading::whyNot() const {
+    if (!differingPages.empty())
+        return "page-differs: " + pagesInWords(differingPages) +
+               " would not look like the document's; print it to a new PDF";
     std::string message;
     if (isProductionReady(message))
         return {};
@@ -237,7 +264,7 @@ ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSe
     return result;
 }
 
-ReadResult splitDocument(DecidedDocument decided) {
+ReadResult splitDocument(DecidedDocument decided, std::size_t checkEvery) {
     ReadResult result{std::move(decided.reading)};
     if (!result.reading.letters)
         return result;
@@ -247,7 +274,7 @@ ReadResult splitDocument(DecidedDocument decided) {
         if (result.sha256 != decided.sha256)
             throw Base::Error('"' + decided.file.string() + "\" has changed; make the plan again");
         Reader::Document document = Reader::openDocument(std::move(bytes), decided.file);
-        addBlobs(*result.reading.letters, document);
+        addBlobs(*result.reading.letters, document, checkEvery);
     } catch (std::exception const& failure) {
         fail(result, failure);
     }

@@ -39,6 +39,8 @@ struct LetterReading {
     std::vector<PageBlob> blobs = {};
     /// What a person should know of the values, one line each.
     std::vector<std::string> warnings = {};
+    /// Those of its pages that would not look like the document's. They keep it from going out.
+    std::vector<int> differingPages = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -97,6 +99,8 @@ struct Along {
     enum class Pages : bool { No, Yes };
 
     Pages pages = Pages::No;
+    /// Of the pages that are written, the first and every so many behind it are held against the document's.
+    std::size_t checkEvery = 1;
     /// Called with the document's name alone, before it is opened.
     std::function<void(ReadResult&, Cfg::Presets const&)> beforeReading = {};
     /// Called when its letters are there; an attachment has none.
@@ -118,6 +122,6 @@ struct DecidedDocument {
 
 /// The pages of those of its letters that can go out. A document that is not the one with that digest any
 /// more is a failure, said in the reading's `error`.
-ReadResult splitDocument(DecidedDocument decided);
+ReadResult splitDocument(DecidedDocument decided, std::size_t checkEvery);
 
 } // namespace VlMail

@@ -58,6 +58,20 @@ TEST_F(Readings, HoldNoPagesUnlessAsked) {
     EXPECT_THAT(result.reading.letters->at(0).blobs, IsEmpty());
 }
 
+TEST_F(Readings, HoldBackALetterWhosePagesDiffer) {
+    DocumentReading reading = read({}).reading;
+    LetterReading& letter = reading.letters.value().at(0);
+    EXPECT_EQ(letter.whyNot(), "");
+    letter.differingPages = {2};
+    EXPECT_EQ(letter.whyNot(),
+              "page-differs: page 2 would not look like the document's; print it to a new PDF");
+    letter.differingPages = {1, 2};
+    DocumentReading const handedOver = DocumentReading::fromJson(reading.toJson());
+    EXPECT_EQ(handedOver.letters.value().at(0).whyNot(),
+              "page-differs: pages 1-2 would not look like the document's; print it to a new PDF");
+    EXPECT_EQ(handedOver.letters->at(1).differingPages, std::vector<int>());
+}
+
 TEST_F(Readings, TakeWhatComesAlong) {
     Along along;
     along.beforeReading = [](ReadResult& result, Cfg::Presets const&) {

@@ -1,0 +1,146 @@
+// Pages that stand alone look as they did in their documents.
+#include "programs/reader/document.h"
+
+#include "tests/support/raw_pdf.h"
+
+#include <gmock/gmock.h>
+
+namespace Reader {
+namespace {
+
+using VLServiceTest::onePage;
+using VLServiceTest::RawPdf;
+
+constexpr char const* FONT = "/Font << /F 4 0 R >>";
+constexpr char const* BOX = "/BBox [0 0 595 842]";
+
+std::string shown(int y, std::string const& text, std::string const& font = "F") {
+    return "BT /" + font + " 10 Tf 72 " + std::to_string(y) + " Td (" + text + ") Tj ET ";
+}
+
+std::string pictureOf(std::string const& pdf) { return openDocument(pdf, "a.pdf").renderPage(1, 72); }
+
+std::string writtenAlone(std::string const& pdf) { return openDocument(pdf, "a.pdf").singlePagePdf(1); }
+
+/// The page shows something, and the same when it stands alone.
+void expectKept(RawPdf const& pdf) {
+    std::string const picture = pictureOf(pdf.bytes());
+    EXPECT_NE(picture, pictureOf(onePage("").bytes()));
+    EXPECT_EQ(pictureOf(writtenAlone(pdf.bytes())), picture);
+}
+
+TEST(SinglePages, HideTheLayersThatAreHidden) {
+    RawPdf pdf = onePage(shown(700, "Seen") + "/OC /L BDC " + shown(600, "Hidden") + "EMC",
+                         "/Properties << /L 6 0 R >>", "",
+                         "/OCProperties << /OCGs [6 0 R] /D << /OFF [6 0 R] /Order [6 0 R] >> >>");
+    pdf.object(6, "<< /Type /OCG /Name (Notes) >>");
+    expectKept(pdf);
+    EXPECT_EQ(pictureOf(pdf.bytes()), pictureOf(onePage(shown(700, "Seen")).bytes()));
+}
+
+RawPdf withField(std::string const& fieldKeys, std::string const& formKeys) {
+    RawPdf pdf = onePage(shown(700, "Name:"), "", "/Annots [7 0 R]",
+                         "/AcroForm << /Fields [7 0 R] /DR << /Font << /Helv 9 0 R >> >> "
+                         "/DA (/Helv 0 Tf 0 g) " +
+                             formKeys + " >>");
+    pdf.object(7, "<< /Type /Annot /Subtype /Widget /FT /Tx /T (name) /V (Lena) /F 4 /Rect [72 640 272 660] "
+                  "/DA (/Helv 10 Tf 0 g) /P 3 0 R " +
+                      fieldKeys + " >>");
+    pdf.object(9, "<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica /Encoding /WinAnsiEncoding >>");
+    return pdf;
+}
+
+TEST(SinglePages, ShowFilledFormFields) {
+    RawPdf pdf = withField("/AP << /N 8 0 R >>", "");
+    pdf.stream(8, "/Type /XObject /Subtype /Form /BBox [0 0 200 20] /Resources << /Font << /Helv 9 0 R >> >>",
+               "/Tx BMC BT /Helv 10 Tf 2 5 Td (Lena) Tj ET EMC");
+    expectKept(pdf);
+    EXPECT_NE(pictureOf(pdf.bytes()), pictureOf(onePage(shown(700, "Name:")).bytes()));
+}
+
+TEST(SinglePages, ShowFormFieldsThatTheReaderHasToDraw) {
+    RawPdf const pdf = withField("", "/NeedAppearances true");
+    expectKept(pdf);
+    EXPECT_NE(pictureOf(pdf.bytes()), pictureOf(onePage(shown(700, "Name:")).bytes()));
+}
+
+TEST(SinglePages, BringNoFieldsOfOtherPagesAlong) {
+    RawPdf pdf = onePage(shown(700, "Name:"), "", "/Annots [7 0 R]", "/AcroForm << /Fields [10 0 R] >>");
+    pdf.object(2, "<< /Type /Pages /Kids [3 0 R 12 0 R] /Count 2 >>");
+    pdf.object(10, "<< /FT /Tx /T (name) /V (Lena) /DA (/Helv 10 Tf) /Kids [7 0 R 11 0 R] >>");
+    std::string const widget =
+        "<< /Type /Annot /Subtype /Widget /Parent 10 0 R /F 4 /Rect [72 640 272 660] /AP << /N ";
+    pdf.object(7, widget + "8 0 R >> >>").object(11, widget + "13 0 R >> >>");
+    pdf.object(12, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Annots [11 0 R] >>");
+    std::string const form =
+        "/Type /XObject /Subtype /Form /BBox [0 0 200 20] /Resources << " + std::string(FONT) + " >>";
+    pdf.stream(8, form, "BT /F 10 Tf 2 5 Td (Lena) Tj ET");
+    std::string noise;
+    for (unsigned state = 1; noise.size() < 100'000; state = state * 1664525 + 1013904223)
+        noise += static_cast<char>('!' + (state >> 24) % 90);
+    pdf.stream(13, form, "% " + noise);
+    expectKept(pdf);
+    EXPECT_LT(writtenAlone(pdf.bytes()).size(), 5000U);
+}
+
+TEST(SinglePages, KeepTheFontsThatFormsTakeFromThem) {
+    RawPdf pdf = onePage("/X6 Do", "/XObject << /X6 6 0 R >>");
+    pdf.stream(
+        6, std::string("/Type /XObject /Subtype /Form ") + BOX + " /Resources << /XObject << /X7 7 0 R >> >>",
+        "/X7 Do");
+    pdf.stream(7, std::string("/Type /XObject /Subtype /Form ") + BOX, shown(700, "Inside"));
+    expectKept(pdf);
+}
+
+TEST(SinglePages, KeepTheFontsThatTypeThreeFontsTakeFromThem) {
+    RawPdf pdf = onePage("BT /T3 20 Tf 72 700 Td (aaa) Tj ET");
+    pdf.object(3, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 5 0 R /Resources << /Font "
+                  "<< /F 4 0 R /T3 6 0 R >> >> >>");
+    pdf.object(6, "<< /Type /Font /Subtype /Type3 /FontBBox [0 0 10 10] /FontMatrix [0.1 0 0 0.1 0 0] "
+                  "/CharProcs << /a 7 0 R >> /Encoding << /Type /Encoding /Differences [97 /a] >> "
+                  "/FirstChar 97 /LastChar 97 /Widths [10] >>");
+    pdf.stream(7, "", "10 0 d0 BT /F 10 Tf (Q) Tj ET");
+    expectKept(pdf);
+}
+
+TEST(SinglePages, ShowTheLastOfIncrementalUpdates) {
+    std::string const first = onePage(shown(700, "First")).bytes();
+    RawPdf update;
+    update.stream(6, "", shown(600, "Second"));
+    update.object(3,
+                  "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents [5 0 R 6 0 R] /Resources "
+                  "<< /Font << /F 4 0 R >> >> >>");
+    std::string const both = update.behind(first);
+    RawPdf again;
+    again.stream(5, "", shown(650, "Third"));
+    std::string const all = again.behind(both);
+    EXPECT_NE(pictureOf(all), pictureOf(both));
+    EXPECT_EQ(pictureOf(writtenAlone(all)), pictureOf(all));
+    EXPECT_EQ(pictureOf(all), pictureOf(onePage(shown(650, "Third") + shown(600, "Second")).bytes()));
+}
+
+TEST(PageChecks, TakeAPageThatShowsTheSame) {
+    Document document = openDocument(onePage(shown(700, "Herrn")).bytes(), "a.pdf");
+    EXPECT_TRUE(document.showsTheSame(1, document.singlePagePdf(1)));
+    Document text = openDocument(std::string("Herrn\nΩmega"), "a.txt");
+    EXPECT_TRUE(text.showsTheSame(1, text.singlePagePdf(1)));
+}
+
+TEST(PageChecks, NoticeWordsAndPicturesThatDiffer) {
+    std::string const page = shown(700, "Herrn Olaf");
+    Document document = openDocument(onePage(page).bytes(), "a.pdf");
+    for (std::string const& other :
+         {std::string(), shown(700, "Herrn Olav"), shown(698, "Herrn Olaf"), page + shown(600, "Copy"),
+          page + "100 100 20 20 re f", page + "0 0 0 RG 72 690 m 272 690 l S"})
+        EXPECT_FALSE(document.showsTheSame(1, onePage(other).bytes())) << other;
+    EXPECT_FALSE(document.showsTheSame(1, "%PDF-1.4 nothing"));
+}
+
+TEST(PageChecks, OverlookWhatNobodySees) {
+    std::string const page = shown(700, "Herrn Olaf");
+    Document document = openDocument(onePage(page).bytes(), "a.pdf");
+    EXPECT_TRUE(document.showsTheSame(1, onePage("1 g 0 0 10 10 re f 0 g " + page).bytes()));
+}
+
+} // namespace
+} // namespace Reader
