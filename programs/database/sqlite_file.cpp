@@ -7,8 +7,10 @@
 
 #include <cerrno>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -64,6 +66,13 @@ SQLite::Database openAndMigrate(fs::path const& file, DatabaseKind const& kind, 
     return database;
 }
 
+/// Gives a file its name unless there is one of that name. Some file systems know no links, others no such
+/// renaming.
+bool giveName(char const* temporary, char const* name) {
+    return ::link(temporary, name) == 0 || errno == EEXIST ||
+           ::renameat2(AT_FDCWD, temporary, AT_FDCWD, name, RENAME_NOREPLACE) == 0 || errno == EEXIST;
+}
+
 /// Makes a file with its schema under another name, and then gives it its own, unless somebody was faster.
 void create(fs::path const& file, DatabaseKind const& kind) {
     std::string temporary = file.string() + ".XXXXXX.part";
@@ -78,7 +87,7 @@ void create(fs::path const& file, DatabaseKind const& kind) {
         remove();
         throw;
     }
-    if (::link(temporary.c_str(), file.c_str()) != 0 && errno != EEXIST) {
+    if (!giveName(temporary.c_str(), file.c_str())) {
         int const error = errno;
         remove();
         throw DatabaseError("cannot open " + theFile(kind, file) + ": " + std::strerror(error));

@@ -56,6 +56,21 @@ TEST(TreeNodeReading, FollowsTheTreeDown) {
     EXPECT_EQ(print(root.serialize()), text);
 }
 
+TEST(TreeNodeReading, FollowsTheTreeAsDeepAsAnAnswerCanBe) {
+    constexpr int DEPTH = 1000;
+    std::string text;
+    for (int i = 0; i < DEPTH; ++i)
+        text += R"({"id":"x","children":[)";
+    text += "{}";
+    for (int i = 0; i < DEPTH; ++i)
+        text += "]}";
+    TreeNode const root(parse(text));
+    int depth = 0;
+    for (TreeNode const* node = &root; !node->children.empty(); node = &node->children.front())
+        ++depth;
+    EXPECT_EQ(depth, DEPTH);
+}
+
 TEST(ServiceSettingsReading, LeavesOutWhatHasAWrongType) {
     ServiceSettings const settings(
         parse(R"({"upload_folder":"/up","tariff":{"currency":"EUR"},"disabled":["a=x"],"suspended":2})"));

@@ -14,6 +14,7 @@
 #include <cstdlib>
 #include <iostream>
 #include <ostream>
+#include <thread>
 #include <unistd.h>
 #include <utility>
 
@@ -23,6 +24,7 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr char const* DEFAULT_PACK_DATABASE = "packs.db";
+constexpr std::chrono::milliseconds PAUSE{500};
 
 fs::path personalFolder(char const* variable, char const* belowHome) {
     char const* const folder = std::getenv(variable);
@@ -142,6 +144,8 @@ Protocol::JobReport awaitJob(Channel::Client& service, std::string const& packId
             throw Base::Error("the service has no job of pack " + packId + "; send it again");
         if (!waitsForPages(answer.jobs.front()) || left <= 0)
             return answer.jobs.front();
+        // A service that holds no answers would be asked without a pause.
+        std::this_thread::sleep_for(std::min(PAUSE, std::chrono::milliseconds(left)));
     }
 }
 
