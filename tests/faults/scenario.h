@@ -17,6 +17,9 @@ struct Command {
     std::function<void(std::filesystem::path const& folder)> prepare;
 };
 
+/// For the names of tests.
+inline void PrintTo(Command const& command, std::ostream* out) { *out << command.name; }
+
 /// The commands of vlmail that need no service.
 std::vector<Command> const& commands();
 

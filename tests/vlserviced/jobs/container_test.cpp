@@ -69,8 +69,7 @@ TEST_F(Container, IsNotWrittenWithoutMetadata) {
 TEST_F(Container, IsNotWrittenOfNamesThatItsIndexCannotHold) {
     storePack(file_, "p1");
     run("UPDATE pages SET page = char(1) WHERE position = 2");
-    EXPECT_EQ(writingFailure("p1"),
-              "the container " + target_.string() + " could not be written; the log says why");
+    EXPECT_EQ(writingFailure("p1"), "page \"\x01\" of \"two.pdf\" has a name that a container cannot hold");
     EXPECT_EQ(filesInOutbox(), 0);
 }
 
