@@ -12,7 +12,6 @@
 
 using namespace testing;
 using namespace std::string_literals;
-using Channel::Frame;
 using Channel::FrameDecoder;
 using Channel::Kind;
 
