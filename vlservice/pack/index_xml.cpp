@@ -72,8 +72,10 @@ std::unique_ptr<TiXmlElement> makeMailing(std::string const& packId, std::deque<
 std::unique_ptr<TiXmlDocument> parseTag(std::string tag, char const* name) {
     if (tag.size() < 2 || tag.back() != '>')
         return nullptr;
-    if (tag[tag.size() - 2] != '/')
-        tag.insert(tag.size() - 1, "/");
+    tag.pop_back();
+    if (tag.back() != '/')
+        tag += '/';
+    tag += '>';
     if (isNestedDeeperThan(1, tag))
         return nullptr;
     auto document = std::make_unique<TiXmlDocument>();
