@@ -1,5 +1,6 @@
 # What nearly every source includes, compiled once. Only headers of others are in here: a header of the project has to
-# include what it needs, and a change in one does not rebuild everything.
+# include what it needs, and a change in one does not rebuild everything. Not for optimised builds (the preset "release"):
+# inlined from a precompiled header, what is a system's is warned about like ours.
 
 set(VLSERVICE_COMMON_HEADERS
     <algorithm> <chrono> <filesystem> <functional> <map> <memory> <optional> <ostream> <sstream> <stdexcept> <string>

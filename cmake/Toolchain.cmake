@@ -35,7 +35,6 @@ if(VLSERVICE_SANITIZE AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     target_compile_options(vlservice_warnings INTERFACE -Wno-maybe-uninitialized)
 endif()
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
-    # Optimising, g++ 12 takes `"literal" + text` for a copy between overlapping blocks, and an insertion into a text for
-    # one of more bytes than there can be.
-    target_compile_options(vlservice_warnings INTERFACE -Wno-restrict -Wno-stringop-overflow)
+    # Optimising, g++ 12 takes `"literal" + text` for a copy between overlapping blocks.
+    target_compile_options(vlservice_warnings INTERFACE -Wno-restrict)
 endif()
