@@ -102,6 +102,17 @@ Anchors anchorsOf(std::string_view pattern) {
     return anchors;
 }
 
+std::string withAnyBlanks(std::string_view pattern) {
+    std::string result;
+    for (std::size_t i = 0; i < pattern.size(); ++i) {
+        if (pattern[i] != ' ')
+            result += pattern[i];
+        else if (i + 1 == pattern.size() || pattern[i + 1] != ' ')
+            result += "\\h*";
+    }
+    return result;
+}
+
 std::string withWholeAsValue(std::string_view pattern) {
     std::string inner(pattern);
     for (std::string const& group : valueGroups())

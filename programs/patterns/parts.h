@@ -27,6 +27,9 @@ struct Anchors {
 };
 Anchors anchorsOf(std::string_view pattern);
 
+/// The pattern with each run of blanks as any number of them.
+std::string withAnyBlanks(std::string_view pattern);
+
 /// The pattern with all that it matches for its value.
 std::string withWholeAsValue(std::string_view pattern);
 

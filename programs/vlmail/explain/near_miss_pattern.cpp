@@ -2,8 +2,8 @@
 #include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/parts.h"
+#include "programs/patterns/text_forms.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
-#include "programs/vlmail/explain/text_forms.h"
 #include "programs/vlmail/explain/words.h"
 
 #include <algorithm>
@@ -13,6 +13,13 @@
 
 namespace VlMail::NearMisses {
 
+using Patterns::codePointOf;
+using Patterns::composed;
+using Patterns::firstUnplainMark;
+using Patterns::foldedCase;
+using Patterns::Likeness;
+using Patterns::likestPiece;
+using Patterns::withPlainMarks;
 using Reader::FieldTrace;
 using Reader::Stretch;
 using Reader::ZoneText;
@@ -64,18 +71,6 @@ std::string lookAlikeAdvice(std::string const& matched, std::string const& patte
     std::string const mark = firstUnplainMark(pattern).value_or("");
     return "the pattern has " + told(mark) + " where the letter has " + Base::inQuotes(withPlainMarks(mark)) +
            ": correct the pattern";
-}
-
-/// Each run of blanks as any number of blanks.
-std::string withAnyBlanks(std::string const& pattern) {
-    std::string result;
-    for (std::size_t i = 0; i < pattern.size(); ++i) {
-        if (pattern[i] != ' ')
-            result += pattern[i];
-        else if (i + 1 == pattern.size() || pattern[i + 1] != ' ')
-            result += "\\h*";
-    }
-    return result;
 }
 
 /// The field in the text with another joint in the place of one line break.
@@ -289,7 +284,7 @@ std::optional<Found> lookAlike(Search const& search) {
 
 std::optional<Found> blanks(Search const& search) {
     return byPattern(
-        search, withAnyBlanks(search.pattern()),
+        search, Patterns::withAnyBlanks(search.pattern()),
         " with other blanks: the words of a line are joined by one blank each; write \\h* in the "
         "pattern where it has blanks");
 }

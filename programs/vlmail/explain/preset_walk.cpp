@@ -1,12 +1,13 @@
 #include "programs/vlmail/explain/preset_walk.h"
 
+#include "programs/patterns/text_forms.h"
 #include "programs/patterns/why_not.h"
-#include "programs/vlmail/explain/text_forms.h"
 
 namespace VlMail {
 namespace {
 
 using Cfg::ExtractPreset;
+using Patterns::composed;
 using Answer = PresetStep::Answer;
 
 bool fits(std::string const& pattern, std::string const& name) {

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-namespace VlMail {
+namespace Patterns {
 
 // Texts are UTF-8; stretches that are not become U+FFFD.
 
@@ -35,4 +35,4 @@ Likeness likestPiece(std::string_view line, std::string_view wanted);
 /// Without regard to case.
 std::string foldedCase(std::string_view text);
 
-} // namespace VlMail
+} // namespace Patterns

@@ -1,4 +1,4 @@
-#include "programs/vlmail/explain/text_forms.h"
+#include "programs/patterns/text_forms.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -9,7 +9,7 @@
 #include <unicode/unistr.h>
 #include <vector>
 
-namespace VlMail {
+namespace Patterns {
 namespace {
 
 icu::UnicodeString unicode(std::string_view text) {
@@ -145,4 +145,4 @@ Likeness likestPiece(std::string_view line, std::string_view wanted) {
 
 std::string foldedCase(std::string_view text) { return utf8(unicode(text).foldCase()); }
 
-} // namespace VlMail
+} // namespace Patterns

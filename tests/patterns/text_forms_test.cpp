@@ -1,11 +1,10 @@
 #include "programs/patterns/parts.h"
-#include "programs/vlmail/explain/text_forms.h"
-#include "programs/vlmail/explain/words.h"
+#include "programs/patterns/text_forms.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-namespace VlMail {
+namespace Patterns {
 namespace {
 
 using testing::ElementsAre;
@@ -81,17 +80,17 @@ TEST(PatternParts, FindsTheLiteralsThatATextMustHave) {
         {R"(  )", {}},
     };
     for (auto const& [pattern, literals] : CASES)
-        EXPECT_EQ(Patterns::literalsOf(pattern), literals) << pattern;
+        EXPECT_EQ(literalsOf(pattern), literals) << pattern;
 }
 
 TEST(PatternParts, CutsAPatternBetweenItsSteps) {
     std::vector<std::string> cuts;
-    for (Patterns::Cut const& cut : Patterns::cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
+    for (Cut const& cut : cutsOf(R"(^Ref:\h*(?<VAL>\d+)$)"))
         cuts.push_back(cut.front + "|" + cut.rest);
     EXPECT_THAT(cuts, ElementsAre(R"(^Ref:\h*(?<VAL>\d+)|$)", R"(^Ref:\h*|(?<VAL>\d+)$)",
                                   R"(^Ref:|\h*(?<VAL>\d+)$)", R"(^|Ref:\h*(?<VAL>\d+)$)"));
-    EXPECT_THAT(Patterns::cutsOf("a|b"), IsEmpty());
-    EXPECT_THAT(Patterns::cutsOf(""), IsEmpty());
+    EXPECT_THAT(cutsOf("a|b"), IsEmpty());
+    EXPECT_THAT(cutsOf(""), IsEmpty());
 }
 
 TEST(PatternParts, TakesAnchorsOff) {
@@ -104,34 +103,25 @@ TEST(PatternParts, TakesAnchorsOff) {
                     {"a\\$", "", "a\\$", ""}, {"a", "", "a", ""},   {"^a|b$", "", "^a|b$", ""},
                     {"$", "", "", "$"},       {"", "", "", ""}};
     for (auto const& [pattern, front, core, end] : CASES) {
-        Patterns::Anchors const anchors = Patterns::anchorsOf(pattern);
+        Anchors const anchors = anchorsOf(pattern);
         EXPECT_EQ(anchors.front, front) << pattern;
         EXPECT_EQ(anchors.core, core) << pattern;
         EXPECT_EQ(anchors.end, end) << pattern;
     }
 }
 
+TEST(PatternParts, TakeAnyBlanksInThePlaceOfBlanks) {
+    EXPECT_EQ(withAnyBlanks("a  b c"), "a\\h*b\\h*c");
+    EXPECT_EQ(withAnyBlanks("a\\hb"), "a\\hb");
+    EXPECT_EQ(withAnyBlanks(" a "), "\\h*a\\h*");
+}
+
 TEST(PatternParts, MakesTheWholeMatchTheValue) {
-    EXPECT_EQ(Patterns::withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
-    EXPECT_TRUE(Patterns::hasValueGroup("a(?<VAL>b)"));
-    EXPECT_TRUE(Patterns::hasValueGroup("a(?'VAL'b)"));
-    EXPECT_FALSE(Patterns::hasValueGroup("a(b)(?<VALUE>c)"));
-}
-
-TEST(Words, ShortenByCharactersAndOnOneLine) {
-    EXPECT_EQ(Words::shortened("a\nb", 10), "a / b");
-    EXPECT_EQ(Words::shortened("\u00FC\u00FC\u00FC", 2), "\u00FC\u00FC\u2026");
-    EXPECT_EQ(Words::shortened("\u00FC\u00FC", 2), "\u00FC\u00FC");
-    EXPECT_EQ(Words::excerpt("abc", 2), "\"ab\u2026\"");
-}
-
-TEST(Words, TellLengthsAndNumbersAlikeInEveryLocale) {
-    EXPECT_EQ(Words::millimetres(9500), "95 mm");
-    EXPECT_EQ(Words::millimetres(9550), "95.5 mm");
-    EXPECT_EQ(Words::millimetres(-205), "-2.05 mm");
-    EXPECT_EQ(Words::number(2.5), "2.5");
-    EXPECT_EQ(Words::number(1234567.89), "1234567.89");
+    EXPECT_EQ(withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
+    EXPECT_TRUE(hasValueGroup("a(?<VAL>b)"));
+    EXPECT_TRUE(hasValueGroup("a(?'VAL'b)"));
+    EXPECT_FALSE(hasValueGroup("a(b)(?<VALUE>c)"));
 }
 
 } // namespace
-} // namespace VlMail
+} // namespace Patterns
