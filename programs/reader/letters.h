@@ -2,6 +2,7 @@
 // Letters out of a document: where they begin, and what an extraction preset finds in them.
 
 #include "programs/reader/document.h"
+#include "programs/reader/letter_joins.h"
 #include "programs/reader/pattern_time.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
@@ -24,13 +25,14 @@ struct Letter {
     std::vector<std::string> missing;
     /// What a person should know of its values, one line each.
     std::vector<std::string> warnings;
+    /// Those of its pages that may begin another letter.
+    std::vector<DoubtfulJoin> doubtfulJoins = {};
 };
 
 /// Each field with a mark other than None and SingleLetter that is found on a page begins a letter there;
 /// pages in front of the first are a letter too. Without such fields, or with one that is marked
-/// SingleLetter, the document is one letter. With skipFirstPage() the first page belongs to none. Without a
-/// trace none of its texts is made. Throws Error when a page cannot be read, and what
-/// FieldSearch::search() does.
+/// SingleLetter, the document is one letter. With skipFirstPage() the first page belongs to none. Throws
+/// Error when a page cannot be read, and what FieldSearch::search() does.
 std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr,
                                 ReadingRules const& rules = {}, PatternLimits const& limits = {});
 

@@ -33,6 +33,9 @@ struct Options {
     bool json = false;
     WorkerOptions reading;
     std::size_t checkEvery = 1;
+    bool acceptJoined = false;
+
+    Along::Joins joins() const { return acceptJoined ? Along::Joins::Accept : Along::Joins::Doubt; }
 };
 
 int report(Dispatch const& dispatch, Options const& options, Terminal const& terminal) {
@@ -76,8 +79,8 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
-              {.pages = Along::Pages::Yes, .checkEvery = options.checkEvery}, progress,
-              [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
+              {.pages = Along::Pages::Yes, .joins = options.joins(), .checkEvery = options.checkEvery},
+              progress, [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
 }
@@ -102,7 +105,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.reading.workers(), {}, progress,
+    readBatch(options.files, settings, options.reading.workers(), {.joins = options.joins()}, progress,
               [&](std::size_t index, ReadResult result) {
                   plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
                   dispatch.take(std::move(result));
@@ -119,6 +122,11 @@ void addBatchOptions(Base::Command const& command, Options& options) {
     addWorkerOptions(command, options.reading);
 }
 
+auto addAcceptJoined(Base::Command const& command, Options& options) {
+    return command.addFlag("--accept-joined", options.acceptJoined,
+                           "Takes pages for one letter that look like letters of their own");
+}
+
 } // namespace
 
 void addMailCommand(Base::Command const& app, Task& task) {
@@ -128,9 +136,11 @@ void addMailCommand(Base::Command const& app, Task& task) {
     auto const files = mail.addOption("FILE", options->files, "PDF or text documents");
     auto const settings =
         mail.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    auto const acceptJoined = addAcceptJoined(mail, *options);
     mail.addOption("--plan", options->plan, "Carries out what vlmail plan has decided")
         .excludes(files)
-        .excludes(settings);
+        .excludes(settings)
+        .excludes(acceptJoined);
     auto const output =
         mail.addOption("-o,--output", options->output, "The folder for the mailing files; made when missing");
     auto const send =
@@ -161,6 +171,7 @@ void addPlanCommand(Base::Command const& app, Task& task) {
     plan.addOption("FILE", options->files, "PDF or text documents").required();
     plan.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
     plan.addOption("-o,--output", options->output, "The file for the plan").required();
+    addAcceptJoined(plan, *options);
     plan.addFlag("--price", options->price, "Asks the service what the mailings would cost");
     addServiceOptions(plan, options->service);
     addBatchOptions(plan, *options);

@@ -12,6 +12,7 @@
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
 
+#include <algorithm>
 #include <utility>
 
 namespace VlMail {
@@ -31,6 +32,9 @@ constexpr char const* MESSAGE_KEY = "message";
 constexpr char const* MISSING_KEY = "missing";
 constexpr char const* WARNINGS_KEY = "warnings";
 constexpr char const* DIFFERING_KEY = "differing_pages";
+constexpr char const* NOT_SEPARATED_KEY = "not_separated";
+constexpr char const* PAGE_KEY = "page";
+constexpr char const* SAYS_KEY = "says";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
 constexpr char const* TRACE_KEY = "trace";
 
@@ -55,6 +59,22 @@ std::vector<std::string> textsOf(json::Value const& array) {
     return texts;
 }
 
+json::Array toJson(std::vector<Reader::DoubtfulJoin> const& joins) {
+    json::Array array;
+    for (Reader::DoubtfulJoin const& join : joins)
+        array.append(json::Object{{PAGE_KEY, join.page}, {SAYS_KEY, join.says}});
+    return array;
+}
+
+std::vector<Reader::DoubtfulJoin> joinsIn(json::Value const& array) {
+    std::vector<Reader::DoubtfulJoin> joins;
+    if (array)
+        for (json::Value const& join : array.toArray())
+            joins.push_back({static_cast<int>(join.toObject().get(PAGE_KEY).toInt()),
+                             join.toObject().get(SAYS_KEY).toString()});
+    return joins;
+}
+
 json::Object toJson(LetterReading const& letter) {
     std::string message;
     bool const ready = letter.isProductionReady(message);
@@ -65,6 +85,8 @@ json::Object toJson(LetterReading const& letter) {
                         {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
     if (!letter.differingPages.empty())
         object.set(DIFFERING_KEY, toJsonArray(letter.differingPages));
+    if (!letter.doubtfulJoins.empty())
+        object.set(NOT_SEPARATED_KEY, toJson(letter.doubtfulJoins));
     setUnlessEmpty(object, MISSING_KEY, letter.missing);
     setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
     return object;
@@ -92,6 +114,7 @@ LetterReading letterFrom(json::Object const& object) {
                          textsOf(object.get(WARNINGS_KEY))};
     if (json::Value const differing = object.get(DIFFERING_KEY))
         letter.differingPages = numbersIn(differing);
+    letter.doubtfulJoins = joinsIn(object.get(NOT_SEPARATED_KEY));
     return letter;
 }
 
@@ -135,8 +158,20 @@ std::vector<LetterReading> lettersOf(Reader::Document& document, Cfg::ExtractPre
                            std::move(letter.fields),
                            std::move(letter.missing),
                            {},
-                           std::move(letter.warnings)});
+                           std::move(letter.warnings),
+                           {},
+                           std::move(letter.doubtfulJoins)});
     return letters;
+}
+
+/// A person has decided that the pages belong together.
+void acceptJoins(std::vector<LetterReading>& letters) {
+    for (LetterReading& letter : letters) {
+        for (Reader::DoubtfulJoin const& join : letter.doubtfulJoins)
+            letter.warnings.push_back("pages: page " + std::to_string(join.page) +
+                                      " was accepted as part of this letter, although " + join.says);
+        letter.doubtfulJoins.clear();
+    }
 }
 
 /// Writes the pages of letters that can go out.
@@ -181,6 +216,8 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
     requirePatterns(extractPreset, settings);
     Reader::Trace trace;
     reading.letters = lettersOf(document, extractPreset, packPreset, along.afterReading ? &trace : nullptr);
+    if (along.joins == Along::Joins::Accept)
+        acceptJoins(*reading.letters);
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, trace, place});
     if (along.pages == Along::Pages::Yes)
@@ -192,6 +229,31 @@ void fail(ReadResult& result, std::exception const& failure) {
     result.reading.error = Base::validUtf8(failure.what());
     result.reading.letters.reset();
     result.report.clear();
+}
+
+/// "pages 1-2 and pages 3-4 may be two letters", "pages 1-6 may be 3 letters, from pages 1, 3, 5 on".
+std::string partsInWords(LetterReading const& letter) {
+    constexpr std::size_t MOST = 20;
+    std::vector<int> const& pages = letter.pages;
+    if (letter.doubtfulJoins.size() == 1) {
+        auto const second = std::find(pages.begin(), pages.end(), letter.doubtfulJoins.front().page);
+        return pagesInWords({pages.begin(), second}) + " and " + pagesInWords({second, pages.end()}) +
+               " may be two letters";
+    }
+    std::vector<int> begins{pages.front()};
+    for (Reader::DoubtfulJoin const& join : letter.doubtfulJoins)
+        if (begins.size() < MOST)
+            begins.push_back(join.page);
+    bool const areAll = begins.size() > letter.doubtfulJoins.size();
+    return pagesInWords(pages) + " may be " + std::to_string(letter.doubtfulJoins.size() + 1) +
+           " letters, from " + pagesInWords(begins) + (areAll ? "" : " and so") + " on";
+}
+
+/// All evidence is in JSON.
+std::string joinsInWords(LetterReading const& letter) {
+    Reader::DoubtfulJoin const& first = letter.doubtfulJoins.front();
+    return "letter-not-separated: " + partsInWords(letter) + ": on page " + std::to_string(first.page) + ' ' +
+           first.says + "; correct the mark or the document, or mail them as one letter with --accept-joined";
 }
 
 } // namespace
@@ -207,6 +269,8 @@ std::string LetterReading::whyNot() const {
     if (!differingPages.empty())
         return "page-differs: " + pagesInWords(differingPages) +
                " would not look like the document's; print it to a new PDF";
+    if (!doubtfulJoins.empty())
+        return joinsInWords(*this);
     std::string message;
     if (isProductionReady(message))
         return {};

@@ -2,6 +2,7 @@
 // What reading a document by the presets has given, and its JSON form, in which worker processes hand it
 // over.
 
+#include "programs/reader/letter_joins.h"
 #include "vlservice/extract/extracted_fields.h"
 #include "vlservice/pack/shared_mem_buffer.h"
 #include "vlservice/presets/presets.h"
@@ -41,6 +42,8 @@ struct LetterReading {
     std::vector<std::string> warnings = {};
     /// Those of its pages that would not look like the document's. They keep it from going out.
     std::vector<int> differingPages = {};
+    /// Those of its pages that may begin another letter. They keep it from going out.
+    std::vector<Reader::DoubtfulJoin> doubtfulJoins = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -67,7 +70,7 @@ struct DocumentReading {
 
     /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
     /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and where there are
-    /// any "missing", the names of obligatory fields, and "warnings".
+    /// any "missing", the names of obligatory fields, "warnings", "differing_pages" and "not_separated".
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);
@@ -97,8 +100,11 @@ struct OpenDocument {
 /// worker process: they change the result and nothing else. What they throw is the reading's `error`.
 struct Along {
     enum class Pages : bool { No, Yes };
+    /// Whether pages that may begin another letter keep theirs from going out, or are only told of.
+    enum class Joins : bool { Doubt, Accept };
 
     Pages pages = Pages::No;
+    Joins joins = Joins::Doubt;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
     std::size_t checkEvery = 1;
     /// Called with the document's name alone, before it is opened.

@@ -277,6 +277,78 @@ TEST_F(VlMailTest, GivesTheSameOutputOnAnyNumberOfProcesses) {
     EXPECT_EQ(out_, alone);
 }
 
+/// Two letters of two pages and one of one; the second has its mark in capitals.
+constexpr char const* BATCH = "No 1\nTo: Ada\fmore\fNO 2\nTo: Bob\fmore\fNo 3\nTo: Eve\n";
+constexpr char const* BATCH_SETTINGS = R"({
+    "extract_presets": [{"match": "batch.*", "pack_preset": "Invoices", "zones": [
+        {"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
+            {"name": "number", "value_extract": "^No (?<VAL>\\d+)$", "value_type": 1, "mark": 1},
+            {"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 1, "send_to_server": true}]}]}],
+    "pack_presets": [{"name": "Invoices"}]})";
+constexpr char const* NOT_SEPARATED =
+    "letter-not-separated: pages 1-2 and pages 3-4 may be two letters: on page 3 \"NO 2\" nearly is the "
+    "mark \"number\", with another letter case; correct the mark or the "
+    "document, or mail them as one letter with "
+    "--accept-joined";
+
+TEST_F(VlMailTest, DoubtsALetterThatMayBeTwo) {
+    write("node.json", BATCH_SETTINGS);
+    write("batch 1.txt", BATCH);
+    EXPECT_EQ(vlmail("letter", {"batch 1.txt"}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_,
+                HasSubstr("  letter 1 of 2, pages 1-4: cannot go out: " + std::string(NOT_SEPARATED) + "\n"));
+    EXPECT_THAT(out_, HasSubstr("  letter 2 of 2, page 5: ready\n"));
+    EXPECT_EQ(vlmail("letter", {"batch 1.txt"}, {"--json"}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_,
+                HasSubstr(R"("not_separated":[{"page":3,"says":"\"NO 2\" nearly is the mark \"number\", )"
+                          R"(with another letter case"}])"));
+}
+
+TEST_F(VlMailTest, LeavesOutBothLettersThatMayBeTwoUntilAPersonAcceptsThem) {
+    write("node.json", BATCH_SETTINGS);
+    write("batch 1.txt", BATCH);
+    EXPECT_EQ(vlmail("mail", {"batch 1.txt"}, {"-o", path("out")}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr("left out: batch 1.txt, pages 1-4: " + std::string(NOT_SEPARATED) + "\n"));
+    ASSERT_EQ(mailings().size(), 1u);
+    Mailing::Metadata const metadata = metadataOf(mailings()[0]);
+    ASSERT_EQ(metadata.letters.size(), 1u);
+    EXPECT_THAT(metadata.letters[0].documents[0].pages, ElementsAre(5));
+
+    fs::remove_all(folder_ / "out");
+    EXPECT_EQ(vlmail("mail", {"batch 1.txt"}, {"-o", path("out"), "--accept-joined"}), VlMail::FINE) << err_;
+    ASSERT_EQ(mailings().size(), 1u);
+    ASSERT_EQ(metadataOf(mailings()[0]).letters.size(), 2u);
+    EXPECT_THAT(metadataOf(mailings()[0]).letters[0].documents[0].pages, ElementsAre(1, 2, 3, 4));
+}
+
+TEST_F(VlMailTest, DecidesOnDoubtfulJoinsInThePlan) {
+    write("node.json", BATCH_SETTINGS);
+    write("batch 1.txt", BATCH);
+    EXPECT_EQ(vlmail("plan", {"batch 1.txt"}, {"-o", path("plan.json")}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr(NOT_SEPARATED));
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::INCOMPLETE) << err_;
+    EXPECT_THAT(out_, HasSubstr(NOT_SEPARATED));
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out"), "--accept-joined"}),
+              VlMail::FAILED);
+    EXPECT_THAT(err_, HasSubstr("--accept-joined"));
+
+    fs::remove_all(folder_ / "out");
+    EXPECT_EQ(vlmail("plan", {"batch 1.txt"}, {"-o", path("plan.json"), "--accept-joined"}), VlMail::FINE);
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::FINE) << err_;
+    ASSERT_EQ(mailings().size(), 1u);
+    EXPECT_EQ(metadataOf(mailings()[0]).letters.size(), 2u);
+}
+
+TEST_F(VlMailTest, CountsTheFurtherPagesThatMayBeginLetters) {
+    write("node.json", BATCH_SETTINGS);
+    write("batch 1.txt", "No 1\nTo: Ada\fNO 2\fNO 3\fNO 4\n");
+    EXPECT_EQ(vlmail("letter", {"batch 1.txt"}), VlMail::INCOMPLETE);
+    EXPECT_THAT(
+        out_,
+        HasSubstr("letter-not-separated: pages 1-4 may be 4 letters, from pages 1-4 on: on page 2 \"NO 2\" "
+                  "nearly is the mark \"number\", with another letter case; correct"));
+}
+
 TEST_F(VlMailTest, CarriesOutAPlan) {
     write("invoice 1.txt", "No 1\nTo: Ada\n");
     write("invoice 2.txt", "No 2\n");
