@@ -61,6 +61,8 @@ template<typename T>
 struct RootDefault {
     T const& value;
 };
+template<typename T>
+RootDefault(T) -> RootDefault<T>;
 
 /// A setting or a list of settings with its key; V is Value<T> or ArrValue<T>. The key is static text and is
 /// not owned. In the reading operations the empty handle stands for a missing key. What is read is stored
