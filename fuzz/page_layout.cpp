@@ -1,11 +1,13 @@
-// Words anywhere on a page, eight bytes each: made into lines, blocks and the text of a zone, which is then
-// cut line by line.
+// Words anywhere on a page, eight bytes each: made into lines, blocks and the text of a zone, of which lines
+// are joined, and which is then cut line by line.
 #include "programs/reader/zone_text.h"
 
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
+#include <set>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -66,12 +68,22 @@ void cut(Reader::ZoneText zone) {
     }
 }
 
+void join(Reader::ZoneText const& zone) {
+    std::vector<Reader::PlacedLine> const lines = zone.placedLines();
+    for (Reader::LineJoin const& join : Reader::joinsOf(lines)) {
+        std::set<std::size_t> const distinct(join.lines.begin(), join.lines.end());
+        require(distinct.size() == join.lines.size() && distinct.size() > 1);
+        require(*distinct.rbegin() < lines.size());
+    }
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size) {
     Reader::Page const page = pageOf(data, size);
     Reader::Layout const layout = Reader::layOut(page);
     check(page, layout);
+    join(Reader::ZoneText::inside(page, layout, {0, 0, 21000, 29700}));
     cut(Reader::ZoneText::inside(page, layout, {0, 0, 21000, 29700}));
     cut(Reader::ZoneText::nearest(page, layout, {4500, 6200}));
     return 0;

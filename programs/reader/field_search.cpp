@@ -1,6 +1,7 @@
 #include "programs/reader/field_search.h"
 
 #include "programs/base/error.h"
+#include "programs/reader/joined_search.h"
 #include "programs/reader/value_reading.h"
 
 #include <algorithm>
@@ -13,17 +14,13 @@ using Cfg::ExtractedField;
 using Cfg::ExtractField;
 
 /// Answers the width of a match, and takes its lines out of the zone unless they are too wide for the field.
-ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
-    return [&field, &text, trace](std::string&, unsigned long long offset, unsigned long long length) {
-        Stretch stretch = text.stretch(offset, length);
-        auto const width = static_cast<unsigned long long>(stretch.width);
-        bool const isTooWide = field.maxWidth() != 0 && field.maxWidth() < width;
-        std::string cut = isTooWide ? std::string() : text.cutLines(offset, length);
-        if (trace) {
-            trace->match = std::move(stretch);
-            trace->isTooWide = isTooWide;
-            trace->cut = std::move(cut);
-        }
+ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, FieldTrace& trace) {
+    return [&](std::string&, unsigned long long offset, unsigned long long length) {
+        trace.match = text.stretch(offset, length);
+        auto const width = static_cast<unsigned long long>(trace.match->width);
+        trace.isTooWide = field.maxWidth() != 0 && field.maxWidth() < width;
+        if (!trace.isTooWide)
+            trace.cut = text.cutLines(offset, length);
         return width;
     };
 }
@@ -47,44 +44,70 @@ FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, Patter
     : document_(std::move(document)), rules_(rules), time_(time), trace_(trace) {}
 
 void FieldSearch::search(Cfg::ExtractZone const& zone, ZoneText text) {
+    SearchedZone& searched = zones_.emplace_back(SearchedZone{&zone, std::move(text)});
     if (trace_)
-        trace_->zones.push_back({&zone, text.text(), text.box(), text.blocks(), {}});
-    for (ExtractField const& field : zone.fields()) {
-        search(field, text);
-        requireTime(field);
-    }
+        searched.trace = {&zone, searched.text.text(), searched.text.box(), searched.text.blocks(), {}};
+    for (ExtractField const& field : zone.fields())
+        search(field, searched);
 }
 
-void FieldSearch::search(ExtractField const& field, ZoneText& text) {
-    FieldTrace* const trace = trace_ ? &trace_->zones.back().fields.emplace_back() : nullptr;
-    Yield yield;
-    yield.value = cutInTime(field, text, trace);
-    if (!yield.value) {
-        if (field.mustHave())
-            found_.missing.push_back(field.name());
-        return;
-    }
-    yield.isFound = !yield.value->isValidated();
-    yield.doubt = validate(field, *yield.value);
-    if (trace) {
-        trace->doubt = yield.doubt;
-        trace->value = std::make_shared<ExtractedField const>(*yield.value);
-        yield.zone = trace_->zones.size() - 1;
-        yield.field = trace_->zones.back().fields.size() - 1;
-    }
-    found_.isMarked = found_.isMarked || (yield.isFound && separatesLetters(field));
-    take(std::move(yield));
+void FieldSearch::search(ExtractField const& field, SearchedZone& zone) {
+    Try& one = zone.fields.emplace_back();
+    takeValue(one, inTime(one, [&] { return cutField(field, zone.text, one.trace); }));
+    requireTime(field);
 }
 
-std::shared_ptr<ExtractedField> FieldSearch::cutInTime(ExtractField const& field, ZoneText& text,
-                                                       FieldTrace* trace) {
-    PatternTime::Turn turn(time_);
-    auto value = cutField(field, text, trace);
+void FieldSearch::searchJoinedLines() {
+    for (SearchedZone& zone : zones_)
+        for (Try& field : zone.fields)
+            if (field.trace.wantsJoinedLines() && !hasFound(field.name()))
+                searchJoinedLines(field, zone.text);
+}
+
+void FieldSearch::searchJoinedLines(Try& field, ZoneText& text) {
+    ExtractField const& definition = *field.trace.definition;
+    auto const isValid = [&](ExtractedField const& found) {
+        ExtractedField value(found);
+        try {
+            readValue(definition, value, rules_);
+            return value.isValid();
+        } catch (std::exception const&) {
+            return true; // It is said when the value is taken.
+        }
+    };
+    auto value = inTime(field, [&] { return cutJoinedField(definition, text, field.trace, isValid); });
+    if (value)
+        takeValue(field, std::move(value));
+    requireTime(definition);
+}
+
+template<typename Cut>
+std::shared_ptr<ExtractedField> FieldSearch::inTime(Try& field, Cut const& cut) {
+    PatternTime::Turn turn(time_, field.spent);
+    std::shared_ptr<ExtractedField> value = cut();
+    field.spent += turn.spent();
     if (turn.isUp())
         found_.warnings.push_back(field.name() + ": its pattern was given up, since it took longer than " +
                                   inSeconds(time_.limits().field) +
                                   "; \"vlmail presets lint\" tells what makes it slow");
     return value;
+}
+
+bool FieldSearch::hasFound(std::string const& name) const {
+    return std::any_of(zones_.begin(), zones_.end(), [&](SearchedZone const& zone) {
+        return std::any_of(zone.fields.begin(), zone.fields.end(),
+                           [&](Try const& field) { return field.isFound && field.name() == name; });
+    });
+}
+
+void FieldSearch::takeValue(Try& field, std::shared_ptr<ExtractedField> value) {
+    field.value = std::move(value);
+    if (!field.value)
+        return;
+    field.isFound = !field.value->isValidated();
+    field.trace.doubt = validate(*field.trace.definition, *field.value);
+    field.trace.value = field.value;
+    found_.isMarked = found_.isMarked || (field.isFound && separatesLetters(*field.trace.definition));
 }
 
 /// The last field is as good as any to look at first: it took some of the time.
@@ -105,48 +128,64 @@ std::string FieldSearch::validate(ExtractField const& field, ExtractedField& val
     }
 }
 
-/// A letter has one value of a name: the first that was found, or else the first default.
-void FieldSearch::take(Yield yield) {
-    auto const known = std::find_if(yields_.begin(), yields_.end(), [&](Yield const& other) {
-        return other.value->name() == yield.value->name();
-    });
-    if (known == yields_.end())
-        yields_.push_back(std::move(yield));
-    else if (yield.isFound && !known->isFound)
-        *known = std::move(yield);
+/// A letter has one value of a name: the first that was found, or else the first in joined lines, or else the
+/// first default.
+std::vector<FieldSearch::Try*> FieldSearch::countingTries() {
+    std::vector<Try*> counting;
+    for (SearchedZone& zone : zones_) {
+        for (Try& field : zone.fields) {
+            if (!field.value)
+                continue;
+            auto const known = std::find_if(counting.begin(), counting.end(), [&](Try* other) {
+                return other->value->name() == field.value->name();
+            });
+            if (known == counting.end())
+                counting.push_back(&field);
+            else if (field.rank() > (*known)->rank())
+                *known = &field;
+        }
+    }
+    return counting;
+}
+
+void FieldSearch::hand(Try& counting) {
+    counting.trace.counts = true;
+    found_.fields.emplace(counting.value->priority(), *counting.value);
+    if (!counting.trace.doubt.empty())
+        found_.warnings.push_back(counting.value->name() + ": " + counting.trace.doubt);
 }
 
 FieldsFound FieldSearch::finish() {
-    for (Yield const& yield : yields_) {
-        found_.fields.emplace(yield.value->priority(), *yield.value);
-        if (!yield.doubt.empty())
-            found_.warnings.push_back(yield.value->name() + ": " + yield.doubt);
-    }
+    for (SearchedZone const& zone : zones_)
+        for (Try const& field : zone.fields)
+            if (!field.value && field.trace.definition->mustHave())
+                found_.missing.push_back(field.name());
+    for (Try* const counting : countingTries())
+        hand(*counting);
     if (trace_)
-        traceWhatCounts();
+        handTraces();
     return std::move(found_);
 }
 
-void FieldSearch::traceWhatCounts() {
-    for (Yield const& yield : yields_)
-        trace_->zones[yield.zone].fields[yield.field].counts = true;
+void FieldSearch::handTraces() {
+    for (SearchedZone& zone : zones_) {
+        for (Try& field : zone.fields)
+            zone.trace.fields.push_back(std::move(field.trace));
+        trace_->zones.push_back(std::move(zone.trace));
+    }
 }
 
 bool separatesLetters(ExtractField const& field) {
     return field.mark() != LetterSeparatorMark::None && field.mark() != LetterSeparatorMark::SingleLetter;
 }
 
-std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace* trace) {
-    std::shared_ptr<ExtractedField> value = field.extractField(
-        text.searchedText(), measureFor(field, text, trace), [trace](std::string const& reason) {
-            if (trace)
-                trace->failure = reason;
-        });
-    if (trace) {
-        trace->definition = &field;
-        if (value && !value->isValidated())
-            trace->rawText = value->rawValue().textOrEmpty();
-    }
+std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace& trace) {
+    trace.definition = &field;
+    std::shared_ptr<ExtractedField> value =
+        field.extractField(text.searchedText(), measureFor(field, text, trace),
+                           [&](std::string const& reason) { trace.failure = reason; });
+    if (value && !value->isValidated())
+        trace.rawText = value->rawValue().textOrEmpty();
     return value;
 }
 

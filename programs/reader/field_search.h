@@ -38,40 +38,58 @@ public:
     /// extraction pattern is logged by the library and finds nothing.
     void search(Cfg::ExtractZone const& zone, ZoneText text);
 
+    /// Searches ordinary fields of which no zone has a value again, in joined lines of what is left of each
+    /// zone's text. So no join takes from a field what it finds without. Throws what search() does.
+    void searchJoinedLines();
+
     FieldsFound finish();
 
 private:
-    /// What one field yields, and where the trace has it.
-    struct Yield {
-        std::shared_ptr<Cfg::ExtractedField> value;
+    /// One field in one zone.
+    struct Try {
+        std::shared_ptr<Cfg::ExtractedField> value = {};
         bool isFound = false;
-        std::string doubt;
-        std::size_t zone = 0;
-        std::size_t field = 0;
+        FieldTrace trace = {};
+        PatternTime::Clock::duration spent = {};
+
+        std::string const& name() const { return trace.definition->name(); }
+        /// Of the values of a name the first of the highest rank counts.
+        int rank() const { return isFound ? (trace.joined ? 1 : 2) : 0; }
+    };
+    struct SearchedZone {
+        Cfg::ExtractZone const* definition = nullptr;
+        ZoneText text;
+        ZoneTrace trace = {};
+        std::vector<Try> fields = {};
     };
 
-    void search(Cfg::ExtractField const& field, ZoneText& text);
-    std::shared_ptr<Cfg::ExtractedField> cutInTime(Cfg::ExtractField const& field, ZoneText& text,
-                                                   FieldTrace* trace);
+    void search(Cfg::ExtractField const& field, SearchedZone& zone);
+    void searchJoinedLines(Try& field, ZoneText& text);
+    bool hasFound(std::string const& name) const;
+    void takeValue(Try& field, std::shared_ptr<Cfg::ExtractedField> value);
+    /// What `cut` gives of the field, in what is left of its time.
+    template<typename Cut>
+    std::shared_ptr<Cfg::ExtractedField> inTime(Try& field, Cut const& cut);
     void requireTime(Cfg::ExtractField const& field) const;
     std::string validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
-    void take(Yield yield);
-    void traceWhatCounts();
+    std::vector<Try*> countingTries();
+    void hand(Try& counting);
+    void handTraces();
 
     std::string document_;
     ReadingRules const& rules_;
     PatternTime& time_;
     PageTrace* trace_;
-    std::vector<Yield> yields_;
+    std::vector<SearchedZone> zones_;
     FieldsFound found_;
 };
 
 /// Whether finding the field begins a letter.
 bool separatesLetters(Cfg::ExtractField const& field);
 
-/// Takes one field out of a zone's text: not validated, or its default, or null. Fills a trace but for its
+/// Takes one field out of a zone's text: not validated, or its default, or null. Fills the trace but for its
 /// value and whether it counts.
 std::shared_ptr<Cfg::ExtractedField> cutField(Cfg::ExtractField const& field, ZoneText& text,
-                                              FieldTrace* trace = nullptr);
+                                              FieldTrace& trace);
 
 } // namespace Reader

@@ -59,6 +59,7 @@ private:
         FieldSearch search(document_.name(), rules_, time_, trace_ || joins_ ? &pageTrace : nullptr);
         for (ExtractZone const& zone : preset_.zones())
             search.search(zone, textOf(page, layout, zone));
+        search.searchJoinedLines();
         FieldsFound found = search.finish();
         pageTrace.beginsLetter = letters_.empty() || found.isMarked;
         if (pageTrace.beginsLetter)

@@ -3,6 +3,7 @@
 
 #include "vlservice/extract/match_time.h"
 
+#include <algorithm>
 #include <chrono>
 
 namespace Reader {
@@ -19,18 +20,20 @@ public:
 
     explicit PatternTime(PatternLimits const& limits = {}) : limits_(limits), left_(limits.document) {}
 
-    /// The patterns of one field, which end in time.
+    /// The patterns of one field, which end in time. A field that has more than one turn has `spent` some of
+    /// its time before.
     class Turn {
     public:
-        explicit Turn(PatternTime& time)
+        explicit Turn(PatternTime& time, Clock::duration spent = {})
             : time_(time), begin_(Clock::now()),
-              match_(time.left_ < time.limits_.field ? time.left_ : Clock::duration(time.limits_.field)) {}
+              match_(std::min(time.left_, Clock::duration(time.limits_.field) - spent)) {}
         Turn(Turn const&) = delete;
         Turn& operator=(Turn const&) = delete;
-        ~Turn() { time_.left_ -= Clock::now() - begin_; }
+        ~Turn() { time_.left_ -= spent(); }
 
         /// Whether a pattern was ended.
         bool isUp() const { return match_.isUp(); }
+        Clock::duration spent() const { return Clock::now() - begin_; }
 
     private:
         PatternTime& time_;

@@ -13,11 +13,20 @@
 
 namespace Reader {
 
+/// Lines that stand apart on the page and were read as one.
+struct JoinedMatch {
+    Joint joint = Joint::Right;
+    /// What the match takes of each line.
+    std::vector<Box> parts;
+};
+
 /// The search for one field in one zone.
 struct FieldTrace {
     Cfg::ExtractField const* definition = nullptr;
     /// Where the pattern matched, and how wide that is.
     std::optional<Stretch> match;
+    /// There when the match was found in joined lines only.
+    std::optional<JoinedMatch> joined = {};
     /// The match is wider than the definition allows: it stays in the text and gives no value.
     bool isTooWide = false;
     /// The lines that the match took out of the zone's text.
@@ -36,6 +45,8 @@ struct FieldTrace {
 
     /// The value was read on the page and is not the default.
     bool isFound() const { return rawText.has_value(); }
+    /// Whether joined lines may have what the zone's text as it stands has not.
+    bool wantsJoinedLines() const;
 };
 
 struct ZoneTrace {

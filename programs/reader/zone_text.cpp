@@ -151,4 +151,21 @@ std::string ZoneText::cutLines(std::size_t offset, std::size_t length) {
     return cut;
 }
 
+std::vector<PlacedLine> ZoneText::placedLines() const {
+    std::vector<PlacedLine> placed;
+    std::size_t offset = 0;
+    for (TextLine const& line : lines_) {
+        if (!line.pieces.empty()) {
+            Word const& first = *line.pieces.front().word;
+            PlacedLine& one = placed.emplace_back(PlacedLine{offset, line.length, first.box, 0, first.turn});
+            for (Piece const& piece : line.pieces) {
+                one.box = one.box.united(piece.word->box);
+                one.size = std::max(one.size, piece.word->size);
+            }
+        }
+        offset += line.length + 1;
+    }
+    return placed;
+}
+
 } // namespace Reader

@@ -2,6 +2,7 @@
 // The text of a zone with its place on the page: fields are searched in it, and each stretch of it can be
 // measured.
 
+#include "programs/reader/joined_lines.h"
 #include "programs/reader/layout.h"
 
 #include <cstddef>
@@ -46,6 +47,8 @@ public:
     /// Takes the lines that have a letter in these bytes out of text(), with their line breaks, and gives
     /// their text.
     std::string cutLines(std::size_t offset, std::size_t length);
+    /// The lines that text() has, from its first; none of text that stands on no page.
+    std::vector<PlacedLine> placedLines() const;
 
 private:
     struct Piece {

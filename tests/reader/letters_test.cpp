@@ -210,6 +210,106 @@ TEST(Fields, WithABadExtractionPatternFindNothing) {
     EXPECT_THAT(lines, ElementsAre(testing::StartsWith("Extract field failed with ")));
 }
 
+constexpr char const* TOTAL = R"_([{"name": "total", "value_extract": "^Total:\\h*(?<VAL>[\\d.]+)"}])_";
+
+TEST(ApartFields, AreFoundBesideTheirLabel) {
+    EXPECT_THAT(valuesOf(lettersOf("Total:               12.00", presetWith(TOTAL)).at(0)),
+                ElementsAre(Pair("total", "\"12.00\"")));
+}
+
+TEST(ApartFields, AreFoundBelowTheirLabel) {
+    EXPECT_THAT(valuesOf(lettersOf("Date:      Total:\ntoday      12.00", presetWith(TOTAL)).at(0)),
+                ElementsAre(Pair("total", "\"12.00\"")));
+}
+
+TEST(ApartFields, AreFoundBehindTheCurrencyBetween) {
+    auto const fields = R"_([{"name": "total", "value_extract": "^Total: EUR\\h*(?<VAL>[\\d.]+)$"}])_";
+    EXPECT_THAT(valuesOf(lettersOf("Total:        EUR          12.00", presetWith(fields)).at(0)),
+                ElementsAre(Pair("total", "\"12.00\"")));
+}
+
+TEST(ApartFields, AreThoseThatAreFoundInNoOtherWay) {
+    EXPECT_THAT(valuesOf(lettersOf("Total:       12.00\n\nTotal: 13.00", presetWith(TOTAL)).at(0)),
+                ElementsAre(Pair("total", "\"13.00\"")));
+    // The second field has its line, though the first could be read with it.
+    auto const fields = R"_([{"name": "total", "value_extract": "^Total:\\h*(?<VAL>[\\d.]+)"},
+                             {"name": "sum", "value_extract": "^(?<VAL>12.*)$"}])_";
+    EXPECT_THAT(valuesOf(lettersOf("Total:       12.00", presetWith(fields)).at(0)),
+                ElementsAre(Pair("sum", "\"12.00\"")));
+}
+
+TEST(ApartFields, GiveWayToAValueOfTheirNameInAnotherZone) {
+    Cfg::ExtractPreset const preset(R"_({"zones": [
+        {"name": "Top", "location": {"right": 21000, "bottom": 2000},
+         "fields": [{"name": "total", "value_extract": "^Total:\\h*(?<VAL>.+)$"}]},
+        {"name": "Rest", "location": {"top": 2000, "right": 21000, "bottom": 29700},
+         "fields": [{"name": "total", "value_extract": "^Sum:\\h*(?<VAL>.+)$"}]}]})_"_json.toObject());
+    EXPECT_THAT(valuesOf(lettersOf("Total:       12.00\n\n\n\nSum: 13.00", preset).at(0)),
+                ElementsAre(Pair("total", "\"13.00\"")));
+    EXPECT_THAT(valuesOf(lettersOf("Total:       12.00\n\n\n\nSum 13.00", preset).at(0)),
+                ElementsAre(Pair("total", "\"12.00\"")));
+}
+
+TEST(ApartFields, ComeBeforeADefaultAndAreThere) {
+    auto const letters = lettersOf("Total:       12.00\n\nDate 1", presetWith(R"_([
+        {"name": "total", "value_extract": "^Total:\\h*(?<VAL>.+)$", "default_value": "0", "obligatory": true},
+        {"name": "sum", "value_extract": "^Sum:\\h*(?<VAL>.+)$", "obligatory": true}])_"));
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("total", "\"12.00\"")));
+    EXPECT_THAT(letters.at(0).missing, ElementsAre("sum"));
+}
+
+TEST(ApartFields, BeginALetterWhereTheyAreMarks) {
+    auto const letters = lettersOf("Ref:          a\fmore\fRef:         b", presetWith(R"_([
+        {"name": "ref", "mark": 1, "value_extract": "^Ref:\\h*(?<VAL>.+)$"}])_"));
+    EXPECT_THAT(pagesOf(letters), ElementsAre(ElementsAre(1, 2), ElementsAre(3)));
+}
+
+TEST(ApartFields, AreNoAddresses) {
+    auto const fields = R"_([{"name": "email", "priority": 2, "value_extract": "^Email:\\h*(?<VAL>\\S+)"}])_";
+    EXPECT_THAT(valuesOf(lettersOf("Email:           a@b.example", presetWith(fields)).at(0)), IsEmpty());
+}
+
+TEST(ApartFields, PreferTheNearestValueThatIsValid) {
+    auto const fields = R"_([{"name": "no", "value_type": 1, "value_extract": "^No\\h*(?<VAL>\\S+)"}])_";
+    // The label's row is tried first, then its column.
+    EXPECT_THAT(valuesOf(lettersOf("No        Date\n17        today", presetWith(fields)).at(0)),
+                ElementsAre(Pair("no", "17")));
+    EXPECT_THAT(valuesOf(lettersOf("No        Date\nx         today", presetWith(fields)).at(0)),
+                ElementsAre(Pair("no", "\"Date\"")));
+}
+
+TEST(ApartFields, TakeTheirLinesOutOfTheZone) {
+    auto const fields = R"_([{"name": "one", "value_extract": "^No\\h*(?<VAL>\\d+)"},
+                             {"name": "two", "value_extract": "^No\\h*(?<VAL>\\d+)"}])_";
+    EXPECT_THAT(valuesOf(lettersOf("No        1\n\n\nNo        2", presetWith(fields)).at(0)),
+                ElementsAre(Pair("one", "\"1\""), Pair("two", "\"2\"")));
+}
+
+TEST(ApartFields, HaveSomethingOfEachLine) {
+    // The pattern fits behind a blank, which no line of its own has in front of it.
+    auto const fields = R"_([{"name": "no", "value_extract": "(?<= )(?<VAL>\\d+)$"}])_";
+    EXPECT_THAT(valuesOf(lettersOf("No          17", presetWith(fields)).at(0)), IsEmpty());
+}
+
+TEST(ApartFields, AreNotSoughtByPatternsForAWholeText) {
+    for (std::string const pattern : {R"(\\ATotal:\\h*(?<VAL>.+))", R"(^Total:\\h*(?<VAL>.+)\\Z)"}) {
+        std::string const fields = R"([{"name": "total", "value_extract": ")" + pattern + "\"}]";
+        EXPECT_THAT(valuesOf(lettersOf("Total:          12.00", presetWith(fields.c_str())).at(0)), IsEmpty())
+            << pattern;
+    }
+}
+
+TEST(ApartFields, AreAsWideAsTheWidestPart) {
+    auto const fields = [](int width) {
+        return R"_([{"name": "total", "value_extract": "^Total:\\h*(?<VAL>.+)$", "width": )_" +
+               std::to_string(width) + "}]";
+    };
+    // Six columns of 2.1167 mm.
+    std::string const document = "Total:          12.00";
+    EXPECT_THAT(valuesOf(lettersOf(document, presetWith(fields(1270).c_str())).at(0)), SizeIs(1));
+    EXPECT_THAT(valuesOf(lettersOf(document, presetWith(fields(1269).c_str())).at(0)), IsEmpty());
+}
+
 TEST(Zones, WithoutALocationHoldTheBlockNearestToTheirPoint) {
     // The default point is at 45, 62 mm: the 13th row.
     std::string const document = "Sender\n\n\n\n\n\n\n\n\n\n\nLena Brandt\nWhitstable\n\n\nDear Lena";
@@ -226,11 +326,11 @@ TEST(Zones, EachHaveATextOfTheirOwn) {
 }
 
 TEST(Presets, SayHowFarApartWordsAndLinesMayBe) {
-    Cfg::ExtractPreset preset = presetWith(R"([{"name": "date", "value_extract": "^Date: (?<VAL>.*)$"}])");
+    Cfg::ExtractPreset preset = presetWith(R"_([{"name": "all", "value_extract": "\\A(?<VAL>.*)\\Z"}])_");
     std::string const document = "Date:          today";
     EXPECT_THAT(valuesOf(lettersOf(document, preset).at(0)), IsEmpty());
     preset.setMaxSpacesBetweenFrags(10.0);
-    EXPECT_THAT(valuesOf(lettersOf(document, preset).at(0)), ElementsAre(Pair("date", "\"today\"")));
+    EXPECT_THAT(valuesOf(lettersOf(document, preset).at(0)), ElementsAre(Pair("all", "\"Date: today\"")));
     preset.setMaxLineDistance(2.5);
     preset.setSpaceAdjustPerc(20);
     EXPECT_EQ(rulesOf(preset).maxLineDistance, 2.5);
@@ -288,6 +388,34 @@ TEST(Traces, TellWhatWasSeenAndWhatCameOfIt) {
 
     EXPECT_FALSE(zone.fields[3].match);
     EXPECT_EQ(zone.fields[3].value, nullptr);
+}
+
+TEST(Traces, TellWhichLinesWereJoined) {
+    Cfg::ExtractPreset const preset = presetWith(R"_([
+        {"name": "total", "value_type": 2, "value_extract": "^Total:\\h*(?<VAL>[\\d.]+)"},
+        {"name": "date", "value_extract": "^Date:\\h*(?<VAL>.+)$"},
+        {"name": "none", "value_extract": "^None:\\h*(?<VAL>.+)$"}])_");
+    Trace trace;
+    lettersOf("Date:\ntoday\n\n\nTotal:         12.00 EUR", preset, &trace);
+    std::vector<FieldTrace> const& fields = trace.pages.at(0).zones.at(0).fields;
+
+    FieldTrace const& total = fields.at(0);
+    ASSERT_TRUE(total.joined && total.match);
+    EXPECT_EQ(total.joined->joint, Joint::Right);
+    EXPECT_THAT(total.joined->parts, ElementsAre(Box{2500, 2693, 3770, 3046}, Box{5675, 2693, 6733, 3046}));
+    EXPECT_EQ(total.match->text, "Total: 12.00");
+    EXPECT_EQ(total.match->box, (Box{2500, 2693, 6733, 3046}));
+    EXPECT_EQ(total.match->width, 1270);
+    EXPECT_EQ(total.cut, "Total:\n12.00 EUR");
+    EXPECT_EQ(total.rawText, "12.00");
+    EXPECT_EQ(text(total.value->rawValue()), "12");
+    EXPECT_TRUE(total.counts);
+
+    ASSERT_TRUE(fields.at(1).joined);
+    EXPECT_EQ(fields.at(1).joined->joint, Joint::Below);
+    EXPECT_EQ(fields.at(1).match->text, "Date: today");
+    EXPECT_FALSE(fields.at(2).joined);
+    EXPECT_FALSE(fields.at(2).match);
 }
 
 TEST(Traces, SayWhichFieldOfANameCounts) {
@@ -378,6 +506,20 @@ TEST(PatternTimes, EndAFieldAndGoOn) {
         ElementsAre("a: its pattern was given up, since it took longer than 0.050 s; \"vlmail presets lint\" "
                     "tells what makes it slow",
                     "b: its pattern was given up, since it took longer than 0.050 s; \"vlmail presets lint\" "
+                    "tells what makes it slow"));
+}
+
+TEST(PatternTimes, HoldForJoinedLinesToo) {
+    // Soon told of each line by itself, which is no "x " and more, and slowly of both.
+    Cfg::ExtractPreset const preset = presetWith(R"_([
+        {"name": "a", "value_extract": "(?<VAL>^x .*.*.*.*.*:)"}, {"name": "b", "value_extract": "(?<VAL>y)"}])_");
+    Document document = openDocument("x          " + longText().substr(100) + "\ny", "a.txt");
+    using std::chrono_literals::operator""ms;
+    auto const letters = readLetters(document, preset, nullptr, {}, {50ms, 60'000ms});
+    EXPECT_THAT(valuesOf(letters.at(0)), ElementsAre(Pair("b", "\"y\"")));
+    EXPECT_THAT(
+        letters.at(0).warnings,
+        ElementsAre("a: its pattern was given up, since it took longer than 0.050 s; \"vlmail presets lint\" "
                     "tells what makes it slow"));
 }
 

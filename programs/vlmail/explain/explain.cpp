@@ -48,6 +48,18 @@ json::Object toJson(Reader::Stretch const& stretch) {
     return {{TEXT, stretch.text}, {BOX, toJson(stretch.box)}, {WIDTH, stretch.width}};
 }
 
+json::Array toJson(std::vector<Box> const& boxes) {
+    json::Array array;
+    for (Box const& box : boxes)
+        array.append(toJson(box));
+    return array;
+}
+
+json::Object toJson(Reader::JoinedMatch const& joined) {
+    return {{JOINT, joined.joint == Reader::Joint::Right ? JOINT_RIGHT : JOINT_BELOW},
+            {PARTS, toJson(joined.parts)}};
+}
+
 json::Object toJson(NearMiss const& miss) {
     json::Object object{{KIND, VlMail::nameOf(miss.kind)}, {SAYS, miss.says}};
     if (miss.page == 0)
@@ -112,12 +124,9 @@ private:
         else
             object.set(POINT, zone.mostProbablePoint().serialize());
         object.set(TEXT, trace.text);
-        json::Array blocks;
-        for (Box const& block : trace.blocks)
-            blocks.append(toJson(block));
-        if (!blocks.empty())
+        if (!trace.blocks.empty())
             object.set(BOX, toJson(trace.box));
-        object.set(BLOCKS, blocks);
+        object.set(BLOCKS, toJson(trace.blocks));
         json::Array fields;
         for (FieldTrace const& field : trace.fields)
             fields.append(explain(trace, field));
@@ -132,6 +141,8 @@ private:
                             {PRIORITY, field.priority()}, {OBLIGATORY, field.mustHave()}};
         if (trace.match)
             object.set(MATCH, toJson(*trace.match));
+        if (trace.joined)
+            object.set(JOINED, toJson(*trace.joined));
         if (!trace.cut.empty())
             object.set(CUT, trace.cut);
         if (trace.rawText)

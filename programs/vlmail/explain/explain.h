@@ -74,6 +74,11 @@ constexpr char const* OUTCOME_TOO_WIDE = "too_wide";
 constexpr char const* OUTCOME_NOT_FOUND = "not_found";
 /// The pattern is empty.
 constexpr char const* OUTCOME_NOT_SEARCHED = "not_searched";
+constexpr char const* JOINED = "joined";
+constexpr char const* JOINT = "joint";
+constexpr char const* JOINT_RIGHT = "right";
+constexpr char const* JOINT_BELOW = "below";
+constexpr char const* PARTS = "parts";
 constexpr char const* CUT = "cut";
 constexpr char const* RAW = "raw";
 constexpr char const* IS_DEFAULT = "default";

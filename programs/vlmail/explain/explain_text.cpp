@@ -160,6 +160,13 @@ private:
             line(12, std::to_string(++number) + ". " + textOf(miss.toObject(), SAYS));
     }
 
+    static std::string joinInWords(json::Value const& joined) {
+        if (!joined)
+            return {};
+        bool const isRight = textOf(joined.toObject(), JOINT) == JOINT_RIGHT;
+        return std::string(", joined with the line ") + (isRight ? "to the right," : "below,");
+    }
+
     void printEvidence(json::Object const& field) {
         std::string const pattern = textOf(field, PATTERN);
         if (!pattern.empty())
@@ -168,8 +175,8 @@ private:
         if (!found)
             return;
         json::Object const& match = found.toObject();
-        line(12,
-             "matches " + excerpt(textOf(match, TEXT), MAX_LETTERS) + " at " + placeInWords(match.get(BOX)));
+        line(12, "matches " + excerpt(textOf(match, TEXT), MAX_LETTERS) + joinInWords(field.get(JOINED)) +
+                     " at " + placeInWords(match.get(BOX)));
         std::string const cut = textOf(field, CUT);
         if (!cut.empty() && cut != textOf(match, TEXT))
             line(12, "takes " + excerpt(cut, MAX_LETTERS) + " out of the zone's text");

@@ -238,7 +238,8 @@ std::optional<Found> earlierField(Search const& search) {
     if (!hit)
         return std::nullopt;
     for (FieldTrace const* const earlier : search.earlierFields()) {
-        cutField(*earlier->definition, text);
+        FieldTrace taken;
+        cutField(*earlier->definition, text, taken);
         if (search.find(text))
             continue;
         return search.told(hit, search.pageNumber(), [&](Hit const& at) {

@@ -53,6 +53,8 @@ std::set<std::string> foundOn(LaidOutPage const& page, Cfg::ExtractPreset const&
     try {
         for (Cfg::ExtractZone const& zone : preset.zones())
             fields.search(zone, Reader::textOf(*page.page, page.layout, zone));
+        fields.searchJoinedLines();
+        fields.finish();
     } catch (Base::Error const&) {
         return names;
     }

@@ -1,6 +1,7 @@
 #include "programs/vlmail/explain/near_miss_search.h"
 
 #include "programs/base/quoting.h"
+#include "programs/reader/joined_search.h"
 
 #include <algorithm>
 #include <limits>
@@ -53,8 +54,10 @@ ZoneText Search::everythingOn(LaidOutPage const& page) {
 }
 
 ZoneText Search::remaining(ZoneText text) const {
-    for (FieldTrace const* const earlier : earlierFields())
-        cut(*earlier->definition, text);
+    for (FieldTrace const* const earlier : earlierFields()) {
+        FieldTrace taken;
+        cutAsItStands(*earlier->definition, text, taken);
+    }
     return text;
 }
 
@@ -74,13 +77,26 @@ ExtractField Search::withPattern(std::string const& pattern) const {
     return variant;
 }
 
-std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const {
+std::shared_ptr<ExtractedField> Search::cutAsItStands(ExtractField const& field, ZoneText& text,
+                                                      FieldTrace& trace) const {
     if (isGivenUp())
-        return std::nullopt;
-    FieldTrace trace;
-    std::shared_ptr<ExtractedField> const value = cutField(field, text, &trace);
+        return nullptr;
+    std::shared_ptr<ExtractedField> value = cutField(field, text, trace);
     if (trace.failure)
         failures_.push_back(*trace.failure);
+    return value;
+}
+
+std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const {
+    FieldTrace trace;
+    trace.definition = &field;
+    std::shared_ptr<ExtractedField> value = cutAsItStands(field, text, trace);
+    if (trace.wantsJoinedLines() && !isGivenUp()) {
+        value = cutJoinedField(field, text, trace,
+                               [&](ExtractedField const& found) { return isValid(field, found); });
+        if (trace.failure)
+            failures_.push_back(*trace.failure);
+    }
     if (!trace.match)
         return std::nullopt;
     return Hit{std::move(*trace.match), trace.rawText && value && isValid(field, *value)};

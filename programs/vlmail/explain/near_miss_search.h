@@ -84,7 +84,7 @@ public:
     /// Why patterns could not be searched, in the engine's words.
     std::vector<std::string> const& failures() const { return failures_; }
 
-    /// Takes the hit's lines out of the text, as reading does.
+    /// Takes the hit's lines out of the text, as reading does, joined lines too.
     std::optional<Hit> cut(Cfg::ExtractField const& field, Reader::ZoneText& text) const;
     std::optional<Hit> find(Cfg::ExtractField const& field, Reader::ZoneText text) const {
         return cut(field, text);
@@ -101,6 +101,9 @@ public:
     }
 
 private:
+    std::shared_ptr<Cfg::ExtractedField> cutAsItStands(Cfg::ExtractField const& field, Reader::ZoneText& text,
+                                                       Reader::FieldTrace& trace) const;
+
     MissedField const& missed_;
     ReadPages& pages_;
     LaidOutPage const& page_;

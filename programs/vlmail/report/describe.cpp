@@ -43,6 +43,9 @@ std::string noteOf(FieldTrace const& field, State state, Cfg::ExtractedField con
         addNote(notes, "another field of this name counts");
     if (state == State::Missing)
         addNote(notes, "it is obligatory");
+    if (field.joined)
+        addNote(notes, field.joined->joint == Reader::Joint::Right ? "joined with the line to the right"
+                                                                   : "joined with the line below");
     if (field.isTooWide)
         addNote(notes, "the match is " + inMillimetres(field.match->width) + " mm wide, allowed are " +
                            inMillimetres(field.definition->maxWidth()) + " mm");
@@ -74,8 +77,8 @@ Field fieldOf(FieldTrace const& trace, Cfg::ExtractedField const* primary, Reade
     if (trace.value)
         field.value = trace.value->valueToStr();
     if (trace.match) {
-        field.match = trace.match->box;
-        field.tag = tagFor(*field.match, field.name, page);
+        field.match = trace.joined ? trace.joined->parts : std::vector{trace.match->box};
+        field.tag = tagFor(field.match.front(), field.name, page);
     }
     return field;
 }

@@ -92,13 +92,19 @@ std::string overlayOf(Zone const& zone, std::string const& anchor, Letter const&
     return overlay(anchor, look, box, letter, name, name);
 }
 
+/// The first box of a match bears the name; those of lines that were joined with it lead to the same row.
 std::string overlayOf(Field const& field, std::string const& anchor, Letter const& letter) {
-    Box const box = onPage(*field.match, letter);
     StateLook const state = lookOf(field);
-    std::string look = std::string("match ") + state.look;
-    look += TAGS.at(static_cast<std::size_t>(field.tag));
+    std::string const look = std::string("match ") + state.look;
     std::string const tag = (isTrouble(field) ? "\u2717 " : "") + field.name;
-    return overlay(anchor, look, box, letter, tag, "field " + field.name + ": " + state.words);
+    std::string html =
+        overlay(anchor, look + TAGS.at(static_cast<std::size_t>(field.tag)),
+                onPage(field.match.front(), letter), letter, tag, "field " + field.name + ": " + state.words);
+    for (std::size_t i = 1; i < field.match.size(); ++i)
+        html += "<a class=\"" + look + "\" href=\"#" + rowAnchor(anchor) + "\" style=\"" +
+                styleOf(onPage(field.match[i], letter), letter) + "\" aria-label=\"field " +
+                escaped(field.name) + ", joined line\"></a>\n";
+    return html;
 }
 
 /// The largest first, so that none hides another from the pointer.
@@ -122,7 +128,7 @@ std::string overlaysOf(Letter const& letter, std::string const& anchor) {
     for (std::size_t i = 0; i < letter.zones.size(); ++i) {
         std::vector<Field> const& fields = letter.zones[i].fields;
         for (std::size_t k = 0; k < fields.size(); ++k) {
-            if (fields[k].match)
+            if (!fields[k].match.empty())
                 html += overlayOf(fields[k], numbered(numbered(anchor, 'z', i), 'f', k), letter);
         }
     }
@@ -145,7 +151,7 @@ std::string figureOf(Letter const& letter, std::string const& anchor) {
 /// A field on the picture is reached from its name.
 std::string nameCell(Field const& field, std::string const& anchor) {
     std::string const name = isolated(field.name);
-    if (!field.match)
+    if (field.match.empty())
         return name;
     return "<a href=\"#" + anchor + "\">" + name + "</a>";
 }

@@ -5,7 +5,6 @@
 #include "programs/reader/geometry.h"
 
 #include <cstddef>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -21,7 +20,7 @@ struct Field {
         Missing, ///< not found, although obligatory
     };
 
-    /// Where the name stands at the match.
+    /// Where the name stands at the match, at the first of its boxes.
     enum class Tag { Behind, InFront, Above };
 
     std::string name;
@@ -29,8 +28,9 @@ struct Field {
     State state = State::Found;
     /// What there is to add, for people.
     std::string note = {};
-    /// Where the pattern matched.
-    std::optional<Reader::Box> match = {};
+    /// Where the pattern matched: one box, or one for each of the lines that were joined; empty without a
+    /// match.
+    std::vector<Reader::Box> match = {};
     Tag tag = Tag::Behind;
 };
 

@@ -139,6 +139,30 @@ TEST_F(ExplanationTest, OfAFoundFieldTellsMatchCutAndValue) {
         "shown": "2021/03/05 00:00:00", "passed_over": false})text"_json));
 }
 
+constexpr char const* APART = R"text({"name": "total", "value_type": 2,
+    "value_extract": "^Total:\\h*(?<VAL>[\\d.]+)"}, {"name": "date", "value_extract": "^Date:\\h*(?<VAL>.+)$"})text";
+
+TEST_F(ExplanationTest, OfAFieldInJoinedLinesTellsWhichAndWhere) {
+    json::Object const reading = explainedFields("Date:\ntoday\n\n\nTotal:         12.00 EUR\n", APART);
+    EXPECT_EQ(text(fieldOf(reading, "total").get("joined")), text(R"({"joint": "right", "parts": [
+        {"left": 2500, "top": 2693, "right": 3770, "bottom": 3046},
+        {"left": 5675, "top": 2693, "right": 6733, "bottom": 3046}]})"_json));
+    EXPECT_EQ(text(fieldOf(reading, "total").get("match")), text(R"({"text": "Total: 12.00",
+        "box": {"left": 2500, "top": 2693, "right": 6733, "bottom": 3046}, "width": 1270})"_json));
+    EXPECT_EQ(text(fieldOf(reading, "date").get("joined").toObject().get("joint")), "\"below\"");
+    EXPECT_FALSE(fieldOf(reading, "date").get("near_misses"));
+}
+
+TEST_F(ExplanationTest, ForPeopleSaysWhichLinesWereJoined) {
+    explainedFields("Date:\ntoday\n\n\nTotal:         12.00 EUR\n", APART);
+    vlmail({"letter", "--explain", "--settings", (folder_ / "settings.json").string(),
+            (folder_ / "letter.txt").string()});
+    EXPECT_THAT(out_,
+                HasSubstr("            matches \"Total: 12.00\", joined with the line to the right, at left "
+                          "25 mm, top 26.93 mm, right 67.33 mm, bottom 30.46 mm\n"));
+    EXPECT_THAT(out_, HasSubstr("            matches \"Date: today\", joined with the line below, at "));
+}
+
 TEST_F(ExplanationTest, OfAnInvalidFieldTellsWhatValidationSaid) {
     json::Object const total = field("total");
     EXPECT_EQ(total.get("outcome").textOrEmpty(), "invalid");

@@ -75,12 +75,25 @@ TEST_F(NearMissTest, OfALineInTwoColumnsThatWereReadAsOneIsASmallerGap) {
 TEST_F(NearMissTest, OfARuleOfThePresetThatOtherFieldsNeedSaysWhatItLosesAndStandsBehind) {
     json::Object const reading = explainedFields("Ref: 17   Page 1\nTotal:   12\n",
                                                  R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>\\d+)$"},
-                                                     {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"})_");
+                                                     {"name": "total", "priority": -1, "value_extract": "^Total: (?<VAL>\\d+)$"})_");
     EXPECT_THAT(
         nearMissesIn(fieldOf(reading, "ref")),
         ElementsAre(StartsWith("anchor: "),
                     "gaps: would match \"Ref: 17\" with \"max_spaces_between_fragments\" at 2.5 or less "
                     "instead of 3, but would lose \"total\""));
+}
+
+TEST_F(NearMissTest, OfAPlaceReadsItsLinesJoinedToo) {
+    json::Object const reading =
+        explainedText("Address\n\n\nTotal:            12\n", R"_({"extract_presets": [
+        {"match": "letter.*", "pack_preset": "P", "zones": [
+            {"name": "Top", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 2000}, "fields": [
+                {"name": "total", "value_extract": "^Total:\\h*(?<VAL>\\d+)$"}]}]}],
+        "pack_presets": [{"name": "P"}]})_");
+    EXPECT_THAT(
+        nearMissesIn(fieldOf(reading, "total")),
+        ElementsAre(
+            "zone: would match 7 mm below the zone \"Top\": move its bottom from 20 mm to 27 mm or more"));
 }
 
 TEST_F(NearMissTest, OfTextBesideItInItsLineIsTheAnchor) {
@@ -206,7 +219,7 @@ TEST_F(NearMissTest, ThatGivesAnInvalidValueStandsBehindOthers) {
 TEST_F(NearMissTest, ListHasNoMoreThanThree) {
     std::string const document = "REF: 17\nRef:\n17\n\fRef: 17\n\fRef: 17\n";
     EXPECT_THAT(
-        missesOf(document, "^Ref:\\h+(?<VAL>\\d+)$"),
+        missesOf(document, "^Ref:\\h+(?<VAL>\\d+)$", R"(, "priority": -1)"),
         ElementsAre(StartsWith("letter_case: "), StartsWith("joined_lines: "), StartsWith("other_page: ")));
 }
 

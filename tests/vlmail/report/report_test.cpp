@@ -48,7 +48,7 @@ std::string sectionWith(Field const& field) {
 
 /// A document in whose texts everything is hostile.
 Report::Document hostileDocument() {
-    Field field{HOSTILE, HOSTILE, Field::State::Invalid, HOSTILE, Reader::Box{0, 0, 10, 10}};
+    Field field{HOSTILE, HOSTILE, Field::State::Invalid, HOSTILE, {Reader::Box{0, 0, 10, 10}}};
     Report::Letter letter = letterWith({{HOSTILE, {0, 0, 100, 100}, true, true, {field}}});
     letter.pages = letter.whyNot = letter.whyNoPicture = HOSTILE;
     letter.png.clear();
@@ -132,11 +132,25 @@ TEST(ReportOverlay, TellsOrdinaryZonesAndThoseFoundByTheirPoint) {
 
 TEST(ReportOverlay, PutsMatchesWhereTheyAreWithTheirNames) {
     std::string const html =
-        sectionWith(Field{"total", "5", Field::State::Found, "", Reader::Box{5000, 6000, 7000, 6300}});
+        sectionWith(Field{"total", "5", Field::State::Found, "", {Reader::Box{5000, 6000, 7000, 6300}}});
     EXPECT_THAT(html,
                 HasSubstr("id=\"d1l1z1f1\" href=\"#d1l1z1f1r\" "
                           "style=\"left:25%;top:20%;width:10%;height:1%\" "
                           "aria-label=\"field total: \u2713 found\"><span class=\"tag\"><bdi>total</bdi>"));
+}
+
+TEST(ReportOverlay, PutsEachOfJoinedLinesWhereItIs) {
+    std::string const html =
+        sectionWith(Field{"a<b",
+                          "5",
+                          Field::State::Found,
+                          "",
+                          {Reader::Box{5000, 6000, 7000, 6300}, Reader::Box{10000, 6000, 12000, 6300}}});
+    EXPECT_THAT(html, HasSubstr("<a class=\"match \" id=\"d1l1z1f1\" href=\"#d1l1z1f1r\" "
+                                "style=\"left:25%;top:20%;width:10%;height:1%\""));
+    EXPECT_THAT(html, HasSubstr("<a class=\"match \" href=\"#d1l1z1f1r\" "
+                                "style=\"left:50%;top:20%;width:10%;height:1%\" "
+                                "aria-label=\"field a&lt;b, joined line\"></a>"));
 }
 
 TEST(ReportOverlay, EndsAtThePagesEdgesWhateverTheSettingsSay) {
@@ -172,7 +186,7 @@ class ReportState : public testing::TestWithParam<StateCase> {};
 TEST_P(ReportState, IsToldInWordsAndByTheLookOfRowAndMatch) {
     StateCase const& expected = GetParam();
     std::string const html =
-        sectionWith(Field{"total", "5", expected.state, "", Reader::Box{5000, 6000, 7000, 6300}});
+        sectionWith(Field{"total", "5", expected.state, "", {Reader::Box{5000, 6000, 7000, 6300}}});
     EXPECT_THAT(html, HasSubstr(std::string("<tr id=\"d1l1z1f1r\" class=\"") + expected.row + "\">"));
     EXPECT_THAT(html, HasSubstr(std::string("\">") + expected.words + "</span>"));
     EXPECT_THAT(html, HasSubstr(std::string("<a class=\"") + expected.match + "\""));
@@ -188,12 +202,12 @@ INSTANTIATE_TEST_SUITE_P(
                     StateCase{Field::State::Missing, "bad", "\u2717 missing", "match bad"}));
 
 TEST(ReportMatch, HasACrossInItsTagWhenItIsInvalid) {
-    EXPECT_THAT(sectionWith(Field{"total", "x", Field::State::Invalid, "", Reader::Box{0, 0, 10, 10}}),
+    EXPECT_THAT(sectionWith(Field{"total", "x", Field::State::Invalid, "", {Reader::Box{0, 0, 10, 10}}}),
                 HasSubstr("<span class=\"tag\"><bdi>\u2717 total</bdi></span>"));
 }
 
 TEST(ReportMatch, HasItsTagWhereThereIsRoom) {
-    Field field{"total", "5", Field::State::Found, "", Reader::Box{15000, 0, 19000, 300}};
+    Field field{"total", "5", Field::State::Found, "", {Reader::Box{15000, 0, 19000, 300}}};
     EXPECT_THAT(sectionWith(field), HasSubstr("<a class=\"match \""));
     field.tag = Field::Tag::InFront;
     EXPECT_THAT(sectionWith(field), HasSubstr("<a class=\"match  front\""));
@@ -248,7 +262,7 @@ TEST(ReportPage, RefersToNothingOutside) {
 
 TEST(ReportPage, LinksToAnchorsThatAreThereOnce) {
     Zone zone = addressWindow();
-    zone.fields = {{"total", "5", Field::State::Found, "", Reader::Box{5000, 6000, 7000, 6300}},
+    zone.fields = {{"total", "5", Field::State::Found, "", {Reader::Box{5000, 6000, 7000, 6300}}},
                    {"none", "", Field::State::NotFound}};
     Report::Letter const letter = letterWith({zone, addressWindow()});
     std::string const html = wholePage({documentWith({letter, letter}), documentWith({letter})});
