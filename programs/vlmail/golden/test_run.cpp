@@ -35,7 +35,8 @@ TestResult write(TestCase const& one, DocumentReading const& reading, std::vecto
 } // namespace
 
 TestRun::TestRun(NodeSettings const& settings, UpdateExpectations update)
-    : settings_(settings), presets_(settings.presets()), update_(update == UpdateExpectations::Yes) {}
+    : settings_(settings), presets_(settings.presets()), index_(presets_),
+      update_(update == UpdateExpectations::Yes) {}
 
 void TestRun::readDocuments(std::vector<TestCase> const& cases, Workers const& workers,
                             BatchWatcher& watcher) {
@@ -62,8 +63,7 @@ TestResult TestRun::run(TestCase const& one) const {
 DocumentReading TestRun::readingOf(TestCase const& one) const {
     if (!one.isZonesText())
         return readings_.at(one.document.string());
-    return readZonesText(Base::readFile(one.document), Base::validUtf8(one.document.stem().string()),
-                         presets_);
+    return readZonesText(Base::readFile(one.document), Base::validUtf8(one.document.stem().string()), index_);
 }
 
 TestResult TestRun::compare(TestCase const& one, DocumentReading const& reading) const {
@@ -72,7 +72,7 @@ TestResult TestRun::compare(TestCase const& one, DocumentReading const& reading)
             return write(one, reading, {});
         return {Verdict::New, {}, "nothing is expected of it yet; --update writes what is found"};
     }
-    auto const& definitions = presets_.matchExtrPreset(reading.document).zones();
+    auto const& definitions = index_.findMatch(reading.document).first.zones();
     std::vector<std::string> found = differences(expectationIn(one.expectation), reading, definitions);
     if (found.empty())
         return {};

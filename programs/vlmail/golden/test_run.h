@@ -3,6 +3,7 @@
 
 #include "programs/vlmail/golden/test_case.h"
 #include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/letters/reading.h"
 
 #include <cstddef>
@@ -42,6 +43,7 @@ private:
 
     NodeSettings const& settings_;
     Cfg::Presets presets_;
+    PresetIndex index_;
     bool update_;
     std::map<std::string, DocumentReading> readings_;
 };

@@ -61,7 +61,7 @@ ExtractZone const& zoneNamed(std::string const& name, Cfg::ExtractPreset const& 
 } // namespace
 
 DocumentReading readZonesText(std::string const& text, std::string const& documentName,
-                              Cfg::Presets const& presets) {
+                              PresetIndex const& presets) {
     auto const& [extractPreset, packPreset] = presets.findMatch(documentName);
     std::vector<Reader::GivenText> texts;
     for (ZoneSection& section : sectionsOf(text))

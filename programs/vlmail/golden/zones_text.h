@@ -7,6 +7,7 @@
 //     [Total]
 //     Total: 1,234.50
 
+#include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/letters/reading.h"
 
 #include <string>
@@ -16,6 +17,6 @@ namespace VlMail {
 /// Reads the letter as a document of that name would be; zones that the text leaves out have no fields.
 /// Throws Error, without the name of the file, when the text is not such a letter or the presets fail.
 DocumentReading readZonesText(std::string const& text, std::string const& documentName,
-                              Cfg::Presets const& presets);
+                              PresetIndex const& presets);
 
 } // namespace VlMail

@@ -143,4 +143,11 @@ PresetIndex::findMatch(std::string const& name) const {
     return presets_.findMatch(name);
 }
 
+Cfg::PackPreset const* packPresetNamed(std::string const& name, Cfg::Presets const& presets) {
+    auto const& all = presets.elements<PackPresets>();
+    auto const found =
+        std::ranges::find_if(all, [&](auto const& element) { return element.value.name() == name; });
+    return found == all.end() ? nullptr : &found->value;
+}
+
 } // namespace VlMail

@@ -1,5 +1,5 @@
 #pragma once
-// Finds a document's presets among many, as Cfg::Presets does.
+// Finds a document's presets, as Cfg::Presets does and fast among many: whoever has a name asks here.
 
 #include "vlservice/presets/presets.h"
 
@@ -40,5 +40,8 @@ private:
     std::unordered_map<std::uint32_t, Positions> byPiece_;
     std::unordered_map<std::string_view, Cfg::PackPreset const*> packPresets_;
 };
+
+/// The one that findMatch() gives where a preset names it: the first of the name; none is nullptr.
+Cfg::PackPreset const* packPresetNamed(std::string const& name, Cfg::Presets const& presets);
 
 } // namespace VlMail

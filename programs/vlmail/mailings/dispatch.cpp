@@ -2,25 +2,21 @@
 
 #include "programs/base/error.h"
 #include "programs/base/quoting.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/pack/container_format.h"
 
-#include <algorithm>
 #include <ostream>
 #include <utility>
 
 namespace VlMail {
 namespace {
 
-/// The one that Presets::findMatch has found: the first of the name.
-Cfg::PackPreset const& presetNamed(std::string const& name, Cfg::Presets const& presets) {
-    auto const& all = presets.elements<Cfg::PresetFieldIdxs::PackPresets>();
-    auto const found = std::find_if(all.begin(), all.end(),
-                                    [&](auto const& element) { return element.value.name() == name; });
-    if (found == all.end())
-        throw Base::Error("there is no pack preset \"" + name + "\"; add it to the settings");
-    return found->value;
+Cfg::PackPreset const& requirePackPreset(std::string const& name, Cfg::Presets const& presets) {
+    if (Cfg::PackPreset const* const preset = packPresetNamed(name, presets))
+        return *preset;
+    throw Base::Error("there is no pack preset " + Base::inQuotes(name) + "; add it to the settings");
 }
 
 /// A document whose name a container cannot hold would fail all of its mailing in the end.
@@ -68,7 +64,7 @@ void Dispatch::mailLetters(DocumentReading reading) {
 OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
     auto& mailing = mailings_[packPreset];
     if (!mailing)
-        mailing = begin_(presetNamed(packPreset, presets_));
+        mailing = begin_(requirePackPreset(packPreset, presets_));
     return *mailing;
 }
 

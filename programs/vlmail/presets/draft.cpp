@@ -6,6 +6,7 @@
 #include "programs/reader/letters.h"
 #include "programs/reader/month_names.h"
 #include "programs/reader/number_reading.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/presets/draft_labels.h"
 
 #include "vlservice/extract/extract_field.h"
@@ -220,9 +221,10 @@ json::Object settingsFor(std::string const& match, std::optional<AddressSighting
 std::size_t countFound(json::Object const& settings, std::string const& name,
                        std::vector<Reader::Document>& documents) {
     Cfg::Presets const presets(settings.get(Cfg::Presets::PART_NAME.c_str()), false, false);
+    PresetIndex const index(presets);
     std::size_t count = 0;
     for (Reader::Document& document : documents) {
-        auto const& [extract, pack] = presets.findMatch(document.name());
+        auto const& [extract, pack] = index.findMatch(document.name());
         auto const letters = Reader::readLetters(document, extract, nullptr, Reader::ReadingRules::of(pack));
         count += std::ranges::any_of(letters, [&](Reader::Letter const& letter) {
             return std::ranges::any_of(letter.fields, [&](auto const& entry) {
