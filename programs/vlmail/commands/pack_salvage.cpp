@@ -1,8 +1,8 @@
 // vlmail pack salvage: a new mailing file out of what is whole in a damaged one.
 #include "programs/base/error.h"
 #include "programs/base/log_capture.h"
-#include "programs/base/pending_file.h"
 #include "programs/base/plain_text.h"
+#include "programs/mailing/container_writer.h"
 #include "programs/mailing/entries_digest.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/pack.h"
@@ -46,8 +46,7 @@ SharedMemBuffer emptyMetadata(std::string const& packId) {
 
 void write(ByteFile& file, SalvagePlan const& plan, fs::path const& target) {
     Base::LogCapture const quiet;
-    Base::PendingFile pending(target);
-    PackWrapper out(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, plan.packId);
+    Mailing::ContainerWriter out(target, plan.packId);
     Mailing::EntriesDigest digest(plan.packId);
     for (SavedPage const& page : plan.pages) {
         SharedMemBuffer const blob = salvagedBlob(file, page.blob);
@@ -56,9 +55,7 @@ void write(ByteFile& file, SalvagePlan const& plan, fs::path const& target) {
     }
     SharedMemBuffer const metadata =
         plan.metadata ? salvagedBlob(file, *plan.metadata) : emptyMetadata(plan.packId);
-    if (!out.finalizeOutput(Mailing::withEntriesDigest(metadata, digest.text())))
-        throw Base::Error("cannot write \"" + target.string() + "\"; make room on the disk and try again");
-    pending.commit();
+    out.finish(Mailing::withEntriesDigest(metadata, digest.text()), "make room on the disk and try again");
 }
 
 /// "pages 1-3, 5"; names that are no numbers one by one.

@@ -2,11 +2,10 @@
 
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
-#include "programs/base/pending_file.h"
+#include "programs/mailing/container_writer.h"
 #include "programs/mailing/pack_database.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
-#include "vlservice/pack/pack_wrapper.h"
 
 #include <iomanip>
 #include <random>
@@ -28,22 +27,16 @@ public:
     MailingBuilder& builder() override { return builder_; }
 
     void finish() override {
-        if (!container_.finalizeOutput(builder_.metadata().toBlob()))
-            throw Base::Error("cannot write the mailing " + place() +
-                              ": the line above says why; make room on the disk and mail again");
-        file_.commit();
+        container_.finish(builder_.metadata().toBlob(), "make room on the disk and mail again");
     }
 
-    std::string place() const override { return file_.target().string(); }
+    std::string place() const override { return container_.target().string(); }
 
 private:
     MailingFile(fs::path const& folder, Cfg::PackPreset const& preset, std::time_t now, std::string const& id)
-        : file_(folder / (id + MAILING_ENDING)),
-          container_(file_.temporary().string(), PackWrapper::PURPOSE_OUTPUT, id),
-          builder_(container_, id, preset, now) {}
+        : container_(folder / (id + MAILING_ENDING), id), builder_(container_, id, preset, now) {}
 
-    Base::PendingFile file_;
-    PackWrapper container_;
+    Mailing::ContainerWriter container_;
     MailingBuilder builder_;
 };
 

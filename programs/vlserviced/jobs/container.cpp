@@ -1,11 +1,10 @@
 #include "programs/vlserviced/jobs/container.h"
 
-#include "programs/base/error.h"
-#include "programs/base/pending_file.h"
+#include "programs/mailing/container_writer.h"
 #include "programs/mailing/pack_database.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
-#include "vlservice/pack/pack_wrapper.h"
+#include "vlservice/pack/page_saver.h"
 
 #include <algorithm>
 
@@ -18,7 +17,7 @@ bool isCompressed(SharedMemBuffer const& blob) {
            std::equal(DB_ZIP_MAGIC.begin(), DB_ZIP_MAGIC.end(), reinterpret_cast<char const*>(blob.data()));
 }
 
-void copyPages(Mailing::PackDatabaseReader& pages, PackWrapper& container) {
+void copyPages(Mailing::PackDatabaseReader& pages, PageSaverI& container) {
     for (auto const& [document, page] : pages.pages()) {
         pages.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
             if (!Container::mayStandInIndex(document) || !Container::mayStandInIndex(page))
@@ -38,12 +37,9 @@ void writeContainer(PackLocation const& pack, std::filesystem::path const& targe
     SharedMemBuffer const metadata = pages.metadata();
     if (!isCompressed(metadata))
         throw BadPack("the metadata of pack " + pack.packId + " is not compressed");
-    Base::PendingFile pending(target);
-    PackWrapper container(pending.temporary().string(), PackWrapper::PURPOSE_OUTPUT, pack.packId);
+    Mailing::ContainerWriter container(target, pack.packId);
     copyPages(pages, container);
-    if (!container.finalizeOutput(metadata))
-        throw Base::Error("the container " + target.string() + " could not be written; the log says why");
-    pending.commit();
+    container.finish(metadata, "make room on the disk");
 }
 
 } // namespace VlServiced

@@ -2,11 +2,13 @@
 
 #include "programs/base/pending_file.h"
 #include "tests/support/failure_of.h"
+#include "tests/support/small_disk.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/pack_help.h"
 
 #include <gtest/gtest.h>
 
+#include <fstream>
 #include <iterator>
 
 namespace {
@@ -57,6 +59,18 @@ TEST_F(Container, IsNotWrittenOfPagesThatAreNotCompressed) {
                      VlServiced::BadPack);
     }
     EXPECT_EQ(filesInOutbox(), 0);
+}
+
+TEST_F(Container, SaysWhyItCannotBeWritten) {
+    VLServiceTest::SmallDisk const disk;
+    if (!disk.whyNot().empty())
+        GTEST_SKIP() << "no right to make a small disk: " << disk.whyNot();
+    storePack(file_, "p1");
+    target_ = fs::path(disk.path()) / "p1.mailing";
+    std::ofstream(fs::path(disk.path()) / "full") << std::string(std::size_t{8} << 20, 'x');
+    EXPECT_EQ(writingFailure("p1"),
+              "cannot write \"" + target_.string() + "\": No space left on device; make room on the disk");
+    EXPECT_FALSE(fs::exists(target_));
 }
 
 TEST_F(Container, IsNotWrittenWithoutMetadata) {
