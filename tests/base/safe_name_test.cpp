@@ -4,14 +4,12 @@
 
 namespace {
 
-struct Case {
-    char const* what;
-    std::string name;
-    std::string safe;
-};
-
 TEST(SafeFileName, KeepsAFileInsideItsFolder) {
-    Case const cases[] = {
+    struct {
+        char const* what;
+        std::string name;
+        std::string safe;
+    } const cases[] = {
         {"an ordinary name", "Rechnung_Müller & Söhne.pdf", "Rechnung_Müller & Söhne.pdf"},
         {"Greek", "Επιστολή 4.pdf", "Επιστολή 4.pdf"},
         {"nothing", "", "_"},
@@ -31,7 +29,7 @@ TEST(SafeFileName, KeepsAFileInsideItsFolder) {
         {"an overlong character of four bytes", "a\xF0\x80\x80\x80z", "a____z"},
         {"a character beyond the last", "a\xF4\x90\x80\x80z", "a____z"},
     };
-    for (Case const& c : cases)
+    for (auto const& c : cases)
         EXPECT_EQ(Base::safeFileName(c.name), c.safe) << c.what;
 }
 

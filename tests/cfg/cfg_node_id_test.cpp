@@ -69,14 +69,12 @@ TEST(CfgNodeIdComparison, IsThatOfTheArrays) {
     EXPECT_EQ(CfgNodeId(), node(""));
 }
 
-struct ParentCase {
-    char const* parent;
-    char const* child;
-    bool isParent;
-};
-
 TEST(CfgNodeIdParentage, IsOfAncestorsAtAnyDistanceByWholeTokens) {
-    ParentCase const cases[] = {
+    struct {
+        char const* parent;
+        char const* child;
+        bool isParent;
+    } const cases[] = {
         {"", "a=acme", true},
         {"", "", false},
         {"a=acme", "u=bob/a=acme", true},
@@ -89,7 +87,7 @@ TEST(CfgNodeIdParentage, IsOfAncestorsAtAnyDistanceByWholeTokens) {
         {"a=other", "u=bob/a=acme", false},
         {"a=x/", "a=x/a=x/", true},
     };
-    for (ParentCase const& c : cases)
+    for (auto const& c : cases)
         EXPECT_EQ(node(c.parent).isParentOf(node(c.child)), c.isParent) << c.parent << " of " << c.child;
 }
 

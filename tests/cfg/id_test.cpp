@@ -262,14 +262,12 @@ TEST(IdNames, AreCutOutBehindTheirPrefixes) {
     }
 }
 
-struct ParentCase {
-    char const* parent;
-    char const* child;
-    bool isParentOrEqual;
-};
-
 TEST(IdParentage, IsATailAtItsFirstOccurrence) {
-    ParentCase const cases[] = {
+    struct {
+        char const* parent;
+        char const* child;
+        bool isParentOrEqual;
+    } const cases[] = {
         {"a=acme", "u=bob/a=acme", true},
         {"u=bob/a=acme", "u=bob/a=acme", true},
         {"", "u=bob/a=acme", true},
@@ -284,7 +282,7 @@ TEST(IdParentage, IsATailAtItsFirstOccurrence) {
         {"cme", "u=bob/a=acme", true},
         {"a=acme", "u=bob/aa=acme", true},
     };
-    for (ParentCase const& c : cases)
+    for (auto const& c : cases)
         EXPECT_EQ(raw(c.parent).isParentOrEqual(raw(c.child)), c.isParentOrEqual)
             << c.parent << " of " << c.child;
 }

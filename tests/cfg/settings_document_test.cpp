@@ -21,7 +21,7 @@
 namespace {
 
 using namespace VLServiceTest;
-using Row = std::pair<std::string, std::string>;
+using DocumentedField = std::pair<std::string, std::string>;
 
 std::string document() {
     std::ifstream in(VLSERVICE_DOCS "/settings.md");
@@ -37,21 +37,21 @@ std::string section(std::string const& heading) {
 }
 
 /// What the expression's two groups hold, line by line.
-std::vector<Row> rows(std::string const& text, std::regex const& expression) {
-    std::vector<Row> rows;
+std::vector<DocumentedField> rows(std::string const& text, std::regex const& expression) {
+    std::vector<DocumentedField> rows;
     for (std::sregex_iterator at(text.begin(), text.end(), expression), end; at != end; ++at)
         rows.emplace_back((*at)[1], (*at)[2]);
     return rows;
 }
 
-std::vector<Row> describedFields(std::string const& part) {
+std::vector<DocumentedField> describedFields(std::string const& part) {
     static std::regex const ROW(R"(\n\| `(\w+)` \| \w+ \| `([^`]*)` \|)");
     return rows(section(part), ROW);
 }
 
 template<typename Part>
-std::vector<Row> fields() {
-    std::vector<Row> fields;
+std::vector<DocumentedField> fields() {
+    std::vector<DocumentedField> fields;
     for (json::KeyRow const& row : Part::keys().rows)
         fields.emplace_back(row.name, row.missing);
     return fields;
@@ -60,8 +60,8 @@ std::vector<Row> fields() {
 template<typename Part>
 class SettingsDocument : public testing::Test {};
 
-using Parts = testing::Types<Cfg::App, Cfg::Inet, Cfg::PO, Cfg::Departments, Cfg::Profiles>;
-TYPED_TEST_SUITE(SettingsDocument, Parts);
+using DocumentedParts = testing::Types<Cfg::App, Cfg::Inet, Cfg::PO, Cfg::Departments, Cfg::Profiles>;
+TYPED_TEST_SUITE(SettingsDocument, DocumentedParts);
 
 TYPED_TEST(SettingsDocument, NamesEveryKeyWithTheDefaultOfTheRoot) {
     EXPECT_EQ(describedFields(TypeParam::PART_NAME), fields<TypeParam>());

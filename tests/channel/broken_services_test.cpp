@@ -25,9 +25,6 @@ using VLServiceTest::messageOf;
 namespace {
 
 constexpr int PRICE = Ipc::PriceEst::CMD_ID;
-constexpr auto NO_KNOWLEDGE = "Whoever answers there does not know our access token, or passes us on.";
-constexpr auto NOT_SEALED = "A message is not sealed by the other side of this connection.";
-
 /// Waits until the client has gone.
 void wait(RawPeer& peer) {
     while (peer.receive()) {

@@ -17,6 +17,7 @@
 
 using namespace testing;
 using namespace Channel;
+using ChannelTest::TOKEN;
 using Verdict = GreetingStep::Verdict;
 namespace fs = std::filesystem;
 
@@ -58,7 +59,6 @@ int withEachAllocationFailing(Work work) {
     }
 }
 
-std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 Terms const TERMS{VERSION, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"};
 Terms const OLD_TERMS{VERSION_1, TOKEN, "", "", ""};
 std::string const NONCE_TEXT(64, '0');

@@ -242,8 +242,6 @@ Read readSealed(std::string const& bytes) {
     return read;
 }
 
-constexpr auto NOT_SEALED = "A message is not sealed by the other side of this connection.";
-
 TEST(SealedFrames, ReadBackAsTheyWereWritten) {
     Read const read = readSealed(sealed(THREE));
     EXPECT_EQ(read.refusal, "");

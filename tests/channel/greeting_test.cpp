@@ -2,6 +2,7 @@
 
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
+#include "tests/channel/known_texts.h"
 
 #include <gmock/gmock.h>
 
@@ -10,11 +11,12 @@
 
 using namespace testing;
 using namespace Channel;
+using ChannelTest::NO_KNOWLEDGE;
+using ChannelTest::TOKEN;
 using Verdict = GreetingStep::Verdict;
 
 namespace {
 
-std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 std::string const CLIENT_NONCE(64, '0');
 std::string const SERVICE_NONCE(64, 'f');
 
@@ -84,8 +86,6 @@ TEST(Greetings, EndAtTheClientWhenTokenOrCertificateDiffer) {
     other.fingerprint = "BB";
     expectNoProof(other, tlsTerms(), reason);
 }
-
-constexpr auto NO_KNOWLEDGE = "Whoever answers there does not know our access token, or passes us on.";
 
 TEST(Greetings, EndAtTheClientWhenTheAddressesDifferWithoutTls) {
     Terms other = plainTerms();

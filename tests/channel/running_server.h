@@ -5,6 +5,7 @@
 #include "programs/channel/client.h"
 #include "programs/channel/frame.h"
 #include "programs/channel/server.h"
+#include "tests/channel/known_texts.h"
 #include "tests/ipc/recording_processor.h"
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/ipc/price_est.h"
@@ -24,8 +25,6 @@
 #include <vector>
 
 namespace ChannelTest {
-
-inline std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 
 /// Settings under which a slow machine does not matter.
 inline Channel::ServerSettings patient() {

@@ -21,12 +21,11 @@
 
 using namespace testing;
 using namespace Channel;
+using ChannelTest::TOKEN;
 using VLServiceTest::messageOf;
 namespace fs = std::filesystem;
 
 namespace {
-
-std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 
 class PrivateFiles : public Test {
 protected:
@@ -174,9 +173,7 @@ TEST(Proofs, AreTheDescribedOnes) {
     std::string const service(64, 'f');
     Terms const first = plainTerms(1);
     Terms const second = plainTerms(2);
-    auto const hex = [](std::string const& key) {
-        return Base::toHex(key.data(), key.size());
-    };
+    auto const hex = [](std::string const& key) { return Base::toHex(key.data(), key.size()); };
     EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proofs"),
               "P  = " + makeProof(Side::Service, second, client, service) +
                   "\nQ  = " + makeProof(Side::Client, second, client, service) +

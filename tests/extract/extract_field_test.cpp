@@ -32,10 +32,6 @@ ExtractField finding(std::string const& pattern, std::string const& keys = "") {
     return ExtractField(object);
 }
 
-ExtractField definition(std::string const& keys) {
-    return ExtractField(parse(R"({"name":"f",)" + keys + "}"));
-}
-
 /// The value's text, or "nothing".
 std::string extracted(ExtractField const& field, std::string text) {
     auto const value = field.extractField(text);

@@ -20,7 +20,7 @@ ExtractField field(std::string const& name, int priority = 0) {
     return ExtractField(json::Object{{"name", name}, {"priority", priority}});
 }
 
-ExtractField finding(std::string const& name, std::string const& pattern) {
+ExtractField named(std::string const& name, std::string const& pattern) {
     return ExtractField(json::Object{{"name", name}, {"value_extract", pattern}});
 }
 
@@ -292,8 +292,8 @@ TEST(SingleLetterField, IsNotTakenOutOfNothing) {
 
 TEST(SingleLetterField, LeavesTheOthersTheirPatternsWhenItIsTakenOut) {
     ExtractZones list;
-    list.emplace_back("Z", std::vector{finding("a", "(?<VAL>A)"), finding(SINGLE, "(?<VAL>S)"),
-                                       finding("b", "(?<VAL>B)"), finding("c", "(?<VAL>C)")});
+    list.emplace_back("Z", std::vector{named("a", "(?<VAL>A)"), named(SINGLE, "(?<VAL>S)"),
+                                       named("b", "(?<VAL>B)"), named("c", "(?<VAL>C)")});
     auto const valueOfEach = [&list] {
         std::vector<std::string> values;
         for (auto const& each : list.front().fields()) {

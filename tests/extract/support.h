@@ -62,6 +62,11 @@ inline long long utc(int year, int month, int day, int hour = 0, int minute = 0,
 
 namespace Cfg {
 
+/// A definition named "f" with further keys, given as the inside of a JSON object.
+inline ExtractField definition(std::string const& keys) {
+    return ExtractField(parse(R"({"name":"f")" + (keys.empty() ? "" : "," + keys) + "}"));
+}
+
 /// What a validation makes of a text: the state and the value.
 struct Typed {
     ExtractedField::ValueType state;

@@ -29,11 +29,6 @@ constexpr double MAX_DOUBLE = std::numeric_limits<double>::max();
 
 constexpr char const* NOT_UTF8 = "Invalid UTF-8 sequence encountered while trying to encode UTF-32 character";
 
-/// A definition named "f" with further keys, given as the inside of a JSON object.
-ExtractField definition(std::string const& keys) {
-    return ExtractField(parse(R"({"name":"f")" + (keys.empty() ? "" : "," + keys) + "}"));
-}
-
 ExtractField integers(std::string const& keys = "") {
     return definition(R"("value_type":1)" + (keys.empty() ? "" : "," + keys));
 }
@@ -582,7 +577,8 @@ std::ptrdiff_t slotOf(Operation operation) {
     return (parts[0] - 1) / static_cast<std::ptrdiff_t>(sizeof(void*));
 }
 
-// Part of the binary interface: a destructor takes the first two places, the private ones lie between and behind.
+// Part of the binary interface: a destructor takes the first two places, the private ones lie between and
+// behind.
 TEST(ValidatorOperations, KeepTheirPlacesForProgramsThatAreBuiltAlready) {
     EXPECT_EQ(slotOf(&Validation::valueType), 2);
     EXPECT_EQ(slotOf(&Validation::minVal), 3);

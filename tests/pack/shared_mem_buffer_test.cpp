@@ -1,5 +1,6 @@
 #include "vlservice/pack/shared_mem_buffer.h"
 
+#include "tests/pack/container_fixture.h"
 #include "tests/support/sanitized.h"
 
 #include <gtest/gtest.h>
@@ -7,10 +8,6 @@
 #include <string>
 
 namespace {
-
-std::string textOf(SharedMemBuffer const& buffer) {
-    return {reinterpret_cast<char const*>(buffer.data()), static_cast<std::size_t>(buffer.size())};
-}
 
 TEST(SharedMemBuffers, AreEmptyByDefault) {
     SharedMemBuffer const buffer;

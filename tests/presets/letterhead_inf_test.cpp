@@ -10,7 +10,7 @@ namespace {
 
 using testing::ElementsAre;
 
-constexpr char const* EVERY_KEY =
+constexpr char const* EVERY_LETTERHEAD_KEY =
     R"({"id":"head","skip_letters":true,"skip_attachments":true,"repeat_last_page":true,)"
     R"("apply_first_grouped_only":true,"on_top":true,"which_attachments":["a","b"],"colour":5})";
 
@@ -44,7 +44,7 @@ TEST(LetterheadConstruction, IsEmptyByTheIdAlone) {
 }
 
 TEST(LetterheadConstruction, SharesTheAdditionalNodeWithCopies) {
-    LetterheadInf const l = letterhead(EVERY_KEY);
+    LetterheadInf const l = letterhead(EVERY_LETTERHEAD_KEY);
     LetterheadInf const copy = l;
     EXPECT_EQ(copy.additional.node(), l.additional.node());
 }
@@ -56,7 +56,7 @@ TEST(LetterheadReading, TakesAStringAsTheId) {
 }
 
 TEST(LetterheadReading, TakesEveryKeyOfAnObject) {
-    LetterheadInf const l = letterhead(EVERY_KEY);
+    LetterheadInf const l = letterhead(EVERY_LETTERHEAD_KEY);
     EXPECT_EQ(l.id, "head");
     EXPECT_TRUE(l.skipLetters && l.skipAttachments && l.repeatLastPage && l.applyFirstGroupedOnly && l.onTop);
     EXPECT_THAT(l.whichAttachments, ElementsAre("a", "b"));
@@ -103,7 +103,7 @@ TEST(LetterheadReading, DropsFileNames) {
 
 TEST(LetterheadWriting, LeavesOutWhatIsNotSet) {
     std::pair<char const*, char const*> const rows[] = {
-        {EVERY_KEY, EVERY_KEY},
+        {EVERY_LETTERHEAD_KEY, EVERY_LETTERHEAD_KEY},
         {R"({"id":"x"})", R"("x")"},
         {R"({"on_top":true,"unknown":1,"id":"x"})", R"({"id":"x","on_top":true,"unknown":1})"},
         {R"({"id":"x","skip_letters":true,"which_attachments":[]})", R"({"id":"x","skip_letters":true})"},
@@ -129,7 +129,7 @@ TEST(LetterheadWriting, LetsAdditionalKeysReplaceItsOwn) {
 }
 
 TEST(LetterheadComparison, SeesEveryMemberButTheAdditionalOnes) {
-    LetterheadInf const l = letterhead(EVERY_KEY);
+    LetterheadInf const l = letterhead(EVERY_LETTERHEAD_KEY);
     LetterheadInf other = l;
     other.additional = {};
     EXPECT_EQ(l, other);

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/reader/layout.h"
+#include "tests/reader/line_texts.h"
 
 #include <gmock/gmock.h>
 
@@ -50,13 +51,6 @@ protected:
 
     fs::path folder_;
 };
-
-std::vector<std::string> linesOf(Page const& page) {
-    std::vector<std::string> texts;
-    for (Layout const layout = layOut(page); Line const& line : layout.lines)
-        texts.push_back(textOf(page, line));
-    return texts;
-}
 
 /// A PDF of one page, made out of text.
 std::string pdfOf(std::string const& text) { return openDocument(text, "made.txt").singlePagePdf(1); }

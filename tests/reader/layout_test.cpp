@@ -14,14 +14,6 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
-std::vector<std::string> linesOf(Page const& page, LayoutRules const& rules = {}) {
-    Layout const layout = layOut(page, rules);
-    std::vector<std::string> texts;
-    for (Line const& line : layout.lines)
-        texts.push_back(textOf(page, line));
-    return texts;
-}
-
 std::vector<std::vector<std::string>> blocksOf(Page const& page, LayoutRules const& rules = {}) {
     Layout const layout = layOut(page, rules);
     std::vector<std::vector<std::string>> blocks;

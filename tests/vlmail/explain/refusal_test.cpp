@@ -8,14 +8,14 @@
 namespace VlMail {
 namespace {
 
-struct Case {
+struct Refused {
     char const* name;
     char const* keys;
     char const* text;
     char const* says;
 };
 
-Case const CASES[]{
+Refused const REFUSALS[]{
     {"TextThatFits", R"({"value_match": "\\d+"})", "17", ""},
     {"TextThatDoesNotFit", R"({"value_match": "\\d+"})", "A 17",
      "\"A 17\" does not match the validation pattern \"\\d+\""},
@@ -50,7 +50,7 @@ Case const CASES[]{
     {"SingleLetterMarkMakesIntegers", R"({"mark": 2, "value_type": 3})", "x", "\"x\" is no integer"},
 };
 
-class Refusals : public testing::TestWithParam<Case> {
+class Refusals : public testing::TestWithParam<Refused> {
 protected:
     static Cfg::ExtractField field() {
         std::string const keys = GetParam().keys;
@@ -76,7 +76,7 @@ TEST_P(Refusals, AgreeWithTheValidator) {
     EXPECT_EQ(value.isValid(), !refusalOf(field(), GetParam().text).has_value());
 }
 
-INSTANTIATE_TEST_SUITE_P(Of, Refusals, testing::ValuesIn(CASES),
+INSTANTIATE_TEST_SUITE_P(Of, Refusals, testing::ValuesIn(REFUSALS),
                          [](auto const& test) { return std::string(test.param.name); });
 
 TEST(TypeInWords, NamesTheKinds) {
