@@ -5,6 +5,7 @@
 #include "programs/base/error.h"
 #include "programs/channel/greeting.h"
 #include "programs/channel/stream.h"
+#include "tests/channel/known_texts.h"
 
 #include <gmock/gmock.h>
 

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/channel/frame.h"
+#include "tests/channel/known_texts.h"
 
 #include "tests/support/format_document.h"
 
@@ -14,6 +15,7 @@ using namespace testing;
 using namespace std::string_literals;
 using Channel::FrameDecoder;
 using Channel::Kind;
+using ChannelTest::NOT_SEALED;
 
 namespace {
 

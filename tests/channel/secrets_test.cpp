@@ -6,6 +6,7 @@
 #include "programs/channel/pin_store.h"
 #include "programs/channel/proof.h"
 #include "programs/channel/token.h"
+#include "tests/channel/known_texts.h"
 
 #include "tests/support/format_document.h"
 #include "tests/support/json_literal.h"

@@ -1,5 +1,6 @@
 #include "programs/reader/layout.h"
 
+#include "tests/reader/line_texts.h"
 #include "tests/support/typesetter.h"
 
 #include <gmock/gmock.h>
