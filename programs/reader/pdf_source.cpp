@@ -4,7 +4,6 @@
 #include "programs/reader/clean_text.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_page.h"
-#include "programs/reader/writing_direction.h"
 
 #include <poppler-document.h>
 #include <poppler-image.h>
@@ -87,7 +86,7 @@ std::string textOf(poppler::text_box const& box) {
     poppler::ustring const units = box.text();
     std::u16string text(units.begin(), units.end());
     showDrawnHyphens(text, box);
-    return cleanText(inReadingOrder(text));
+    return cleanText(text);
 }
 
 /// Numbers the fonts of a page.
