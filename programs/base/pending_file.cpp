@@ -7,8 +7,8 @@
 #include <csignal>
 #include <cstdlib>
 #include <fcntl.h>
+#include <list>
 #include <mutex>
-#include <set>
 #include <string>
 #include <sys/stat.h>
 #include <system_error>
@@ -20,11 +20,13 @@ namespace {
 
 namespace fs = std::filesystem;
 
+/// Of ".part".
+constexpr int ENDING_LENGTH = 5;
 constexpr int ENDING_SIGNALS[]{SIGINT, SIGTERM, SIGHUP, SIGPIPE};
 
-/// Read by the handler, and changed only while that cannot run.
-std::set<std::string>& pendingNames() {
-    static std::set<std::string> names;
+/// Absolute. Read by the handler, and changed only while that cannot run.
+std::list<std::string>& pendingNames() {
+    static std::list<std::string> names;
     return names;
 }
 /// The process whose files they are; a child has a copy of the names.
@@ -54,10 +56,8 @@ private:
     sigset_t before_;
 };
 
-extern "C" void removePendingFiles(int number) {
-    if (::getpid() == owner)
-        for (std::string const& name : pendingNames())
-            ::unlink(name.c_str());
+extern "C" void removePendingFilesAndEnd(int number) {
+    removePendingFiles();
     std::signal(number, SIG_DFL);
     std::raise(number);
 }
@@ -84,23 +84,27 @@ void trySyncFolder(fs::path const& target) {
 
 } // namespace
 
-PendingFile::PendingFile(fs::path target) : target_(std::move(target)) {
+PendingFile::PendingFile(fs::path target)
+    : target_(std::move(target)), file_(target_), temporary_(file_.name()) {}
+
+PendingFile::Temporary::Temporary(fs::path const& target) {
+    // Once the file is there nothing may fail, or it would stay.
     SignalsHeld const held;
-    std::string name = (folderOf(target_) / ".XXXXXX.part").string();
-    FileDescriptor const file(::mkostemps(name.data(), 5, O_CLOEXEC), name);
-    if (file.number() < 0)
-        fail("cannot write into " + folderOf(target_).string());
-    giveUsualRights(file.number());
-    temporary_ = name;
-    pendingNames().insert(fs::absolute(temporary_).string());
+    std::list<std::string> name{fs::absolute(folderOf(target) / ".XXXXXX.part").string()};
+    int const file = ::mkostemps(name.front().data(), ENDING_LENGTH, O_CLOEXEC);
+    if (file < 0)
+        fail("cannot write into " + folderOf(target).string());
+    giveUsualRights(file);
+    ::close(file);
+    name_ = name.begin();
+    pendingNames().splice(pendingNames().end(), name);
 }
 
-PendingFile::~PendingFile() {
+PendingFile::Temporary::~Temporary() {
     SignalsHeld const held;
-    pendingNames().erase(fs::absolute(temporary_).string());
-    std::error_code ignored;
-    if (pending_)
-        fs::remove(temporary_, ignored);
+    if (!isLeft_)
+        ::unlink(name_->c_str());
+    pendingNames().erase(name_);
 }
 
 void PendingFile::commit(Durability durability) {
@@ -108,7 +112,7 @@ void PendingFile::commit(Durability durability) {
         FileDescriptor(temporary_, O_RDONLY).sync();
     if (::rename(temporary_.c_str(), target_.c_str()) != 0)
         fail("cannot write " + target_.string());
-    pending_ = false;
+    file_.leave();
     if (durability == Durability::Synced)
         trySyncFolder(target_);
 }
@@ -128,9 +132,15 @@ void removePendingFilesOnSignals() {
         ::sigaction(number, nullptr, &before);
         // Who started the program with a signal ignored wants it to go on.
         if (before.sa_handler != SIG_IGN)
-            std::signal(number, removePendingFiles);
+            std::signal(number, removePendingFilesAndEnd);
     }
     std::signal(SIGXFSZ, SIG_IGN);
+}
+
+void removePendingFiles() noexcept {
+    if (::getpid() == owner)
+        for (std::string const& name : pendingNames())
+            ::unlink(name.c_str());
 }
 
 } // namespace Base

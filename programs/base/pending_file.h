@@ -3,6 +3,8 @@
 // renamed.
 
 #include <filesystem>
+#include <list>
+#include <string>
 #include <string_view>
 
 namespace Base {
@@ -17,11 +19,8 @@ public:
 
     /// Throws std::system_error, with the folder in its text, when no file can be made there.
     explicit PendingFile(std::filesystem::path target);
-    ~PendingFile();
-    PendingFile(PendingFile const&) = delete;
-    PendingFile& operator=(PendingFile const&) = delete;
 
-    /// Where to write; the file exists and is empty.
+    /// Where to write; the file exists and is empty. An absolute path.
     std::filesystem::path const& temporary() const { return temporary_; }
     std::filesystem::path const& target() const { return target_; }
 
@@ -31,9 +30,27 @@ public:
     void commit(Durability durability = Durability::Synced);
 
 private:
+    /// The file under its temporary name, which goes with the object.
+    class Temporary {
+    public:
+        explicit Temporary(std::filesystem::path const& target);
+        ~Temporary();
+        Temporary(Temporary const&) = delete;
+        Temporary& operator=(Temporary const&) = delete;
+
+        std::string const& name() const { return *name_; }
+        /// It has another name by now.
+        void leave() { isLeft_ = true; }
+
+    private:
+        /// Among those of all pending files.
+        std::list<std::string>::iterator name_;
+        bool isLeft_ = false;
+    };
+
     std::filesystem::path target_;
+    Temporary file_;
     std::filesystem::path temporary_;
-    bool pending_ = true;
 };
 
 /// Writes a whole file by way of a PendingFile. Throws std::system_error.
@@ -43,5 +60,9 @@ void writeFile(std::filesystem::path const& target, std::string_view bytes,
 /// From here on what ends the process from outside (SIGINT, SIGTERM, SIGHUP, SIGPIPE) removes its pending
 /// files first, and a size limit is a failure to write. For programs of one thread; children are not meant.
 void removePendingFilesOnSignals();
+
+/// Removes them as such a signal does, without taking memory; nothing where removePendingFilesOnSignals() was
+/// not called, and in children. For a process that ends at once.
+void removePendingFiles() noexcept;
 
 } // namespace Base

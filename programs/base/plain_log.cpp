@@ -2,6 +2,8 @@
 
 #include "programs/base/plain_text.h"
 
+#include <utility>
+
 namespace Base {
 
 PlainLog::PlainLog() : before_(Log::setSink({})) {
@@ -11,6 +13,6 @@ PlainLog::PlainLog() : before_(Log::setSink({})) {
     });
 }
 
-PlainLog::~PlainLog() { Log::setSink(before_); }
+PlainLog::~PlainLog() { Log::setSink(std::move(before_)); }
 
 } // namespace Base

@@ -4,6 +4,7 @@
 #include <boost/asio/post.hpp>
 
 #include <mutex>
+#include <new>
 #include <optional>
 #include <thread>
 #include <utility>
@@ -36,19 +37,32 @@ struct BackgroundLookup::State {
     }
 };
 
+namespace {
+
+/// Why it failed, and else what was found.
+std::pair<std::string, std::vector<std::string>> found(LookUp const& lookUp, std::string const& host) {
+    try {
+        return {"", lookUp(host)};
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (std::exception const& failure) {
+        return {failure.what(), {}};
+    }
+}
+
+} // namespace
+
 BackgroundLookup::BackgroundLookup(asio::io_context& io, LookUp lookUp, std::string host, Done done)
     : state_(std::make_shared<State>()) {
     state_->work.emplace(io.get_executor());
     state_->done = std::move(done);
     std::thread([state = state_, lookUp = std::move(lookUp), host = std::move(host)] {
-        std::string failure;
-        std::vector<std::string> addresses;
         try {
-            addresses = lookUp(host);
-        } catch (std::exception const& e) {
-            failure = e.what();
+            auto [failure, addresses] = found(lookUp, host);
+            state->finish(std::move(failure), std::move(addresses), state);
+        } catch (std::bad_alloc const&) {
+            // An answer for which there is no memory is as one that never comes, which is given up.
         }
-        state->finish(std::move(failure), std::move(addresses), state);
     }).detach();
 }
 

@@ -1,5 +1,6 @@
 #include "programs/channel/proof.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
 
@@ -61,6 +62,7 @@ bool isSameProof(std::string_view a, std::string_view b) {
 }
 
 std::string hmac(std::string_view key, std::string_view message) {
+    Base::requireCrypto();
     std::array<unsigned char, EVP_MAX_MD_SIZE> bytes;
     unsigned int length = 0;
     if (!HMAC(EVP_sha256(), key.data(), static_cast<int>(key.size()),

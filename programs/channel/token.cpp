@@ -1,5 +1,6 @@
 #include "programs/channel/token.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
 #include "programs/base/private_file.h"
@@ -22,6 +23,7 @@ constexpr std::string_view WHITE = " \t\r\n";
 bool isWordCharacter(char c) { return c > ' ' && c < '\x7f'; }
 
 std::string randomHex() {
+    Base::requireCrypto();
     std::array<unsigned char, RANDOM_BYTES> bytes;
     if (RAND_bytes(bytes.data(), bytes.size()) != 1)
         throw Base::Error("The system gives no random numbers.");

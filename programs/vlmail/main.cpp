@@ -1,5 +1,6 @@
 #include "programs/vlmail/commands/command.h"
 
+#include "programs/base/out_of_memory.h"
 #include "programs/base/pending_file.h"
 #include "vlservice/platform/log.h"
 
@@ -21,10 +22,10 @@ int runOnTerminal(int argc, char** argv) {
 } // namespace
 
 int main(int argc, char** argv) {
+    Base::endWhenOutOfMemory(VlMail::OUT_OF_MEMORY);
     try {
         return runOnTerminal(argc, argv);
     } catch (std::bad_alloc const&) {
-        std::cerr << VlMail::OUT_OF_MEMORY;
-        return VlMail::FAILED;
+        Base::endOutOfMemory();
     }
 }

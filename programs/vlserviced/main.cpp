@@ -1,4 +1,5 @@
 #include "programs/base/host_port.h"
+#include "programs/base/out_of_memory.h"
 #include "programs/base/plain_log.h"
 #include "programs/base/plain_text.h"
 #include "programs/vlserviced/options.h"
@@ -7,31 +8,42 @@
 
 #include <exception>
 #include <iostream>
+#include <new>
 
 namespace {
 
-int serve(VlServiced::Options const& options) {
-    try {
-        g_LogVerbose = options.verbose;
-        Base::PlainLog const plainLog;
-        VlServiced::Service service(options);
-        std::cout << "listening on " << Base::hostPortText(options.listen, service.port()) << '\n';
-        if (!service.fingerprint().empty())
-            std::cout << "certificate " << service.fingerprint() << '\n';
-        std::cout << std::flush;
-        service.run();
-        return 0;
-    } catch (std::exception const& failure) {
-        std::cerr << "vlserviced: " << Base::oneLine(failure.what()) << std::endl;
-        return 1;
-    }
+constexpr char const* OUT_OF_MEMORY =
+    "vlserviced: there is not enough memory; nothing that was acknowledged is lost, start it again\n";
+
+void serve(VlServiced::Options const& options) {
+    g_LogVerbose = options.verbose;
+    Base::PlainLog const plainLog;
+    VlServiced::Service service(options);
+    std::cout << "listening on " << Base::hostPortText(options.listen, service.port()) << '\n';
+    if (!service.fingerprint().empty())
+        std::cout << "certificate " << service.fingerprint() << '\n';
+    std::cout << std::flush;
+    service.run();
+}
+
+int run(int argc, char** argv) {
+    auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr);
+    if (int const* const status = std::get_if<int>(&parsed))
+        return *status;
+    serve(std::get<VlServiced::Options>(parsed));
+    return 0;
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
-    auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr);
-    if (int const* const status = std::get_if<int>(&parsed))
-        return *status;
-    return serve(std::get<VlServiced::Options>(parsed));
+    Base::endWhenOutOfMemory(OUT_OF_MEMORY);
+    try {
+        return run(argc, argv);
+    } catch (std::bad_alloc const&) {
+        Base::endOutOfMemory();
+    } catch (std::exception const& failure) {
+        std::cerr << "vlserviced: " << Base::oneLine(failure.what()) << std::endl;
+        return 1;
+    }
 }

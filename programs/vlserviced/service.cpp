@@ -1,6 +1,7 @@
 #include "programs/vlserviced/service.h"
 
 #include "programs/base/error.h"
+#include "programs/base/out_of_memory.h"
 #include "programs/base/plain_text.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
@@ -26,6 +27,7 @@
 #include <chrono>
 #include <csignal>
 #include <ctime>
+#include <new>
 #include <optional>
 #include <utility>
 #include <vector>
@@ -158,6 +160,9 @@ private:
             try {
                 io_.run();
                 return;
+            } catch (std::bad_alloc const&) {
+                // A connection or a listener may be lost with what failed; nothing would take it up again.
+                throw;
             } catch (std::exception const& failure) {
                 Log::Lock(3).logStreamLine()
                     << "The service goes on after a failure. " << Base::oneLine(failure.what());
@@ -207,9 +212,21 @@ private:
         return std::chrono::hours(hours > 0 ? hours : 1);
     }
 
+    /// Work hands its outcome over itself. What keeps it from that would leave a job or a client waiting for
+    /// good.
+    static void runOn(asio::thread_pool& threads, JobSurroundings::Work work) {
+        asio::post(threads, [work = std::move(work)] {
+            try {
+                work();
+            } catch (std::bad_alloc const&) {
+                Base::endOutOfMemory();
+            }
+        });
+    }
+
     JobSurroundings surroundings() {
-        return {[this](JobSurroundings::Work work) { asio::post(worker_, std::move(work)); },
-                [this](JobSurroundings::Work work) { asio::post(reader_, std::move(work)); },
+        return {[this](JobSurroundings::Work work) { runOn(worker_, std::move(work)); },
+                [this](JobSurroundings::Work work) { runOn(reader_, std::move(work)); },
                 [this](JobSurroundings::Work work) { asio::post(io_, std::move(work)); },
                 &now,
                 [this] { return settings_.service(); },

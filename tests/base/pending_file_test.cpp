@@ -1,6 +1,7 @@
 #include "programs/base/pending_file.h"
 
 #include "programs/base/log_capture.h"
+#include "tests/support/failing_memory.h"
 
 #include <gmock/gmock.h>
 
@@ -9,6 +10,8 @@
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
+#include <new>
+#include <optional>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -68,6 +71,30 @@ TEST_F(PendingFileTest, AppearsUnderItsNameOnCommit) {
     pending.commit();
     EXPECT_EQ(read(target), "whole");
     EXPECT_EQ(filesInFolder(), 1);
+}
+
+TEST_F(PendingFileTest, GoesThoughThereIsNoMemoryForIt) {
+    auto pending = std::make_optional<Base::PendingFile>(folder_ / "a.mailing");
+    {
+        VLServiceTest::FailingMemory const memory(1, true);
+        pending.reset();
+    }
+    EXPECT_EQ(filesInFolder(), 0);
+}
+
+TEST_F(PendingFileTest, LeavesNothingWhenMemoryRunsOutInTheMiddle) {
+    fs::path const target = folder_ / "a.mailing";
+    bool hasFailed = true;
+    for (long call = 1; hasFailed; ++call) {
+        try {
+            VLServiceTest::FailingMemory const memory(call);
+            Base::PendingFile const pending{fs::path(target)};
+            hasFailed = memory.hasFailed();
+            EXPECT_FALSE(hasFailed) << call;
+        } catch (std::bad_alloc const&) {
+        }
+        EXPECT_EQ(filesInFolder(), 0) << call;
+    }
 }
 
 TEST_F(PendingFileTest, LeavesNothingWithoutCommit) {

@@ -1,4 +1,5 @@
 #include "tests/pack/container_fixture.h"
+#include "tests/support/failing_memory.h"
 
 #include <array>
 
@@ -318,6 +319,29 @@ TEST_F(WritingContainers, StandInAsASinkOfPages) {
     sink.savePage("a.pdf", "1", bufferOf(PAGE_1));
     EXPECT_TRUE(wrapper_->finalizeOutput(bufferOf(METADATA)));
     EXPECT_EQ(page(open(), "a.pdf", "1"), PAGE_1);
+}
+
+TEST_F(WritingContainers, TellOfEachLackOfMemoryByTheResult) {
+    SharedMemBuffer const page = bufferOf(PAGE_1);
+    SharedMemBuffer const metadata = bufferOf(METADATA);
+    std::string const document = "a document with a name of some length.pdf";
+    bool hasFailed = true;
+    long call = 0;
+    while (hasFailed) {
+        PackWrapper& out = create();
+        bool isWhole = false;
+        {
+            VLServiceTest::FailingMemory const memory(++call);
+            EXPECT_NO_THROW(out.savePage(document, "1", page)) << call;
+            EXPECT_NO_THROW(isWhole = out.finalizeOutput(metadata)) << call;
+            hasFailed = memory.hasFailed();
+        }
+        EXPECT_EQ(std::filesystem::exists(file_), isWhole) << call;
+        EXPECT_EQ(isWhole ? open().szBins() : 0u, isWhole ? 2u : 0u) << call;
+        EXPECT_TRUE(isWhole || !log_.take().empty()) << call;
+    }
+    // Items, attributes and the printed text take some.
+    EXPECT_GT(call, 10);
 }
 
 } // namespace

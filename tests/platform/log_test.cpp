@@ -1,5 +1,6 @@
 #include "vlservice/platform/log.h"
 
+#include "tests/support/failing_memory.h"
 #include "tests/support/foreign_locale.h"
 
 #include <gmock/gmock.h>
@@ -122,6 +123,17 @@ TEST(LogSink, AtStartLetsNoTextForgeALine) {
     testing::internal::CaptureStderr();
     Log::Lock(4).logStreamLine() << "name\n<0>forged\r\n";
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "<4>name <0>forged \n");
+}
+
+TEST_F(LogLines, ForWhichThereIsNoMemoryAreCut) {
+    std::string const text(100, 'x');
+    {
+        VLServiceTest::FailingMemory const memory(1, true);
+        EXPECT_NO_THROW(Log::Lock(4).logStreamLine() << "Failed: " << text);
+    }
+    Log::Lock(4).logStreamLine() << "later";
+    ASSERT_FALSE(lines.empty());
+    EXPECT_EQ(lines.back().second, "later");
 }
 
 TEST(LogVerbose, IsOffAtStart) { EXPECT_FALSE(g_LogVerbose); }

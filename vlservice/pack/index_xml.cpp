@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <charconv>
 #include <memory>
+#include <new>
 #include <ostream>
 #include <string_view>
 #include <utility>
@@ -66,6 +67,15 @@ std::unique_ptr<TiXmlElement> makeMailing(std::string const& packId, std::deque<
         mailing->LinkEndChild(makeItem(entry).release());
     mailing->SetAttribute(MAILING_ITEMS, std::to_string(items.size()));
     return mailing;
+}
+
+bool print(std::ostream& out, std::string const& packId, std::deque<BinEntry> const& items) {
+    TiXmlDocument document;
+    document.LinkEndChild(new TiXmlDeclaration("1.0", "UTF-8", "yes"));
+    auto root = std::make_unique<TiXmlElement>(TAG_ROOT);
+    root->LinkEndChild(makeMailing(packId, items).release());
+    document.LinkEndChild(root.release());
+    return static_cast<bool>(out << document);
 }
 
 /// The tag alone as an element of that name; empty when it cannot be parsed or is another.
@@ -131,14 +141,11 @@ bool writeIndex(std::ostream& out, std::string const& packId, std::deque<BinEntr
         mayStandInIndex(packId) && std::all_of(items.begin(), items.end(), [](auto const& entry) {
             return mayStandInIndex(entry.name) && mayStandInIndex(entry.document);
         });
-    if (!printable)
+    try {
+        return printable && print(out, packId, items);
+    } catch (std::bad_alloc const&) {
         return false;
-    TiXmlDocument document;
-    document.LinkEndChild(new TiXmlDeclaration("1.0", "UTF-8", "yes"));
-    auto root = std::make_unique<TiXmlElement>(TAG_ROOT);
-    root->LinkEndChild(makeMailing(packId, items).release());
-    document.LinkEndChild(root.release());
-    return static_cast<bool>(out << document);
+    }
 }
 
 } // namespace Container

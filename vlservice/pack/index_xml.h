@@ -21,7 +21,7 @@ std::string parseIndex(TiXmlDocument& document, std::string text);
 /// What is not there or unreadable stays empty or zero.
 PackWrapper::BinEntry readItem(TiXmlElement const& item);
 
-/// False when the id or a name cannot stand in XML, or when the stream fails.
+/// False when the id or a name cannot stand in XML, when the stream fails, or when memory does.
 bool writeIndex(std::ostream& out, std::string const& packId, std::deque<PackWrapper::BinEntry> const& items);
 
 } // namespace Container

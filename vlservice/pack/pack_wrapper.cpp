@@ -38,6 +38,16 @@ std::uint32_t checksum(SharedMemBuffer const& data) {
     return static_cast<std::uint32_t>(crc32(0, data.data(), cutSize(data)));
 }
 
+/// A line of which as much is told as there is memory for: whoever is told of a failure gets a result, and no
+/// exception.
+void logFailure(LogPriority priority, char const* what, fs::path const& path,
+                char const* then = "") noexcept {
+    try {
+        Log::Lock(priority).logStreamLine() << what << path << then;
+    } catch (std::bad_alloc const&) {
+    }
+}
+
 /// The text at a place, behind the first zero byte not all of it: a zero ends the index. None when it cannot
 /// be read.
 std::optional<std::string> readText(std::istream& in, Container::IndexPlace const& place) {
@@ -78,10 +88,14 @@ bool PackWrapper::outputFinalished() const { return okSoFar() && fileStream_.fai
 // Output
 
 void PackWrapper::createOutputFile() {
-    fileStream_.open(pth_, std::ios::out | std::ios::binary);
-    if (fileStream_)
-        return;
-    Log::Lock(3).logStreamLine() << "Mailing wrapper failed to create file " << pth_;
+    try {
+        fileStream_.open(pth_, std::ios::out | std::ios::binary);
+        if (fileStream_)
+            return;
+    } catch (std::bad_alloc const&) {
+        // The file may be there; it goes with the failure.
+    }
+    logFailure(3, "Mailing wrapper failed to create file ", pth_);
     onFailure();
 }
 
@@ -90,7 +104,7 @@ void PackWrapper::savePage(std::string const& document, std::string const& page,
         return;
     if (writeBin(document, page, Container::ROLE_PAGE, data))
         return;
-    Log::Lock(4).logStreamLine() << "Mailing wrapper failed to save page data to " << pth_;
+    logFailure(4, "Mailing wrapper failed to save page data to ", pth_);
     onFailure();
 }
 
@@ -98,19 +112,19 @@ bool PackWrapper::finalizeOutput(SharedMemBuffer metadata) {
     if (!okSoFar())
         return false;
     if (!writeBin({}, VL_JOBMETADATA, Container::ROLE_FRAMEWORK, metadata)) {
-        Log::Lock(4).logStreamLine() << "Mailing wrapper failed to save mailing metadata to " << pth_;
+        logFailure(4, "Mailing wrapper failed to save mailing metadata to ", pth_);
         return onFailureRetFalse();
     }
     if (!Container::writeIndex(fileStream_, savedPackId(), bins_)) {
         // The odd spelling is the interface's: programs that read the log know the line so.
-        Log::Lock(4).logStreamLine() << "Mailing wrapper failed to save bin offsetts to " << pth_;
+        logFailure(4, "Mailing wrapper failed to save bin offsetts to ", pth_);
         return onFailureRetFalse();
     }
     char trailer[Container::OFFSET_SIZE];
     LittleEndian::store(binPos_, trailer);
     // Flushed here: a full disk would otherwise show only when the file is closed.
     if (!fileStream_.write(trailer, sizeof trailer).flush()) {
-        Log::Lock(4).logStreamLine() << "Mailing wrapper failed to save final offset to " << pth_;
+        logFailure(4, "Mailing wrapper failed to save final offset to ", pth_);
         return onFailureRetFalse();
     }
     closeFile();
@@ -120,7 +134,11 @@ bool PackWrapper::finalizeOutput(SharedMemBuffer metadata) {
 /// The entry and the position stay advanced when the write fails.
 bool PackWrapper::writeBin(std::string const& document, std::string const& name, char const* role,
                            SharedMemBuffer const& data) {
-    append({name, binPos_, cutSize(data), role, checksum(data), document});
+    try {
+        append({name, binPos_, cutSize(data), role, checksum(data), document});
+    } catch (std::bad_alloc const&) {
+        return false;
+    }
     binPos_ += data.size();
     fileStream_.write(reinterpret_cast<char const*>(data.data()), static_cast<std::streamsize>(data.size()));
     return !fileStream_.fail();
@@ -156,7 +174,7 @@ void PackWrapper::loadImportFile() {
     try {
         findIndex();
     } catch (std::bad_alloc const&) {
-        Log::Lock(4).logStreamLine() << "Failed to parse file " << pth_ << ". Import failed. Out of memory";
+        logFailure(4, "Failed to parse file ", pth_, ". Import failed. Out of memory");
         pages_.clear();
         bins_.clear();
         onFailure();

@@ -40,28 +40,21 @@ Sink setSink(Sink sink) {
     return std::exchange(shared().sink, std::move(sink));
 }
 
-struct Lock::Line {
-    LogPriority priority;
-    std::ostringstream text;
-};
-
-Lock::Lock(LogPriority priority) : line_(new Line{priority, {}}) {
-    line_->text.imbue(std::locale::classic());
-}
+Lock::Lock(LogPriority priority) noexcept : priority_(priority) { line_.imbue(std::locale::classic()); }
 
 Lock::~Lock() {
     try {
-        std::string text = std::move(line_->text).str();
+        std::string text = std::move(line_).str();
         if (!text.empty() && text.back() == '\n')
             text.pop_back();
         std::lock_guard const guard(shared().mutex);
         if (Sink const sink = shared().sink)
-            sink(line_->priority, text);
+            sink(priority_, text);
     } catch (...) {
         // Logging is the last resort: there is nowhere left to report to.
     }
 }
 
-std::ostream& Lock::logStreamLine() { return line_->text; }
+std::ostream& Lock::logStreamLine() { return line_; }
 
 } // namespace Log

@@ -4,8 +4,8 @@
 #include "vlservice/export.h"
 
 #include <functional>
-#include <memory>
 #include <ostream>
+#include <sstream>
 #include <string>
 
 /// Trace lines (priority 7) are written only while this is set; false at start.
@@ -24,10 +24,11 @@ using Sink = std::function<void(LogPriority, std::string const& line)>;
 VLSERVICE_EXPORT Sink setSink(Sink sink);
 
 /// One message: what is streamed in reaches the sink, in one call, when the object is destroyed, without its
-/// final end of line. Numbers are written with the classic locale. Lines of several threads do not mix.
+/// final end of line. Numbers are written with the classic locale. Lines of several threads do not mix. A
+/// line for which there is no memory is cut or dropped: a failure can be told from anywhere.
 class VLSERVICE_EXPORT Lock {
 public:
-    Lock(LogPriority priority);
+    Lock(LogPriority priority) noexcept;
     ~Lock();
     Lock(Lock const&) = delete;
     Lock& operator=(Lock const&) = delete;
@@ -35,8 +36,8 @@ public:
     std::ostream& logStreamLine();
 
 private:
-    struct Line;
-    std::unique_ptr<Line> line_;
+    LogPriority priority_;
+    std::ostringstream line_;
 };
 
 } // namespace Log

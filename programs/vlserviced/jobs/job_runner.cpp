@@ -277,9 +277,14 @@ void JobRunner::inBackground(std::string const& packId, std::function<void()> wo
             Log::Lock(3).logStreamLine() << "Pack " << packId << " cannot be recorded. " << failure.what();
         }
     };
-    surroundings_.onWorker([work = std::move(work), finish, onOwnThread = surroundings_.onOwnThread] {
-        onOwnThread([finish, outcome = outcomeOf(work)] { finish(outcome); });
-    });
+    try {
+        surroundings_.onWorker([work = std::move(work), finish, onOwnThread = surroundings_.onOwnThread] {
+            onOwnThread([finish, outcome = outcomeOf(work)] { finish(outcome); });
+        });
+    } catch (...) {
+        busy_.erase(packId);
+        throw;
+    }
 }
 
 JobRunner::Outcome JobRunner::outcomeOf(std::function<void()> const& work) {
