@@ -4,9 +4,13 @@
 #include "programs/vlmail/pack/blob_extent.h"
 #include "vlservice/pack/blob_format.h"
 
+#include <zlib.h>
+
 #include <algorithm>
 #include <cstring>
+#include <new>
 #include <numeric>
+#include <utility>
 #include <vector>
 
 namespace VlMail {
@@ -30,19 +34,54 @@ bool isCompressed(SharedMemBuffer const& bytes) {
 
 } // namespace
 
-ContainerFile::ContainerFile(std::string const& path) : fileSize_(ByteFile(path).size()) {
+ContainerFile::ContainerFile(std::string const& path) : file_(path) {
     container_.emplace(path, PackWrapper::PURPOSE_IMPORT, std::string());
-    if (container_->failed())
+    if (container_->failed()) {
+        requireReadable();
         throw Base::Error("cannot read \"" + path +
                           "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
                           "salvage\" saves what is left of it");
+    }
     findOverlaps();
 }
 
+/// An index that the disk does not give is not damaged. It stands at the end, and says where at the
+/// beginning.
+void ContainerFile::requireReadable() {
+    constexpr std::uint64_t LOOKED_AT = std::uint64_t{16} << 20;
+    std::string part(std::size_t{1} << 20, '\0');
+    file_.read(0, part.data(), 1);
+    for (std::uint64_t at = file_.size() - std::min(LOOKED_AT, file_.size()); at < file_.size();
+         at += part.size())
+        file_.read(at, part.data(), part.size());
+}
+
 ContainerFile::Blob ContainerFile::blob(unsigned long long index) {
-    Blob blob{container_->binData(index), 0, {}};
-    blob.damage = damageOf(index, blob);
+    Blob blob;
+    blob.damage = damageOfPlace(index);
+    if (blob.damage.empty())
+        blob.damage = read(entry(index), blob.bytes);
+    if (blob.damage.empty())
+        blob.damage = damageOfContent(blob);
     return blob;
+}
+
+/// Not by way of the library, which gives no bytes both when the disk fails and when they are others.
+std::string ContainerFile::read(Entry const& entry, SharedMemBuffer& bytes) {
+    try {
+        SharedMemBuffer stored;
+        stored.resize(entry.length);
+        std::size_t const got =
+            file_.read(entry.offset, reinterpret_cast<char*>(stored.data()), entry.length);
+        if (got != entry.length || crc32(0, stored.data(), entry.length) != entry.crc)
+            return "its checksum is wrong";
+        bytes = std::move(stored);
+        return {};
+    } catch (Base::Error const& failure) {
+        return failure.what();
+    } catch (std::bad_alloc const&) {
+        return "there is not enough memory for it";
+    }
 }
 
 /// Blobs stand one behind the other; entries that share bytes were forged, and expand to any size.
@@ -60,17 +99,16 @@ void ContainerFile::findOverlaps() {
     }
 }
 
-std::string ContainerFile::damageOf(unsigned long long index, Blob& blob) const {
+std::string ContainerFile::damageOfPlace(unsigned long long index) const {
     Entry const& entry = this->entry(index);
     if (entry.length == 0)
         return "it is empty";
-    if (entry.length > fileSize_ || entry.offset > fileSize_ - entry.length)
+    if (entry.length > fileSize() || entry.offset > fileSize() - entry.length)
         return "it runs past the end of the file";
-    if (overlapping_.contains(index))
-        return "its bytes belong to another as well";
-    // A blob that cannot be read, or whose checksum is wrong, is not given out.
-    if (blob.bytes.empty())
-        return "its checksum is wrong";
+    return overlapping_.contains(index) ? "its bytes belong to another as well" : "";
+}
+
+std::string ContainerFile::damageOfContent(Blob& blob) {
     blob.dataSize = blob.bytes.size();
     if (!isCompressed(blob.bytes))
         return {};

@@ -2,6 +2,7 @@
 // A mailing file as the subcommands look into it.
 
 #include "programs/base/log_capture.h"
+#include "programs/vlmail/pack/byte_file.h"
 #include "vlservice/pack/pack_wrapper.h"
 
 #include <cstdint>
@@ -27,7 +28,7 @@ public:
     /// Throws Error when there is no such file or its index cannot be read.
     explicit ContainerFile(std::string const& path);
 
-    std::uint64_t fileSize() const { return fileSize_; }
+    std::uint64_t fileSize() const { return file_.size(); }
     std::string const& packId() const { return container_->packId(); }
     unsigned long long size() const { return container_->szBins(); }
     Entry const& entry(unsigned long long index) const { return container_->bin(index); }
@@ -36,12 +37,16 @@ public:
     Blob blob(unsigned long long index);
 
 private:
+    void requireReadable();
     void findOverlaps();
-    std::string damageOf(unsigned long long index, Blob& blob) const;
+    /// What is wrong, in words, or nothing; each looks at what the one before it has found in order.
+    std::string damageOfPlace(unsigned long long index) const;
+    std::string read(Entry const& entry, SharedMemBuffer& bytes);
+    static std::string damageOfContent(Blob& blob);
 
     /// The subcommands say what failed in words of their own.
     Base::LogCapture quiet_;
-    std::uint64_t fileSize_;
+    ByteFile file_;
     std::optional<PackWrapper> container_;
     /// Entries whose bytes belong to an entry before them as well.
     std::set<unsigned long long> overlapping_;
