@@ -4,7 +4,7 @@
 #include "programs/reader/clean_text.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_page.h"
-#include "programs/reader/writing_direction.h"
+#include "vlservice/platform/log.h"
 
 #include <poppler-document.h>
 #include <poppler-image.h>
@@ -45,12 +45,27 @@ constexpr char16_t SOFT_HYPHEN = 0x00AD;
 /// Of a picture: A4 at 1,000 dots per inch, about.
 constexpr double MAX_PIXELS = 1e8;
 
+/// As poppler says that it draws nothing of what is written in a font.
+constexpr char const* FONT_FAILURE = "Couldn't create a font for";
+
+/// The last one of this process, which draws one page at a time.
+std::string& fontFailure() {
+    static std::string failure;
+    return failure;
+}
+
 /// Sets poppler up, once for the process.
 void preparePoppler() {
     static std::once_flag once;
     std::call_once(once, [] {
-        // What poppler finds wrong with a document shows in what can be read of it.
-        poppler::set_debug_error_function([](std::string const&, void*) {}, nullptr);
+        // What poppler finds wrong with a document shows in what can be read of it, but for letters that it
+        // leaves out of a picture.
+        poppler::set_debug_error_function(
+            [](std::string const& message, void*) {
+                if (message.find(FONT_FAILURE) != std::string::npos)
+                    fontFailure() = message.substr(message.find(FONT_FAILURE));
+            },
+            nullptr);
     });
     // poppler drops its tables with the last document and makes them anew for the next, which costs more than
     // opening it does: an empty document keeps them.
@@ -87,7 +102,7 @@ std::string textOf(poppler::text_box const& box) {
     poppler::ustring const units = box.text();
     std::u16string text(units.begin(), units.end());
     showDrawnHyphens(text, box);
-    return cleanText(inReadingOrder(text));
+    return cleanText(text);
 }
 
 /// Numbers the fonts of a page.
@@ -192,7 +207,13 @@ public:
     }
 
     std::string renderPage(int number, double dotsPerInch) override {
-        return pngOf(draw(number, dotsPerInch));
+        fontFailure().clear();
+        poppler::image const image = draw(number, dotsPerInch);
+        if (!fontFailure().empty())
+            Log::Lock(4).logStreamLine()
+                << where_ << ": the picture of page " << number << " lacks letters (" << fontFailure()
+                << "); draw it again, or embed the document's fonts";
+        return pngOf(image);
     }
 
     std::optional<Picture> drawPage(int number, double dotsPerInch) override {

@@ -107,6 +107,8 @@ std::string inWords(JobFailure failure, JobLimits const& limits) {
     case JobFailure::OutOfMemory:
         return "it took more than " + std::to_string(limits.memory >> 20) +
                " MiB of memory; print it to a new PDF, or give --document-memory a larger number";
+    case JobFailure::NoMemory:
+        return "there is not enough memory for it; close other programs, or give --jobs a smaller number";
     }
     return "the reader broke down over it; the document is damaged, print it to a new PDF";
 }

@@ -6,8 +6,10 @@
 #include <cerrno>
 #include <csignal>
 #include <cstdint>
+#include <cstdlib>
 #include <map>
 #include <memory>
+#include <new>
 #include <optional>
 #include <poll.h>
 #include <sched.h>
@@ -78,9 +80,9 @@ public:
     ~Worker() {
         ::close(socket_);
         // It may be in the middle of a job that nobody waits for.
-        ::kill(process_, SIGKILL);
-        while (::waitpid(process_, nullptr, 0) < 0 && errno == EINTR) {
-        }
+        if (process_ > 0)
+            ::kill(process_, SIGKILL);
+        awaitEnd();
     }
     Worker(Worker const&) = delete;
     Worker& operator=(Worker const&) = delete;
@@ -112,10 +114,10 @@ public:
         job_.reset();
         Number length = 0;
         if (!readAll(socket_, &length, sizeof length))
-            return failure_;
+            return whyNot();
         std::string result(length, '\0');
         if (!readAll(socket_, result.data(), result.size()))
-            return failure_;
+            return whyNot();
         return result;
     }
 
@@ -129,17 +131,37 @@ private:
         ::kill(process_, SIGKILL);
     }
 
+    /// The exit status, or less than nothing for an end by a signal.
+    int awaitEnd() {
+        int status = 0;
+        while (process_ > 0 && ::waitpid(process_, &status, 0) < 0 && errno == EINTR) {
+        }
+        process_ = -1;
+        return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    }
+
+    JobFailure whyNot() {
+        // It ends when nobody listens to it.
+        ::shutdown(socket_, SHUT_RDWR);
+        return awaitEnd() == NO_MEMORY ? JobFailure::NoMemory : failure_;
+    }
+
     /// The life of the worker process. Whatever is thrown ends it, too: behind the constructor it would go on
     /// as a second parent.
     [[noreturn]] static void serve(int socket, Job const& job) {
         try {
             answer(socket, job);
+        } catch (std::bad_alloc const&) {
+            ::_exit(NO_MEMORY);
         } catch (...) {
             // The parent sees that this process has ended without a result.
         }
         // Nothing of the parent's is flushed or destroyed here.
         ::_exit(0);
     }
+
+    /// The exit status of a worker that lacks memory, however it comes to its end.
+    static constexpr int NO_MEMORY = EXIT_FAILURE;
 
     /// Ends when the other side closes.
     static void answer(int socket, Job const& job) {

@@ -18,9 +18,11 @@ using Job = std::function<std::string(std::size_t index)>;
 enum class JobFailure {
     /// Its worker died over it.
     Died,
-    // Its worker was ended because the job took more than it may.
+    /// Its worker was ended because the job took more than it may.
     OutOfTime,
     OutOfMemory,
+    /// The machine had no memory for it.
+    NoMemory,
 };
 using JobResult = std::variant<std::string, JobFailure>;
 

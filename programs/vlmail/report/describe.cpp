@@ -6,6 +6,7 @@
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
+#include <new>
 #include <string>
 
 namespace VlMail::Report {
@@ -109,6 +110,9 @@ std::vector<Zone> zonesOf(Reader::PageTrace const& trace, LetterReading const& l
 void draw(Letter& letter, Reader::Document& document) {
     try {
         letter.png = document.renderPage(letter.page, DOTS_PER_INCH);
+    } catch (std::bad_alloc const&) {
+        // That says nothing of the page.
+        throw;
     } catch (std::exception const& failure) {
         letter.whyNoPicture = failure.what();
     }

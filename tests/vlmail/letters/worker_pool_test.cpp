@@ -5,6 +5,7 @@
 #include <chrono>
 #include <csignal>
 #include <ctime>
+#include <new>
 #include <string>
 #include <unistd.h>
 #include <vector>
@@ -21,6 +22,8 @@ std::string inWords(VlMail::JobResult const& result) {
         return "died";
     case VlMail::JobFailure::OutOfTime:
         return "out of time";
+    case VlMail::JobFailure::NoMemory:
+        return "no memory";
     case VlMail::JobFailure::OutOfMemory:
         break;
     }
@@ -65,6 +68,15 @@ TEST(WorkerPool, LosesOnlyTheJobThatKillsItsWorker) {
         return squareOf(index);
     });
     EXPECT_EQ(results, (std::vector<std::string>{"0", "1", "died", "9", "16", "25"}));
+}
+
+TEST(WorkerPool, SaysWhichJobTheMachineHadNoMemoryFor) {
+    auto const results = run(4, 2, [](std::size_t index) {
+        if (index == 1)
+            throw std::bad_alloc();
+        return squareOf(index);
+    });
+    EXPECT_EQ(results, (std::vector<std::string>{"0", "no memory", "4", "9"}));
 }
 
 TEST(WorkerPool, EndsAJobThatTakesMoreTimeThanItMay) {
