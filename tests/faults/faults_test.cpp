@@ -6,34 +6,30 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
+#include <cerrno>
 
 namespace {
 
 using namespace Faults;
 
-/// So many of the calls that are made often are tried, at even distances; of the others every one.
+/// Every call is tried up to so many; of more, so many at even distances.
 constexpr long MAX_POINTS = 100;
-constexpr long MAX_POINTS_OF_OFTEN = 16;
+/// Of those that there are hundreds or tens of thousands of, and that differ less.
+constexpr long MAX_POINTS_OF_OFTEN = 24;
 constexpr long MAX_POINTS_OF_SERVICE = 12;
 
-std::vector<long> pointsOf(std::string const& call, long calls) {
-    bool const isOften = call == "read" || call == "open";
-    long const count = std::min(calls, isOften ? MAX_POINTS_OF_OFTEN : MAX_POINTS);
+/// One command in which no allocation of its beginning, which all commands share, is left out.
+constexpr char const* LIGHTEST = "pack_list";
+
+std::vector<long> pointsOf(long calls, long limit) {
+    long const count = std::min(calls, limit);
     std::vector<long> points;
     for (long i = 0; i < count; ++i)
         points.push_back(1 + i * calls / count);
     return points;
 }
 
-/// Left to the sweep: lack of memory, since `mail` and `pack salvage` still end by a signal where it stays
-/// out, and the report, which tells other things where a picture fails.
-std::vector<Command> quickCommands() {
-    std::vector<Command> quick = commands();
-    std::erase_if(quick, [](Command const& command) { return command.name == "letter_report"; });
-    return quick;
-}
-
-bool isQuick(std::string const& call) { return call != "memory"; }
+bool isOften(std::string const& call) { return call == "memory" || call == "read"; }
 
 class CommandsWhoseCallsFail : public testing::TestWithParam<Command> {};
 
@@ -41,10 +37,9 @@ TEST_P(CommandsWhoseCallsFail, KeepTheirPromises) {
     Scenario scenario(GetParam());
     long tried = 0;
     for (std::string const& call : CALLS) {
-        if (!isQuick(call))
-            continue;
         std::vector<Fault> const faults = faultsOf(call);
-        for (long const point : pointsOf(call, scenario.callsOf(call))) {
+        for (long const point :
+             pointsOf(scenario.callsOf(call), isOften(call) ? MAX_POINTS_OF_OFTEN : MAX_POINTS)) {
             Fault fault = faults[static_cast<std::size_t>(tried++) % faults.size()];
             fault.number = point;
             EXPECT_THAT(scenario.run(fault), testing::IsEmpty())
@@ -55,8 +50,29 @@ TEST_P(CommandsWhoseCallsFail, KeepTheirPromises) {
     EXPECT_GT(tried, 3);
 }
 
-INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsWhoseCallsFail, testing::ValuesIn(quickCommands()),
+INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsWhoseCallsFail, testing::ValuesIn(commands()),
                          [](auto const& each) { return each.param.name; });
+
+TEST(CommandsWithoutMemory, KeepTheirPromisesWhicheverOfTheFirstAllocationsFails) {
+    Scenario scenario(*std::ranges::find(commands(), LIGHTEST, &Command::name));
+    std::vector<Fault> const faults = faultsOf("memory");
+    for (long point = 1; point <= MAX_POINTS; ++point) {
+        Fault fault = faults[static_cast<std::size_t>(point) % faults.size()];
+        fault.number = point;
+        EXPECT_THAT(scenario.run(fault), testing::IsEmpty()) << fault.text();
+    }
+}
+
+TEST(ACheckOfAMailing, DoesNotTakeADiskThatFailsForDamage) {
+    Scenario scenario(*std::ranges::find(commands(), "pack_verify", &Command::name));
+    long const calls = scenario.callsOf("read");
+    EXPECT_GT(calls, 3);
+    for (long number = 1; number <= calls; ++number) {
+        Ended const ended = scenario.look({"read", EIO, number, true});
+        bool const isTold = (ended.out + ended.err).find("Input/output error") != std::string::npos;
+        EXPECT_EQ(ended.status != 0, isTold) << number << ": " << ended.out << ended.err;
+    }
+}
 
 class AServiceWhoseCallsFail : public testing::TestWithParam<std::string> {};
 
@@ -65,16 +81,18 @@ TEST_P(AServiceWhoseCallsFail, LosesNothingAndDoublesNothing) {
     std::vector<Fault> const faults = faultsOf(GetParam());
     long const calls = job.callsOf(GetParam());
     EXPECT_GT(calls, 0);
-    for (long i = 0; i < std::min(calls, MAX_POINTS_OF_SERVICE); ++i) {
-        Fault fault = faults[static_cast<std::size_t>(i) % faults.size()];
-        fault.number = 1 + i * calls / std::min(calls, MAX_POINTS_OF_SERVICE);
+    std::size_t tried = 0;
+    for (long const point : pointsOf(calls, MAX_POINTS_OF_SERVICE)) {
+        Fault fault = faults[tried++ % faults.size()];
+        fault.number = point;
         EXPECT_THAT(job.run(fault), testing::IsEmpty())
             << "to repeat: scripts/torture --repeat service " << fault.text();
     }
 }
 
 INSTANTIATE_TEST_SUITE_P(OfAKind, AServiceWhoseCallsFail,
-                         testing::Values("write", "sync", "rename", "remove", "open", "read"),
+                         testing::Values("write", "sync", "rename", "remove", "open", "read", "memory",
+                                         "send", "receive"),
                          [](auto const& each) { return each.param; });
 
 } // namespace

@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
+#include <stdexcept>
 
 #include <fcntl.h>
 #include <sys/wait.h>
@@ -71,6 +72,9 @@ bool awaitEnd(pid_t process, int& status) {
 } // namespace
 
 std::map<std::string, std::string> environmentOf(Fault const& fault, fs::path const& counter) {
+    // The loader goes on without a library that it does not find, and nothing would fail.
+    if (!fs::exists(FAIL_AT_CALL_LIBRARY))
+        throw std::runtime_error("there is no " FAIL_AT_CALL_LIBRARY);
     std::ofstream(counter, std::ios::binary) << std::string(sizeof(long), '\0');
     return {{"LD_PRELOAD", FAIL_AT_CALL_LIBRARY},
             {"FAULT", fault.text()},

@@ -35,6 +35,22 @@ std::string withoutIds(std::string const& text) {
     return std::regex_replace(text, id, "ID");
 }
 
+/// Of a report: what is not drawn but written. In a picture's place may stand why there is none.
+std::string withoutPictures(std::string html) {
+    constexpr std::string_view SHEET = "<div class=\"sheet\"";
+    for (std::size_t at = html.find(SHEET); at != std::string::npos; at = html.find(SHEET, at + 1)) {
+        std::size_t const begin = std::min(html.find('\n', at), html.size() - 1) + 1;
+        html.erase(begin, html.find('\n', begin) - begin);
+    }
+    return html;
+}
+
+/// What draws pages takes another font, or leaves letters out, where it cannot have what it wants. Of files
+/// that it cannot read it tells. Of memory that it does not get for one letter it tells nobody.
+bool mayShowLess(Fault const& fault, Ended const& ended) {
+    return fault.call == "memory" || !ended.err.empty();
+}
+
 std::string verifiedAs(fs::path const& mailing) {
     Ended const ended =
         runWith({}, VLMAIL_PROGRAM, {"pack", "verify", mailing.filename()}, mailing.parent_path());
@@ -126,20 +142,29 @@ void Scenario::checkOutputs(Fault const& fault, Ended const& ended, Files const&
         if (before_.contains(name) && before_.at(name) == content)
             continue;
         if (after_.contains(name))
-            checkOutput(name, content, ended.status == clean_.status);
+            checkOutput(fault, ended, name, content);
         else if (!isHidden(name) || (ended.status >= 0 && fault.call != "remove"))
             find("leaves " + name);
     }
 }
 
-void Scenario::checkOutput(std::string const& name, std::string const& content, bool isComplete) {
+bool Scenario::isSame(std::string const& name, std::string const& content) const {
     std::string const& whole = after_.at(name);
+    return changing_.at(name) ? content.size() == whole.size() : content == whole;
+}
+
+void Scenario::checkOutput(Fault const& fault, Ended const& ended, std::string const& name,
+                           std::string const& content) {
+    std::string const& whole = after_.at(name);
+    bool const isComplete = ended.status == clean_.status;
     if (name.ends_with(".mailing")) {
         std::string const verdict = verifiedAs(folder_ / names().at(name));
         if (isComplete ? verdict != verdicts_[name] : verdict.find("all whole") == std::string::npos)
             find("leaves a mailing that is not whole: " + verdict);
     } else if (isComplete || name.ends_with(".pdf")) {
-        if (changing_[name] ? content.size() != whole.size() : content != whole)
+        bool const isExcused = name.ends_with(".html") && mayShowLess(fault, ended) &&
+                               withoutPictures(content) == withoutPictures(whole);
+        if (!isSame(name, content) && !isExcused)
             find("leaves " + name + " with other content than a run in which nothing fails");
     } else if (!endsLike(content, whole)) {
         find("leaves half of " + name);

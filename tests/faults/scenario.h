@@ -32,6 +32,8 @@ public:
     long callsOf(std::string const& call);
     /// Runs it with the fault; gives what was promised and not kept, empty when all was.
     std::vector<std::string> run(Fault const& fault);
+    /// Only runs it with the fault.
+    Ended look(Fault const& fault) { return runOnce(fault); }
 
 private:
     using Files = std::map<std::string, std::string>;
@@ -43,7 +45,9 @@ private:
     void checkEnd(Fault const& fault, Ended const& ended, Files const& after);
     void checkInputs(Files const& after);
     void checkOutputs(Fault const& fault, Ended const& ended, Files const& after);
-    void checkOutput(std::string const& name, std::string const& content, bool isComplete);
+    void checkOutput(Fault const& fault, Ended const& ended, std::string const& name,
+                     std::string const& content);
+    bool isSame(std::string const& name, std::string const& content) const;
     void find(std::string const& what) { findings_.push_back(what); }
 
     Command command_;

@@ -2,6 +2,7 @@
 // random and for as long as one likes.
 //     torture MINUTES [SEED]           says each finding, and how to repeat it; status 1 when there was one
 //     torture --repeat COMMAND FAULT   runs one, such as "mail write:28:3+"
+//     torture --each COMMAND CALL [STEP]   each call of a kind, or each so many, in each way that it can fail
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
 
@@ -51,13 +52,17 @@ Subject subjectOf(std::string const& name, std::shared_ptr<Runner> const& runner
             [=](Fault const& fault) { return runner->run(fault); }};
 }
 
+std::vector<Subject> allSubjects() {
+    std::vector<Subject> subjects;
+    for (Command const& command : commands())
+        subjects.push_back(subjectOf(command.name, std::make_shared<Scenario>(command)));
+    subjects.push_back(subjectOf(SERVICE, std::make_shared<OneJob>()));
+    return subjects;
+}
+
 class Sweep {
 public:
-    explicit Sweep(unsigned seed) : random_(seed) {
-        for (Command const& command : commands())
-            subjects_.push_back(subjectOf(command.name, std::make_shared<Scenario>(command)));
-        subjects_.push_back(subjectOf(SERVICE, std::make_shared<OneJob>()));
-    }
+    explicit Sweep(unsigned seed) : random_(seed) {}
 
     /// One run; whether there was a finding.
     bool step() {
@@ -75,8 +80,26 @@ private:
     std::size_t below(std::size_t limit) { return random_() % limit; }
 
     std::mt19937 random_;
-    std::vector<Subject> subjects_;
+    std::vector<Subject> subjects_ = allSubjects();
 };
+
+int each(std::string const& name, std::string const& call, long step) {
+    std::vector<Subject> const subjects = allSubjects();
+    auto const subject = std::ranges::find(subjects, name, &Subject::name);
+    if (subject == subjects.end() || std::ranges::find(CALLS, call) == CALLS.end() || step < 1) {
+        std::cerr << "torture: there is no command " << name << " or no call " << call << '\n';
+        return 1;
+    }
+    bool isFound = false;
+    long const calls = subject->count(call);
+    std::cout << name << " makes " << calls << " calls of " << call << std::endl;
+    for (long number = 1; number <= calls; number += step)
+        for (Fault fault : faultsOf(call)) {
+            fault.number = number;
+            isFound = say(name, fault, subject->run(fault)) || isFound;
+        }
+    return isFound ? 1 : 0;
+}
 
 int torture(double minutes, unsigned seed) {
     std::cout << "torture for " << minutes << " minutes with the seed " << seed << std::endl;
@@ -96,9 +119,12 @@ int main(int argc, char** argv) {
     std::vector<std::string> const words(argv + 1, argv + argc);
     if (words.size() == 3 && words[0] == "--repeat")
         return repeat(words[1], words[2]);
+    if ((words.size() == 3 || words.size() == 4) && words[0] == "--each")
+        return each(words[1], words[2], words.size() == 4 ? std::atol(words[3].c_str()) : 1);
     double const minutes = words.empty() ? 0 : std::atof(words[0].c_str());
     if (minutes <= 0 || words.size() > 2) {
-        std::cerr << "usage: torture MINUTES [SEED] | torture --repeat COMMAND FAULT\n";
+        std::cerr << "usage: torture MINUTES [SEED] | torture --repeat COMMAND FAULT | torture --each "
+                     "COMMAND CALL [STEP]\n";
         return 1;
     }
     return torture(minutes,
