@@ -72,6 +72,9 @@ bool isUnseen(UChar32 c) {
     return c == 0x00AD || c == 0x200B || c == 0x2060 || c == 0xFEFF || u_charType(c) == U_CONTROL_CHAR;
 }
 
+/// Hyphens of typography look like the one that people type; dashes are wider and stay.
+bool isHyphen(UChar32 c) { return c == 0x2010 || c == 0x2011; }
+
 void append(std::u16string& text, UChar32 c) {
     char16_t units[2];
     std::size_t length = 0;
@@ -85,6 +88,8 @@ void appendClean(std::u16string& text, UChar32 c) {
     else if (u_isUWhiteSpace(c)) {
         if (!text.empty() && text.back() != u' ')
             text += u' ';
+    } else if (isHyphen(c)) {
+        text += u'-';
     } else if (isPresentationForm(c)) {
         std::u16string one;
         append(one, c);

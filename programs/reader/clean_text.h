@@ -7,9 +7,9 @@
 
 namespace Reader {
 
-/// UTF-8 in NFC. Ligatures and other presentation forms become their letters; white space becomes one blank
-/// and disappears at the ends, as do control characters, soft hyphens and characters without width
-/// everywhere. What is no UTF-16 becomes U+FFFD.
+/// UTF-8 in NFC. Ligatures and other presentation forms become their letters, and the hyphens U+2010 and
+/// U+2011 the plain one; white space becomes one blank and disappears at the ends, as do control characters,
+/// soft hyphens and characters without width everywhere. What is no UTF-16 becomes U+FFFD.
 std::string cleanText(std::u16string_view text);
 
 /// Nothing when the text is no valid UTF-8.

@@ -5,6 +5,7 @@
 #include "programs/reader/value_reading.h"
 
 #include <algorithm>
+#include <string_view>
 #include <utility>
 
 namespace Reader {
@@ -28,6 +29,28 @@ ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, Fiel
 std::string inSeconds(std::chrono::milliseconds time) {
     std::string const rest = std::to_string(1000 + time.count() % 1000).substr(1);
     return std::to_string(time.count() / 1000) + (rest == "000" ? "" : '.' + rest) + " s";
+}
+
+/// An address from its first line on, over several lines. A pattern that has anything in front of the value
+/// says itself how the address begins.
+bool beginsAtFirstLine(ExtractField const& field) {
+    std::string_view pattern = field.strRegex();
+    bool const isOfLines = pattern.starts_with("\\A") || pattern.find("\\n") != pattern.npos;
+    for (std::string_view const front : {"(?s)", "(?i)", "\\A", "^"})
+        if (pattern.starts_with(front))
+            pattern.remove_prefix(front.size());
+    return field.priority() > 0 && isOfLines &&
+           pattern.starts_with("(?<" + ExtractField::REGEX_VALUE_GROUP_MARK + '>');
+}
+
+std::shared_ptr<ExtractedField> cutOut(ExtractField const& field, ZoneText& text, FieldTrace& trace) {
+    trace.definition = &field;
+    std::shared_ptr<ExtractedField> value =
+        field.extractField(text.searchedText(), measureFor(field, text, trace),
+                           [&](std::string const& reason) { trace.failure = reason; });
+    if (value && !value->isValidated())
+        trace.rawText = value->rawValue().textOrEmpty();
+    return value;
 }
 
 } // namespace
@@ -180,12 +203,15 @@ bool separatesLetters(ExtractField const& field) {
 }
 
 std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace& trace) {
-    trace.definition = &field;
-    std::shared_ptr<ExtractedField> value =
-        field.extractField(text.searchedText(), measureFor(field, text, trace),
-                           [&](std::string const& reason) { trace.failure = reason; });
+    if (!beginsAtFirstLine(field))
+        return cutOut(field, text, trace);
+    ZoneText address = text;
+    trace.sendersLine = address.cutSmallerLinesAbove();
+    if (trace.sendersLine.empty())
+        return cutOut(field, text, trace);
+    auto value = cutOut(field, address, trace);
     if (value && !value->isValidated())
-        trace.rawText = value->rawValue().textOrEmpty();
+        text = std::move(address);
     return value;
 }
 

@@ -1,7 +1,10 @@
 #include "programs/reader/lines.h"
 
 #include "programs/reader/blank_widths.h"
+#include "programs/reader/letter_spacing.h"
+#include "programs/reader/writing_direction.h"
 
+#include <algorithm>
 #include <map>
 #include <numeric>
 #include <optional>
@@ -207,23 +210,56 @@ int mainSize(Page const& page, OpenLine const& line) {
     return main;
 }
 
-Line closed(Page const& page, OpenLine const& open, Turn turn, double minWordGap) {
-    Line line;
-    line.turn = turn;
-    line.size = mainSize(page, open);
-    line.box = page.words[open.words.front().index].box;
+/// Whether the word at `i` and the one before it have a blank between them.
+bool isApart(Page const& page, OpenLine const& open, std::size_t i, double minWordGap) {
+    Word const& before = page.words[open.words[i - 1].index];
+    int const size = std::max(before.size, page.words[open.words[i].index].size);
+    int const gap = open.words[i].frame.start - open.words[i - 1].frame.end;
+    return before.blankBehind || gap > minWordGap * size;
+}
+
+std::vector<SetWord> asSet(Page const& page, OpenLine const& open) {
+    std::vector<SetWord> words;
     for (std::size_t i = 0; i < open.words.size(); ++i) {
-        std::size_t const index = open.words[i].index;
-        bool blankBefore = false;
-        if (i > 0) {
-            Word const& before = page.words[open.words[i - 1].index];
-            int const size = std::max(before.size, page.words[index].size);
-            int const gap = open.words[i].frame.start - open.words[i - 1].frame.end;
-            blankBefore = before.blankBehind || gap > minWordGap * size;
-        }
-        line.words.push_back({index, blankBefore});
-        line.box = line.box.united(page.words[index].box);
+        Word const& word = page.words[open.words[i].index];
+        int const gap = i == 0 ? 0 : open.words[i].frame.start - open.words[i - 1].frame.end;
+        words.push_back({word.text, gap, word.size, word.font});
     }
+    return words;
+}
+
+/// The words from left to right.
+std::vector<LineWord> wordsOf(Page const& page, OpenLine const& open, double minWordGap) {
+    std::vector<bool> const isSpaced = belongsToWordBefore(asSet(page, open));
+    std::vector<LineWord> words;
+    for (std::size_t i = 0; i < open.words.size(); ++i)
+        words.push_back({open.words[i].index, i > 0 && !isSpaced[i] && isApart(page, open, i, minWordGap)});
+    return words;
+}
+
+std::vector<LineWord> asRead(Page const& page, std::vector<LineWord> words) {
+    std::vector<std::string_view> texts;
+    for (LineWord const& word : words)
+        texts.push_back(page.words[word.word].text);
+    if (page.isTyped || std::none_of(texts.begin(), texts.end(), isFromRightToLeft))
+        return words;
+    std::vector<std::size_t> const order = readingOrderOf(texts);
+    std::vector<LineWord> read;
+    for (std::size_t i = 0; i < order.size(); ++i) {
+        // What stands between two words stands in front of the one on the right; others were never
+        // neighbours.
+        std::size_t const right = i > 0 ? std::max(order[i - 1], order[i]) : 0;
+        bool const areNeighbours = i > 0 && order[i - 1] + order[i] + 1 == 2 * right;
+        read.push_back({words[order[i]].word, i > 0 && (!areNeighbours || words[right].blankBefore)});
+    }
+    return read;
+}
+
+Line closed(Page const& page, OpenLine const& open, Turn turn, double minWordGap) {
+    Line line{asRead(page, wordsOf(page, open, minWordGap)), page.words[open.words.front().index].box,
+              mainSize(page, open), turn};
+    for (PlacedWord const& placed : open.words)
+        line.box = line.box.united(page.words[placed.index].box);
     return line;
 }
 

@@ -37,6 +37,8 @@ struct Page {
     /// In no order that anything may depend on.
     std::vector<Word> words;
     std::vector<Font> fonts;
+    /// Words stand from left to right in the order in which they are read, whatever their script.
+    bool isTyped = false;
 };
 
 } // namespace Reader

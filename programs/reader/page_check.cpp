@@ -1,7 +1,11 @@
 #include "programs/reader/page_check.h"
 
+#include "programs/reader/clean_text.h"
+#include "programs/reader/writing_direction.h"
+
 #include <algorithm>
 #include <cstdlib>
+#include <string>
 #include <tuple>
 #include <vector>
 
@@ -17,19 +21,34 @@ constexpr int SAME_SHADE = 40;
 /// So many points of a picture may differ by more.
 constexpr std::size_t STRAY_POINTS = 8;
 
-std::vector<Word const*> sorted(Page const& page) {
-    std::vector<Word const*> words;
+/// A word, and how it is read off a sheet.
+struct Shown {
+    std::string text;
+    Word const* word;
+};
+
+/// What is typed in a script from right to left is drawn from left to right as it was typed.
+std::string textOf(Page const& page, Word const& word) {
+    return page.isTyped && isFromRightToLeft(word.text) ? cleanText(inReadingOrder(*utf16Of(word.text)))
+                                                        : word.text;
+}
+
+std::vector<Shown> sorted(Page const& page) {
+    std::vector<Shown> words;
     for (Word const& word : page.words)
-        words.push_back(&word);
-    std::sort(words.begin(), words.end(), [](Word const* a, Word const* b) {
-        return std::tie(a->text, a->box.top, a->box.left) < std::tie(b->text, b->box.top, b->box.left);
+        words.push_back({textOf(page, word), &word});
+    std::sort(words.begin(), words.end(), [](Shown const& a, Shown const& b) {
+        return std::tie(a.text, a.word->box.top, a.word->box.left) <
+               std::tie(b.text, b.word->box.top, b.word->box.left);
     });
     return words;
 }
 
-bool isSame(Word const* one, Word const* other) {
-    return one->text == other->text && std::abs(one->box.left - other->box.left) <= SAME_PLACE &&
-           std::abs(one->box.top - other->box.top) <= one->size / SAME_HEIGHT;
+bool isSame(Shown const& one, Shown const& other) {
+    Box const& box = one.word->box;
+    Box const& otherBox = other.word->box;
+    return one.text == other.text && std::abs(box.left - otherBox.left) <= SAME_PLACE &&
+           std::abs(box.top - otherBox.top) <= one.word->size / SAME_HEIGHT;
 }
 
 bool isSameShade(char one, char other) {
@@ -39,8 +58,8 @@ bool isSameShade(char one, char other) {
 } // namespace
 
 bool haveSameWords(Page const& one, Page const& other) {
-    std::vector<Word const*> const words = sorted(one);
-    std::vector<Word const*> const others = sorted(other);
+    std::vector<Shown> const words = sorted(one);
+    std::vector<Shown> const others = sorted(other);
     return std::equal(words.begin(), words.end(), others.begin(), others.end(), isSame);
 }
 

@@ -4,6 +4,7 @@
 #include "programs/reader/clean_text.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_page.h"
+#include "programs/reader/writing_direction.h"
 #include "vlservice/platform/log.h"
 
 #include <poppler-document.h>
@@ -102,7 +103,7 @@ std::string textOf(poppler::text_box const& box) {
     poppler::ustring const units = box.text();
     std::u16string text(units.begin(), units.end());
     showDrawnHyphens(text, box);
-    return cleanText(text);
+    return cleanText(inReadingOrder(text));
 }
 
 /// Numbers the fonts of a page.

@@ -123,6 +123,7 @@ private:
         page.number = static_cast<int>(pages_.size()) + 1;
         page.width = TypedPage::WIDTH;
         page.height = TypedPage::HEIGHT;
+        page.isTyped = true;
         page.fonts = {{TypedPage::FONT, TypedPage::COLUMN / TypedPage::SIZE}};
         pages_.push_back(std::move(page));
         row_ = 0;

@@ -29,6 +29,8 @@ struct FieldTrace {
     std::optional<JoinedMatch> joined = {};
     /// The match is wider than the definition allows: it stays in the text and gives no value.
     bool isTooWide = false;
+    /// Smaller print above an address, the sender's, which was left out of what was searched.
+    std::string sendersLine = {};
     /// The lines that the match took out of the zone's text.
     std::string cut;
     /// The text of the value before it was validated; nothing when the value is the default.

@@ -21,20 +21,50 @@ Box partOf(Word const& word, std::size_t begin, std::size_t end) {
 
 void unite(std::optional<Box>& sum, Box const& box) { sum = sum ? sum->united(box) : box; }
 
+bool standBelowEachOther(Line const* upper, Line const* lower) {
+    Frame const a = frameOf(upper->box, upper->turn);
+    Frame const b = frameOf(lower->box, lower->turn);
+    return upper->turn == lower->turn && a.bottom - b.top <= std::min(a.height(), b.height()) / 2;
+}
+
+/// One column has one order, whatever blocks its lines make.
+std::vector<Line const*> inOrder(Layout const& layout) {
+    std::vector<Line const*> asBlocks;
+    for (Line const& line : layout.lines)
+        asBlocks.push_back(&line);
+    std::vector<Line const*> fromTop = asBlocks;
+    std::stable_sort(fromTop.begin(), fromTop.end(), [](Line const* a, Line const* b) {
+        return frameOf(a->box, a->turn).top < frameOf(b->box, b->turn).top;
+    });
+    bool const isColumn =
+        std::adjacent_find(fromTop.begin(), fromTop.end(), [](Line const* a, Line const* b) {
+            return !standBelowEachOther(a, b);
+        }) == fromTop.end();
+    return isColumn ? fromTop : asBlocks;
+}
+
+/// From this ratio on a line is set smaller than another, as blocks have it.
+bool isSmaller(int size, int other) { return size * 6LL <= other * 5LL; }
+
 } // namespace
 
 ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location) {
     ZoneText zone;
     Layout const inside = layOutInside(page, layout.spacing, location);
+    for (Line const* const line : inOrder(inside))
+        zone.addLine(page, *line);
     for (Block const& block : inside.blocks)
-        zone.addBlock(page, inside, block);
+        zone.addBlock(block);
     return zone;
 }
 
 ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) {
     ZoneText zone;
-    if (Block const* const block = layout.nearestBlock(point))
-        zone.addBlock(page, layout, *block);
+    if (Block const* const block = layout.nearestBlock(point)) {
+        for (std::size_t i = block->firstLine; i < block->endLine; ++i)
+            zone.addLine(page, layout.lines[i]);
+        zone.addBlock(*block);
+    }
     return zone;
 }
 
@@ -47,25 +77,26 @@ ZoneText ZoneText::given(std::string const& text) {
         if (!zone.lines_.empty())
             zone.text_ += '\n';
         zone.text_ += line;
-        zone.lines_.push_back({{}, line.size()});
+        zone.lines_.push_back({{}, line.size(), 0, {}});
         begin = end + 1;
     }
     return zone;
 }
 
-void ZoneText::addBlock(Page const& page, Layout const& layout, Block const& block) {
-    for (std::size_t i = block.firstLine; i < block.endLine; ++i) {
-        if (!lines_.empty())
-            text_ += '\n';
-        lines_.push_back(lineOf(page, layout.lines[i]));
-    }
+void ZoneText::addBlock(Block const& block) {
     box_ = blocks_.empty() ? block.box : box_.united(block.box);
     blocks_.push_back(block.box);
 }
 
+void ZoneText::addLine(Page const& page, Line const& line) {
+    if (!lines_.empty())
+        text_ += '\n';
+    lines_.push_back(lineOf(page, line));
+}
+
 /// Adds the line's words to the text and tells where they are.
 ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line) {
-    TextLine result;
+    TextLine result{{}, 0, line.size, frameOf(line.box, line.turn)};
     std::size_t lettersLeft = MAX_LINE_LENGTH;
     for (LineWord const& lineWord : line.words) {
         Word const& word = page.words[lineWord.word];
@@ -135,6 +166,33 @@ Stretch ZoneText::stretch(std::size_t offset, std::size_t length) const {
     }
     result.box = all.value_or(Box{});
     return result;
+}
+
+std::size_t ZoneText::countSmallerLinesAbove() const {
+    constexpr std::size_t FEWEST_BELOW = 2;
+    std::size_t count = 0;
+    while (count < lines_.size() && !isSmaller(lines_.front().size, lines_[count].size))
+        ++count;
+    if (count + FEWEST_BELOW > lines_.size() || lines_[count].size == 0)
+        return 0;
+    Frame const& below = lines_[count].frame;
+    bool const stand = std::all_of(lines_.begin(), lines_.begin() + static_cast<std::ptrdiff_t>(count),
+                                   [&](TextLine const& line) {
+                                       return isSmaller(line.size, lines_[count].size) &&
+                                              line.frame.bottom <= below.top + below.height() / 2 &&
+                                              line.frame.start < below.end && below.start < line.frame.end;
+                                   });
+    return stand && !isSmaller(lines_[count + 1].size, lines_[count].size) ? count : 0;
+}
+
+std::string ZoneText::cutSmallerLinesAbove() {
+    std::size_t const count = countSmallerLinesAbove();
+    if (count == 0)
+        return {};
+    std::size_t length = count - 1;
+    for (std::size_t i = 0; i < count; ++i)
+        length += lines_[i].length;
+    return cutLines(0, length);
 }
 
 std::string ZoneText::cutLines(std::size_t offset, std::size_t length) {

@@ -27,7 +27,8 @@ struct Stretch {
 /// Holds references to the page, which must live longer.
 class ZoneText {
 public:
-    /// The words whose centre lies in the location, laid out without the others.
+    /// The words whose centre lies in the location, laid out without the others: block by block, or from top
+    /// to bottom where no lines stand side by side.
     static ZoneText inside(Page const& page, Layout const& layout, Box const& location);
     /// The block nearest to the point.
     static ZoneText nearest(Page const& page, Layout const& layout, Point point);
@@ -44,6 +45,9 @@ public:
 
     /// What stands at these bytes of text(); words that are only partly in it count by their letters.
     Stretch stretch(std::size_t offset, std::size_t length) const;
+    /// Takes the lines of smaller print away that stand above the others: the sender's, of a zone with an
+    /// address. Gives their text, which is empty when there are none.
+    std::string cutSmallerLinesAbove();
     /// Takes the lines that have a letter in these bytes out of text(), with their line breaks, and gives
     /// their text.
     std::string cutLines(std::size_t offset, std::size_t length);
@@ -60,6 +64,9 @@ private:
     struct TextLine {
         std::vector<Piece> pieces;
         std::size_t length = 0;
+        /// Of its print, and where it stands; nothing of text that stands nowhere.
+        int size = 0;
+        Frame frame = {};
     };
     /// Whole lines, and the bytes of text() that they take without their last line break.
     struct LineRange {
@@ -69,7 +76,9 @@ private:
         std::size_t textEnd = 0;
     };
 
-    void addBlock(Page const& page, Layout const& layout, Block const& block);
+    void addBlock(Block const& block);
+    void addLine(Page const& page, Line const& line);
+    std::size_t countSmallerLinesAbove() const;
     TextLine lineOf(Page const& page, Line const& line);
     LineRange linesAt(std::size_t offset, std::size_t length) const;
 

@@ -143,6 +143,8 @@ private:
             object.set(MATCH, toJson(*trace.match));
         if (trace.joined)
             object.set(JOINED, toJson(*trace.joined));
+        if (!trace.sendersLine.empty())
+            object.set(SENDERS_LINE, trace.sendersLine);
         if (!trace.cut.empty())
             object.set(CUT, trace.cut);
         if (trace.rawText)

@@ -79,6 +79,7 @@ constexpr char const* JOINT = "joint";
 constexpr char const* JOINT_RIGHT = "right";
 constexpr char const* JOINT_BELOW = "below";
 constexpr char const* PARTS = "parts";
+constexpr char const* SENDERS_LINE = "senders_line";
 constexpr char const* CUT = "cut";
 constexpr char const* RAW = "raw";
 constexpr char const* IS_DEFAULT = "default";

@@ -171,6 +171,10 @@ private:
         std::string const pattern = textOf(field, PATTERN);
         if (!pattern.empty())
             line(12, "pattern " + excerpt(pattern, MAX_LETTERS));
+        std::string const sendersLine = textOf(field, SENDERS_LINE);
+        if (!sendersLine.empty())
+            line(12, "leaves out " + excerpt(sendersLine, MAX_LETTERS) +
+                         ", the sender's: smaller print above the address");
         json::Value const found = field.get(MATCH);
         if (!found)
             return;

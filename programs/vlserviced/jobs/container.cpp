@@ -17,14 +17,20 @@ bool isCompressed(SharedMemBuffer const& blob) {
            std::equal(DB_ZIP_MAGIC.begin(), DB_ZIP_MAGIC.end(), reinterpret_cast<char const*>(blob.data()));
 }
 
+/// Names of documents stay out of it: what is at fault goes into the log, and they may be those of people.
+[[noreturn]] void refuse(std::size_t position, char const* why) {
+    throw BadPack("page " + std::to_string(position) + " of the pack " + why);
+}
+
 void copyPages(Mailing::PackDatabaseReader& pages, PageSaverI& container) {
+    std::size_t position = 0;
     for (auto const& [document, page] : pages.pages()) {
+        ++position;
         pages.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
             if (!Container::mayStandInIndex(document) || !Container::mayStandInIndex(page))
-                throw BadPack("page \"" + page + "\" of \"" + document +
-                              "\" has a name that a container cannot hold");
+                refuse(position, "has a name that a container cannot hold");
             if (!isCompressed(blob))
-                throw BadPack("page \"" + page + "\" of \"" + document + "\" is not a compressed page");
+                refuse(position, "is not a compressed page");
             container.savePage(document, page, std::move(blob));
         });
     }

@@ -103,8 +103,9 @@ std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::stri
         if (isDelivered || state == Protocol::stateName(Protocol::JobState::Failed))
             return CarrierReport{isDelivered, report.get("text").textOrEmpty()};
         Log::Lock(4).logStreamLine() << "The report " << path << " has no state that is known";
-    } catch (json::Exc const& failure) {
-        Log::Lock(4).logStreamLine() << "The report " << path << " cannot be read. " << failure.what();
+    } catch (json::Exc const&) {
+        // What the parser says quotes the carrier's text, which may tell of a recipient.
+        Log::Lock(4).logStreamLine() << "The report " << path << " cannot be read: it is no JSON object";
     }
     return std::nullopt;
 }

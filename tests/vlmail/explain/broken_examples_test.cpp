@@ -51,10 +51,10 @@ Broken const BROKEN[]{
      "earlier_field: would match \"Total: 12.30 EUR\", but the field \"subject\", which is searched before "
      "it, "
      "takes that line: put this field in front of it, or into a zone of its own"},
-    {"typographic-hyphen", "reference",
-     "look_alike: would match \"Our reference: AB\u20111704\" if characters that look alike were the same: "
+    {"typographic-dash", "reference",
+     "look_alike: would match \"Our reference: AB\u20131704\" if characters that look alike were the same: "
      "the "
-     "letter has \"\u2011\" (U+2011) where the pattern has \"-\": let the pattern take both"},
+     "letter has \"\u2013\" (U+2013) where the pattern has \"-\": let the pattern take both"},
     {"value-broken-over-two-lines", "reference",
      "joined_lines: would match with the lines \"Our reference: AB-17\" and \"04\" joined: let the "
      "pattern take a line break there, \\s in the place of a blank or \\h"},

@@ -54,7 +54,7 @@ TEST_F(Container, IsNotWrittenOfPagesThatAreNotCompressed) {
                             "UPDATE pages SET data = x'54455A' WHERE position = 1",
                             "UPDATE pages SET data = 5 WHERE position = 1"}) {
         run(sql);
-        EXPECT_EQ(writingFailure("p1"), "page \"2\" of \"one.pdf\" is not a compressed page") << sql;
+        EXPECT_EQ(writingFailure("p1"), "page 2 of the pack is not a compressed page") << sql;
         EXPECT_THROW(VlServiced::writeContainer({folder_.path().string(), "packs.db", "p1"}, target_),
                      VlServiced::BadPack);
     }
@@ -83,7 +83,7 @@ TEST_F(Container, IsNotWrittenWithoutMetadata) {
 TEST_F(Container, IsNotWrittenOfNamesThatItsIndexCannotHold) {
     storePack(file_, "p1");
     run("UPDATE pages SET page = char(1) WHERE position = 2");
-    EXPECT_EQ(writingFailure("p1"), "page \"\x01\" of \"two.pdf\" has a name that a container cannot hold");
+    EXPECT_EQ(writingFailure("p1"), "page 3 of the pack has a name that a container cannot hold");
     EXPECT_EQ(filesInOutbox(), 0);
 }
 

@@ -204,9 +204,9 @@ TEST_F(JobRunnerTest, GivesUpAPackThatIsBad) {
     acceptStored("p1");
     run("UPDATE pages SET data = 'x' WHERE position = 0");
     doWork();
-    EXPECT_EQ(state("p1"), "failed: page \"1\" of \"one.pdf\" is not a compressed page");
+    EXPECT_EQ(state("p1"), "failed: page 1 of the pack is not a compressed page");
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
-              "pack p1 was given up: page \"1\" of \"one.pdf\" is not a compressed page");
+              "pack p1 was given up: page 1 of the pack is not a compressed page");
     runner_->resume();
     EXPECT_TRUE(work_.empty());
 }
