@@ -16,6 +16,8 @@ std::regex const HEADING("#+ +(.*)");
 std::regex const CODE("`[^`]*`");
 std::regex const LINK(R"(\]\(([^)]+)\))");
 std::regex const PLACE("`((?:vlservice|programs|tests|fuzz|bench|examples|docs|scripts)/[a-z0-9_./-]*)`");
+std::regex const TEST_NAME("`([A-Z][A-Z0-9]*[a-z][A-Za-z0-9]*\\.[A-Z][A-Za-z0-9]*)`");
+std::regex const DECLARATION(R"(\bTEST(?:_F|_P)?\(\s*(\w+),\s*(\w+)\))");
 
 /// Every match's first group.
 std::vector<std::string> allMatches(std::string const& line, std::regex const& regex) {
@@ -78,6 +80,7 @@ void Page::readLine(std::string const& line) {
     std::ranges::copy_if(allMatches(std::regex_replace(line, CODE, ""), LINK), std::back_inserter(links_),
                          [](std::string const& link) { return link.find("://") == std::string::npos; });
     std::ranges::copy(allMatches(line, PLACE), std::back_inserter(places_));
+    std::ranges::copy(allMatches(line, TEST_NAME), std::back_inserter(tests_));
 }
 
 std::vector<fs::path> pagesOf(fs::path const& root) {
@@ -126,6 +129,31 @@ std::vector<std::string> missingPlaces(fs::path const& root) {
         for (std::string const& place : page.places())
             if (!fs::exists(root / place))
                 missing.push_back(file.lexically_relative(root).string() + ": " + place);
+    }
+    return missing;
+}
+
+std::set<std::string> declaredTests(fs::path const& root) {
+    std::set<std::string> tests;
+    for (fs::directory_entry const& entry : fs::recursive_directory_iterator(root / "tests")) {
+        if (entry.path().extension() != ".cpp")
+            continue;
+        std::ifstream in(entry.path());
+        std::string const text{std::istreambuf_iterator<char>(in), {}};
+        for (std::sregex_iterator match(text.begin(), text.end(), DECLARATION), end; match != end; ++match)
+            tests.insert((*match)[1].str() + '.' + (*match)[2].str());
+    }
+    return tests;
+}
+
+std::vector<std::string> missingTests(fs::path const& root) {
+    std::set<std::string> const declared = declaredTests(root);
+    std::vector<std::string> missing;
+    for (fs::path const& file : pagesOf(root)) {
+        Page const page(file);
+        for (std::string const& test : page.tests())
+            if (!declared.contains(test))
+                missing.push_back(file.lexically_relative(root).string() + ": " + test);
     }
     return missing;
 }

@@ -17,12 +17,15 @@ public:
     bool hasHeading(std::string const& anchor) const { return anchors_.contains(anchor); }
     /// Names of files and folders of the project that it mentions in backticks.
     std::vector<std::string> const& places() const { return places_; }
+    /// Names of tests, `Suite.Name`, that it mentions in backticks.
+    std::vector<std::string> const& tests() const { return tests_; }
 
 private:
     void readLine(std::string const& line);
 
     std::vector<std::string> links_;
     std::vector<std::string> places_;
+    std::vector<std::string> tests_;
     std::set<std::string> anchors_;
 };
 
@@ -37,3 +40,9 @@ std::vector<std::string> unreachedPages(std::filesystem::path const& root);
 
 /// One text `page: place` for each file or folder that is mentioned and not there.
 std::vector<std::string> missingPlaces(std::filesystem::path const& root);
+
+/// Of all tests that are declared in `tests` below `root`, `Suite.Name`.
+std::set<std::string> declaredTests(std::filesystem::path const& root);
+
+/// One text `page: test` for each test that is mentioned and not declared.
+std::vector<std::string> missingTests(std::filesystem::path const& root);

@@ -7,6 +7,9 @@
 
 #include <algorithm>
 #include <fstream>
+#include <map>
+#include <regex>
+#include <set>
 #include <string>
 
 namespace {
@@ -20,6 +23,45 @@ TEST(Pages, LinkToFilesAndHeadingsThatAreThere) { EXPECT_THAT(brokenLinks(SOURCE
 TEST(Pages, AreReachedFromTheReadme) { EXPECT_THAT(unreachedPages(SOURCE_FOLDER), IsEmpty()); }
 
 TEST(Pages, NamePlacesThatAreThere) { EXPECT_THAT(missingPlaces(SOURCE_FOLDER), IsEmpty()); }
+
+TEST(Pages, NameTestsThatAreThere) { EXPECT_THAT(missingTests(SOURCE_FOLDER), IsEmpty()); }
+
+/// By their numbers, each with the text up to the next.
+std::map<int, std::string> promisesOf(fs::path const& page) {
+    std::regex const numbered(R"((\d+)\. \*\*.*)");
+    std::map<int, std::string> promises;
+    std::ifstream in(page);
+    int number = 0;
+    for (std::string line; std::getline(in, line);) {
+        if (std::smatch match; std::regex_match(line, match, numbered))
+            number = std::stoi(match[1]);
+        else if (!line.starts_with("   "))
+            number = 0;
+        if (number > 0)
+            promises[number] += line;
+    }
+    return promises;
+}
+
+TEST(Security, HasATestForEachOfItsSixteenPromises) {
+    auto const promises = promisesOf(SOURCE_FOLDER "/docs/security.md");
+    EXPECT_EQ(promises.size(), 16U);
+    std::set<std::string> const tests = declaredTests(SOURCE_FOLDER);
+    for (auto const& [number, text] : promises)
+        EXPECT_TRUE(std::ranges::any_of(tests, [&](std::string const& test) {
+            return text.find('`' + test + '`') != std::string::npos;
+        })) << number;
+}
+
+TEST(Security, NamesTheTargetOfEveryDoor) {
+    Page const page(fs::path(SOURCE_FOLDER) / "docs/security.md");
+    for (fs::directory_entry const& entry : fs::directory_iterator(fs::path(SOURCE_FOLDER) / "fuzz")) {
+        std::string const name = "fuzz/" + entry.path().filename().string();
+        if (entry.path().extension() == ".cpp" && name != "fuzz/replay_main.cpp") {
+            EXPECT_EQ(std::ranges::count(page.places(), name), 1) << name;
+        }
+    }
+}
 
 TEST(Readme, NamesEveryFolderOfTheLibraryAndThePrograms) {
     Page const readme(fs::path(SOURCE_FOLDER) / "README.md");
@@ -68,6 +110,13 @@ TEST_F(MadePages, AreFoundWrongWhereTheyNamePlacesThatAreNotThere) {
     write("README.md", "`docs/a.md` `docs/` `docs/b.md` `docs/NAME.md` `fuzz/corpus`\n");
     write("docs/a.md", "");
     EXPECT_THAT(missingPlaces(folder_.path()), ElementsAre("README.md: docs/b.md", "README.md: fuzz/corpus"));
+}
+
+TEST_F(MadePages, AreFoundWrongWhereTheyNameTestsThatAreNotThere) {
+    fs::create_directory(folder_ / "tests");
+    write("README.md", "`Frames.AreRead` `Frames.AreWritten`, `Frames::AreRead` Frames.AreGone\n");
+    write("tests/a_test.cpp", "TEST_F(Frames,\n       AreRead) {}\nTEST(Frame, sAreWritten) {}\n");
+    EXPECT_THAT(missingTests(folder_.path()), ElementsAre("README.md: Frames.AreWritten"));
 }
 
 } // namespace
