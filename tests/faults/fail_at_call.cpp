@@ -1,8 +1,9 @@
 // Loaded into a program ahead of the C library: the call of a given number in a class of calls fails, or the
 // process is killed in front of it as kill -9 would. Calls count from the beginning of main to its end, over
 // all processes that come of it. The environment says which:
-//     FAULT        CLASS:ERROR:NUMBER, such as write:28:3; the error 0 kills; a "+" behind it fails all later
-//     ones too FAULT_CALLS  a file of 8 bytes, where the calls of the class are counted
+//     FAULT        CLASS:ERROR:NUMBER, such as write:28:3; the error 0 kills; a "+" behind it fails all
+//                  later ones too. The class "durable" is all that make something durable or visible.
+//     FAULT_CALLS  a file of 8 bytes, where the calls of the class are counted
 // Syncing does nothing else: a process that is killed leaves what it wrote to the system.
 
 #include <atomic>
@@ -64,9 +65,16 @@ void readFault() {
     fault.calls = countersIn(std::getenv("FAULT_CALLS"));
 }
 
+bool isOfFault(char const* call) {
+    if (std::strcmp(fault.call, "durable") != 0)
+        return std::strcmp(call, fault.call) == 0;
+    return std::strcmp(call, "sync") == 0 || std::strcmp(call, "rename") == 0 ||
+           std::strcmp(call, "remove") == 0;
+}
+
 /// Whether this call of the class is to fail; errno says how then.
 bool fails(char const* call) {
-    if (!isCounting || !fault.calls || std::strcmp(call, fault.call) != 0)
+    if (!isCounting || !fault.calls || !isOfFault(call))
         return false;
     long const number = ++*fault.calls;
     if (fault.number == 0 || number < fault.number || (number > fault.number && !fault.stays))
@@ -153,6 +161,7 @@ FAILING(receive, ssize_t, recvmsg, (int peer, msghdr* message, int flags), (peer
 
 FAILING(open, int, mkstemp, (char* name), (name))
 FAILING(open, int, mkstemps, (char* name, int ending), (name, ending))
+FAILING(open, int, mkostemps, (char* name, int ending, int flags), (name, ending, flags))
 FAILING(open, int, mkdir, (char const* name, mode_t mode), (name, mode))
 FAILING(start, int, pipe, (int ends[2]), (ends))
 FAILING(start, int, pipe2, (int ends[2], int flags), (ends, flags))

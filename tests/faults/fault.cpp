@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
+#include <fstream>
+#include <stdexcept>
 
 namespace Faults {
 
@@ -38,6 +40,24 @@ std::vector<Fault> faultsOf(std::string const& call) {
     if (call == "start")
         return {{call, EAGAIN, 0, false}};
     return {{call, EIO, 0, false}, killed};
+}
+
+std::map<std::string, std::string> environmentOf(Fault const& fault, std::filesystem::path const& counter) {
+    // The loader goes on without a library that it does not find, and nothing would fail.
+    if (!std::filesystem::exists(FAIL_AT_CALL_LIBRARY))
+        throw std::runtime_error("there is no " FAIL_AT_CALL_LIBRARY);
+    std::ofstream(counter, std::ios::binary) << std::string(sizeof(long), '\0');
+    return {{"LD_PRELOAD", FAIL_AT_CALL_LIBRARY},
+            {"FAULT", fault.text()},
+            {"FAULT_CALLS", counter.string()},
+            // The sanitizer would refuse to be behind another library.
+            {"ASAN_OPTIONS", "verify_asan_link_order=0"}};
+}
+
+long callsIn(std::filesystem::path const& counter) {
+    long calls = 0;
+    std::ifstream(counter, std::ios::binary).read(reinterpret_cast<char*>(&calls), sizeof calls);
+    return calls;
 }
 
 } // namespace Faults

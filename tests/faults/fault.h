@@ -1,13 +1,15 @@
 #pragma once
 // A call that fails: which, how, and from when on.
 
+#include <filesystem>
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
 
 namespace Faults {
 
-/// The kinds of calls that can be made to fail, as fail_at_call.cpp names them.
+/// The kinds of calls that can be made to fail, as fail_at_call.cpp names them, each once.
 extern std::vector<std::string> const CALLS;
 
 struct Fault {
@@ -28,5 +30,9 @@ struct Fault {
 
 /// What calls of a kind can fail with, among them that the process is killed.
 std::vector<Fault> faultsOf(std::string const& call);
+
+/// The environment of a program in which that call fails. The counter is a file that is made anew.
+std::map<std::string, std::string> environmentOf(Fault const& fault, std::filesystem::path const& counter);
+long callsIn(std::filesystem::path const& counter);
 
 } // namespace Faults

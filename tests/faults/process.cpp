@@ -6,7 +6,6 @@
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
-#include <stdexcept>
 
 #include <fcntl.h>
 #include <sys/wait.h>
@@ -70,24 +69,6 @@ bool awaitEnd(pid_t process, int& status) {
 }
 
 } // namespace
-
-std::map<std::string, std::string> environmentOf(Fault const& fault, fs::path const& counter) {
-    // The loader goes on without a library that it does not find, and nothing would fail.
-    if (!fs::exists(FAIL_AT_CALL_LIBRARY))
-        throw std::runtime_error("there is no " FAIL_AT_CALL_LIBRARY);
-    std::ofstream(counter, std::ios::binary) << std::string(sizeof(long), '\0');
-    return {{"LD_PRELOAD", FAIL_AT_CALL_LIBRARY},
-            {"FAULT", fault.text()},
-            {"FAULT_CALLS", counter.string()},
-            // The sanitizer would refuse to be behind another library.
-            {"ASAN_OPTIONS", "verify_asan_link_order=0"}};
-}
-
-long callsIn(fs::path const& counter) {
-    long calls = 0;
-    std::ifstream(counter, std::ios::binary).read(reinterpret_cast<char*>(&calls), sizeof calls);
-    return calls;
-}
 
 Ended runWith(Fault const& fault, fs::path const& program, std::vector<std::string> arguments,
               fs::path const& folder) {

@@ -4,7 +4,6 @@
 #include "tests/faults/fault.h"
 
 #include <filesystem>
-#include <map>
 
 namespace Faults {
 
@@ -17,10 +16,6 @@ struct Ended {
     long calls = 0;
     bool isLate = false;
 };
-
-/// The environment of a program in which that call fails. The counter is a file that is made anew.
-std::map<std::string, std::string> environmentOf(Fault const& fault, std::filesystem::path const& counter);
-long callsIn(std::filesystem::path const& counter);
 
 /// Runs it in the folder. What it writes and its count stand in files beside the folder meanwhile. After a
 /// minute it is late and killed.

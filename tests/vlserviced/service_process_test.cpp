@@ -2,6 +2,7 @@
 #include "tests/vlserviced/service_process.h"
 
 #include "programs/base/error.h"
+#include "tests/faults/fault.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
@@ -147,11 +148,8 @@ protected:
         return stored ? folder / "packs.db" : fs::path();
     }
     /// A service that is killed at its call of that number; 0 lets it live.
-    static ServiceProcess::Environment killingAt(int call) {
-        return {{"LD_PRELOAD", KILL_AT_CALL_LIBRARY},
-                {"KILL_AT_CALL", std::to_string(call)},
-                // The sanitizer would refuse to be behind another library.
-                {"ASAN_OPTIONS", "verify_asan_link_order=0"}};
+    ServiceProcess::Environment killingAt(int call) const {
+        return Faults::environmentOf({"durable", 0, call}, folder_ / "calls");
     }
 
     void acknowledge(std::string const& what) {
