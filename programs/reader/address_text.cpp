@@ -36,10 +36,10 @@ bool hasDigit(std::string_view line) { return line.find_first_of("0123456789") !
 
 /// Letters, and the number of a house or of a box.
 bool isStreet(std::string_view line) {
-    auto const isLetter = [](unsigned char c) {
+    auto const isAlphabetic = [](unsigned char c) {
         return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c >= 0x80;
     };
-    return hasDigit(line) && std::count_if(line.begin(), line.end(), isLetter) >= 3;
+    return hasDigit(line) && std::count_if(line.begin(), line.end(), isAlphabetic) >= 3;
 }
 
 } // namespace

@@ -69,12 +69,12 @@ FontFile::FontFile(std::string file) : file_(std::move(file)) {
     font_.reset(hb_font_create(face.get()));
     hb_font_set_scale(font_.get(), 1000, 1000);
     hb_font_extents_t extents{};
-    std::optional<hb_codepoint_t> const letter = glyphOf(font_.get(), U'M');
-    if (!letter || !hb_font_get_h_extents(font_.get(), &extents))
+    std::optional<hb_codepoint_t> const capital = glyphOf(font_.get(), U'M');
+    if (!capital || !hb_font_get_h_extents(font_.get(), &extents))
         fail();
     ascent_ = extents.ascender;
     descent_ = extents.descender;
-    advance_ = hb_font_get_glyph_h_advance(font_.get(), *letter);
+    advance_ = hb_font_get_glyph_h_advance(font_.get(), *capital);
     if (advance_ <= 0)
         fail();
 }

@@ -194,16 +194,16 @@ void sampleGaps(Page const& page, std::vector<OpenLine> const& lines, BlankWidth
         }
 }
 
-/// The size of most of the line's letters.
+/// The size of most of the line's characters.
 int mainSize(Page const& page, OpenLine const& line) {
-    std::map<int, std::size_t> lettersOfSizes;
+    std::map<int, std::size_t> charactersOfSizes;
     int main = 0;
     std::size_t most = 0;
     for (PlacedWord const& placed : line.words) {
         Word const& word = page.words[placed.index];
-        std::size_t const letters = lettersOfSizes[word.size] += word.text.size();
-        if (letters > most) {
-            most = letters;
+        std::size_t const characters = charactersOfSizes[word.size] += word.text.size();
+        if (characters > most) {
+            most = characters;
             main = word.size;
         }
     }

@@ -27,7 +27,7 @@ constexpr char const* OTHER_WAYS = "written in another way";
 
 /// A mark this far outside of its zone was meant to be in it, in 1/100 mm.
 constexpr int BEYOND = 2000;
-constexpr std::size_t MIN_LABEL_LETTERS = 4;
+constexpr std::size_t MIN_LABEL_CHARACTERS = 4;
 
 /// A match in some writing of a text: the lines that it takes, counted from 0.
 struct LineHit {
@@ -76,10 +76,10 @@ std::string labelIn(std::string const& pattern) {
 
 /// Whether there are words in the label.
 bool isTelling(std::string const& label) {
-    std::size_t letters = 0;
+    std::size_t characters = 0;
     for (std::string const& literal : Patterns::literalsOf(label))
-        letters += literal.size();
-    return letters >= MIN_LABEL_LETTERS;
+        characters += literal.size();
+    return characters >= MIN_LABEL_CHARACTERS;
 }
 
 Box grown(Cfg::Rect const& at) {

@@ -54,10 +54,10 @@ std::optional<Parts> partsOf(Text const& text) {
 bool isBesideNumber(Text const& text) {
     constexpr std::ptrdiff_t LONGEST_CURRENCY = 5;
     constexpr std::u32string_view ALLOWED = U"+()[].,:*=%";
-    auto const isLetter = [](char32_t c) { return u_isalpha(static_cast<UChar32>(c)); };
-    return std::count_if(text.begin(), text.end(), isLetter) <= LONGEST_CURRENCY &&
+    auto const isAlphabetic = [](char32_t c) { return u_isalpha(static_cast<UChar32>(c)); };
+    return std::count_if(text.begin(), text.end(), isAlphabetic) <= LONGEST_CURRENCY &&
            std::all_of(text.begin(), text.end(), [&](char32_t c) {
-               return isLetter(c) || isBlank(c) || isMinus(c) || ALLOWED.find(c) != ALLOWED.npos ||
+               return isAlphabetic(c) || isBlank(c) || isMinus(c) || ALLOWED.find(c) != ALLOWED.npos ||
                       u_charType(static_cast<UChar32>(c)) == U_CURRENCY_SYMBOL;
            });
 }

@@ -10,12 +10,12 @@
 namespace Reader {
 namespace {
 
-/// The part of a word's box that some of its letters take, as if all were equally wide.
+/// The part of a word's box that some of its characters take, as if all were equally wide.
 Box partOf(Word const& word, std::size_t begin, std::size_t end) {
     std::string_view const text = word.text;
-    double const letters = static_cast<double>(Base::characterCount(text));
-    double const from = static_cast<double>(Base::characterCount(text.substr(0, begin))) / letters;
-    double const to = static_cast<double>(Base::characterCount(text.substr(0, end))) / letters;
+    double const characters = static_cast<double>(Base::characterCount(text));
+    double const from = static_cast<double>(Base::characterCount(text.substr(0, begin))) / characters;
+    double const to = static_cast<double>(Base::characterCount(text.substr(0, end))) / characters;
     return partAlong(word.box, word.turn, from, to);
 }
 
@@ -97,22 +97,22 @@ void ZoneText::addLine(Page const& page, Line const& line) {
 /// Adds the line's words to the text and tells where they are.
 ZoneText::TextLine ZoneText::lineOf(Page const& page, Line const& line) {
     TextLine result{{}, 0, line.size, frameOf(line.box, line.turn)};
-    std::size_t lettersLeft = MAX_LINE_LENGTH;
+    std::size_t charactersLeft = MAX_LINE_LENGTH;
     for (LineWord const& lineWord : line.words) {
         Word const& word = page.words[lineWord.word];
         bool const blank = !result.pieces.empty() && lineWord.blankBefore;
-        if (lettersLeft <= (blank ? 1U : 0U))
+        if (charactersLeft <= (blank ? 1U : 0U))
             break;
         if (blank) {
             text_ += ' ';
             ++result.length;
-            --lettersLeft;
+            --charactersLeft;
         }
-        std::string_view const text = Base::firstCharacters(word.text, lettersLeft);
+        std::string_view const text = Base::firstCharacters(word.text, charactersLeft);
         text_ += text;
         result.pieces.push_back({result.length, result.length + text.size(), &word});
         result.length += text.size();
-        lettersLeft -= Base::characterCount(text);
+        charactersLeft -= Base::characterCount(text);
     }
     return result;
 }
