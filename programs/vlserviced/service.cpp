@@ -207,8 +207,8 @@ private:
     }
 
     std::chrono::hours statusUpdateTime() const {
-        long long const hours =
-            settings_.values("", Cfg::Inet::PART_NAME).get("status_update_hours").intOrZero();
+        Cfg::Inet const inet(settings_.values("", Cfg::Inet::PART_NAME), false, false);
+        int const hours = inet.value<Cfg::InetFieldIdxs::StatusUpdateHours>();
         return std::chrono::hours(hours > 0 ? hours : 1);
     }
 

@@ -8,28 +8,6 @@
 #include <stdexcept>
 #include <tuple>
 
-namespace {
-
-constexpr std::uint32_t MODE_WIDTH = 0xFF;
-/// Two bits that exclude each other.
-constexpr std::uint32_t MODE_EXCLUSIVE = 0x02 | 0x08;
-/// A mode that is set needs one of these.
-constexpr std::uint32_t MODE_REQUIRED = 0x01 | 0x02 | 0x08 | 0x80;
-constexpr std::uint32_t CLIENT_MODE_REQUIRED = 0x01 | 0x02 | 0x10;
-
-bool isPlausible(std::uint32_t bits, std::uint32_t required) {
-    return bits <= MODE_WIDTH && (bits == 0 || (bits & required) != 0);
-}
-
-bool mayStand(Cfg::ProcessMode mode) {
-    bool const excludesItself = (mode.bits() & MODE_EXCLUSIVE) == MODE_EXCLUSIVE;
-    return !excludesItself && isPlausible(mode.bits(), MODE_REQUIRED);
-}
-
-bool mayStand(Cfg::ProcessModeClient mode) { return isPlausible(mode.bits(), CLIENT_MODE_REQUIRED); }
-
-} // namespace
-
 namespace json {
 
 /// Words of flag bits: what is no integer reads as 0, and they are written unsigned.
@@ -39,7 +17,7 @@ struct Form<T> {
     static bool fits(Value const& node) { return node.isInt(); }
     static T read(Value const& node) {
         T const mode(static_cast<std::uint32_t>(node.toInt()));
-        if (!mayStand(mode))
+        if (!T::RULES.allows(mode.bits()))
             throw std::runtime_error("Invalid value for process_mode!");
         return mode;
     }

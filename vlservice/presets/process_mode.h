@@ -6,7 +6,26 @@
 
 namespace Cfg {
 
+/// What holds for a word of flag bits in a pack preset.
+struct ModeRules {
+    static constexpr std::uint32_t WIDTH = 0xFF;
+
+    /// Bits that exclude each other; none when 0.
+    std::uint32_t exclusive;
+    /// Bits of which a mode that is set needs one.
+    std::uint32_t required;
+
+    constexpr bool excludesItself(std::uint32_t bits) const {
+        return exclusive != 0 && (bits & exclusive) == exclusive;
+    }
+    constexpr bool allows(std::uint32_t bits) const {
+        return bits == 0 || (bits <= WIDTH && !excludesItself(bits) && (bits & required) != 0);
+    }
+};
+
 struct ProcessMode {
+    static constexpr ModeRules RULES{.exclusive = 0x02 | 0x08, .required = 0x01 | 0x02 | 0x08 | 0x80};
+
     constexpr ProcessMode() = default;
     /// Any bits: nothing is checked here.
     explicit constexpr ProcessMode(std::uint32_t bits) : bits_(bits) {}
@@ -20,6 +39,8 @@ private:
 
 /// The part of it that concerns the client program.
 struct ProcessModeClient {
+    static constexpr ModeRules RULES{.exclusive = 0, .required = 0x01 | 0x02 | 0x10};
+
     constexpr ProcessModeClient() = default;
     /// Any bits: nothing is checked here.
     explicit constexpr ProcessModeClient(std::uint32_t bits) : bits_(bits) {}

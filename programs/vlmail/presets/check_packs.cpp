@@ -48,44 +48,43 @@ bool usedByDefault(std::string const& name, PresetsDocument const& document) {
                        [&](auto const& element) { return element.value.packPresetName() == name; });
 }
 
-/// A word of flags with the rules that the library has for it.
 struct ModeRow {
     char const* key;
-    long long exclusive;
-    long long required;
-    char const* requiredInWords;
+    Cfg::ModeRules rules;
 };
 
-constexpr long long MODE_WIDTH = 0xFF;
-constexpr ModeRow MODES[] = {
-    {"process_mode", 2 + 8, 1 + 2 + 8 + 128, "the bits 1, 2, 8 and 128"},
-    {"process_mode_client", 0, 1 + 2 + 16, "the bits 1, 2 and 16"},
+ModeRow const MODES[] = {
+    {"process_mode", Cfg::ProcessMode::RULES},
+    {"process_mode_client", Cfg::ProcessModeClient::RULES},
 };
 
-bool isRefused(ModeRow const& row, json::Value const& value) {
-    try {
-        Cfg::PackPreset(json::Object{{"name", ""}, {row.key, value}}, {});
-        return false;
-    } catch (std::exception const&) {
-        return true;
-    }
+/// "the bits 1, 2 and 16"
+std::string inWords(std::uint32_t bits) {
+    std::string words;
+    for (std::uint32_t bit = 1; bit != 0 && bit <= bits; bit <<= 1)
+        if (bits & bit)
+            words += (words.empty() ? "" : (bits >> 1) < bit ? " and " : ", ") + std::to_string(bit);
+    return "the bits " + words;
 }
 
-std::string whyRefused(ModeRow const& row, long long mode) {
-    if (mode < 0 || mode > MODE_WIDTH)
+/// Empty when the mode may stand.
+std::string whyRefused(Cfg::ModeRules const& rules, long long mode) {
+    // As it is read: cut to 32 bits.
+    auto const bits = static_cast<std::uint32_t>(mode);
+    if (rules.allows(bits))
+        return {};
+    if (bits > Cfg::ModeRules::WIDTH)
         return "it has more than eight bits";
-    if (row.exclusive != 0 && (mode & row.exclusive) == row.exclusive)
-        return "the bits 2 and 8 exclude each other";
-    return std::string("it has none of ") + row.requiredInWords;
+    if (rules.excludesItself(bits))
+        return inWords(rules.exclusive) + " exclude each other";
+    return "it has none of " + inWords(rules.required);
 }
 
 /// Whether a letterhead is stored as its id alone.
 bool hasFlag(json::Object const& letterhead) {
-    for (char const* flag :
-         {"skip_letters", "skip_attachments", "repeat_last_page", "apply_first_grouped_only", "on_top"})
-        if (letterhead.get(flag).isTrue())
-            return true;
-    return false;
+    return std::ranges::any_of(Cfg::LetterheadInf::keys().rows, [&](json::KeyRow const& row) {
+        return row.form.type == json::KeyType::Flag && letterhead.get(row.name).isTrue();
+    });
 }
 
 /// The keys that reading a letterhead keeps and writing it loses.
@@ -140,10 +139,11 @@ void checkProcessModes(PresetsDocument const& document, Findings& findings) {
     for (ListedPackPreset const& pack : document.packPresets()) {
         for (ModeRow const& row : MODES) {
             json::Value const mode = pack.json.get(row.key);
-            if (mode.isInt() && isRefused(row, mode))
-                findings.add(
-                    ProcessModeRefused, pack.place / row.key,
-                    {std::to_string(mode.toInt()), whyRefused(row, mode.toInt()), row.requiredInWords});
+            if (!mode.isInt())
+                continue;
+            if (std::string const why = whyRefused(row.rules, mode.toInt()); !why.empty())
+                findings.add(ProcessModeRefused, pack.place / row.key,
+                             {std::to_string(mode.toInt()), why, inWords(row.rules.required)});
         }
     }
 }

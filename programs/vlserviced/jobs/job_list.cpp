@@ -9,16 +9,21 @@
 namespace VlServiced {
 namespace {
 
+template<Cfg::InetFieldIdxs I>
+int hours(Cfg::Inet const& inet) {
+    return inet.value<I>();
+}
+
 /// How long a job may stay in a state, by the settings of its node.
 struct AlarmRule {
     JobState state;
-    char const* hoursKey;
+    int (*hours)(Cfg::Inet const&);
     char const* text;
 };
 constexpr AlarmRule ALARM_RULES[] = {
-    {JobState::Submitted, "submitted_alarm_hours",
+    {JobState::Submitted, hours<Cfg::InetFieldIdxs::SubmittedAlarmHours>,
      "nobody has taken the container from the upload folder for "},
-    {JobState::Lodged, "lodged_alarm_hours", "the carrier has not reported for "},
+    {JobState::Lodged, hours<Cfg::InetFieldIdxs::LodgedAlarmHours>, "the carrier has not reported for "},
 };
 
 /// Tells what has taken too long. Jobs of one node are asked about together, so each node's settings are
@@ -32,23 +37,24 @@ public:
                                        [&](AlarmRule const& r) { return r.state == job.state; });
         if (rule == std::end(ALARM_RULES))
             return {};
-        long long const allowed = settingsOf(job.cfgId).get(rule->hoursKey).intOrZero();
+        long long const allowed = rule->hours(settingsOf(job.cfgId));
         long long const waited = (now_ - job.changedAt) / 3600;
         return allowed > 0 && waited >= allowed ? rule->text + std::to_string(waited) + " hours"
                                                 : std::string();
     }
 
 private:
-    json::Object const& settingsOf(std::string const& node) {
+    Cfg::Inet const& settingsOf(std::string const& node) {
         auto const found = byNode_.find(node);
         if (found != byNode_.end())
             return found->second;
-        return byNode_.emplace(node, settings_.values(node, Cfg::Inet::PART_NAME)).first->second;
+        return byNode_.emplace(node, Cfg::Inet(settings_.values(node, Cfg::Inet::PART_NAME), false, false))
+            .first->second;
     }
 
     SettingsService const& settings_;
     long long now_;
-    std::map<std::string, json::Object> byNode_;
+    std::map<std::string, Cfg::Inet> byNode_;
 };
 
 std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
