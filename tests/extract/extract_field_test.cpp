@@ -341,11 +341,11 @@ TEST(Extraction, TakesTheGroupThatTookPartOfSeveralWithTheName) {
 }
 
 TEST(Extraction, LeavesTheTextAndLogsNothingWithoutAMatch) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     std::string text = "abc";
     EXPECT_FALSE(finding("(?<VAL>x)").extractField(text));
     EXPECT_EQ(text, "abc");
-    EXPECT_THAT(log.lines(), IsEmpty());
+    EXPECT_THAT(log.texts(), IsEmpty());
 }
 
 TEST(Extraction, MeasuresTheWholeMatchInBytes) {
@@ -442,21 +442,21 @@ TEST(ExtractionPatterns, RegardCaseUnlessTheySayOtherwise) {
 
 TEST(ExtractionFailures, LogABadPatternEachTimeAndYieldTheDefault) {
     auto const field = finding("(?<VAL>a", R"("default_value":"d")");
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     EXPECT_EQ(extracted(field, "a"), "\"d\"");
     EXPECT_EQ(extracted(field, "a"), "\"d\"");
-    EXPECT_THAT(log.lines(), ElementsAre(StartsWith("3 Extract field failed with "),
+    EXPECT_THAT(log.texts(), ElementsAre(StartsWith("3 Extract field failed with "),
                                          StartsWith("3 Extract field failed with ")));
 }
 
 TEST(ExtractionFailures, LogAPatternThatTheEngineWouldNeverParse) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     for (char const* const pattern :
          {"a?+(?#why)(?<VAL>b)", "a*+ (?#why)b", "a++(?#x)(?#y)b", "a{1}+(?#why)b", "a*?+(?#why)b"})
         EXPECT_EQ(extracted(finding(pattern), "ab"), "nothing") << pattern;
-    EXPECT_THAT(log.lines(),
+    EXPECT_THAT(log.texts(),
                 Each(StartsWith("3 Extract field failed with A comment stands behind a possessive")));
-    EXPECT_EQ(log.lines().size(), 5u);
+    EXPECT_EQ(log.texts().size(), 5u);
 }
 
 TEST(ExtractionPatterns, TakeCommentsAndPossessiveRepeatsApartFromEachOther) {
@@ -465,7 +465,7 @@ TEST(ExtractionPatterns, TakeCommentsAndPossessiveRepeatsApartFromEachOther) {
 }
 
 TEST(ExtractionFailures, LogTextAndPatternsThatAreNotUtf8) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     std::string const line =
         "3 Extract field failed with Invalid UTF-8 sequence encountered while trying to encode "
         "UTF-32 character";
@@ -473,7 +473,7 @@ TEST(ExtractionFailures, LogTextAndPatternsThatAreNotUtf8) {
     EXPECT_FALSE(finding("(?<VAL>\\d)").extractField(text));
     EXPECT_EQ(text, "\xff 1");
     EXPECT_FALSE(finding("(?<VAL>\\d)\xe2\x82").extractField(text));
-    EXPECT_THAT(log.lines(), ElementsAre(line, line));
+    EXPECT_THAT(log.texts(), ElementsAre(line, line));
 }
 
 TEST(ExtractionFailures, ComeOnlyFromTextThatIsLookedAt) {
@@ -481,7 +481,7 @@ TEST(ExtractionFailures, ComeOnlyFromTextThatIsLookedAt) {
 }
 
 TEST(ExtractionFailures, LogAFailingMeasureAndYieldTheDefault) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     std::string text = "a";
     auto const field = finding("(?<VAL>a)", R"("default_value":"d")");
     auto const value = field.extractField(
@@ -489,23 +489,23 @@ TEST(ExtractionFailures, LogAFailingMeasureAndYieldTheDefault) {
     ASSERT_TRUE(value);
     EXPECT_EQ(typed(*value), plain("d"));
     EXPECT_NE(value.get(), field.validation().defaultValue());
-    EXPECT_THAT(log.lines(), ElementsAre("3 Extract field failed with no page"));
+    EXPECT_THAT(log.texts(), ElementsAre("3 Extract field failed with no page"));
 }
 
 TEST(ExtractionFailures, LetPassWhatIsNoException) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     std::string text = "a";
     EXPECT_THROW(finding("(?<VAL>a)")
                      .extractField(text, [](std::string&, auto, auto) -> unsigned long long { throw 5; }),
                  int);
-    EXPECT_THAT(log.lines(), IsEmpty());
+    EXPECT_THAT(log.texts(), IsEmpty());
 }
 
 TEST(ExtractionFailures, LogRunawayBacktracking) {
-    LoggedLines const log;
+    VLServiceTest::LogLines const log;
     std::string text(40, 'a');
     EXPECT_FALSE(finding("(?<VAL>(a|aa)*b)").extractField(text));
-    EXPECT_THAT(log.lines(), ElementsAre(StartsWith("3 Extract field failed with ")));
+    EXPECT_THAT(log.texts(), ElementsAre(StartsWith("3 Extract field failed with ")));
 }
 
 TEST(FieldCopies, OwnTheirValidator) {

@@ -2,8 +2,9 @@
 // What the tests of definitions, zones and presets share.
 
 #include "tests/support/json_helpers.h"
+#include "tests/support/log_lines.h"
+#include "tests/support/time_zone.h"
 #include "vlservice/extract/extract_field.h"
-#include "vlservice/platform/log.h"
 
 #include <gmock/gmock.h>
 
@@ -15,39 +16,6 @@
 #include <string>
 #include <utility>
 #include <vector>
-
-/// The lines that are logged during its life, as "<priority> text".
-class LoggedLines {
-public:
-    LoggedLines()
-        : before_(Log::setSink([this](LogPriority priority, std::string const& line) {
-              lines_.push_back(std::to_string(priority) + " " + line);
-          })) {}
-    ~LoggedLines() { Log::setSink(std::move(before_)); }
-    LoggedLines(LoggedLines const&) = delete;
-    LoggedLines& operator=(LoggedLines const&) = delete;
-
-    std::vector<std::string> const& lines() const { return lines_; }
-
-private:
-    std::vector<std::string> lines_;
-    Log::Sink before_;
-};
-
-/// Local time of a zone; UTC again behind it.
-class TimeZone {
-public:
-    explicit TimeZone(char const* zone) { set(zone); }
-    ~TimeZone() { set("UTC"); }
-    TimeZone(TimeZone const&) = delete;
-    TimeZone& operator=(TimeZone const&) = delete;
-
-private:
-    static void set(char const* zone) {
-        setenv("TZ", zone, 1);
-        tzset();
-    }
-};
 
 inline long long utc(int year, int month, int day, int hour = 0, int minute = 0, int second = 0) {
     std::tm time{};

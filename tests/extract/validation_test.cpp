@@ -346,7 +346,7 @@ TEST(NumberValidation, DoesNotHoldTheDefaultAgainstTheLimits) {
 }
 
 class DateValidation : public testing::Test {
-    TimeZone zone_{"UTC"};
+    VLServiceTest::TimeZone zone_{"UTC"};
 };
 
 TEST_F(DateValidation, ReadsWhatItsDefaultPatternAccepts) {
@@ -507,7 +507,7 @@ TEST_F(DateValidation, ReadsLimitsAndDefaultByItsOwnPattern) {
 }
 
 TEST(DateValidationInBerlin, CountsTheStandardOffset) {
-    TimeZone const zone("Europe/Berlin");
+    VLServiceTest::TimeZone const zone("Europe/Berlin");
     EXPECT_EQ(validate(dates(), "05/03/21"), date(utc(2021, 3, 4, 23)));
     EXPECT_EQ(validate(dates(), "05/07/21"), date(utc(2021, 7, 4, 23)));
 }
@@ -542,7 +542,7 @@ TEST(DefaultValue, IsNotBuiltForANewFieldOfPositivePriority) {
 }
 
 TEST(ValidatorWriting, WritesKeysInOrderAndLeavesOutDefaults) {
-    TimeZone const zone("UTC");
+    VLServiceTest::TimeZone const zone("UTC");
     struct {
         char const* keys;
         char const* written;

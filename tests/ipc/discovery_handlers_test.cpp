@@ -2,8 +2,8 @@
 
 #include "tests/ipc/discovery_access.h"
 #include "tests/ipc/failing_syscalls.h"
-#include "tests/ipc/log_capture.h"
 #include "tests/ipc/recording_processor.h"
+#include "tests/support/log_lines.h"
 
 #include "vlservice/ipc/gui_fwd.h"
 #include "vlservice/json/json_text.h"
@@ -18,7 +18,7 @@
 
 using namespace testing;
 using Access = Ipc::DiscoveryTestAccess;
-using Line = LogCapture::Line;
+using Line = VLServiceTest::LogLine;
 using boost::posix_time::hours;
 using boost::posix_time::seconds;
 
@@ -37,7 +37,7 @@ protected:
     boost::asio::io_context io;
     /// The first of its kind makes the reactor, which needs files.
     boost::asio::deadline_timer reactorMaker{io};
-    LogCapture log;
+    VLServiceTest::LogLines log;
     std::vector<std::string> received;
 
     std::unique_ptr<Ipc::DiscoveryBase> makeBase(bool ipv4 = true) {
@@ -190,8 +190,8 @@ TEST_P(DiscoveryRefusing, LogsAndDropsIt) {
     Access::receive(*base, GetParam().datagram);
     EXPECT_THAT(received, IsEmpty());
     ASSERT_EQ(log.lines.size(), 1u);
-    EXPECT_EQ(log.lines[0].first, 3);
-    EXPECT_THAT(log.lines[0].second, StartsWith(std::string(BAD_MESSAGE) + GetParam().reason));
+    EXPECT_EQ(log.lines[0].priority, 3);
+    EXPECT_THAT(log.lines[0].text, StartsWith(std::string(BAD_MESSAGE) + GetParam().reason));
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -275,7 +275,7 @@ TEST_F(DiscoveryHandlers, ReceivingAllGoesOnAfterGarbageAndAfterWhatTheFunctionT
     EXPECT_THAT(received, ElementsAre(R"({"n":1})", R"({"n":2})"));
     ASSERT_EQ(log.lines.size(), 2u);
     EXPECT_EQ(log.lines[0], (Line{3, std::string(BAD_MESSAGE) + "no room"}));
-    EXPECT_THAT(log.lines[1].second, StartsWith(std::string(BAD_MESSAGE) + "JSON error: "));
+    EXPECT_THAT(log.lines[1].text, StartsWith(std::string(BAD_MESSAGE) + "JSON error: "));
 }
 
 TEST_F(DiscoveryHandlers, ReceivingAllLogsAFloodOfGarbageInAFewLines) {

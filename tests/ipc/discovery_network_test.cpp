@@ -1,8 +1,8 @@
 // Discovery over a real network: client and service each in a namespace of its own, joined by virtual
 // interfaces.
 
-#include "tests/ipc/log_capture.h"
 #include "tests/ipc/recording_processor.h"
+#include "tests/support/log_lines.h"
 #include "tests/support/two_networks.h"
 
 #include "vlservice/ipc/discovery_cli.h"
@@ -65,7 +65,7 @@ private:
 class DiscoveryOverANetwork : public Test {
 protected:
     TwoNetworks networks;
-    LogCapture log;
+    VLServiceTest::LogLines log;
     std::shared_ptr<RecordingProcessor> processor = std::make_shared<RecordingProcessor>();
     std::chrono::steady_clock::duration searched{};
 

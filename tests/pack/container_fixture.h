@@ -2,7 +2,7 @@
 // A folder of its own with one container in it, verbs to write and damage the file, and the layouts byte by
 // byte.
 
-#include "tests/pack/log_lines.h"
+#include "tests/support/log_lines.h"
 #include "tests/support/temporary_folder.h"
 #include "vlservice/pack/pack_wrapper.h"
 
@@ -16,6 +16,9 @@
 #include <optional>
 #include <string>
 #include <vector>
+
+using VLServiceTest::LogLine;
+using VLServiceTest::LogLines;
 
 inline std::string littleEndian(std::uint64_t number, int bytes = 8) {
     std::string text;

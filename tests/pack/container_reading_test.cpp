@@ -143,9 +143,8 @@ TEST_F(ReadingContainers, LogAnIndexThatWouldBeginBeforeTheFileHoweverFar) {
     std::int64_t const gigabytes4 = std::int64_t{1} << 32;
     std::string trailing = trailingLayout(PAGE_1, indexOf(item("1", 0, PAGE_1)));
     std::string leading = leadingLayout(PAGE_1, indexOf(item("1", 8, PAGE_1)));
-    for (std::int64_t position :
-         {std::int64_t{-1}, 1 - gigabytes4, -gigabytes4, -gigabytes4 - 1, -2 * gigabytes4,
-          std::numeric_limits<std::int64_t>::min()}) {
+    for (std::int64_t position : {std::int64_t{-1}, 1 - gigabytes4, -gigabytes4, -gigabytes4 - 1,
+                                  -2 * gigabytes4, std::numeric_limits<std::int64_t>::min()}) {
         std::string const number = littleEndian(static_cast<std::uint64_t>(position));
         write(trailing.replace(trailing.size() - 8, 8, number));
         EXPECT_THAT(failToOpen(), ElementsAre(line)) << "trailing offset " << position;

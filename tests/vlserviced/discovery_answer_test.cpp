@@ -3,7 +3,7 @@
 
 #include "programs/vlmail/service/multicast_probe.h"
 #include "programs/vlmail/service/service_search.h"
-#include "tests/ipc/log_capture.h"
+#include "tests/support/log_lines.h"
 #include "tests/support/two_networks.h"
 #include "tests/vlserviced/json_help.h"
 
@@ -126,7 +126,7 @@ protected:
     static inline udp::endpoint const GROUP{boost::asio::ip::make_address("239.4.5.6"), 45677};
 
     TwoNetworks networks_;
-    LogCapture log_;
+    VLServiceTest::LogLines log_;
     boost::asio::io_context io_;
     boost::asio::executor_work_guard<boost::asio::io_context::executor_type> work_{io_.get_executor()};
     std::optional<VlServiced::DiscoveryAnswer> answer_;
