@@ -1,10 +1,12 @@
-// Words anywhere on a page, eight bytes each: made into lines, blocks and the text of a zone, of which lines
-// are joined, and which is then cut line by line.
+// Words anywhere on a page, eight bytes each: made into lines, blocks and the texts of zones, of which lines
+// are joined, and which are then cut line by line. The last sixteen bytes are the edges of a zone, too.
 #include "programs/reader/zone_text.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <cstdlib>
+#include <cstring>
 #include <set>
 #include <string>
 #include <vector>
@@ -34,6 +36,14 @@ Reader::Page pageOf(std::uint8_t const* data, std::size_t size) {
         page.words.push_back(word);
     }
     return page;
+}
+
+/// As settings may say it: anywhere.
+Reader::Box zoneOf(std::uint8_t const* data, std::size_t size) {
+    std::array<int, 4> edges{};
+    if (size >= sizeof edges)
+        std::memcpy(edges.data(), data + size - sizeof edges, sizeof edges);
+    return {edges[0], edges[1], edges[2], edges[3]};
 }
 
 /// Each word is on one line, or a copy of one that is; each line in one block.
@@ -86,5 +96,8 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     join(Reader::ZoneText::inside(page, layout, {0, 0, 21000, 29700}));
     cut(Reader::ZoneText::inside(page, layout, {0, 0, 21000, 29700}));
     cut(Reader::ZoneText::nearest(page, layout, {4500, 6200}));
+    Reader::Box const zone = zoneOf(data, size);
+    cut(Reader::ZoneText::inside(page, layout, zone));
+    cut(Reader::ZoneText::nearest(page, layout, {zone.left, zone.top}));
     return 0;
 }
