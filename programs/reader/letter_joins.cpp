@@ -41,7 +41,7 @@ bool isWithin(Box const& a, Box const& b, int distance) {
 }
 
 bool isOfOneHeight(Box const& a, Box const& b) {
-    auto const [smaller, larger] = std::minmax(a.height(), b.height());
+    auto const [smaller, larger] = std::minmax({a.height(), b.height()});
     return (larger - smaller) * 100LL <= static_cast<long long>(larger) * SAME_HEIGHT;
 }
 
