@@ -33,7 +33,8 @@ public:
 
         /// Whether a pattern was ended.
         bool isUp() const { return match_.isUp(); }
-        Clock::duration spent() const { return Clock::now() - begin_; }
+        /// A clock that was set back has not given time back.
+        Clock::duration spent() const { return std::max(Clock::now() - begin_, Clock::duration::zero()); }
 
     private:
         PatternTime& time_;

@@ -68,4 +68,22 @@ inline RawPdf onePage(std::string const& content, std::string const& resources =
     return pdf;
 }
 
+/// Forms of which each draws a line and the next one several times.
+inline std::string formTree(int depth, int width) {
+    RawPdf pdf = onePage("/X6 Do", "/XObject << /X6 6 0 R >>");
+    for (int form = 6; form < 6 + depth; ++form) {
+        std::string const next = "X" + std::to_string(form + 1);
+        std::string content = "BT /F 10 Tf 72 700 Td (Hello) Tj ET";
+        for (int i = 0; i < width; ++i)
+            content += " /" + next + " Do";
+        pdf.stream(form,
+                   "/Type /XObject /Subtype /Form /BBox [0 0 595 842] /Resources << /Font << /F 4 0 R >> "
+                   "/XObject << /" +
+                       next + ' ' + std::to_string(form + 1) + " 0 R >> >>",
+                   content);
+    }
+    pdf.stream(6 + depth, "/Type /XObject /Subtype /Form /BBox [0 0 595 842]", "");
+    return pdf.bytes();
+}
+
 } // namespace VLServiceTest

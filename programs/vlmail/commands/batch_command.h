@@ -47,12 +47,16 @@ struct WorkerOptions {
     }
 };
 
-inline void addWorkerOptions(Base::Command const& command, WorkerOptions& options) {
-    command.addCount("--jobs", options.jobs, "Processes to read with");
+inline void addLimitOptions(Base::Command const& command, WorkerOptions& options) {
     command.addCount("--document-seconds", options.seconds, "Processor time that a document may take")
         .showDefault();
     command.addCount("--document-memory", options.mebibytes, "MiB of memory that a document may take")
         .showDefault();
+}
+
+inline void addWorkerOptions(Base::Command const& command, WorkerOptions& options) {
+    command.addCount("--jobs", options.jobs, "Processes to read with");
+    addLimitOptions(command, options);
 }
 
 inline ExitStatus exitStatusOf(Outcome::End end) {

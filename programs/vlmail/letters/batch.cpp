@@ -92,27 +92,6 @@ ReadResult unpack(std::string bytes) {
     return result;
 }
 
-std::string inWords(JobFailure failure, JobLimits const& limits) {
-    auto const seconds = [&] {
-        std::string const milliseconds = std::to_string(limits.processor.count() % 1000);
-        return std::to_string(limits.processor.count() / 1000) +
-               (milliseconds == "0" ? "" : '.' + std::string(3 - milliseconds.size(), '0') + milliseconds);
-    };
-    switch (failure) {
-    case JobFailure::Died:
-        break;
-    case JobFailure::OutOfTime:
-        return "it took more than " + seconds() +
-               " s of processor time; print it to a new PDF, or give --document-seconds a larger number";
-    case JobFailure::OutOfMemory:
-        return "it took more than " + std::to_string(limits.memory >> 20) +
-               " MiB of memory; print it to a new PDF, or give --document-memory a larger number";
-    case JobFailure::NoMemory:
-        return "there is not enough memory for it; close other programs, or give --jobs a smaller number";
-    }
-    return "the reader broke down over it; the document is damaged, print it to a new PDF";
-}
-
 ReadResult unread(std::string const& file, JobFailure failure, JobLimits const& limits) {
     ReadResult result;
     result.reading.document = Base::validUtf8(std::filesystem::path(file).filename().string());
@@ -138,6 +117,27 @@ void runBatch(std::size_t count, Workers const& workers, BatchWatcher& watcher,
 }
 
 } // namespace
+
+std::string inWords(JobFailure failure, JobLimits const& limits) {
+    auto const seconds = [&] {
+        std::string const milliseconds = std::to_string(limits.processor.count() % 1000);
+        return std::to_string(limits.processor.count() / 1000) +
+               (milliseconds == "0" ? "" : '.' + std::string(3 - milliseconds.size(), '0') + milliseconds);
+    };
+    switch (failure) {
+    case JobFailure::Died:
+        break;
+    case JobFailure::OutOfTime:
+        return "it took more than " + seconds() +
+               " s of processor time; print it to a new PDF, or give --document-seconds a larger number";
+    case JobFailure::OutOfMemory:
+        return "it took more than " + std::to_string(limits.memory >> 20) +
+               " MiB of memory; print it to a new PDF, or give --document-memory a larger number";
+    case JobFailure::NoMemory:
+        return "there is not enough memory for it; close other programs, or give --jobs a smaller number";
+    }
+    return "the reader broke down over it; the document is damaged, print it to a new PDF";
+}
 
 void readBatch(std::vector<std::string> const& files, NodeSettings const& settings, Workers const& workers,
                Along const& along, BatchWatcher& watcher,

@@ -5,6 +5,7 @@
 #include "programs/vlmail/letters/worker_pool.h"
 
 #include <functional>
+#include <string>
 
 namespace VlMail {
 
@@ -21,6 +22,9 @@ public:
     /// Before the result of a document with so many letters is handed over.
     virtual void handsOver(std::size_t /*letters*/) {}
 };
+
+/// Why a document has no result and what to do, as the rest of a line.
+std::string inWords(JobFailure failure, JobLimits const& limits);
 
 /// Reads the files by the settings in worker processes and hands each result over in the order of the files.
 /// A document that brings its reader down, or takes more than it may, has that for its error.

@@ -1,6 +1,7 @@
 // Zones: where they lie, and whether they have something to do.
 #include "programs/patterns/pattern.h"
 #include "programs/vlmail/presets/checks.h"
+#include "programs/vlmail/presets/sheet.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
@@ -16,9 +17,6 @@ using enum FindingKind;
 // Pages in 1/100 mm.
 /// Any sheet of A4 or Letter, upright or not, lies within this length.
 constexpr int LONGEST_EDGE = 29700;
-/// The wider of both, upright.
-constexpr int UPRIGHT_WIDTH = 21590;
-constexpr int UPRIGHT_HEIGHT = 29700;
 /// Less than a short word in small print.
 constexpr int TINY = 200;
 

@@ -3,11 +3,13 @@
 #include "programs/base/millimetres.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/quoting.h"
+#include "programs/reader/address_text.h"
 #include "programs/reader/letters.h"
 #include "programs/reader/month_names.h"
 #include "programs/reader/number_reading.h"
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/presets/draft_labels.h"
+#include "programs/vlmail/presets/sheet.h"
 
 #include "vlservice/extract/extract_field.h"
 #include "vlservice/extract/extract_preset.h"
@@ -54,10 +56,17 @@ std::string textOf(Reader::Page const& page, Reader::Layout const& layout, Reade
 /// The window of an envelope, generously, in 1/100 mm.
 constexpr Box WINDOW{1000, 3000, 13000, 11000};
 
-bool mayBeAddress(Reader::Block const& block) {
+bool hasProse(Reader::Page const& page, Reader::Layout const& layout, Reader::Block const& block) {
+    for (std::size_t i = block.firstLine; i < block.endLine; ++i)
+        if (Reader::isProse(Reader::textOf(page, layout.lines[i])))
+            return true;
+    return false;
+}
+
+bool mayBeAddress(Reader::Page const& page, Reader::Layout const& layout, Reader::Block const& block) {
     std::size_t const lines = block.endLine - block.firstLine;
     return block.turn == Reader::Turn::Upright && lines >= 2 && lines <= 7 &&
-           WINDOW.contains(block.box.centre());
+           WINDOW.contains(block.box.centre()) && !hasProse(page, layout, block);
 }
 
 /// A line of smaller print right above the block.
@@ -99,7 +108,7 @@ std::optional<AddressSighting> addressOn(Reader::Page const& page, std::string c
         return block.box.distanceTo(Cfg::ExtractZone::DEF_MOST_PROBABLE_POINT);
     };
     for (Reader::Block const& block : layout.blocks)
-        if (mayBeAddress(block) && (!best || distance(block) < distance(*best)))
+        if (mayBeAddress(page, layout, block) && (!best || distance(block) < distance(*best)))
             best = &block;
     if (!best)
         return std::nullopt;
@@ -157,8 +166,12 @@ json::Array listOf(json::Object const& element) {
     return list;
 }
 
+/// Sheets are rounded, a little cut off or other than what letters are printed on.
 json::Object rectOf(Box const& box) {
-    return {{"left", box.left}, {"top", box.top}, {"right", box.right}, {"bottom", box.bottom}};
+    return {{"left", std::max(box.left, 0)},
+            {"top", std::max(box.top, 0)},
+            {"right", std::min(box.right, UPRIGHT_WIDTH)},
+            {"bottom", std::min(box.bottom, UPRIGHT_HEIGHT)}};
 }
 
 json::Object zoneOf(Sighting const& sighting, Reader::Page const& page) {

@@ -13,6 +13,7 @@ namespace {
 
 using testing::AnyOf;
 using VLServiceTest::deflated;
+using VLServiceTest::formTree;
 using VLServiceTest::onePage;
 using VLServiceTest::RawPdf;
 
@@ -45,24 +46,6 @@ private:
 
     TemporaryFolder folder_;
 };
-
-/// Forms of which each draws the next several times.
-std::string formTree(int depth, int width) {
-    RawPdf pdf = onePage("/X6 Do", "/XObject << /X6 6 0 R >>");
-    for (int form = 6; form < 6 + depth; ++form) {
-        std::string const next = "X" + std::to_string(form + 1);
-        std::string content = PLAIN;
-        for (int i = 0; i < width; ++i)
-            content += " /" + next + " Do";
-        pdf.stream(form,
-                   "/Type /XObject /Subtype /Form /BBox [0 0 595 842] /Resources << /Font << /F 4 0 R >> "
-                   "/XObject << /" +
-                       next + ' ' + std::to_string(form + 1) + " 0 R >> >>",
-                   content);
-    }
-    pdf.stream(6 + depth, "/Type /XObject /Subtype /Form /BBox [0 0 595 842]", "");
-    return pdf.bytes();
-}
 
 TEST_F(HostileDocuments, OfFormsThatDrawEachOtherWithoutEndAreEnded) {
     EXPECT_EQ(errorOf(formTree(40, 10)),

@@ -1,6 +1,7 @@
 #include "programs/vlmail/presets/draft.h"
 #include "programs/vlmail/presets/draft_labels.h"
 #include "programs/vlmail/presets/lint.h"
+#include "tests/support/raw_pdf.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlmail/run_vlmail.h"
 #include "vlservice/json/json_text.h"
@@ -133,6 +134,53 @@ TEST(Drafts, HaveAnAddressWhereNoneWasSeen) {
     EXPECT_THAT(
         draft.evidence,
         Contains("address: none was seen; the block of text nearest to the window of an envelope is taken"));
+}
+
+TEST(Drafts, KeepTheirZonesOnTheSheetsOfLetters) {
+    // A4 that was rounded up, and a poster.
+    for (int const height : {842, 2400}) {
+        VLServiceTest::RawPdf pdf = VLServiceTest::onePage("BT /F 10 Tf 72 " + std::to_string(height - 300) +
+                                                           " Td (Total: 12.50) Tj ET");
+        pdf.object(3, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595.3 " + std::to_string(height) +
+                          "] /Contents 5 0 R /Resources << /Font << /F 4 0 R >> >> >>");
+        std::vector<Reader::Document> documents;
+        documents.push_back(Reader::openDocument(pdf.bytes(), "a.pdf"));
+        ASSERT_GT(documents[0].page(1).height, 29700);
+        Draft const draft = draftFrom(documents);
+        EXPECT_TRUE(lint(PresetsDocument(textOf(draft.settings))).empty()) << textOf(draft.settings);
+        EXPECT_THAT(textOf(draft.settings), HasSubstr(R"("bottom":29700)"));
+    }
+}
+
+TEST(Drafts, TakeNoProseForAnAddress) {
+    std::string const prose = "We thank you for the order that you have placed\nand hope that all is well.\n";
+    auto documents = documentsOf({{"a.txt", std::string(13, '\n') + prose}});
+    EXPECT_THAT(draftFrom(documents).evidence, Contains(HasSubstr("address: none was seen")));
+    auto withAddress = documentsOf(
+        {{"a.txt", std::string(13, '\n') + prose + "\n\n\nLena Brandt\n12 Long Street\nLeeds LS1 4AP\n"}});
+    EXPECT_THAT(draftFrom(withAddress).evidence,
+                Contains(HasSubstr("address: \"Lena Brandt / 12 Long Street")));
+}
+
+TEST(DraftCommand, EndsOverADocumentThatTakesTooLong) {
+    TemporaryFolder const folder;
+    std::string const letter = (folder / "a.pdf").string();
+    std::string const settings = (folder / "node.json").string();
+    std::ofstream(letter, std::ios::binary) << VLServiceTest::formTree(40, 10);
+    Ran const ran = runVlMail({"presets", "draft", letter, "-o", settings, "--document-seconds", "1"});
+    EXPECT_EQ(ran.status, FAILED);
+    EXPECT_EQ(ran.err,
+              "vlmail: cannot make a draft of 1 document: it took more than 1 s of processor time; print it "
+              "to a new PDF, or give --document-seconds a larger number\n");
+    EXPECT_EQ(contentOf(settings), "");
+}
+
+TEST(DraftCommand, SaysWhatCannotBeRead) {
+    TemporaryFolder const folder;
+    std::string const settings = (folder / "node.json").string();
+    Ran const ran = runVlMail({"presets", "draft", (folder / "gone.pdf").string(), "-o", settings});
+    EXPECT_EQ(ran.status, FAILED);
+    EXPECT_THAT(ran.err, HasSubstr("gone.pdf: there is no such file"));
 }
 
 TEST(DraftCommand, WritesSettingsOnce) {
