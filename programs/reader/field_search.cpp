@@ -63,28 +63,63 @@ FieldTrace const* PageTrace::counting(std::string const& name) const {
     return nullptr;
 }
 
-FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time, PageTrace* trace)
-    : document_(std::move(document)), rules_(rules), time_(time), trace_(trace) {}
+FieldSearch::FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time)
+    : document_(std::move(document)), rules_(rules), time_(time) {}
 
-void FieldSearch::search(Cfg::ExtractZone const& zone, ZoneText text) {
-    SearchedZone& searched = zones_.emplace_back(SearchedZone{&zone, std::move(text)});
-    if (trace_)
-        searched.trace = {&zone, searched.text.text(), searched.text.box(), searched.text.blocks(), {}};
-    for (ExtractField const& field : zone.fields())
-        search(field, searched);
+void FieldSearch::search(Cfg::ExtractZone const& zone, ZoneView view) {
+    zones_.push_back({&zone, zones_.size(), {}});
+    zones_.back().sights.push_back(searchAt(zone, std::move(view)));
 }
 
-void FieldSearch::search(ExtractField const& field, SearchedZone& zone) {
-    Try& one = zone.fields.emplace_back();
-    takeValue(one, inTime(one, [&] { return cutField(field, zone.text, one.trace); }));
+void FieldSearch::search(Cfg::ExtractZone const& zone, std::size_t order, NextView const& next) {
+    SearchedZone searched{&zone, order, {}};
+    while (std::optional<ZoneView> view = next()) {
+        searched.sights.push_back(searchAt(zone, std::move(*view)));
+        if (!searched.sights.back().hasFound())
+            continue;
+        searched.sights.erase(searched.sights.begin(), searched.sights.end() - 1);
+        break;
+    }
+    if (searched.sights.empty())
+        searched.sights.push_back(searchAt(zone, {}));
+    auto const behind = std::ranges::upper_bound(zones_, order, {}, &SearchedZone::order);
+    zones_.insert(behind, std::move(searched));
+}
+
+FieldSearch::Sight FieldSearch::searchAt(Cfg::ExtractZone const& zone, ZoneView view) {
+    if (view.place.isGivenUp)
+        found_.warnings.push_back("zone \"" + zone.name() + "\": " + view.place.whyNowhere);
+    ZoneText const& text = view.text;
+    ZoneTrace trace{&zone, std::move(view.place), text.text(), text.box(), text.blocks(), {}};
+    Sight sight{std::move(view.text), std::move(trace)};
+    for (ExtractField const& field : zone.fields())
+        search(field, sight);
+    return sight;
+}
+
+void FieldSearch::search(ExtractField const& field, Sight& sight) {
+    Try& one = sight.fields.emplace_back();
+    takeValue(one, inTime(one, [&] { return cutField(field, sight.text, one.trace); }));
     requireTime(field);
 }
 
 void FieldSearch::searchJoinedLines() {
-    for (SearchedZone& zone : zones_)
-        for (Try& field : zone.fields)
-            if (field.trace.wantsJoinedLines() && !hasFound(field.name()))
-                searchJoinedLines(field, zone.text);
+    for (SearchedZone& zone : zones_) {
+        auto const hasFound = [&](Sight& sight) {
+            searchJoinedLines(sight);
+            return sight.hasFound();
+        };
+        auto const found = std::ranges::find_if(zone.sights, hasFound);
+        if (found != zone.sights.end())
+            std::iter_swap(zone.sights.begin(), found);
+    }
+}
+
+void FieldSearch::searchJoinedLines(Sight& sight) {
+    for (Try& field : sight.fields)
+        if (!std::exchange(field.isTriedInJoinedLines, true) && field.trace.wantsJoinedLines() &&
+            !hasFound(field.name()))
+            searchJoinedLines(field, sight.text);
 }
 
 void FieldSearch::searchJoinedLines(Try& field, ZoneText& text) {
@@ -116,10 +151,13 @@ std::shared_ptr<ExtractedField> FieldSearch::inTime(Try& field, Cut const& cut) 
     return value;
 }
 
+bool FieldSearch::Sight::hasFound() const { return std::ranges::any_of(fields, &Try::isFound); }
+
 bool FieldSearch::hasFound(std::string const& name) const {
-    return std::any_of(zones_.begin(), zones_.end(), [&](SearchedZone const& zone) {
-        return std::any_of(zone.fields.begin(), zone.fields.end(),
-                           [&](Try const& field) { return field.isFound && field.name() == name; });
+    auto const isIt = [&](Try const& field) { return field.isFound && field.name() == name; };
+    return std::ranges::any_of(zones_, [&](SearchedZone const& zone) {
+        return std::ranges::any_of(
+            zone.sights, [&](Sight const& sight) { return std::ranges::any_of(sight.fields, isIt); });
     });
 }
 
@@ -130,7 +168,7 @@ void FieldSearch::takeValue(Try& field, std::shared_ptr<ExtractedField> value) {
     field.isFound = !field.value->isValidated();
     field.trace.doubt = validate(*field.trace.definition, *field.value);
     field.trace.value = field.value;
-    found_.isMarked = found_.isMarked || (field.isFound && separatesLetters(*field.trace.definition));
+    isMarked_ = isMarked_ || (field.isFound && separatesLetters(*field.trace.definition));
 }
 
 /// The last field is as good as any to look at first: it took some of the time.
@@ -156,12 +194,11 @@ std::string FieldSearch::validate(ExtractField const& field, ExtractedField& val
 std::vector<FieldSearch::Try*> FieldSearch::countingTries() {
     std::vector<Try*> counting;
     for (SearchedZone& zone : zones_) {
-        for (Try& field : zone.fields) {
+        for (Try& field : zone.sights.front().fields) {
             if (!field.value)
                 continue;
-            auto const known = std::find_if(counting.begin(), counting.end(), [&](Try* other) {
-                return other->value->name() == field.value->name();
-            });
+            auto const known = std::ranges::find_if(
+                counting, [&](Try const* other) { return other->value->name() == field.value->name(); });
             if (known == counting.end())
                 counting.push_back(&field);
             else if (field.rank() > (*known)->rank())
@@ -178,24 +215,26 @@ void FieldSearch::hand(Try& counting) {
         found_.warnings.push_back(counting.value->name() + ": " + counting.trace.doubt);
 }
 
-FieldsFound FieldSearch::finish() {
+std::vector<ZoneTrace> FieldSearch::zones() const {
+    std::vector<ZoneTrace> traces;
+    for (SearchedZone const& zone : zones_) {
+        traces.push_back(zone.sights.front().trace);
+        for (Try const& field : zone.sights.front().fields)
+            traces.back().fields.push_back(field.trace);
+    }
+    return traces;
+}
+
+FieldsFound FieldSearch::finish(PageTrace* trace) {
     for (SearchedZone const& zone : zones_)
-        for (Try const& field : zone.fields)
+        for (Try const& field : zone.sights.front().fields)
             if (!field.value && field.trace.definition->mustHave())
                 found_.missing.push_back(field.name());
     for (Try* const counting : countingTries())
         hand(*counting);
-    if (trace_)
-        handTraces();
+    if (trace)
+        trace->zones = zones();
     return std::move(found_);
-}
-
-void FieldSearch::handTraces() {
-    for (SearchedZone& zone : zones_) {
-        for (Try& field : zone.fields)
-            zone.trace.fields.push_back(std::move(field.trace));
-        trace_->zones.push_back(std::move(zone.trace));
-    }
 }
 
 bool separatesLetters(ExtractField const& field) {

@@ -8,7 +8,9 @@
 #include "vlservice/extract/extracted_fields.h"
 
 #include <cstddef>
+#include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -22,33 +24,43 @@ struct FieldsFound {
     std::vector<std::string> missing;
     /// What a person should know of values, a line each that begins with the field's name.
     std::vector<std::string> warnings;
-    /// A field that separates letters was found.
-    bool isMarked = false;
 };
+
+/// The next place where a zone may be; nothing when there is no further one.
+using NextView = std::function<std::optional<ZoneView>()>;
 
 class FieldSearch {
 public:
-    /// `document` names it in messages; the rules and the time must live as long as the search. With a trace
-    /// the search says there how it came about.
-    FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time,
-                PageTrace* trace = nullptr);
+    /// `document` names it in messages; the rules and the time must live as long as the search.
+    FieldSearch(std::string document, ReadingRules const& rules, PatternTime& time);
 
     /// Searches the zone's fields, which take their lines out of the text one after the other. Throws Error
     /// when a field's validation pattern fails, or the document's time for patterns is up; a failing
     /// extraction pattern is logged by the library and finds nothing.
-    void search(Cfg::ExtractZone const& zone, ZoneText text);
+    void search(Cfg::ExtractZone const& zone, ZoneView view);
+    /// The same in the first of several places where one of the zone's fields is found. `order` tells where
+    /// the zone stands among the others, whose order is that in which they were searched.
+    void search(Cfg::ExtractZone const& zone, std::size_t order, NextView const& next);
 
-    /// Searches ordinary fields of which no zone has a value again, in joined lines of what is left of each
-    /// zone's text. So no join takes from a field what it finds without. Throws what search() does.
+    /// Searches ordinary fields of which no zone has a value again, each once, in joined lines of what is
+    /// left of each zone's text. So no join takes from a field what it finds without. Throws what search()
+    /// does.
     void searchJoinedLines();
 
-    FieldsFound finish();
+    /// A field that separates letters was found.
+    bool isMarked() const { return isMarked_; }
+    /// What was seen so far, in the order of the zones.
+    std::vector<ZoneTrace> zones() const;
+
+    /// A trace gets the zones.
+    FieldsFound finish(PageTrace* trace = nullptr);
 
 private:
     /// One field in one zone.
     struct Try {
         std::shared_ptr<Cfg::ExtractedField> value = {};
         bool isFound = false;
+        bool isTriedInJoinedLines = false;
         FieldTrace trace = {};
         PatternTime::Clock::duration spent = {};
 
@@ -56,14 +68,24 @@ private:
         /// Of the values of a name the first of the highest rank counts.
         int rank() const { return isFound ? (trace.joined ? 1 : 2) : 0; }
     };
+    /// A zone in one place.
+    struct Sight {
+        ZoneText text;
+        ZoneTrace trace;
+        std::vector<Try> fields = {};
+
+        bool hasFound() const;
+    };
     struct SearchedZone {
         Cfg::ExtractZone const* definition = nullptr;
-        ZoneText text;
-        ZoneTrace trace = {};
-        std::vector<Try> fields = {};
+        std::size_t order = 0;
+        /// One, or all that were looked at in vain.
+        std::vector<Sight> sights = {};
     };
 
-    void search(Cfg::ExtractField const& field, SearchedZone& zone);
+    Sight searchAt(Cfg::ExtractZone const& zone, ZoneView view);
+    void search(Cfg::ExtractField const& field, Sight& sight);
+    void searchJoinedLines(Sight& sight);
     void searchJoinedLines(Try& field, ZoneText& text);
     bool hasFound(std::string const& name) const;
     void takeValue(Try& field, std::shared_ptr<Cfg::ExtractedField> value);
@@ -74,14 +96,13 @@ private:
     std::string validate(Cfg::ExtractField const& field, Cfg::ExtractedField& value) const;
     std::vector<Try*> countingTries();
     void hand(Try& counting);
-    void handTraces();
 
     std::string document_;
     ReadingRules const& rules_;
     PatternTime& time_;
-    PageTrace* trace_;
     std::vector<SearchedZone> zones_;
     FieldsFound found_;
+    bool isMarked_ = false;
 };
 
 /// Whether finding the field begins a letter.

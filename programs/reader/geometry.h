@@ -35,6 +35,10 @@ struct Box {
     double distanceTo(Point point) const {
         return std::hypot(distance(left, right, point.x), distance(top, bottom, point.y));
     }
+    /// Edges that no int can tell end at the last one.
+    Box movedBy(Point by) const {
+        return {sum(left, by.x), sum(top, by.y), sum(right, by.x), sum(bottom, by.y)};
+    }
     /// The smallest box around both.
     Box united(Box const& other) const {
         return {std::min(left, other.left), std::min(top, other.top), std::max(right, other.right),
@@ -48,6 +52,10 @@ private:
     static int difference(int from, int to) {
         constexpr std::int64_t MOST = std::numeric_limits<int>::max();
         return static_cast<int>(std::clamp(std::int64_t{to} - from, -MOST, MOST));
+    }
+    static int sum(int a, int b) {
+        using Limits = std::numeric_limits<int>;
+        return static_cast<int>(std::clamp<std::int64_t>(std::int64_t{a} + b, Limits::min(), Limits::max()));
     }
     static double distance(double from, double to, double at) { return std::max({from - at, 0.0, at - to}); }
 };

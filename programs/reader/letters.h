@@ -31,8 +31,9 @@ struct Letter {
 
 /// Each field with a mark other than None and SingleLetter that is found on a page begins a letter there;
 /// pages in front of the first are a letter too. Without such fields, or with one that is marked
-/// SingleLetter, the document is one letter. With skipFirstPage() the first page belongs to none. Throws
-/// Error when a page cannot be read, and what FieldSearch::search() does.
+/// SingleLetter, the document is one letter. Fields of zones that the rules put on other pages mark nothing.
+/// With skipFirstPage() the first page belongs to none. Throws Error when a page cannot be read, and what
+/// FieldSearch::search() does.
 std::vector<Letter> readLetters(Document& document, Cfg::ExtractPreset const& preset, Trace* trace = nullptr,
                                 ReadingRules const& rules = {}, PatternLimits const& limits = {});
 
@@ -49,8 +50,5 @@ Letter readGivenTexts(std::string const& document, std::span<GivenText const> te
 
 /// What a preset says about lines and blocks.
 LayoutRules rulesOf(Cfg::ExtractPreset const& preset);
-
-/// By the zone's location or, without one, its most probable point.
-ZoneText textOf(Page const& page, Layout const& layout, Cfg::ExtractZone const& zone);
 
 } // namespace Reader

@@ -205,6 +205,11 @@ ZoneRules const* ReadingRules::forZone(std::string const& name) const {
     return found == zones.end() ? nullptr : &found->second;
 }
 
+bool ReadingRules::isOnFirstPage(std::string const& zone) const {
+    ZoneRules const* const rules = forZone(zone);
+    return !rules || rules->isOnFirstPage();
+}
+
 ReadingRules ReadingRules::from(json::Value const& reading, std::vector<RulesFault>& faults) {
     return Parser(faults).rules(reading);
 }

@@ -42,6 +42,8 @@ struct ZoneRules {
     std::string anchor = {};
     /// The text is read column by column.
     bool byColumn = false;
+
+    bool isOnFirstPage() const { return pages == Pages::One && page == 1; }
 };
 
 /// What is wrong with a "reading": the keys that lead to the place, and words for people.
@@ -64,6 +66,7 @@ struct ReadingRules {
 
     /// Null for a zone that nothing is said about.
     ZoneRules const* forZone(std::string const& name) const;
+    bool isOnFirstPage(std::string const& zone) const;
 
     /// Adds what is wrong to `faults`; such a value counts as not said.
     static ReadingRules from(json::Value const& reading, std::vector<RulesFault>& faults);

@@ -2,7 +2,7 @@
 // How letters came about: what was seen in each zone, and what became of each field. Definitions and zones
 // point into the preset.
 
-#include "programs/reader/zone_text.h"
+#include "programs/reader/zone_place.h"
 
 #include "vlservice/extract/extract_zone.h"
 
@@ -53,6 +53,7 @@ struct FieldTrace {
 
 struct ZoneTrace {
     Cfg::ExtractZone const* definition = nullptr;
+    ZonePlace place = {};
     /// What was seen before the first field was searched.
     std::string text;
     Box box;
@@ -63,6 +64,7 @@ struct ZoneTrace {
 struct PageTrace {
     int page = 0;
     bool beginsLetter = false;
+    /// In the order of the preset. Those that "reading" puts on other pages are there when a letter begins.
     std::vector<ZoneTrace> zones;
 
     /// The field of that name whose value counts; null when none of them has a value.

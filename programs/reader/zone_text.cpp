@@ -43,17 +43,27 @@ std::vector<Line const*> inOrder(Layout const& layout) {
     return isColumn ? fromTop : asBlocks;
 }
 
+std::vector<Line const*> linesOf(std::vector<Block> const& blocks, Layout const& layout) {
+    std::vector<Line const*> lines;
+    for (Block const& block : blocks)
+        for (std::size_t i = block.firstLine; i < block.endLine; ++i)
+            lines.push_back(&layout.lines[i]);
+    return lines;
+}
+
 /// From this ratio on a line is set smaller than another, as blocks have it.
 bool isSmaller(int size, int other) { return size * 6LL <= other * 5LL; }
 
 } // namespace
 
-ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location) {
+ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location, ReadingOrder order) {
     ZoneText zone;
     Layout const inside = layOutInside(page, layout.spacing, location);
-    for (Line const* const line : inOrder(inside))
+    bool const byRows = order == ReadingOrder::Rows;
+    std::vector<Block> const blocks = byRows ? inside.blocks : byColumns(inside);
+    for (Line const* const line : byRows ? inOrder(inside) : linesOf(blocks, inside))
         zone.addLine(page, *line);
-    for (Block const& block : inside.blocks)
+    for (Block const& block : blocks)
         zone.addBlock(block);
     return zone;
 }

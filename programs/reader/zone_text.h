@@ -3,7 +3,7 @@
 // measured.
 
 #include "programs/reader/joined_lines.h"
-#include "programs/reader/layout.h"
+#include "programs/reader/reading_order.h"
 
 #include <cstddef>
 #include <string>
@@ -29,7 +29,8 @@ class ZoneText {
 public:
     /// The words whose centre lies in the location, laid out without the others: block by block, or from top
     /// to bottom where no lines stand side by side.
-    static ZoneText inside(Page const& page, Layout const& layout, Box const& location);
+    static ZoneText inside(Page const& page, Layout const& layout, Box const& location,
+                           ReadingOrder order = ReadingOrder::Rows);
     /// The block nearest to the point.
     static ZoneText nearest(Page const& page, Layout const& layout, Point point);
     /// Text that stands on no page; its lines are cut as those of a page are.

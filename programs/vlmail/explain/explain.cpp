@@ -123,6 +123,7 @@ private:
             object.set(LOCATION, zone.location().serialize());
         else
             object.set(POINT, zone.mostProbablePoint().serialize());
+        addPlace(object, trace.place);
         object.set(TEXT, trace.text);
         if (!trace.blocks.empty())
             object.set(BOX, toJson(trace.box));
@@ -132,6 +133,22 @@ private:
             fields.append(explain(trace, field));
         object.set(FIELDS, fields);
         return object;
+    }
+
+    /// What "reading" says of the zone's place.
+    void addPlace(json::Object& object, Reader::ZonePlace const& place) const {
+        if (place.page != 0 && place.page != trace_.page)
+            object.set(PAGE, place.page);
+        if (!place.whyNowhere.empty())
+            object.set(NOWHERE, place.whyNowhere);
+        if (place.anchor) {
+            object.set(ANCHOR, toJson(*place.anchor));
+            object.set(PLACE, place.location
+                                  ? toJson(*place.location)
+                                  : toJson({place.point.x, place.point.y, place.point.x, place.point.y}));
+        }
+        if (place.order == Reader::ReadingOrder::Columns)
+            object.set(BY_COLUMN, true);
     }
 
     json::Object explain(ZoneTrace const& zone, FieldTrace const& trace) const {
@@ -169,10 +186,18 @@ private:
         if (!trace_.beginsLetter || isFoundOn(trace_, trace.definition->name()))
             return;
         json::Array misses;
-        for (NearMiss const& miss : nearMissesOf({preset_, zone, trace, trace_.page, otherPages_}, pages_))
+        for (NearMiss const& miss :
+             nearMissesOf({preset_, zone, trace, trace_.page, otherPagesThan(zone.place.page)}, pages_))
             misses.append(toJson(miss));
         if (!misses.empty())
             object.set(NEAR_MISSES, misses);
+    }
+
+    std::vector<int> otherPagesThan(int page) const {
+        std::vector<int> pages = otherPages_;
+        pages.push_back(trace_.page);
+        std::erase(pages, page);
+        return pages;
     }
 
     PageTrace const& trace_;

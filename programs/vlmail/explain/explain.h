@@ -61,6 +61,11 @@ constexpr char const* BEGINS_LETTER = "begins_letter";
 constexpr char const* LOCATION = "location";
 constexpr char const* POINT = "point";
 constexpr char const* BLOCKS = "blocks";
+constexpr char const* ANCHOR = "anchor";
+/// The location on the page, where an anchor moves it.
+constexpr char const* PLACE = "place";
+constexpr char const* BY_COLUMN = "column";
+constexpr char const* NOWHERE = "nowhere";
 
 // Of a field.
 constexpr char const* PATTERN = "pattern";

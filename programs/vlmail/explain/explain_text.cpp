@@ -82,17 +82,31 @@ private:
     }
 
     void printZone(json::Object const& zone) {
-        std::string const name = "zone " + Base::inQuotes(textOf(zone, NAME)) + ", ";
-        if (json::Value const location = zone.get(LOCATION)) {
-            line(6, name + placeInWords(location));
-        } else {
-            Cfg::Point const point(zone.get(POINT));
-            line(6, name + "the block nearest to the point " + millimetres(point.x) + ", " +
-                        millimetres(point.y));
-        }
-        printZoneText(zone);
+        line(6, "zone " + Base::inQuotes(textOf(zone, NAME)) + ", " + whereInWords(zone));
+        if (zone.get(NOWHERE))
+            line(8, textOf(zone, NOWHERE));
+        else
+            printZoneText(zone);
         for (json::Value const& field : zone.get(FIELDS).toArray())
             printField(field.toObject());
+    }
+
+    static std::string whereInWords(json::Object const& zone) {
+        std::string words;
+        if (long long const page = zone.get(PAGE).intOrZero())
+            words += "on page " + std::to_string(page) + ", ";
+        if (zone.get(BY_COLUMN).isTrue())
+            words += "column by column, ";
+        json::Value const anchor = zone.get(ANCHOR);
+        if (anchor)
+            words += "told from the anchor at left " + millimetres(Cfg::Rect(anchor).left) + ", top " +
+                     millimetres(Cfg::Rect(anchor).top) + ": ";
+        json::Value const place = zone.get(anchor ? PLACE : LOCATION);
+        if (zone.get(LOCATION))
+            return words + placeInWords(place);
+        Cfg::Rect const moved(place);
+        Cfg::Point const point = anchor ? Cfg::Point(moved.left, moved.top) : Cfg::Point(zone.get(POINT));
+        return words + "the block nearest to the point " + millimetres(point.x) + ", " + millimetres(point.y);
     }
 
     void printZoneText(json::Object const& zone) {

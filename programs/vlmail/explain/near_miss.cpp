@@ -97,8 +97,8 @@ private:
 char const* nameOf(NearMissKind kind) { return WAYS[static_cast<std::size_t>(kind)].name; }
 
 std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages) {
-    LaidOutPage const* const page = pages.page(missed.page);
-    if (!page || missed.field.definition->strRegex().empty())
+    LaidOutPage const* const page = pages.page(missed.page());
+    if (!page || !missed.zone.place.whyNowhere.empty() || missed.field.definition->strRegex().empty())
         return {};
     // Each pattern that fails would be a line on the terminal, beside the near miss that says so.
     Base::LogCapture const quiet;

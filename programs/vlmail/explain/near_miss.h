@@ -56,10 +56,13 @@ struct MissedField {
     Reader::ZoneTrace const& zone;
     /// One of the zone's.
     Reader::FieldTrace const& field;
-    /// Where it was searched.
-    int page = 0;
-    /// The letter's other pages, and the one that the preset skips.
+    /// The letter's first page.
+    int firstPage = 0;
+    /// Those of the letter on which it was not searched, and the one that the preset skips.
     std::vector<int> otherPages;
+
+    /// Where it was searched; 0 when the letter has no such page.
+    int page() const { return zone.place.page; }
 };
 
 /// At most three, the likeliest first; those that would give a valid value stand in front of those that would

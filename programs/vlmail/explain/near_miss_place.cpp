@@ -48,13 +48,13 @@ std::set<std::string> foundOn(LaidOutPage const& page, Cfg::ExtractPreset const&
     Reader::PageTrace trace;
     Reader::PatternTime time;
     Reader::ReadingRules const rules;
-    Reader::FieldSearch fields({}, rules, time, &trace);
+    Reader::FieldSearch fields({}, rules, time);
     std::set<std::string> names;
     try {
         for (Cfg::ExtractZone const& zone : preset.zones())
-            fields.search(zone, Reader::textOf(*page.page, page.layout, zone));
+            fields.search(zone, {Reader::textOf(*page.page, page.layout, zone), {}});
         fields.searchJoinedLines();
-        fields.finish();
+        fields.finish(&trace);
     } catch (Base::Error const&) {
         return names;
     }
@@ -153,7 +153,9 @@ std::string pointInWords(Point point) {
 }
 
 /// Only what takes all of a zone's text stands for the zone: other fields of it may be where they should.
-std::string pointAdvice(Search const& search, Point from, Point to) {
+std::string pointAdvice(Search const& search, Point onPage) {
+    Point const from = search.zone().mostProbablePoint();
+    Point const to(onPage.x - search.origin().x, onPage.y - search.origin().y);
     return search.takesWholeText() ? "move the point from " + pointInWords(from) + " to " + pointInWords(to)
                                    : "give the field a zone of its own with the point " + pointInWords(to);
 }
@@ -169,11 +171,16 @@ std::vector<Box> blocksByDistance(Search const& search, Point point) {
 }
 
 std::string otherPageAdvice(Search const& search, int page) {
-    if (page < search.pageNumber())
+    int const first = search.missed().firstPage;
+    if (page < first)
         return "the preset skips the first page: leave \"skip_first_page\" out";
-    std::string const rule = "fields are searched on the first page of a letter: move the text there";
+    std::string const rule = search.pageNumber() == first
+                                 ? "fields are searched on the first page of a letter"
+                                 : "the zone lies on page " + std::to_string(search.pageNumber());
+    std::string const advice = rule + ": set the zone's \"page\" in \"reading\" to " +
+                               std::to_string(page - first + 1) + ", or move the text";
     bool const maybeCovered = search.pageNumber() == 1 && page == 2;
-    return maybeCovered ? rule + ", or set \"skip_first_page\" if page 1 is a cover sheet" : rule;
+    return maybeCovered ? advice + ", or set \"skip_first_page\" if page 1 is a cover sheet" : advice;
 }
 
 std::optional<Found> onPage(Search const& search, LaidOutPage const& page) {
@@ -223,10 +230,11 @@ std::optional<Found> zone(Search const& search) {
     for (ZoneChange const& change : changesNearby(search)) {
         if (best.isValid())
             break;
-        ZoneText text = ZoneText::inside(*search.page().page, search.page().layout, change.after);
+        ZoneText text = search.textInside(change.after);
         best.offer(
             search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), [&](Hit const&) {
-                return "would match " + change.where("the " + search.zoneName()) + ": " + change.advice();
+                return "would match " + change.where("the " + search.zoneName()) + ": " +
+                       change.toldFrom(search.origin()).advice();
             }));
     }
     return best.take();
@@ -235,7 +243,7 @@ std::optional<Found> zone(Search const& search) {
 std::optional<Found> block(Search const& search) {
     if (search.zone().hasLocation())
         return std::nullopt;
-    Point const point = search.zone().mostProbablePoint();
+    Point const point = search.point();
     Best best;
     for (Box const& box : blocksByDistance(search, point)) {
         if (best.isValid())
@@ -244,8 +252,7 @@ std::optional<Found> block(Search const& search) {
         ZoneText text = ZoneText::nearest(*search.page().page, search.page().layout, middle);
         auto const says = [&](Hit const&) {
             return "would match in the text block " + millimetres(wholeMillimetres(box.distanceTo(point))) +
-                   " away from the point of the " + search.zoneName() + ": " +
-                   pointAdvice(search, point, middle);
+                   " away from the point of the " + search.zoneName() + ": " + pointAdvice(search, middle);
         };
         best.offer(search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), says));
     }

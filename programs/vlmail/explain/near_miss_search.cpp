@@ -36,18 +36,19 @@ bool isValid(ExtractField const& field, ExtractedField value) {
 
 std::string Search::zoneName() const { return "zone " + Base::inQuotes(zone().name()); }
 
-Box Search::location() const {
-    Cfg::Rect const& at = zone().location();
-    return {at.left, at.top, at.right, at.bottom};
-}
-
 std::vector<int> Search::otherPages() const {
     std::vector<int> pages = missed_.otherPages;
     pages.resize(std::min(pages.size(), MAX_OTHER_PAGES));
     return pages;
 }
 
-ZoneText Search::textOn(LaidOutPage const& page) const { return textOf(*page.page, page.layout, zone()); }
+ZoneText Search::textOn(LaidOutPage const& page) const {
+    return textAt(*page.page, page.layout, missed_.zone.place);
+}
+
+ZoneText Search::textInside(Box const& location) const {
+    return ZoneText::inside(*page_.page, page_.layout, location, missed_.zone.place.order);
+}
 
 ZoneText Search::everythingOn(LaidOutPage const& page) {
     return ZoneText::inside(*page.page, page.layout, EVERYWHERE);

@@ -51,8 +51,11 @@ public:
     Cfg::ExtractZone const& zone() const { return *missed_.zone.definition; }
     /// Such as: zone "Info".
     std::string zoneName() const;
-    Reader::Box location() const;
-    int pageNumber() const { return missed_.page; }
+    /// On the page, and what the settings tell it from there.
+    Reader::Box location() const { return *missed_.zone.place.location; }
+    Reader::Point origin() const { return missed_.zone.place.origin(); }
+    Reader::Point point() const { return missed_.zone.place.point; }
+    int pageNumber() const { return missed_.page(); }
     LaidOutPage const& page() const { return page_; }
     ReadPages& pages() const { return pages_; }
     /// The letter's other pages that are looked at.
@@ -67,6 +70,8 @@ public:
 
     /// The zone's text on that page.
     Reader::ZoneText textOn(LaidOutPage const& page) const;
+    /// The same with another location.
+    Reader::ZoneText textInside(Reader::Box const& location) const;
     static Reader::ZoneText everythingOn(LaidOutPage const& page);
     /// What the fields that are searched earlier leave of the text.
     Reader::ZoneText remaining(Reader::ZoneText text) const;

@@ -27,6 +27,10 @@ struct ZoneChange {
     /// From where the zone's text would come: "7 mm below and 12 mm to the right of the zone", "with the zone
     /// 7 mm lower", "with the zone 20 mm shorter at the right".
     std::string where(std::string const& zone) const;
+    /// The same with places told from there instead of the page's corner.
+    ZoneChange toldFrom(Reader::Point origin) const {
+        return {kind, before.movedBy({-origin.x, -origin.y}), after.movedBy({-origin.x, -origin.y})};
+    }
     /// What to change: "move its bottom from 95 mm to 102 mm or more".
     std::string advice() const;
 };

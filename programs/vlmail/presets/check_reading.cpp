@@ -1,5 +1,6 @@
 // What pack presets say about reading: whether it can be used, and goes together with the fields.
 #include "programs/patterns/pattern.h"
+#include "programs/reader/field_search.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/nearest_name.h"
@@ -85,8 +86,11 @@ void checkReadingRules(PresetsDocument const& document, Findings& findings) {
 }
 
 void checkReadingOfFields(PresetsDocument const& document, Findings& findings) {
-    forEachField(document, [&](ListedExtractPreset const& preset, ListedZone const&,
+    forEachField(document, [&](ListedExtractPreset const& preset, ListedZone const& zone,
                                ListedField const& listed) {
+        if (listed.field && Reader::separatesLetters(*listed.field) &&
+            !readingRulesFor(document, preset).isOnFirstPage(zone.name))
+            findings.add(ReadingMarkElsewhere, listed.place / "mark", {inQuotes(zone.name)});
         bool const isReal = listed.field && listed.field->validation().valueType() == FieldValueType::Float;
         if (isReal && readingRulesFor(document, preset).numbers.kind != Reader::NumberRules::Decimal::Plain &&
             refusesPlainDecimals(listed))

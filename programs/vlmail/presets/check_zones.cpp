@@ -8,6 +8,7 @@
 #include <array>
 #include <optional>
 #include <string>
+#include <tuple>
 
 namespace VlMail {
 namespace {
@@ -37,16 +38,22 @@ bool isOffPage(Cfg::Point const& point) {
 long long widthOf(Cfg::Rect const& rect) { return static_cast<long long>(rect.right) - rect.left; }
 long long heightOf(Cfg::Rect const& rect) { return static_cast<long long>(rect.bottom) - rect.top; }
 
-void checkLocation(ListedZone const& zone, Findings& findings) {
+bool isAnchored(Reader::ReadingRules const& rules, ListedZone const& zone) {
+    Reader::ZoneRules const* const said = rules.forZone(zone.name);
+    return said && !said->anchor.empty();
+}
+
+/// Where an anchored zone lies on the page is known when a letter is read.
+void checkLocation(ListedZone const& zone, bool isAnchored, Findings& findings) {
     Place const place = zone.place / "location";
     if (isEmpty(zone.location))
         findings.add(ZoneEmpty, place, {inWords(zone.location)});
-    else if (isOffPage(zone.location))
+    else if (!isAnchored && isOffPage(zone.location))
         findings.add(ZoneOffPage, place, {inWords(zone.location)});
     else if (widthOf(zone.location) < TINY || heightOf(zone.location) < TINY)
         findings.add(ZoneTiny, place,
                      {inMillimetres(widthOf(zone.location)), inMillimetres(heightOf(zone.location))});
-    else if (isBeyondPage(zone.location))
+    else if (!isAnchored && isBeyondPage(zone.location))
         findings.add(ZoneBeyondPage, place, {inWords(zone.location)});
 }
 
@@ -102,6 +109,24 @@ void checkApart(ListedZone const& zone, ListedZone const& other, Findings& findi
     }
 }
 
+/// Whether the places of both are told from one point of one page.
+bool areToldAlike(Reader::ReadingRules const& rules, ListedZone const& zone, ListedZone const& other) {
+    auto const told = [&](ListedZone const& one) {
+        Reader::ZoneRules const* const said = rules.forZone(one.name);
+        Reader::ZoneRules const place = said ? *said : Reader::ZoneRules();
+        return std::tuple(place.pages, place.page, place.anchor);
+    };
+    return told(zone) == told(other);
+}
+
+void checkPlace(ListedZone const& zone, bool isAnchored, Findings& findings) {
+    if (zone.hasLocation())
+        checkLocation(zone, isAnchored, findings);
+    if (!isAnchored && isOffPage(zone.point))
+        findings.add(PointOffPage, zone.place / "most_probable_point",
+                     {std::to_string(zone.point.x), std::to_string(zone.point.y)});
+}
+
 template<typename Look>
 void forEachZone(PresetsDocument const& document, Look look) {
     for (ListedExtractPreset const& preset : document.extractPresets())
@@ -112,20 +137,21 @@ void forEachZone(PresetsDocument const& document, Look look) {
 } // namespace
 
 void checkZonePlaces(PresetsDocument const& document, Findings& findings) {
-    forEachZone(document, [&](ListedZone const& zone) {
-        if (zone.hasLocation())
-            checkLocation(zone, findings);
-        if (isOffPage(zone.point))
-            findings.add(PointOffPage, zone.place / "most_probable_point",
-                         {std::to_string(zone.point.x), std::to_string(zone.point.y)});
-    });
+    for (ListedExtractPreset const& preset : document.extractPresets()) {
+        Reader::ReadingRules const rules = readingRulesFor(document, preset);
+        for (ListedZone const& zone : preset.zones)
+            checkPlace(zone, isAnchored(rules, zone), findings);
+    }
 }
 
 void checkZonesApart(PresetsDocument const& document, Findings& findings) {
-    for (ListedExtractPreset const& preset : document.extractPresets())
+    for (ListedExtractPreset const& preset : document.extractPresets()) {
+        Reader::ReadingRules const rules = readingRulesFor(document, preset);
         for (auto zone = preset.zones.begin(); zone != preset.zones.end(); ++zone)
             for (auto other = preset.zones.begin(); other != zone; ++other)
-                checkApart(*zone, *other, findings);
+                if (areToldAlike(rules, *zone, *other))
+                    checkApart(*zone, *other, findings);
+    }
 }
 
 void checkZoneFields(PresetsDocument const& document, Findings& findings) {

@@ -202,6 +202,10 @@ constexpr FindingWords WORDS[] = {
     {ReadingAgainstMatch, "reading-against-match", Error,
      "\"reading\" hands a number on as 1234.56, and the pattern fits no such number: every value with decimals is refused",
      "remove \"value_match\", or write one for numbers with a decimal point and without separators"},
+    {ReadingMarkElsewhere, "reading-mark-elsewhere", Error,
+     "the mark begins letters only where their first page has it, and \"reading\" puts the zone {0} on another: it "
+     "separates nothing",
+     "move the field to a zone of the first page, or remove \"mark\""},
     // clang-format on
 };
 

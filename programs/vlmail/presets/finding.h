@@ -78,6 +78,7 @@ enum class FindingKind {
     ReadingRefused,
     ReadingZoneMissing,
     ReadingAgainstMatch,
+    ReadingMarkElsewhere,
     COUNT_,
 };
 

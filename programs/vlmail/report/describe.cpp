@@ -85,46 +85,53 @@ Field fieldOf(FieldTrace const& trace, Cfg::ExtractedField const* primary, Reade
 }
 
 Box boxOf(ZoneTrace const& zone) {
-    Cfg::Rect const& location = zone.definition->location();
-    if (zone.definition->hasLocation())
-        return {location.left, location.top, location.right, location.bottom};
+    if (zone.place.location)
+        return *zone.place.location;
     if (!zone.blocks.empty())
         return zone.box;
-    Cfg::Point const point = zone.definition->mostProbablePoint();
+    Cfg::Point const point = zone.place.point;
     return {point.x, point.y, point.x, point.y};
 }
 
-std::vector<Zone> zonesOf(Reader::PageTrace const& trace, LetterReading const& letter,
-                          Reader::Page const& page) {
-    std::vector<Zone> zones;
-    for (ZoneTrace const& seen : trace.zones) {
-        Zone zone{seen.definition->name(), boxOf(seen), seen.definition->hasAddress(),
-                  !seen.definition->hasLocation()};
-        for (FieldTrace const& field : seen.fields)
-            zone.fields.push_back(fieldOf(field, letter.fields.primaryAddressField(), page));
-        zones.push_back(std::move(zone));
-    }
-    return zones;
-}
-
-void draw(Letter& letter, Reader::Document& document) {
+Sheet sheetOf(int number, Reader::Document& document) {
+    Reader::Page const& page = document.page(number);
+    Sheet sheet{number, page.width, page.height};
     try {
-        letter.png = document.renderPage(letter.page, DOTS_PER_INCH);
+        sheet.png = document.renderPage(number, DOTS_PER_INCH);
     } catch (std::bad_alloc const&) {
         // That says nothing of the page.
         throw;
     } catch (std::exception const& failure) {
-        letter.whyNoPicture = failure.what();
+        sheet.whyNoPicture = failure.what();
     }
+    return sheet;
+}
+
+/// The place of the page among the sheets, to which it is added when it is not there yet.
+std::size_t placeAmong(std::vector<Sheet>& sheets, int page, Reader::Document& document) {
+    auto const place =
+        static_cast<std::size_t>(std::ranges::find(sheets, page, &Sheet::page) - sheets.begin());
+    if (place == sheets.size())
+        sheets.push_back(sheetOf(page, document));
+    return place;
+}
+
+Zone zoneOf(ZoneTrace const& seen, LetterReading const& letter, Reader::Page const& page) {
+    Zone zone{seen.definition->name(), boxOf(seen), seen.definition->hasAddress(),
+              !seen.definition->hasLocation()};
+    zone.whyNowhere = seen.place.whyNowhere;
+    for (FieldTrace const& field : seen.fields)
+        zone.fields.push_back(fieldOf(field, letter.fields.primaryAddressField(), page));
+    return zone;
 }
 
 Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader::PageTrace const& trace) {
-    Letter letter{trace.page, pagesInWords(reading.pages), reading.whyNot()};
-    Reader::Page const& page = document.page(trace.page);
-    letter.width = page.width;
-    letter.height = page.height;
-    draw(letter, document);
-    letter.zones = zonesOf(trace, reading, page);
+    Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(trace.page, document)}};
+    for (ZoneTrace const& seen : trace.zones) {
+        int const page = seen.place.page == 0 ? trace.page : seen.place.page;
+        letter.zones.push_back(zoneOf(seen, reading, document.page(page)));
+        letter.zones.back().sheet = placeAmong(letter.sheets, page, document);
+    }
     return letter;
 }
 

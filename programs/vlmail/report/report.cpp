@@ -58,59 +58,61 @@ std::string placeOf(Box const& box) {
 }
 
 /// Settings may place a zone anywhere: what lies off the page ends at its edge.
-Box onPage(Box const& box, Letter const& letter) {
+Box onPage(Box const& box, Sheet const& sheet) {
     Box clipped;
-    clipped.left = std::clamp(box.left, 0, letter.width);
-    clipped.top = std::clamp(box.top, 0, letter.height);
-    clipped.right = std::clamp(box.right, clipped.left, letter.width);
-    clipped.bottom = std::clamp(box.bottom, clipped.top, letter.height);
+    clipped.left = std::clamp(box.left, 0, sheet.width);
+    clipped.top = std::clamp(box.top, 0, sheet.height);
+    clipped.right = std::clamp(box.right, clipped.left, sheet.width);
+    clipped.bottom = std::clamp(box.bottom, clipped.top, sheet.height);
     return clipped;
 }
 
-std::string styleOf(Box const& box, Letter const& letter) {
-    return "left:" + percent(box.left, letter.width) + ";top:" + percent(box.top, letter.height) +
-           ";width:" + percent(box.width(), letter.width) + ";height:" + percent(box.height(), letter.height);
+std::string styleOf(Box const& box, Sheet const& sheet) {
+    return "left:" + percent(box.left, sheet.width) + ";top:" + percent(box.top, sheet.height) +
+           ";width:" + percent(box.width(), sheet.width) + ";height:" + percent(box.height(), sheet.height);
 }
 
-std::string overlay(std::string const& anchor, std::string const& look, Box const& box, Letter const& letter,
+std::string overlay(std::string const& anchor, std::string const& look, Box const& box, Sheet const& sheet,
                     std::string const& tag, std::string const& label) {
     return "<a class=\"" + look + "\" id=\"" + anchor + "\" href=\"#" + rowAnchor(anchor) + "\" style=\"" +
-           styleOf(box, letter) + "\" aria-label=\"" + escaped(label) + "\"><span class=\"tag\">" +
+           styleOf(box, sheet) + "\" aria-label=\"" + escaped(label) + "\"><span class=\"tag\">" +
            isolated(tag) + "</span></a>\n";
 }
 
 std::string kindOf(Zone const& zone) { return zone.isAddressWindow ? "address window" : "zone"; }
 
-std::string overlayOf(Zone const& zone, std::string const& anchor, Letter const& letter) {
+std::string overlayOf(Zone const& zone, std::string const& anchor, Sheet const& sheet) {
     constexpr int TAG_HEIGHT = 400;
-    Box const box = onPage(zone.box, letter);
+    Box const box = onPage(zone.box, sheet);
     std::string look = "zone";
     look += zone.isAddressWindow ? " window" : "";
     look += zone.isByPoint ? " point" : "";
     look += box.top < TAG_HEIGHT ? " high" : "";
     std::string const name = kindOf(zone) + ' ' + zone.name;
-    return overlay(anchor, look, box, letter, name, name);
+    return overlay(anchor, look, box, sheet, name, name);
 }
 
 /// The first box of a match bears the name; those of lines that were joined with it lead to the same row.
-std::string overlayOf(Field const& field, std::string const& anchor, Letter const& letter) {
+std::string overlayOf(Field const& field, std::string const& anchor, Sheet const& sheet) {
     StateLook const state = lookOf(field);
     std::string const look = std::string("match ") + state.look;
     std::string const tag = (isTrouble(field) ? "\u2717 " : "") + field.name;
     std::string html =
         overlay(anchor, look + TAGS.at(static_cast<std::size_t>(field.tag)),
-                onPage(field.match.front(), letter), letter, tag, "field " + field.name + ": " + state.words);
+                onPage(field.match.front(), sheet), sheet, tag, "field " + field.name + ": " + state.words);
     for (std::size_t i = 1; i < field.match.size(); ++i)
         html += "<a class=\"" + look + "\" href=\"#" + rowAnchor(anchor) + "\" style=\"" +
-                styleOf(onPage(field.match[i], letter), letter) + "\" aria-label=\"field " +
+                styleOf(onPage(field.match[i], sheet), sheet) + "\" aria-label=\"field " +
                 escaped(field.name) + ", joined line\"></a>\n";
     return html;
 }
 
-/// The largest first, so that none hides another from the pointer.
-std::vector<std::size_t> bySize(std::vector<Zone> const& zones) {
-    std::vector<std::size_t> order(zones.size());
-    std::iota(order.begin(), order.end(), std::size_t{0});
+/// Those of a sheet, the largest first, so that none hides another from the pointer.
+std::vector<std::size_t> bySize(std::vector<Zone> const& zones, std::size_t sheet) {
+    std::vector<std::size_t> order;
+    for (std::size_t i = 0; i < zones.size(); ++i)
+        if (zones[i].sheet == sheet && zones[i].whyNowhere.empty())
+            order.push_back(i);
     auto const area = [&](std::size_t index) {
         return 1.0 * zones[index].box.width() * zones[index].box.height();
     };
@@ -119,33 +121,44 @@ std::vector<std::size_t> bySize(std::vector<Zone> const& zones) {
     return order;
 }
 
-std::string overlaysOf(Letter const& letter, std::string const& anchor) {
-    if (letter.width <= 0 || letter.height <= 0)
+std::string overlaysOf(Letter const& letter, std::size_t place, std::string const& anchor) {
+    Sheet const& sheet = letter.sheets[place];
+    if (sheet.width <= 0 || sheet.height <= 0)
         return {};
+    std::vector<std::size_t> order = bySize(letter.zones, place);
     std::string html;
-    for (std::size_t const index : bySize(letter.zones))
-        html += overlayOf(letter.zones[index], numbered(anchor, 'z', index), letter);
-    for (std::size_t i = 0; i < letter.zones.size(); ++i) {
-        std::vector<Field> const& fields = letter.zones[i].fields;
+    for (std::size_t const index : order)
+        html += overlayOf(letter.zones[index], numbered(anchor, 'z', index), sheet);
+    std::sort(order.begin(), order.end());
+    for (std::size_t const index : order) {
+        std::vector<Field> const& fields = letter.zones[index].fields;
         for (std::size_t k = 0; k < fields.size(); ++k) {
             if (!fields[k].match.empty())
-                html += overlayOf(fields[k], numbered(numbered(anchor, 'z', i), 'f', k), letter);
+                html += overlayOf(fields[k], numbered(numbered(anchor, 'z', index), 'f', k), sheet);
         }
     }
     return html;
 }
 
-std::string pictureOf(Letter const& letter) {
-    if (letter.png.empty())
-        return "<p>" + isolated(letter.whyNoPicture) + "</p>\n";
-    return "<img alt=\"page " + std::to_string(letter.page) + "\" src=\"" + pngUri(letter.png) + "\">\n";
+std::string pictureOf(Sheet const& sheet) {
+    if (sheet.png.empty())
+        return "<p>" + isolated(sheet.whyNoPicture) + "</p>\n";
+    return "<img alt=\"page " + std::to_string(sheet.page) + "\" src=\"" + pngUri(sheet.png) + "\">\n";
 }
 
-std::string figureOf(Letter const& letter, std::string const& anchor) {
-    return "<figure><div class=\"sheet\" style=\"--w:" + std::to_string(std::max(letter.width, 1)) +
-           ";--h:" + std::to_string(std::max(letter.height, 1)) + "\">\n" + pictureOf(letter) +
-           overlaysOf(letter, anchor) + "</div>\n<figcaption>Page " + std::to_string(letter.page) +
+std::string figureOf(Letter const& letter, std::size_t place, std::string const& anchor) {
+    Sheet const& sheet = letter.sheets[place];
+    return "<figure><div class=\"sheet\" style=\"--w:" + std::to_string(std::max(sheet.width, 1)) +
+           ";--h:" + std::to_string(std::max(sheet.height, 1)) + "\">\n" + pictureOf(sheet) +
+           overlaysOf(letter, place, anchor) + "</div>\n<figcaption>Page " + std::to_string(sheet.page) +
            ", on which the fields of this letter were searched.</figcaption></figure>\n";
+}
+
+std::string figuresOf(Letter const& letter, std::string const& anchor) {
+    std::string html;
+    for (std::size_t i = 0; i < letter.sheets.size(); ++i)
+        html += figureOf(letter, i, anchor);
+    return letter.sheets.size() == 1 ? html : "<div>\n" + html + "</div>\n";
 }
 
 /// A field on the picture is reached from its name.
@@ -167,12 +180,23 @@ std::string rowOf(Field const& field, std::string const& anchor) {
            stateSpan(state.words, state.look) + noteOf(field) + "</td></tr>\n";
 }
 
-std::string rowsOf(Zone const& zone, std::string const& anchor) {
+/// A zone on the picture is reached from its name.
+std::string zoneCell(Zone const& zone, std::string const& anchor) {
+    std::string const name = escaped(kindOf(zone)) + ' ' + isolated(zone.name);
+    return zone.whyNowhere.empty() ? "<a href=\"#" + anchor + "\">" + name + "</a>" : name;
+}
+
+std::string placeOf(Zone const& zone, std::vector<Sheet> const& sheets) {
+    if (!zone.whyNowhere.empty())
+        return isolated(zone.whyNowhere);
+    return placeOf(zone.box) + (zone.isByPoint ? ", the text nearest to its point" : "") +
+           (zone.sheet > 0 ? ", page " + std::to_string(sheets[zone.sheet].page) : std::string());
+}
+
+std::string rowsOf(Zone const& zone, std::vector<Sheet> const& sheets, std::string const& anchor) {
     std::string html = "<tbody>\n<tr class=\"group\" id=\"" + rowAnchor(anchor) +
-                       "\"><th scope=\"rowgroup\" colspan=\"3\"><a href=\"#" + anchor + "\">" +
-                       escaped(kindOf(zone)) + ' ' + isolated(zone.name) + "</a> <small>" +
-                       placeOf(zone.box) + (zone.isByPoint ? ", the text nearest to its point" : "") +
-                       "</small></th></tr>\n";
+                       "\"><th scope=\"rowgroup\" colspan=\"3\">" + zoneCell(zone, anchor) + " <small>" +
+                       placeOf(zone, sheets) + "</small></th></tr>\n";
     for (std::size_t i = 0; i < zone.fields.size(); ++i)
         html += rowOf(zone.fields[i], numbered(anchor, 'f', i));
     return html + "</tbody>\n";
@@ -184,7 +208,7 @@ std::string tableOf(Letter const& letter, std::string const& anchor) {
     std::string html = "<table><caption>Fields, by zone</caption>\n<thead><tr><th scope=\"col\">Field</th>"
                        "<th scope=\"col\">Value</th><th scope=\"col\">State</th></tr></thead>\n";
     for (std::size_t i = 0; i < letter.zones.size(); ++i)
-        html += rowsOf(letter.zones[i], numbered(anchor, 'z', i));
+        html += rowsOf(letter.zones[i], letter.sheets, numbered(anchor, 'z', i));
     return html + "</table>\n";
 }
 
@@ -205,7 +229,7 @@ std::string letterHtml(Letter const& letter, std::string const& anchor, std::str
     std::string const fields = anchor + "t";
     return "<article class=\"letter\" id=\"" + anchor + "\" aria-labelledby=\"" + anchor + "h\">\n" +
            letterHeading(letter, anchor, count) + "<a class=\"skip\" href=\"#" + fields +
-           "\">Skip the picture</a>\n<div class=\"beside\">\n" + figureOf(letter, anchor) +
+           "\">Skip the picture</a>\n<div class=\"beside\">\n" + figuresOf(letter, anchor) +
            "<div class=\"fields\" id=\"" + fields + "\" tabindex=\"-1\">\n" + whyNotOf(letter) +
            tableOf(letter, anchor) + "</div></div>\n</article>\n";
 }

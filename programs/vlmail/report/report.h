@@ -36,26 +36,37 @@ struct Field {
 
 struct Zone {
     std::string name;
+    /// Where it lies on its page.
     Reader::Box box;
     /// A recipient address is searched in it.
     bool isAddressWindow = false;
     /// Found by its most probable point: the box is around the text that was nearest.
     bool isByPoint = false;
     std::vector<Field> fields = {};
+    /// Among the sheets of its letter.
+    std::size_t sheet = 0;
+    /// Why it lies nowhere; then it is not drawn.
+    std::string whyNowhere = {};
 };
 
-struct Letter {
-    /// The first page, on which the fields are searched, and all of them in words.
+/// A page of a letter on which fields were searched.
+struct Sheet {
     int page = 1;
-    std::string pages;
-    /// Why it cannot go out; empty when it can.
-    std::string whyNot = {};
-    /// Of the first page as shown, in 1/100 mm.
+    /// As shown, in 1/100 mm.
     int width = 0;
     int height = 0;
     /// A picture of it, or else why there is none.
     std::string png = {};
     std::string whyNoPicture = {};
+};
+
+struct Letter {
+    /// All its pages in words.
+    std::string pages;
+    /// Why it cannot go out; empty when it can.
+    std::string whyNot = {};
+    /// Its first page, and others on which zones lie.
+    std::vector<Sheet> sheets = {};
     std::vector<Zone> zones = {};
 };
 

@@ -37,7 +37,8 @@ Broken const BROKEN[]{
     {"field-on-the-second-page", "total",
      "other_page: would match \"Total: 12.30 EUR\" on page 2 outside the zone \"Text\"; fields are searched "
      "on "
-     "the first page of a letter: move the text there, or set \"skip_first_page\" if page 1 is a cover "
+     "the first page of a letter: set the zone's \"page\" in \"reading\" to 2, or move the text, or set "
+     "\"skip_first_page\" if page 1 is a cover "
      "sheet"},
     {"no-value-group", "total",
      "value_group: the pattern matches \"Total: 12.30 EUR\", but has no group (?<VAL>...): put one round the "

@@ -163,6 +163,46 @@ TEST_F(ExplanationTest, ForPeopleSaysWhichLinesWereJoined) {
     EXPECT_THAT(out_, HasSubstr("            matches \"Date: today\", joined with the line below, at "));
 }
 
+constexpr char const* PLACED =
+    R"text({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+    {"name": "Total", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 900}, "fields": [
+        {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"}]},
+    {"name": "Nowhere", "fields": []}]}],
+    "pack_presets": [{"name": "P", "reading": {"zones": {"Total": {"page": "last", "anchor": "^Sum", "column": true},
+                                                        "Nowhere": {"page": 3}}}}]})text";
+
+TEST_F(ExplanationTest, TellsWhereReadingPutsAZone) {
+    json::Object const reading = explainedText("one\n\f\n\nSum\nTotal: 17\n", PLACED);
+    json::Array const zones =
+        reading.get("trace").toObject().get("pages").toArray().at(0).toObject().get("zones").toArray();
+    json::Object const total = zones.at(0).toObject();
+    EXPECT_EQ(total.get("page").toInt(), 2);
+    EXPECT_EQ(text(total.get("anchor")),
+              text(R"({"left": 2500, "top": 1847, "right": 3135, "bottom": 2200})"_json));
+    EXPECT_EQ(text(total.get("place")),
+              text(R"({"left": 2500, "top": 1847, "right": 11500, "bottom": 2747})"_json));
+    EXPECT_EQ(text(total.get("location")),
+              text(R"({"left": 0, "top": 0, "right": 9000, "bottom": 900})"_json));
+    EXPECT_TRUE(total.get("column").isTrue());
+    EXPECT_FALSE(total.get("nowhere"));
+    json::Object const nowhere = zones.at(1).toObject();
+    EXPECT_EQ(text(nowhere.get("nowhere")), "\"the letter has no page 3\"");
+    EXPECT_FALSE(nowhere.get("page"));
+}
+
+TEST_F(ExplanationTest, ForPeopleSaysWhereReadingPutsAZone) {
+    explainedText("one\n\f\n\nSum\nTotal: 17\n", PLACED);
+    vlmail({"letter", "--explain", "--settings", (folder_ / "settings.json").string(),
+            (folder_ / "letter.txt").string()});
+    EXPECT_THAT(
+        out_,
+        HasSubstr(
+            "      zone \"Total\", on page 2, column by column, told from the anchor at left 25 mm, top "
+            "18.47 mm: left 25 mm, top 18.47 mm, right 115 mm, bottom 27.47 mm\n"));
+    EXPECT_THAT(out_, HasSubstr("      zone \"Nowhere\", the block nearest to the point 45 mm, 62 mm\n"
+                                "        the letter has no page 3\n"));
+}
+
 TEST_F(ExplanationTest, OfAnInvalidFieldTellsWhatValidationSaid) {
     json::Object const total = field("total");
     EXPECT_EQ(total.get("outcome").textOrEmpty(), "invalid");

@@ -168,7 +168,36 @@ TEST_F(NearMissTest, OnAPageThatIsSkippedSaysSo) {
 TEST_F(NearMissTest, OnAThirdPageOffersNoCoverSheet) {
     EXPECT_THAT(missesOf("one\n\ftwo\n\fRef: 17\n", "^Ref: (?<VAL>\\d+)$"),
                 ElementsAre("other_page: would match \"Ref: 17\" on page 3 in the zone \"Page\"; fields are "
-                            "searched on the first page of a letter: move the text there"));
+                            "searched on the first page of a letter: set the zone's \"page\" in \"reading\" "
+                            "to 3, or move the text"));
+}
+
+constexpr char const* ELSEWHERE_PLACED =
+    R"_({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+    {"name": "Top", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 600}, "fields": [
+        {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"}]}]}],
+    "pack_presets": [{"name": "P", "reading": {"zones": {"Top": {"page": 2, "anchor": "^Sum"}}}}]})_";
+
+TEST_F(NearMissTest, OfAnAnchoredZoneOfAnotherPageIsToldFromTheAnchor) {
+    json::Object const reading = explainedText("one\n\f\n\nSum\n\n\nTotal: 17\n", ELSEWHERE_PLACED);
+    EXPECT_THAT(nearMissesIn(fieldOf(reading, "total")),
+                ElementsAre("zone: would match 10.53 mm below the zone \"Top\": move its bottom from 6 mm to "
+                            "16.53 mm or more"));
+}
+
+TEST_F(NearMissTest, OfAZoneOfAnotherPageIsTheLettersOtherPages) {
+    EXPECT_THAT(
+        nearMissesIn(fieldOf(explainedText("Sum\nTotal: 17\n\fSum\n", ELSEWHERE_PLACED), "total")),
+        ElementsAre(
+            "other_page: would match \"Total: 17\" on page 1 in the zone \"Top\"; the zone lies on page 2: "
+            "set the zone's \"page\" in \"reading\" to 1, or move the text"));
+}
+
+TEST_F(NearMissTest, IsNotSoughtForAZoneThatLiesNowhere) {
+    EXPECT_THAT(nearMissesIn(fieldOf(explainedText("Sum\nTotal: 17\n", ELSEWHERE_PLACED), "total")),
+                IsEmpty());
+    EXPECT_THAT(nearMissesIn(fieldOf(explainedText("one\n\fTotal: 17\n", ELSEWHERE_PLACED), "total")),
+                IsEmpty());
 }
 
 TEST_F(NearMissTest, OfTextFarFromTheZoneSaysHowFar) {

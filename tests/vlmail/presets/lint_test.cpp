@@ -559,6 +559,32 @@ std::vector<Case> const CASES{
       "error /pack_presets/0/reading/zones/Z/page: is no page of a letter: no document that is sent by this "
       "pack "
       "preset can be read | write 1, 2 and so on, \"last\" or \"any\" [reading-refused]"}},
+    {"NothingInAPlaceThatAnAnchorTells",
+     partOf(
+         R"_({"match": "a.*", "pack_preset": "P", "zones": [
+             {"name": "Above", "location": {"left": -1000, "top": -2000, "right": 1000, "bottom": -500},
+              "fields": [{"name": "email", "priority": 2, "send_to_server": true, "value_extract": "^To: (?<VAL>.*)$"}]}]})_",
+         R"_({"name": "P", "reading": {"zones": {"Above": {"anchor": "^Sum:"}}}})_"),
+     {}},
+    {"NothingInZonesThatLieOnDifferentPages",
+     partOf(
+         R"_({"match": "a.*", "pack_preset": "P", "zones": [
+             {"name": "One", "location": {"left": 1000, "top": 2000, "right": 9000, "bottom": 9000},
+              "fields": [{"name": "email", "priority": 2, "send_to_server": true, "value_extract": "^(?<VAL>.*)$"}]},
+             {"name": "Two", "location": {"left": 2000, "top": 2000, "right": 9500, "bottom": 9000},
+              "fields": [{"name": "two", "value_extract": "^(?<VAL>.*)$"}]}]})_",
+         R"_({"name": "P", "reading": {"zones": {"Two": {"page": "last"}}}})_"),
+     {}},
+    {"AMarkInAZoneOfAnotherPage",
+     partOf(
+         presetWith(zoneWith(
+             R"_({"name": "ref", "mark": 1, "obligatory": true, "value_extract": "^Ref: (?<VAL>\\S+)$"})_")),
+         R"_({"name": "P", "reading": {"zones": {"Z": {"page": "any"}}}})_"),
+     {"error /extract_presets/0/zones/0/fields/1/mark: the mark begins letters only where their first page "
+      "has it, and "
+      "\"reading\" puts the zone \"Z\" on another: it separates nothing | move the field to a zone of the "
+      "first page, or "
+      "remove \"mark\" [reading-mark-elsewhere]"}},
     {"AZoneThatIsReadAndNotThere",
      partOf(presetWith(zoneWith("")),
             R"_({"name": "P", "reading": {"zones": {"z": {"page": 2}, "Other": {}}}})_"),

@@ -26,10 +26,7 @@ Zone addressWindow() {
 }
 
 Report::Letter letterWith(std::vector<Zone> zones) {
-    Report::Letter letter{1, "page 1"};
-    letter.width = 20000;
-    letter.height = 30000;
-    letter.png = "png";
+    Report::Letter letter{"page 1", {}, {{1, 20000, 30000, "png"}}};
     letter.zones = std::move(zones);
     return letter;
 }
@@ -50,8 +47,9 @@ std::string sectionWith(Field const& field) {
 Report::Document hostileDocument() {
     Field field{HOSTILE, HOSTILE, Field::State::Invalid, HOSTILE, {Reader::Box{0, 0, 10, 10}}};
     Report::Letter letter = letterWith({{HOSTILE, {0, 0, 100, 100}, true, true, {field}}});
-    letter.pages = letter.whyNot = letter.whyNoPicture = HOSTILE;
-    letter.png.clear();
+    letter.zones.push_back({HOSTILE, {}, false, false, {}, 0, HOSTILE});
+    letter.pages = letter.whyNot = letter.sheets[0].whyNoPicture = HOSTILE;
+    letter.sheets[0].png.clear();
     return {HOSTILE, "", HOSTILE, HOSTILE, false, {letter}};
 }
 
@@ -108,8 +106,8 @@ TEST(ReportPicture, IsInThePage) {
 
 TEST(ReportPicture, IsReplacedByTheReasonThatThereIsNone) {
     Report::Letter letter = letterWith({});
-    letter.png.clear();
-    letter.whyNoPicture = "too large";
+    letter.sheets[0].png.clear();
+    letter.sheets[0].whyNoPicture = "too large";
     std::string const html = section(documentWith({letter}), 1);
     EXPECT_THAT(html, HasSubstr("too large"));
     EXPECT_THAT(html, Not(HasSubstr("<img")));
@@ -170,7 +168,7 @@ TEST(ReportOverlay, DrawsLargeZonesUnderSmallOnes) {
 
 TEST(ReportOverlay, IsLeftOutForAPageWithoutSize) {
     Report::Letter letter = letterWith({addressWindow()});
-    letter.width = 0;
+    letter.sheets[0].width = 0;
     EXPECT_THAT(section(documentWith({letter}), 1), Not(HasSubstr("aria-label=\"address window")));
 }
 
@@ -245,6 +243,41 @@ TEST(ReportPage, HasAPictureForEachLetter) {
     std::string const html = wholePage({documentWith({letter, letter}), documentWith({letter})});
     EXPECT_EQ(matchesOf(html, "(<article)").size(), 3U);
     EXPECT_EQ(matchesOf(html, "(<img)").size(), 3U);
+}
+
+TEST(ReportLetter, HasAPictureOfEachPageOnWhichZonesLie) {
+    Zone total{"Total",
+               {5000, 6000, 7000, 9000},
+               false,
+               false,
+               {{"total", "5", Field::State::Found, "", {Reader::Box{5000, 6000, 7000, 6300}}}}};
+    total.sheet = 1;
+    Report::Letter letter = letterWith({addressWindow(), total});
+    letter.sheets.push_back({3, 10000, 30000, "png"});
+    std::string const html = section(documentWith({letter}), 1);
+    std::size_t const second = html.find("<figcaption>Page 1,");
+    ASSERT_NE(second, html.npos);
+    std::string const first = html.substr(0, second);
+    std::string const rest = html.substr(second);
+    EXPECT_THAT(first, HasSubstr("id=\"d1l1z1\""));
+    EXPECT_THAT(first, Not(HasSubstr("id=\"d1l1z2")));
+    EXPECT_THAT(rest,
+                HasSubstr("id=\"d1l1z2\" href=\"#d1l1z2r\" style=\"left:50%;top:20%;width:20%;height:10%\""));
+    EXPECT_THAT(rest, HasSubstr("id=\"d1l1z2f1\""));
+    EXPECT_THAT(rest, HasSubstr("<figcaption>Page 3, on which"));
+    EXPECT_THAT(rest, HasSubstr(", page 3</small>"));
+    EXPECT_THAT(first, HasSubstr("<div class=\"beside\">\n<div>\n<figure>"));
+}
+
+TEST(ReportLetter, SaysWhyAZoneLiesNowhere) {
+    Zone zone = addressWindow();
+    zone.whyNowhere = "the letter has no page 3";
+    std::string const html = sectionWith(zone);
+    EXPECT_THAT(
+        html,
+        HasSubstr(
+            "colspan=\"3\">address window <bdi>Window</bdi> <small><bdi>the letter has no page 3</bdi>"));
+    EXPECT_THAT(html, Not(HasSubstr("href=\"#d1l1z1\"")));
 }
 
 TEST(ReportPage, RefersToNothingOutside) {
