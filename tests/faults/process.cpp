@@ -16,7 +16,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr int LATE_SECONDS = 20;
+/// Of the clock, which goes on while a busy machine does other things.
+constexpr int LATE_SECONDS = 120;
 
 /// Children's ends are waited for and must not get lost meanwhile; `how` is SIG_BLOCK or SIG_UNBLOCK.
 void holdChildSignals(int how) {

@@ -17,8 +17,8 @@ struct Ended {
     bool isLate = false;
 };
 
-/// Runs it in the folder. What it writes and its count stand in files beside the folder meanwhile. After a
-/// minute it is late and killed.
+/// Runs it in the folder. What it writes and its count stand in files beside the folder meanwhile. After two
+/// minutes it is late and killed.
 Ended runWith(Fault const& fault, std::filesystem::path const& program, std::vector<std::string> arguments,
               std::filesystem::path const& folder);
 

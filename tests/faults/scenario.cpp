@@ -112,7 +112,7 @@ Scenario::Files Scenario::files() const {
 
 void Scenario::checkEnd(Fault const& fault, Ended const& ended, Files const& after) {
     if (ended.isLate)
-        find("does not end within a minute");
+        find("does not end within two minutes");
     if (ended.status < 0 && !fault.kills())
         find("dies of signal " + std::to_string(-ended.status));
     if (ended.status < 0)

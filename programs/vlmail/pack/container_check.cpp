@@ -62,6 +62,8 @@ private:
         digest_.add(entry.document, entry.name, entry.length, entry.crc);
         if (++found_[{entry.document, entry.name}] == 2)
             damaged(VlMail::inWords(entry), "it stands in the index twice");
+        if (entry.name == Container::JOB_METADATA)
+            damaged(VlMail::inWords(entry), "it has the name of the metadata");
     }
 
     /// Metadata of another program says nothing that could be compared.
@@ -71,8 +73,10 @@ private:
                 metadata_ = Mailing::Metadata::fromBlob(blob.bytes);
         } catch (std::exception const&) {
         }
-        if (metadata_ && (entry.name != Container::JOB_METADATA || entry.role != Container::ROLE_FRAMEWORK ||
-                          !entry.document.empty()))
+        // That of another program may have another name, but is of no document either.
+        bool const isOther =
+            metadata_ && (entry.name != Container::JOB_METADATA || entry.role != Container::ROLE_FRAMEWORK);
+        if (isOther || !entry.document.empty())
             damaged("the metadata", "its entry in the index is another than was written");
     }
 

@@ -11,6 +11,7 @@
 #include <zlib.h>
 
 #include <algorithm>
+#include <iterator>
 #include <map>
 #include <set>
 #include <tuple>
@@ -165,27 +166,49 @@ private:
         }
     }
 
+    /// Where blobs that were found begin and end.
+    using Taken = std::map<std::uint64_t, std::uint64_t>;
+
+    /// Whether some of the bytes belong to another blob: an entry may stand in the index twice, or be forged.
+    static bool isTaken(Taken const& taken, FoundBlob const& blob) {
+        auto const behind = taken.lower_bound(blob.offset + blob.length);
+        return behind != taken.begin() && std::prev(behind)->second > blob.offset;
+    }
+
     void findPlainBlobs() {
+        Taken taken;
+        for (Candidate const& candidate : candidates_)
+            taken.emplace(candidate.blob.offset, candidate.blob.offset + candidate.blob.length);
         for (std::size_t const i : unmatchedItems()) {
             Item const& item = remains_.items[i];
             std::uint64_t const position = positionOf(item);
             if (item.length == 0 || item.length > file_.size() || position > file_.size() - item.length)
                 continue;
             FoundBlob const blob{position, item.length, item.length, FoundBlob::Form::Plain};
-            if (checksumOf(file_, blob) == item.crc)
-                candidates_.push_back({blob, i});
+            if (isTaken(taken, blob) || checksumOf(file_, blob) != item.crc)
+                continue;
+            taken.emplace(position, position + item.length);
+            candidates_.push_back({blob, i});
         }
         std::stable_sort(candidates_.begin(), candidates_.end(), [](Candidate const& a, Candidate const& b) {
             return a.blob.offset < b.blob.offset;
         });
     }
 
+    /// The first one that the index names, and that reads as metadata where that is wanted: the roles of two
+    /// items may be exchanged.
+    std::vector<Candidate>::iterator findNamedMetadata(bool isReadable) {
+        return std::find_if(candidates_.begin(), candidates_.end(), [&](Candidate const& candidate) {
+            return candidate.item && isMetadata(remains_.items[*candidate.item]) &&
+                   (!isReadable || asMetadata(candidate));
+        });
+    }
+
     /// The one that the index names, else the last one that reads as metadata.
     void chooseMetadata() {
-        auto chosen =
-            std::find_if(candidates_.begin(), candidates_.end(), [this](Candidate const& candidate) {
-                return candidate.item && isMetadata(remains_.items[*candidate.item]);
-            });
+        auto chosen = findNamedMetadata(true);
+        if (chosen == candidates_.end())
+            chosen = findNamedMetadata(false);
         if (chosen != candidates_.end()) {
             metadata_ = asMetadata(*chosen);
         } else {

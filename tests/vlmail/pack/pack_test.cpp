@@ -405,6 +405,19 @@ TEST_F(PackVerify, LetsTheMetadataOfOtherProgramsBe) {
     EXPECT_EQ(out_, file_.string() + ": 3 pages of 2 documents, all whole\n");
 }
 
+TEST_F(PackVerify, FindsAPageThatPassesForTheMetadata) {
+    packWithDigest(PAGES);
+    std::string bytes = read(file_);
+    std::string const page = "role=\"page\"", framework = "role=\"framework\"";
+    bytes.replace(bytes.find(framework), framework.size(), page);
+    bytes.replace(bytes.find(page), page.size(), framework);
+    write(bytes);
+    EXPECT_EQ(run({"verify", file_.string()}), 1);
+    EXPECT_THAT(out_,
+                HasSubstr("damaged: the metadata: its entry in the index is another than was written\n"));
+    EXPECT_THAT(out_, HasSubstr("damaged: page DDT440001.TDD of \"\": it has the name of the metadata\n"));
+}
+
 TEST_F(PackVerify, RefusesManyEmptyItemsInFewLines) {
     std::string const blob = textOf(zipped(pdf("x")));
     std::string items = item("1", 0, blob);
