@@ -37,9 +37,12 @@ constexpr std::string_view SETTINGS = R"json({"presets": {
         {"name": "count", "value_type": 1, "value_extract": "^Count:\\h*(?<VAL>.+)$", "ignore_on_group": 1},
         {"name": "date", "value_type": 3, "value_extract": "^Date:\\h*(?<VAL>.+)$",
          "value_match": "(?<day>\\d{1,2})\\. (?<month>\\w+) (?<year>\\d{4})"},
-        {"name": "ref", "mark": 1, "send_to_server": true, "value_extract": "^Ref:\\h*(?<VAL>.+)$"}]}]}],
+        {"name": "ref", "mark": 1, "send_to_server": true, "value_extract": "^Ref:\\h*(?<VAL>.+)$"}]},
+    {"name": "Behind", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 3000}, "fields": [
+        {"name": "behind", "value_extract": "^(?<VAL>.+)$"}]}]}],
 "pack_presets": [{"name": "Letters", "process_mode": 3,
-    "reading": {"decimal": ",", "grouping": ".", "months": "de"}}]}})json";
+    "reading": {"decimal": ",", "grouping": ".", "months": "de",
+                "zones": {"Behind": {"page": "any", "anchor": "^Ref:", "column": true}}}}]}})json";
 
 void require(bool holds) {
     if (!holds)
