@@ -2,6 +2,7 @@
 // scripts/torture goes through all of them.
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
+#include "tests/faults/served_command.h"
 
 #include <gmock/gmock.h>
 
@@ -15,7 +16,7 @@ using namespace Faults;
 /// Every call is tried up to so many; of more, so many at even distances.
 constexpr long MAX_POINTS = 100;
 /// Of those that there are hundreds or tens of thousands of, and that differ less.
-constexpr long MAX_POINTS_OF_OFTEN = 24;
+constexpr long MAX_POINTS_OF_OFTEN = 16;
 constexpr long MAX_POINTS_OF_SERVICE = 12;
 
 /// One command in which no allocation of its beginning, which all commands share, is left out.
@@ -73,6 +74,26 @@ TEST(ACheckOfAMailing, DoesNotTakeADiskThatFailsForDamage) {
         EXPECT_EQ(ended.status != 0, isTold) << number << ": " << ended.out << ended.err;
     }
 }
+
+class CommandsThatAskAService : public testing::TestWithParam<std::string> {};
+
+TEST_P(CommandsThatAskAService, LoseNothingAndDoubleNothingWhenTheirCallsFail) {
+    ServedCommand command(GetParam());
+    long tried = 0;
+    for (std::string const& call : CALLS) {
+        std::vector<Fault> const faults = faultsOf(call);
+        for (long const point : pointsOf(command.callsOf(call), MAX_POINTS_OF_SERVICE)) {
+            Fault fault = faults[static_cast<std::size_t>(tried++) % faults.size()];
+            fault.number = point;
+            EXPECT_THAT(command.run(fault), testing::IsEmpty())
+                << "to repeat: scripts/torture --repeat " << GetParam() << ' ' << fault.text();
+        }
+    }
+    EXPECT_GT(tried, 3);
+}
+
+INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsThatAskAService, testing::ValuesIn(ServedCommand::NAMES),
+                         [](auto const& each) { return each.param; });
 
 class AServiceWhoseCallsFail : public testing::TestWithParam<std::string> {};
 

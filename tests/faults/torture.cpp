@@ -5,6 +5,7 @@
 //     torture --each COMMAND CALL [STEP]   each call of a kind, or each so many, in each way that it can fail
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
+#include "tests/faults/served_command.h"
 
 #include <algorithm>
 #include <chrono>
@@ -26,18 +27,6 @@ bool say(std::string const& command, Fault const& fault, std::vector<std::string
     return !findings.empty();
 }
 
-int repeat(std::string const& name, std::string const& text) {
-    auto const command = std::ranges::find(commands(), name, &Command::name);
-    bool const isService = name == SERVICE;
-    auto const fault = Fault::parse(text);
-    if ((command == commands().end() && !isService) || !fault) {
-        std::cerr << "torture: there is no command " << name << " or no fault " << text << '\n';
-        return 1;
-    }
-    auto const findings = isService ? OneJob().run(*fault) : Scenario(*command).run(*fault);
-    return say(name, *fault, findings) ? 1 : 0;
-}
-
 /// What may be run with a fault, and how often it makes calls of each kind.
 struct Subject {
     std::string name;
@@ -46,18 +35,44 @@ struct Subject {
     std::map<std::string, long> calls = {};
 };
 
-template<typename Runner>
-Subject subjectOf(std::string const& name, std::shared_ptr<Runner> const& runner) {
-    return {name, [=](std::string const& call) { return runner->callsOf(call); },
-            [=](Fault const& fault) { return runner->run(fault); }};
+/// Made when it is first run: each makes a run of its own first, or starts a service.
+template<typename Runner, typename... Arguments>
+Subject subjectOf(std::string const& name, Arguments... arguments) {
+    auto const runner = std::make_shared<std::shared_ptr<Runner>>();
+    auto const made = [=]() -> Runner& {
+        if (!*runner)
+            *runner = std::make_shared<Runner>(arguments...);
+        return **runner;
+    };
+    return {name, [=](std::string const& call) { return made().callsOf(call); },
+            [=](Fault const& fault) { return made().run(fault); }};
 }
 
 std::vector<Subject> allSubjects() {
     std::vector<Subject> subjects;
     for (Command const& command : commands())
-        subjects.push_back(subjectOf(command.name, std::make_shared<Scenario>(command)));
-    subjects.push_back(subjectOf(SERVICE, std::make_shared<OneJob>()));
+        subjects.push_back(subjectOf<Scenario>(command.name, command));
+    for (std::string const& name : ServedCommand::NAMES)
+        subjects.push_back(subjectOf<ServedCommand>(name, name));
+    subjects.push_back(subjectOf<OneJob>(SERVICE));
     return subjects;
+}
+
+/// The one of that name, or none.
+std::vector<Subject> subjectsOf(std::string const& name) {
+    std::vector<Subject> subjects = allSubjects();
+    std::erase_if(subjects, [&](Subject const& subject) { return subject.name != name; });
+    return subjects;
+}
+
+int repeat(std::string const& name, std::string const& text) {
+    std::vector<Subject> const subjects = subjectsOf(name);
+    auto const fault = Fault::parse(text);
+    if (subjects.empty() || !fault) {
+        std::cerr << "torture: there is no command " << name << " or no fault " << text << '\n';
+        return 1;
+    }
+    return say(name, *fault, subjects.front().run(*fault)) ? 1 : 0;
 }
 
 class Sweep {
@@ -84,19 +99,18 @@ private:
 };
 
 int each(std::string const& name, std::string const& call, long step) {
-    std::vector<Subject> const subjects = allSubjects();
-    auto const subject = std::ranges::find(subjects, name, &Subject::name);
-    if (subject == subjects.end() || std::ranges::find(CALLS, call) == CALLS.end() || step < 1) {
+    std::vector<Subject> const subjects = subjectsOf(name);
+    if (subjects.empty() || std::ranges::find(CALLS, call) == CALLS.end() || step < 1) {
         std::cerr << "torture: there is no command " << name << " or no call " << call << '\n';
         return 1;
     }
     bool isFound = false;
-    long const calls = subject->count(call);
+    long const calls = subjects.front().count(call);
     std::cout << name << " makes " << calls << " calls of " << call << std::endl;
     for (long number = 1; number <= calls; number += step)
         for (Fault fault : faultsOf(call)) {
             fault.number = number;
-            isFound = say(name, fault, subject->run(fault)) || isFound;
+            isFound = say(name, fault, subjects.front().run(fault)) || isFound;
         }
     return isFound ? 1 : 0;
 }
