@@ -458,4 +458,27 @@ TEST_F(ReadingContainers, FailForEveryFlippedBitOfTheTrailer) {
     }
 }
 
+std::string manyItems(int count) {
+    std::string items;
+    for (int i = 0; i < count; ++i)
+        items += "<mailitem/>";
+    return items;
+}
+
+TEST_F(ReadingContainers, RefusesMoreItemsThanTheFileHasRoomForBlobs) {
+    write(trailingLayout(blobOf("page"), indexOf(manyItems(100'001))));
+    EXPECT_TRUE(open().failed());
+    EXPECT_THAT(log_.take(),
+                testing::Contains(LogLine{4, "Failed to parse file " + quoted() +
+                                                 ". Import failed. Error: the index has more elements than "
+                                                 "the file has room for blobs."}));
+}
+
+TEST_F(ReadingContainers, TakesManyItemsWhereTheFileHasRoomForThem) {
+    write(trailingLayout(blobOf("page"), indexOf(manyItems(90'000))));
+    EXPECT_EQ(open().szBins(), 90'000u);
+    write(trailingLayout(blobOf(std::string(20'000 * 11, 'x')), indexOf(manyItems(110'000))));
+    EXPECT_EQ(open().szBins(), 110'000u);
+}
+
 } // namespace

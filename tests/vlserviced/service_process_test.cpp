@@ -14,6 +14,7 @@
 #include "vlservice/ipc/set_svc_cfg.h"
 #include "vlservice/ipc/upload_queued.h"
 
+#include <SQLiteCpp/Database.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -22,6 +23,7 @@
 #include <csignal>
 #include <fstream>
 #include <set>
+#include <stdexcept>
 #include <thread>
 
 namespace {
@@ -82,6 +84,33 @@ TEST_F(ServiceProcessTest, TellsErrorsOfCommandsWithoutAnAnswerAsErrors) {
         failureOf([&] { client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", "p1"); });
     EXPECT_NE(text.find("there is no pack database " + (folder_ / "packs.db").string()), std::string::npos)
         << text;
+}
+
+TEST_F(ServiceProcessTest, AnswersAtOnceWhileOthersNameAPackDatabaseThatSomebodyHolds) {
+    constexpr int WAITING = 20, QUESTIONS = 200;
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1");
+    SQLite::Database holder(database.string(), SQLite::OPEN_READWRITE);
+    holder.exec("BEGIN EXCLUSIVE");
+    ServiceProcess const service(arguments());
+    std::atomic<int> answered = 0;
+    std::vector<std::thread> others;
+    for (int i = 0; i < WAITING; ++i)
+        others.emplace_back([&] {
+            failureOf([&] {
+                clientOf(service, data_)->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", "p1");
+                throw std::runtime_error("taken");
+            });
+            ++answered;
+        });
+    auto const client = clientOf(service, data_);
+    for (int i = 0; i < QUESTIONS; ++i)
+        client->call<Ipc::GetSvcCfg>();
+    // Each of the others waits for some seconds: had they been waited for, all would be through.
+    EXPECT_LT(answered, WAITING);
+    holder.exec("COMMIT");
+    for (std::thread& other : others)
+        other.join();
 }
 
 TEST_F(ServiceProcessTest, RefusesASecondProcessOnItsFolder) {

@@ -1,5 +1,6 @@
 #include "vlservice/pack/index_xml.h"
 
+#include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
 #include "vlservice/pack/index_tags.h"
 #include "vlservice/pack/xml_depth.h"
@@ -69,6 +70,12 @@ std::unique_ptr<TiXmlElement> makeMailing(std::string const& packId, std::deque<
     return mailing;
 }
 
+bool hasTooManyElements(std::string_view index, std::uint64_t bytesBesideIt) {
+    auto const elements = static_cast<std::uint64_t>(std::count(index.begin(), index.end(), '<'));
+    return elements > UNPROVEN_ELEMENTS &&
+           (elements - UNPROVEN_ELEMENTS) > bytesBesideIt / DB_ZIP_HEADER_SIZE;
+}
+
 bool print(std::ostream& out, std::string const& packId, std::deque<BinEntry> const& items) {
     TiXmlDocument document;
     document.LinkEndChild(new TiXmlDeclaration("1.0", "UTF-8", "yes"));
@@ -114,10 +121,12 @@ bool mayStandInIndex(std::string_view text) {
     });
 }
 
-std::string parseIndex(TiXmlDocument& document, std::string text) {
+std::string parseIndex(TiXmlDocument& document, std::string text, std::uint64_t bytesBesideIt) {
     text.resize(std::min(text.find('\0'), text.size()));
     if (isNestedDeeperThan(MAX_XML_DEPTH, text))
         return "Error: elements are nested too deep.";
+    if (hasTooManyElements(text, bytesBesideIt))
+        return "Error: the index has more elements than the file has room for blobs.";
     // Text that is no UTF-8 is read byte by byte whatever it declares: TinyXML takes the length of a
     // character from its first byte and would run over markup, or past the end.
     TiXmlEncoding const encoding = isUtf8(text) ? TIXML_ENCODING_UNKNOWN : TIXML_ENCODING_LEGACY;

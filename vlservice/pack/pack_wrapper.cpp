@@ -210,8 +210,9 @@ void PackWrapper::findIndex() {
         auto text = readText(fileStream_, *place);
         if (!text)
             return fail("Failed to read from file ", ". Import failed, system error code ");
+        auto const beside = static_cast<std::uint64_t>(fileEnd_) - text->size();
         TiXmlDocument doc;
-        errorText = Container::parseIndex(doc, std::move(*text));
+        errorText = Container::parseIndex(doc, std::move(*text), beside);
         if (errorText.empty())
             return importCorbulet(doc, place->blobStart);
     }
