@@ -113,6 +113,15 @@ std::string withAnyBlanks(std::string_view pattern) {
     return result;
 }
 
+std::string labelIn(std::string_view pattern) {
+    std::array const groups = valueGroups();
+    for (Cut const& cut : cutsOf(pattern))
+        if (std::any_of(groups.begin(), groups.end(),
+                        [&](std::string const& group) { return cut.rest.starts_with(group); }))
+            return cut.front;
+    return {};
+}
+
 std::string withWholeAsValue(std::string_view pattern) {
     std::string inner(pattern);
     for (std::string const& group : valueGroups())

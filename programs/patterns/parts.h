@@ -30,6 +30,9 @@ Anchors anchorsOf(std::string_view pattern);
 /// The pattern with each run of blanks as any number of them.
 std::string withAnyBlanks(std::string_view pattern);
 
+/// What of the pattern stands in front of its value; nothing when that cannot be told.
+std::string labelIn(std::string_view pattern);
+
 /// The pattern with all that it matches for its value.
 std::string withWholeAsValue(std::string_view pattern);
 

@@ -1,7 +1,7 @@
 #include "programs/reader/field_search.h"
 
 #include "programs/base/error.h"
-#include "programs/reader/joined_search.h"
+#include "programs/reader/field_labels.h"
 #include "programs/reader/value_reading.h"
 
 #include <algorithm>
@@ -124,19 +124,27 @@ void FieldSearch::searchJoinedLines(Sight& sight) {
 
 void FieldSearch::searchJoinedLines(Try& field, ZoneText& text) {
     ExtractField const& definition = *field.trace.definition;
-    auto const isValid = [&](ExtractedField const& found) {
-        ExtractedField value(found);
-        try {
-            readValue(definition, value, rules_);
-            return value.isValid();
-        } catch (std::exception const&) {
-            return true; // It is said when the value is taken.
-        }
-    };
-    auto value = inTime(field, [&] { return cutJoinedField(definition, text, field.trace, isValid); });
+    auto const judge = [&](ExtractedField const& found) { return worthOf(definition, found); };
+    auto value = inTime(field, [&] { return cutJoinedField(definition, text, field.trace, judge); });
     if (value)
         takeValue(field, std::move(value));
     requireTime(definition);
+}
+
+Worth FieldSearch::worthOf(ExtractField const& field, ExtractedField const& found) const {
+    FieldLabels labels;
+    for (SearchedZone const& zone : zones_)
+        for (ExtractField const& other : zone.definition->fields())
+            labels.add(other);
+    if (labels.haveAll(found.rawValue().textOrEmpty(), field))
+        return Worth::None;
+    ExtractedField value(found);
+    try {
+        readValue(field, value, rules_);
+        return value.isValid() ? Worth::Good : Worth::Poor;
+    } catch (std::exception const&) {
+        return Worth::Good; // It is said when the value is taken.
+    }
 }
 
 template<typename Cut>

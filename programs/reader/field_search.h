@@ -1,6 +1,7 @@
 #pragma once
 // The fields of one letter, searched zone by zone.
 
+#include "programs/reader/joined_search.h"
 #include "programs/reader/pattern_time.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
@@ -87,6 +88,8 @@ private:
     void search(Cfg::ExtractField const& field, Sight& sight);
     void searchJoinedLines(Sight& sight);
     void searchJoinedLines(Try& field, ZoneText& text);
+    /// Of a value in joined lines: the labels of other fields are none.
+    Worth worthOf(Cfg::ExtractField const& field, Cfg::ExtractedField const& found) const;
     bool hasFound(std::string const& name) const;
     void takeValue(Try& field, std::shared_ptr<Cfg::ExtractedField> value);
     /// What `cut` gives of the field, in what is left of its time.

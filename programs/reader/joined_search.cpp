@@ -106,10 +106,10 @@ std::string cutLines(LineJoin const& join, std::vector<PlacedLine> const& lines,
     return cut;
 }
 
-/// The first hit with a good value, or else the first.
+/// The first hit with a good value, or else the first with a poor one.
 std::optional<JoinedHit> bestHit(ExtractField const& field, ZoneText const& text,
                                  std::vector<PlacedLine> const& lines, FieldTrace& trace,
-                                 IsGood const& isGood) {
+                                 Judge const& judge) {
     std::optional<JoinedHit> best;
     for (LineJoin const& join : joinsOf(lines)) {
         JoinedText joined(text, lines, join);
@@ -118,9 +118,10 @@ std::optional<JoinedHit> bestHit(ExtractField const& field, ZoneText const& text
         std::optional<JoinedHit> hit = searchIn(field, joined, trace);
         if (trace.failure)
             break;
-        if (hit && isGood(*hit->value))
+        Worth const worth = hit ? judge(*hit->value) : Worth::None;
+        if (worth == Worth::Good)
             return hit;
-        if (hit && !best)
+        if (worth == Worth::Poor && !best)
             best = std::move(hit);
     }
     return best;
@@ -135,9 +136,9 @@ bool FieldTrace::wantsJoinedLines() const {
 }
 
 std::shared_ptr<ExtractedField> cutJoinedField(ExtractField const& field, ZoneText& text, FieldTrace& trace,
-                                               IsGood const& isGood) {
+                                               Judge const& judge) {
     std::vector<PlacedLine> const lines = text.placedLines();
-    std::optional<JoinedHit> hit = bestHit(field, text, lines, trace, isGood);
+    std::optional<JoinedHit> hit = bestHit(field, text, lines, trace, judge);
     if (!hit)
         return nullptr;
     trace.cut = cutLines(hit->join, lines, text);

@@ -11,13 +11,14 @@
 
 namespace Reader {
 
-/// Whether a value is as it should be; a search goes on for a better one where it is not.
-using IsGood = std::function<bool(Cfg::ExtractedField const&)>;
+/// What a value is worth: a search goes on for a better one than a poor one.
+enum class Worth { None, Poor, Good };
+using Judge = std::function<Worth(Cfg::ExtractedField const&)>;
 
 /// Tries the field's pattern on joined lines of the text, each join by itself. The first good value counts,
-/// or else the first; the lines that it was found in leave the text. Gives null, and adds nothing to the
-/// trace but a failure, when there is none.
+/// or else the first poor one; the lines that it was found in leave the text. Gives null, and adds nothing to
+/// the trace but a failure, when there is none.
 std::shared_ptr<Cfg::ExtractedField> cutJoinedField(Cfg::ExtractField const& field, ZoneText& text,
-                                                    FieldTrace& trace, IsGood const& isGood);
+                                                    FieldTrace& trace, Judge const& judge);
 
 } // namespace Reader

@@ -66,14 +66,6 @@ Stretch linesOf(ZoneText const& text, LineHit const& hit) {
     return text.stretch(begin, end - 1 - begin);
 }
 
-/// What of the pattern stands in front of its value.
-std::string labelIn(std::string const& pattern) {
-    for (Patterns::Cut const& cut : Patterns::cutsOf(pattern))
-        if (cut.rest.starts_with("(?<" + ExtractField::REGEX_VALUE_GROUP_MARK + '>'))
-            return cut.front;
-    return {};
-}
-
 /// Whether there are words in the label.
 bool isTelling(std::string const& label) {
     std::size_t characters = 0;
@@ -134,7 +126,7 @@ MarkWatch::Mark MarkWatch::markOf(Cfg::ExtractZone const& zone, ExtractField con
                {withPattern(field, plain), true, LOOK_ALIKES},
                {withPattern(field, Patterns::withAnyBlanks(pattern)), false, OTHER_BLANKS}},
               {}};
-    if (std::string const label = labelIn(loose); isTelling(label))
+    if (std::string const label = Patterns::labelIn(loose); isTelling(label))
         mark.label = Reading{withPattern(field, Patterns::withWholeAsValue(label)), true, ""};
     return mark;
 }

@@ -116,6 +116,14 @@ TEST(PatternParts, TakeAnyBlanksInThePlaceOfBlanks) {
     EXPECT_EQ(withAnyBlanks(" a "), "\\h*a\\h*");
 }
 
+TEST(PatternParts, FindTheLabelInFrontOfTheValue) {
+    EXPECT_EQ(labelIn(R"(^Total:\h*(?<VAL>.+)$)"), R"(^Total:\h*)");
+    EXPECT_EQ(labelIn(R"(^No (?'VAL'\d+))"), "^No ");
+    EXPECT_EQ(labelIn(R"((?<VAL>.+))"), "");
+    EXPECT_EQ(labelIn(R"(^(?:a(?<VAL>.+)))"), "");
+    EXPECT_EQ(labelIn(R"(a(?<VAL>.)|b)"), "");
+}
+
 TEST(PatternParts, MakesTheWholeMatchTheValue) {
     EXPECT_EQ(withWholeAsValue("a(?<VAL>b)(?'VAL'c)"), "(?<VAL>a(?:b)(?:c))");
     EXPECT_TRUE(hasValueGroup("a(?<VAL>b)"));

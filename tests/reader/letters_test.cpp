@@ -278,6 +278,19 @@ TEST(ApartFields, PreferTheNearestValueThatIsValid) {
                 ElementsAre(Pair("no", "\"Date\"")));
 }
 
+TEST(ApartFields, AreNotTheLabelsOfOtherFields) {
+    auto const fields = R"_([{"name": "no", "value_extract": "^No\\h*(?<VAL>.+)$"},
+                             {"name": "date", "value_extract": "^Date\\h*(?<VAL>\\d.*)$"},
+                             {"name": "total", "value_extract": "^Total\\h*(?<VAL>\\d.*)$"}])_";
+    EXPECT_THAT(
+        valuesOf(lettersOf("No        Date       Total\n17        18         5", presetWith(fields)).at(0)),
+        ElementsAre(Pair("no", "\"17\""), Pair("date", "\"18\""), Pair("total", "\"5\"")));
+    // A value may begin with what is a label elsewhere, and nothing is better than a label.
+    EXPECT_THAT(valuesOf(lettersOf("No        Date of issue", presetWith(fields)).at(0)),
+                ElementsAre(Pair("no", "\"Date of issue\"")));
+    EXPECT_THAT(valuesOf(lettersOf("No        Date", presetWith(fields)).at(0)), IsEmpty());
+}
+
 TEST(ApartFields, TakeTheirLinesOutOfTheZone) {
     auto const fields = R"_([{"name": "one", "value_extract": "^No\\h*(?<VAL>\\d+)"},
                              {"name": "two", "value_extract": "^No\\h*(?<VAL>\\d+)"}])_";

@@ -93,8 +93,9 @@ std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const 
     trace.definition = &field;
     std::shared_ptr<ExtractedField> value = cutAsItStands(field, text, trace);
     if (trace.wantsJoinedLines() && !isGivenUp()) {
-        value = cutJoinedField(field, text, trace,
-                               [&](ExtractedField const& found) { return isValid(field, found); });
+        value = cutJoinedField(field, text, trace, [&](ExtractedField const& found) {
+            return isValid(field, found) ? Reader::Worth::Good : Reader::Worth::Poor;
+        });
         if (trace.failure)
             failures_.push_back(*trace.failure);
     }
