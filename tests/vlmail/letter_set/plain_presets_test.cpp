@@ -1,0 +1,99 @@
+// Presets as people write them first, on letters as companies send them: what of them is found.
+#include "tests/support/temporary_folder.h"
+#include "tests/support/time_zone.h"
+#include "tests/vlmail/letter_set/letter_set.h"
+#include "tests/vlmail/run_vlmail.h"
+#include "vlservice/json/json_text.h"
+
+#include <gmock/gmock.h>
+
+#include <cstddef>
+#include <fstream>
+#include <map>
+#include <set>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace {
+
+using testing::IsEmpty;
+
+class PlainPresets : public testing::Test {
+protected:
+    PlainPresets() {
+        json::Array extractPresets;
+        json::Array packPresets;
+        for (LetterSet::Letter const& letter : letters_) {
+            std::ofstream(folder_ / letter.name.c_str(), std::ios::binary) << letter.pdf;
+            extractPresets.append(letter.extractPreset);
+            packPresets.append(letter.packPreset);
+        }
+        std::ofstream(settings_) << json::Object{{"extract_presets", extractPresets},
+                                                 {"pack_presets", packPresets}};
+    }
+
+    /// One line of JSON a letter.
+    std::vector<std::string> read() const {
+        std::vector<std::string> arguments{"letter", "--json", "--settings", settings_};
+        for (LetterSet::Letter const& letter : letters_)
+            arguments.push_back((folder_ / letter.name.c_str()).string());
+        std::istringstream out(runVlMail(arguments).out);
+        std::vector<std::string> lines;
+        for (std::string line; std::getline(out, line);)
+            lines.push_back(line);
+        return lines;
+    }
+
+    VLServiceTest::TimeZone const utc_{"UTC"};
+    TemporaryFolder const folder_;
+    std::string const settings_ = (folder_ / "node.json").string();
+    std::vector<LetterSet::Letter> const letters_ = LetterSet::all();
+};
+
+std::string inText(json::Value const& value) {
+    std::ostringstream text;
+    text << value;
+    return text.str();
+}
+
+/// "NAME: FIELD is VALUE", of fields that are missing or not as they should be.
+std::vector<std::string> misread(LetterSet::Letter const& letter, std::string const& line) {
+    json::Array const letters = json::strToObject(line.data(), line.size()).get("letters").toArray();
+    std::map<std::string, json::Value> found;
+    for (json::Value const& field : letters.at(0).toObject().get("fields").toArray())
+        found[field.toObject().get("name").toString()] = field.toObject().get("value");
+    std::vector<std::string> lines;
+    for (auto const& [name, value] : letter.expected)
+        if (inText(found[name]) != inText(value))
+            lines.push_back(letter.name + ": " + name + " is " + inText(found[name]));
+    return lines;
+}
+
+TEST_F(PlainPresets, AreManyAndVaried) {
+    std::set<std::string> names;
+    std::size_t fields = 0;
+    for (LetterSet::Letter const& letter : letters_) {
+        names.insert(letter.name);
+        fields += letter.expected.size();
+    }
+    EXPECT_EQ(names.size(), 42u);
+    EXPECT_EQ(fields, 210u);
+}
+
+TEST_F(PlainPresets, FindAllFieldsOfAllLetters) {
+    std::vector<std::string> const lines = read();
+    ASSERT_EQ(lines.size(), letters_.size());
+    std::vector<std::string> all;
+    for (std::size_t i = 0; i < lines.size(); ++i)
+        for (std::string& one : misread(letters_[i], lines[i]))
+            all.push_back(std::move(one));
+    EXPECT_THAT(all, IsEmpty());
+}
+
+TEST_F(PlainPresets, HaveNoErrorsInTheEyesOfLint) {
+    Ran const ran = runVlMail({"presets", "lint", settings_});
+    EXPECT_THAT(ran.out, testing::HasSubstr(": 0 errors, ")) << ran.out;
+}
+
+} // namespace
