@@ -47,10 +47,10 @@ TEST(Security, HasATestForEachOfItsSixteenPromises) {
     auto const promises = promisesOf(SOURCE_FOLDER "/docs/security.md");
     EXPECT_EQ(promises.size(), 16U);
     std::set<std::string> const tests = declaredTests(SOURCE_FOLDER);
-    for (auto const& [number, text] : promises)
+    for (auto const& promise : promises)
         EXPECT_TRUE(std::ranges::any_of(tests, [&](std::string const& test) {
-            return text.find('`' + test + '`') != std::string::npos;
-        })) << number;
+            return promise.second.find('`' + test + '`') != std::string::npos;
+        })) << promise.first;
 }
 
 TEST(Security, NamesTheTargetOfEveryDoor) {

@@ -25,12 +25,15 @@
 
 #define EXPORTED __attribute__((visibility("default")))
 
+// The C library's own names.
+// NOLINTBEGIN(bugprone-reserved-identifier)
 extern "C" {
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
 void* __libc_realloc(void* block, std::size_t size);
 void* __libc_memalign(std::size_t alignment, std::size_t size);
 }
+// NOLINTEND(bugprone-reserved-identifier)
 
 namespace {
 
@@ -109,6 +112,7 @@ int countingMain(int argc, char** argv, char** environment) {
 
 } // namespace
 
+// The parameters come in parentheses of their own. NOLINTBEGIN(bugprone-macro-parentheses)
 // Defines a function of the C library that fails with -1, where the condition holds, or gives what the
 // library's own gives.
 #define FAILING_IF(condition, Class, Result, name, parameters, arguments)                                    \
@@ -118,9 +122,11 @@ int countingMain(int argc, char** argv, char** environment) {
     }
 #define FAILING(Class, Result, name, parameters, arguments)                                                  \
     FAILING_IF(true, Class, Result, name, parameters, arguments)
+// NOLINTEND(bugprone-macro-parentheses)
 
 extern "C" {
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier)
 EXPORTED int __libc_start_main(Main main, int argc, char** argv, void (*init)(), void (*fini)(),
                                void (*end)(), void* stack) {
     using Start = int (*)(Main, int, char**, void (*)(), void (*)(), void (*)(), void*);

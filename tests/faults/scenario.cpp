@@ -5,6 +5,7 @@
 #include <iterator>
 #include <regex>
 #include <sstream>
+#include <utility>
 
 namespace Faults {
 namespace {
