@@ -212,6 +212,7 @@ void Peer::onGreeting(Frame const& message) {
     case GreetingStep::Verdict::GoesOn:
         return write(step.reply->frame(), [this] { receive(); });
     case GreetingStep::Verdict::Welcome:
+        isKnown_ = true;
         context_->know(shared_from_this());
         return write(step.reply->frame(), [this, seals = step.seals] { onWelcome(seals); });
     case GreetingStep::Verdict::Refused:
@@ -404,6 +405,8 @@ void Peer::giveUp(std::string const& reason) {
 
 void Peer::log(int priority, std::string const& text) const {
     if (priority == TRACE && !g_LogVerbose)
+        return;
+    if (priority == FAILED && !isKnown_ && !context_->mayTellOfStranger())
         return;
     Log::Lock line(priority);
     line.logStreamLine() << "Channel " << name_ << ": " << text;

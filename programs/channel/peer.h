@@ -32,6 +32,8 @@ public:
     virtual void release(std::size_t size) = 0;
     /// Counts an answer that is on its way, of a size or of none any more.
     virtual void holdAnswer(std::shared_ptr<Peer> const& peer, std::size_t size) = 0;
+    /// Counts a line about somebody who has not proved himself; false when it is one too many.
+    virtual bool mayTellOfStranger() = 0;
     /// The peer has proved itself.
     virtual void know(std::shared_ptr<Peer> const& peer) = 0;
     virtual void leave(std::shared_ptr<Peer> const& peer) = 0;
@@ -113,6 +115,8 @@ private:
     std::shared_ptr<Link> link_;
     std::optional<Deadline> deadline_;
     State state_ = State::Greeting;
+    /// Whether the client has proved itself.
+    bool isKnown_ = false;
     /// What becomes of the connection when the deadline is due.
     std::string dueReason_;
     bool isInsideMessage_ = false;

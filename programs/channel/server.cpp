@@ -12,6 +12,7 @@
 
 #include <sys/resource.h>
 
+#include <chrono>
 #include <deque>
 #include <list>
 #include <sstream>
@@ -146,6 +147,16 @@ public:
         dropAnswers();
     }
 
+    bool mayTellOfStranger() override {
+        auto const now = std::chrono::steady_clock::now();
+        if (now - tellingSince_ >= settings_.strangersLinesTime) {
+            tellWhatWasLeftOut();
+            tellingSince_ = now;
+            toldOfStrangers_ = 0;
+        }
+        return ++toldOfStrangers_ <= settings_.strangersLines;
+    }
+
     void know(std::shared_ptr<Peer> const& peer) override {
         strangers_.remove(peer.get());
         // One more may be on its way in; the next ones wait.
@@ -171,6 +182,13 @@ private:
     };
 
     std::size_t known() const { return peers_.size() - strangers_.size(); }
+
+    void tellWhatWasLeftOut() const {
+        if (toldOfStrangers_ > settings_.strangersLines)
+            Log::Lock(FAILED).logStreamLine()
+                << "Channel: of strangers there were " << toldOfStrangers_ - settings_.strangersLines
+                << " more lines.";
+    }
 
     /// The newest one stays: it has just begun.
     void dropAnswers() {
@@ -232,6 +250,8 @@ private:
     std::string fingerprint_;
     std::uint16_t port_ = 0;
     std::optional<tcp::acceptor> acceptor_;
+    std::chrono::steady_clock::time_point tellingSince_ = std::chrono::steady_clock::now();
+    std::size_t toldOfStrangers_ = 0;
     std::optional<asio::steady_timer> retryTimer_;
     std::unordered_set<std::shared_ptr<Peer>> peers_;
     /// Of the peers, those that have not proved themselves; the oldest first.

@@ -25,6 +25,9 @@ struct ServerSettings {
     std::size_t maxConnections = 2000;
     /// Of strangers; when there are more, the one that has been here for the longest goes.
     std::size_t maxStrangers = 256;
+    /// Of the log's lines about strangers in each such time; how many more there were is told behind it.
+    std::size_t strangersLines = 20;
+    std::chrono::milliseconds strangersLinesTime = std::chrono::seconds(10);
     /// For TLS and the exchange of proofs.
     std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
     /// For the rest of a message whose first byte is there, and for a peer to take an answer.

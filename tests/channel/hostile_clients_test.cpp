@@ -8,6 +8,7 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <stdexcept>
@@ -89,6 +90,40 @@ INSTANTIATE_TEST_SUITE_P(
            BadBeginning{"NoObject", greetingOf(0, Kind::Request, 0, "[]"),
                         "JSON error: Wrong type: array. Expected type: object"}),
     [](auto const& instance) { return instance.param.name; });
+
+TEST_F(HostileClients, ThatAreManyFillNoLog) {
+    auto settings = patient();
+    settings.strangersLines = 3;
+    settings.strangersLinesTime = 1h;
+    serve(settings);
+    for (int i = 0; i < 10; ++i) {
+        RawPeer peer(server->port());
+        peer.send("GET / HTTP/1.1\r\n");
+        EXPECT_NE(peer.refusal(), "");
+    }
+    EXPECT_EQ(log.lines().size(), 3u);
+    expectService();
+}
+
+TEST_F(HostileClients, ThatWereLeftOutOfTheLogAreCountedLater) {
+    auto settings = patient();
+    settings.strangersLines = 1;
+    settings.strangersLinesTime = 100ms;
+    serve(settings);
+    auto const isCounted = [this] {
+        auto const lines = log.lines();
+        return std::ranges::any_of(lines, [](std::string const& line) {
+            return line.starts_with("Channel: of strangers there were ") && line.ends_with(" more lines.");
+        });
+    };
+    for (auto const end = std::chrono::steady_clock::now() + 1min;
+         !isCounted() && std::chrono::steady_clock::now() < end;) {
+        RawPeer peer(server->port());
+        peer.send("GET / HTTP/1.1\r\n");
+        EXPECT_NE(peer.refusal(), "");
+    }
+    EXPECT_TRUE(isCounted());
+}
 
 TEST_F(HostileClients, WithAWrongProofAreToldLoggedAndClosed) {
     serve();

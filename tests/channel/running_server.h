@@ -30,6 +30,7 @@ namespace ChannelTest {
 inline Channel::ServerSettings patient() {
     Channel::ServerSettings settings;
     settings.greetingTime = std::chrono::minutes(1);
+    settings.strangersLines = 1'000'000;
     return settings;
 }
 
