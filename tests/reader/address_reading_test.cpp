@@ -17,7 +17,7 @@
 namespace Reader {
 namespace {
 
-using VLServiceTest::operator""_json;
+using namespace VLServiceTest;
 using testing::ElementsAre;
 
 constexpr Box WINDOW{2000, 4500, 11000, 9000};

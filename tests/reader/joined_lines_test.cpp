@@ -14,7 +14,6 @@
 namespace Reader {
 namespace {
 
-using testing::AnyOf;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;

@@ -12,12 +12,11 @@
 namespace Reader {
 namespace {
 
-using VLServiceTest::operator""_json;
+using namespace VLServiceTest;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::Pair;
 using testing::SizeIs;
-using VLServiceTest::text;
 
 /// A preset with one zone over the whole page.
 Cfg::ExtractPreset presetWith(char const* fields) {

@@ -15,12 +15,10 @@
 namespace Reader {
 namespace {
 
-using VLServiceTest::operator""_json;
+using namespace VLServiceTest;
 using testing::ElementsAre;
 using testing::IsEmpty;
-using testing::Pair;
 using testing::SizeIs;
-using VLServiceTest::text;
 
 /// A zone "Top" over the first page's two top lines with a name and the mark "ref", and "Sum" with "total".
 class PlacedZones : public testing::Test {
