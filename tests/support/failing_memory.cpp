@@ -48,5 +48,14 @@ void* operator new(std::size_t size) {
     }
 }
 
+/// A sanitizer's own would not fit to the releasing below.
+void* operator new(std::size_t size, std::nothrow_t const&) noexcept {
+    try {
+        return operator new(size);
+    } catch (std::bad_alloc const&) {
+        return nullptr;
+    }
+}
+
 void operator delete(void* block) noexcept { std::free(block); }
 void operator delete(void* block, std::size_t) noexcept { std::free(block); }

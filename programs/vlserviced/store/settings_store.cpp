@@ -95,6 +95,18 @@ void SettingsStore::addChain(std::string const& id) {
         insertion.exec();
         insertion.reset();
     }
+    if (!missing.empty())
+        requireRoomForNodes();
+}
+
+/// With those that the transaction has added.
+void SettingsStore::requireRoomForNodes() const {
+    SQLite::Statement query(database_, "SELECT count(*), sum(length(CAST(id AS BLOB))) FROM nodes");
+    query.executeStep();
+    if (query.getColumn(0).getInt64() > MAX_NODES || query.getColumn(1).getInt64() > MAX_IDS_BYTES)
+        throw Base::Error("there is no room for more nodes: " + std::to_string(MAX_NODES) +
+                          " are possible, whose ids have " + std::to_string(MAX_IDS_BYTES) +
+                          " bytes together; remove some first");
 }
 
 void SettingsStore::add(std::string const& id) {

@@ -41,7 +41,8 @@ public:
     /// Error when they hold more than MAX_CHAIN_BYTES.
     std::vector<SettingsLevel> chain(std::string const& id) const;
 
-    /// Adds the node, and those above it that are not there yet.
+    /// Adds the node, and those above it that are not there yet. Throws Error, as the others that add nodes,
+    /// when there would be more than MAX_NODES or their ids had more than MAX_IDS_BYTES.
     void add(std::string const& id);
     /// Replaces the node's own value of a part, adding the node when it is new. The empty handle erases it.
     /// Throws Error for more than MAX_PART_BYTES.
@@ -58,9 +59,13 @@ public:
     /// Of the JSON of one part of one node, and of all that a chain holds: an answer has to carry it.
     static constexpr std::size_t MAX_PART_BYTES = 4 << 20;
     static constexpr long long MAX_CHAIN_BYTES = 8 << 20;
+    /// Of all nodes: the tree goes out in one answer.
+    static constexpr long long MAX_NODES = 20'000;
+    static constexpr long long MAX_IDS_BYTES = 4 << 20;
 
 private:
     void addChain(std::string const& id);
+    void requireRoomForNodes() const;
     /// How long the JSON texts of a node's parts are.
     long long bytesOf(std::string const& id) const;
 

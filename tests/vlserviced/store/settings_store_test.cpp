@@ -155,4 +155,27 @@ TEST_F(SettingsStoreTest, ReadsChainsOfABoundedSize) {
         "its nodes hold less");
 }
 
+TEST_F(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
+    std::string const refusal =
+        "there is no room for more nodes: 20000 are possible, whose ids have 4194304 bytes "
+        "together; remove some first";
+    // With the root there are 19,999 then.
+    database_.exec("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 19998) "
+                   "INSERT INTO nodes (id, parent) SELECT 'a=' || i, '' FROM n");
+    EXPECT_EQ(failureOf([&] { store_.add("u=bob/a=acme"); }), refusal);
+    EXPECT_FALSE(store_.contains("a=acme"));
+    store_.add("a=acme");
+    EXPECT_EQ(failureOf([&] { store_.setPart("a=other", "po", json::Object{{"code", "1"}}); }), refusal);
+    store_.setPart("a=acme", "po", json::Object{{"code", "1"}});
+    store_.remove("a=17");
+    store_.add("a=other");
+}
+
+TEST_F(SettingsStoreTest, KeepsIdsOfABoundedSize) {
+    database_.exec("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 4200) "
+                   "INSERT INTO nodes (id, parent) SELECT 'a=' || i || printf('%.998c', 'x'), '' FROM n");
+    EXPECT_THAT(failureOf([&] { store_.add("a=acme"); }),
+                testing::StartsWith("there is no room for more nodes"));
+}
+
 } // namespace
