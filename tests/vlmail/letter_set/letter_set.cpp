@@ -160,37 +160,55 @@ void setBody(Document& document, Country const& country) {
     document.text(25, 285, country.sender, 7);
 }
 
+/// Where a field stands: places in millimetres, sizes in points.
+struct Place {
+    double x;
+    double y;
+    double valueX;
+    double valueY;
+    double labelSize = 11;
+    double valueSize = 11;
+};
+
+Place placeOf(int i, Way way) {
+    double const line = 100 + 6 * i;
+    double const column = 25 + 43 * i;
+    double const half = 25 + 80 * (i % 2);
+    double const row = 104 + 16 * (i / 2);
+    switch (way) {
+    case Way::Apart:
+        return {25, line, 150, line};
+    case Way::Columns:
+        return {column, 104, column, 109, 9, 9};
+    case Way::InfoBlock:
+        return {120, line - 42, 160, line - 42, 10, 10};
+    case Way::SendersLine:
+        return {25, line, 80, line};
+    case Way::Stacked:
+        return {half, row, half, row + 5, 9, 11};
+    case Way::Lines:
+    case Way::TwoPages:
+        break;
+    }
+    return {25, line, 25, line};
+}
+
+bool hasColon(Way way) { return way != Way::Columns && way != Way::InfoBlock && way != Way::Stacked; }
+
+void setItem(Document& document, Item const& item, Place const& place, Way way) {
+    std::string const label = item.label + (hasColon(way) ? ":" : "");
+    if (way == Way::Lines || way == Way::TwoPages) {
+        document.text(place.x, place.y, label + ' ' + item.value);
+        return;
+    }
+    document.text(place.x, place.y, label, place.labelSize);
+    document.text(place.valueX, place.valueY, item.value, place.valueSize);
+}
+
 void setItems(Document& document, Items const& items, Way way) {
     int i = 0;
-    for (Item const& item : items) {
-        switch (way) {
-        case Way::Lines:
-        case Way::TwoPages:
-            document.text(25, 100 + 6 * i, item.label + ": " + item.value);
-            break;
-        case Way::Apart:
-            document.text(25, 100 + 6 * i, item.label + ":");
-            document.text(150, 100 + 6 * i, item.value);
-            break;
-        case Way::Columns:
-            document.text(25 + 43 * i, 104, item.label, 9);
-            document.text(25 + 43 * i, 109, item.value, 9);
-            break;
-        case Way::InfoBlock:
-            document.text(120, 58 + 6 * i, item.label, 10);
-            document.text(160, 58 + 6 * i, item.value, 10);
-            break;
-        case Way::SendersLine:
-            document.text(25, 100 + 6 * i, item.label + ":");
-            document.text(80, 100 + 6 * i, item.value);
-            break;
-        case Way::Stacked:
-            document.text(25 + 80 * (i % 2), 104 + 16 * (i / 2), item.label, 9);
-            document.text(25 + 80 * (i % 2), 109 + 16 * (i / 2), item.value, 11);
-            break;
-        }
-        ++i;
-    }
+    for (Item const& item : items)
+        setItem(document, item, placeOf(i++, way), way);
 }
 
 std::string pdfOf(Country const& country, Items items, Way way) {
@@ -222,12 +240,11 @@ std::string escaped(std::string_view text) {
 }
 
 json::Object fieldOf(Item const& item, Way way) {
-    bool const hasColon = way != Way::Columns && way != Way::InfoBlock && way != Way::Stacked;
     std::string const name = item.name;
     std::string const value = name == "number" || name == "customer" ? "\\S+" : ".+";
-    json::Object field{
-        {"name", name},
-        {"value_extract", "^" + escaped(item.label) + (hasColon ? ":" : "") + "\\h*(?<VAL>" + value + ")$"}};
+    json::Object field{{"name", name},
+                       {"value_extract", "^" + escaped(item.label) + (hasColon(way) ? ":" : "") +
+                                             "\\h*(?<VAL>" + value + ")$"}};
     if (name == "date")
         field.set("value_type", 3);
     if (name == "date")
