@@ -1,0 +1,89 @@
+// What it costs to hold each page that is written against the document's: PDFs read, split into pages and
+// compressed with the check, by the same without it, in turns. For the default of "vlmail mail
+// --check-every": the aim is that the check of every page costs half of the mailing at most (ratio 1.5).
+// These letters have few pages, so that their ratio is the highest there is; most of it is drawing both
+// pages. The container, which costs the same either way, is left out.
+#include "programs/mailing/page_blob.h"
+#include "programs/reader/document.h"
+#include "programs/reader/letters.h"
+
+#include "vlservice/extract/extract_field.h"
+#include "vlservice/extract/extract_preset.h"
+#include "vlservice/extract/extract_zone.h"
+
+#include <benchmark/benchmark.h>
+
+#include <chrono>
+#include <cstddef>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+enum class Check : bool { No, Yes };
+
+/// The PDFs of an office and its like.
+std::vector<std::string> const& documents() {
+    static std::vector<std::string> const files = [] {
+        std::vector<std::string> found;
+        for (auto const& entry : fs::recursive_directory_iterator(VLSERVICE_EXAMPLE_LETTERS))
+            if (entry.path().extension() == ".pdf")
+                found.push_back(entry.path().string());
+        return found;
+    }();
+    return files;
+}
+
+Cfg::ExtractPreset addressAlone() {
+    Cfg::ExtractPreset preset;
+    preset.zones().emplace_back(Cfg::ExtractZone::DEF_ZONE_NAME,
+                                std::vector<Cfg::ExtractField>{Cfg::ExtractField::DefPostal()});
+    return preset;
+}
+
+/// Gives the number of pages.
+std::size_t split(std::string const& file, Cfg::ExtractPreset const& preset, Check check) {
+    Reader::Document document = Reader::openDocument(fs::path(file));
+    std::size_t pages = 0;
+    for (Reader::Letter const& letter : Reader::readLetters(document, preset))
+        for (int const page : letter.pages) {
+            std::string const pdf = document.singlePagePdf(page);
+            if (check == Check::Yes)
+                benchmark::DoNotOptimize(document.showsTheSame(page, pdf));
+            benchmark::DoNotOptimize(Mailing::compressed(pdf));
+            ++pages;
+        }
+    return pages;
+}
+
+double secondsOfAll(Cfg::ExtractPreset const& preset, Check check, std::size_t& pages) {
+    auto const begin = std::chrono::steady_clock::now();
+    for (std::string const& file : documents())
+        pages += split(file, preset, check);
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
+}
+
+/// Both in turns, so that what else the machine does costs both.
+void checkEachPage(benchmark::State& state) {
+    Cfg::ExtractPreset const preset = addressAlone();
+    double with = 0;
+    double without = 0;
+    std::size_t pages = 0;
+    for (auto _ : state) {
+        std::size_t same = 0;
+        without += secondsOfAll(preset, Check::No, same);
+        with += secondsOfAll(preset, Check::Yes, pages);
+    }
+    state.counters["ratio"] = with / without;
+    state.counters["us_a_page_without"] = without * 1e6 / static_cast<double>(pages);
+    state.counters["us_a_page_with"] = with * 1e6 / static_cast<double>(pages);
+}
+
+BENCHMARK(checkEachPage)->Unit(benchmark::kMillisecond)->MinTime(5);
+
+} // namespace
+
+BENCHMARK_MAIN();
