@@ -105,7 +105,8 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Plan plan(settings);
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.reading.workers(), {.joins = options.joins()}, progress,
+    readBatch(options.files, settings, options.reading.workers(),
+              {.digest = Along::Digest::Yes, .joins = options.joins()}, progress,
               [&](std::size_t index, ReadResult result) {
                   plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
                   dispatch.take(std::move(result));

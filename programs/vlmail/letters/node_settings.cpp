@@ -46,13 +46,12 @@ void requirePartNames(json::Object const& document, fs::path const& file) {
 } // namespace
 
 NodeSettings NodeSettings::fromFile(fs::path const& file) {
-    std::string const text = Base::readFile(file);
     NodeSettings settings;
+    settings.text_ = Base::readFile(file);
     settings.file_ = file;
     settings.place_ = Base::inQuotes(file.string());
-    settings.sha256_ = Base::sha256(text);
     try {
-        settings.parts_ = json::strToObject(text.data(), text.size());
+        settings.parts_ = json::strToObject(settings.text_.data(), settings.text_.size());
     } catch (json::Exc const& wrong) {
         throw Base::Error("cannot read the settings in " + Base::inQuotes(file.string()) + ": " +
                           wrong.what() + "; correct the file there");
@@ -63,6 +62,8 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     settings.presets();
     return settings;
 }
+
+std::string NodeSettings::sha256() const { return file_.empty() ? std::string() : Base::sha256(text_); }
 
 NodeSettings NodeSettings::fromFileIfNamed(std::string const& file) {
     return file.empty() ? NodeSettings() : fromFile(file);

@@ -32,12 +32,13 @@ public:
     std::filesystem::path const& file() const { return file_; }
     /// Where they come from, as messages say it.
     std::string const& place() const { return place_; }
-    /// Of the file as it was read; empty for the defaults.
-    std::string const& sha256() const { return sha256_; }
+    /// Of the file as it was read; empty for the defaults. Computed at each call: few want it, and the first
+    /// digest of a process costs more than a short letter.
+    std::string sha256() const;
 
 private:
     std::filesystem::path file_;
-    std::string sha256_;
+    std::string text_;
     std::string place_ = "the settings";
     bool sorted_ = true;
     json::Object parts_;

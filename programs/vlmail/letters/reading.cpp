@@ -319,7 +319,8 @@ ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSe
         if (along.beforeReading)
             along.beforeReading(result, presets.presets());
         std::string bytes = Base::readFile(file);
-        result.sha256 = Base::sha256(bytes);
+        if (along.digest == Along::Digest::Yes)
+            result.sha256 = Base::sha256(bytes);
         Reader::Document document = Reader::openDocument(std::move(bytes), file);
         readLetters(result, document, presets, settings, along, place);
     } catch (std::exception const& failure) {

@@ -79,7 +79,7 @@ struct DocumentReading {
 /// A document as read.
 struct ReadResult {
     DocumentReading reading;
-    /// Of the file; empty when it could not be read.
+    /// Of the file, when it was asked for; empty when it could not be read.
     std::string sha256 = {};
     /// The document's section of a report, when Along::afterReading makes one.
     std::string report = {};
@@ -100,10 +100,12 @@ struct OpenDocument {
 /// worker process: they change the result and nothing else. What they throw is the reading's `error`.
 struct Along {
     enum class Pages : bool { No, Yes };
+    enum class Digest : bool { No, Yes };
     /// Whether pages that may begin another letter keep theirs from going out, or are only told of.
     enum class Joins : bool { Doubt, Accept };
 
     Pages pages = Pages::No;
+    Digest digest = Digest::No;
     Joins joins = Joins::Doubt;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
     std::size_t checkEvery = 1;

@@ -52,6 +52,13 @@ TEST_F(Readings, HoldThePagesOfLettersThatCanGoOut) {
     EXPECT_THAT(result.reading.letters->at(1).blobs, IsEmpty());
 }
 
+TEST_F(Readings, HoldTheDigestOfTheFileWhenAsked) {
+    // printf 'Mail: a@b.example\nRef: 1\fmore\fRef: 2' | sha256sum
+    EXPECT_EQ(read({.digest = Along::Digest::Yes}).sha256,
+              "49ac7f28ea8ec3279befac214724ccdf2983301b913c99c233f2eb88a0680f3f");
+    EXPECT_EQ(read({}).sha256, "");
+}
+
 TEST_F(Readings, HoldNoPagesUnlessAsked) {
     ReadResult const result = read({});
     ASSERT_THAT(result.reading.letters.value(), SizeIs(2));
