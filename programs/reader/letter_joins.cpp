@@ -117,6 +117,14 @@ bool isOneRecipient(Address const& a, Address const& b) {
     return shared >= 2 || linesOfA.front() == linesOfB.front();
 }
 
+/// What a field took for an address, without the sender's line say, or else what stands in the zone.
+std::optional<Address> addressIn(ZoneTrace const& zone) {
+    for (FieldTrace const& field : zone.fields)
+        if (field.definition->priority() > 0 && field.match && looksLikePostalAddress(field.match->text))
+            return Address{field.match->text, field.match->box};
+    return looksLikePostalAddress(zone.text) ? std::optional(Address{zone.text, zone.box}) : std::nullopt;
+}
+
 } // namespace
 
 class JoinWatch::Looks {
@@ -130,8 +138,7 @@ public:
     }
 
     void see(Page const& page, Layout const& layout, PageTrace const& trace) {
-        Look look{page.number, marks_.found(trace), addressesOn(page, layout),
-                  pageNumberingsOn(page, layout)};
+        Look look{page.number, marks_.found(trace), addressesOn(trace), pageNumberingsOn(page, layout)};
         if (look.marks.empty())
             look.marks = marks_.nearly(page, layout, time_);
         if (time_.isUp() && givenUpAt_ == 0)
@@ -157,13 +164,12 @@ public:
     int givenUpAt() const { return givenUpAt_; }
 
 private:
-    std::vector<std::optional<Address>> addressesOn(Page const& page, Layout const& layout) const {
-        std::vector<std::optional<Address>> addresses;
-        for (Cfg::ExtractZone const* const zone : addressZones_) {
-            ZoneText const text = textOf(page, layout, *zone);
-            addresses.push_back(looksLikePostalAddress(text.text())
-                                    ? std::optional(Address{text.text(), text.box()})
-                                    : std::nullopt);
+    std::vector<std::optional<Address>> addressesOn(PageTrace const& trace) const {
+        std::vector<std::optional<Address>> addresses(addressZones_.size());
+        for (ZoneTrace const& zone : trace.zones) {
+            auto const known = std::find(addressZones_.begin(), addressZones_.end(), zone.definition);
+            if (known != addressZones_.end())
+                addresses[static_cast<std::size_t>(known - addressZones_.begin())] = addressIn(zone);
         }
         return addresses;
     }

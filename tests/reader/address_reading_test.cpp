@@ -257,5 +257,30 @@ TEST(AddressZones, OfPresetsLeaveSendersLinesOut) {
     EXPECT_EQ(trace.pages.at(0).zones.at(0).fields.at(0).sendersLine, "Kerzen GmbH, Weg 1, 34117 Kassel");
 }
 
+TEST(AddressZones, WithSendersLinesTellOfDoubtfulJoins) {
+    Cfg::ExtractPreset const preset(R"({"zones": [{"name": "_Address",
+        "location": {"left": 2000, "top": 4500, "right": 11000, "bottom": 9000}, "fields": [
+            {"name": "postal", "priority": 1, "send_to_server": true, "width": 14000,
+             "value_extract": "\\A(?<VAL>(.{1,72}\\n){0,8}.{1,72})\\Z"}]},
+        {"name": "Text", "location": {"right": 21000, "bottom": 29700}, "fields": [
+            {"name": "no", "mark": 1, "value_extract": "^No (?<VAL>\\d+)$"}]}]})"_json.toObject());
+    auto const content = [](std::string const& name, std::string const& street, std::string const& head) {
+        return "BT /F 6 Tf 70 690 Td (Kerzen GmbH, Weg 1, 34117 Kassel) Tj ET BT /F 11 Tf 14 TL 70 670 Td (" +
+               name + ") Tj T* (" + street + ") Tj T* (34117 Kassel) Tj ET BT /F 11 Tf 70 500 Td (" + head +
+               ") Tj ET";
+    };
+    VLServiceTest::RawPdf pdf = VLServiceTest::onePage(content("Lena Brandt", "Weg 5", "No 17"));
+    pdf.object(2, "<< /Type /Pages /Kids [3 0 R 6 0 R] /Count 2 >>");
+    pdf.object(6, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 7 0 R /Resources << /Font "
+                  "<< /F 4 0 R >> >> >>");
+    pdf.stream(7, "", content("Otto Roe", "Gasse 7", "Credit note"));
+    Document document = openDocument(pdf.bytes(), "a.pdf");
+    std::vector<Letter> const letters = readLetters(document, preset);
+    ASSERT_EQ(letters.size(), 1u);
+    ASSERT_EQ(letters[0].doubtfulJoins.size(), 1u);
+    EXPECT_EQ(letters[0].doubtfulJoins[0].says,
+              "it has another address where letters begin: \"Otto Roe Gasse 7 34117 Kassel\"");
+}
+
 } // namespace
 } // namespace Reader
