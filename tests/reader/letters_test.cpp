@@ -431,15 +431,15 @@ TEST(Traces, TellWhichLinesWereJoined) {
 }
 
 TEST(Traces, SayWhichFieldOfANameCounts) {
-    Trace trace;
-    lettersOf("Tel 1\nPhone 2", presetWith(R"([
+    Cfg::ExtractPreset const preset = presetWith(R"([
         {"name": "phone", "value_extract": "^Fon (?<VAL>.*)$", "default_value": "none"},
         {"name": "phone", "value_extract": "^Tel (?<VAL>.*)$"},
         {"name": "phone", "value_extract": "^Phone (?<VAL>.*)$"},
         {"name": "land", "value_extract": "^In (?<VAL>.*)$", "default_value": "UK"},
         {"name": "land", "value_extract": "^To (?<VAL>.*)$", "default_value": "NZ"},
-        {"name": "fax", "value_extract": "^Fax (?<VAL>.*)$"}])"),
-              &trace);
+        {"name": "fax", "value_extract": "^Fax (?<VAL>.*)$"}])");
+    Trace trace;
+    lettersOf("Tel 1\nPhone 2", preset, &trace);
     PageTrace const& page = trace.pages.at(0);
     std::vector<FieldTrace> const& fields = page.zones.at(0).fields;
     std::vector<bool> counts;
