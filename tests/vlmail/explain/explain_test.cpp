@@ -8,8 +8,7 @@ namespace {
 
 using testing::HasSubstr;
 using testing::Not;
-using VLServiceTest::operator""_json;
-using VLServiceTest::text;
+using namespace VLServiceTest;
 
 constexpr char const* SETTINGS = R"text({"extract_presets": [
     {"match": "terms", "pack_preset": "P"},

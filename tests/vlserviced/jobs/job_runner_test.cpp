@@ -18,7 +18,6 @@ namespace {
 namespace fs = std::filesystem;
 
 using VlServiced::JobRunner;
-using VlServiced::JobState;
 using VlServiced::UploadFolder;
 
 /// A runner whose worker does what it was given only when the test says so. Whatever was not done by then is
