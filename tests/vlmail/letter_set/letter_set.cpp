@@ -4,6 +4,7 @@
 
 #include <array>
 #include <chrono>
+#include <cmath>
 #include <string_view>
 
 namespace LetterSet {
@@ -174,7 +175,7 @@ Place placeOf(int i, Way way) {
     double const line = 100 + 6 * i;
     double const column = 25 + 43 * i;
     double const half = 25 + 80 * (i % 2);
-    double const row = 104 + 16 * (i / 2);
+    double const row = 104 + 16 * std::floor(i / 2.0);
     switch (way) {
     case Way::Apart:
         return {25, line, 150, line};
