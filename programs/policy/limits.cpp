@@ -1,0 +1,231 @@
+#include "programs/policy/limits.h"
+
+#include "programs/base/plain_text.h"
+#include "programs/base/quoting.h"
+#include "programs/base/utf8.h"
+#include "vlservice/cfg/departments.h"
+#include "vlservice/cfg/po.h"
+#include "vlservice/cfg/profiles.h"
+#include "vlservice/platform/local_time.h"
+
+#include <algorithm>
+#include <iterator>
+#include <string_view>
+
+namespace Policy {
+namespace {
+
+struct LimitName {
+    Limit limit;
+    char const* code;
+};
+
+constexpr LimitName NAMES[] = {
+    {Limit::TooManySheets, "too-many-sheets"},
+    {Limit::DepartmentNotListed, "department-not-listed"},
+    {Limit::ProfileNotListed, "profile-not-listed"},
+    {Limit::PurchaseOrderMissing, "purchase-order-missing"},
+    {Limit::PurchaseOrderExpired, "purchase-order-expired"},
+    {Limit::EmailMalformed, "email-malformed"},
+    {Limit::DelayImpossible, "delay-impossible"},
+};
+
+constexpr Cfg::PriorityDelivery NEVER{1};
+constexpr Cfg::PriorityDelivery ALWAYS{2};
+
+/// A text from settings within a line for people.
+std::string shown(std::string const& text) {
+    constexpr std::size_t MAX_BYTES = 80;
+    std::string const line = Base::plainLine(text);
+    std::string_view const front = Base::firstBytes(line, MAX_BYTES);
+    return Base::inQuotes(front.size() == line.size() ? line : std::string(front) + "...");
+}
+
+/// The first few of a list, and how many more there are.
+std::string shownList(std::vector<std::string> const& names) {
+    constexpr std::size_t MOST = 5;
+    std::string list;
+    for (std::size_t i = 0; i < std::min(names.size(), MOST); ++i)
+        list += (i == 0 ? "" : ", ") + shown(names[i]);
+    if (names.size() > MOST)
+        list += " and " + std::to_string(names.size() - MOST) + " more";
+    return names.empty() ? "none" : list;
+}
+
+std::optional<Refusal> refusalOfChoice(Limit limit, char const* noun, std::string const& chosen,
+                                       std::vector<std::string> const& listed,
+                                       Sourced<bool> const& enforced) {
+    if (!enforced.value || std::ranges::find(listed, chosen) != listed.end())
+        return std::nullopt;
+    std::string const value = chosen.empty() ? std::string("no ") + noun : noun + (' ' + shown(chosen));
+    return Refusal{limit, value + ", " + shownList(listed) + " allowed by " + enforced.source};
+}
+
+std::optional<Refusal> refusalOfPurchaseOrder(Rules const& rules, long long now) {
+    if (!rules.enforcesPurchaseOrder.value)
+        return std::nullopt;
+    if (rules.purchaseOrder.empty())
+        return Refusal{Limit::PurchaseOrderMissing,
+                       "no purchase order, one wanted by " + rules.enforcesPurchaseOrder.source};
+    if (rules.expiry.value == 0 || now < rules.expiry.value)
+        return std::nullopt;
+    return Refusal{Limit::PurchaseOrderExpired, "purchase order " + shown(rules.purchaseOrder) +
+                                                    ", valid until " + LocalTime::toText(rules.expiry.value) +
+                                                    " as set by " + rules.expiry.source};
+}
+
+std::optional<Refusal> refusalOfEmail(Cfg::PackPreset const& mailing, PresetSource const& sourceOf) {
+    std::string const& email = mailing.userEmailOverride();
+    if (email.empty() || isEmailAddress(email))
+        return std::nullopt;
+    return Refusal{Limit::EmailMalformed, "\"customer_email\" " + shown(email) +
+                                              ", one address NAME@HOST possible, as set by " +
+                                              sourceOf(mailing.name())};
+}
+
+std::optional<Refusal> refusalOfDelay(Cfg::PackPreset const& mailing, Moment const& moment,
+                                      PresetSource const& sourceOf) {
+    std::string const why =
+        mailing.pDelayInfo() ? whyImpossible(*mailing.pDelayInfo(), moment) : std::string();
+    if (why.empty())
+        return std::nullopt;
+    return Refusal{Limit::DelayImpossible, why + ", as set by " + sourceOf(mailing.name())};
+}
+
+template<typename Elements>
+std::vector<std::string> namesOf(Elements const& elements) {
+    std::vector<std::string> names;
+    for (auto const& element : elements)
+        names.push_back(element.name());
+    return names;
+}
+
+/// The profiles' names: elements that are inherited one by one.
+std::vector<std::string> namesOf(Cfg::Profiles const& profiles) {
+    std::vector<std::string> names;
+    for (auto const& element : profiles.elements<Cfg::ProfFieldIdxs::Vals>())
+        names.push_back(element.value.name());
+    return names;
+}
+
+/// A value of the part "app".
+template<Cfg::AppFieldIdxs I>
+auto ofApp(Cfg::App const& app, SourcedSettings const& settings, char const* key) {
+    using Value = std::decay_t<decltype(app.value<I>())>;
+    return Sourced<Value>{app.value<I>(), settings.sourceOf(Cfg::App::PART_NAME, key)};
+}
+
+bool isLetterOrDigit(char c) {
+    return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
+}
+
+/// Addresses may be international: what is beyond ASCII stands for itself.
+bool isBeyondAscii(char c) { return static_cast<unsigned char>(c) >= 0x80; }
+
+bool mayStandInName(char c) {
+    constexpr std::string_view MARKS = "!#$%&'*+-/=?^_`{|}~.";
+    return isLetterOrDigit(c) || isBeyondAscii(c) || MARKS.find(c) != MARKS.npos;
+}
+
+bool isMailboxName(std::string_view name) {
+    constexpr std::size_t MAX_BYTES = 64;
+    return !name.empty() && name.size() <= MAX_BYTES && name.front() != '.' && name.back() != '.' &&
+           name.find("..") == name.npos && std::ranges::all_of(name, mayStandInName);
+}
+
+bool isHostLabel(std::string_view label) {
+    constexpr std::size_t MAX_BYTES = 63;
+    return !label.empty() && label.size() <= MAX_BYTES && label.front() != '-' && label.back() != '-' &&
+           std::ranges::all_of(label,
+                               [](char c) { return isLetterOrDigit(c) || isBeyondAscii(c) || c == '-'; });
+}
+
+/// Two labels at least.
+bool isHostName(std::string_view host) {
+    std::size_t const dot = host.rfind('.');
+    if (dot == host.npos)
+        return false;
+    for (std::size_t begin = 0; begin <= host.size();) {
+        std::string_view const label = host.substr(begin, host.find('.', begin) - begin);
+        if (!isHostLabel(label))
+            return false;
+        begin += label.size() + 1;
+    }
+    return true;
+}
+
+} // namespace
+
+char const* codeOf(Limit limit) { return std::ranges::find(NAMES, limit, &LimitName::limit)->code; }
+
+std::string Refusal::line() const { return codeOf(limit) + (": " + says); }
+
+std::string inOneLine(std::vector<Refusal> const& refusals) {
+    std::string line;
+    for (Refusal const& refusal : refusals)
+        line += (line.empty() ? "" : "; ") + refusal.line();
+    return line;
+}
+
+Rules::Rules(SourcedSettings const& settings) {
+    using enum Cfg::AppFieldIdxs;
+    auto const app = settings.part<Cfg::App>();
+    maxLetterSheets = ofApp<MaxLetterSheets>(app, settings, "max_letter_sheets");
+    priority = app.value<PriorityDelivery>();
+    enforcesDepartment = ofApp<EnforceDep>(app, settings, "enfoce_dep");
+    enforcesProfile = ofApp<EnforceProfile>(app, settings, "enforce_profile");
+    enforcesPurchaseOrder = ofApp<EnforcePo>(app, settings, "enforce_po");
+    departments = namesOf(settings.part<Cfg::Departments>().value<Cfg::DepFieldIdxs::Vals>());
+    profiles = namesOf(settings.part<Cfg::Profiles>());
+    auto const order = settings.part<Cfg::PO>();
+    purchaseOrder = order.value<Cfg::POFieldIdxs::Code>();
+    expiry = {order.value<Cfg::POFieldIdxs::Expiry>(), settings.sourceOf(Cfg::PO::PART_NAME, "expiry")};
+}
+
+long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex) {
+    long long sheets = 0;
+    for (Mailing::DocumentPages const& document : letter.documents) {
+        auto const pages = static_cast<long long>(document.pages.size());
+        sheets += duplex ? (pages + 1) / 2 : pages;
+    }
+    return sheets;
+}
+
+std::optional<Refusal> refusalOfSheets(long long sheets, Rules const& rules) {
+    auto const& [most, source] = rules.maxLetterSheets;
+    if (most <= 0 || sheets <= most)
+        return std::nullopt;
+    return Refusal{Limit::TooManySheets,
+                   std::to_string(sheets) + " sheets, " + std::to_string(most) + " allowed by " + source};
+}
+
+std::vector<Refusal> refusalsOf(Cfg::PackPreset const& mailing, Rules const& rules, Moment const& moment,
+                                PresetSource const& sourceOf) {
+    std::optional<Refusal> const checks[] = {
+        refusalOfChoice(Limit::DepartmentNotListed, "department", mailing.department(), rules.departments,
+                        rules.enforcesDepartment),
+        refusalOfChoice(Limit::ProfileNotListed, "profile", mailing.profile(), rules.profiles,
+                        rules.enforcesProfile),
+        refusalOfPurchaseOrder(rules, moment.now),
+        refusalOfEmail(mailing, sourceOf),
+        refusalOfDelay(mailing, moment, sourceOf),
+    };
+    std::vector<Refusal> refusals;
+    for (std::optional<Refusal> const& check : checks)
+        if (check)
+            refusals.push_back(*check);
+    return refusals;
+}
+
+bool goesWithPriority(Cfg::PackPreset const& mailing, Rules const& rules) {
+    return rules.priority == ALWAYS || (rules.priority != NEVER && mailing.priorityDelivery());
+}
+
+bool isEmailAddress(std::string_view text) {
+    constexpr std::size_t MAX_BYTES = 254;
+    std::size_t const at = text.find('@');
+    return text.size() <= MAX_BYTES && at != text.npos && isMailboxName(text.substr(0, at)) &&
+           isHostName(text.substr(at + 1));
+}
+
+} // namespace Policy
