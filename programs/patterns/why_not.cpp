@@ -6,13 +6,21 @@
 #include "programs/patterns/pattern.h"
 
 #include <optional>
+#include <utility>
 
 namespace Patterns {
 namespace {
 
+using Clock = std::chrono::steady_clock;
+
+struct PatienceSpent {};
+
 /// The longest beginning of the name that the pattern fits; nothing when there is none.
-std::optional<std::string> longestBeginning(Pattern const& pattern, std::string const& name) {
+std::optional<std::string> longestBeginning(Pattern const& pattern, std::string const& name,
+                                            Clock::time_point deadline) {
     for (std::size_t length = name.size() + 1; length-- > 0;) {
+        if (Clock::now() >= deadline)
+            throw PatienceSpent();
         if (Base::isBetweenCharacters(name, length) &&
             pattern.fits(name.substr(0, length)) == Pattern::Answer::Yes)
             return name.substr(0, length);
@@ -20,9 +28,10 @@ std::optional<std::string> longestBeginning(Pattern const& pattern, std::string 
     return std::nullopt;
 }
 
-std::optional<std::string> fittedBy(std::string const& beginning, std::string const& name) {
+std::optional<std::string> fittedBy(std::string const& beginning, std::string const& name,
+                                    Clock::time_point deadline) {
     try {
-        return longestBeginning(Pattern("(?:" + beginning + ")", Pattern::Use::Name), name);
+        return longestBeginning(Pattern("(?:" + beginning + ")", Pattern::Use::Name), name, deadline);
     } catch (Broken const&) {
         return std::nullopt;
     }
@@ -41,12 +50,12 @@ WhyNot failsAt(std::string const& part, std::string const& fitted) {
 }
 
 /// How far the pieces get, one after the other.
-WhyNot whyNot(Sequence const& pieces, std::string const& name) {
+WhyNot whyNot(Sequence const& pieces, std::string const& name, Clock::time_point deadline) {
     std::string beginning;
     std::string fitted;
     for (Piece const& piece : pieces) {
         beginning += piece.text;
-        auto const longer = fittedBy(beginning, name);
+        auto const longer = fittedBy(beginning, name, deadline);
         if (!longer)
             return failsAt(piece.text, fitted);
         fitted = *longer;
@@ -54,18 +63,27 @@ WhyNot whyNot(Sequence const& pieces, std::string const& name) {
     return endsEarly(fitted, name);
 }
 
-} // namespace
-
-WhyNot whyNot(std::string const& expression, std::string const& name) {
-    if (expression.empty())
-        return {"an empty expression fits no name", {}, {}};
+/// The alternative that gets furthest.
+WhyNot furthest(std::string const& expression, std::string const& name, Clock::time_point deadline) {
     std::optional<WhyNot> best;
     for (Sequence const& pieces : outlineOf(expression)) {
-        WhyNot why = whyNot(withJoinedLiterals(pieces), name);
+        WhyNot why = whyNot(withJoinedLiterals(pieces), name, deadline);
         if (!best || why.fitted.size() > best->fitted.size())
             best = std::move(why);
     }
     return *best;
+}
+
+} // namespace
+
+WhyNot whyNot(std::string const& expression, std::string const& name, Clock::duration patience) {
+    if (expression.empty())
+        return {"an empty expression fits no name", {}, {}};
+    try {
+        return furthest(expression, name, Clock::now() + patience);
+    } catch (PatienceSpent const&) {
+        return {"it does not fit, and it takes too long to tell where", {}, {}};
+    }
 }
 
 } // namespace Patterns

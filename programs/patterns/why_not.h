@@ -1,6 +1,7 @@
 #pragma once
 // Why the expression of a preset does not fit a document's name.
 
+#include <chrono>
 #include <string>
 
 namespace Patterns {
@@ -14,7 +15,9 @@ struct WhyNot {
     std::string fitted;
 };
 
-/// For an expression that compiles and does not fit the name.
-WhyNot whyNot(std::string const& expression, std::string const& name);
+/// For an expression that compiles and does not fit the name. Takes little longer than `patience`, and then
+/// says that it took too long.
+WhyNot whyNot(std::string const& expression, std::string const& name,
+              std::chrono::steady_clock::duration patience = std::chrono::seconds(1));
 
 } // namespace Patterns

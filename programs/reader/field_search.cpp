@@ -26,11 +26,6 @@ ExtractField::Measure measureFor(ExtractField const& field, ZoneText& text, Fiel
     };
 }
 
-std::string inSeconds(std::chrono::milliseconds time) {
-    std::string const rest = std::to_string(1000 + time.count() % 1000).substr(1);
-    return std::to_string(time.count() / 1000) + (rest == "000" ? "" : '.' + rest) + " s";
-}
-
 /// An address from its first line on, over several lines. A pattern that has anything in front of the value
 /// says itself how the address begins.
 bool beginsAtFirstLine(ExtractField const& field) {

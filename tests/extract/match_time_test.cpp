@@ -1,4 +1,5 @@
 #include "vlservice/extract/extract_field.h"
+#include "vlservice/extract/extract_preset.h"
 #include "vlservice/extract/match_time.h"
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
@@ -67,4 +68,20 @@ TEST_F(MatchTimes, EndValidationToo) {
                          ExtractedField::ValueType::NotValidated);
     MatchTime const time(2ms);
     EXPECT_THROW(field.validate(value), std::runtime_error);
+}
+
+TEST_F(MatchTimes, EndMatchingANameToo) {
+    MatchTime const time(2ms);
+    EXPECT_THROW(ExtractPreset::match(".*.*.*.*.*:", std::string(900, 'x')), std::runtime_error);
+    EXPECT_TRUE(time.isUp());
+}
+
+TEST_F(MatchTimes, EndNoLaterThanTheOuterOneWhichIsUpThenToo) {
+    MatchTime const outer(2ms);
+    {
+        MatchTime const inner(1h);
+        EXPECT_EQ(found(fieldWith(RUNAWAY), std::string(900, 'x')), TIME_IS_UP);
+        EXPECT_TRUE(inner.isUp());
+    }
+    EXPECT_TRUE(outer.isUp());
 }

@@ -549,5 +549,42 @@ TEST(PatternTimes, EndADocumentInOneLine) {
     }
 }
 
+TEST(PatternTimes, EndADocumentWithTwentyHardFieldsInItsLine) {
+    std::string fields;
+    for (int i = 1; i <= 20; ++i)
+        fields += (i == 1 ? R"_([{"name": "hard )_" : R"_(, {"name": "hard )_") + std::to_string(i) +
+                  R"_(", "value_extract": "(?<VAL>.*.*.*.*.*:)"})_";
+    Cfg::ExtractPreset const preset = presetWith((fields + ']').c_str());
+    Document document = openDocument(longText(), "a.txt");
+    using std::chrono_literals::operator""ms;
+    try {
+        readLetters(document, preset, nullptr, {}, {30ms, 200ms});
+        FAIL() << "no failure";
+    } catch (Base::Error const& error) {
+        EXPECT_THAT(error.what(),
+                    testing::MatchesRegex("a\\.txt: its patterns took longer than 0\\.200 s, that of the "
+                                          "field \"hard [0-9]+\" last; run \"vlmail presets lint\" on the "
+                                          "settings and correct the slow ones"));
+    }
+}
+
+TEST(PatternTimes, AreNotGivenBackByAClockThatIsSetBack) {
+    using std::chrono_literals::operator""s;
+    static PatternTime::Clock::time_point now;
+    PatternTime time({2s, 20s}, [] { return now; });
+    auto const pass = [&](PatternTime::Clock::duration duration) {
+        PatternTime::Turn const turn(time);
+        now += duration;
+        return turn.spent();
+    };
+    EXPECT_EQ(pass(5s), 5s);
+    EXPECT_EQ(time.left(), 15s);
+    EXPECT_EQ(pass(-60s), 0s);
+    EXPECT_EQ(time.left(), 15s);
+    EXPECT_FALSE(time.isUp());
+    pass(15s);
+    EXPECT_TRUE(time.isUp());
+}
+
 } // namespace
 } // namespace Reader

@@ -2,6 +2,7 @@
 
 #include "vlservice/extract/match_clock.h"
 
+#include <algorithm>
 #include <stdexcept>
 
 namespace Cfg {
@@ -20,14 +21,16 @@ void MatchClock::look() {
 
 MatchTime::MatchTime(std::chrono::steady_clock::duration limit)
     : outerDeadline_(matchClock.deadline), outerIsUp_(matchClock.isUp) {
-    matchClock.deadline = std::chrono::steady_clock::now() + limit;
+    matchClock.deadline = std::min(outerDeadline_, std::chrono::steady_clock::now() + limit);
     matchClock.isUp = false;
     matchClock.stepsToLook = 0;
 }
 
 MatchTime::~MatchTime() {
+    // What ended at the outer one's end has ended that too.
+    bool const endedOuter = matchClock.isUp && matchClock.deadline == outerDeadline_;
     matchClock.deadline = outerDeadline_;
-    matchClock.isUp = outerIsUp_;
+    matchClock.isUp = outerIsUp_ || endedOuter;
 }
 
 bool MatchTime::isUp() const { return matchClock.isUp; }

@@ -7,10 +7,10 @@
 
 namespace Cfg {
 
-/// While it lives, the matches of fields and validators on this thread have that much time together, by the
-/// steady clock. One that would go on for longer ends as one that is too complex does: the field is not
-/// found, and validating throws std::runtime_error. Without it only the engine's own limit of states holds.
-/// The innermost one counts.
+/// While it lives, the matches of fields, validators and names of documents on this thread have that much
+/// time together, by the steady clock. One that would go on for longer ends as one that is too complex does:
+/// the field is not found, and validating or matching a name throws std::runtime_error. Without it only the
+/// engine's own limit of states holds. The innermost one counts, which ends no later than the outer ones.
 class VLSERVICE_EXPORT MatchTime {
 public:
     explicit MatchTime(std::chrono::steady_clock::duration limit);

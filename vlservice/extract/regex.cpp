@@ -22,9 +22,9 @@ namespace {
 // users.
 [[maybe_unused]] int const CLEANUP_AT_EXIT = std::atexit(releaseUnicodeTables);
 
-/// Decodes UTF-8 and tells the clock of each step. The matchers run on it as it is: the engine's own wrappers
-/// for UTF-8 copy all groups once more.
-class ClockedDecoder {
+/// Walks a text and tells the clock of each step.
+template<typename Inner>
+class Clocked {
 public:
     using iterator_category = std::bidirectional_iterator_tag;
     using value_type = UChar32;
@@ -32,48 +32,53 @@ public:
     using pointer = UChar32 const*;
     using reference = UChar32;
 
-    ClockedDecoder() = default;
-    ClockedDecoder(char const* at, char const* first, char const* last) : decoder_(at, first, last) {}
+    Clocked() = default;
+    explicit Clocked(Inner inner) : inner_(inner) {}
 
-    UChar32 operator*() const { return *decoder_; }
-    ClockedDecoder& operator++() {
+    UChar32 operator*() const { return *inner_; }
+    Clocked& operator++() {
         matchClock.step();
-        ++decoder_;
+        ++inner_;
         return *this;
     }
-    ClockedDecoder operator++(int) {
-        ClockedDecoder const before = *this;
+    Clocked operator++(int) {
+        Clocked const before = *this;
         ++*this;
         return before;
     }
-    ClockedDecoder& operator--() {
+    Clocked& operator--() {
         matchClock.step();
-        --decoder_;
+        --inner_;
         return *this;
     }
-    ClockedDecoder operator--(int) {
-        ClockedDecoder const before = *this;
+    Clocked operator--(int) {
+        Clocked const before = *this;
         --*this;
         return before;
     }
-    friend bool operator==(ClockedDecoder const& a, ClockedDecoder const& b) {
-        return a.decoder_ == b.decoder_;
-    }
-    friend bool operator!=(ClockedDecoder const& a, ClockedDecoder const& b) {
-        return a.decoder_ != b.decoder_;
-    }
+    friend bool operator==(Clocked const& a, Clocked const& b) { return a.inner_ == b.inner_; }
+    friend bool operator!=(Clocked const& a, Clocked const& b) { return a.inner_ != b.inner_; }
 
-    char const* base() const { return decoder_.base(); }
+    Inner const& inner() const { return inner_; }
 
 private:
-    Decoder decoder_;
+    Inner inner_ = {};
 };
+
+/// Decodes UTF-8. The matchers run on it as it is: the engine's own wrappers for UTF-8 copy all groups once
+/// more.
+using ClockedDecoder = Clocked<Decoder>;
+using ClockedPoints = Clocked<UChar32 const*>;
+
+ClockedDecoder decoderAt(char const* at, std::string_view text) {
+    return ClockedDecoder(Decoder(at, text.data(), text.data() + text.size()));
+}
 
 using Groups = boost::match_results<ClockedDecoder>;
 
 std::string_view piece(boost::sub_match<ClockedDecoder> const& group) {
-    char const* const first = group.first.base();
-    return {first, static_cast<std::size_t>(group.second.base() - first)};
+    char const* const first = group.first.inner().base();
+    return {first, static_cast<std::size_t>(group.second.inner().base() - first)};
 }
 
 std::optional<std::string_view> groupNamed(Groups const& groups, std::string_view name) {
@@ -106,20 +111,16 @@ FieldRegex::FieldRegex(std::string_view pattern)
 FieldRegex::~FieldRegex() = default;
 
 std::optional<FieldRegex::Found> FieldRegex::search(std::string_view text, std::string_view group) const {
-    char const* const first = text.data();
-    char const* const last = first + text.size();
     Groups groups;
-    if (!boost::regex_search(ClockedDecoder(first, first, last), ClockedDecoder(last, first, last), groups,
+    if (!boost::regex_search(decoderAt(text.data(), text), decoderAt(text.data() + text.size(), text), groups,
                              compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return Found{piece(groups[0]), groupNamed(groups, group)};
 }
 
 std::optional<RegexGroups> FieldRegex::match(std::string_view text) const {
-    char const* const first = text.data();
-    char const* const last = first + text.size();
     auto found = std::make_unique<RegexGroups::Results>();
-    if (!boost::regex_match(ClockedDecoder(first, first, last), ClockedDecoder(last, first, last),
+    if (!boost::regex_match(decoderAt(text.data(), text), decoderAt(text.data() + text.size(), text),
                             found->groups, compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return RegexGroups(std::move(found));
@@ -136,7 +137,8 @@ NameRegex::~NameRegex() = default;
 
 bool NameRegex::matches(std::string_view name) const {
     CodePoints const points = decode(name);
-    return boost::regex_match(points.data(), points.data() + points.size(), compiled_->regex);
+    return boost::regex_match(ClockedPoints(points.data()), ClockedPoints(points.data() + points.size()),
+                              compiled_->regex);
 }
 
 } // namespace Cfg

@@ -28,7 +28,7 @@ private:
 
 /// A pattern for the text of a letter, in Perl syntax. "." crosses no line break; "^" and "$" match at each
 /// one. Texts are UTF-8. Matching throws std::out_of_range where it meets an invalid sequence, and
-/// std::runtime_error when the pattern is too complex for the text.
+/// std::runtime_error when the pattern is too complex for the text, or its time is up.
 class FieldRegex {
 public:
     /// The whole match, and one of its groups if it took part. Pieces of the text that was searched.
@@ -65,7 +65,7 @@ public:
 
     /// Whether the pattern fits the whole name. The name is decoded before it is matched: one that is not
     /// UTF-8 always throws std::out_of_range. Throws std::runtime_error when the pattern is too complex for
-    /// the name.
+    /// the name, or its time is up.
     bool matches(std::string_view name) const;
 
 private:

@@ -5,6 +5,7 @@
 #include "programs/reader/document.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/presets.h"
+#include "programs/vlmail/explain/preset_walk.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/presets/presets_document.h"
 #include "programs/vlmail/presets/words.h"
@@ -55,8 +56,9 @@ public:
 
     Found find(std::string const& name) const {
         Found found{name, {}, {}, {}, {}, {}};
+        NameTrial trial(name);
         for (auto const& element : presets_.elements<ExtractPresets>())
-            if (endsWith(element.value, found))
+            if (endsWith(element.value, found, trial))
                 return found;
         found.error = "no extraction preset fits; add one, such as \".*\"";
         return found;
@@ -64,10 +66,10 @@ public:
 
 private:
     /// Whether the search ends with this preset, because it fits or fails.
-    bool endsWith(Cfg::ExtractPreset const& preset, Found& found) const {
+    bool endsWith(Cfg::ExtractPreset const& preset, Found& found, NameTrial& trial) const {
         Tried tried{found.earlier.size() + 1, &preset, placeAt(found.earlier.size()), {}};
         try {
-            if (preset.match(found.name)) {
+            if (trial.fits(preset)) {
                 found.taken = std::move(tried);
                 findPack(found);
                 return true;
@@ -78,7 +80,7 @@ private:
                           "; correct it, or no later preset is reached";
             return true;
         }
-        tried.why = Patterns::whyNot(preset.strRegex(), found.name);
+        tried.why = trial.whyNot(preset.strRegex());
         found.earlier.push_back(std::move(tried));
         return false;
     }

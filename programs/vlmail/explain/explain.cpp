@@ -81,12 +81,13 @@ char const* outcomeOf(FieldTrace const& trace) {
 }
 
 /// What width limit and validator say against the match; empty when they take it.
-std::string objection(FieldTrace const& trace) {
+std::string objection(FieldTrace const& trace, Reader::PatternTime& time) {
     if (trace.isTooWide)
         return "wider than " + Words::millimetres(static_cast<long long>(trace.definition->maxWidth())) +
                ": " + Words::millimetres(trace.match->width);
     if (!trace.rawText || trace.value->isValid())
         return {};
+    Reader::PatternTime::Turn const turn(time);
     std::optional<Refusal> const refusal = refusalOf(*trace.definition, *trace.rawText);
     return refusal ? refusal->says : std::string();
 }
@@ -100,8 +101,8 @@ bool isFoundOn(PageTrace const& page, std::string const& name) {
 class PageExplainer {
 public:
     PageExplainer(PageTrace const& trace, std::vector<int> otherPages, Cfg::ExtractPreset const& preset,
-                  ReadPages& pages)
-        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages) {}
+                  ReadPages& pages, Reader::PatternTime& time)
+        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages), time_(time) {}
 
     json::Object explain() const {
         json::Array zones;
@@ -166,7 +167,7 @@ private:
             object.set(CUT, trace.cut);
         if (trace.rawText)
             object.set(RAW, *trace.rawText);
-        std::string const says = objection(trace);
+        std::string const says = objection(trace, time_);
         if (!says.empty())
             object.set(SAYS, says);
         if (trace.value)
@@ -186,8 +187,8 @@ private:
         if (!trace_.beginsLetter || isFoundOn(trace_, trace.definition->name()))
             return;
         json::Array misses;
-        for (NearMiss const& miss :
-             nearMissesOf({preset_, zone, trace, trace_.page, otherPagesThan(zone.place.page)}, pages_))
+        MissedField const missed{preset_, zone, trace, trace_.page, otherPagesThan(zone.place.page)};
+        for (NearMiss const& miss : nearMissesOf(missed, pages_, time_))
             misses.append(toJson(miss));
         if (!misses.empty())
             object.set(NEAR_MISSES, misses);
@@ -204,6 +205,7 @@ private:
     std::vector<int> otherPages_;
     Cfg::ExtractPreset const& preset_;
     ReadPages& pages_;
+    Reader::PatternTime& time_;
 };
 
 /// The pages behind the first of a letter, up to the next letter, and one that is skipped in front of it.
@@ -231,12 +233,14 @@ json::Object explainPresets(Cfg::Presets const& presets, std::string const& docu
 }
 
 void explainPages(json::Object& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
-                  Reader::Trace const& trace) {
+                  Reader::Trace const& trace, Reader::PatternLimits const& limits) {
     ReadPages pages(document, Reader::rulesOf(preset));
+    Reader::PatternTime time(limits);
     json::Array explained;
     for (std::size_t i = 0; i < trace.pages.size(); ++i)
         explained.append(
-            PageExplainer(trace.pages[i], otherPagesOf(i, trace, pages.count()), preset, pages).explain());
+            PageExplainer(trace.pages[i], otherPagesOf(i, trace, pages.count()), preset, pages, time)
+                .explain());
     explanation.set(PAGE_COUNT, pages.count());
     explanation.set(PAGES, explained);
 }

@@ -7,6 +7,7 @@
 
 #include "vlservice/presets/presets.h"
 
+#include <chrono>
 #include <string>
 
 namespace VlMail {
@@ -14,11 +15,13 @@ namespace VlMail {
 /// The search for the presets of a document of that name; known before the document is read.
 json::Object explainPresets(Cfg::Presets const& presets, std::string const& document);
 
+constexpr Reader::PatternLimits NEAR_MISS_LIMITS{std::chrono::seconds(2), std::chrono::seconds(10)};
+
 /// Adds what was seen on the pages to what explainPresets() gave. The trace is that of reading the document
 /// by the preset. Near misses are sought on all pages of a letter, so that this costs more than the reading
-/// itself.
+/// itself; `limits` are those of all patterns that are tried for a field, and for all.
 void explainPages(json::Object& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
-                  Reader::Trace const& trace);
+                  Reader::Trace const& trace, Reader::PatternLimits const& limits = NEAR_MISS_LIMITS);
 
 /// The keys and words of an explanation, shared by those who read it.
 namespace Explanation {

@@ -92,17 +92,7 @@ private:
     std::vector<NearMiss> others_;
 };
 
-} // namespace
-
-char const* nameOf(NearMissKind kind) { return WAYS[static_cast<std::size_t>(kind)].name; }
-
-std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages) {
-    LaidOutPage const* const page = pages.page(missed.page());
-    if (!page || !missed.zone.place.whyNowhere.empty() || missed.field.definition->strRegex().empty())
-        return {};
-    // Each pattern that fails would be a line on the terminal, beside the near miss that says so.
-    Base::LogCapture const quiet;
-    Search const search(missed, pages, *page);
+std::vector<NearMiss> lookFor(Search const& search) {
     Collected collected;
     bool isExplained = false;
     for (Way const& way : WAYS) {
@@ -118,6 +108,31 @@ std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages) 
             break;
     }
     return collected.take();
+}
+
+NearMiss outOfTime(Reader::PatternTime const& time) {
+    return {Kind::Failure,
+            "nothing was tried for this field, since that took " + Reader::inSeconds(time.limits().document) +
+                " for the fields before it; \"vlmail presets lint\" tells which patterns are slow",
+            {},
+            0,
+            {}};
+}
+
+} // namespace
+
+char const* nameOf(NearMissKind kind) { return WAYS[static_cast<std::size_t>(kind)].name; }
+
+std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages, Reader::PatternTime& time) {
+    LaidOutPage const* const page = pages.page(missed.page());
+    if (!page || !missed.zone.place.whyNowhere.empty() || missed.field.definition->strRegex().empty())
+        return {};
+    if (time.isUp())
+        return {outOfTime(time)};
+    // Each pattern that fails would be a line on the terminal, beside the near miss that says so.
+    Base::LogCapture const quiet;
+    Reader::PatternTime::Turn const turn(time);
+    return lookFor(Search(missed, pages, *page, turn));
 }
 
 } // namespace VlMail

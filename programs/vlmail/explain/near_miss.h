@@ -66,7 +66,8 @@ struct MissedField {
 };
 
 /// At most three, the likeliest first; those that would give a valid value stand in front of those that would
-/// not. What the library says about patterns that fail meanwhile is not logged.
-std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages);
+/// not. What the library says about patterns that fail meanwhile is not logged. Ends in `time`; when that is
+/// up before, it is the only thing that is told.
+std::vector<NearMiss> nearMissesOf(MissedField const& missed, ReadPages& pages, Reader::PatternTime& time);
 
 } // namespace VlMail

@@ -92,6 +92,8 @@ std::optional<Found> withRule(Search const& search, Rule const& rule, double val
         return found;
     // The rule is the whole preset's: advice that harms other fields stands behind all that does not.
     std::string const losses = lossesBy(search, page);
+    if (search.isGivenUp())
+        return std::nullopt; // What it loses is not known.
     found->says += losses;
     found->isValid = found->isValid && losses.empty();
     return found;

@@ -120,6 +120,6 @@ std::optional<PlainHit> Search::find(ExtractField const& field, std::string text
     return hit;
 }
 
-bool Search::isGivenUp() const { return failures_.size() >= MAX_FAILURES; }
+bool Search::isGivenUp() const { return failures_.size() >= MAX_FAILURES || turn_.isUp(); }
 
 } // namespace VlMail

@@ -41,8 +41,9 @@ struct Found {
 class Search {
 public:
     /// All of them must live as long as the search.
-    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page)
-        : missed_(missed), pages_(pages), page_(page), searchedText_(remaining(textOn(page))) {}
+    Search(MissedField const& missed, ReadPages& pages, LaidOutPage const& page,
+           Reader::PatternTime::Turn const& turn)
+        : missed_(missed), pages_(pages), page_(page), turn_(turn), searchedText_(remaining(textOn(page))) {}
 
     MissedField const& missed() const { return missed_; }
     Reader::FieldTrace const& trace() const { return missed_.field; }
@@ -82,8 +83,8 @@ public:
     /// The field with another pattern.
     Cfg::ExtractField withPattern(std::string const& pattern) const;
 
-    // Searches. They find nothing any more when patterns have failed too often: each time may have cost
-    // seconds.
+    // Searches. They find nothing any more when patterns have failed too often, each of which may have cost
+    // seconds, or the time is up.
 
     bool isGivenUp() const;
     /// Why patterns could not be searched, in the engine's words.
@@ -112,6 +113,7 @@ private:
     MissedField const& missed_;
     ReadPages& pages_;
     LaidOutPage const& page_;
+    Reader::PatternTime::Turn const& turn_;
     /// A search that fails is remembered, whoever asked for it.
     mutable std::vector<std::string> failures_;
     Reader::ZoneText searchedText_;

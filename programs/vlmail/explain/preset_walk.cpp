@@ -1,7 +1,6 @@
 #include "programs/vlmail/explain/preset_walk.h"
 
 #include "programs/patterns/text_forms.h"
-#include "programs/patterns/why_not.h"
 
 namespace VlMail {
 namespace {
@@ -9,6 +8,7 @@ namespace {
 using Cfg::ExtractPreset;
 using Patterns::composed;
 using Answer = PresetStep::Answer;
+using Reader::PatternTime;
 
 bool fits(std::string const& pattern, std::string const& name) {
     try {
@@ -18,22 +18,19 @@ bool fits(std::string const& pattern, std::string const& name) {
     }
 }
 
-std::string wordsWhyNot(std::string const& pattern, std::string const& name) {
+bool fitsComposed(std::string const& pattern, std::string const& name) {
     std::string const composedPattern = composed(pattern);
     std::string const composedName = composed(name);
     bool const changes = composedPattern != pattern || composedName != name;
-    if (changes && fits(composedPattern, composedName))
-        return "would fit after Unicode normalisation: letters are composed in one and decomposed in the "
-               "other";
-    return Patterns::whyNot(pattern, name).words;
+    return changes && fits(composedPattern, composedName);
 }
 
-PresetStep take(Cfg::ArrValue<ExtractPreset> const& element, std::string const& document) {
+PresetStep take(Cfg::ArrValue<ExtractPreset> const& element, NameTrial& trial) {
     PresetStep step{&element.value, element.inh, Answer::No, {}};
     try {
-        step.answer = element.value.match(document) ? Answer::Yes : Answer::No;
+        step.answer = trial.fits(element.value) ? Answer::Yes : Answer::No;
         step.why = step.answer == Answer::Yes ? "fits the whole name"
-                                              : wordsWhyNot(element.value.strRegex(), document);
+                                              : trial.whyNotInWords(element.value.strRegex());
     } catch (std::exception const& failure) {
         step.answer = Answer::Failed;
         step.why = std::string("cannot be tried: ") + failure.what();
@@ -43,10 +40,32 @@ PresetStep take(Cfg::ArrValue<ExtractPreset> const& element, std::string const& 
 
 } // namespace
 
-std::vector<PresetStep> walkPresets(Cfg::Presets const& presets, std::string const& document) {
+bool NameTrial::fits(ExtractPreset const& preset) {
+    PatternTime::Turn const turn(matching_);
+    return preset.match(name_);
+}
+
+Patterns::WhyNot NameTrial::whyNot(std::string const& pattern) {
+    PatternTime::Turn const turn(explaining_);
+    return Patterns::whyNot(pattern, name_, explaining_.left());
+}
+
+std::string NameTrial::whyNotInWords(std::string const& pattern) {
+    {
+        PatternTime::Turn const turn(explaining_);
+        if (fitsComposed(pattern, name_))
+            return "would fit after Unicode normalisation: letters are composed in one and decomposed in the "
+                   "other";
+    }
+    return whyNot(pattern).words;
+}
+
+std::vector<PresetStep> walkPresets(Cfg::Presets const& presets, std::string const& document,
+                                    std::chrono::milliseconds time) {
+    NameTrial trial(document, time);
     std::vector<PresetStep> steps;
     for (auto const& element : presets.elements<Cfg::PresetFieldIdxs::ExtractPresets>()) {
-        steps.push_back(take(element, document));
+        steps.push_back(take(element, trial));
         if (steps.back().answer != Answer::No)
             break;
     }

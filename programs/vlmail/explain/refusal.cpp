@@ -3,6 +3,7 @@
 #include "programs/base/quoting.h"
 #include "programs/vlmail/explain/words.h"
 
+#include <stdexcept>
 #include <string_view>
 
 namespace VlMail {
@@ -81,9 +82,7 @@ bool isLess(json::Value const& a, json::Value const& b) {
     return a.isInt() && b.isInt() ? a.toInt() < b.toInt() : a.numberOrZero() < b.numberOrZero();
 }
 
-} // namespace
-
-std::optional<Refusal> refusalOf(ExtractField const& field, std::string const& text) {
+std::optional<Refusal> refusalBy(ExtractField const& field, std::string const& text) {
     Validation const& validation = field.validation();
     FieldValueType const type = validation.valueType();
     ExtractedField const value = validatedWithoutLimits(field, type, validation.strRegex(), text);
@@ -112,6 +111,16 @@ std::optional<Refusal> refusalOf(ExtractField const& field, std::string const& t
                            (isDate ? " is after the latest date " : " is above the maximum ") +
                            limitInWords(most, type)};
     return std::nullopt;
+}
+
+} // namespace
+
+std::optional<Refusal> refusalOf(ExtractField const& field, std::string const& text) {
+    try {
+        return refusalBy(field, text);
+    } catch (std::runtime_error const&) {
+        return std::nullopt;
+    }
 }
 
 char const* typeInWords(ExtractField const& field) {

@@ -21,7 +21,7 @@ struct Refusal {
     std::string says;
 };
 
-/// Nothing when the validator takes the text. Throws what ExtractField::validate does.
+/// Nothing when the validator takes the text, or cannot be tried on it: its pattern is bad or takes too long.
 std::optional<Refusal> refusalOf(Cfg::ExtractField const& field, std::string const& text);
 
 /// The kind of a field's values in words: "text", "integer", "number", "date".

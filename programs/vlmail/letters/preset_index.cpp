@@ -1,13 +1,17 @@
 #include "programs/vlmail/letters/preset_index.h"
 
+#include "programs/base/error.h"
+#include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/required_words.h"
+#include "programs/reader/pattern_time.h"
 
 #include <unicode/uchar.h>
 
 #include <algorithm>
 #include <cctype>
 #include <iterator>
+#include <stdexcept>
 
 namespace VlMail {
 namespace {
@@ -92,17 +96,21 @@ std::uint32_t rarestPiece(Words const& words, Counts const& counts) {
 
 } // namespace
 
-PresetIndex::PresetIndex(Cfg::Presets const& presets) : presets_(presets) {
-    if (presets.elements<ExtractPresets>().size() < WORTH_AN_INDEX)
-        return;
-    std::vector<std::vector<Words>> words;
+PresetIndex::PresetIndex(Cfg::Presets const& presets, std::chrono::milliseconds time)
+    : presets_(presets), time_(time),
+      isIndexed_(presets.elements<ExtractPresets>().size() >= WORTH_AN_INDEX) {
     for (auto const& element : presets.elements<ExtractPresets>()) {
+        all_.push_back(static_cast<std::uint32_t>(extractPresets_.size()));
         extractPresets_.push_back(&element.value);
-        words.push_back(wordsOf(element.value));
     }
-    add(words);
     for (auto const& element : presets.elements<PackPresets>())
         packPresets_.emplace(element.value.name(), &element.value);
+    if (!isIndexed_)
+        return;
+    std::vector<std::vector<Words>> words;
+    for (Cfg::ExtractPreset const* const preset : extractPresets_)
+        words.push_back(wordsOf(*preset));
+    add(words);
 }
 
 void PresetIndex::add(std::vector<std::vector<Words>> const& wordsOfPresets) {
@@ -128,19 +136,41 @@ PresetIndex::Positions PresetIndex::candidates(std::string const& name) const {
     return all;
 }
 
-std::pair<Cfg::ExtractPreset const&, Cfg::PackPreset const&>
-PresetIndex::findMatch(std::string const& name) const {
-    if (extractPresets_.empty() || !isPlainName(name))
-        return presets_.findMatch(name);
-    for (std::uint32_t const position : candidates(name)) {
-        Cfg::ExtractPreset const& preset = *extractPresets_[position];
-        if (!preset.match(name))
-            continue;
-        if (auto const pack = packPresets_.find(preset.packPresetName()); pack != packPresets_.end())
-            return {preset, *pack->second};
-        break;
+bool PresetIndex::fits(Cfg::ExtractPreset const& preset, std::string const& name,
+                       Cfg::MatchTime const& time) const {
+    try {
+        return preset.match(name);
+    } catch (std::runtime_error const&) {
+        if (!time.isUp())
+            throw;
+        throw Base::Error("the patterns of presets took longer than " + Reader::inSeconds(time_) +
+                          " for the document's name, " + Base::inQuotes(preset.strRegex()) + " last");
     }
-    return presets_.findMatch(name);
+}
+
+std::optional<PresetIndex::Match> PresetIndex::firstOf(Positions const& positions, std::string const& name,
+                                                       Cfg::MatchTime const& time) const {
+    auto const found = std::ranges::find_if(
+        positions, [&](std::uint32_t position) { return fits(*extractPresets_[position], name, time); });
+    if (found == positions.end())
+        return std::nullopt;
+    Cfg::ExtractPreset const& preset = *extractPresets_[*found];
+    auto const pack = packPresets_.find(preset.packPresetName());
+    return pack == packPresets_.end() ? std::nullopt : std::optional(Match{preset, *pack->second});
+}
+
+std::optional<PresetIndex::Match> PresetIndex::findInTime(std::string const& name) const {
+    Cfg::MatchTime const time(time_);
+    if (isIndexed_ && isPlainName(name))
+        if (auto const match = firstOf(candidates(name), name, time))
+            return match;
+    return firstOf(all_, name, time);
+}
+
+PresetIndex::Match PresetIndex::findMatch(std::string const& name) const {
+    std::optional<Match> const match = findInTime(name);
+    // The walk says what is missing, in time: all patterns before that have been tried.
+    return match ? *match : presets_.findMatch(name);
 }
 
 Cfg::PackPreset const* packPresetNamed(std::string const& name, Cfg::Presets const& presets) {

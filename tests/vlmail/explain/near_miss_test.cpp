@@ -1,5 +1,7 @@
 // The kinds of near misses that need no PDF, and which of them are told.
+#include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/near_miss.h"
+#include "programs/vlmail/explain/preset_walk.h"
 #include "tests/vlmail/explain/explain_fixture.h"
 
 namespace VlMail {
@@ -302,6 +304,37 @@ TEST(NearMissKinds, StandInTheDescriptionInTheirOrder) {
     for (int kind = 0; kind <= static_cast<int>(NearMissKind::Literal); ++kind)
         known.push_back(nameOf(static_cast<NearMissKind>(kind)));
     EXPECT_EQ(described, known);
+}
+
+TEST_F(NearMissTest, HaveATimeForEachDocumentAndSayWhenItIsUp) {
+    using std::chrono_literals::operator""ms;
+    std::string const settings =
+        R"_({"zones": [{"name": "All", "location": {"right": 100000, "bottom": 100000},
+        "fields": [{"name": "a", "value_extract": "^Ref (?<VAL>x+)$", "value_match": ".*.*.*.*.*:"},
+                   {"name": "b", "value_extract": "^Our (?<VAL>\\d+)$"}]}]})_";
+    Cfg::ExtractPreset const preset(json::strToObject(settings.data(), settings.size()));
+    Reader::Document document = Reader::openDocument("REF " + std::string(900, 'x'), "a.txt");
+    Reader::Trace trace;
+    Reader::readLetters(document, preset, &trace);
+    json::Object explanation;
+    explainPages(explanation, document, preset, trace, {30ms, 30ms});
+    json::Object const reading{{"trace", explanation}};
+    EXPECT_THAT(nearMisses(reading, "a"), testing::Contains(StartsWith("letter_case: ")));
+    EXPECT_THAT(nearMisses(reading, "b"),
+                ElementsAre("failure: nothing was tried for this field, since that took 0.030 s for the "
+                            "fields before it; \"vlmail presets lint\" tells which patterns are slow"));
+}
+
+TEST(PresetWalks, EndInTimeWithTheOneThatCannotBeTriedAnyMore) {
+    using std::chrono_literals::operator""ms;
+    json::Array presets;
+    for (int i = 0; i < 500; ++i)
+        presets.append(json::Object{{"match", ".*.*.*:" + std::to_string(i)}, {"pack_preset", "P"}});
+    Cfg::Presets const settings(json::Object{{"extract_presets", presets}}, false, false);
+    std::vector<PresetStep> const steps = walkPresets(settings, std::string(190, 'x'), 50ms);
+    EXPECT_EQ(steps.back().answer, PresetStep::Answer::Failed);
+    EXPECT_EQ(steps.back().why, "cannot be tried: The time for matching the regular expression is up.");
+    EXPECT_EQ(steps.at(steps.size() - 2).why, "it does not fit, and it takes too long to tell where");
 }
 
 } // namespace

@@ -4,6 +4,7 @@
 
 #include <gmock/gmock.h>
 
+#include <chrono>
 #include <random>
 #include <string>
 #include <vector>
@@ -174,4 +175,30 @@ TEST(PresetIndex, AgreesWithTheWalkOnAnyExpressionsAndNames) {
             ASSERT_EQ(foundBy(index, name), foundBy(Cfg::Presets(presets), name)) << name;
         }
     }
+}
+
+// Each says no in a hundredth of a second or so, which is far from what ends a search by itself.
+TEST(PresetIndex, EndsInTimeAndNamesTheExpressionThatWasTriedLast) {
+    using std::chrono_literals::operator""ms;
+    for (std::size_t const count : {19U, 1'000U}) {
+        std::vector<std::string> expressions;
+        for (std::size_t i = 0; i < count; ++i)
+            expressions.push_back("(?i).*.*.*:" + std::to_string(i));
+        Cfg::Presets const presets = presetsFor(expressions);
+        PresetIndex const index(presets, 30ms);
+        EXPECT_THAT(foundBy(index, std::string(190, 'x')),
+                    testing::MatchesRegex("the patterns of presets took longer than 0\\.030 s for the "
+                                          "document's name, \"\\(\\?i\\)\\.\\*\\.\\*\\.\\*:[0-9]+\" last"));
+    }
+}
+
+TEST(PresetIndex, TellsOfExpressionsThatAreTooComplexAsTheWalkDoes) {
+    std::vector<std::string> expressions = manyExpressions(40);
+    expressions[3] = "(?:x*)*y";
+    Cfg::Presets const presets = presetsFor(expressions);
+    PresetIndex const index(presets);
+    std::string const name = std::string(40, 'x');
+    std::string const told = foundBy(index, name);
+    EXPECT_THAT(told, testing::HasSubstr("complexity"));
+    EXPECT_EQ(told, foundBy(presets, name));
 }
