@@ -14,6 +14,11 @@ if(LLD_PROGRAM AND CMAKE_BUILD_TYPE STREQUAL "Debug")
     add_link_options(-fuse-ld=lld)
 endif()
 
+# A debug build is short of time sooner than of memory: g++ collects its garbage once there are 512 MiB of it, in kB here.
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_BUILD_TYPE STREQUAL "Debug")
+    add_compile_options(--param=ggc-min-heapsize=524288)
+endif()
+
 set(VLSERVICE_SANITIZE "" CACHE STRING "Sanitizers to build with, as -fsanitize= takes them")
 if(VLSERVICE_SANITIZE)
     add_compile_options(-fsanitize=${VLSERVICE_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)

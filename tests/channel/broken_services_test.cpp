@@ -24,7 +24,6 @@ using VLServiceTest::messageOf;
 
 namespace {
 
-constexpr int PRICE = Ipc::PriceEst::CMD_ID;
 /// Waits until the client has gone.
 void wait(RawPeer& peer) {
     while (peer.receive()) {

@@ -27,7 +27,7 @@ struct Owned {
     friend bool operator==(Owned const&, Owned const&) = default;
 };
 
-std::string bytesOf(std::vector<Owned> const& messages) {
+std::string streamOf(std::vector<Owned> const& messages) {
     std::string bytes = Channel::preface();
     for (Owned const& m : messages)
         Channel::appendFrame(bytes, {static_cast<std::uint8_t>(m.command), m.kind, m.sequence, m.text});
@@ -99,13 +99,13 @@ std::vector<Owned> const THREE = {{25, Kind::Request, 2, R"({"id":"p"})"},
 
 TEST(Frames, ReadBackAsTheyWereWritten) {
     FrameDecoder decoder;
-    feed(decoder, bytesOf(THREE));
+    feed(decoder, streamOf(THREE));
     EXPECT_EQ(takeAll(decoder), THREE);
     EXPECT_FALSE(decoder.isInside());
 }
 
 TEST(Frames, ReadTheSameInTwoPiecesCutAnywhere) {
-    std::string const bytes = bytesOf(THREE);
+    std::string const bytes = streamOf(THREE);
     for (std::size_t cut = 0; cut <= bytes.size(); ++cut) {
         FrameDecoder decoder;
         feed(decoder, bytes.substr(0, cut));
@@ -120,7 +120,7 @@ TEST(Frames, ReadTheSameInTwoPiecesCutAnywhere) {
 TEST(Frames, ReadTheSameByteByByte) {
     FrameDecoder decoder;
     std::vector<Owned> messages;
-    for (char const byte : bytesOf(THREE)) {
+    for (char const byte : streamOf(THREE)) {
         feed(decoder, std::string(1, byte));
         for (Owned const& message : takeAll(decoder))
             messages.push_back(message);
@@ -129,7 +129,7 @@ TEST(Frames, ReadTheSameByteByByte) {
 }
 
 TEST(Frames, ThatAreTruncatedAnywhereGiveTheMessagesBeforeAndAnUnfinishedOne) {
-    std::string const bytes = bytesOf(THREE);
+    std::string const bytes = streamOf(THREE);
     std::vector<std::size_t> ends = {Channel::PREFACE_SIZE};
     for (Owned const& message : THREE)
         ends.push_back(ends.back() + Channel::HEADER_SIZE + message.text.size());
@@ -147,13 +147,13 @@ TEST(Frames, ThatAreTruncatedAnywhereGiveTheMessagesBeforeAndAnUnfinishedOne) {
 TEST(Frames, MayBeAsLongAsTheLimit) {
     FrameDecoder decoder;
     std::vector<Owned> const longest = {{1, Kind::Request, 1, std::string(Channel::MAX_TEXT, 'x')}};
-    feed(decoder, bytesOf(longest));
+    feed(decoder, streamOf(longest));
     EXPECT_EQ(takeAll(decoder), longest);
 }
 
 TEST(Frames, AnnounceTheirSize) {
     FrameDecoder decoder;
-    std::string const bytes = bytesOf({{1, Kind::Request, 1, std::string(100, 'x')}});
+    std::string const bytes = streamOf({{1, Kind::Request, 1, std::string(100, 'x')}});
     feed(decoder, bytes.substr(0, Channel::PREFACE_SIZE + Channel::HEADER_SIZE - 1));
     EXPECT_EQ(decoder.next(), std::nullopt);
     EXPECT_EQ(decoder.announced(), 0u);
@@ -164,7 +164,7 @@ TEST(Frames, AnnounceTheirSize) {
 
 TEST(Frames, AllocateNothingForWhatIsOnlyAnnounced) {
     FrameDecoder decoder;
-    feed(decoder, bytesOf({{1, Kind::Request, 1, std::string(Channel::MAX_TEXT, 'x')}}).substr(0, 100));
+    feed(decoder, streamOf({{1, Kind::Request, 1, std::string(Channel::MAX_TEXT, 'x')}}).substr(0, 100));
     EXPECT_EQ(decoder.next(), std::nullopt);
     EXPECT_LE(decoder.room().size(), 64u * 1024);
 }
@@ -206,7 +206,7 @@ INSTANTIATE_TEST_SUITE_P(
 TEST(Frames, KeepToALowerLimit) {
     FrameDecoder decoder;
     decoder.limitText(99);
-    feed(decoder, bytesOf({{1, Kind::Request, 1, std::string(100, 'x')}}));
+    feed(decoder, streamOf({{1, Kind::Request, 1, std::string(100, 'x')}}));
     EXPECT_THROW(decoder.next(), Base::Error);
 }
 
@@ -290,7 +290,7 @@ std::string block(std::string const& name) {
 }
 
 TEST(FrameDescription, ShowsARequestBehindThePreface) {
-    EXPECT_EQ(block("request"), VLServiceTest::hexDump(bytesOf(
+    EXPECT_EQ(block("request"), VLServiceTest::hexDump(streamOf(
                                     {{20, Kind::Request, 2, R"({"db_host":"db","db_name":"packs"})"}})));
 }
 

@@ -11,7 +11,9 @@
 
 using namespace testing;
 using namespace Channel;
+using ChannelTest::NO_GREETING;
 using ChannelTest::NO_KNOWLEDGE;
+using ChannelTest::plainTerms;
 using ChannelTest::TOKEN;
 using Verdict = GreetingStep::Verdict;
 
@@ -20,10 +22,6 @@ namespace {
 std::string const CLIENT_NONCE(64, '0');
 std::string const SERVICE_NONCE(64, 'f');
 
-/// As both sides of a connection without TLS see it.
-Terms plainTerms(std::uint16_t version = VERSION) {
-    return {version, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"};
-}
 Terms tlsTerms(std::uint16_t version = VERSION) { return {version, TOKEN, "AA", "", ""}; }
 
 ClientGreeting makeClient(Terms const& terms = plainTerms()) { return {terms, CLIENT_NONCE}; }
@@ -114,7 +112,6 @@ struct Case {
     Frame frame() const { return {static_cast<std::uint8_t>(command), kind, sequence, text}; }
 };
 
-constexpr auto NO_GREETING = "The greeting is missing.";
 constexpr auto NO_ANSWER = "It does not greet.";
 constexpr auto NO_TEXT = "JSON error: Wrong type: empty. Expected type: string";
 constexpr auto OTHER_TOKEN = "Its access token is not the one of this service.";

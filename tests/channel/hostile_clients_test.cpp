@@ -23,8 +23,6 @@ using Channel::Kind;
 
 namespace {
 
-constexpr int PRICE = Ipc::PriceEst::CMD_ID;
-
 class HostileClients : public Test {
 protected:
     SharedLog log;
@@ -68,8 +66,6 @@ TEST_P(BadBeginnings, AreToldLoggedAndClosed) {
 std::string greetingOf(int command, Kind kind, std::uint32_t sequence, std::string const& text) {
     return Channel::preface() + bytesOf(command, kind, sequence, text);
 }
-
-constexpr auto NO_GREETING = "The greeting is missing.";
 
 INSTANTIATE_TEST_SUITE_P(
     Bytes, BadBeginnings,

@@ -170,6 +170,8 @@ private:
 /// A port that nobody listens on, as far as one can know.
 std::uint16_t freePort();
 
+constexpr int PRICE = Ipc::PriceEst::CMD_ID;
+
 /// The bytes of a message.
 std::string bytesOf(int command, Channel::Kind kind, std::uint32_t sequence, std::string const& text);
 

@@ -22,6 +22,7 @@
 
 using namespace testing;
 using namespace Channel;
+using ChannelTest::plainTerms;
 using ChannelTest::TOKEN;
 using VLServiceTest::messageOf;
 namespace fs = std::filesystem;
@@ -167,8 +168,6 @@ TEST_F(PrivateFiles, KeepATokenThatOthersCanReadFromBeingUsed) {
 // --- proofs
 
 /// A connection without TLS.
-Terms plainTerms(std::uint16_t version) { return {version, TOKEN, "", "127.0.0.1:40000", "127.0.0.1:4711"}; }
-
 TEST(Proofs, AreTheDescribedOnes) {
     std::string const client(64, '0');
     std::string const service(64, 'f');

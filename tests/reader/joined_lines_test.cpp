@@ -137,9 +137,9 @@ TEST(JoinedLines, OfManyLinesInOnePlaceAreFewForEachLine) {
 }
 
 TEST(JoinedLines, OfSizesThatNoLetterHasAreNone) {
-    constexpr int FAR = std::numeric_limits<int>::max() / 4;
-    std::vector<PlacedLine> const lines{{0, 1, {0, -FAR, 1000, FAR}, 400, Turn::Upright},
-                                        {2, 1, {2000, 0, 3000, 400}, FAR, Turn::Upright},
+    constexpr int FAR_AWAY = std::numeric_limits<int>::max() / 4;
+    std::vector<PlacedLine> const lines{{0, 1, {0, -FAR_AWAY, 1000, FAR_AWAY}, 400, Turn::Upright},
+                                        {2, 1, {2000, 0, 3000, 400}, FAR_AWAY, Turn::Upright},
                                         {4, 1, {4000, 0, 5000, 400}, 400, Turn::Upright}};
     EXPECT_THAT(joinsOf(lines), IsEmpty());
 }
