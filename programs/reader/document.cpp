@@ -51,6 +51,11 @@ std::string Document::singlePagePdf(int number) {
     return source_->singlePagePdf(number);
 }
 
+std::optional<Picture> Document::drawPage(int number, double dotsPerInch) {
+    checkNumber(number);
+    return source_->drawPage(number, dotsPerInch);
+}
+
 std::string Document::renderPage(int number, double dotsPerInch) {
     checkNumber(number);
     return source_->renderPage(number, dotsPerInch);

@@ -3,10 +3,12 @@
 
 #include "programs/base/error.h"
 #include "programs/reader/page.h"
+#include "programs/reader/page_check.h"
 
 #include <filesystem>
 #include <map>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace Reader {
@@ -34,6 +36,8 @@ public:
     /// Whether a PDF of one page shows the words and, at 36 dots per inch, the picture of this page. One that
     /// cannot be opened shows nothing. Throws Error when this page cannot be drawn.
     bool showsTheSame(int number, std::string const& pdf);
+    /// The page as it looks, upright or turned as it is shown; nothing for text, which is black on white.
+    std::optional<Picture> drawPage(int number, double dotsPerInch);
     /// A PNG picture of the page.
     std::string renderPage(int number, double dotsPerInch);
 

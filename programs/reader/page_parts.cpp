@@ -1,6 +1,8 @@
 #include "programs/reader/page_parts.h"
 
+#include <qpdf/Buffer.hh>
 #include <qpdf/QPDFObjectHandle.hh>
+#include <qpdf/QPDFWriter.hh>
 
 #include <set>
 #include <string>
@@ -169,6 +171,16 @@ void carryCatalog(QPDF& document, QPDF& single, QPDFPageObjectHelper page) {
     if (layers.isDictionary())
         single.getRoot().replaceKey("/OCProperties", single.copyForeignObject(indirect(document, layers)));
     carryForm(document, single, page);
+}
+
+std::string bytesOf(QPDF& pdf) {
+    QPDFWriter writer(pdf);
+    writer.setOutputMemory();
+    writer.setDeterministicID(true);
+    writer.setObjectStreamMode(qpdf_o_generate);
+    writer.write();
+    auto const bytes = writer.getBufferSharedPointer();
+    return std::string(reinterpret_cast<char const*>(bytes->getBuffer()), bytes->getSize());
 }
 
 } // namespace Reader

@@ -5,6 +5,8 @@
 #include <qpdf/QPDF.hh>
 #include <qpdf/QPDFPageObjectHelper.hh>
 
+#include <string>
+
 namespace Reader {
 
 /// Takes fonts and forms out of the page's resources that nothing on the page uses: neither its content nor
@@ -17,5 +19,8 @@ void separateFormFields(QPDFPageObjectHelper page);
 
 /// Carries over which layers are shown, and how the fields of forms look. `page` was added to `single`.
 void carryCatalog(QPDF& document, QPDF& single, QPDFPageObjectHelper page);
+
+/// The PDF as bytes, the same for the same objects.
+std::string bytesOf(QPDF& pdf);
 
 } // namespace Reader

@@ -4,11 +4,9 @@
 #include "programs/base/hex.h"
 #include "programs/reader/page_parts.h"
 
-#include <qpdf/Buffer.hh>
 #include <qpdf/QPDF.hh>
 #include <qpdf/QPDFObjectHandle.hh>
 #include <qpdf/QPDFPageDocumentHelper.hh>
-#include <qpdf/QPDFWriter.hh>
 
 #include <stdexcept>
 #include <utility>
@@ -16,16 +14,6 @@
 
 namespace Reader {
 namespace {
-
-std::string bytesOf(QPDF& pdf) {
-    QPDFWriter writer(pdf);
-    writer.setOutputMemory();
-    writer.setDeterministicID(true);
-    writer.setObjectStreamMode(qpdf_o_generate);
-    writer.write();
-    auto const bytes = writer.getBufferSharedPointer();
-    return std::string(reinterpret_cast<char const*>(bytes->getBuffer()), bytes->getSize());
-}
 
 std::string hex(unsigned value) { return Base::hexNumber(value, 4); }
 
