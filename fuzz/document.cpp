@@ -1,5 +1,5 @@
 // A document's bytes, PDF or text: read, searched with the presets that every node has, its first page
-// written and read again.
+// written, held against the document's and read again.
 #include "programs/base/error.h"
 #include "programs/reader/letters.h"
 
@@ -36,7 +36,9 @@ void read(std::string bytes) {
     if (document.pageCount() > MAX_PAGES)
         return;
     search(document, presets.matchExtrPreset("document"));
-    Reader::Document const single = Reader::openDocument(document.singlePagePdf(1), "page");
+    std::string const page = document.singlePagePdf(1);
+    document.showsTheSame(1, page);
+    Reader::Document const single = Reader::openDocument(page, "page");
     require(single.pageCount() == 1);
 }
 

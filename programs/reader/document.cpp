@@ -62,6 +62,9 @@ std::string Document::renderPage(int number, double dotsPerInch) {
 }
 
 bool Document::showsTheSame(int number, std::string const& pdf) {
+    checkNumber(number);
+    if (source_->hasSameObjects(number, pdf))
+        return true;
     Page const& shown = page(number);
     std::optional<Picture> const picture = source_->drawPage(number, CHECKED_DOTS_PER_INCH);
     try {

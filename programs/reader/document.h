@@ -33,8 +33,9 @@ public:
     Page const& page(int number);
     /// A PDF of this page alone. The same page gives the same bytes.
     std::string singlePagePdf(int number);
-    /// Whether a PDF of one page shows the words and, at 36 dots per inch, the picture of this page. One that
-    /// cannot be opened shows nothing. Throws Error when this page cannot be drawn.
+    /// Whether a PDF of one page shows the words and, at 36 dots per inch, the picture of this page. Both are
+    /// drawn unless they are made of the same objects. One that cannot be opened shows nothing. Throws Error
+    /// when this page cannot be drawn.
     bool showsTheSame(int number, std::string const& pdf);
     /// The page as it looks, upright or turned as it is shown; nothing for text, which is black on white.
     std::optional<Picture> drawPage(int number, double dotsPerInch);

@@ -7,6 +7,8 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <string>
 
 namespace Reader {
 
@@ -19,6 +21,8 @@ public:
     virtual Page readPage(int number) = 0;
     virtual std::string singlePagePdf(int number) = 0;
     virtual std::string renderPage(int number, double dotsPerInch) = 0;
+    /// Whether a PDF of one page is certain to show what the page shows, as its parts tell without drawing.
+    virtual bool hasSameObjects(int number, std::string_view pdf) = 0;
     /// Nothing where a page has no other picture than the PDF that is made of it.
     virtual std::optional<Picture> drawPage(int number, double dotsPerInch) = 0;
 };

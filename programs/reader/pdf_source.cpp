@@ -2,6 +2,7 @@
 // pdf_page.
 #include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
+#include "programs/reader/page_objects.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_page.h"
 #include "programs/reader/writing_direction.h"
@@ -167,7 +168,7 @@ bool saysEncrypted(std::string_view bytes) { return bytes.find("/Encrypt") != st
 class PdfSource : public PageSource {
 public:
     PdfSource(std::string bytes, std::string where)
-        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_) {
+        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_), objects_(bytes_) {
         preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
             throw Base::Error(where_ + ": is larger than 2 GiB; split it");
@@ -206,6 +207,8 @@ public:
         popplerPage(number); // It throws for a page that was not read either.
         return writer_.write(number, pageCount());
     }
+
+    bool hasSameObjects(int number, std::string_view pdf) override { return objects_.areSame(number, pdf); }
 
     std::string renderPage(int number, double dotsPerInch) override {
         fontFailure().clear();
@@ -254,10 +257,11 @@ private:
         return page;
     }
 
-    /// poppler and the writer read from it as long as they live.
+    /// poppler, the writer and its check read from it as long as they live.
     std::string const bytes_;
     std::string const where_;
     PdfPageWriter writer_;
+    PageObjects objects_;
     std::unique_ptr<poppler::document> document_;
 };
 

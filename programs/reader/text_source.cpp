@@ -153,6 +153,8 @@ public:
     int pageCount() const override { return static_cast<int>(pages_.size()); }
     Page readPage(int number) override { return page(number); }
     std::string singlePagePdf(int number) override { return pdfOfTypedPage(page(number), where_); }
+    bool hasSameObjects(int, std::string_view) override { return false; }
+
     std::optional<Picture> drawPage(int, double) override { return std::nullopt; }
     std::string renderPage(int number, double dotsPerInch) override {
         return openPdf(singlePagePdf(number), where_)->renderPage(1, dotsPerInch);

@@ -65,6 +65,13 @@ std::string PdfMaker::bytes() {
     return written(writer);
 }
 
+std::string PdfMaker::linearized() {
+    QPDFWriter writer(pdf_->file);
+    writer.setOutputMemory();
+    writer.setLinearization(true);
+    return written(writer);
+}
+
 std::string PdfMaker::encrypted(char const* password) {
     QPDFWriter writer(pdf_->file);
     writer.setOutputMemory();

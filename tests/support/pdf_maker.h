@@ -22,6 +22,8 @@ public:
     PdfMaker& losePage();
 
     std::string bytes();
+    /// With the first page in front, for readers that get it piece by piece.
+    std::string linearized();
     /// The password opens it; an empty one is not asked for.
     std::string encrypted(char const* password);
 

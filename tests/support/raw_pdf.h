@@ -1,6 +1,7 @@
 #pragma once
 // Writes PDFs as they are told, whether they make sense or not.
 
+#include <algorithm>
 #include <map>
 #include <string>
 #include <zlib.h>
@@ -28,17 +29,19 @@ public:
                                   bytes + "\nendstream");
     }
 
-    std::string bytes() const { return appendedTo("%PDF-1.7\n", ""); }
+    std::string bytes() const { return appendedTo("%PDF-1.7\n", 0, ""); }
 
     /// An incremental update of a PDF that bytes() has given: these objects stand behind it and replace its
     /// own of the same numbers.
     std::string behind(std::string const& earlier) const {
         std::size_t const last = earlier.rfind("startxref\n") + 10;
-        return appendedTo(earlier, " /Prev " + earlier.substr(last, earlier.find('\n', last) - last));
+        int const size = std::stoi(earlier.substr(earlier.rfind("/Size ") + 6));
+        return appendedTo(earlier, size, " /Prev " + earlier.substr(last, earlier.find('\n', last) - last));
     }
 
 private:
-    std::string appendedTo(std::string pdf, std::string const& trailerKeys) const {
+    std::string appendedTo(std::string pdf, int size, std::string const& trailerKeys) const {
+        size = std::max(size, objects_.rbegin()->first + 1);
         std::string table = "xref\n0 1\n0000000000 65535 f \n";
         for (auto const& [number, body] : objects_) {
             std::string const offset = std::to_string(pdf.size());
@@ -47,8 +50,8 @@ private:
             pdf += std::to_string(number) + " 0 obj\n" + body + "\nendobj\n";
         }
         std::string const start = std::to_string(pdf.size());
-        return pdf + table + "trailer\n<< /Size 1000 /Root 1 0 R" + trailerKeys + " >>\nstartxref\n" + start +
-               "\n%%EOF\n";
+        return pdf + table + "trailer\n<< /Size " + std::to_string(size) + " /Root 1 0 R" + trailerKeys +
+               " >>\nstartxref\n" + start + "\n%%EOF\n";
     }
 
     std::map<int, std::string> objects_;
