@@ -245,7 +245,7 @@ bool separatesLetters(ExtractField const& field) {
 }
 
 std::shared_ptr<ExtractedField> cutField(ExtractField const& field, ZoneText& text, FieldTrace& trace) {
-    if (!beginsAtFirstLine(field))
+    if (field.ignoreFontMetrics() || !beginsAtFirstLine(field))
         return cutOut(field, text, trace);
     ZoneText address = text;
     trace.sendersLine = address.cutSmallerLinesAbove();

@@ -77,6 +77,15 @@ TEST(SendersLines, StayForFieldsThatAreNoAddressOrOneLine) {
               "Candle Works Ltd, 1 Wick Lane, Leeds LS1 4AP");
 }
 
+TEST(SendersLines, StayForFieldsThatIgnoreTheSizeOfPrint) {
+    Cfg::ExtractField field(Cfg::ExtractField::DefPostal());
+    field.setIgnoreFontMertics(true);
+    FieldTrace const trace = addressIn(withSendersLine(), field);
+    EXPECT_EQ(trace.rawText, "Candle Works Ltd, 1 Wick Lane, Leeds LS1 4AP\n"
+                             "Lena Brandt\n3 Orchard Close\nWhitstable CT5 1AA");
+    EXPECT_EQ(trace.sendersLine, "");
+}
+
 TEST(SendersLines, StayInTheTextWhenNoAddressIsFound) {
     Typesetter const set = withSendersLine();
     ZoneText text = windowOf(set);

@@ -1,8 +1,10 @@
 // Keys that nobody knows, and values that are not read as they stand.
 #include "programs/reader/reading_rules.h"
+#include "programs/vlmail/presets/acting.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
+#include "vlservice/json/json_text.h"
 #include "vlservice/presets/settings_parts.h"
 
 #include <algorithm>
@@ -88,6 +90,11 @@ std::vector<std::string> keysOfReader(RecordKeys const& keys) {
                                              : std::vector<std::string>();
 }
 
+/// Whether there is something else than what a missing key reads as.
+bool isSet(json::Value const& value, KeyRow const& row) {
+    return isOfType(value, row.form.type) && json::toText(value) != row.missing;
+}
+
 class KeyChecker {
 public:
     explicit KeyChecker(Findings& findings) : findings_(findings) {}
@@ -114,10 +121,12 @@ private:
             return checkUnknown(object, key, parent / key, keys);
         if (row->use == KeyUse::Dropped)
             return findings_.add(DroppedKey, parent / key, {inQuotes(key)});
-        if (row->inheritance != Inheritance::Whole)
-            return checkValue(value, parent / key, *row);
-        Unwrapped const unwrapped = unwrap(value, parent / key);
+        Unwrapped const unwrapped = row->inheritance == Inheritance::Whole
+                                        ? unwrap(value, parent / key)
+                                        : Unwrapped{value, parent / key, false};
         checkValue(unwrapped.node, unwrapped.place, *row);
+        if (isCarriedOnly(keys, key) && isSet(unwrapped.node, *row))
+            findings_.add(CarriedOnly, unwrapped.place, {inQuotes(key)});
     }
 
     void checkUnknown(json::Object const& object, std::string const& key, Place const& place,

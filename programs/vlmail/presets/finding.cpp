@@ -48,6 +48,9 @@ constexpr FindingWords WORDS[] = {
     {UnknownNumber, "unknown-number", Warning,
      "{0} has no meaning: {1}",
      "write a number from {2}"},
+    {CarriedOnly, "carried-only", Warning,
+     "{0} is kept and handed on, and changes nothing here",
+     "remove it unless another program reads it"},
 
     {EmptyMatch, "empty-match", Error,
      "an empty expression fits no document's name: the preset is never used",

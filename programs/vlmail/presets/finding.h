@@ -24,6 +24,7 @@ enum class FindingKind {
     RefusedType,
     CutNumber,
     UnknownNumber,
+    CarriedOnly,
     // Lists of presets.
     EmptyMatch,
     MatchWithoutEnding,

@@ -60,6 +60,19 @@ std::vector<Case> const CASES{
      partWithField(R"_({"name": "ref", "default_value": "none", "colour": "red"})_"),
      {"warning /extract_presets/0/zones/0/fields/1/colour: \"colour\" is no known key and changes nothing | "
       "remove it, or look its name up [unknown-key]"}},
+    {"KeysThatNobodyActsOn",
+     R"_({"app": {"debug_view": 3, "m": 0, "dep_alias": "cost centre"}})_",
+     {"warning /app/debug_view: \"debug_view\" is kept and handed on, and changes nothing here | remove it "
+      "unless another program reads it [carried-only]",
+      "warning /app/dep_alias: \"dep_alias\" is kept and handed on, and changes nothing here | remove it "
+      "unless another program reads it [carried-only]"}},
+    {"AKeyThatNobodyActsOnInAPreset",
+     partOf(preset(R"_("match": "a.*", "pack_preset": "P", "ocr_mode": 1, "retry_on_repeated": 0)_"),
+            R"_({"name": "P", "process_mode_client": 1})_"),
+     {"warning /extract_presets/0/ocr_mode: \"ocr_mode\" is kept and handed on, and changes nothing here | "
+      "remove it unless another program reads it [carried-only]",
+      "warning /pack_presets/0/process_mode_client: \"process_mode_client\" is kept and handed on, and "
+      "changes nothing here | remove it unless another program reads it [carried-only]"}},
     {"TheSpellingOfEnfoceDep",
      R"_({"app": {"enforce_dep": true, "enforce_po": true}})_",
      {"error /app/enforce_dep: \"enforce_dep\" is no known key and changes nothing | write \"enfoce_dep\" "
@@ -147,7 +160,9 @@ std::vector<Case> const CASES{
     {"AnUnsignedNumberBelowZero",
      R"_({"extract_presets": [{"match": "a.*", "pack_preset": "P", "type": 1, "ocr_test_pages": -1}], "pack_presets": [{"name": "P"}]})_",
      {"error /extract_presets/0/ocr_test_pages: -1 does not fit and reads as 4294967295 | write a number "
-      "from 0 to 4294967295 [cut-number]"}},
+      "from 0 to 4294967295 [cut-number]",
+      "warning /extract_presets/0/ocr_test_pages: \"ocr_test_pages\" is kept and handed on, and "
+      "changes nothing here | remove it unless another program reads it [carried-only]"}},
     {"NumbersWithoutAMeaning",
      partWithField(
          R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>.*)$", "value_type": 4, "ignore_on_group": 7})_"),
@@ -264,7 +279,9 @@ std::vector<Case> const CASES{
       "[process-mode-refused]",
       "error /pack_presets/0/process_mode_client: 4 is refused, and all settings of the document with it: it "
       "has none of the bits 1, 2 and 16 | write 0, or a number up to 255 with one of the bits 1, 2 and 16 "
-      "[process-mode-refused]"}},
+      "[process-mode-refused]",
+      "warning /pack_presets/0/process_mode_client: \"process_mode_client\" is kept and handed on, and "
+      "changes nothing here | remove it unless another program reads it [carried-only]"}},
     {"AProcessModeOfMoreThanEightBits",
      partOf(preset(R"_("match": "a.*", "pack_preset": "P")_"), R"_({"name": "P", "process_mode": 256})_"),
      {"error /pack_presets/0/process_mode: 256 is refused, and all settings of the document with it: it has "
