@@ -57,8 +57,15 @@ void Dispatch::mailLetters(DocumentReading reading) {
         MailingBuilder& mailing = mailingFor(reading.packPreset).builder();
         if (name.empty())
             name = mailing.nameFor(reading.document);
+        noteNotifications(reading.document, letter);
         mailing.add(name, std::move(letter));
     }
+}
+
+void Dispatch::noteNotifications(std::string const& name, LetterReading const& letter) {
+    for (auto const& [priority, field] : letter.fields)
+        if (priority < 0 && field.rawValue().isString())
+            notifications_.push_back({name, letter.pages, field.name(), field.rawValue().toString()});
 }
 
 OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
@@ -107,6 +114,9 @@ void Dispatch::print() const {
         table.print(terminal_.out);
     for (std::string const& document : attachments_)
         terminal_.out << "not a letter: " << document << ", an attachment\n";
+    for (Notification const& each : notifications_)
+        terminal_.out << "to be notified: " << Base::inQuotes(each.address) << " of " << each.name << ", "
+                      << pagesInWords(each.pages) << ", by its field " << Base::inQuotes(each.field) << '\n';
     for (LeftBehind const& letter : leftOut_)
         terminal_.out << "left out: " << letter.name << ", " << pagesInWords(letter.pages) << ": "
                       << letter.reason << '\n';
@@ -128,10 +138,23 @@ json::Object Dispatch::toJson() const {
     json::Array attachments;
     for (std::string const& document : attachments_)
         attachments.append(document);
-    return {{"mailings", mailings},
-            {"left_out", toJson(leftOut_)},
-            {"attachments", attachments},
-            {"failures", toJson(failures_)}};
+    json::Object object{{"mailings", mailings},
+                        {"left_out", toJson(leftOut_)},
+                        {"attachments", attachments},
+                        {"failures", toJson(failures_)}};
+    if (!notifications_.empty())
+        object.set("notifications", toJson(notifications_));
+    return object;
+}
+
+json::Array Dispatch::toJson(std::vector<Notification> const& all) {
+    json::Array array;
+    for (Notification const& each : all)
+        array.append(json::Object{{"name", each.name},
+                                  {"pages", toJsonArray(each.pages)},
+                                  {"field", each.field},
+                                  {"address", each.address}});
+    return array;
 }
 
 json::Array Dispatch::toJson(std::vector<LeftBehind> const& all) {

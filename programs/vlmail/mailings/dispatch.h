@@ -29,7 +29,7 @@ public:
 
     /// A table of the mailings, and a line for each document and letter that stays behind.
     void print() const;
-    /// {"mailings", "left_out", "attachments", "failures"}.
+    /// {"mailings", "left_out", "attachments", "failures"}, and "notifications" where there are any.
     json::Object toJson() const;
     Outcome::End end() const { return outcome_.end(); }
 
@@ -41,11 +41,21 @@ private:
         std::string reason;
     };
 
+    /// Somebody who is to hear of a letter that goes out, by an address of a priority below 0.
+    struct Notification {
+        std::string name;
+        std::vector<int> pages;
+        std::string field;
+        std::string address;
+    };
+
     void mailLetters(DocumentReading reading);
+    void noteNotifications(std::string const& name, LetterReading const& letter);
     OutgoingMailing& mailingFor(std::string const& packPreset);
     std::string priceInWords(OutgoingMailing const* mailing) const;
     void fail(std::string const& name, std::string const& reason);
     static json::Array toJson(std::vector<LeftBehind> const& all);
+    static json::Array toJson(std::vector<Notification> const& all);
     json::Object toJson(OutgoingMailing& mailing) const;
 
     Cfg::Presets const& presets_;
@@ -59,6 +69,7 @@ private:
     std::vector<LeftBehind> leftOut_;
     std::vector<LeftBehind> failures_;
     std::vector<std::string> attachments_;
+    std::vector<Notification> notifications_;
     Outcome outcome_;
 };
 

@@ -27,7 +27,8 @@ constexpr char const* SETTINGS = R"({
         {"match": "invoice.*", "pack_preset": "Invoices", "zones": [
             {"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
                 {"name": "number", "value_extract": "^No (?<VAL>\\d+)$", "value_type": 1, "obligatory": true},
-                {"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 1, "send_to_server": true}]}]},
+                {"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 1, "send_to_server": true},
+                {"name": "copy", "value_extract": "^Copy: (?<VAL>.*)$", "priority": -1}]}]},
         {"match": "terms.*", "pack_preset": "Invoices", "type": 1},
         {"match": "broken.*", "pack_preset": "Invoices", "zones": [
             {"name": "Page", "fields": [{"name": "total", "value_extract": "(", "priority": 0}]}]},
@@ -319,6 +320,18 @@ TEST_F(VlMailTest, LeavesOutBothLettersThatMayBeTwoUntilAPersonAcceptsThem) {
     ASSERT_EQ(mailings().size(), 1u);
     ASSERT_EQ(metadataOf(mailings()[0]).letters.size(), 2u);
     EXPECT_THAT(metadataOf(mailings()[0]).letters[0].documents[0].pages, ElementsAre(1, 2, 3, 4));
+}
+
+TEST_F(VlMailTest, TellsWhoIsToBeNotified) {
+    write("invoice 1.txt", "No 1\nTo: Ada\nCopy: office@acme.example\n");
+    write("invoice 2.txt", "No 2\nCopy: nobody@acme.example\n");
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt", "invoice 2.txt"}, {"-o", path("plan.json"), "--json"}),
+              VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr(R"("notifications":[{"name":"invoice 1.txt","pages":[1],)"
+                                R"("field":"copy","address":"office@acme.example"}]})"));
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FINE);
+    EXPECT_THAT(out_, HasSubstr("to be notified: \"office@acme.example\" of invoice 1.txt, page 1, by its "
+                                "field \"copy\"\n"));
 }
 
 TEST_F(VlMailTest, DecidesOnDoubtfulJoinsInThePlan) {
