@@ -16,8 +16,9 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// A page of words is some 100,000 points then.
-constexpr double CHECKED_DOTS_PER_INCH = 36;
+/// Of A4 they take some 6 MB.
+constexpr std::size_t KEPT_OVERVIEWS = 16;
+constexpr std::size_t MOST_KEPT_BYTES = std::size_t{1} << 20;
 
 bool isNamedPdf(fs::path const& name) {
     std::string ending = name.extension().string();
@@ -61,16 +62,42 @@ std::string Document::renderPage(int number, double dotsPerInch) {
     return source_->renderPage(number, dotsPerInch);
 }
 
+std::optional<Picture> const& Document::overview(int number) {
+    checkNumber(number);
+    if (auto const kept = overviews_.find(number); kept != overviews_.end())
+        return kept->second;
+    if (lastOverview_.first == number)
+        return lastOverview_.second;
+    std::optional<Picture> drawn = source_->drawPage(number, OVERVIEW_DOTS_PER_INCH);
+    bool const isSmall = !drawn || drawn->points.size() <= MOST_KEPT_BYTES;
+    if (isSmall && overviews_.size() < KEPT_OVERVIEWS)
+        return overviews_.emplace(number, std::move(drawn)).first->second;
+    lastOverview_ = {number, std::move(drawn)};
+    return lastOverview_.second;
+}
+
+std::optional<Picture> Document::drawPart(int number, Raster const& raster) {
+    checkNumber(number);
+    return source_->drawPart(number, raster);
+}
+
+PageExtras Document::extrasOf(int number) {
+    checkNumber(number);
+    return source_->extrasOf(number);
+}
+
+std::vector<std::string> Document::embeddedFiles() { return source_->embeddedFiles(); }
+
 bool Document::showsTheSame(int number, std::string const& pdf) {
     checkNumber(number);
     if (source_->hasSameObjects(number, pdf))
         return true;
     Page const& shown = page(number);
-    std::optional<Picture> const picture = source_->drawPage(number, CHECKED_DOTS_PER_INCH);
+    std::optional<Picture> const& picture = overview(number);
     try {
         std::unique_ptr<PageSource> const written = openPdf(pdf, name_);
         return haveSameWords(shown, written->readPage(1)) &&
-               (!picture || lookTheSame(*picture, *written->drawPage(1, CHECKED_DOTS_PER_INCH)));
+               (!picture || lookTheSame(*picture, *written->drawPage(1, OVERVIEW_DOTS_PER_INCH)));
     } catch (Base::Error const&) {
         return false;
     }

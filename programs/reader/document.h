@@ -4,16 +4,22 @@
 #include "programs/base/error.h"
 #include "programs/reader/page.h"
 #include "programs/reader/page_check.h"
+#include "programs/reader/page_extras.h"
 
 #include <filesystem>
 #include <map>
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace Reader {
 
 class PageSource;
+
+/// A page of words is some 100,000 points then.
+constexpr double OVERVIEW_DOTS_PER_INCH = 36;
 
 /// One document. Pages are read when they are first asked for, and stay where they are as long as it lives.
 /// A document belongs to one thread; several threads may each have their own.
@@ -33,12 +39,18 @@ public:
     Page const& page(int number);
     /// A PDF of this page alone. The same page gives the same bytes.
     std::string singlePagePdf(int number);
-    /// Whether a PDF of one page shows the words and, at 36 dots per inch, the picture of this page. Both are
-    /// drawn unless they are made of the same objects. One that cannot be opened shows nothing. Throws Error
+    /// Whether a PDF of one page shows the words and the overview of this page. Both are drawn
+    /// unless they are made of the same objects. One that cannot be opened shows nothing. Throws Error
     /// when this page cannot be drawn.
     bool showsTheSame(int number, std::string const& pdf);
     /// The page as it looks, upright or turned as it is shown; nothing for text, which is black on white.
     std::optional<Picture> drawPage(int number, double dotsPerInch);
+    /// The page at OVERVIEW_DOTS_PER_INCH; nothing for one that is typed, whose words are all there is on it.
+    /// Valid until the next call. Throws Error when the page cannot be drawn.
+    std::optional<Picture> const& overview(int number);
+    std::optional<Picture> drawPart(int number, Raster const& raster);
+    PageExtras extrasOf(int number);
+    std::vector<std::string> embeddedFiles();
     /// A PNG picture of the page.
     std::string renderPage(int number, double dotsPerInch);
 
@@ -48,6 +60,9 @@ private:
     std::string name_;
     std::unique_ptr<PageSource> source_;
     std::map<int, Page> pages_;
+    /// Those of the first pages that were asked for, and the last one.
+    std::map<int, std::optional<Picture>> overviews_;
+    std::pair<int, std::optional<Picture>> lastOverview_;
 };
 
 /// Opens a PDF, or a text file whose pages end with form feeds. Throws Error.

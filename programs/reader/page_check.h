@@ -14,6 +14,16 @@ struct Picture {
     std::string points;
 };
 
+/// How a part of a page is drawn: the part in points of the whole picture.
+struct Raster {
+    double acrossDotsPerInch = 0;
+    double downDotsPerInch = 0;
+    int left = 0;
+    int top = 0;
+    int width = 0;
+    int height = 0;
+};
+
 /// The same texts at the same places, in whatever order.
 bool haveSameWords(Page const& one, Page const& other);
 

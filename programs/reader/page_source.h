@@ -3,12 +3,13 @@
 
 #include "programs/reader/page.h"
 #include "programs/reader/page_check.h"
+#include "programs/reader/page_extras.h"
 
 #include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <string>
+#include <vector>
 
 namespace Reader {
 
@@ -25,6 +26,12 @@ public:
     virtual bool hasSameObjects(int number, std::string_view pdf) = 0;
     /// Nothing where a page has no other picture than the PDF that is made of it.
     virtual std::optional<Picture> drawPage(int number, double dotsPerInch) = 0;
+    /// The same for a part, with hard edges: a point is dark when anything touches it.
+    virtual std::optional<Picture> drawPart(int /*number*/, Raster const& /*raster*/) { return std::nullopt; }
+    /// What a sheet of paper cannot show of the page, or may show otherwise.
+    virtual PageExtras extrasOf(int /*number*/) { return {}; }
+    /// The names of the files inside the document.
+    virtual std::vector<std::string> embeddedFiles() { return {}; }
 };
 
 // `where` names the document in messages.

@@ -4,11 +4,13 @@
 #include "programs/reader/clean_text.h"
 #include "programs/reader/page_objects.h"
 #include "programs/reader/page_source.h"
+#include "programs/reader/pdf_extras.h"
 #include "programs/reader/pdf_page.h"
 #include "programs/reader/writing_direction.h"
 #include "vlservice/platform/log.h"
 
 #include <poppler-document.h>
+#include <poppler-font.h>
 #include <poppler-image.h>
 #include <poppler-page-renderer.h>
 #include <poppler-page.h>
@@ -168,7 +170,8 @@ bool saysEncrypted(std::string_view bytes) { return bytes.find("/Encrypt") != st
 class PdfSource : public PageSource {
 public:
     PdfSource(std::string bytes, std::string where)
-        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_), objects_(bytes_) {
+        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_), objects_(bytes_),
+          extras_(bytes_, where_) {
         preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
             throw Base::Error(where_ + ": is larger than 2 GiB; split it");
@@ -221,7 +224,36 @@ public:
     }
 
     std::optional<Picture> drawPage(int number, double dotsPerInch) override {
-        poppler::image const image = draw(number, dotsPerInch);
+        return pictureOf(draw(number, dotsPerInch));
+    }
+
+    std::optional<Picture> drawPart(int number, Raster const& raster) override {
+        if (raster.width < 1 || raster.height < 1 || 1.0 * raster.width * raster.height > MAX_PIXELS)
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " makes too large a picture; ask for fewer dots per inch");
+        poppler::page_renderer renderer;
+        renderer.set_image_format(poppler::image::format_rgb24);
+        poppler::image const image =
+            renderer.render_page(popplerPage(number).get(), raster.acrossDotsPerInch, raster.downDotsPerInch,
+                                 raster.left, raster.top, raster.width, raster.height);
+        requireDrawn(image, number);
+        return pictureOf(image);
+    }
+
+    PageExtras extrasOf(int number) override {
+        PageExtras extras;
+        std::unique_ptr<poppler::font_iterator> const fonts(document_->create_font_iterator(number - 1));
+        for (poppler::font_info const& font : fonts->next())
+            if (!font.is_embedded())
+                extras.fontsNotEmbedded.push_back(font.name());
+        extras.lostAnnotations = lostAnnotations(number);
+        return extras;
+    }
+
+    std::vector<std::string> embeddedFiles() override { return extras_.embeddedFiles(); }
+
+private:
+    static Picture pictureOf(poppler::image const& image) {
         Picture picture{image.width(), image.height(), {}};
         for (int row = 0; row < image.height(); ++row)
             picture.points.append(image.const_data() + row * image.bytes_per_row(),
@@ -229,7 +261,21 @@ public:
         return picture;
     }
 
-private:
+    void requireDrawn(poppler::image const& image, int number) const {
+        if (!image.is_valid())
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " cannot be drawn; export the document again");
+    }
+
+    std::vector<LostAnnotation> lostAnnotations(int number) {
+        std::vector<LostAnnotation> lost;
+        for (PdfAnnotation const& annotation : extras_.lostAnnotations(number, pageCount()))
+            lost.push_back({annotation.kind, boxOf(poppler::rectf(annotation.left, annotation.top,
+                                                                  annotation.right - annotation.left,
+                                                                  annotation.bottom - annotation.top))});
+        return lost;
+    }
+
     poppler::image draw(int number, double dotsPerInch) const {
         std::unique_ptr<poppler::page> const page = popplerPage(number);
         poppler::rectf const sheet = page->page_rect();
@@ -243,9 +289,7 @@ private:
         renderer.set_render_hint(poppler::page_renderer::antialiasing);
         renderer.set_render_hint(poppler::page_renderer::text_antialiasing);
         poppler::image const image = renderer.render_page(page.get(), dotsPerInch, dotsPerInch);
-        if (!image.is_valid())
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " cannot be drawn; export the document again");
+        requireDrawn(image, number);
         return image;
     }
 
@@ -262,6 +306,7 @@ private:
     std::string const where_;
     PdfPageWriter writer_;
     PageObjects objects_;
+    PdfExtras extras_;
     std::unique_ptr<poppler::document> document_;
 };
 

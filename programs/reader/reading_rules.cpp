@@ -200,6 +200,13 @@ private:
 
 } // namespace
 
+std::string placeInWords(char const* key, RulesFault const& fault) {
+    std::string place = key;
+    for (std::string const& step : fault.path)
+        place += '/' + step;
+    return inQuotes(place);
+}
+
 ZoneRules const* ReadingRules::forZone(std::string const& name) const {
     auto const found = zones.find(name);
     return found == zones.end() ? nullptr : &found->second;
@@ -220,10 +227,7 @@ ReadingRules ReadingRules::of(Cfg::PackPreset const& preset) {
     ReadingRules rules = from(additional.isObject() ? additional.toObject().get(KEY) : json::Value(), faults);
     if (faults.empty())
         return rules;
-    std::string place = KEY;
-    for (std::string const& key : faults.front().path)
-        place += '/' + key;
-    throw Base::Error(inQuotes(place) + " of the pack preset " + inQuotes(preset.name()) + ' ' +
+    throw Base::Error(placeInWords(KEY, faults.front()) + " of the pack preset " + inQuotes(preset.name()) + ' ' +
                       faults.front().what + "; " + faults.front().advice);
 }
 

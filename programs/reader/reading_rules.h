@@ -53,6 +53,9 @@ struct RulesFault {
     std::string advice;
 };
 
+/// The key and those that lead to the place, in quotes: "reading/zones/Total/page".
+std::string placeInWords(char const* key, RulesFault const& fault);
+
 struct ReadingRules {
     static constexpr char const* KEY = "reading";
     /// A letter of more pages would be none.
