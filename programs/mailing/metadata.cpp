@@ -21,8 +21,8 @@ constexpr char const* ENTRIES_DIGEST_KEY = "entries_digest";
 
 /// What is not the pack preset's in the object that it shares; its name's key is listed so that the name is
 /// not taken for an unknown key as well.
-std::unordered_set<std::string> const NOT_THE_PRESETS{ID_KEY, CREATED_KEY, LETTERS_KEY, ENTRIES_DIGEST_KEY,
-                                                      "pack_preset"};
+std::unordered_set<std::string> const NOT_THE_PRESETS{
+    ID_KEY, CREATED_KEY, LETTERS_KEY, ENTRIES_DIGEST_KEY, PURCHASE_ORDER_KEY, "pack_preset"};
 
 json::Object toJson(DocumentPages const& document) {
     json::Array pages;
@@ -76,6 +76,8 @@ json::Object Metadata::toJson() const {
     object.set(LETTERS_KEY, all);
     if (!entriesDigest.empty())
         object.set(ENTRIES_DIGEST_KEY, entriesDigest);
+    if (!purchaseOrder.empty())
+        object.set(PURCHASE_ORDER_KEY, purchaseOrder);
     return object;
 }
 
@@ -87,6 +89,7 @@ Metadata Metadata::fromJson(json::Object const& object) {
     for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
         metadata.letters.push_back(letterFrom(letter.toObject()));
     metadata.entriesDigest = object.get(ENTRIES_DIGEST_KEY).textOrEmpty();
+    metadata.purchaseOrder = object.get(PURCHASE_ORDER_KEY).textOrEmpty();
     return metadata;
 }
 
@@ -104,6 +107,16 @@ SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& d
     } catch (json::Exc const&) {
         return metadata;
     }
+}
+
+SharedMemBuffer withMembers(SharedMemBuffer metadata, json::Object const& members) {
+    json::Object object = objectIn(metadata);
+    bool isChanged = false;
+    for (auto const& [key, value] : members) {
+        isChanged = isChanged || object.get(key) != value;
+        object.set(key, value);
+    }
+    return isChanged ? blobOf(object) : metadata;
 }
 
 } // namespace Mailing

@@ -25,8 +25,10 @@ struct MailedLetter {
     Cfg::ExtractedFields fields;
 };
 
+inline constexpr char const* PURCHASE_ORDER_KEY = "purchase_order";
+
 /// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
-/// its keys "id", "created", "letters" and "entries_digest".
+/// its keys "id", "created", "letters", "entries_digest" and "purchase_order".
 struct Metadata {
     std::string id;
     /// Seconds since the epoch, UTC.
@@ -35,6 +37,8 @@ struct Metadata {
     std::vector<MailedLetter> letters;
     /// EntriesDigest of the pages, which is known when the last of them is stored; empty in older mailings.
     std::string entriesDigest = {};
+    /// That the mailing goes by; empty when there is none.
+    std::string purchaseOrder = {};
 
     json::Object toJson() const;
     /// Throws std::exception when a key has not the form above.
@@ -49,5 +53,9 @@ struct Metadata {
 /// The same metadata, whatever else is in it, with another digest, for pages that are stored anew. Metadata
 /// that has none stays as it is.
 SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& digest);
+
+/// The same metadata, whatever else is in it, with these members. Throws std::exception when the blob cannot
+/// be read.
+SharedMemBuffer withMembers(SharedMemBuffer metadata, json::Object const& members);
 
 } // namespace Mailing

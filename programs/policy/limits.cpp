@@ -182,6 +182,10 @@ Rules::Rules(SourcedSettings const& settings) {
     expiry = {order.value<Cfg::POFieldIdxs::Expiry>(), settings.sourceOf(Cfg::PO::PART_NAME, "expiry")};
 }
 
+std::vector<std::string> Rules::parts() {
+    return {Cfg::App::PART_NAME, Cfg::Departments::PART_NAME, Cfg::Profiles::PART_NAME, Cfg::PO::PART_NAME};
+}
+
 long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex) {
     long long sheets = 0;
     for (Mailing::DocumentPages const& document : letter.documents) {
@@ -219,6 +223,15 @@ std::vector<Refusal> refusalsOf(Cfg::PackPreset const& mailing, Rules const& rul
 
 bool goesWithPriority(Cfg::PackPreset const& mailing, Rules const& rules) {
     return rules.priority == ALWAYS || (rules.priority != NEVER && mailing.priorityDelivery());
+}
+
+json::Object decidedMembers(Rules const& rules) {
+    json::Object members;
+    if (!rules.purchaseOrder.empty())
+        members.set(Mailing::PURCHASE_ORDER_KEY, rules.purchaseOrder);
+    if (rules.priority == NEVER || rules.priority == ALWAYS)
+        members.set("priority_delivery", rules.priority == ALWAYS);
+    return members;
 }
 
 bool isEmailAddress(std::string_view text) {

@@ -46,6 +46,8 @@ struct Rules {
     Rules() : Rules(SourcedSettings()) {}
     /// Throws std::exception when a part cannot be read.
     explicit Rules(SourcedSettings const& settings);
+    /// The names of the settings parts that they stand in.
+    static std::vector<std::string> parts();
 
     /// 0 and below are no limit.
     Sourced<int> maxLetterSheets;
@@ -75,6 +77,10 @@ std::vector<Refusal> refusalsOf(Cfg::PackPreset const& mailing, Rules const& rul
 
 /// Whether a mailing is delivered with priority: as its preset says unless the settings say never or always.
 bool goesWithPriority(Cfg::PackPreset const& mailing, Rules const& rules);
+
+/// The members of a mailing's metadata that the settings decide, with their values: its purchase order, and
+/// whether it goes with priority where that is not the preset's affair.
+json::Object decidedMembers(Rules const& rules);
 
 /// Whether a text has the form NAME@HOST of one e-mail address.
 bool isEmailAddress(std::string_view text);

@@ -1,9 +1,10 @@
 #pragma once
-// Jobs as client and service speak of them: their states, questions about them and the answers.
+// Jobs as client and service speak of them: their states, questions about them, changes and the answers.
 
 #include "vlservice/json/json.h"
 
 #include <array>
+#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -13,6 +14,8 @@ namespace Protocol {
 enum class JobState {
     /// On record; the pages still lie with the client alone.
     Accepted,
+    /// The container is in the outbox and stays there until the job is due or released.
+    Held,
     /// The container is in the outbox.
     Queued,
     /// The container lies in the upload folder under a temporary name and is about to get its own.
@@ -25,16 +28,24 @@ enum class JobState {
     Delivered,
     /// Given up; the problem says why.
     Failed,
+    /// A person has called it back before it was handed over.
+    Cancelled,
+    /// A trial run: the container is in the outbox, and nothing is handed over.
+    Tried,
 };
 
-inline constexpr std::array ALL_JOB_STATES{JobState::Accepted,  JobState::Queued, JobState::Submitting,
-                                           JobState::Submitted, JobState::Lodged, JobState::Delivered,
-                                           JobState::Failed};
+inline constexpr std::array ALL_JOB_STATES{
+    JobState::Accepted, JobState::Held,      JobState::Queued, JobState::Submitting, JobState::Submitted,
+    JobState::Lodged,   JobState::Delivered, JobState::Failed, JobState::Cancelled,  JobState::Tried};
 
 /// The name under which a state is kept and told.
 char const* stateName(JobState state);
 /// Throws Error when no state has that name.
 JobState stateNamed(std::string const& name);
+/// The names of the states that the first clients did not know.
+std::vector<std::string> laterStates();
+/// The state as a client is told that knows, of the later states, those of these names alone.
+JobState toldTo(std::vector<std::string> const& knownLater, JobState state);
 
 /// A question about jobs; what is empty is no restriction.
 struct JobsQuery {
@@ -44,6 +55,7 @@ struct JobsQuery {
     static constexpr long long MAX_JOBS = 1000;
     /// How long an answer is held at most, in milliseconds.
     static constexpr long long MAX_WAIT = 20'000;
+    static constexpr std::size_t MAX_STATES = 100;
 
     /// The pack database.
     std::string folder;
@@ -55,6 +67,8 @@ struct JobsQuery {
     /// How long the answer may be held while one of the jobs of `ids` waits for its pages to be fetched and
     /// nothing is in its way; milliseconds.
     long long wait = 0;
+    /// The later states that the asker knows. Others are told it as what they come closest to.
+    std::vector<std::string> knownStates = laterStates();
 
     JobsQuery() = default;
     /// Throws Error on a wrong type.
@@ -84,6 +98,8 @@ struct JobReport {
     std::string alarm;
     /// Whether it is to be handed on.
     bool toUpload = false;
+    /// Until when it is held, or will be, seconds since the epoch; 0 when that is not known.
+    long long due = 0;
     /// Where the container lies.
     std::string container;
 
@@ -107,6 +123,56 @@ struct JobsAnswer {
 
     JobsAnswer() = default;
     explicit JobsAnswer(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// What a person may do to a job.
+enum class JobAction { Hold, Release, Cancel };
+
+/// "hold"
+char const* actionName(JobAction action);
+
+/// Asks for a change of jobs.
+struct JobsChange {
+    static constexpr char const* KIND = "change_jobs";
+    static constexpr char const* IN_WORDS = "a change of jobs";
+
+    JobAction action = JobAction::Hold;
+    /// Pack ids, JobsQuery::MAX_JOBS at most.
+    std::vector<std::string> ids;
+
+    JobsChange() = default;
+    JobsChange(JobAction wanted, std::vector<std::string> packIds);
+    /// Throws Error on an action that there is not, when there are no ids, and on a wrong type.
+    explicit JobsChange(json::Object const& object);
+    /// With "query", as the questions have it.
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// A job that stays as it is, and why.
+struct JobRefusal {
+    std::string id;
+    std::string why;
+
+    JobRefusal() = default;
+    JobRefusal(std::string packId, std::string reason);
+    explicit JobRefusal(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+struct JobsChangeAnswer {
+    /// As they are now, in the order of their acceptance.
+    std::vector<JobReport> jobs;
+    std::vector<JobRefusal> refused;
+
+    JobsChangeAnswer() = default;
+    explicit JobsChangeAnswer(json::Object const& object);
     json::Object serialize() const;
 
     struct Keys;

@@ -80,7 +80,8 @@ void Processor::visit(Ipc::CSConfigIdsList& cmd) {
 }
 
 /// The command has one payload for many questions.
-json::Object Processor::answer(json::Object const& question) const {
+json::Object Processor::answer(json::Object const& question) {
+    using Protocol::JobsChange;
     using Protocol::JobsQuery;
     using Protocol::SettingsQuery;
     std::string const kind = Protocol::kindOf(question);
@@ -88,8 +89,26 @@ json::Object Processor::answer(json::Object const& question) const {
         return settings_.effective(SettingsQuery(question)).serialize();
     if (kind == JobsQuery::KIND)
         return listJobs(JobsQuery(question), jobs_, settings_, outbox_, now_()).serialize();
+    if (kind == JobsChange::KIND)
+        return changeJobs(JobsChange(question));
     throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
-                      JobsQuery::KIND);
+                      JobsQuery::KIND + ", " + JobsChange::KIND);
+}
+
+json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
+    Protocol::JobsChangeAnswer answer;
+    Protocol::JobsQuery changed;
+    for (std::string const& id : change.ids) {
+        try {
+            runner_.change(change.action, id);
+            changed.ids.push_back(id);
+        } catch (Base::Error const& refused) {
+            answer.refused.emplace_back(id, refused.what());
+        }
+    }
+    if (!changed.ids.empty())
+        answer.jobs = listJobs(changed, jobs_, settings_, outbox_, now_()).jobs;
+    return answer.serialize();
 }
 
 void Processor::visit(Ipc::GuiFwd&) { throw Base::Error("the service forwards nothing to a user interface"); }

@@ -42,7 +42,8 @@ public:
     void visit(Ipc::SetPartBase& cmd) override;
 
 private:
-    json::Object answer(json::Object const& question) const;
+    json::Object answer(json::Object const& question);
+    json::Object changeJobs(Protocol::JobsChange const& change);
     json::Object serviceOverview() const;
 
     SettingsService& settings_;

@@ -1,6 +1,7 @@
 #include "programs/vlserviced/service.h"
 
 #include "programs/base/error.h"
+#include "programs/base/local_offset.h"
 #include "programs/base/out_of_memory.h"
 #include "programs/base/plain_text.h"
 #include "programs/channel/server.h"
@@ -24,6 +25,7 @@
 #include <boost/asio/steady_timer.hpp>
 #include <boost/asio/thread_pool.hpp>
 
+#include <algorithm>
 #include <chrono>
 #include <csignal>
 #include <ctime>
@@ -40,6 +42,8 @@ namespace fs = std::filesystem;
 
 /// How often jobs are tried again that something kept from going on.
 constexpr std::chrono::minutes RETRY_TIME{1};
+/// How often unused presets are looked for.
+constexpr std::chrono::hours SWEEP_TIME{24};
 constexpr std::size_t MAX_PATH_BYTES = 1000;
 
 long long now() { return std::time(nullptr); }
@@ -109,7 +113,10 @@ public:
                   [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
                       handle(cmd, answer);
                   }) {
-        jobs_.onChange([this](std::string const& packId) { held_.onChange(packId); });
+        jobs_.onChange([this](std::string const& packId) {
+            held_.onChange(packId);
+            awaitDue();
+        });
         removeUnfinished(outbox_);
         recogniseUploadFolder();
         if (options.answersDiscovery)
@@ -126,7 +133,11 @@ public:
             if (!ec)
                 stop();
         });
-        asio::post(io_, [this] { runner_.resume(); });
+        asio::post(io_, [this] {
+            awaitDue();
+            runner_.resume();
+        });
+        asio::post(io_, [this] { sweepPresets(); });
         awaitUpkeep();
         runHandlers();
         // What the worker has finished by now goes on record; the rest is taken up at the next start.
@@ -184,7 +195,26 @@ private:
         server_->stop();
         discovery_.reset();
         upkeep_.cancel();
+        due_.cancel();
+        isStopping_ = true;
         signals_.cancel();
+    }
+
+    /// Looks at the clock again now and then, since somebody may set it.
+    void awaitDue() {
+        std::optional<long long> const due = jobs_.nextDue();
+        if (!due || isStopping_) {
+            due_.cancel();
+            return;
+        }
+        due_.expires_after(std::clamp(std::chrono::seconds(*due - now()), std::chrono::seconds(0),
+                                      std::chrono::seconds(RETRY_TIME)));
+        due_.async_wait([this](boost::system::error_code const& ec) {
+            if (ec)
+                return;
+            runner_.releaseDue();
+            awaitDue();
+        });
     }
 
     void awaitUpkeep() {
@@ -203,6 +233,23 @@ private:
         if (time - lastStatusUpdate_ >= statusUpdateTime()) {
             lastStatusUpdate_ = time;
             runner_.updateStatus("", "");
+        }
+        if (time - lastSweep_ >= SWEEP_TIME)
+            sweepPresets();
+    }
+
+    void sweepPresets() {
+        lastSweep_ = std::chrono::steady_clock::now();
+        settings_.removeUnusedPresets();
+    }
+
+    /// The mailing is on record whatever becomes of this.
+    void notePresetUse(std::string const& node, std::string const& packPreset) {
+        try {
+            settings_.notePresetUse(node, packPreset);
+        } catch (std::exception const& failure) {
+            Log::Lock(4).logStreamLine()
+                << "The use of a preset is not on record. " << Base::oneLine(failure.what());
         }
     }
 
@@ -230,7 +277,15 @@ private:
                 [this](JobSurroundings::Work work) { asio::post(io_, std::move(work)); },
                 &now,
                 [this] { return settings_.service(); },
-                outbox_};
+                outbox_,
+                [this](std::string const& node) { return settings_.rules(node); },
+                [this](std::string const& node, std::string const& packPreset) {
+                    return settings_.sourceOfPackPreset(node, packPreset);
+                },
+                &Base::localOffset,
+                [this](std::string const& node, std::string const& packPreset) {
+                    notePresetUse(node, packPreset);
+                }};
     }
 
     DataFolder data_;
@@ -251,7 +306,11 @@ private:
 
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
     asio::steady_timer upkeep_{io_};
+    /// For the next job that is held and due.
+    asio::steady_timer due_{io_};
+    bool isStopping_ = false;
     std::chrono::steady_clock::time_point lastStatusUpdate_ = std::chrono::steady_clock::now();
+    std::chrono::steady_clock::time_point lastSweep_ = std::chrono::steady_clock::now();
     std::optional<Channel::Server> server_;
     std::optional<DiscoveryAnswer> discovery_;
 };

@@ -198,4 +198,13 @@ TEST(SourcedSettings, NameTheDocumentWhereThereIsNoNode) {
     EXPECT_EQ(Policy::SourcedSettings().sourceOfPackPreset("GLOBAL"), "the built-in settings");
 }
 
+TEST(MembersOfMetadata, AreDecidedWhereTheSettingsSayMoreThanThePreset) {
+    EXPECT_EQ(print(Policy::decidedMembers({})), "{}");
+    EXPECT_EQ(print(Policy::decidedMembers(
+                  rulesOf(parse(R"({"app": {"priority_delivery": 1}, "po": {"code": "P-1"}})")))),
+              R"({"purchase_order":"P-1","priority_delivery":false})");
+    EXPECT_EQ(print(Policy::decidedMembers(rulesOf(parse(R"({"app": {"priority_delivery": 2}})")))),
+              R"({"priority_delivery":true})");
+}
+
 } // namespace

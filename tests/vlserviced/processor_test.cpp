@@ -82,8 +82,8 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
               R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets"})");
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
               R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
-    EXPECT_EQ(send(29, R"({"query":"x"})"), R"({"err":"there is no query \"x\"; there are settings, jobs"})");
-    EXPECT_EQ(send(29, "{}"), R"({"err":"there is no query \"\"; there are settings, jobs"})");
+    EXPECT_EQ(send(29, R"({"query":"x"})"), R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs"})");
+    EXPECT_EQ(send(29, "{}"), R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {
@@ -132,6 +132,31 @@ TEST_F(ProcessorTest, HoldsJobsBackUntilTheyMayGoOn) {
     EXPECT_FALSE(std::filesystem::exists(outbox_ / "p1.mailing"));
     EXPECT_EQ(send(30, "{}"), "{}");
     EXPECT_TRUE(std::filesystem::exists(outbox_ / "p1.mailing"));
+}
+
+TEST_F(ProcessorTest, HoldsReleasesAndCancelsJobs) {
+    storePack(folder_ / "packs.db", "p1");
+    storePack(folder_ / "packs.db", "p2");
+    processPack("p1");
+    processPack("p2");
+    auto const change = [&](std::string const& action, std::string const& ids) {
+        json::Object const answer =
+            parse(send(29, R"({"query":"change_jobs","action":")" + action + R"(","ids":[)" + ids + "]}"));
+        std::string told;
+        for (json::Value const& job : answer.get("jobs").toArray())
+            told += job.toObject().get("id").textOrEmpty() + ' ' + job.toObject().get("state").textOrEmpty() +
+                    ';';
+        for (json::Value const& refused : answer.get("refused").toArray())
+            told += refused.toObject().get("id").textOrEmpty() + ": " +
+                    refused.toObject().get("why").textOrEmpty() + ';';
+        return told;
+    };
+    EXPECT_EQ(change("hold", R"("p1","none","p2")"), "p1 held;p2 held;none: there is no mailing none;");
+    EXPECT_EQ(change("release", R"("p2")"), "p2 queued;");
+    EXPECT_EQ(change("cancel", R"("p1")"), "p1 cancelled;");
+    EXPECT_EQ(change("hold", R"("p1")"), "p1: it is too late to hold mailing p1: it was cancelled;");
+    EXPECT_EQ(send(29, R"({"query":"change_jobs","action":"stop","ids":["p1"]})"),
+              R"({"err":"\"action\" of a change of jobs has to be \"hold\", \"release\" or \"cancel\""})");
 }
 
 } // namespace

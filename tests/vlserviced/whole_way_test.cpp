@@ -118,7 +118,7 @@ protected:
             std::string const page = std::string("no blob, but a letter to ") + PERSON;
             writer.savePage(std::string(PERSON) + ".pdf", "1",
                             SharedMemBuffer::copyOf(page.data(), page.size()));
-            writer.finish(zipped("metadata"));
+            writer.finish(zipped(metadataText("bad")));
         }
         auto const client = clientOf(service_, data_);
         VlMail::sendPack(*client, database, "bad", false);

@@ -1,6 +1,7 @@
 #include "programs/vlserviced/jobs/container.h"
 
 #include "programs/mailing/container_writer.h"
+#include "programs/mailing/metadata.h"
 #include "programs/mailing/pack_database.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
@@ -36,16 +37,28 @@ void copyPages(Mailing::PackDatabaseReader& pages, PageSaverI& container) {
     }
 }
 
+SharedMemBuffer decidedMetadata(SharedMemBuffer const& metadata, std::string const& packId,
+                                json::Object const& decided) {
+    if (decided.empty())
+        return metadata;
+    try {
+        return Mailing::withMembers(metadata, decided);
+    } catch (json::Exc const&) {
+        throw BadPack("the metadata of pack " + packId + " is none of a mailing");
+    }
+}
+
 } // namespace
 
-void writeContainer(PackLocation const& pack, std::filesystem::path const& target) {
+void writeContainer(PackLocation const& pack, std::filesystem::path const& target,
+                    json::Object const& decided) {
     Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
     SharedMemBuffer const metadata = pages.metadata();
     if (!isCompressed(metadata))
         throw BadPack("the metadata of pack " + pack.packId + " is not compressed");
     Mailing::ContainerWriter container(target, pack.packId);
     copyPages(pages, container);
-    container.finish(metadata, "make room on the disk");
+    container.finish(decidedMetadata(metadata, pack.packId, decided), "make room on the disk");
 }
 
 } // namespace VlServiced

@@ -3,6 +3,7 @@
 
 #include "programs/base/error.h"
 #include "programs/vlserviced/store/job.h"
+#include "vlservice/json/json.h"
 
 #include <filesystem>
 
@@ -15,8 +16,10 @@ public:
 };
 
 /// Writes the pack's container to `target`, which is there only when it is whole, replacing one of that name.
+/// `decided` are members that its metadata has whatever the client wrote.
 /// Throws BadPack when a page is no compressed page; Database::DatabaseError, Error and std::system_error
 /// when the database cannot be read or the container cannot be written, which may pass.
-void writeContainer(PackLocation const& pack, std::filesystem::path const& target);
+void writeContainer(PackLocation const& pack, std::filesystem::path const& target,
+                    json::Object const& decided = {});
 
 } // namespace VlServiced

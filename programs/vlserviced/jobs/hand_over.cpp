@@ -72,6 +72,12 @@ void stage(fs::path const& container, UploadFolder const& folder) {
     syncFolder(folder);
 }
 
+void unstage(std::string const& name, UploadFolder const& folder) {
+    std::string const temporary = temporaryOf(name);
+    if (::unlinkat(folder.descriptor(), temporary.c_str(), 0) != 0 && errno != ENOENT)
+        fail("cannot remove " + (folder.path() / temporary).string());
+}
+
 void publish(std::string const& name, UploadFolder const& folder) {
     std::string const temporary = temporaryOf(name);
     if (!isThere(folder, temporary))

@@ -22,6 +22,8 @@ namespace VlServiced {
 
 /// Throws std::system_error when the copy cannot be made. What lies under the temporary name goes.
 void stage(std::filesystem::path const& container, UploadFolder const& folder);
+/// Takes back what was staged and is not to be published. Throws std::system_error.
+void unstage(std::string const& name, UploadFolder const& folder);
 /// Throws std::system_error.
 void publish(std::string const& name, UploadFolder const& folder);
 

@@ -33,6 +33,8 @@ public:
     Alarms(SettingsService const& settings, long long now) : settings_(settings), now_(now) {}
 
     std::string of(Job const& job) {
+        if (job.state == JobState::Queued && job.toUpload && hasNoUploadFolder_)
+            return "the service has no upload folder";
         auto const rule = std::find_if(std::begin(ALARM_RULES), std::end(ALARM_RULES),
                                        [&](AlarmRule const& r) { return r.state == job.state; });
         if (rule == std::end(ALARM_RULES))
@@ -54,13 +56,16 @@ private:
 
     SettingsService const& settings_;
     long long now_;
+    bool hasNoUploadFolder_ = settings_.service().uploadFolder().empty();
     std::map<std::string, Cfg::Inet> byNode_;
 };
 
 std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
     switch (job.state) {
+    case JobState::Held:
     case JobState::Queued:
     case JobState::Submitting:
+    case JobState::Tried:
         return (outbox / job.containerName()).string();
     case JobState::Submitted:
         return (std::filesystem::path(job.uploadFolder) / job.containerName()).string();
@@ -83,7 +88,15 @@ Protocol::JobReport reportOf(Job const& job) {
     report.changed = job.changedAt;
     report.problem = job.problem;
     report.toUpload = job.toUpload;
+    report.due = job.state == JobState::Accepted || job.state == JobState::Held ? job.due : 0;
     return report;
+}
+
+/// To a client that does not know the state, its nearest one says why it is where it is.
+void tellAs(JobState state, Protocol::JobReport& report) {
+    if (report.state == JobState::Cancelled && state == JobState::Failed)
+        report.problem = "it was cancelled";
+    report.state = state;
 }
 
 } // namespace
@@ -98,6 +111,7 @@ Protocol::JobsAnswer listJobs(Protocol::JobsQuery const& query, JobStore const& 
         Protocol::JobReport& report = answer.jobs.emplace_back(reportOf(job));
         report.alarm = alarms.of(job);
         report.container = containerOf(job, outbox);
+        tellAs(Protocol::toldTo(query.knownStates, job.state), report);
     }
     return answer;
 }

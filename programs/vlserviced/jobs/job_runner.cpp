@@ -3,12 +3,16 @@
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/safe_name.h"
+#include "programs/mailing/metadata.h"
 #include "programs/mailing/pack_database.h"
+#include "programs/policy/course.h"
 #include "programs/vlserviced/jobs/container.h"
 #include "programs/vlserviced/jobs/hand_over.h"
 #include "programs/vlserviced/store/node_id.h"
+#include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
 
+#include <algorithm>
 #include <system_error>
 #include <utility>
 
@@ -16,6 +20,8 @@ namespace VlServiced {
 namespace {
 
 namespace fs = std::filesystem;
+
+using Protocol::JobAction;
 
 constexpr std::size_t MAX_TITLE_BYTES = 500;
 
@@ -44,25 +50,89 @@ void requireSamePack(Job const& known, PackLocation const& pack) {
         throw Base::Error("there is another pack " + pack.packId + ", from " + known.pack.file().string());
     if (known.state == JobState::Failed)
         throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
+    if (known.state == JobState::Cancelled)
+        throw Base::Error("pack " + pack.packId + " was cancelled: mail its letters anew");
+}
+
+/// Sheets of the letter that has the most.
+long long mostSheets(Mailing::Metadata const& metadata) {
+    long long most = 0;
+    for (Mailing::MailedLetter const& letter : metadata.letters)
+        most = std::max(most, Policy::sheetsOf(letter, metadata.packPreset.duplex()));
+    return most;
+}
+
+Mailing::Metadata metadataOf(Mailing::PackDatabaseReader& pack) {
+    try {
+        return Mailing::Metadata::fromBlob(pack.metadata());
+    } catch (Database::DatabaseError const&) {
+        throw;
+    } catch (std::exception const&) {
+        // What is wrong would be told with values of letters.
+        throw Base::Error("the metadata of pack " + pack.info().id + " is none of a mailing");
+    }
 }
 
 PackSummary summaryOf(PackLocation const& pack) {
-    Mailing::PackDatabaseReader const pages(pack.file(), pack.packId);
-    PackSummary const summary{pages.info().cfgId, pages.info().title,
-                              static_cast<long long>(pages.documentCount()),
-                              static_cast<long long>(pages.pages().size())};
+    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
+    PackSummary summary{pages.info().cfgId, pages.info().title, static_cast<long long>(pages.documentCount()),
+                        static_cast<long long>(pages.pages().size())};
     if (summary.pages == 0)
         throw Base::Error("pack " + pack.packId + " has no pages");
     if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
         throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
                           std::to_string(MAX_TITLE_BYTES) + " bytes");
     checkNodeId(summary.cfgId);
+    Mailing::Metadata const metadata = metadataOf(pages);
+    summary.packPreset = metadata.packPreset;
+    summary.sheets = mostSheets(metadata);
     return summary;
 }
 
-/// Whether a container that is in the outbox was handed on.
-bool isHandedOn(JobState state) {
-    return state == JobState::Submitted || state == JobState::Lodged || state == JobState::Delivered;
+/// Whether the outbox is no place for its container any more.
+bool hasLeftOutbox(JobState state) {
+    return state == JobState::Submitted || state == JobState::Lodged || state == JobState::Delivered ||
+           state == JobState::Cancelled;
+}
+
+/// How far a job has got that it is too late for.
+std::string whoHas(Job const& job) {
+    switch (job.state) {
+    case JobState::Submitting:
+        return "it is being handed over to the upload folder " + job.uploadFolder;
+    case JobState::Submitted:
+        return "the upload folder " + job.uploadFolder + " has it since " + LocalTime::toText(job.changedAt);
+    case JobState::Lodged:
+        return "the carrier has taken it from the upload folder " + job.uploadFolder;
+    case JobState::Delivered:
+        return "the carrier has delivered it";
+    case JobState::Cancelled:
+        return "it was cancelled";
+    case JobState::Tried:
+        return "it was a trial run, which hands nothing over";
+    default:
+        return "it was given up: " + job.problem;
+    }
+}
+
+/// False when it is too late.
+bool record(JobStore& jobs, JobAction action, std::string const& packId, long long now) {
+    switch (action) {
+    case JobAction::Hold:
+        return jobs.hold(packId, now);
+    case JobAction::Release:
+        return jobs.release(packId, now);
+    case JobAction::Cancel:
+        break;
+    }
+    return jobs.cancel(packId, now);
+}
+
+/// The state of a job whose container is made.
+JobState stateBehindPacking(Job const& job, long long now) {
+    if (job.isTrial)
+        return JobState::Tried;
+    return job.toHold || job.due > now ? JobState::Held : JobState::Queued;
 }
 
 } // namespace
@@ -75,6 +145,16 @@ void JobRunner::resume() {
     for (JobState const state : {JobState::Submitting, JobState::Queued, JobState::Accepted})
         for (Job const& job : jobs_.inState(state))
             proceed(job);
+    releaseDue();
+}
+
+void JobRunner::releaseDue() {
+    // Each is a transaction of its own, and others wait meanwhile.
+    constexpr std::size_t AT_ONCE = 100;
+    for (Job const& job : jobs_.due(surroundings_.now(), AT_ONCE)) {
+        jobs_.advance(job.pack.packId, JobState::Held, JobState::Queued, surroundings_.now());
+        proceed(jobs_.find(job.pack.packId).value());
+    }
 }
 
 void JobRunner::accept(PackLocation const& pack, std::function<void(std::string const& failure)> done) {
@@ -113,16 +193,41 @@ void JobRunner::admit(PackLocation const& pack, PackSummary const& summary) {
         requireSamePack(*job, pack);
     } else {
         requireNotDisabled(pack.packId, summary.cfgId);
-        job.emplace();
-        job->pack = pack;
-        job->cfgId = summary.cfgId;
-        job->title = summary.title;
-        job->documents = summary.documents;
-        job->pages = summary.pages;
-        job->acceptedAt = surroundings_.now();
+        requireAllowed(pack.packId, summary);
+        job = jobFor(pack, summary);
         jobs_.accept(*job);
+        surroundings_.usedPreset(summary.cfgId, summary.packPreset.name());
     }
     proceed(*job);
+}
+
+Job JobRunner::jobFor(PackLocation const& pack, PackSummary const& summary) const {
+    Policy::Moment const moment{surroundings_.now(), surroundings_.offset};
+    Policy::Course const course = Policy::courseOf(summary.packPreset, moment);
+    Job job;
+    job.pack = pack;
+    job.cfgId = summary.cfgId;
+    job.title = summary.title;
+    job.documents = summary.documents;
+    job.pages = summary.pages;
+    job.acceptedAt = moment.now;
+    job.toUpload = course.handsOver;
+    job.toHold = course.holds;
+    job.isTrial = course.isTrial;
+    job.due = course.due;
+    return job;
+}
+
+/// The client has decided by the same rules, unless it is an older one or had others.
+void JobRunner::requireAllowed(std::string const& packId, PackSummary const& summary) const {
+    Policy::Rules const rules = surroundings_.rules(summary.cfgId);
+    std::vector<Policy::Refusal> refusals = Policy::refusalsOf(
+        summary.packPreset, rules, {surroundings_.now(), surroundings_.offset},
+        [&](std::string const& name) { return surroundings_.presetSource(summary.cfgId, name); });
+    if (auto const refusal = Policy::refusalOfSheets(summary.sheets, rules))
+        refusals.push_back(*refusal);
+    if (!refusals.empty())
+        throw Base::Error(Policy::inOneLine(refusals) + "; pack " + packId + " is not taken");
 }
 
 void JobRunner::requireNotDisabled(std::string const& packId, std::string const& cfgId) const {
@@ -144,28 +249,34 @@ void JobRunner::proceed(Job const& job) {
 void JobRunner::startPacking(Job const& job) {
     inBackground(
         job.pack.packId,
-        [pack = job.pack, target = surroundings_.outbox / job.containerName()] {
-            writeContainer(pack, target);
+        [pack = job.pack, target = surroundings_.outbox / job.containerName(),
+         decided = Policy::decidedMembers(surroundings_.rules(job.cfgId))] {
+            writeContainer(pack, target, decided);
         },
         [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
 }
 
 void JobRunner::onPacked(std::string const& packId, Outcome const& outcome) {
+    Job const job = jobs_.find(packId).value();
+    if (job.state != JobState::Accepted)
+        return discard(job);
     if (outcome.kind == Outcome::Kind::GiveUp) {
         Log::Lock(3).logStreamLine() << "Pack " << packId << " is given up: " << outcome.why;
         jobs_.fail(packId, outcome.why, surroundings_.now());
     } else if (outcome.kind == Outcome::Kind::TryLater) {
         noteProblem(packId, outcome.why);
     } else {
-        jobs_.advance(packId, JobState::Accepted, JobState::Queued, surroundings_.now());
+        long long const now = surroundings_.now();
+        jobs_.advance(packId, JobState::Accepted, stateBehindPacking(job, now), now);
         proceed(jobs_.find(packId).value());
     }
 }
 
 void JobRunner::startStaging(Job const& job) {
     std::string const folder = surroundings_.settings().uploadFolder();
+    // The job list tells that there is none.
     if (folder.empty())
-        return noteProblem(job.pack.packId, "the service has no upload folder");
+        return;
     auto const identity = std::make_shared<std::string>(surroundings_.settings().uploadFolderIdentity());
     inBackground(
         job.pack.packId,
@@ -181,10 +292,46 @@ void JobRunner::startStaging(Job const& job) {
 
 void JobRunner::onStaged(std::string const& packId, std::string const& folder, std::string const& identity,
                          Outcome const& outcome) {
-    if (outcome.kind != Outcome::Kind::Done)
+    bool const isStaged = outcome.kind == Outcome::Kind::Done;
+    if (isStaged && jobs_.beginSubmitting(packId, folder, identity, surroundings_.now()))
+        return finishSubmitting(jobs_.find(packId).value());
+    Job const job = jobs_.find(packId).value();
+    if (job.state == JobState::Queued)
         return noteProblem(packId, outcome.why);
-    jobs_.beginSubmitting(packId, folder, identity, surroundings_.now());
-    finishSubmitting(jobs_.find(packId).value());
+    // A person was faster.
+    discard(job);
+}
+
+/// What lies of a job where it is not to lie: a staged copy of one that is held or was cancelled, and the
+/// container of a cancelled one. The container goes last, so that a later start finds what is left to do.
+void JobRunner::discard(Job const& job) {
+    Outcome const unstaged = outcomeOf([&] {
+        ServiceSettings const settings = surroundings_.settings();
+        if (!settings.uploadFolder().empty())
+            unstage(job.containerName(),
+                    UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()));
+    });
+    if (unstaged.kind != Outcome::Kind::Done)
+        Log::Lock(4).logStreamLine() << "Pack " << job.pack.packId << " may lie in the upload folder under a "
+                                     << "temporary name: " << unstaged.why;
+    if (hasLeftOutbox(job.state))
+        removeFromOutbox(job.containerName());
+}
+
+void JobRunner::change(JobAction action, std::string const& packId) {
+    std::optional<Job> const job = jobs_.find(packId);
+    if (!job)
+        throw Base::Error("there is no mailing " + Base::oneLine(packId));
+    bool const isSo = action == JobAction::Cancel && job->state == JobState::Cancelled;
+    if (!record(jobs_, action, packId, surroundings_.now()) && !isSo)
+        throw Base::Error("it is too late to " + std::string(actionName(action)) + " mailing " + packId +
+                          ": " + whoHas(*job));
+    Job const changed = jobs_.find(packId).value();
+    // What the worker is about to make is seen to when it has.
+    if (changed.state == JobState::Cancelled && !busy_.contains(packId))
+        discard(changed);
+    else
+        proceed(changed);
 }
 
 void JobRunner::finishSubmitting(Job const& job) {
@@ -216,8 +363,8 @@ void JobRunner::sweepOutbox() {
     if (!std::exchange(isSwept_, true))
         for (fs::directory_entry const& entry : fs::directory_iterator(surroundings_.outbox, unreadable))
             if (std::optional<Job> const job = jobs_.find(entry.path().stem().string());
-                job && isHandedOn(job->state) && entry.path().filename() == job->containerName())
-                leftInOutbox_.insert(job->containerName());
+                job && hasLeftOutbox(job->state) && entry.path().filename() == job->containerName())
+                discard(*job);
     for (std::string const& name : std::set<std::string>(leftInOutbox_))
         removeFromOutbox(name);
 }
@@ -231,7 +378,7 @@ void JobRunner::upload(std::string const& folder, std::string const& database) {
 }
 
 void JobRunner::updateStatus(std::string const& folder, std::string const& database) {
-    for (Job const& job : jobs_.unfinished(folder.empty() ? folder : folderText(folder), database)) {
+    for (Job const& job : jobs_.underWay(folder.empty() ? folder : folderText(folder), database)) {
         if (job.state == JobState::Submitted || job.state == JobState::Lodged)
             refresh(job);
         else

@@ -2,6 +2,8 @@
 // Brings jobs along their way: from the client's database into the outbox, from there to the upload folder,
 // and on with what the carrier reports.
 
+#include "programs/base/local_offset.h"
+#include "programs/policy/limits.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/job_store.h"
 
@@ -27,14 +29,29 @@ struct JobSurroundings {
     /// The service's settings as they are at that moment.
     std::function<ServiceSettings()> settings;
     std::filesystem::path outbox;
+    /// What counts for the mailings of a node.
+    std::function<Policy::Rules(std::string const& node)> rules = [](std::string const&) {
+        return Policy::Rules();
+    };
+    /// Where a node has a pack preset from, for messages.
+    std::function<std::string(std::string const& node, std::string const& packPreset)> presetSource =
+        [](std::string const& node, std::string const&) { return node; };
+    /// The clock of the place that delays are meant for.
+    Policy::UtcOffset offset = &Base::localOffset;
+    /// Told that a node's mailing was accepted that goes by that pack preset.
+    std::function<void(std::string const& node, std::string const& packPreset)> usedPreset =
+        [](std::string const&, std::string const&) {};
 };
 
-/// What a pack's job says of it.
+/// What a pack says of itself.
 struct PackSummary {
     std::string cfgId;
     std::string title;
     long long documents = 0;
     long long pages = 0;
+    Cfg::PackPreset packPreset = {};
+    /// Of its letter with the most.
+    long long sheets = 0;
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -48,6 +65,8 @@ public:
 
     /// Takes up every job that can go on: at the start, and when jobs are no longer held back.
     void resume();
+    /// Takes up what is held and due by now, a few jobs at a time.
+    void releaseDue();
     /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
     /// nothing. The pages are fetched later. `done` is called on the own thread, with the reason as one line
     /// when the pack cannot be taken, which is empty otherwise.
@@ -57,6 +76,9 @@ public:
     void upload(std::string const& folder, std::string const& database);
     /// Brings the states of these jobs up to date with the upload folder, and tries again what failed before.
     void updateStatus(std::string const& folder, std::string const& database);
+    /// Holds a job, lets it go on, or calls it back. What is so already stays so. Throws Error, which says
+    /// where the job has got to, when it is too late.
+    void change(Protocol::JobAction action, std::string const& packId);
 
 private:
     /// How a step of the worker ended.
@@ -73,8 +95,11 @@ private:
     void onStaged(std::string const& packId, std::string const& folder, std::string const& identity,
                   Outcome const& outcome);
     void refresh(Job const& job);
+    void discard(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary);
+    Job jobFor(PackLocation const& pack, PackSummary const& summary) const;
+    void requireAllowed(std::string const& packId, PackSummary const& summary) const;
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
     void removeFromOutbox(std::string const& containerName);
     void sweepOutbox();

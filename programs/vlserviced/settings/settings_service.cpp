@@ -1,12 +1,16 @@
 #include "programs/vlserviced/settings/settings_service.h"
 
 #include "programs/base/error.h"
+#include "programs/base/local_offset.h"
+#include "programs/policy/auto_presets.h"
 #include "programs/vlserviced/settings/parts.h"
+#include "programs/vlserviced/settings/preset_rules.h"
 #include "programs/vlserviced/settings/upload_folder.h"
 #include "programs/vlserviced/store/node_id.h"
 #include "vlservice/cfg/id.h"
+#include "vlservice/presets/presets.h"
 
-#include <map>
+#include <ctime>
 #include <unordered_set>
 #include <utility>
 
@@ -39,7 +43,10 @@ std::string identityOf(std::string const& uploadFolder) {
 
 } // namespace
 
-SettingsService::SettingsService(SettingsStore& store) : store_(store) {}
+SettingsService::SettingsService(SettingsStore& store, Clock clock)
+    : store_(store), clock_(std::move(clock)) {}
+
+Policy::Moment SettingsService::localClock() { return {std::time(nullptr), &Base::localOffset}; }
 
 Protocol::TreeNode SettingsService::tree() const {
     std::vector<SettingsNode> const nodes = store_.nodes();
@@ -88,7 +95,11 @@ json::Object SettingsService::values(std::string const& id, std::string const& p
 void SettingsService::setPart(std::string const& id, std::string const& part, json::Value const& sent) {
     requireChangeable();
     checkNodeId(id);
-    store_.setPart(id, part, ownForm(part, sent));
+    json::Value const own = ownForm(part, sent);
+    if (own && part == Cfg::Presets::PART_NAME)
+        requireAllowedPresets(own.toObject(), store_.chain(id), clock_());
+    rules_.clear();
+    store_.setPart(id, part, own);
 }
 
 void SettingsService::update(std::string const& id, bool reset) {
@@ -97,6 +108,7 @@ void SettingsService::update(std::string const& id, bool reset) {
     // An id that is missing from a request reads as the root.
     if (reset && id.empty())
         throw Base::Error("the root cannot be reset as a whole: set its parts to nothing one by one");
+    rules_.clear();
     if (reset)
         store_.clear(id);
     else
@@ -107,7 +119,42 @@ void SettingsService::update(std::string const& id, bool reset) {
 void SettingsService::remove(std::string const& id) {
     requireChangeable();
     checkNodeId(id);
+    rules_.clear();
     store_.remove(id);
+}
+
+Policy::Rules SettingsService::rules(std::string const& id) const {
+    constexpr std::size_t MOST = 1000;
+    if (auto const known = rules_.find(id); known != rules_.end())
+        return known->second;
+    if (rules_.size() >= MOST)
+        rules_.clear();
+    Policy::SourcedSettings const settings(effective({id, Policy::Rules::parts()}));
+    return rules_.emplace(id, Policy::Rules(settings)).first->second;
+}
+
+std::string SettingsService::sourceOfPackPreset(std::string const& id, std::string const& name) const {
+    return Policy::SourcedSettings(effective({id, {Cfg::Presets::PART_NAME}})).sourceOfPackPreset(name);
+}
+
+void SettingsService::notePresetUse(std::string const& id, std::string const& packPreset) {
+    if (!Policy::expiresUnused(packPreset) || holdsChangesBack())
+        return;
+    std::string const& part = Cfg::Presets::PART_NAME;
+    for (SettingsLevel const& level : store_.chain(id))
+        if (json::Value const presets = level.parts.get(part))
+            if (json::Value const used = Policy::withUse(presets.toObject(), packPreset, clock_().now))
+                store_.setPart(level.id, part, used);
+}
+
+void SettingsService::removeUnusedPresets() {
+    if (holdsChangesBack())
+        return;
+    std::string const& part = Cfg::Presets::PART_NAME;
+    for (std::string const& node : store_.nodesWithText(part, "#auto_"))
+        if (json::Value const left =
+                Policy::withoutUnused(store_.parts(node).get(part).toObject(), clock_().now))
+            store_.setPart(node, part, left);
 }
 
 ServiceSettings SettingsService::service() const { return ServiceSettings(store_.serviceSettings()); }
@@ -128,8 +175,10 @@ void SettingsService::recogniseUploadFolder() {
 
 void SettingsService::suspend(int bits) { store_.setServiceSettings(service().withSuspended(bits).stored()); }
 
+bool SettingsService::holdsChangesBack() const { return service().isSuspended(Suspended::SettingsChanges); }
+
 void SettingsService::requireChangeable() const {
-    if (service().isSuspended(Suspended::SettingsChanges))
+    if (holdsChangesBack())
         throw Base::Error("changes of settings are held back at the moment");
 }
 

@@ -1,10 +1,13 @@
 #pragma once
 // What the service does with settings, in terms of node ids and JSON.
 
+#include "programs/policy/limits.h"
 #include "programs/protocol/settings.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/settings_store.h"
 
+#include <functional>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -14,8 +17,10 @@ namespace VlServiced {
 /// while changes are held back.
 class SettingsService {
 public:
+    using Clock = std::function<Policy::Moment()>;
+
     /// The store has to outlive the service.
-    explicit SettingsService(SettingsStore& store);
+    explicit SettingsService(SettingsStore& store, Clock clock = &localClock);
 
     /// The root, with all below it.
     Protocol::TreeNode tree() const;
@@ -34,13 +39,25 @@ public:
     /// The values of one part that count at a node.
     json::Object values(std::string const& id, std::string const& part) const;
 
+    /// What counts for the mailings of a node; kept until settings change.
+    Policy::Rules rules(std::string const& id) const;
+    /// Where a node has a pack preset from, for messages.
+    std::string sourceOfPackPreset(std::string const& id, std::string const& name) const;
+
     /// Replaces the node's own values of a part by those of what was sent; nothing, or nothing of its own,
-    /// leaves the node without own values.
+    /// leaves the node without own values. Of the part "presets" those are refused that a node above has
+    /// locked, and delays that never end.
     void setPart(std::string const& id, std::string const& part, json::Value const& sent);
     /// Adds the node, when it is new, and tests that all its settings can be read. With `reset`, its own
     /// values are erased first; those of the root cannot be.
     void update(std::string const& id, bool reset);
     void remove(std::string const& id);
+
+    /// Puts on record that a mailing of the node went by a pack preset, where that is one that expires
+    /// unused.
+    void notePresetUse(std::string const& id, std::string const& packPreset);
+    /// Removes the presets of all nodes that expire and that nobody has used for long.
+    void removeUnusedPresets();
 
     ServiceSettings service() const;
     /// An upload folder gets a mark, and its identity goes on record with it.
@@ -52,9 +69,13 @@ public:
     void suspend(int bits);
 
 private:
+    static Policy::Moment localClock();
     void requireChangeable() const;
+    bool holdsChangesBack() const;
 
     SettingsStore& store_;
+    Clock clock_;
+    mutable std::map<std::string, Policy::Rules> rules_;
 };
 
 } // namespace VlServiced

@@ -32,6 +32,12 @@ struct Job {
     std::string problem;
     /// Whether the container is to be handed on as soon as it is there.
     bool toUpload = false;
+    /// Until when it is held, seconds since the epoch; 0 when it is not, or until a person releases it.
+    long long due = 0;
+    /// Whether it is held until a person releases it.
+    bool toHold = false;
+    /// Whether its container is made and nothing handed over.
+    bool isTrial = false;
     /// Where the container goes, or went; empty before Submitting.
     std::string uploadFolder;
     /// Which of all folders of that name it is, as FolderIdentity tells it.

@@ -17,7 +17,12 @@ using Protocol::stateNamed;
 
 constexpr char const* SELECT_JOBS =
     "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
-    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity FROM jobs ";
+    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity, due, to_hold, trial FROM "
+    "jobs ";
+
+/// The states of which there are few: the others are where jobs rest, or end.
+constexpr JobState UNDER_WAY[] = {JobState::Accepted, JobState::Queued, JobState::Submitting,
+                                  JobState::Submitted, JobState::Lodged};
 
 Job jobIn(SQLite::Statement& row) {
     Job job;
@@ -35,6 +40,9 @@ Job jobIn(SQLite::Statement& row) {
     job.acceptedAt = row.getColumn(11).getInt64();
     job.changedAt = row.getColumn(12).getInt64();
     job.uploadFolderIdentity = row.getColumn(13).getString();
+    job.due = row.getColumn(14).getInt64();
+    job.toHold = row.getColumn(15).getInt() != 0;
+    job.isTrial = row.getColumn(16).getInt() != 0;
     return job;
 }
 
@@ -111,21 +119,43 @@ std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) 
     return jobs;
 }
 
-std::vector<Job> JobStore::unfinished(std::string const& folder, std::string const& database) const {
+std::vector<Job> JobStore::underWay(std::string const& folder, std::string const& database) const {
+    std::vector<std::string> states;
+    for (JobState const state : UNDER_WAY)
+        states.emplace_back(stateName(state));
     Conditions wanted;
-    wanted.add("db_folder = ", folder);
-    wanted.add("db_name = ", database);
-    wanted.add("state NOT IN (SELECT value FROM json_each",
-               textOf({stateName(JobState::Delivered), stateName(JobState::Failed)}), ")");
+    wanted.add("state IN (SELECT value FROM json_each", textOf(states), ")");
+    // The signs keep these from choosing the index: what rests and has ended is of the same databases.
+    wanted.add("+db_folder = ", folder);
+    wanted.add("+db_name = ", database);
     SQLite::Statement query(database_, SELECT_JOBS + wanted.text() + "ORDER BY accepted_at, pack");
     wanted.bind(query);
     return jobsIn(query);
 }
 
+// The state stands in the text: a bound one would keep the index out, which holds that state alone.
+std::vector<Job> JobStore::due(long long now, std::size_t limit) const {
+    SQLite::Statement query(database_, std::string(SELECT_JOBS) +
+                                           "INDEXED BY jobs_by_due WHERE state = 'held' AND due <= ? "
+                                           "ORDER BY due, pack LIMIT " +
+                                           std::to_string(limit));
+    query.bind(1, static_cast<std::int64_t>(now));
+    return jobsIn(query);
+}
+
+std::optional<long long> JobStore::nextDue() const {
+    SQLite::Statement query(database_, "SELECT due FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND "
+                                       "due IS NOT NULL ORDER BY due LIMIT 1");
+    if (!query.executeStep())
+        return std::nullopt;
+    return query.getColumn(0).getInt64();
+}
+
 bool JobStore::accept(Job const& job) {
     SQLite::Statement insertion(
         database_, "INSERT INTO jobs (pack, db_folder, db_name, cfg_id, title, documents, pages, "
-                   "state, accepted_at, changed_at) VALUES (?, ?, ?, ?, ?, ?, ?, ?, ?, ?9) "
+                   "state, accepted_at, changed_at, to_upload, due, to_hold, trial) "
+                   "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?9, ?10, nullif(?11, 0), ?12, ?13) "
                    "ON CONFLICT DO NOTHING");
     insertion.bind(1, job.pack.packId);
     insertion.bind(2, job.pack.folder);
@@ -136,6 +166,10 @@ bool JobStore::accept(Job const& job) {
     insertion.bind(7, static_cast<std::int64_t>(job.pages));
     insertion.bind(8, stateName(JobState::Accepted));
     insertion.bind(9, static_cast<std::int64_t>(job.acceptedAt));
+    insertion.bind(10, job.toUpload ? 1 : 0);
+    insertion.bind(11, static_cast<std::int64_t>(job.due));
+    insertion.bind(12, job.toHold ? 1 : 0);
+    insertion.bind(13, job.isTrial ? 1 : 0);
     return insertion.exec() == 1;
 }
 
@@ -168,6 +202,33 @@ bool JobStore::beginSubmitting(std::string const& packId, std::string const& upl
     return moved;
 }
 
+bool JobStore::changeAtRest(std::string const& assignments, std::string const& packId, long long now) {
+    SQLite::Statement change(database_, "UPDATE jobs SET problem = '', " + assignments +
+                                            " WHERE pack = ?1 AND state IN ('accepted', 'held', 'queued')");
+    change.bind(1, packId);
+    change.bind(2, static_cast<std::int64_t>(now));
+    bool const isChanged = change.exec() == 1;
+    if (isChanged)
+        changed(packId);
+    return isChanged;
+}
+
+bool JobStore::hold(std::string const& packId, long long now) {
+    return changeAtRest("to_hold = 1, due = NULL, changed_at = iif(state = 'queued', ?2, changed_at), "
+                        "state = iif(state = 'queued', 'held', state)",
+                        packId, now);
+}
+
+bool JobStore::release(std::string const& packId, long long now) {
+    return changeAtRest("to_hold = 0, due = NULL, changed_at = iif(state = 'held', ?2, changed_at), "
+                        "state = iif(state = 'held', 'queued', state)",
+                        packId, now);
+}
+
+bool JobStore::cancel(std::string const& packId, long long now) {
+    return changeAtRest("due = NULL, changed_at = ?2, state = 'cancelled'", packId, now);
+}
+
 void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
     SQLite::Statement change(database_,
                              "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
@@ -189,11 +250,9 @@ void JobStore::setProblem(std::string const& packId, std::string const& problem)
 
 void JobStore::wantUpload(std::string const& folder, std::string const& database) {
     SQLite::Statement change(database_, "UPDATE jobs SET to_upload = 1 WHERE ?1 IN ('', db_folder) AND "
-                                        "?2 IN ('', db_name) AND state IN (?3, ?4)");
+                                        "?2 IN ('', db_name) AND state IN ('accepted', 'held', 'queued')");
     change.bind(1, folder);
     change.bind(2, database);
-    change.bind(3, stateName(JobState::Accepted));
-    change.bind(4, stateName(JobState::Queued));
     change.exec();
 }
 

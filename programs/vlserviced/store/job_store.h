@@ -32,8 +32,15 @@ public:
     /// In the order of their acceptance, at most `limit`, the youngest when there are more. Costs what the
     /// answer is large, however many jobs there are.
     std::vector<Job> matching(JobFilter const& filter, std::size_t limit) const;
-    /// Those of a pack database that are neither delivered nor given up; empty texts are no restriction.
-    std::vector<Job> unfinished(std::string const& folder, std::string const& database) const;
+    /// Those of a pack database that go on by themselves; empty texts are no restriction. Costs what the
+    /// answer is large, however many are held or done.
+    std::vector<Job> underWay(std::string const& folder, std::string const& database) const;
+
+    /// Of those that are held and due by then the first few, in the order of their time. Costs what the
+    /// answer is large.
+    std::vector<Job> due(long long now, std::size_t limit) const;
+    /// When the next job that is held is due.
+    std::optional<long long> nextDue() const;
 
     /// How many jobs are in each state that any is in.
     std::vector<std::pair<JobState, long long>> counts() const;
@@ -47,6 +54,13 @@ public:
     /// queued.
     bool beginSubmitting(std::string const& packId, std::string const& uploadFolder,
                          std::string const& identity, long long now);
+    /// Has a job held until it is released, also one that is not queued yet. False, and no change, once it is
+    /// on its way.
+    bool hold(std::string const& packId, long long now);
+    /// Lets a job go on that is held, or will be; false, and no change, when it cannot be held any more.
+    bool release(std::string const& packId, long long now);
+    /// Calls a job back; false, and no change, once it is on its way.
+    bool cancel(std::string const& packId, long long now);
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.
@@ -59,6 +73,8 @@ public:
     void onChange(std::function<void(std::string const&)> tell) { tell_ = std::move(tell); }
 
 private:
+    /// Of those of that pack id in a state from which one may go back.
+    bool changeAtRest(std::string const& assignments, std::string const& packId, long long now);
     void changed(std::string const& packId) const;
 
     SQLite::Database& database_;

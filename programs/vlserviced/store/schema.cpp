@@ -60,11 +60,19 @@ constexpr char const* SCHEMA_3 = R"sql(
 ALTER TABLE jobs ADD COLUMN upload_identity TEXT NOT NULL DEFAULT '';
 )sql";
 
+/// A job is due at an instant, or never by itself. The index holds those that wait for it and no others.
+constexpr char const* SCHEMA_4 = R"sql(
+ALTER TABLE jobs ADD COLUMN due INTEGER;
+ALTER TABLE jobs ADD COLUMN to_hold INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE jobs ADD COLUMN trial INTEGER NOT NULL DEFAULT 0;
+CREATE INDEX jobs_by_due ON jobs (due, pack) WHERE state = 'held' AND due IS NOT NULL;
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
     static Database::DatabaseKind const kind{
-        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3}};
+        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4}};
     return kind;
 }
 

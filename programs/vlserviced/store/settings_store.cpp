@@ -58,6 +58,17 @@ json::Object SettingsStore::parts(std::string const& id) const {
     return parts;
 }
 
+std::vector<std::string> SettingsStore::nodesWithText(std::string const& part,
+                                                      std::string const& text) const {
+    SQLite::Statement query(database_, "SELECT node FROM parts WHERE part = ? AND instr(json, ?) > 0");
+    query.bindNoCopy(1, part);
+    query.bindNoCopy(2, text);
+    std::vector<std::string> nodes;
+    while (query.executeStep())
+        nodes.push_back(query.getColumn(0).getString());
+    return nodes;
+}
+
 long long SettingsStore::bytesOf(std::string const& id) const {
     SQLite::Statement query(database_, "SELECT ifnull(sum(length(json)), 0) FROM parts WHERE node = ?");
     query.bindNoCopy(1, id);

@@ -37,6 +37,8 @@ public:
     std::vector<SettingsNode> nodes() const;
     /// An object from part name to the node's own value, in flat form.
     json::Object parts(std::string const& id) const;
+    /// The ids of the nodes whose own value of a part has that text in it.
+    std::vector<std::string> nodesWithText(std::string const& part, std::string const& text) const;
     /// The node and all above it, the root last. Nodes that are not stored are levels without parts. Throws
     /// Error when they hold more than MAX_CHAIN_BYTES.
     std::vector<SettingsLevel> chain(std::string const& id) const;

@@ -33,7 +33,7 @@ protected:
         return all;
     }
     json::Value keyOf(char const* packId, char const* key, long long now) {
-        return list(R"({"ids":[")" + std::string(packId) + "\"]}", now)
+        return list(R"({"states":["held","cancelled","tried"],"ids":[")" + std::string(packId) + "\"]}", now)
             .get("jobs")
             .toArray()
             .at(0)
@@ -98,6 +98,46 @@ TEST_F(JobList, RaisesAnAlarmByTheHoursOfTheNode) {
     EXPECT_EQ(keyOf("p1", "alarm", 30 * HOUR), json::Value("the carrier has not reported for 30 hours"));
     settings_.setPart("a=acme", "inet", parse(R"({"lodged_alarm_hours":0})"));
     EXPECT_FALSE(keyOf("p1", "alarm", 1000 * HOUR));
+}
+
+TEST_F(JobList, TellsUntilWhenAJobIsHeld) {
+    Job job;
+    job.pack = {"/srv/packs", "packs.db", "p1"};
+    job.due = 5000;
+    jobs_.accept(job);
+    EXPECT_EQ(keyOf("p1", "due", 0), json::Value(5000));
+    jobs_.advance("p1", JobState::Accepted, JobState::Held, 200);
+    EXPECT_EQ(keyOf("p1", "due", 0), json::Value(5000));
+    EXPECT_EQ(keyOf("p1", "container", 0), json::Value("/var/outbox/p1.mailing"));
+    jobs_.advance("p1", JobState::Held, JobState::Queued, 200);
+    EXPECT_FALSE(keyOf("p1", "due", 0));
+}
+
+TEST_F(JobList, TellsLaterStatesToClientsThatKnowThem) {
+    for (auto const& [id, state] :
+         {std::pair{"p1", JobState::Held}, {"p2", JobState::Cancelled}, {"p3", JobState::Tried}}) {
+        add(id, 100);
+        jobs_.advance(id, JobState::Accepted, state, 200);
+    }
+    auto const states = [&](std::string const& query) {
+        std::string all;
+        for (json::Value const& job : list(query).get("jobs").toArray())
+            all += job.toObject().get("state").textOrEmpty() + ' ' +
+                   job.toObject().get("problem").textOrEmpty() + ';';
+        return all;
+    };
+    EXPECT_EQ(states(R"({"states":["held","cancelled","tried"]})"), "held ;cancelled ;tried ;");
+    EXPECT_EQ(states("{}"), "queued ;failed it was cancelled;queued ;");
+}
+
+TEST_F(JobList, TellsThatThereIsNoFolderForWhatIsToBeHandedOver) {
+    add("p1", 100);
+    jobs_.advance("p1", JobState::Accepted, JobState::Queued, 200);
+    EXPECT_FALSE(keyOf("p1", "alarm", 0));
+    jobs_.wantUpload("", "");
+    EXPECT_EQ(keyOf("p1", "alarm", 0), json::Value("the service has no upload folder"));
+    settings_.changeService(parse(R"({"upload_folder":")" + folder_.path().string() + "\"}"));
+    EXPECT_FALSE(keyOf("p1", "alarm", 0));
 }
 
 } // namespace

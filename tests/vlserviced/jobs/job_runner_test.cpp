@@ -43,6 +43,14 @@ protected:
                        [this] { return now_; },
                        [this] { return VlServiced::ServiceSettings(settings_); },
                        outbox_,
+                       [this](std::string const&) { return rules_; },
+                       [](std::string const& node, std::string const& packPreset) {
+                           return node + " for " + packPreset;
+                       },
+                       [](long long) { return 0LL; },
+                       [this](std::string const& node, std::string const& packPreset) {
+                           used_.push_back(node + ' ' + packPreset);
+                       },
                    });
     }
     void doWork() {
@@ -52,10 +60,23 @@ protected:
     void accept(std::string const& packId) {
         EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", packId), "nothing was thrown");
     }
-    void acceptStored(std::string const& packId) {
-        storePack(packs_, packId);
+    void acceptStored(std::string const& packId, std::string const& preset = "") {
+        storePack(packs_, packId, "a=acme", preset);
         accept(packId);
     }
+    /// What a change says.
+    std::string change(Protocol::JobAction action, std::string const& packId = "p1") {
+        return failureOf([&] { runner_->change(action, packId); });
+    }
+    /// As a process does that was started anew.
+    void restart() {
+        startRunner();
+        runner_->resume();
+        doWork();
+    }
+    bool isStaged() const { return fs::exists(upload_ / ".p1.mailing.part"); }
+    bool isInOutbox() const { return fs::exists(outbox_ / "p1.mailing"); }
+    bool isHandedOver() const { return fs::exists(upload_ / "p1.mailing"); }
     std::string state(std::string const& packId) {
         std::optional<VlServiced::Job> const job = jobs_.find(packId);
         return !job ? "none" : stateName(job->state) + (job->problem.empty() ? "" : ": " + job->problem);
@@ -94,6 +115,9 @@ protected:
     /// When it is there, what the readers were given waits in it.
     std::optional<std::deque<VlServiced::JobSurroundings::Work>> readersWork_;
     long long now_ = 1000;
+    Policy::Rules rules_;
+    /// Nodes and pack presets of accepted mailings.
+    std::vector<std::string> used_;
     std::optional<JobRunner> runner_;
 };
 
@@ -482,6 +506,299 @@ TEST_F(JobRunnerTest, RefusesAPackDatabaseThatOthersMayWrite) {
               "the pack database " + packs_.string() + " is not read, because others may write " +
                   folder_.path().string() + ": take their right away (chmod go-w)");
     EXPECT_EQ(state("p1"), "none");
+}
+
+constexpr auto HOLD = Protocol::JobAction::Hold;
+constexpr auto RELEASE = Protocol::JobAction::Release;
+constexpr auto CANCEL = Protocol::JobAction::Cancel;
+constexpr char const* DONE = "nothing was thrown";
+
+// What a pack preset says about the way of its mailings.
+
+TEST_F(JobRunnerTest, HandsOverByItselfWhatIsToGoAtOnce) {
+    acceptStored("p1", R"("process_mode": 3, )");
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, KeepsWhatIsToGoAtOnceUntilThereIsAFolder) {
+    setSettings("{}");
+    acceptStored("p1", R"("process_mode": 2, )");
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+    setSettings(R"({"upload_folder":")" + upload_.string() + "\"}");
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, HoldsUntilItIsReleasedWhatIsToBeHeldAlsoWithAnUpload) {
+    acceptStored("p1", R"("process_mode": 9, )");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "held");
+    runner_->upload("", "");
+    runner_->resume();
+    runner_->updateStatus("", "");
+    EXPECT_TRUE(work_.empty());
+    EXPECT_EQ(change(RELEASE), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_FALSE(isInOutbox());
+}
+
+TEST_F(JobRunnerTest, HoldsADelayedMailingUntilItIsDueAlsoWithAnUpload) {
+    // 1000 seconds behind midnight: due at the 20th minute.
+    acceptStored("p1", R"("delay": {"mins": [20]}, )");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "held");
+    EXPECT_EQ(jobs_.find("p1")->due, 1200);
+    now_ = 1199;
+    runner_->releaseDue();
+    EXPECT_EQ(state("p1"), "held");
+    now_ = 1200;
+    runner_->releaseDue();
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, LetsADelayedMailingWaitForAnUploadWhenItIsDue) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, )");
+    doWork();
+    now_ = 1200;
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+TEST_F(JobRunnerTest, ReleasesAMailingInFrontOfItsTime) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, "process_mode": 2, )");
+    doWork();
+    EXPECT_EQ(change(RELEASE), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, ReleasesWhatIsNotHeldYet) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, "process_mode": 8, )");
+    EXPECT_EQ(change(RELEASE), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+TEST_F(JobRunnerTest, HandsNothingOverOfATrialRun) {
+    acceptStored("p1", R"("process_mode": 131, )");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "tried");
+    EXPECT_EQ(contentOf(outbox_ / "p1.mailing"), contentOfPack("p1"));
+    runner_->upload("", "");
+    runner_->updateStatus("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "tried");
+    EXPECT_TRUE(fs::is_empty(upload_));
+    for (auto const action : {HOLD, RELEASE, CANCEL})
+        EXPECT_EQ(change(action), "it is too late to " + std::string(actionName(action)) +
+                                      " mailing p1: it was a trial run, which hands nothing over");
+}
+
+TEST_F(JobRunnerTest, HoldsAMailingThatWaitsToBeHandedOver) {
+    acceptStored("p1");
+    EXPECT_EQ(change(HOLD), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "held");
+    EXPECT_EQ(change(RELEASE), DONE);
+    EXPECT_EQ(state("p1"), "queued");
+    EXPECT_EQ(change(HOLD), DONE);
+    EXPECT_EQ(change(HOLD), DONE);
+    EXPECT_EQ(state("p1"), "held");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "held");
+}
+
+TEST_F(JobRunnerTest, KeepsADelayedMailingThatAPersonHolds) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, )");
+    doWork();
+    EXPECT_EQ(change(HOLD), DONE);
+    now_ = 5000;
+    runner_->releaseDue();
+    EXPECT_EQ(state("p1"), "held");
+}
+
+TEST_F(JobRunnerTest, TakesBackACopyThatIsBeingMadeOfAMailingThatAPersonHolds) {
+    acceptStored("p1");
+    doWork();
+    runner_->upload("", "");
+    EXPECT_EQ(change(HOLD), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "held");
+    EXPECT_FALSE(isStaged());
+    EXPECT_TRUE(isInOutbox());
+    EXPECT_EQ(change(RELEASE), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, CallsAMailingBackWhereverItIsUntilItIsHandedOver) {
+    acceptStored("p1");
+    EXPECT_EQ(change(CANCEL), DONE);
+    doWork();
+    EXPECT_EQ(state("p1"), "cancelled");
+    EXPECT_FALSE(isInOutbox());
+    EXPECT_EQ(change(CANCEL), DONE);
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
+              "pack p1 was cancelled: mail its letters anew");
+
+    acceptStored("p2");
+    doWork();
+    EXPECT_EQ(change(CANCEL, "p2"), DONE);
+    EXPECT_FALSE(fs::exists(outbox_ / "p2.mailing"));
+
+    acceptStored("p3", R"("process_mode": 8, )");
+    doWork();
+    EXPECT_EQ(change(CANCEL, "p3"), DONE);
+    EXPECT_EQ(state("p3"), "cancelled");
+    EXPECT_FALSE(fs::exists(outbox_ / "p3.mailing"));
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(filesInUpload(), 0);
+}
+
+TEST_F(JobRunnerTest, CallsAMailingBackWhoseCopyIsBeingMade) {
+    acceptStored("p1");
+    doWork();
+    runner_->upload("", "");
+    EXPECT_EQ(change(CANCEL), DONE);
+    EXPECT_TRUE(isInOutbox());
+    doWork();
+    EXPECT_EQ(state("p1"), "cancelled");
+    EXPECT_FALSE(isStaged());
+    EXPECT_FALSE(isInOutbox());
+    EXPECT_EQ(filesInUpload(), 0);
+}
+
+TEST_F(JobRunnerTest, SaysWhoHasAMailingThatCannotBeCalledBack) {
+    acceptStored("p1");
+    doWork();
+    stageOnRecord();
+    std::string const late = "it is too late to cancel mailing p1: ";
+    EXPECT_EQ(change(CANCEL), late + "it is being handed over to the upload folder " + upload_.string());
+    runner_->resume();
+    EXPECT_TRUE(
+        change(CANCEL).starts_with(late + "the upload folder " + upload_.string() + " has it since "));
+    fs::remove(upload_ / "p1.mailing");
+    runner_->updateStatus("", "");
+    EXPECT_EQ(change(CANCEL), late + "the carrier has taken it from the upload folder " + upload_.string());
+    std::ofstream(upload_ / "p1.mailing.status") << R"({"state":"delivered"})";
+    runner_->updateStatus("", "");
+    EXPECT_EQ(change(CANCEL), late + "the carrier has delivered it");
+    EXPECT_EQ(change(HOLD), "it is too late to hold mailing p1: the carrier has delivered it");
+    acceptStored("bad");
+    run("UPDATE pages SET data = 'x' WHERE pack = 'bad' AND position = 0");
+    doWork();
+    EXPECT_EQ(
+        change(CANCEL, "bad"),
+        "it is too late to cancel mailing bad: it was given up: page 1 of the pack is not a compressed page");
+    EXPECT_EQ(change(RELEASE, "none"), "there is no mailing none");
+}
+
+// A process that was killed in each of the states, and behind each change.
+
+TEST_F(JobRunnerTest, HoldsBehindARestartWhatWasToBeHeld) {
+    acceptStored("p1", R"("process_mode": 8, )");
+    restart();
+    EXPECT_EQ(state("p1"), "held");
+    restart();
+    EXPECT_EQ(state("p1"), "held");
+    EXPECT_EQ(change(RELEASE), DONE);
+    restart();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+TEST_F(JobRunnerTest, ReleasesBehindARestartWhatBecameDueMeanwhile) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, "process_mode": 3, )");
+    doWork();
+    restart();
+    EXPECT_EQ(state("p1"), "held");
+    now_ = 9000;
+    restart();
+    EXPECT_EQ(state("p1"), "submitted");
+}
+
+TEST_F(JobRunnerTest, PassesOverADelayThatEndedBeforeItsContainerWasMade) {
+    acceptStored("p1", R"("delay": {"mins": [20]}, )");
+    now_ = 1200;
+    restart();
+    EXPECT_EQ(state("p1"), "queued");
+}
+
+TEST_F(JobRunnerTest, KeepsTrialsAndCancelledMailingsBehindARestart) {
+    acceptStored("p1", R"("process_mode": 128, )");
+    restart();
+    EXPECT_EQ(state("p1"), "tried");
+    restart();
+    EXPECT_EQ(state("p1"), "tried");
+    EXPECT_TRUE(isInOutbox());
+    acceptStored("p2");
+    EXPECT_EQ(change(CANCEL, "p2"), DONE);
+    restart();
+    EXPECT_EQ(state("p2"), "cancelled");
+    EXPECT_FALSE(fs::exists(outbox_ / "p2.mailing"));
+}
+
+TEST_F(JobRunnerTest, RemovesBehindARestartWhatIsLeftOfACancelledMailing) {
+    acceptStored("p1");
+    doWork();
+    VlServiced::stage(outbox_ / "p1.mailing", UploadFolder(upload_, {}));
+    jobs_.cancel("p1", now_);
+    restart();
+    EXPECT_FALSE(isStaged());
+    EXPECT_FALSE(isInOutbox());
+    EXPECT_FALSE(isHandedOver());
+}
+
+// What the settings of the node allow, whatever the client has decided.
+
+TEST_F(JobRunnerTest, RefusesWhatTheSettingsDoNotAllow) {
+    rules_.maxLetterSheets = {2, "u=bob/a=acme"};
+    storePack(packs_, "p1");
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
+              "too-many-sheets: 3 sheets, 2 allowed by u=bob/a=acme; pack p1 is not taken");
+    EXPECT_EQ(state("p1"), "none");
+    storePack(packs_, "both sides", "a=acme", R"("duplex": true, )");
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "both sides"), DONE);
+    rules_.enforcesProfile = {true, "the root"};
+    storePack(packs_, "p2", "a=acme", R"("delay": {"week_days": [9]}, )");
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p2"),
+              "profile-not-listed: no profile, none allowed by the root; delay-impossible: 9 in "
+              "\"week_days\", 0 to 6 "
+              "possible, as set by a=acme for Bills; too-many-sheets: 3 sheets, 2 allowed by u=bob/a=acme; "
+              "pack p2 is "
+              "not taken");
+    EXPECT_EQ(used_, std::vector<std::string>{"a=acme Bills"});
+}
+
+TEST_F(JobRunnerTest, RefusesMetadataThatIsNone) {
+    storePack(packs_, "p1");
+    run("UPDATE packs SET metadata = 'x'");
+    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
+              "the metadata of pack p1 is none of a mailing");
+    EXPECT_EQ(state("p1"), "none");
+}
+
+TEST_F(JobRunnerTest, WritesWhatTheSettingsDecideIntoTheMetadata) {
+    rules_.purchaseOrder = "P-1";
+    rules_.priority = Cfg::PriorityDelivery{2};
+    acceptStored("p1");
+    doWork();
+    PackWrapper container((outbox_ / "p1.mailing").string(), PackWrapper::PURPOSE_IMPORT, "");
+    json::Object const metadata = parse(unzipped(container.inputFullMeta()));
+    EXPECT_EQ(metadata.get("purchase_order"), json::Value("P-1"));
+    EXPECT_TRUE(metadata.get("priority_delivery").isTrue());
+    EXPECT_EQ(metadata.get("title"), json::Value("metadata of p1"));
 }
 
 } // namespace

@@ -192,4 +192,87 @@ TEST_F(SettingsServiceTest, RecognisesAnUploadFolderThatWasSetWithoutAnIdentity)
     EXPECT_EQ(service_.service().uploadFolderIdentity(), identity) << "what is on record stays";
 }
 
+/// A settings service whose clock the test sets.
+class PresetRules : public testing::Test {
+protected:
+    std::string set(std::string const& id, std::string const& presets) {
+        return failureOf([&] { settings_.setPart(id, "presets", parse(presets)); });
+    }
+    std::string presetsOf(std::string const& id) { return print(store_.parts(id).get("presets")); }
+
+    static constexpr long long DAY = 86'400;
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{database_};
+    long long now_ = 20'000 * DAY;
+    VlServiced::SettingsService settings_{store_, [this] {
+                                              return Policy::Moment{now_, [](long long) { return 0LL; }};
+                                          }};
+};
+
+TEST_F(PresetRules, NodesBelowCannotReplaceALockedPackPreset) {
+    EXPECT_EQ(set("a=acme", R"({"pack_presets":[{"name":"Bills","lock_pack_ui":true},{"name":"Open"}]})"),
+              "nothing was thrown");
+    EXPECT_EQ(
+        set("u=bob/ou=sales/a=acme", R"({"pack_presets":[{"name":"Open"},{"name":"Bills","duplex":true}]})"),
+        "the settings \"presets\" were not changed: the pack preset \"Bills\" is locked by a=acme "
+        "(\"lock_pack_ui\"): nodes below cannot replace it");
+    EXPECT_EQ(presetsOf("u=bob/ou=sales/a=acme"), "#absent#");
+    EXPECT_EQ(set("u=bob/a=acme", R"({"pack_presets":[{"name":"Open"},{"name":"bills"}]})"),
+              "nothing was thrown");
+    EXPECT_EQ(set("a=other", R"({"pack_presets":[{"name":"Bills"}]})"), "nothing was thrown");
+    EXPECT_EQ(set("a=acme", R"({"pack_presets":[{"name":"Bills","lock_pack_ui":true,"duplex":true}]})"),
+              "nothing was thrown");
+    set("", R"({"pack_presets":[{"name":"Root's","lock_pack_ui":true}]})");
+    EXPECT_EQ(set("a=acme", R"({"pack_presets":[{"name":"Root's"}]})"),
+              "the settings \"presets\" were not changed: the pack preset \"Root's\" is locked by the root "
+              "(\"lock_pack_ui\"): nodes below cannot replace it");
+}
+
+TEST_F(PresetRules, DelaysThatNeverEndAreRefusedWhenTheyAreSet) {
+    EXPECT_EQ(
+        set("a=acme", R"({"pack_presets":[{"name":"Bills","delay":{"week_days":[1,9]}}]})"),
+        "the settings \"presets\" were not changed: the pack preset \"Bills\" has a delay that never ends: "
+        "delay-impossible: 9 in \"week_days\", 0 to 6 possible");
+    EXPECT_EQ(
+        set("a=acme", R"({"pack_presets":[{"name":"Bills","delay":{"count":500}}]})"),
+        "the settings \"presets\" were not changed: the pack preset \"Bills\" has a delay that never ends: "
+        "delay-impossible: slot 500 is not reached within 400 days");
+    EXPECT_EQ(set("a=acme", R"({"pack_presets":[{"name":"Bills","delay":{"week_days":[1],"mins":[480]}}]})"),
+              "nothing was thrown");
+}
+
+TEST_F(PresetRules, ThoseThatExpireAreKeptAsLongAsTheyAreUsed) {
+    set("", R"({"pack_presets":[{"name":"#auto_b.pdf"}]})");
+    set("a=acme", R"({"extract_presets":[{"match":"a\\.pdf","pack_preset":"#auto_a.pdf"}],)"
+                  R"("pack_presets":[{"name":"#auto_a.pdf"},{"name":"Bills"}]})");
+    settings_.removeUnusedPresets();
+    now_ += 80 * DAY;
+    settings_.notePresetUse("u=bob/a=acme", "#auto_b.pdf");
+    settings_.notePresetUse("u=bob/a=acme", "Bills");
+    now_ += 11 * DAY;
+    settings_.removeUnusedPresets();
+    EXPECT_EQ(presetsOf(""), R"({"pack_presets":[{"name":"#auto_b.pdf","last_used":1734912000}]})");
+    EXPECT_EQ(presetsOf("a=acme"), R"({"extract_presets":[],"pack_presets":[{"name":"Bills"}]})");
+    settings_.suspend(1);
+    now_ += 200 * DAY;
+    settings_.removeUnusedPresets();
+    settings_.notePresetUse("a=acme", "#auto_b.pdf");
+    EXPECT_EQ(presetsOf(""), R"({"pack_presets":[{"name":"#auto_b.pdf","last_used":1734912000}]})");
+}
+
+TEST_F(PresetRules, TheRulesOfANodeNameWhereTheyComeFromAndFollowChanges) {
+    EXPECT_EQ(settings_.rules("u=bob/a=acme").maxLetterSheets.source, "the built-in settings");
+    settings_.setPart("a=acme", "app", parse(R"({"max_letter_sheets":5})"));
+    EXPECT_EQ(settings_.rules("u=bob/a=acme").maxLetterSheets.value, 5);
+    EXPECT_EQ(settings_.rules("u=bob/a=acme").maxLetterSheets.source, "a=acme");
+    settings_.setPart("u=bob/a=acme", "app", parse(R"({"max_letter_sheets":7})"));
+    EXPECT_EQ(settings_.rules("u=bob/a=acme").maxLetterSheets.source, "u=bob/a=acme");
+    settings_.update("u=bob/a=acme", true);
+    EXPECT_EQ(settings_.rules("u=bob/a=acme").maxLetterSheets.source, "a=acme");
+    set("a=acme", R"({"pack_presets":[{"name":"Bills"}]})");
+    EXPECT_EQ(settings_.sourceOfPackPreset("u=bob/a=acme", "Bills"), "a=acme");
+}
+
 } // namespace

@@ -3,10 +3,14 @@
 #include "programs/vlserviced/store/schema.h"
 #include "tests/support/temporary_folder.h"
 
+#include <SQLiteCpp/Statement.h>
 #include <SQLiteCpp/Transaction.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sqlite3.h>
+
+#include <functional>
+#include <iterator>
 
 namespace {
 
@@ -131,8 +135,9 @@ TEST_F(JobStoreTest, FindsTheJobsOfAPackDatabase) {
 }
 
 TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
-    for (auto const* id : {"accepted", "queued", "submitted"})
+    for (auto const* id : {"accepted", "queued", "submitted", "held"})
         store_.accept(job(id));
+    store_.advance("held", JobState::Accepted, JobState::Held, 2);
     for (auto const* id : {"queued", "submitted"})
         store_.advance(id, JobState::Accepted, JobState::Queued, 2);
     store_.advance("submitted", JobState::Queued, JobState::Submitted, 3);
@@ -141,17 +146,93 @@ TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
     store_.wantUpload("/srv/packs", "packs.db");
     EXPECT_TRUE(store_.find("accepted")->toUpload);
     EXPECT_TRUE(store_.find("queued")->toUpload);
+    EXPECT_TRUE(store_.find("held")->toUpload);
     EXPECT_FALSE(store_.find("submitted")->toUpload);
 }
 
-TEST_F(JobStoreTest, ListsWhatIsUnfinishedOfAPackDatabase) {
+TEST_F(JobStoreTest, RecordsTheCourseOfAJob) {
+    Job wanted = job("p1");
+    wanted.toUpload = wanted.toHold = wanted.isTrial = true;
+    wanted.due = 900;
+    store_.accept(wanted);
+    Job const found = store_.find("p1").value();
+    EXPECT_TRUE(found.toUpload && found.toHold && found.isTrial);
+    EXPECT_EQ(found.due, 900);
+    store_.accept(job("p2"));
+    Job const plain = store_.find("p2").value();
+    EXPECT_FALSE(plain.toUpload || plain.toHold || plain.isTrial);
+    EXPECT_EQ(plain.due, 0);
+}
+
+TEST_F(JobStoreTest, HoldsReleasesAndCallsBackWhatIsNotOnItsWay) {
+    struct {
+        JobState from;
+        JobState held;
+        JobState released;
+        JobState cancelled;
+    } const cases[] = {
+        {JobState::Accepted, JobState::Accepted, JobState::Accepted, JobState::Cancelled},
+        {JobState::Held, JobState::Held, JobState::Queued, JobState::Cancelled},
+        {JobState::Queued, JobState::Held, JobState::Queued, JobState::Cancelled},
+        {JobState::Submitting, JobState::Submitting, JobState::Submitting, JobState::Submitting},
+        {JobState::Submitted, JobState::Submitted, JobState::Submitted, JobState::Submitted},
+        {JobState::Lodged, JobState::Lodged, JobState::Lodged, JobState::Lodged},
+        {JobState::Delivered, JobState::Delivered, JobState::Delivered, JobState::Delivered},
+        {JobState::Failed, JobState::Failed, JobState::Failed, JobState::Failed},
+        {JobState::Cancelled, JobState::Cancelled, JobState::Cancelled, JobState::Cancelled},
+        {JobState::Tried, JobState::Tried, JobState::Tried, JobState::Tried},
+    };
+    static_assert(std::size(cases) == Protocol::ALL_JOB_STATES.size());
+    int number = 0;
+    auto const behind = [&](JobState from, bool (JobStore::*change)(std::string const&, long long)) {
+        std::string const id = "p" + std::to_string(++number);
+        Job wanted = job(id);
+        wanted.due = 900;
+        store_.accept(wanted);
+        store_.advance(id, JobState::Accepted, from, 150);
+        bool const isChanged = (store_.*change)(id, 160);
+        Job const found = store_.find(id).value();
+        EXPECT_EQ(found.due, isChanged ? 0 : 900);
+        EXPECT_EQ(found.changedAt, found.state == from ? 150 : 160);
+        EXPECT_EQ(found.toHold, isChanged && change == &JobStore::hold);
+        return found.state;
+    };
+    for (auto const& [from, held, released, cancelled] : cases) {
+        EXPECT_EQ(behind(from, &JobStore::hold), held) << stateName(from);
+        EXPECT_EQ(behind(from, &JobStore::release), released) << stateName(from);
+        EXPECT_EQ(behind(from, &JobStore::cancel), cancelled) << stateName(from);
+    }
+}
+
+TEST_F(JobStoreTest, FindsWhatIsHeldAndDueInTheOrderOfItsTime) {
+    for (auto const& [id, due] :
+         {std::pair{"c", 300LL}, {"a", 500LL}, {"b", 100LL}, {"never", 0LL}, {"queued", 50LL}}) {
+        Job held = job(id);
+        held.due = due;
+        store_.accept(held);
+        store_.advance(id, JobState::Accepted,
+                       id == std::string("queued") ? JobState::Queued : JobState::Held, 2);
+    }
+    EXPECT_EQ(store_.nextDue(), 100);
+    EXPECT_THAT(ids(store_.due(99, 10)), IsEmpty());
+    EXPECT_THAT(ids(store_.due(300, 10)), ElementsAre("b", "c"));
+    EXPECT_THAT(ids(store_.due(1000, 2)), ElementsAre("b", "c"));
     for (auto const* id : {"a", "b", "c"})
+        store_.advance(id, JobState::Held, JobState::Queued, 3);
+    EXPECT_EQ(store_.nextDue(), std::nullopt);
+}
+
+TEST_F(JobStoreTest, ListsWhatGoesOnByItselfOfAPackDatabase) {
+    for (auto const* id : {"a", "b", "c", "held", "cancelled", "tried"})
         store_.accept(job(id));
+    store_.advance("held", JobState::Accepted, JobState::Held, 6);
+    store_.advance("cancelled", JobState::Accepted, JobState::Cancelled, 6);
+    store_.advance("tried", JobState::Accepted, JobState::Tried, 6);
     store_.fail("b", "gone", 5);
     store_.advance("c", JobState::Accepted, JobState::Delivered, 6);
-    EXPECT_THAT(ids(store_.unfinished("", "")), ElementsAre("a"));
-    EXPECT_THAT(ids(store_.unfinished("/srv/packs", "packs.db")), ElementsAre("a"));
-    EXPECT_THAT(ids(store_.unfinished("/srv/other", "")), IsEmpty());
+    EXPECT_THAT(ids(store_.underWay("", "")), ElementsAre("a"));
+    EXPECT_THAT(ids(store_.underWay("/srv/packs", "packs.db")), ElementsAre("a"));
+    EXPECT_THAT(ids(store_.underWay("/srv/other", "")), IsEmpty());
 }
 
 TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
@@ -214,6 +295,48 @@ TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
     addJobs(50, 3000);
     for (std::size_t i = 0; i < few.size(); ++i)
         EXPECT_NEAR(steps(filters[i]), few[i], 2) << i;
+}
+
+TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
+    auto const addHeld = [this](int from, int to) {
+        SQLite::Transaction transaction(database_);
+        for (int i = from; i < to; ++i) {
+            Job held = job("job " + std::to_string(i), i);
+            held.due = 1000 + i;
+            store_.accept(held);
+            store_.advance(held.pack.packId, JobState::Accepted, JobState::Held, i);
+        }
+        transaction.commit();
+    };
+    auto const steps = [this](auto const& question) {
+        StepCounter const counter(database_);
+        question();
+        return counter.steps();
+    };
+    std::function<void()> const questions[] = {
+        [this] { store_.due(1004, 100); },
+        [this] { store_.nextDue(); },
+        [this] { store_.underWay("", ""); },
+        [this] { store_.underWay("/srv/packs", "packs.db"); },
+        [this] { store_.inState(JobState::Queued); },
+    };
+    addHeld(0, 50);
+    std::vector<int> few;
+    for (auto const& question : questions)
+        few.push_back(steps(question));
+    addHeld(50, 3000);
+    for (std::size_t i = 0; i < few.size(); ++i)
+        EXPECT_NEAR(steps(questions[i]), few[i], 2) << i;
+}
+
+TEST_F(JobStoreTest, OrdersWhatIsDueByItsIndexAlone) {
+    SQLite::Statement plan(database_,
+                           "EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND due <= 7 "
+                           "ORDER BY due, pack");
+    std::vector<std::string> steps;
+    while (plan.executeStep())
+        steps.push_back(plan.getColumn(3).getString());
+    EXPECT_THAT(steps, ElementsAre("SEARCH jobs USING INDEX jobs_by_due (due<?)"));
 }
 
 } // namespace
