@@ -19,11 +19,11 @@ Box standardPrintArea() {
     return area;
 }
 
+/// Neither an e-mail address nor a number.
 bool isPostal(std::string_view value) {
-    bool const isOneLine = value.find('\n') == value.npos;
     bool const hasLetters =
         std::ranges::any_of(value, [](unsigned char c) { return std::isalpha(c) || c >= 0x80; });
-    return !isOneLine || (hasLetters && value.find('@') == value.npos);
+    return value.find('\n') != value.npos || (hasLetters && value.find('@') == value.npos);
 }
 
 /// Where the search found the value that counts.
@@ -124,15 +124,13 @@ Box PlacedAddress::box() const {
 
 std::optional<PlacedAddress> postalAddressOf(Cfg::ExtractedFields const& fields,
                                              Reader::PageTrace const* trace) {
-    for (auto const& [priority, field] : fields) {
-        if (!field.isRcptAddress() || !field.sendToServer() || !isPostal(field.valueToStr()))
-            continue;
-        PlacedAddress address{field.valueToStr()};
-        if (trace)
-            place(address, field.name(), *trace);
-        return address;
-    }
-    return std::nullopt;
+    Cfg::ExtractedField const* const field = fields.primaryAddressField();
+    if (!field || !isPostal(field->valueToStr()))
+        return std::nullopt;
+    PlacedAddress address{field->valueToStr()};
+    if (trace)
+        place(address, field->name(), *trace);
+    return address;
 }
 
 std::vector<Finding> checkLetter(LetterOnPaper const& letter, PrintRules const& rules) {

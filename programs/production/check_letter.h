@@ -52,8 +52,8 @@ struct LetterOnPaper {
     PlacedAddress const* address = nullptr;
 };
 
-/// The recipient's postal address among the fields, by falling priority, and its place, as far as the search
-/// of the letter's first page tells it; `trace` may be null.
+/// The address that counts and its place, as far as the search of the letter tells it, when it is a postal
+/// one: a letter to an e-mail address or a telephone has no envelope. `trace` may be null.
 std::optional<PlacedAddress> postalAddressOf(Cfg::ExtractedFields const& fields,
                                              Reader::PageTrace const* trace);
 

@@ -10,8 +10,6 @@ namespace {
 
 /// Print that is smaller by a fifth above an address is the sender's.
 constexpr double SENDERS_SIZE = 0.8;
-/// In font sizes of the address: how far above it the sender's line stands at most.
-constexpr int SENDERS_DISTANCE = 3;
 /// Around words, in 1/100 mm: their letters' edges when a page is drawn coarsely.
 constexpr int RIM = 100;
 
@@ -22,85 +20,106 @@ bool isInside(Box const& box, Box const& room) {
            box.bottom <= room.bottom;
 }
 
+bool isIn(std::vector<Box> const& boxes, Reader::Word const& word) {
+    return std::ranges::any_of(boxes, [&](Box const& box) { return box.contains(word.box.centre()); });
+}
+
 class Window {
 public:
     Window(PageOnPaper const& page, PrintRules const& rules, Findings& findings)
-        : page_(page), box_(*rules.production.window), tolerance_(rules.production.tolerance),
-          findings_(findings) {}
-
-    void checkAddress() {
-        Box const address = page_.address->box();
-        if (isInside(address, grown(box_, tolerance_)))
-            return;
-        findings_.add(Code::AddressOutsideWindow, page_.at(address),
-                      "the address stands at " + placeInWords(address) + ", the window is " +
-                          placeInWords(box_),
-                      fixFor(address, box_));
+        : page_(page), box_(*rules.production.window), inner_(grown(box_, -rules.production.tolerance)),
+          outer_(grown(box_, rules.production.tolerance)), findings_(findings), address_(page.address->box()),
+          meant_(page.address->parts) {
+        addSendersLine();
+        for (Box& box : meant_)
+            box = grown(box, RIM);
     }
 
+    void checkAddress() {
+        if (!isInside(address_, outer_))
+            findings_.add(Code::AddressOutsideWindow, page_.at(address_),
+                          "the address stands at " + placeInWords(address_) + ", the window is " +
+                              placeInWords(box_),
+                          fixFor(address_, box_));
+    }
+
+    /// Text block by block, and what else there is.
     void checkRest() {
-        Box const inner = grown(box_, -tolerance_);
-        if (inner.left >= inner.right || inner.top >= inner.bottom)
-            return;
-        std::optional<Box> const found = page_.ink.inside(inner, meantToShow());
+        std::optional<Box> const found = ink();
         if (!found)
             return;
-        findings_.add(Code::TextInWindow, page_.at(*found),
-                      textInWords(page_.page, *found) + " shows through the window",
-                      "move it " + inWords(wayOutOf(*found, box_)));
+        for (TextBlock const& block : blocksIn(wordsIn(*found))) {
+            add(block.box, block.text);
+            meant_.push_back(grown(block.box, RIM));
+        }
+        if (std::optional<Box> const rest = ink())
+            add(*rest, "something");
     }
 
 private:
-    /// The address, and the sender's line above it.
-    std::vector<Box> meantToShow() const {
-        std::vector<Box> boxes;
-        if (!page_.address)
-            return boxes;
-        for (Box const& part : page_.address->parts)
-            boxes.push_back(grown(part, RIM));
-        addSendersLine(boxes);
-        return boxes;
+    std::optional<Box> ink() const {
+        bool const isTiny = inner_.left >= inner_.right || inner_.top >= inner_.bottom;
+        return isTiny ? std::nullopt : page_.ink.inside(inner_, meant_);
     }
 
-    void addSendersLine(std::vector<Box>& boxes) const {
-        Box const address = page_.address->box();
-        int const size = addressSize(address);
-        int lowest = address.top - SENDERS_DISTANCE * size;
+    void add(Box const& box, std::string const& text) {
+        findings_.add(Code::TextInWindow, page_.at(box), text + " shows through the window",
+                      "move it " + inWords(wayOutOf(box, box_)));
+    }
+
+    Reader::Page wordsIn(Box const& found) const {
+        Reader::Page part = wordsOf(page_.page, found);
+        std::erase_if(part.words, [&](Reader::Word const& word) { return isIn(meant_, word); });
+        return part;
+    }
+
+    /// The nearest line of smaller print above the address, which may have a rule below it.
+    void addSendersLine() {
+        int const size = addressSize();
+        int lowest = outer_.top;
         for (Reader::Word const& word : page_.page.words)
-            if (isSenders(word, address, size))
+            if (isSenders(word, size))
                 lowest = std::max(lowest, word.box.centre().y);
         for (Reader::Word const& word : page_.page.words)
-            if (isSenders(word, address, size) && word.box.top <= lowest && word.box.bottom >= lowest)
-                boxes.push_back(grown(word.box, RIM));
+            if (isSenders(word, size) && word.box.top <= lowest && word.box.bottom >= lowest)
+                meant_.push_back(
+                    {word.box.left, word.box.top, word.box.right, word.box.bottom + word.box.height()});
     }
 
-    int addressSize(Box const& address) const {
+    int addressSize() const {
         int size = 0;
         for (Reader::Word const& word : page_.page.words)
-            if (address.contains(word.box.centre()))
+            if (address_.contains(word.box.centre()))
                 size = std::max(size, word.size);
         return size;
     }
 
-    static bool isSenders(Reader::Word const& word, Box const& address, int size) {
-        return word.size <= SENDERS_SIZE * size && word.box.centre().y < address.top &&
-               word.box.centre().y > address.top - SENDERS_DISTANCE * size;
+    bool isSenders(Reader::Word const& word, int size) const {
+        Reader::Point const centre = word.box.centre();
+        return word.size <= SENDERS_SIZE * size && centre.y < address_.top && outer_.contains(centre);
     }
 
     PageOnPaper const& page_;
     Box box_;
-    int tolerance_;
+    Box inner_;
+    Box outer_;
     Findings& findings_;
+    Box address_;
+    /// To show.
+    std::vector<Box> meant_;
 };
 
 } // namespace
 
 void checkWindow(PageOnPaper const& page, PrintRules const& rules, Findings& findings) {
-    if (!page.isFirst || !rules.production.window)
+    if (!rules.production.window || !page.address)
         return;
+    if (!page.isFirst)
+        return findings.add(Code::AddressOutsideWindow, page.at(page.address->box()),
+                            "the address does not stand on the letter's first page, which the window shows",
+                            "move it to " + placeInWords(*rules.production.window) + " of the first page");
     Window window(page, rules, findings);
-    if (page.address)
-        window.checkAddress();
+    window.checkAddress();
     window.checkRest();
 }
 

@@ -19,8 +19,11 @@ int intoRoom(int from, int to, int roomFrom, int roomTo) {
     return from < roomFrom ? roomFrom - from : roomTo - to;
 }
 
+/// Nobody moves anything by less.
+std::string inTenths(int hundredths) { return Base::withMillimetres((std::abs(hundredths) + 9) / 10 * 10); }
+
 std::string oneWay(int length, char const* forwards, char const* backwards) {
-    return Base::withMillimetres(std::abs(length)) + ' ' + (length > 0 ? forwards : backwards);
+    return inTenths(length) + ' ' + (length > 0 ? forwards : backwards);
 }
 
 std::string joined(std::string const& one, std::string const& other) {
@@ -28,12 +31,18 @@ std::string joined(std::string const& one, std::string const& other) {
 }
 
 std::string smaller(int size, int room, char const* word) {
-    return size > room ? Base::withMillimetres(size - room) + ' ' + word : std::string();
+    return size > room ? inTenths(size - room) + ' ' + word : std::string();
 }
 
 bool haveCommonPart(Box const& one, Box const& other) {
     return one.left < other.right && other.left < one.right && one.top < other.bottom &&
            other.top < one.bottom;
+}
+
+std::string inShortQuotes(std::string const& text) {
+    constexpr std::size_t SHOWN = 40;
+    std::string const start(Base::firstCharacters(text, SHOWN));
+    return Base::inQuotes(start + (start.size() < text.size() ? "..." : ""));
 }
 
 } // namespace
@@ -67,18 +76,31 @@ std::string placeInWords(Box const& box) {
            Base::inMillimetres(box.top) + " to " + Base::withMillimetres(box.bottom) + " down";
 }
 
-std::string textInWords(Reader::Page const& page, Box const& box) {
-    constexpr std::size_t SHOWN = 40;
+Reader::Page wordsOf(Reader::Page const& page, Box const& box) {
     Reader::Page part{page.number, page.width, page.height, {}, page.fonts};
     std::ranges::copy_if(page.words, std::back_inserter(part.words),
                          [&](Reader::Word const& word) { return haveCommonPart(word.box, box); });
+    return part;
+}
+
+std::vector<TextBlock> blocksIn(Reader::Page const& page) {
+    Reader::Layout const layout = Reader::layOut(page);
+    std::vector<TextBlock> blocks;
+    for (Reader::Block const& block : layout.blocks) {
+        std::string text;
+        for (std::size_t line = block.firstLine; line < block.endLine; ++line)
+            text += (text.empty() ? "" : " ") + Reader::textOf(page, layout.lines[line]);
+        blocks.push_back({block.box, inShortQuotes(text)});
+    }
+    return blocks;
+}
+
+std::string textInWords(Reader::Page const& page, Box const& box) {
+    Reader::Page const part = wordsOf(page, box);
     std::string text;
     for (Reader::Line const& line : Reader::layOut(part).lines)
         text += (text.empty() ? "" : " ") + Reader::textOf(part, line);
-    if (text.empty())
-        return "something";
-    std::string const start(Base::firstCharacters(text, SHOWN));
-    return Base::inQuotes(start + (start.size() < text.size() ? "..." : ""));
+    return text.empty() ? "something" : inShortQuotes(text);
 }
 
 } // namespace Production

@@ -5,6 +5,7 @@
 #include "programs/reader/page.h"
 
 #include <string>
+#include <vector>
 
 namespace Production {
 
@@ -28,6 +29,16 @@ std::string fixFor(Box const& box, Box const& room);
 
 /// "20 to 105 mm across and 45 to 90 mm down".
 std::string placeInWords(Box const& box);
+
+/// The page with only those of its words that have a part in the box.
+Reader::Page wordsOf(Reader::Page const& page, Box const& box);
+
+/// Text that stands together, in quotes and cut when it is long.
+struct TextBlock {
+    Box box;
+    std::string text;
+};
+std::vector<TextBlock> blocksIn(Reader::Page const& page);
 
 /// The words with a part in the box, in quotes and cut when they are many; "something" where there are none.
 std::string textInWords(Reader::Page const& page, Box const& box);

@@ -311,12 +311,39 @@ TEST(Windows, TakeWhatReachesIntoThemByTheToleranceAndNothingMore) {
     }
 }
 
-TEST(Windows, AreThoseOfTheFirstPage) {
+TEST(Windows, ShowOnlyTheFirstPage) {
     std::string const pdf =
         Reader::PdfMaker().page(box(MIDDLE), A4_PAGE).page(box({3000, 6000, 4000, 7000}), A4_PAGE).bytes();
-    EXPECT_THAT(findingsIn(pdf, printRules(R"({"window": {"left": 2000, "top": 4500, "right": 10500,
-                                               "bottom": 9000}})"_json)),
+    Production::PrintRules const rules =
+        printRules(R"({"window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000}})"_json);
+    EXPECT_THAT(findingsIn(pdf, rules, Production::PlacedAddress{"a\nb", 1, {{3000, 5000, 4000, 6000}}}),
                 IsEmpty());
+    Finding const found =
+        only(findingsIn(pdf, rules, Production::PlacedAddress{"a\nb", 2, {{3000, 6000, 4000, 7000}}}));
+    EXPECT_STREQ(nameOf(found.code), "address-outside-window");
+    EXPECT_EQ(found.says, "the address does not stand on the letter's first page, which the window shows");
+    EXPECT_EQ(found.fix, "move it to 20 to 105 mm across and 45 to 90 mm down of the first page");
+    EXPECT_THAT(found.pages, ElementsAre(2));
+}
+
+TEST(Windows, ShowEachBlockOfOtherTextAsAFindingOfItsOwn) {
+    auto const found = Addressed(text(2500, 7500, "Diagnosis") + text(7500, 7900, "CONFIDENTIAL") +
+                                 box({3000, 8200, 3500, 8500}))
+                           .findings({2000, 4500, 10500, 9000});
+    ASSERT_EQ(found.size(), 3U);
+    EXPECT_EQ(found[0].says, "\"Diagnosis\" shows through the window");
+    EXPECT_EQ(found[1].says, "\"CONFIDENTIAL\" shows through the window");
+    EXPECT_EQ(found[2].says, "something shows through the window");
+}
+
+TEST(Windows, MayHaveTheSendersLineFarAboveTheAddressAndNoOtherSmallPrint) {
+    std::string const line = text(2500, 4800, "Acme GmbH, Am Markt 1, 01067 Dresden", 6);
+    EXPECT_THAT(Addressed(line).findings({2000, 4000, 10500, 9000}), IsEmpty());
+    EXPECT_THAT(Addressed(line + box({2500, 4900, 7000, 4920})).findings({2000, 4000, 10500, 9000}),
+                IsEmpty());
+    EXPECT_EQ(
+        only(Addressed(line + text(2500, 4400, "HIV clinic", 6)).findings({2000, 4000, 10500, 9000})).says,
+        "\"HIV clinic\" shows through the window");
 }
 
 TEST(Deviations, AreForgivenInPlacesAndNotInAddressesAndSizes) {
@@ -450,7 +477,7 @@ TEST(UnusableRules, AreOneFindingOfTheLetterInOneLine) {
     EXPECT_TRUE(found.isError());
 }
 
-TEST(PostalAddresses, AreThoseOfSeveralLinesOrWithLettersAndNoAtSign) {
+TEST(PostalAddresses, AreThoseThatCountAndAreNoEMailAddressesAndNumbers) {
     auto const addressOf = [](std::vector<std::pair<int, std::string>> const& values) {
         Cfg::ExtractedFields fields;
         for (auto const& [priority, value] : values)
@@ -461,10 +488,10 @@ TEST(PostalAddresses, AreThoseOfSeveralLinesOrWithLettersAndNoAtSign) {
         auto const address = Production::postalAddressOf(fields, nullptr);
         return address ? address->text : std::string();
     };
-    EXPECT_EQ(addressOf({{2, "lena@example.org"}, {1, "Lena Brandt\n04109 Leipzig"}}),
-              "Lena Brandt\n04109 Leipzig");
-    EXPECT_EQ(addressOf({{3, "+49 341 4711"}, {1, "Lena Brandt"}}), "Lena Brandt");
-    EXPECT_EQ(addressOf({{2, "lena@example.org"}}), "");
+    EXPECT_EQ(addressOf({{1, "Lena Brandt\n04109 Leipzig"}}), "Lena Brandt\n04109 Leipzig");
+    EXPECT_EQ(addressOf({{1, "Lena Brandt"}}), "Lena Brandt");
+    EXPECT_EQ(addressOf({{2, "lena@example.org"}, {1, "Lena Brandt\n04109 Leipzig"}}), "");
+    EXPECT_EQ(addressOf({{3, "+49 341 4711"}, {1, "Lena Brandt"}}), "");
     EXPECT_EQ(addressOf({{0, "Lena Brandt\n04109 Leipzig"}}), "");
 }
 

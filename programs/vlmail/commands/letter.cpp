@@ -4,6 +4,7 @@
 #include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/explain_text.h"
 #include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/field_words.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -65,6 +66,8 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         out << "    missing, although obligatory: " << name << '\n';
     for (std::string const& warning : letter.warnings)
         out << "    look at " << warning << '\n';
+    for (Production::Finding const& finding : letter.findings)
+        out << linesFor(finding, 4);
 }
 
 void printLetters(std::ostream& out, DocumentReading const& reading) {
@@ -101,6 +104,7 @@ void explain(ReadResult& result, OpenDocument const& read) {
 /// What the options want to know beside the letters.
 Along alongFor(Options const& options) {
     Along along;
+    along.checks = Along::Checks::Yes;
     if (options.explain)
         along.beforeReading = [](ReadResult& result, Cfg::Presets const& presets) {
             result.reading.trace = explainPresets(presets, result.reading.document);

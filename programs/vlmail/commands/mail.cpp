@@ -61,9 +61,11 @@ struct Destination {
 
 /// What counts at the node, as the service tells it.
 NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
-    std::string const& name = Cfg::Presets::PART_NAME;
-    json::Object const presets = fetchSettings(service, nodeId, {name}).part(name).values;
-    return NodeSettings::resolved({{name.c_str(), presets}}, "the service, at " + nodeInWords(nodeId));
+    auto const settings = fetchSettings(service, nodeId, {Cfg::Presets::PART_NAME, Cfg::App::PART_NAME});
+    json::Object parts;
+    for (std::string const& part : {Cfg::Presets::PART_NAME, Cfg::App::PART_NAME})
+        parts.set(part.c_str(), settings.part(part).values);
+    return NodeSettings::resolved(parts, "the service, at " + nodeInWords(nodeId));
 }
 
 NodeSettings settingsFor(Options const& options, Destination const& destination) {
@@ -79,7 +81,10 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     Dispatch dispatch(presets, destination.begin, terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
-              {.pages = Along::Pages::Yes, .joins = options.joins(), .checkEvery = options.checkEvery},
+              {.pages = Along::Pages::Yes,
+               .joins = options.joins(),
+               .checks = Along::Checks::Yes,
+               .checkEvery = options.checkEvery},
               progress, [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -106,8 +111,8 @@ int makePlan(Options const& options, Terminal const& terminal) {
     Dispatch dispatch(presets, mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
-              {.digest = Along::Digest::Yes, .joins = options.joins()}, progress,
-              [&](std::size_t index, ReadResult result) {
+              {.digest = Along::Digest::Yes, .joins = options.joins(), .checks = Along::Checks::Yes},
+              progress, [&](std::size_t index, ReadResult result) {
                   plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
                   dispatch.take(std::move(result));
               });

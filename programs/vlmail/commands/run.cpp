@@ -14,6 +14,7 @@ namespace {
 
 void addCommands(Base::Command const& command, Task& task) {
     command.requireCommand();
+    addCheckCommand(command, task);
     addDiscoverCommand(command, task);
     addLetterCommand(command, task);
     addMailCommand(command, task);

@@ -87,4 +87,13 @@ Cfg::Presets NodeSettings::presets() const {
     }
 }
 
+Cfg::App NodeSettings::app() const {
+    try {
+        return {part(Cfg::App::PART_NAME), true, sorted_};
+    } catch (std::exception const& wrong) {
+        throw Base::Error("cannot use the part \"app\" in " + place_ + ": " + wrong.what() +
+                          "; correct it there");
+    }
+}
+
 } // namespace VlMail

@@ -1,6 +1,7 @@
 #pragma once
 // The settings that a command works with, from a JSON document on disk.
 
+#include "vlservice/cfg/app.h"
 #include "vlservice/json/json.h"
 #include "vlservice/presets/presets.h"
 
@@ -26,6 +27,8 @@ public:
     /// Completed by the global defaults, so that a pair of presets exists for every document's name.
     /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
     Cfg::Presets presets() const;
+    /// The part "app", completed by the global defaults. Throws Error when it cannot be understood.
+    Cfg::App app() const;
     /// The part's JSON as it stands in the document; the empty handle when it is not there.
     json::Value part(std::string const& name) const { return parts_.get(name); }
     /// Empty for settings that are not from a file.

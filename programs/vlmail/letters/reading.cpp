@@ -8,6 +8,7 @@
 #include "programs/mailing/page_blob.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
+#include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
@@ -33,6 +34,7 @@ constexpr char const* MISSING_KEY = "missing";
 constexpr char const* WARNINGS_KEY = "warnings";
 constexpr char const* DIFFERING_KEY = "differing_pages";
 constexpr char const* NOT_SEPARATED_KEY = "not_separated";
+constexpr char const* FINDINGS_KEY = "findings";
 constexpr char const* PAGE_KEY = "page";
 constexpr char const* SAYS_KEY = "says";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
@@ -75,6 +77,21 @@ std::vector<Reader::DoubtfulJoin> joinsIn(json::Value const& array) {
     return joins;
 }
 
+json::Array toJson(std::vector<Production::Finding> const& findings) {
+    json::Array array;
+    for (Production::Finding const& finding : findings)
+        array.append(finding.toJson());
+    return array;
+}
+
+std::vector<Production::Finding> findingsIn(json::Value const& array) {
+    std::vector<Production::Finding> findings;
+    if (array)
+        for (json::Value const& finding : array.toArray())
+            findings.push_back(Production::Finding::fromJson(finding.toObject()));
+    return findings;
+}
+
 json::Object toJson(LetterReading const& letter) {
     std::string message;
     bool const ready = letter.isProductionReady(message);
@@ -87,6 +104,8 @@ json::Object toJson(LetterReading const& letter) {
         object.set(DIFFERING_KEY, toJsonArray(letter.differingPages));
     if (!letter.doubtfulJoins.empty())
         object.set(NOT_SEPARATED_KEY, toJson(letter.doubtfulJoins));
+    if (!letter.findings.empty())
+        object.set(FINDINGS_KEY, toJson(letter.findings));
     setUnlessEmpty(object, MISSING_KEY, letter.missing);
     setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
     return object;
@@ -115,6 +134,7 @@ LetterReading letterFrom(json::Object const& object) {
     if (json::Value const differing = object.get(DIFFERING_KEY))
         letter.differingPages = numbersIn(differing);
     letter.doubtfulJoins = joinsIn(object.get(NOT_SEPARATED_KEY));
+    letter.findings = findingsIn(object.get(FINDINGS_KEY));
     return letter;
 }
 
@@ -215,9 +235,12 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
         return;
     requirePatterns(extractPreset, settings);
     Reader::Trace trace;
-    reading.letters = lettersOf(document, extractPreset, packPreset, along.afterReading ? &trace : nullptr);
+    bool const isTraced = along.afterReading || along.checks == Along::Checks::Yes;
+    reading.letters = lettersOf(document, extractPreset, packPreset, isTraced ? &trace : nullptr);
     if (along.joins == Along::Joins::Accept)
         acceptJoins(*reading.letters);
+    if (along.checks == Along::Checks::Yes)
+        checkLetters(*reading.letters, {document, extractPreset, trace, place}, packPreset, settings);
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, trace, place});
     if (along.pages == Along::Pages::Yes)
@@ -273,7 +296,7 @@ std::string LetterReading::whyNot() const {
         return joinsInWords(*this);
     std::string message;
     if (isProductionReady(message))
-        return {};
+        return errorsInWords(findings);
     if (message.empty())
         return "no address to go to";
     return message;

@@ -2,6 +2,7 @@
 // What reading a document by the presets has given, and its JSON form, in which worker processes hand it
 // over.
 
+#include "programs/production/finding.h"
 #include "programs/reader/letter_joins.h"
 #include "vlservice/extract/extracted_fields.h"
 #include "vlservice/pack/shared_mem_buffer.h"
@@ -44,6 +45,8 @@ struct LetterReading {
     std::vector<int> differingPages = {};
     /// Those of its pages that may begin another letter. They keep it from going out.
     std::vector<Reader::DoubtfulJoin> doubtfulJoins = {};
+    /// What would go wrong with it on paper, when that was asked for. Errors keep it from going out.
+    std::vector<Production::Finding> findings = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -70,7 +73,8 @@ struct DocumentReading {
 
     /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
     /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and where there are
-    /// any "missing", the names of obligatory fields, "warnings", "differing_pages" and "not_separated".
+    /// any "missing", the names of obligatory fields, "warnings", "differing_pages", "not_separated" and
+    /// "findings".
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);
@@ -103,10 +107,13 @@ struct Along {
     enum class Digest : bool { No, Yes };
     /// Whether pages that may begin another letter keep theirs from going out, or are only told of.
     enum class Joins : bool { Doubt, Accept };
+    /// Whether it is looked what would go wrong with the letters on paper, for which every page is drawn.
+    enum class Checks : bool { No, Yes };
 
     Pages pages = Pages::No;
     Digest digest = Digest::No;
     Joins joins = Joins::Doubt;
+    Checks checks = Checks::No;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
     std::size_t checkEvery = 1;
     /// Called with the document's name alone, before it is opened.
