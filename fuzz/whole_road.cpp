@@ -101,7 +101,8 @@ void mail(VlMail::ReadResult result, Cfg::Presets const& presets, fs::path const
     std::ostringstream text;
     Base::PlainStream out(text);
     VlMail::Terminal const terminal{out, out};
-    VlMail::Dispatch dispatch(presets, VlMail::mailingsIntoFolder(folder), terminal);
+    VlMail::MakingReady const making;
+    VlMail::Dispatch dispatch(presets, making, VlMail::mailingsIntoFolder(folder), terminal);
     dispatch.take(std::move(result));
     dispatch.finish();
     dispatch.print();

@@ -11,24 +11,45 @@
 
 namespace Mailing {
 
-/// Pages of one document that belong to a letter.
+/// Pages of one document that belong to a letter. In a mailing that is made ready they begin on a front side
+/// where sheets are printed on both.
 struct DocumentPages {
+    enum class Role {
+        Letter,
+        Attachment,
+        Blank, ///< the other side of the sheet in front of it
+    };
+
     /// As the container names the document.
     std::string document;
     /// From 1, in the order in which they go out.
     std::vector<int> pages;
+    Role role = Role::Letter;
 };
 
 /// One letter, or several that go out as one because they are addressed alike.
 struct MailedLetter {
     std::vector<DocumentPages> documents;
     Cfg::ExtractedFields fields;
+    /// Of paper, where the mailing is made ready.
+    long long sheets = 0;
+    /// Of the pages that are printed in colour, where the mailing is made ready.
+    long long colouredPages = 0;
+};
+
+/// A letterhead or an attachment that is on or among the pages.
+struct UsedDocument {
+    /// As the pack preset has it.
+    std::string id;
+    /// Of the document, 64 hexadecimal digits.
+    std::string sha256;
 };
 
 inline constexpr char const* PURCHASE_ORDER_KEY = "purchase_order";
 
 /// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
-/// its keys "id", "created", "letters", "entries_digest" and "purchase_order".
+/// its keys "id", "created", "letters", "made_ready", "used_documents", "entries_digest" and
+/// "purchase_order".
 struct Metadata {
     std::string id;
     /// Seconds since the epoch, UTC.
@@ -39,6 +60,10 @@ struct Metadata {
     std::string entriesDigest = {};
     /// That the mailing goes by; empty when there is none.
     std::string purchaseOrder = {};
+    /// The pages are the sides that are printed, with all that lies on them, and blank ones among them:
+    /// nobody lays a letterhead on them or adds an attachment. Older mailings are not.
+    bool madeReady = false;
+    std::vector<UsedDocument> usedDocuments = {};
 
     json::Object toJson() const;
     /// Throws std::exception when a key has not the form above.

@@ -2,6 +2,7 @@
 // What a letter is made of on paper: parts in their order, the letterheads on their pages, blank sides and
 // sheets. Decided without looking at any page.
 
+#include "programs/reader/page.h"
 #include "vlservice/presets/letterhead_inf.h"
 #include "vlservice/presets/pack_preset.h"
 
@@ -69,15 +70,7 @@ bool endsWithBlank(int pages, Sides sides);
 /// `pageCounts` are those of a letter's parts, without blank sides.
 long long sheetsOf(std::vector<int> const& pageCounts, Sides sides);
 
-/// In 1/100 mm, as shown.
-struct PageSize {
-    int width = 0;
-    int height = 0;
-
-    PageSize turned() const { return {height, width}; }
-
-    friend bool operator==(PageSize const&, PageSize const&) = default;
-};
+using Reader::PageSize;
 
 /// Within 2 mm in both directions.
 bool areAlike(PageSize one, PageSize other);

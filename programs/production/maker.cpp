@@ -13,23 +13,31 @@ std::string inWords(PageSize page) {
     return Base::inMillimetres(page.width) + " x " + Base::withMillimetres(page.height);
 }
 
+PreparedDocument const& unknownDocument() {
+    static PreparedDocument const unknown{
+        DOCUMENT_UNKNOWN + std::string("a letterhead of the pack preset is not at hand; name its folder")};
+    return unknown;
+}
+
 PageSize afterTurns(PageSize page, int quarterTurns) { return quarterTurns % 2 == 0 ? page : page.turned(); }
 
 } // namespace
 
 Maker::Maker(Cfg::PackPreset const& preset, PreparedDocuments const& documents)
     : letterheads_(preset.letterheads()), orientation_(preset.orientationForced()),
-      mayGroup_(!preset.noGroup()), documents_(documents) {
-    for (Cfg::LetterheadInf const& letterhead : letterheads_)
-        pageCounts_.push_back(static_cast<int>(documents_.at(letterhead.id).pages.size()));
+      mayGroup_(!preset.noGroup()) {
+    for (Cfg::LetterheadInf const& letterhead : letterheads_) {
+        auto const found = documents.find(letterhead.id);
+        documents_.push_back(found == documents.end() ? &unknownDocument() : &found->second);
+        pageCounts_.push_back(static_cast<int>(documents_.back()->pages.size()));
+    }
 }
 
 std::string Maker::whyNot(Part const& part, std::vector<PageSize> const& pages,
                           std::string const& name) const {
-    for (Cfg::LetterheadInf const& letterhead : letterheads_)
-        if (std::string const& error = documents_.at(letterhead.id).error;
-            appliesTo(part, letterhead) && !error.empty())
-            return error;
+    for (std::size_t i = 0; i < letterheads_.size(); ++i)
+        if (appliesTo(part, letterheads_[i]) && !documents_[i]->error.empty())
+            return documents_[i]->error;
     for (std::size_t i = 0; i < pages.size(); ++i) {
         int const number = static_cast<int>(i) + 1;
         Layers const layers = layersOf(number, part);
@@ -53,17 +61,22 @@ std::string Maker::whyNotOn(PageSize page, Layer const& layer, std::string const
            ' ' + inWords(printed) + "; give both the same size, nothing is scaled";
 }
 
-PreparedPage Maker::make(PreparedPage page, Part const& part, int number) {
+PreparedPage Maker::plan(PreparedPage page, Part const& part, int number) const {
     Layers const layers = layersOf(number, part);
-    int const turns = quarterTurnsFor(orientation_, page.size);
-    page.size = afterTurns(page.size, turns);
-    PageChange const change{laid(layers.under, page.size), laid(layers.over, page.size), turns};
-    if (change.empty())
-        return page;
-    page.pdf = changedPage(page.pdf, change, "page " + std::to_string(number));
     auto const isColoured = [&](Layer const& layer) { return pageOf(layer).isColoured; };
     page.isColoured = page.isColoured || std::any_of(layers.under.begin(), layers.under.end(), isColoured) ||
                       std::any_of(layers.over.begin(), layers.over.end(), isColoured);
+    page.size = afterTurns(page.size, quarterTurnsFor(orientation_, page.size));
+    return page;
+}
+
+PreparedPage Maker::make(PreparedPage page, Part const& part, int number) {
+    Layers const layers = layersOf(number, part);
+    int const turns = quarterTurnsFor(orientation_, page.size);
+    page = plan(std::move(page), part, number);
+    PageChange const change{laid(layers.under, page.size), laid(layers.over, page.size), turns};
+    if (!change.empty())
+        page.pdf = changedPage(page.pdf, change, "page " + std::to_string(number));
     return page;
 }
 
@@ -79,8 +92,7 @@ Layers Maker::layersOf(int number, Part const& part) const {
 }
 
 PreparedPage const& Maker::pageOf(Layer const& layer) const {
-    return documents_.at(letterheads_[layer.letterhead].id)
-        .pages.at(static_cast<std::size_t>(layer.page - 1));
+    return documents_[layer.letterhead]->pages.at(static_cast<std::size_t>(layer.page - 1));
 }
 
 std::vector<PageChange::Laid> Maker::laid(std::vector<Layer> const& layers, PageSize turnedPage) {

@@ -15,7 +15,7 @@ namespace Production {
 /// Belongs to one thread. Letterheads are parsed when they are first laid on a page.
 class Maker {
 public:
-    /// `documents` has each of the preset's letterheads, and outlives the maker.
+    /// `documents` outlives the maker; a letterhead that is not among them is unknown.
     Maker(Cfg::PackPreset const& preset, PreparedDocuments const& documents);
 
     /// Why the pages of a part cannot be made ready: a code and one line; empty when they can. `name` is that
@@ -23,6 +23,8 @@ public:
     std::string whyNot(Part const& part, std::vector<PageSize> const& pages, std::string const& name) const;
     /// Page `number`, from 1, of a part for which whyNot() is empty. Throws Error.
     PreparedPage make(PreparedPage page, Part const& part, int number);
+    /// The same, but for the PDF.
+    PreparedPage plan(PreparedPage page, Part const& part, int number) const;
     /// Whether a letter's pages are others where it is not the first of those that go out as one.
     bool tellsFirstLetters() const;
 
@@ -36,7 +38,8 @@ private:
     std::vector<Cfg::LetterheadInf> letterheads_;
     PackForcedOrientation orientation_;
     bool mayGroup_;
-    PreparedDocuments const& documents_;
+    /// Of the letterheads, one each.
+    std::vector<PreparedDocument const*> documents_;
     std::vector<int> pageCounts_;
     /// By document and page.
     std::map<std::pair<std::string, int>, LaidPage> parsed_;

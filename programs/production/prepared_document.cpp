@@ -7,6 +7,7 @@
 #include "programs/production/colour.h"
 #include "programs/reader/document.h"
 
+#include <algorithm>
 #include <new>
 #include <optional>
 #include <utility>
@@ -20,15 +21,13 @@ public:
     using Base::Error::Error;
 };
 
-void requireSize(bool fits, std::string const& where, std::string const& what) {
-    if (!fits)
-        throw Unusable(DOCUMENT_SIZE + where + ": has more than " + what +
-                       "; leave out what is not to be printed");
+std::string hasMoreThan(std::filesystem::path const& name, std::string const& what) {
+    return DOCUMENT_SIZE + Base::validUtf8(name.string()) + ": has more than " + what +
+           "; leave out what is not to be printed";
 }
 
 PreparedPage prepared(Reader::Document& document, int number, std::string const& where) {
-    Reader::Page const& page = document.page(number);
-    PreparedPage made{document.singlePagePdf(number), {page.width, page.height}};
+    PreparedPage made{document.singlePagePdf(number), document.pageSize(number)};
     if (!document.showsTheSame(number, made.pdf))
         throw Base::Error(where + ": page " + std::to_string(number) +
                           " would look different when it stands alone; print the document to a new PDF");
@@ -39,10 +38,11 @@ PreparedPage prepared(Reader::Document& document, int number, std::string const&
 
 std::vector<PreparedPage> pagesOf(std::string bytes, std::filesystem::path const& name) {
     std::string const where = name.string();
-    requireSize(bytes.size() <= MAX_DOCUMENT_BYTES, where, std::to_string(MAX_DOCUMENT_BYTES >> 20) + " MiB");
+    if (bytes.size() > MAX_DOCUMENT_BYTES)
+        throw Unusable(whyTooLarge(name));
     Reader::Document document = Reader::openDocument(std::move(bytes), name);
-    requireSize(document.pageCount() <= MAX_DOCUMENT_PAGES, where,
-                std::to_string(MAX_DOCUMENT_PAGES) + " pages");
+    if (document.pageCount() > MAX_DOCUMENT_PAGES)
+        throw Unusable(hasMoreThan(name, std::to_string(MAX_DOCUMENT_PAGES) + " pages"));
     std::vector<PreparedPage> pages;
     for (int number = 1; number <= document.pageCount(); ++number)
         pages.push_back(prepared(document, number, where));
@@ -53,6 +53,20 @@ std::vector<PreparedPage> pagesOf(std::string bytes, std::filesystem::path const
 
 bool isDocumentId(std::string const& id) { return Base::safeFileName(id) == id; }
 
+std::string whyTooLarge(std::filesystem::path const& name) {
+    return hasMoreThan(name, std::to_string(MAX_DOCUMENT_BYTES >> 20) + " MiB");
+}
+
+Finding findingOf(std::string const& line) {
+    Code const code = line.starts_with(DOCUMENT_SIZE)      ? Code::DocumentSize
+                      : line.starts_with(DOCUMENT_UNKNOWN) ? Code::DocumentUnknown
+                                                           : Code::DocumentDamaged;
+    std::size_t const behindCode = line.find(": ") + 2;
+    std::size_t const semicolon = std::min(line.rfind("; "), line.size());
+    std::string const fix = semicolon < line.size() ? line.substr(semicolon + 2) : std::string();
+    return {code, Severity::Error, {}, {}, line.substr(behindCode, semicolon - behindCode), fix};
+}
+
 PreparedDocument prepare(std::string bytes, std::filesystem::path const& name) {
     PreparedDocument document;
     try {
@@ -61,7 +75,7 @@ PreparedDocument prepare(std::string bytes, std::filesystem::path const& name) {
     } catch (std::bad_alloc const&) {
         throw;
     } catch (Unusable const& failure) {
-        document.error = Base::validUtf8(failure.what());
+        document.error = failure.what();
     } catch (std::exception const& failure) {
         document.error = DOCUMENT_DAMAGED + Base::validUtf8(failure.what());
     }

@@ -1,6 +1,7 @@
 #pragma once
 // Letterheads and attachments: documents that a pack preset names by an id, as pages that stand alone.
 
+#include "programs/production/finding.h"
 #include "programs/production/letter_parts.h"
 
 #include <cstddef>
@@ -39,6 +40,14 @@ using PreparedDocuments = std::map<std::string, PreparedDocument>;
 
 /// Whether an id can name a document: it has to be a safe file name.
 bool isDocumentId(std::string const& id);
+
+/// Why a file of more than MAX_DOCUMENT_BYTES cannot be used, for those who look at its size before reading
+/// it.
+std::string whyTooLarge(std::filesystem::path const& name);
+
+/// What stands behind a code and in front of the last semicolon of such a line is what is wrong, the rest
+/// what to do.
+Finding findingOf(std::string const& line);
 
 /// Takes a document apart; `name` stands for it in messages and tells its kind by its ending. What is wrong
 /// with it is the result's error; nothing derived from std::exception is thrown but std::bad_alloc.

@@ -50,6 +50,8 @@ struct LetterBatch::Keys {
         Asked{"colour", &LetterBatch::colour, FlagForm{}},
         Asked{"duplex", &LetterBatch::duplex, FlagForm{}},
         Asked{"priority", &LetterBatch::priority, FlagForm{}},
+        Asked{"paper_sheets", &LetterBatch::paperSheets, IntegerForm{0, MAX_PAGES}},
+        Asked{"coloured_pages", &LetterBatch::colouredPages, IntegerForm{0, MAX_PAGES}},
     };
 };
 
@@ -78,6 +80,12 @@ Tariff::Tariff(json::Object const& object) {
 LetterBatch::LetterBatch(json::Object const& object) {
     requireKnownKeys<LetterBatch>(object, " have no key ");
     json::readKeys(Keys::TABLE, object, *this);
+    if (paperSheets > 0 && (paperSheets > pages || paperSheets < fewestSheets()))
+        throw Base::Error("\"paper_sheets\" of the letters have to be " + std::to_string(fewestSheets()) +
+                          " to " + std::to_string(pages));
+    if (colouredPages > pages)
+        throw Base::Error("\"coloured_pages\" of the letters have to be " + std::to_string(pages) +
+                          " at most");
 }
 
 json::Object LetterBatch::serialize() const { return writeRecord(*this); }

@@ -41,23 +41,33 @@ struct LetterBatch {
     static constexpr long long MAX_PAGES = 10'000;
 
     long long count = 1;
-    /// Of one letter.
+    /// Of one letter, without blank sides.
     long long pages = 1;
     bool colour = false;
     bool duplex = false;
     bool priority = false;
+    /// Of one letter; 0 where its parts are not known: then the pages lie on as few sheets as they can.
+    long long paperSheets = 0;
+    /// Of one letter that is not in colour throughout.
+    long long colouredPages = 0;
 
     LetterBatch() = default;
-    /// Throws Error on an unknown key, a wrong type, and counts below 1 or beyond their bounds.
+    /// Throws Error on an unknown key, a wrong type, counts below 1 or beyond their bounds, more sheets or
+    /// coloured pages than pages, and sheets that could not hold the pages.
     explicit LetterBatch(json::Object const& object);
     json::Object serialize() const;
 
-    /// Sheets of one letter: a sheet has two pages with duplex.
-    long long sheets() const { return duplex ? (pages + 1) / 2 : pages; }
+    /// Sheets of one letter: a sheet has two pages with duplex, or one where a part ends.
+    long long sheets() const { return paperSheets > 0 ? paperSheets : fewestSheets(); }
     /// Sheets of one letter that have something on both sides.
-    long long duplexSheets() const { return duplex ? pages / 2 : 0; }
+    long long duplexSheets() const { return duplex ? pages - sheets() : 0; }
+    /// Pages of one letter that are printed in colour.
+    long long pagesInColour() const { return colour ? pages : colouredPages; }
 
     struct Keys;
+
+private:
+    long long fewestSheets() const { return duplex ? (pages + 1) / 2 : pages; }
 };
 
 struct PriceRequest {

@@ -47,6 +47,11 @@ Page const& Document::page(int number) {
     return page->second;
 }
 
+PageSize Document::pageSize(int number) {
+    checkNumber(number);
+    return source_->pageSize(number);
+}
+
 std::string Document::singlePagePdf(int number) {
     checkNumber(number);
     return source_->singlePagePdf(number);

@@ -37,6 +37,8 @@ public:
     /// Pages count from 1 in all calls. They throw Error when the page is damaged and std::out_of_range when
     /// there is none of that number.
     Page const& page(int number);
+    /// That of page(), without reading what is on it.
+    PageSize pageSize(int number);
     /// A PDF of this page alone. The same page gives the same bytes.
     std::string singlePagePdf(int number);
     /// Whether a PDF of one page shows the words and the overview of this page. Both are drawn

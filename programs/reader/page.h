@@ -28,6 +28,16 @@ struct Font {
     double blank = 0;
 };
 
+/// In 1/100 mm, as shown.
+struct PageSize {
+    int width = 0;
+    int height = 0;
+
+    PageSize turned() const { return {height, width}; }
+
+    friend bool operator==(PageSize const&, PageSize const&) = default;
+};
+
 struct Page {
     /// From 1.
     int number = 0;
@@ -39,6 +49,8 @@ struct Page {
     std::vector<Font> fonts;
     /// Words stand from left to right in the order in which they are read, whatever their script.
     bool isTyped = false;
+
+    PageSize size() const { return {width, height}; }
 };
 
 } // namespace Reader

@@ -20,6 +20,8 @@ public:
 
     virtual int pageCount() const = 0;
     virtual Page readPage(int number) = 0;
+    /// That of readPage(), without reading the page.
+    virtual PageSize pageSize(int number) = 0;
     virtual std::string singlePagePdf(int number) = 0;
     virtual std::string renderPage(int number, double dotsPerInch) = 0;
     /// Whether a PDF of one page is certain to show what the page shows, as its parts tell without drawing.

@@ -191,12 +191,9 @@ public:
         std::unique_ptr<poppler::page> const source = popplerPage(number);
         Page page;
         page.number = number;
-        poppler::rectf const sheet = source->page_rect();
-        page.width = toHundredths(std::abs(sheet.width()));
-        page.height = toHundredths(std::abs(sheet.height()));
-        poppler::page::orientation_enum const orientation = source->orientation();
-        if (orientation == poppler::page::landscape || orientation == poppler::page::seascape)
-            std::swap(page.width, page.height);
+        PageSize const size = sizeOf(*source);
+        page.width = size.width;
+        page.height = size.height;
 
         FontNumbers fonts(page.fonts);
         Box const visible{0, 0, page.width, page.height};
@@ -205,6 +202,8 @@ public:
                 page.words.push_back(std::move(*word));
         return page;
     }
+
+    PageSize pageSize(int number) override { return sizeOf(*popplerPage(number)); }
 
     std::string singlePagePdf(int number) override {
         popplerPage(number); // It throws for a page that was not read either.
@@ -274,6 +273,15 @@ private:
                                                                   annotation.right - annotation.left,
                                                                   annotation.bottom - annotation.top))});
         return lost;
+    }
+
+    static PageSize sizeOf(poppler::page const& page) {
+        poppler::rectf const sheet = page.page_rect();
+        PageSize const size{toHundredths(std::abs(sheet.width())), toHundredths(std::abs(sheet.height()))};
+        poppler::page::orientation_enum const orientation = page.orientation();
+        bool const liesAcross =
+            orientation == poppler::page::landscape || orientation == poppler::page::seascape;
+        return liesAcross ? size.turned() : size;
     }
 
     poppler::image draw(int number, double dotsPerInch) const {

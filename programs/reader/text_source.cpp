@@ -152,6 +152,7 @@ public:
 
     int pageCount() const override { return static_cast<int>(pages_.size()); }
     Page readPage(int number) override { return page(number); }
+    PageSize pageSize(int number) override { return page(number).size(); }
     std::string singlePagePdf(int number) override { return pdfOfTypedPage(page(number), where_); }
     bool hasSameObjects(int, std::string_view) override { return false; }
 

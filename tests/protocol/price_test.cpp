@@ -28,6 +28,14 @@ TEST(PriceRequestReading, RefusesWhatItDoesNotKnow) {
          R"("pages" of the letters has to be an integer from 1 to 10000)"},
         {R"({"letters":[{"count":1000001}]})",
          R"("count" of the letters has to be an integer from 1 to 1000000)"},
+        {R"({"letters":[{"pages":4,"paper_sheets":3}]})",
+         R"("paper_sheets" of the letters have to be 4 to 4)"},
+        {R"({"letters":[{"pages":5,"duplex":true,"paper_sheets":2}]})",
+         R"("paper_sheets" of the letters have to be 3 to 5)"},
+        {R"({"letters":[{"pages":5,"duplex":true,"paper_sheets":6}]})",
+         R"("paper_sheets" of the letters have to be 3 to 5)"},
+        {R"({"letters":[{"pages":5,"coloured_pages":6}]})",
+         R"("coloured_pages" of the letters have to be 5 at most)"},
         {R"({"letters":[{"colour":1}]})", R"("colour" of the letters has to be true or false)"},
     };
     for (auto const& [request, message] : cases)
@@ -65,6 +73,9 @@ TEST(PriceRequestWriting, IsReadAsItWasWritten) {
     LetterBatch batch;
     batch.pages = 7;
     batch.colour = true;
+    batch.duplex = true;
+    batch.paperSheets = 5;
+    batch.colouredPages = 2;
     PriceRequest const read(PriceRequest({batch}).serialize());
     ASSERT_EQ(read.letters.size(), 1u);
     EXPECT_EQ(print(read.letters.front().serialize()), print(batch.serialize()));

@@ -47,6 +47,9 @@ struct WorkerOptions {
     }
 };
 
+constexpr char const* DOCUMENTS_HELP =
+    "The folder with the letterheads and attachments that pack presets name";
+
 inline void addLimitOptions(Base::Command const& command, WorkerOptions& options) {
     command.addCount("--document-seconds", options.seconds, "Processor time that a document may take")
         .showDefault();

@@ -3,6 +3,7 @@
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/checking.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "vlservice/json/json_text.h"
@@ -16,6 +17,7 @@ namespace {
 struct Options {
     std::vector<std::string> files;
     std::string settings;
+    std::string documents;
     bool json = false;
     WorkerOptions reading;
 };
@@ -63,7 +65,10 @@ int checkDocuments(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Outcome outcome;
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.reading.workers(), {.checks = Along::Checks::Yes}, progress,
+    MakingReady making(MakingReady::Colours::Ignored);
+    making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
+    readBatch(options.files, settings, options.reading.workers(),
+              {.checks = Along::Checks::Yes, .making = &making}, progress,
               [&](std::size_t, ReadResult const& result) {
                   outcome.count(result.reading);
                   if (options.json)
@@ -86,6 +91,7 @@ void addCheckCommand(Base::Command const& app, Task& task) {
         app.addCommand("check", "Says what would go wrong with the letters in documents on paper");
     check.addOption("FILE", options->files, "PDF or text documents").required();
     check.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    check.addOption("--documents", options->documents, DOCUMENTS_HELP);
     check.addFlag("--json", options->json,
                   "One JSON object a document, each on a line, with the \"findings\" of each letter");
     addWorkerOptions(check, options->reading);

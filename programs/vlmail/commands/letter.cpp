@@ -6,6 +6,7 @@
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/field_words.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/report/describe.h"
@@ -24,6 +25,7 @@ namespace {
 struct Options {
     std::vector<std::string> files;
     std::string settings;
+    std::string documents;
     std::string report;
     bool json = false;
     bool explain = false;
@@ -126,8 +128,12 @@ int showLetters(Options const& options, Terminal const& terminal) {
     std::optional<Report::File> report;
     if (!options.report.empty())
         report.emplace(options.report);
+    MakingReady making(MakingReady::Colours::Ignored);
+    making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
+    Along along = alongFor(options);
+    along.making = &making;
     BatchProgress progress(terminal);
-    readBatch(options.files, settings, options.reading.workers(), alongFor(options), progress,
+    readBatch(options.files, settings, options.reading.workers(), along, progress,
               [&](std::size_t, ReadResult result) {
                   DocumentReading const& reading = result.reading;
                   outcome.count(reading);
@@ -155,6 +161,7 @@ void addLetterCommand(Base::Command const& app, Task& task) {
         "letter", "Shows the letters in documents: presets, fields, and whether they can go out");
     letter.addOption("FILE", options->files, "PDF or text documents").required();
     letter.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    letter.addOption("--documents", options->documents, DOCUMENTS_HELP);
     letter.addFlag("--json", options->json, "One JSON object a document, each on a line");
     letter.addFlag("--explain", options->explain,
                    "Tells how each field came about, and why one was not found; with --json as \"trace\"");

@@ -6,6 +6,7 @@
 #include "programs/vlmail/commands/service_options.h"
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/mailings/dispatch.h"
 #include "programs/vlmail/mailings/plan.h"
@@ -23,6 +24,7 @@ namespace {
 struct Options {
     std::vector<std::string> files;
     std::string settings;
+    std::string documents;
     std::string plan;
     std::string output;
     bool send = false;
@@ -74,17 +76,26 @@ NodeSettings settingsFor(Options const& options, Destination const& destination)
                : NodeSettings::fromFileIfNamed(options.settings);
 }
 
+/// Prepares what the documents' pack presets name.
+MakingReady makingFor(Options const& options, Cfg::Presets const& presets, MakingReady::Colours colours) {
+    MakingReady making(colours);
+    making.prepareFor(options.files, presets, options.documents, options.reading.workers());
+    return making;
+}
+
 int mailDocuments(Options const& options, Terminal const& terminal) {
     Destination const destination(options, terminal);
     NodeSettings const settings = settingsFor(options, destination);
     Cfg::Presets const presets = settings.presets();
-    Dispatch dispatch(presets, destination.begin, terminal);
+    MakingReady making = makingFor(options, presets, MakingReady::Colours::Counted);
+    Dispatch dispatch(presets, making, destination.begin, terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
               {.pages = Along::Pages::Yes,
                .joins = options.joins(),
                .checks = Along::Checks::Yes,
-               .checkEvery = options.checkEvery},
+               .checkEvery = options.checkEvery,
+               .making = &making},
               progress, [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -96,9 +107,11 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     Destination const destination(options, terminal);
     NodeSettings const settings = plan.settings();
     Cfg::Presets const presets = settings.presets();
-    Dispatch dispatch(presets, destination.begin, terminal);
+    MakingReady making;
+    plan.prepare(making, presets, options.reading.workers());
+    Dispatch dispatch(presets, making, destination.begin, terminal);
     BatchProgress progress(terminal);
-    splitBatch(plan.documents(), options.reading.workers(), options.checkEvery, progress,
+    splitBatch(plan.documents(), presets, options.reading.workers(), options.checkEvery, making, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
     return report(dispatch, options, terminal);
@@ -107,11 +120,17 @@ int mailPlan(Options const& options, Terminal const& terminal) {
 int makePlan(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
     Cfg::Presets const presets = settings.presets();
-    Plan plan(settings);
-    Dispatch dispatch(presets, mailingsNowhere(), terminal);
+    MakingReady making = makingFor(
+        options, presets, options.price ? MakingReady::Colours::Counted : MakingReady::Colours::Ignored);
+    Plan plan(settings, making.usedDocuments());
+    Dispatch dispatch(presets, making, mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
-              {.digest = Along::Digest::Yes, .joins = options.joins(), .checks = Along::Checks::Yes},
+              {.pages = Along::Pages::Planned,
+               .digest = Along::Digest::Yes,
+               .joins = options.joins(),
+               .checks = Along::Checks::Yes,
+               .making = &making},
               progress, [&](std::size_t index, ReadResult result) {
                   plan.add({std::filesystem::absolute(options.files[index]), result.sha256, result.reading});
                   dispatch.take(std::move(result));
@@ -128,6 +147,10 @@ void addBatchOptions(Base::Command const& command, Options& options) {
     addWorkerOptions(command, options.reading);
 }
 
+auto addDocuments(Base::Command const& command, Options& options) {
+    return command.addOption("--documents", options.documents, DOCUMENTS_HELP);
+}
+
 auto addAcceptJoined(Base::Command const& command, Options& options) {
     return command.addFlag("--accept-joined", options.acceptJoined,
                            "Takes pages for one letter that look like letters of their own");
@@ -142,10 +165,12 @@ void addMailCommand(Base::Command const& app, Task& task) {
     auto const files = mail.addOption("FILE", options->files, "PDF or text documents");
     auto const settings =
         mail.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    auto const documents = addDocuments(mail, *options);
     auto const acceptJoined = addAcceptJoined(mail, *options);
     mail.addOption("--plan", options->plan, "Carries out what vlmail plan has decided")
         .excludes(files)
         .excludes(settings)
+        .excludes(documents)
         .excludes(acceptJoined);
     auto const output =
         mail.addOption("-o,--output", options->output, "The folder for the mailing files; made when missing");
@@ -177,6 +202,7 @@ void addPlanCommand(Base::Command const& app, Task& task) {
     plan.addOption("FILE", options->files, "PDF or text documents").required();
     plan.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
     plan.addOption("-o,--output", options->output, "The file for the plan").required();
+    addDocuments(plan, *options);
     addAcceptJoined(plan, *options);
     plan.addFlag("--price", options->price, "Asks the service what the mailings would cost");
     addServiceOptions(plan, options->service);

@@ -63,7 +63,10 @@ std::vector<Protocol::LetterBatch> lettersIn(Options const& options) {
     }
     for (Protocol::LetterBatch& batch : batches) {
         batch.colour |= options.colour;
-        batch.duplex |= options.duplex;
+        if (options.duplex && !batch.duplex) {
+            batch.duplex = true;
+            batch.paperSheets = 0;
+        }
         batch.priority |= options.priority;
     }
     return batches;

@@ -7,71 +7,21 @@
 #include "programs/vlmail/letters/worker_pool.h"
 #include "vlservice/json/json_text.h"
 
-#include <cstdint>
-#include <cstring>
 #include <filesystem>
 #include <sstream>
+#include <string_view>
 #include <utility>
 
 namespace VlMail {
 namespace {
 
-/// What a worker hands over: numbers in the machine's order and byte strings behind their lengths.
-class Message {
-public:
-    Message() = default;
-    explicit Message(std::string bytes) : bytes_(std::move(bytes)) {}
-
-    void put(std::uint64_t number) { bytes_.append(reinterpret_cast<char const*>(&number), sizeof number); }
-    void put(void const* data, std::size_t size) {
-        put(size);
-        bytes_.append(static_cast<char const*>(data), size);
-    }
-    std::uint64_t number() {
-        std::uint64_t number = 0;
-        std::memcpy(&number, bytes_.data() + at_, sizeof number);
-        at_ += sizeof number;
-        return number;
-    }
-    /// The next byte string, valid as long as the message.
-    std::pair<char const*, std::size_t> bytes() {
-        std::size_t const size = number();
-        at_ += size;
-        return {bytes_.data() + at_ - size, size};
-    }
-    std::string take() { return std::move(bytes_); }
-
-private:
-    std::string bytes_;
-    std::size_t at_ = 0;
-};
-
-void put(Message& message, std::vector<PageBlob> const& blobs) {
-    message.put(blobs.size());
-    for (PageBlob const& blob : blobs) {
-        message.put(static_cast<std::uint64_t>(blob.number));
-        message.put(blob.data.data(), blob.data.size());
-    }
-}
-
-std::vector<PageBlob> takeBlobs(Message& message) {
-    std::vector<PageBlob> blobs(message.number());
-    for (PageBlob& blob : blobs) {
-        blob.number = static_cast<int>(message.number());
-        auto const [data, size] = message.bytes();
-        blob.data = SharedMemBuffer::copyOf(data, size);
-    }
-    return blobs;
-}
-
 std::string pack(ReadResult const& result) {
-    Message message;
+    WorkerMessage message;
     std::ostringstream text;
     text << result.reading.toJson();
-    std::string const json = std::move(text).str();
-    message.put(json.data(), json.size());
-    message.put(result.sha256.data(), result.sha256.size());
-    message.put(result.report.data(), result.report.size());
+    message.put(std::move(text).str());
+    message.put(result.sha256);
+    message.put(result.report);
     if (result.reading.letters)
         for (LetterReading const& letter : *result.reading.letters)
             put(message, letter.blobs);
@@ -79,13 +29,11 @@ std::string pack(ReadResult const& result) {
 }
 
 ReadResult unpack(std::string bytes) {
-    Message message(std::move(bytes));
-    auto const [json, length] = message.bytes();
-    ReadResult result{DocumentReading::fromJson(json::strToObject(json, length))};
-    auto const [digest, digestLength] = message.bytes();
-    result.sha256.assign(digest, digestLength);
-    auto const [report, reportLength] = message.bytes();
-    result.report.assign(report, reportLength);
+    WorkerMessage message(std::move(bytes));
+    std::string_view const json = message.bytes();
+    ReadResult result{DocumentReading::fromJson(json::strToObject(json.data(), json.size()))};
+    result.sha256 = message.text();
+    result.report = message.text();
     if (result.reading.letters)
         for (LetterReading& letter : *result.reading.letters)
             letter.blobs = takeBlobs(message);
@@ -150,11 +98,12 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
         [&](std::size_t index) { return files[index]; }, take);
 }
 
-void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, std::size_t checkEvery,
-                BatchWatcher& watcher, std::function<void(std::size_t, ReadResult)> const& take) {
+void splitBatch(std::vector<DecidedDocument> const& documents, Cfg::Presets const& presets,
+                Workers const& workers, std::size_t checkEvery, MakingReady& making, BatchWatcher& watcher,
+                std::function<void(std::size_t, ReadResult)> const& take) {
     runBatch(
         documents.size(), workers, watcher,
-        [&](std::size_t index) { return splitDocument(documents[index], checkEvery); },
+        [&](std::size_t index) { return splitDocument(documents[index], presets, checkEvery, making); },
         [&](std::size_t index) { return documents[index].file.string(); }, take);
 }
 

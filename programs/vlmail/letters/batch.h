@@ -33,7 +33,8 @@ void readBatch(std::vector<std::string> const& files, NodeSettings const& settin
                std::function<void(std::size_t, ReadResult)> const& take);
 
 /// The same with the pages of documents that were read before, as splitDocument() gives them.
-void splitBatch(std::vector<DecidedDocument> const& documents, Workers const& workers, std::size_t checkEvery,
-                BatchWatcher& watcher, std::function<void(std::size_t, ReadResult)> const& take);
+void splitBatch(std::vector<DecidedDocument> const& documents, Cfg::Presets const& presets,
+                Workers const& workers, std::size_t checkEvery, MakingReady& making, BatchWatcher& watcher,
+                std::function<void(std::size_t, ReadResult)> const& take);
 
 } // namespace VlMail

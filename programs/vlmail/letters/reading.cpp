@@ -6,9 +6,12 @@
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/mailing/page_blob.h"
+#include "programs/production/colour.h"
+#include "programs/production/maker.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/letters/checking.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
@@ -194,35 +197,119 @@ void acceptJoins(std::vector<LetterReading>& letters) {
     }
 }
 
-/// Writes the pages of letters that can go out.
-class PageWriting {
+std::vector<Production::PageSize> sizesOf(std::vector<int> const& pages, Reader::Document& document) {
+    std::vector<Production::PageSize> sizes;
+    for (int const number : pages)
+        sizes.push_back(document.pageSize(number));
+    return sizes;
+}
+
+void addTo(LetterReading& letter, std::string const& whyNotMade) {
+    if (!whyNotMade.empty())
+        letter.findings.insert(letter.findings.begin(), Production::findingOf(whyNotMade));
+    if (letter.findings.size() > Production::Findings::MOST)
+        letter.findings.pop_back();
+}
+
+/// Notes which of the letters cannot be made ready.
+void holdAgainst(std::vector<LetterReading>& letters, Reader::Document& document,
+                 Cfg::PackPreset const& preset, MakingReady& making) {
+    for (LetterReading& letter : letters)
+        addTo(letter, making.whyNot(preset, sizesOf(letter.pages, document)));
+}
+
+/// Makes the pages of letters that can go out.
+class PageMaking {
 public:
-    PageWriting(Reader::Document& document, std::size_t checkEvery)
-        : document_(document), checkEvery_(checkEvery) {}
+    /// Without `making` pages stay as they are.
+    PageMaking(Reader::Document& document, Cfg::PackPreset const& preset, Along const& along)
+        : document_(document), along_(along),
+          maker_(along.making ? &along.making->makerFor(preset) : nullptr),
+          countsColours_(along.making && along.making->countsColours(preset)) {}
 
     void addBlobs(LetterReading& letter) {
         if (!letter.whyNot().empty())
             return;
-        for (int const page : letter.pages) {
-            std::string const pdf = document_.singlePagePdf(page);
-            if (written_++ % checkEvery_ == 0 && !document_.showsTheSame(page, pdf))
-                letter.differingPages.push_back(page);
-            letter.blobs.push_back({page, Mailing::compressed(pdf)});
+        try {
+            for (int const page : letter.pages)
+                addPage(letter, page);
+        } catch (Unmade const& failure) {
+            addTo(letter, Production::DOCUMENT_DAMAGED + Base::validUtf8(failure.what()));
         }
-        if (!letter.differingPages.empty())
+        if (!letter.whyNot().empty())
             letter.blobs.clear();
     }
 
 private:
+    using Kind = Production::Part::Kind;
+    /// Of one page; the document's others may be fine.
+    struct Unmade : Base::Error {
+        using Base::Error::Error;
+    };
+
+    void addPage(LetterReading& letter, int number) {
+        Production::PreparedPage content = contentOf(number);
+        if (along_.pages == Along::Pages::Yes)
+            write(content, letter, number);
+        int const place = static_cast<int>(letter.blobs.size()) + 1;
+        PageBlob& blob = letter.blobs.emplace_back();
+        blob.number = number;
+        Production::PreparedPage const made = this->made(content, Kind::FirstLetter, place);
+        blob.size = made.size;
+        blob.isColoured = blob.isLaterColoured = made.isColoured;
+        if (along_.pages == Along::Pages::Yes)
+            blob.data = Mailing::compressed(made.pdf);
+        if (maker_ && maker_->tellsFirstLetters())
+            addLater(blob, this->made(content, Kind::LaterLetter, place), made);
+    }
+
+    Production::PreparedPage contentOf(int number) {
+        Production::PreparedPage content{{}, document_.pageSize(number)};
+        if (countsColours_)
+            if (auto const picture = document_.drawPage(number, Production::LOOKED_AT_DOTS_PER_INCH))
+                content.isColoured = Production::isColoured(*picture);
+        return content;
+    }
+
+    /// What is written is held against the document before anything is laid on it.
+    void write(Production::PreparedPage& content, LetterReading& letter, int number) {
+        content.pdf = document_.singlePagePdf(number);
+        if (written_++ % along_.checkEvery == 0 && !document_.showsTheSame(number, content.pdf))
+            letter.differingPages.push_back(number);
+    }
+
+    Production::PreparedPage made(Production::PreparedPage const& content, Kind kind, int place) {
+        if (!maker_)
+            return content;
+        try {
+            return along_.pages == Along::Pages::Yes ? maker_->make(content, {kind}, place)
+                                                     : maker_->plan(content, {kind}, place);
+        } catch (Base::Error const& failure) {
+            throw Unmade(failure.what());
+        }
+    }
+
+    void addLater(PageBlob& blob, Production::PreparedPage const& later,
+                  Production::PreparedPage const& first) {
+        blob.isLaterColoured = later.isColoured;
+        if (later.pdf != first.pdf)
+            blob.laterData = Mailing::compressed(later.pdf);
+    }
+
     Reader::Document& document_;
-    std::size_t checkEvery_;
+    Along const& along_;
+    Production::Maker* maker_;
+    bool countsColours_;
     std::size_t written_ = 0;
 };
 
-void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document, std::size_t checkEvery) {
-    PageWriting writing(document, checkEvery);
+void addBlobs(std::vector<LetterReading>& letters, Reader::Document& document, Cfg::PackPreset const& preset,
+              Along const& along) {
+    if (along.pages == Along::Pages::No)
+        return;
+    PageMaking making(document, preset, along);
     for (LetterReading& letter : letters)
-        writing.addBlobs(letter);
+        making.addBlobs(letter);
 }
 
 void readLetters(ReadResult& result, Reader::Document& document, PresetIndex const& presets,
@@ -241,10 +328,11 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
         acceptJoins(*reading.letters);
     if (along.checks == Along::Checks::Yes)
         checkLetters(*reading.letters, {document, extractPreset, trace, place}, packPreset, settings);
+    if (along.making)
+        holdAgainst(*reading.letters, document, packPreset, *along.making);
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, trace, place});
-    if (along.pages == Along::Pages::Yes)
-        addBlobs(*reading.letters, document, along.checkEvery);
+    addBlobs(*reading.letters, document, packPreset, along);
 }
 
 void fail(ReadResult& result, std::exception const& failure) {
@@ -352,7 +440,8 @@ ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSe
     return result;
 }
 
-ReadResult splitDocument(DecidedDocument decided, std::size_t checkEvery) {
+ReadResult splitDocument(DecidedDocument decided, Cfg::Presets const& presets, std::size_t checkEvery,
+                         MakingReady& making) {
     ReadResult result{std::move(decided.reading)};
     if (!result.reading.letters)
         return result;
@@ -362,7 +451,10 @@ ReadResult splitDocument(DecidedDocument decided, std::size_t checkEvery) {
         if (result.sha256 != decided.sha256)
             throw Base::Error('"' + decided.file.string() + "\" has changed; make the plan again");
         Reader::Document document = Reader::openDocument(std::move(bytes), decided.file);
-        addBlobs(*result.reading.letters, document, checkEvery);
+        // Without such a preset there is no mailing, which is said where it would begin.
+        if (Cfg::PackPreset const* const preset = packPresetNamed(result.reading.packPreset, presets))
+            addBlobs(*result.reading.letters, document, *preset,
+                     {.pages = Along::Pages::Yes, .checkEvery = checkEvery, .making = &making});
     } catch (std::exception const& failure) {
         fail(result, failure);
     }

@@ -4,8 +4,8 @@
 
 #include "programs/production/finding.h"
 #include "programs/reader/letter_joins.h"
+#include "programs/vlmail/letters/page_blob.h"
 #include "vlservice/extract/extracted_fields.h"
-#include "vlservice/pack/shared_mem_buffer.h"
 #include "vlservice/presets/presets.h"
 
 #include <cstddef>
@@ -22,14 +22,9 @@ struct Trace;
 
 namespace VlMail {
 
+class MakingReady;
 class NodeSettings;
 class PresetIndex;
-
-/// A page of a document, compressed as containers and databases keep it.
-struct PageBlob {
-    int number = 0;
-    SharedMemBuffer data;
-};
 
 struct LetterReading {
     /// From 1.
@@ -45,7 +40,8 @@ struct LetterReading {
     std::vector<int> differingPages = {};
     /// Those of its pages that may begin another letter. They keep it from going out.
     std::vector<Reader::DoubtfulJoin> doubtfulJoins = {};
-    /// What would go wrong with it on paper, when that was asked for. Errors keep it from going out.
+    /// What would go wrong with it on paper, when that was asked for, and why its pages cannot be made ready.
+    /// Errors keep it from going out.
     std::vector<Production::Finding> findings = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
@@ -103,7 +99,8 @@ struct OpenDocument {
 /// What comes along with a document's letters. The functions run where the document is read, which may be a
 /// worker process: they change the result and nothing else. What they throw is the reading's `error`.
 struct Along {
-    enum class Pages : bool { No, Yes };
+    /// The pages of letters that can go out: none, what is known of them without writing them, or all.
+    enum class Pages { No, Planned, Yes };
     enum class Digest : bool { No, Yes };
     /// Whether pages that may begin another letter keep theirs from going out, or are only told of.
     enum class Joins : bool { Doubt, Accept };
@@ -116,6 +113,8 @@ struct Along {
     Checks checks = Checks::No;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
     std::size_t checkEvery = 1;
+    /// What pages are made ready with; they are left as they are without it. It outlives the batch.
+    MakingReady* making = nullptr;
     /// Called with the document's name alone, before it is opened.
     std::function<void(ReadResult&, Cfg::Presets const&)> beforeReading = {};
     /// Called when its letters are there; an attachment has none.
@@ -135,8 +134,10 @@ struct DecidedDocument {
     DocumentReading reading;
 };
 
-/// The pages of those of its letters that can go out. A document that is not the one with that digest any
-/// more is a failure, said in the reading's `error`.
-ReadResult splitDocument(DecidedDocument decided, std::size_t checkEvery);
+/// The pages of those of its letters that can go out, made ready as the pack preset of that name in `presets`
+/// says. A document that is not the one with that digest any more is a failure, said in the reading's
+/// `error`.
+ReadResult splitDocument(DecidedDocument decided, Cfg::Presets const& presets, std::size_t checkEvery,
+                         MakingReady& making);
 
 } // namespace VlMail

@@ -7,6 +7,7 @@
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/pack/container_format.h"
 
+#include <numeric>
 #include <ostream>
 #include <utility>
 
@@ -17,6 +18,11 @@ Cfg::PackPreset const& requirePackPreset(std::string const& name, Cfg::Presets c
     if (Cfg::PackPreset const* const preset = packPresetNamed(name, presets))
         return *preset;
     throw Base::Error("there is no pack preset " + Base::inQuotes(name) + "; add it to the settings");
+}
+
+long long sumOf(Mailing::Metadata const& mailing, long long Mailing::MailedLetter::*number) {
+    return std::accumulate(mailing.letters.begin(), mailing.letters.end(), 0LL,
+                           [&](long long sum, auto const& letter) { return sum + letter.*number; });
 }
 
 /// A document whose name a container cannot hold would fail all of its mailing in the end.
@@ -30,8 +36,9 @@ void requireName(DocumentReading& reading) {
 
 } // namespace
 
-Dispatch::Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal const& terminal)
-    : presets_(presets), begin_(std::move(begin)), terminal_(terminal) {}
+Dispatch::Dispatch(Cfg::Presets const& presets, MakingReady const& making, BeginMailing begin,
+                   Terminal const& terminal)
+    : presets_(presets), making_(making), begin_(std::move(begin)), terminal_(terminal) {}
 
 void Dispatch::take(ReadResult result) {
     DocumentReading& reading = result.reading;
@@ -70,8 +77,11 @@ void Dispatch::noteNotifications(std::string const& name, LetterReading const& l
 
 OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
     auto& mailing = mailings_[packPreset];
-    if (!mailing)
-        mailing = begin_(requirePackPreset(packPreset, presets_));
+    if (!mailing) {
+        Cfg::PackPreset const& preset = requirePackPreset(packPreset, presets_);
+        mailing = begin_(preset);
+        mailing->builder().useDocuments(making_.attachmentsOf(packPreset), making_.usedDocumentsOf(preset));
+    }
     return *mailing;
 }
 
@@ -101,13 +111,14 @@ void Dispatch::print() const {
     auto const number = [](std::size_t n) { return std::to_string(n); };
     constexpr auto RIGHT = TextTable::Align::Right;
     std::vector<TextTable::Column> columns{
-        {"pack preset"}, {"letters", RIGHT}, {"sent as", RIGHT}, {"pages", RIGHT}};
+        {"pack preset"}, {"letters", RIGHT}, {"sent as", RIGHT}, {"pages", RIGHT}, {"sheets", RIGHT}};
     columns.push_back(prices_.empty() ? TextTable::Column{"mailing"} : TextTable::Column{"price", RIGHT});
     TextTable table(columns);
     for (OutgoingMailing* const mailing : arrived_) {
         MailingBuilder const& builder = mailing->builder();
         table.addRow({builder.metadata().packPreset.name(), number(builder.letterCount()),
                       number(builder.metadata().letters.size()), number(builder.pageCount()),
+                      std::to_string(sumOf(builder.metadata(), &Mailing::MailedLetter::sheets)),
                       prices_.empty() ? mailing->place() : priceInWords(mailing)});
     }
     if (!table.empty())
@@ -174,7 +185,9 @@ json::Object Dispatch::toJson(OutgoingMailing& mailing) const {
     json::Object object{{"pack_preset", metadata.packPreset.name()},
                         {"letters", mailing.builder().letterCount()},
                         {"sent_as", metadata.letters.size()},
-                        {"pages", mailing.builder().pageCount()}};
+                        {"pages", mailing.builder().pageCount()},
+                        {"sheets", sumOf(metadata, &Mailing::MailedLetter::sheets)},
+                        {"coloured_pages", sumOf(metadata, &Mailing::MailedLetter::colouredPages)}};
     if (!metadata.id.empty()) {
         object.set("id", metadata.id);
         object.set("place", mailing.place());

@@ -2,6 +2,7 @@
 // Sorts the letters of a batch into mailings, one a pack preset, and keeps account of what stays behind.
 
 #include "programs/channel/client.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/mailings/outgoing_mailing.h"
@@ -16,8 +17,9 @@ namespace VlMail {
 
 class Dispatch {
 public:
-    /// `presets` are those that the documents were read by.
-    Dispatch(Cfg::Presets const& presets, BeginMailing begin, Terminal const& terminal);
+    /// `presets` are those that the documents were read by, `making` is what they were made ready with.
+    Dispatch(Cfg::Presets const& presets, MakingReady const& making, BeginMailing begin,
+             Terminal const& terminal);
 
     /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
     /// of.
@@ -59,6 +61,7 @@ private:
     json::Object toJson(OutgoingMailing& mailing) const;
 
     Cfg::Presets const& presets_;
+    MakingReady const& making_;
     BeginMailing begin_;
     Terminal const& terminal_;
     /// By the pack preset's name, so that the same documents give the same order of mailings.

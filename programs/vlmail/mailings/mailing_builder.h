@@ -1,15 +1,19 @@
 #pragma once
-// Makes a mailing out of letters: stores their pages and groups those that go out as one.
+// Makes a mailing out of letters: stores their pages, groups those that go out as one, and lays out what each
+// of them is on paper.
 
 #include "programs/mailing/entries_digest.h"
 #include "programs/mailing/metadata.h"
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/reading.h"
 #include "vlservice/pack/page_saver.h"
 
 #include <cstddef>
+#include <map>
 #include <string>
 #include <unordered_map>
 #include <unordered_set>
+#include <utility>
 #include <vector>
 
 namespace VlMail {
@@ -23,24 +27,63 @@ public:
     /// folders.
     std::string nameFor(std::string const& document);
 
-    /// Adds a letter under a name from nameFor(), and its pages.
-    /// A letter that equals an earlier one in all that must agree joins it, unless the pack preset forbids
-    /// grouping; one whose other values cannot be merged stays alone.
+    /// Adds a letter under a name from nameFor(), and its pages; of large pages of a document that are the
+    /// same the first is stored. A letter that equals an earlier one in all that must agree joins it, unless
+    /// the pack preset forbids grouping; one whose other values cannot be merged stays alone.
     void add(std::string const& document, LetterReading letter);
 
+    /// Takes the attachments of the pack preset, in the order of its list, and the documents that were used.
+    /// Their pages are stored when the mailing has letters.
+    void useDocuments(std::vector<MadeAttachment> const& attachments, std::vector<UsedDocument> const& used);
+
+    /// Completes the letters, and stores what they share: attachments and blank sides.
+    Mailing::Metadata const& finish();
+
+    /// Of the letters as finish() has left them.
     Mailing::Metadata const& metadata() const { return metadata_; }
     std::size_t letterCount() const { return letterCount_; }
     std::size_t pageCount() const { return pageCount_; }
 
 private:
-    bool joinGroup(LetterReading const& letter, Mailing::DocumentPages const& pages);
+    /// A part of a letter, without a blank side.
+    struct Part {
+        Mailing::DocumentPages pages;
+        /// Of the last page.
+        Production::PageSize size = {};
+        long long colouredPages = 0;
+    };
+    /// Letters that go out as one, or a letter alone.
+    struct Group {
+        std::vector<Part> letters;
+        Cfg::ExtractedFields fields;
+    };
+    enum class Place { First, Later };
+
+    /// The group that the letter has joined, or nullptr.
+    Group* joinedGroup(LetterReading const& letter);
+    Part stored(std::string const& document, std::vector<PageBlob> const& pages, Place place);
+    int storedPage(std::string const& document, int number, SharedMemBuffer const& data);
+    void save(std::string const& document, int number, SharedMemBuffer const& data);
+    void storeAttachments();
+    Mailing::MailedLetter composed(Group const& group);
+    std::vector<Part const*> partsOf(Group const& group) const;
+    Mailing::DocumentPages blankSide(Production::PageSize size);
 
     PageSaverI& pages_;
     Mailing::Metadata metadata_;
     Mailing::EntriesDigest digest_;
     std::unordered_set<std::string> documents_;
-    /// Positions in metadata_.letters of those that a further letter may join, by what must agree.
-    std::unordered_multimap<std::string, std::size_t> groups_;
+    std::vector<Group> groups_;
+    /// Positions in groups_ of those that a further letter may join, by what must agree.
+    std::unordered_multimap<std::string, std::size_t> byFields_;
+    /// Numbers of stored pages by their document's name and their digest.
+    std::unordered_map<std::string, int> byContent_;
+    std::vector<MadeAttachment> attachments_;
+    /// In the order in which they go out.
+    std::vector<Part> inFront_;
+    std::vector<Part> behind_;
+    std::string blankName_;
+    std::map<std::pair<int, int>, int> blankSides_;
     std::size_t letterCount_ = 0;
     std::size_t pageCount_ = 0;
 };

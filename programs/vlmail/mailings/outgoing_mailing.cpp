@@ -27,7 +27,7 @@ public:
     MailingBuilder& builder() override { return builder_; }
 
     void finish() override {
-        container_.finish(builder_.metadata().toBlob(), "make room on the disk and mail again");
+        container_.finish(builder_.finish().toBlob(), "make room on the disk and mail again");
     }
 
     std::string place() const override { return container_.target().string(); }
@@ -50,7 +50,7 @@ public:
     MailingBuilder& builder() override { return builder_; }
 
     void finish() override {
-        pack_.finish(builder_.metadata().toBlob());
+        pack_.finish(builder_.finish().toBlob());
         state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_).state);
     }
 
@@ -71,7 +71,7 @@ public:
     explicit PlannedMailing(Cfg::PackPreset const& preset) : builder_(nowhere_, {}, preset, 0) {}
 
     MailingBuilder& builder() override { return builder_; }
-    void finish() override {}
+    void finish() override { builder_.finish(); }
     std::string place() const override { return {}; }
 
 private:

@@ -3,10 +3,13 @@
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/base/read_file.h"
-#include "programs/reader/document.h"
+#include "programs/vlmail/letters/preset_index.h"
 #include "vlservice/json/json_text.h"
 
+#include <algorithm>
+#include <set>
 #include <sstream>
+#include <string_view>
 #include <utility>
 
 namespace VlMail {
@@ -22,6 +25,8 @@ constexpr char const* SETTINGS_KEY = "settings";
 constexpr char const* DOCUMENTS_KEY = "documents";
 constexpr char const* OUTCOME_KEY = "outcome";
 constexpr char const* DIGEST_KEY = "digest";
+constexpr char const* USED_DOCUMENTS_KEY = "used_documents";
+constexpr char const* ID_KEY = "id";
 constexpr char const* FILE_KEY = "file";
 constexpr char const* SHA256_KEY = "sha256";
 
@@ -45,6 +50,35 @@ json::Object fileToJson(fs::path const& file, std::string const& digest) {
     return {{FILE_KEY, file.string()}, {SHA256_KEY, digest}};
 }
 
+json::Array toJson(std::vector<UsedDocument> const& documents) {
+    json::Array array;
+    for (UsedDocument const& used : documents) {
+        json::Object object = fileToJson(used.file, used.sha256);
+        object.set(ID_KEY, used.id);
+        array.append(object);
+    }
+    return array;
+}
+
+std::vector<UsedDocument> usedDocumentsIn(json::Value const& array) {
+    std::vector<UsedDocument> documents;
+    if (array)
+        for (json::Value const& value : array.toArray()) {
+            json::Object const& object = value.toObject();
+            documents.push_back({object.get(ID_KEY).toString(), object.get(FILE_KEY).toString(),
+                                 object.get(SHA256_KEY).toString()});
+        }
+    return documents;
+}
+
+/// It may have changed while it was being used.
+void requireSame(UsedDocument const& used, std::vector<UsedDocument> const& planned) {
+    auto const same = [&](UsedDocument const& one) { return one.id == used.id && one.sha256 == used.sha256; };
+    if (std::none_of(planned.begin(), planned.end(), same))
+        throw Base::Error("cannot carry out the plan: \"" + used.file.string() +
+                          "\" has changed; make it again with vlmail plan");
+}
+
 /// What is wrong with a file now, or nothing.
 std::string changeOf(fs::path const& file, std::string const& digest) {
     try {
@@ -57,7 +91,7 @@ std::string changeOf(fs::path const& file, std::string const& digest) {
 
 } // namespace
 
-Plan::Plan(NodeSettings const& settings) {
+Plan::Plan(NodeSettings const& settings, std::vector<UsedDocument> used) : usedDocuments_(std::move(used)) {
     if (settings.file().empty())
         return;
     settingsFile_ = fs::absolute(settings.file());
@@ -77,6 +111,7 @@ Plan Plan::fromFile(fs::path const& file) {
             plan.settingsFile_ = settings.toObject().get(FILE_KEY).toString();
             plan.settingsSha256_ = settings.toObject().get(SHA256_KEY).toString();
         }
+        plan.usedDocuments_ = usedDocumentsIn(object.get(USED_DOCUMENTS_KEY));
         for (json::Value const& value : object.get(DOCUMENTS_KEY).toArray()) {
             json::Object const& document = value.toObject();
             plan.add({document.get(FILE_KEY).toString(), document.get(SHA256_KEY).textOrEmpty(),
@@ -102,6 +137,8 @@ std::string Plan::toText(json::Object const& outcome) const {
                                                            : fileToJson(settingsFile_, settingsSha256_)},
                       {DOCUMENTS_KEY, documents},
                       {OUTCOME_KEY, outcome}};
+    if (!usedDocuments_.empty())
+        plan.set(USED_DOCUMENTS_KEY, toJson(usedDocuments_));
     plan.set(DIGEST_KEY, digestOf(plan));
     return textOf(plan) + '\n';
 }
@@ -115,6 +152,8 @@ void Plan::requireUnchanged() const {
     };
     if (!settingsFile_.empty())
         check(settingsFile_, settingsSha256_);
+    for (UsedDocument const& used : usedDocuments_)
+        check(used.file, used.sha256);
     for (DecidedDocument const& document : documents_) {
         if (!document.reading.failed())
             check(document.file, document.sha256);
@@ -125,6 +164,22 @@ void Plan::requireUnchanged() const {
 
 NodeSettings Plan::settings() const {
     return settingsFile_.empty() ? NodeSettings() : NodeSettings::fromFile(settingsFile_);
+}
+
+void Plan::prepare(MakingReady& making, Cfg::Presets const& presets, Workers const& workers) const {
+    std::set<std::string> names;
+    for (DecidedDocument const& document : documents_)
+        names.insert(document.reading.packPreset);
+    std::vector<Cfg::PackPreset> used;
+    for (std::string const& name : names)
+        if (Cfg::PackPreset const* const preset = packPresetNamed(name, presets))
+            used.push_back(*preset);
+    DocumentFolder folder;
+    for (UsedDocument const& document : usedDocuments_)
+        folder.fix(document.id, document.file);
+    making.prepare(used, folder, workers);
+    for (UsedDocument const& document : making.usedDocuments())
+        requireSame(document, usedDocuments_);
 }
 
 } // namespace VlMail

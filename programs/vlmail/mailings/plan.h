@@ -1,6 +1,7 @@
 #pragma once
 // A batch that is decided and not yet carried out, as a JSON document.
 
+#include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/reading.h"
 
@@ -14,12 +15,14 @@ namespace VlMail {
 /// carried out later exactly as decided, or refused when something has changed.
 ///
 /// In JSON {"plan", "settings": {"file", "sha256"}, "documents": [{"file", "sha256", ...}], "outcome",
-/// "digest"}: a document has beside its file the keys of DocumentReading::toJson(), "outcome" is that of
-/// Dispatch::toJson() and is there to be read by people and programs, and "digest" is over all the rest.
+/// "used_documents", "digest"}: a document has beside its file the keys of DocumentReading::toJson(),
+/// "outcome" is that of Dispatch::toJson() and is there to be read by people and programs, and "digest" is
+/// over all the rest.
 class Plan {
 public:
-    /// The settings may be the global defaults, which have no file.
-    explicit Plan(NodeSettings const& settings);
+    /// The settings may be the global defaults, which have no file. `used` are the letterheads and
+    /// attachments.
+    explicit Plan(NodeSettings const& settings, std::vector<UsedDocument> used = {});
     /// Throws Error when the file is no plan or was changed.
     static Plan fromFile(std::filesystem::path const& file);
 
@@ -32,6 +35,9 @@ public:
     /// Throws Error that names every document and settings file that is gone or has changed since.
     void requireUnchanged() const;
     NodeSettings settings() const;
+    /// Prepares the letterheads and attachments that the plan was made with. Throws Error when one of them
+    /// has changed.
+    void prepare(MakingReady& making, Cfg::Presets const& presets, Workers const& workers) const;
 
 private:
     Plan() = default;
@@ -39,6 +45,7 @@ private:
     /// Empty for the global defaults.
     std::filesystem::path settingsFile_;
     std::string settingsSha256_;
+    std::vector<UsedDocument> usedDocuments_;
     std::vector<DecidedDocument> documents_;
 };
 

@@ -5,31 +5,49 @@
 
 #include <cstdio>
 #include <map>
+#include <tuple>
 
 namespace VlMail {
 namespace {
 
-/// As pack presets say it: 1 is grey, and 0 leaves it to the pages, which the tariff cannot see.
+/// As pack presets say it. Where pages were not counted, all of them are in colour then.
 constexpr PackColorModel COLOUR{2};
+
+/// Printed pages, sheets and coloured pages of a letter.
+using Counts = std::tuple<long long, long long, long long>;
+
+long long printedPages(Mailing::MailedLetter const& letter) {
+    long long pages = 0;
+    for (Mailing::DocumentPages const& document : letter.documents)
+        if (document.role != Mailing::DocumentPages::Role::Blank)
+            pages += static_cast<long long>(document.pages.size());
+    return pages;
+}
+
+/// An older service knows letters in colour throughout and no others.
+void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::Metadata const& mailing) {
+    batch.colour =
+        mailing.madeReady ? colouredPages == batch.pages : mailing.packPreset.colorModel() == COLOUR;
+    if (!batch.colour)
+        batch.colouredPages = colouredPages;
+}
 
 } // namespace
 
 std::vector<Protocol::LetterBatch> pricedLettersOf(Mailing::Metadata const& mailing) {
-    std::map<long long, long long> lettersByPages;
-    for (Mailing::MailedLetter const& letter : mailing.letters) {
-        long long pages = 0;
-        for (Mailing::DocumentPages const& document : letter.documents)
-            pages += static_cast<long long>(document.pages.size());
-        ++lettersByPages[pages];
-    }
+    std::map<Counts, long long> lettersByCounts;
+    for (Mailing::MailedLetter const& letter : mailing.letters)
+        ++lettersByCounts[{printedPages(letter), letter.sheets, letter.colouredPages}];
     std::vector<Protocol::LetterBatch> batches;
-    for (auto const& [pages, letters] : lettersByPages) {
+    for (auto const& [counts, letters] : lettersByCounts) {
         Protocol::LetterBatch& batch = batches.emplace_back();
         batch.count = letters;
-        batch.pages = pages;
-        batch.colour = mailing.packPreset.colorModel() == COLOUR;
         batch.duplex = mailing.packPreset.duplex();
         batch.priority = mailing.packPreset.priorityDelivery();
+        batch.pages = std::get<0>(counts);
+        if (std::get<1>(counts) != batch.sheets())
+            batch.paperSheets = std::get<1>(counts);
+        setColour(batch, std::get<2>(counts), mailing);
     }
     return batches;
 }

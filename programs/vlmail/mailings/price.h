@@ -10,7 +10,7 @@
 
 namespace VlMail {
 
-/// The letters of a mailing, those of equal length together.
+/// The letters of a mailing, those of as many pages, sheets and coloured pages together.
 std::vector<Protocol::LetterBatch> pricedLettersOf(Mailing::Metadata const& mailing);
 
 /// The service's estimate as it answers it. Throws std::exception with a line for people.

@@ -50,17 +50,24 @@ std::uint64_t blobAreaStart(ByteFile& file) {
 }
 
 /// The pages that the metadata names, in the order in which they were stored; none when that order cannot be
-/// told: grouping moves a document to letters that were stored earlier.
+/// told: grouping moves a document to letters that were stored earlier, and what several letters share may be
+/// stored at any time.
 std::vector<PageName> storedOrder(Mailing::Metadata const& metadata) {
+    using Mailing::DocumentPages;
     bool const isGrouped = std::any_of(metadata.letters.begin(), metadata.letters.end(),
                                        [](auto const& letter) { return letter.documents.size() > 1; });
     if (isGrouped && metadata.letters.size() > 1)
         return {};
     std::vector<PageName> names;
+    std::set<PageName> known;
     for (Mailing::MailedLetter const& letter : metadata.letters)
-        for (Mailing::DocumentPages const& document : letter.documents)
+        for (DocumentPages const& document : letter.documents) {
+            if (document.role != DocumentPages::Role::Letter)
+                return {};
             for (int const page : document.pages)
-                names.push_back({document.document, std::to_string(page)});
+                if (PageName name{document.document, std::to_string(page)}; known.insert(name).second)
+                    names.push_back(std::move(name));
+        }
     return names;
 }
 

@@ -9,7 +9,7 @@ namespace VlServiced {
 // The bounds of both keep the price of a batch within 64 bits: less than 2.6e12 a letter.
 long long priceOf(Protocol::LetterBatch const& batch, Protocol::Tariff const& tariff) {
     long long const oneLetter =
-        tariff.letter + batch.sheets() * tariff.sheet + (batch.colour ? batch.pages * tariff.colourPage : 0) +
+        tariff.letter + batch.sheets() * tariff.sheet + batch.pagesInColour() * tariff.colourPage +
         batch.duplexSheets() * tariff.duplexSheet + (batch.priority ? tariff.priorityLetter : 0);
     return batch.count * std::max(oneLetter, 0LL);
 }

@@ -207,9 +207,10 @@ TEST_F(VlMailTest, GroupsLettersThatAgree) {
     ASSERT_EQ(mailings().size(), 1u);
     Mailing::Metadata const metadata = metadataOf(mailings()[0]);
     ASSERT_EQ(metadata.letters.size(), 1u);
-    ASSERT_EQ(metadata.letters[0].documents.size(), 2u);
+    ASSERT_EQ(metadata.letters[0].documents.size(), 3u);
     EXPECT_EQ(metadata.letters[0].documents[0].document, "invoice 1.txt");
-    EXPECT_EQ(metadata.letters[0].documents[1].document, "invoice 1 (2).txt");
+    EXPECT_EQ(metadata.letters[0].documents[1].document, "blank") << "the preset says duplex";
+    EXPECT_EQ(metadata.letters[0].documents[2].document, "invoice 1 (2).txt");
 }
 
 TEST_F(VlMailTest, LeavesOutWhatIsNotReadyAndLosesNothingElse) {

@@ -38,6 +38,26 @@ TEST(PricedLetters, FollowThePackPreset) {
     EXPECT_FALSE(pricedLettersOf(mailingWith(R"(,"colour_model":1)")).front().colour) << "grey";
 }
 
+TEST(PricedLetters, HaveTheSheetsAndColouredPagesOfMailingsThatAreMadeReady) {
+    Mailing::Metadata mailing = mailingWith(R"(,"duplex":true,"colour_model":2)");
+    using Role = Mailing::DocumentPages::Role;
+    mailing.madeReady = true;
+    mailing.letters = {
+        {{{"a.pdf", {1}}, {"blank", {1}, Role::Blank}, {"t.pdf", {1, 2, 3}, Role::Attachment}}, {}, 3, 2},
+        {{{"b.pdf", {1, 2}}}, {}, 1, 2}};
+    std::vector<Protocol::LetterBatch> const batches = pricedLettersOf(mailing);
+    ASSERT_EQ(batches.size(), 2u);
+    EXPECT_EQ(batches[0].pages, 2);
+    EXPECT_EQ(batches[0].paperSheets, 0) << "as few as can be";
+    EXPECT_TRUE(batches[0].colour);
+    EXPECT_EQ(batches[0].colouredPages, 0);
+    EXPECT_EQ(batches[1].pages, 4);
+    EXPECT_EQ(batches[1].sheets(), 3);
+    EXPECT_EQ(batches[1].duplexSheets(), 1);
+    EXPECT_FALSE(batches[1].colour);
+    EXPECT_EQ(batches[1].pagesInColour(), 2);
+}
+
 TEST(Money, IsWrittenWithItsSignInFront) {
     std::pair<long long, char const*> const cases[] = {
         {0, "0.00"},
