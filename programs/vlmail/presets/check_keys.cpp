@@ -1,4 +1,5 @@
 // Keys that nobody knows, and values that are not read as they stand.
+#include "programs/production/production_rules.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/acting.h"
 #include "programs/vlmail/presets/checks.h"
@@ -84,10 +85,12 @@ bool isOfType(json::Value const& value, KeyType type) {
     return true;
 }
 
-/// Keys that the record keeps and that this program's reader knows; looked at by checkReadingRules.
-std::vector<std::string> keysOfReader(RecordKeys const& keys) {
-    return &keys == &Cfg::PackPreset::keys() ? std::vector<std::string>{Reader::ReadingRules::KEY}
-                                             : std::vector<std::string>();
+/// Keys that the record keeps and that this program knows; checkReadingRules and checkProductionRules look at
+/// them.
+std::vector<std::string> keysOfPrograms(RecordKeys const& keys) {
+    if (&keys != &Cfg::PackPreset::keys())
+        return {};
+    return {Reader::ReadingRules::KEY, Production::ProductionRules::KEY};
 }
 
 /// Whether there is something else than what a missing key reads as.
@@ -131,7 +134,7 @@ private:
 
     void checkUnknown(json::Object const& object, std::string const& key, Place const& place,
                       RecordKeys const& keys) {
-        std::vector<std::string> candidates = keysOfReader(keys);
+        std::vector<std::string> candidates = keysOfPrograms(keys);
         if (std::ranges::find(candidates, key) != candidates.end())
             return;
         for (KeyRow const& row : keys.rows)

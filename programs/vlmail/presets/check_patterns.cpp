@@ -4,6 +4,7 @@
 #include "programs/patterns/hard_lines.h"
 #include "programs/patterns/outline.h"
 #include "programs/patterns/pattern.h"
+#include "programs/production/production_rules.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/words.h"
 
@@ -108,7 +109,9 @@ bool isComposed(std::string const& text) {
     return U_FAILURE(error) || nfc->isNormalized(icu::UnicodeString::fromUTF8(text), error);
 }
 
-void checkPattern(std::string const& text, Use use, Place const& place, Findings& findings) {
+/// `givenUp` is what becomes of letters whose texts are too hard for it.
+void checkPattern(std::string const& text, Use use, Place const& place, Findings& findings,
+                  char const* givenUp) {
     if (text.empty())
         return;
     if (use != Use::Name && !isComposed(text))
@@ -116,13 +119,29 @@ void checkPattern(std::string const& text, Use use, Place const& place, Findings
     try {
         Trial const trial = tryHardLines(Patterns::Pattern(text, use));
         if (trial.burden == Burden::Runaway)
-            findings.add(RunawayPattern, place, {startOf(trial.line), consequenceOfGivingUp(use)});
+            findings.add(RunawayPattern, place, {startOf(trial.line), givenUp});
         else if (trial.burden == Burden::Slow)
             findings.add(SlowPattern, place, {startOf(trial.line)});
     } catch (Patterns::Broken const& broken) {
         findings.add(PatternBroken, place,
                      {std::to_string(broken.position + 1), broken.what(), consequenceOfBreaking(use)});
     }
+}
+
+void checkPattern(std::string const& text, Use use, Place const& place, Findings& findings) {
+    checkPattern(text, use, place, findings, consequenceOfGivingUp(use));
+}
+
+void checkPatternsOf(ListedPackPreset const& pack, Findings& findings) {
+    std::vector<Reader::RulesFault> faults;
+    auto const reading = Reader::ReadingRules::from(pack.json.get(Reader::ReadingRules::KEY), faults);
+    for (auto const& [name, zone] : reading.zones)
+        checkPattern(zone.anchor, Use::Extract,
+                     pack.place / Reader::ReadingRules::KEY / "zones" / name / "anchor", findings);
+    using Production::ProductionRules;
+    auto const production = ProductionRules::from(pack.json.get(ProductionRules::KEY), faults);
+    checkPattern(production.postcode, Use::Extract, pack.place / ProductionRules::KEY / "postcode", findings,
+                 "a letter with such an address cannot go out");
 }
 
 } // namespace
@@ -136,13 +155,8 @@ void checkPatterns(PresetsDocument const& document, Findings& findings) {
         checkPattern(field.json.get("value_match").textOrEmpty(), Use::Validate, field.place / "value_match",
                      findings);
     });
-    for (ListedPackPreset const& pack : document.packPresets()) {
-        std::vector<Reader::RulesFault> faults;
-        auto const rules = Reader::ReadingRules::from(pack.json.get(Reader::ReadingRules::KEY), faults);
-        for (auto const& [name, zone] : rules.zones)
-            checkPattern(zone.anchor, Use::Extract,
-                         pack.place / Reader::ReadingRules::KEY / "zones" / name / "anchor", findings);
-    }
+    for (ListedPackPreset const& pack : document.packPresets())
+        checkPatternsOf(pack, findings);
 }
 
 void checkValueGroups(PresetsDocument const& document, Findings& findings) {

@@ -17,13 +17,6 @@ namespace {
 using enum FindingKind;
 using Reader::ReadingRules;
 
-Place placeOf(ListedPackPreset const& pack, Reader::RulesFault const& fault) {
-    Place place = pack.place / ReadingRules::KEY;
-    for (std::string const& key : fault.path)
-        place = place / key;
-    return place;
-}
-
 /// Of the zones that are read by this pack preset's rules.
 std::vector<std::string> zoneNames(PresetsDocument const& document, std::string const& packPreset) {
     std::vector<std::string> names;
@@ -80,7 +73,8 @@ void checkReadingRules(PresetsDocument const& document, Findings& findings) {
         std::vector<Reader::RulesFault> faults;
         ReadingRules const rules = ReadingRules::from(pack.json.get(ReadingRules::KEY), faults);
         for (Reader::RulesFault const& fault : faults)
-            findings.add(ReadingRefused, placeOf(pack, fault), {fault.what, fault.advice});
+            findings.add(ReadingRefused, pack.place / ReadingRules::KEY / fault.path,
+                         {fault.what, fault.advice});
         checkZoneNames(document, pack, rules, findings);
     }
 }

@@ -54,6 +54,10 @@ void checkReadingOfFields(PresetsDocument const& document, Findings& findings);
 /// How the documents that get this preset are read; what is wrong there counts as not said.
 Reader::ReadingRules readingRulesFor(PresetsDocument const& document, ListedExtractPreset const& preset);
 
+// check_production.cpp
+void checkProductionRules(PresetsDocument const& document, Findings& findings);
+void checkPrintArea(PresetsDocument const& document, Findings& findings);
+
 /// Calls `look` with each preset, zone and field.
 template<typename Look>
 void forEachField(PresetsDocument const& document, Look look) {

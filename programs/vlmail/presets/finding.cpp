@@ -209,6 +209,13 @@ constexpr FindingWords WORDS[] = {
      "the mark begins letters only where their first page has it, and \"reading\" puts the zone {0} on another: it "
      "separates nothing",
      "move the field to a zone of the first page, or remove \"mark\""},
+
+    {ProductionRefused, "production-refused", Error,
+     "{0}: no letter that is sent by this pack preset can go out",
+     "{1}"},
+    {PrintAreaEmpty, "print-area-empty", Error,
+     "the print area has no area ({0}): no letter can go out",
+     "\"left\" must be less than \"right\", and \"top\" less than \"bottom\""},
     // clang-format on
 };
 

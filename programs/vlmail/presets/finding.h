@@ -80,6 +80,9 @@ enum class FindingKind {
     ReadingZoneMissing,
     ReadingAgainstMatch,
     ReadingMarkElsewhere,
+    // What is printed.
+    ProductionRefused,
+    PrintAreaEmpty,
     COUNT_,
 };
 

@@ -15,6 +15,7 @@ constexpr Check CHECKS[] = {
     checkAddresses,       checkFieldAttributes,  checkLimits,
     checkDefaults,        checkDatesWithoutYear, checkNumbersWithoutMinimum,
     checkDecimalCommas,   checkReadingRules,     checkReadingOfFields,
+    checkProductionRules, checkPrintArea,
 };
 
 } // namespace

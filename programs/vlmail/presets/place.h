@@ -2,6 +2,7 @@
 // Where something stands in a JSON document.
 
 #include <cstddef>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -15,6 +16,12 @@ public:
         for (char const c : key)
             pointer += c == '~' ? "~0" : c == '/' ? "~1" : std::string(1, c);
         return Place(std::move(pointer));
+    }
+    Place operator/(std::span<std::string const> steps) const {
+        Place place = *this;
+        for (std::string const& step : steps)
+            place = place / step;
+        return place;
     }
     Place operator/(std::size_t index) const { return Place(pointer_ + '/' + std::to_string(index)); }
 
