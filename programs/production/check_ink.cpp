@@ -5,6 +5,8 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
+#include <vector>
 
 namespace Production {
 namespace {
@@ -35,22 +37,33 @@ std::array<Side, 4> sidesOf(Box const& area, int tolerance, Box const& page) {
 
 bool hasArea(Box const& box) { return box.left < box.right && box.top < box.bottom; }
 
+/// The part of a box that lies in another.
+Box clipped(Box const& box, Box const& room) {
+    return {std::clamp(box.left, room.left, room.right), std::clamp(box.top, room.top, room.bottom),
+            std::clamp(box.right, room.left, room.right), std::clamp(box.bottom, room.top, room.bottom)};
+}
+
 } // namespace
 
 void checkPrintArea(PageOnPaper const& page, PrintRules const& rules, Findings& findings) {
     if (page.ink.isEmpty())
         return;
-    Box const sheet{0, 0, page.page.width, page.page.height};
+    Box const sheet = page.sheet();
     Box const area = rules.printAreaOn({sheet.right, sheet.bottom});
-    for (Side const& side : sidesOf(area, rules.production.tolerance, sheet)) {
-        std::optional<Box> const found = hasArea(side.beyond) ? page.ink.inside(side.beyond) : std::nullopt;
-        if (found)
-            findings.add(Code::ContentOutsidePrintArea, page.at(*found),
-                         textInWords(page.page, *found) + " reaches " +
-                             Base::withMillimetres(side.by(*found, area)) + " beyond the print area on the " +
-                             side.name,
-                         fixFor(page.ink.bounds()->united(*found), area));
-    }
+    Box all = clipped(*page.ink.bounds(), area);
+    std::vector<std::pair<Side, Box>> beyond;
+    for (Side const& side : sidesOf(area, rules.production.tolerance, sheet))
+        if (std::optional<Box> const found =
+                hasArea(side.beyond) ? page.ink.inside(side.beyond) : std::nullopt) {
+            beyond.emplace_back(side, *found);
+            all = all.united(*found);
+        }
+    for (auto const& [side, found] : beyond)
+        findings.add(Code::ContentOutsidePrintArea, page.at(found),
+                     textInWords(page.page, found) + " reaches " +
+                         Base::withMillimetres(side.by(found, area)) + " beyond the print area on the " +
+                         side.name,
+                     fixFor(all, area));
 }
 
 void checkClearZones(PageOnPaper const& page, PrintRules const& rules, Findings& findings) {
@@ -64,7 +77,7 @@ void checkClearZones(PageOnPaper const& page, PrintRules const& rules, Findings&
             findings.add(Code::ClearZone, page.at(*found),
                          textInWords(page.page, *found) + " stands where nothing may, " +
                              placeInWords(zone.box),
-                         "move it " + inWords(wayOutOf(*found, zone.box)));
+                         "move it " + inWords(wayOutOf(*found, zone.box, page.sheet())));
     }
 }
 

@@ -10,15 +10,11 @@ namespace {
 
 /// Print that is smaller by a fifth above an address is the sender's.
 constexpr double SENDERS_SIZE = 0.8;
-/// Around words, in 1/100 mm: their letters' edges when a page is drawn coarsely.
-constexpr int RIM = 100;
+/// How far letters reach beyond the boxes of their words when a page is drawn coarsely, and in another font
+/// than the one that was meant.
+int rimOf(int size) { return 100 + size / 3; }
 
 Box grown(Box const& box, int by) { return {box.left - by, box.top - by, box.right + by, box.bottom + by}; }
-
-bool isInside(Box const& box, Box const& room) {
-    return box.left >= room.left && box.top >= room.top && box.right <= room.right &&
-           box.bottom <= room.bottom;
-}
 
 bool isIn(std::vector<Box> const& boxes, Reader::Word const& word) {
     return std::ranges::any_of(boxes, [&](Box const& box) { return box.contains(word.box.centre()); });
@@ -32,7 +28,7 @@ public:
           meant_(page.address->parts) {
         addSendersLine();
         for (Box& box : meant_)
-            box = grown(box, RIM);
+            box = grown(box, rimOf(addressSize()));
     }
 
     void checkAddress() {
@@ -50,7 +46,7 @@ public:
             return;
         for (TextBlock const& block : blocksIn(wordsIn(*found))) {
             add(block.box, block.text);
-            meant_.push_back(grown(block.box, RIM));
+            meant_.push_back(grown(block.box, rimOf(block.size)));
         }
         if (std::optional<Box> const rest = ink())
             add(*rest, "something");
@@ -64,7 +60,7 @@ private:
 
     void add(Box const& box, std::string const& text) {
         findings_.add(Code::TextInWindow, page_.at(box), text + " shows through the window",
-                      "move it " + inWords(wayOutOf(box, box_)));
+                      "move it " + inWords(wayOutOf(box, box_, page_.sheet())));
     }
 
     Reader::Page wordsIn(Box const& found) const {

@@ -14,6 +14,7 @@ struct PageOnPaper {
     /// The letter's address when it stands on this page, or null.
     PlacedAddress const* address = nullptr;
 
+    Box sheet() const { return {0, 0, page.width, page.height}; }
     Place at(Box const& box = {}) const { return {page.number, box}; }
 };
 

@@ -9,6 +9,7 @@
 #include <array>
 #include <cstdlib>
 #include <iterator>
+#include <utility>
 
 namespace Production {
 namespace {
@@ -47,16 +48,24 @@ std::string inShortQuotes(std::string const& text) {
 
 } // namespace
 
+bool isInside(Box const& box, Box const& room) {
+    return box.left >= room.left && box.top >= room.top && box.right <= room.right &&
+           box.bottom <= room.bottom;
+}
+
 Way wayInto(Box const& box, Box const& room) {
     return {intoRoom(box.left, box.right, room.left, room.right),
             intoRoom(box.top, box.bottom, room.top, room.bottom)};
 }
 
-Way wayOutOf(Box const& box, Box const& zone) {
+Way wayOutOf(Box const& box, Box const& zone, Box const& room) {
     std::array const ways{Way{0, zone.top - box.bottom}, Way{0, zone.bottom - box.top},
                           Way{zone.left - box.right, 0}, Way{zone.right - box.left, 0}};
-    return *std::ranges::min_element(ways, {},
-                                     [](Way const& way) { return std::abs(way.right) + std::abs(way.down); });
+    auto const cost = [&](Way const& way) {
+        bool const stays = isInside(box.movedBy({way.right, way.down}), room);
+        return std::pair(!stays, std::abs(way.right) + std::abs(way.down));
+    };
+    return *std::ranges::min_element(ways, {}, cost);
 }
 
 std::string inWords(Way const& way) {
@@ -88,9 +97,12 @@ std::vector<TextBlock> blocksIn(Reader::Page const& page) {
     std::vector<TextBlock> blocks;
     for (Reader::Block const& block : layout.blocks) {
         std::string text;
-        for (std::size_t line = block.firstLine; line < block.endLine; ++line)
+        int size = 0;
+        for (std::size_t line = block.firstLine; line < block.endLine; ++line) {
             text += (text.empty() ? "" : " ") + Reader::textOf(page, layout.lines[line]);
-        blocks.push_back({block.box, inShortQuotes(text)});
+            size = std::max(size, layout.lines[line].size);
+        }
+        blocks.push_back({block.box, size, inShortQuotes(text)});
     }
     return blocks;
 }

@@ -17,10 +17,12 @@ struct Way {
     int down = 0;
 };
 
+bool isInside(Box const& box, Box const& room);
+
 /// The shortest way of `box` into `room`; 0 where it lies there, or is too large to.
 Way wayInto(Box const& box, Box const& room);
-/// The shortest way of `box` out of `zone`.
-Way wayOutOf(Box const& box, Box const& zone);
+/// The shortest way of `box` out of `zone` on which it stays in `room`, or else the shortest.
+Way wayOutOf(Box const& box, Box const& zone, Box const& room);
 
 /// "12 mm right", "12 mm right and 3.5 mm up".
 std::string inWords(Way const& way);
@@ -36,6 +38,8 @@ Reader::Page wordsOf(Reader::Page const& page, Box const& box);
 /// Text that stands together, in quotes and cut when it is long.
 struct TextBlock {
     Box box;
+    /// Of its largest print.
+    int size = 0;
     std::string text;
 };
 std::vector<TextBlock> blocksIn(Reader::Page const& page);

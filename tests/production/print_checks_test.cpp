@@ -224,6 +224,13 @@ TEST(ClearZones, AreOnTheFirstPageOrOnAll) {
     EXPECT_THAT(pages("all"), ElementsAre(1, 2));
 }
 
+TEST(ClearZones, AreLeftOnAWayThatStaysOnThePage) {
+    json::Value const bottom =
+        R"({"clear_zones": [{"left": 0, "top": 28000, "right": 21000, "bottom": 29700}]})"_json;
+    Finding const found = only(findingsIn(a4Page(box({5000, 29000, 6000, 29200})), printRules(bottom)));
+    EXPECT_THAT(found.fix, testing::MatchesRegex("move it 1[0-9.]+ mm up"));
+}
+
 TEST(ClearZones, SayWhatStandsInThemAndTheShortestWayOut) {
     Finding const found =
         only(withoutFonts(findingsIn(a4Page(text(5500, 5900, "Total")), printRules(oneZone()))));

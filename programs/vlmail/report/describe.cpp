@@ -125,6 +125,22 @@ Zone zoneOf(ZoneTrace const& seen, LetterReading const& letter, Reader::Page con
     return zone;
 }
 
+/// Each picture makes the report longer, and one of a kind shows what is wrong.
+constexpr std::size_t MOST_SHEETS = 20;
+
+Fault faultOf(Production::Finding const& finding, Letter& letter, Reader::Document& document) {
+    Fault fault{nameOf(finding.code), finding.isError(),
+                finding.pages.empty() ? "document" : pagesInWords(finding.pages), finding.says, finding.fix};
+    fault.box = finding.box;
+    if (finding.box == Box())
+        return fault;
+    for (int const page : finding.pages)
+        if (std::ranges::find(letter.sheets, page, &Sheet::page) != letter.sheets.end() ||
+            letter.sheets.size() < MOST_SHEETS)
+            fault.sheets.push_back(placeAmong(letter.sheets, page, document));
+    return fault;
+}
+
 Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader::PageTrace const& trace) {
     Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(trace.page, document)}};
     for (ZoneTrace const& seen : trace.zones) {
@@ -132,6 +148,8 @@ Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader
         letter.zones.push_back(zoneOf(seen, reading, document.page(page)));
         letter.zones.back().sheet = placeAmong(letter.sheets, page, document);
     }
+    for (Production::Finding const& finding : reading.findings)
+        letter.faults.push_back(faultOf(finding, letter, document));
     return letter;
 }
 

@@ -72,11 +72,17 @@ std::string styleOf(Box const& box, Sheet const& sheet) {
            ";width:" + percent(box.width(), sheet.width) + ";height:" + percent(box.height(), sheet.height);
 }
 
-std::string overlay(std::string const& anchor, std::string const& look, Box const& box, Sheet const& sheet,
-                    std::string const& tag, std::string const& label) {
-    return "<a class=\"" + look + "\" id=\"" + anchor + "\" href=\"#" + rowAnchor(anchor) + "\" style=\"" +
+/// A mark on a sheet that leads to `row`.
+std::string overlay(std::string const& anchor, std::string const& row, std::string const& look,
+                    Box const& box, Sheet const& sheet, std::string const& tag, std::string const& label) {
+    return "<a class=\"" + look + "\" id=\"" + anchor + "\" href=\"#" + row + "\" style=\"" +
            styleOf(box, sheet) + "\" aria-label=\"" + escaped(label) + "\"><span class=\"tag\">" +
            isolated(tag) + "</span></a>\n";
+}
+
+std::string overlay(std::string const& anchor, std::string const& look, Box const& box, Sheet const& sheet,
+                    std::string const& tag, std::string const& label) {
+    return overlay(anchor, rowAnchor(anchor), look, box, sheet, tag, label);
 }
 
 std::string kindOf(Zone const& zone) { return zone.isAddressWindow ? "address window" : "zone"; }
@@ -107,6 +113,17 @@ std::string overlayOf(Field const& field, std::string const& anchor, Sheet const
     return html;
 }
 
+/// The name stands where the sheet does not end.
+std::string overlayOf(Fault const& fault, std::string const& anchor, std::string const& row,
+                      Sheet const& sheet) {
+    constexpr int TAG_HEIGHT = 500;
+    Box const box = onPage(fault.box, sheet);
+    std::string look = fault.isError ? "fault" : "fault slight";
+    look += box.centre().x > sheet.width / 2 ? " front" : "";
+    look += box.bottom > sheet.height - TAG_HEIGHT ? " above" : "";
+    return overlay(anchor, row, look, box, sheet, fault.code, fault.code + ": " + fault.says);
+}
+
 /// Those of a sheet, the largest first, so that none hides another from the pointer.
 std::vector<std::size_t> bySize(std::vector<Zone> const& zones, std::size_t sheet) {
     std::vector<std::size_t> order;
@@ -119,6 +136,19 @@ std::vector<std::size_t> bySize(std::vector<Zone> const& zones, std::size_t shee
     std::stable_sort(order.begin(), order.end(),
                      [&](std::size_t one, std::size_t other) { return area(one) > area(other); });
     return order;
+}
+
+std::string faultsOn(Letter const& letter, std::size_t place, std::string const& anchor) {
+    std::string html;
+    for (std::size_t i = 0; i < letter.faults.size(); ++i) {
+        Fault const& fault = letter.faults[i];
+        std::string const one = numbered(anchor, 'p', i);
+        auto const on = std::ranges::find(fault.sheets, place);
+        if (on != fault.sheets.end())
+            html += overlayOf(fault, on == fault.sheets.begin() ? one : numbered(one, 's', place),
+                              rowAnchor(one), letter.sheets[place]);
+    }
+    return html;
 }
 
 std::string overlaysOf(Letter const& letter, std::size_t place, std::string const& anchor) {
@@ -137,7 +167,7 @@ std::string overlaysOf(Letter const& letter, std::size_t place, std::string cons
                 html += overlayOf(fields[k], numbered(numbered(anchor, 'z', index), 'f', k), sheet);
         }
     }
-    return html;
+    return html + faultsOn(letter, place, anchor);
 }
 
 std::string pictureOf(Sheet const& sheet) {
@@ -146,12 +176,18 @@ std::string pictureOf(Sheet const& sheet) {
     return "<img alt=\"page " + std::to_string(sheet.page) + "\" src=\"" + pngUri(sheet.png) + "\">\n";
 }
 
+bool isSearched(Letter const& letter, std::size_t sheet) {
+    return sheet == 0 || std::ranges::find(letter.zones, sheet, &Zone::sheet) != letter.zones.end();
+}
+
 std::string figureOf(Letter const& letter, std::size_t place, std::string const& anchor) {
     Sheet const& sheet = letter.sheets[place];
     return "<figure><div class=\"sheet\" style=\"--w:" + std::to_string(std::max(sheet.width, 1)) +
            ";--h:" + std::to_string(std::max(sheet.height, 1)) + "\">\n" + pictureOf(sheet) +
            overlaysOf(letter, place, anchor) + "</div>\n<figcaption>Page " + std::to_string(sheet.page) +
-           ", on which the fields of this letter were searched.</figcaption></figure>\n";
+           (isSearched(letter, place) ? ", on which the fields of this letter were searched"
+                                      : ", on which something is wrong on paper") +
+           ".</figcaption></figure>\n";
 }
 
 std::string figuresOf(Letter const& letter, std::string const& anchor) {
@@ -212,6 +248,27 @@ std::string tableOf(Letter const& letter, std::string const& anchor) {
     return html + "</table>\n";
 }
 
+std::string rowOf(Fault const& fault, std::string const& anchor) {
+    std::string const code = fault.sheets.empty()
+                                 ? escaped(fault.code)
+                                 : "<a href=\"#" + anchor + "\">" + escaped(fault.code) + "</a>";
+    return "<tr id=\"" + rowAnchor(anchor) + "\" class=\"" + (fault.isError ? "bad" : "") +
+           "\"><th scope=\"row\">" + code + "</th><td>" +
+           stateSpan(fault.isError ? "\u2717 error" : "! warning", fault.isError ? "bad" : "quiet") +
+           "<small>" + escaped(fault.pages) + "</small></td><td>" + isolated(fault.says) + "<small>" +
+           isolated(fault.fix) + "</small></td></tr>\n";
+}
+
+std::string faultsOf(Letter const& letter, std::string const& anchor) {
+    if (letter.faults.empty())
+        return {};
+    std::string html = "<table><caption>On paper</caption>\n<thead><tr><th scope=\"col\">Found</th><th "
+                       "scope=\"col\">State</th><th scope=\"col\">What and remedy</th></tr></thead>\n";
+    for (std::size_t i = 0; i < letter.faults.size(); ++i)
+        html += rowOf(letter.faults[i], numbered(anchor, 'p', i));
+    return html + "</table>\n";
+}
+
 std::string whyNotOf(Letter const& letter) {
     if (letter.whyNot.empty())
         return {};
@@ -231,7 +288,7 @@ std::string letterHtml(Letter const& letter, std::string const& anchor, std::str
            letterHeading(letter, anchor, count) + "<a class=\"skip\" href=\"#" + fields +
            "\">Skip the picture</a>\n<div class=\"beside\">\n" + figuresOf(letter, anchor) +
            "<div class=\"fields\" id=\"" + fields + "\" tabindex=\"-1\">\n" + whyNotOf(letter) +
-           tableOf(letter, anchor) + "</div></div>\n</article>\n";
+           faultsOf(letter, anchor) + tableOf(letter, anchor) + "</div></div>\n</article>\n";
 }
 
 std::string lettersHtml(Document const& document, std::string const& anchor) {
@@ -283,6 +340,7 @@ constexpr char const* LEGEND = R"html(<ul class="legend" aria-label="Marks on th
 <li><span class="match"></span>found</li>
 <li><span class="match quiet"></span>matched, but not used</li>
 <li><span class="match bad"></span>&#10007; invalid</li>
+<li><span class="fault"></span>&#10007; wrong on paper</li>
 </ul>
 )html";
 

@@ -60,14 +60,28 @@ struct Sheet {
     std::string whyNoPicture = {};
 };
 
+/// What would go wrong with a letter on paper.
+struct Fault {
+    std::string code;
+    bool isError = true;
+    /// In words.
+    std::string pages;
+    std::string says;
+    std::string fix;
+    /// Drawn at the box on each of these, by their places among the sheets of the letter; none without one.
+    std::vector<std::size_t> sheets = {};
+    Reader::Box box = {};
+};
+
 struct Letter {
     /// All its pages in words.
     std::string pages;
     /// Why it cannot go out; empty when it can.
     std::string whyNot = {};
-    /// Its first page, and others on which zones lie.
+    /// Its first page, and others on which zones or faults lie.
     std::vector<Sheet> sheets = {};
     std::vector<Zone> zones = {};
+    std::vector<Fault> faults = {};
 };
 
 struct Document {

@@ -61,6 +61,8 @@ figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9em; }
     background-image: linear-gradient(rgb(85 93 104 / 14%) 0 100%); }
 .match.bad { border: 2px dashed #b3152a; background-image: repeating-linear-gradient(135deg, rgb(179 21 42 / 22%) 0 3px,
     rgb(179 21 42 / 6%) 3px 8px); }
+.fault { border: 3px double #d00000; background-image: linear-gradient(rgb(208 0 0 / 16%) 0 100%); }
+.fault.slight { border: 2px dotted #d00000; background-image: none; }
 .tag { position: absolute; z-index: 1; padding: 0 .3em; font: 600 .68rem/1.35 system-ui, sans-serif; white-space: nowrap;
     font-size: clamp(.3rem, 1.5cqw, .72rem); color: #fff; background: #35548c; }
 .zone > .tag { left: -1px; bottom: 100%; }
@@ -71,6 +73,9 @@ figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9em; }
 .match.above > .tag { left: -1px; top: auto; bottom: 100%; }
 .match.quiet > .tag { background: #555d68; }
 .match.bad > .tag { background: #b3152a; }
+.fault > .tag { left: -1px; top: 100%; background: #d00000; }
+.fault.front > .tag { left: auto; right: -1px; }
+.fault.above > .tag { top: auto; bottom: 100%; }
 .sheet a:focus-visible { outline: 3px solid #0b57d0; box-shadow: 0 0 0 6px #fff; z-index: 3; }
 .sheet a:hover { z-index: 2; box-shadow: 0 0 0 2px #0b57d0; }
 .sheet a:target { z-index: 2; outline: 4px solid #d97706; outline-offset: 1px; }

@@ -50,6 +50,7 @@ Report::Document hostileDocument() {
     letter.zones.push_back({HOSTILE, {}, false, false, {}, 0, HOSTILE});
     letter.pages = letter.whyNot = letter.sheets[0].whyNoPicture = HOSTILE;
     letter.sheets[0].png.clear();
+    letter.faults.push_back({HOSTILE, true, HOSTILE, HOSTILE, HOSTILE, {0}, {0, 0, 100, 100}});
     return {HOSTILE, "", HOSTILE, HOSTILE, false, {letter}};
 }
 
@@ -316,6 +317,36 @@ TEST(ReportPage, KnowsTheDarkPaperAndTheKeyboard) {
     std::string const html = page("", {});
     for (char const* rule : {"@media (prefers-color-scheme: dark)", "@media print", ":focus-visible"})
         EXPECT_THAT(html, HasSubstr(rule));
+}
+
+TEST(FaultsOnPaper, AreDrawnOnEachOfTheirSheetsAndToldInATable) {
+    Report::Letter letter = letterWith({});
+    letter.sheets.push_back({2, 20000, 30000, "png"});
+    letter.faults.push_back({"clear-zone", true, "pages 1-2", "it stands there", "move it 5 mm up", {0, 1},
+                             {0, 0, 5000, 3000}});
+    letter.faults.push_back({"embedded-file-lost", false, "document", "it is lost", "send it", {}, {}});
+    std::string const html = section(documentWith({letter}), 1);
+    EXPECT_THAT(html, HasSubstr("<a class=\"fault\" id=\"d1l1p1\" href=\"#d1l1p1r\" style=\"left:0%;top:"));
+    EXPECT_THAT(html, HasSubstr("<a class=\"fault\" id=\"d1l1p1s2\" href=\"#d1l1p1r\""));
+    EXPECT_THAT(html, HasSubstr("<tr id=\"d1l1p1r\" class=\"bad\"><th scope=\"row\"><a "
+                                "href=\"#d1l1p1\">clear-zone</a></th>"));
+    EXPECT_THAT(html, HasSubstr("<small>pages 1-2</small>"));
+    EXPECT_THAT(html, HasSubstr("<th scope=\"row\">embedded-file-lost</th>"));
+    EXPECT_THAT(html, HasSubstr("Page 2, on which something is wrong on paper."));
+    EXPECT_THAT(html, Not(HasSubstr("d1l1p2\"")));
+}
+
+TEST(FaultsOnPaper, HaveTheirNamesOnTheSheet) {
+    auto const lookOf = [](Reader::Box const& box, bool isError) {
+        Report::Letter letter = letterWith({});
+        letter.faults.push_back({"clear-zone", isError, "page 1", "a", "b", {0}, box});
+        std::string const html = section(documentWith({letter}), 1);
+        std::size_t const begin = html.find("<a class=\"fault") + 10;
+        return html.substr(begin, html.find('"', begin) - begin);
+    };
+    EXPECT_EQ(lookOf({0, 0, 100, 100}, true), "fault");
+    EXPECT_EQ(lookOf({19000, 0, 20000, 100}, false), "fault slight front");
+    EXPECT_EQ(lookOf({0, 29000, 100, 30000}, true), "fault above");
 }
 
 } // namespace
