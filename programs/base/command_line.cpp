@@ -17,6 +17,33 @@ std::string whyNotCount(std::string const& text) {
     return isCount ? "" : "\"" + text + "\" is no number above 0";
 }
 
+std::vector<std::string> namesOf(CLI::Option const& option) {
+    std::vector<std::string> names;
+    for (std::string const& name : option.get_snames())
+        names.push_back("-" + name);
+    for (std::string const& name : option.get_lnames())
+        names.push_back("--" + name);
+    if (names.empty())
+        names.push_back(option.get_name());
+    return names;
+}
+
+OptionInfo infoOf(CLI::Option const& option) {
+    bool const isFlag = option.get_items_expected_max() == 0;
+    return {namesOf(option),          isFlag ? "" : option.get_type_name(),
+            option.get_description(), option.get_default_str(),
+            option.get_required(),    option.get_items_expected_max() > 1};
+}
+
+CommandInfo infoOf(CLI::App const& app) {
+    CommandInfo info{app.get_name(), app.get_description()};
+    for (CLI::Option const* const option : app.get_options())
+        info.options.push_back(infoOf(*option));
+    for (CLI::App const* const command : app.get_subcommands([](CLI::App const*) { return true; }))
+        info.commands.push_back(infoOf(*command));
+    return info;
+}
+
 } // namespace
 
 Option const& Option::required() const {
@@ -84,10 +111,30 @@ Option Command::addOffFlag(std::string const& names, bool& value, std::string co
 
 void Command::whenNamed(std::function<void()> call) const { app_->callback(std::move(call)); }
 
+CommandInfo Command::info() const { return infoOf(*app_); }
+
+std::string Command::helpOf(std::vector<std::string> const& words) const {
+    CLI::App const* app = app_;
+    std::string above;
+    for (std::string const& word : words) {
+        above += (above.empty() ? "" : " ") + app->get_name();
+        auto const named = app->get_subcommands([&](CLI::App const* each) { return each->check_name(word); });
+        if (named.empty())
+            return {};
+        app = named.front();
+    }
+    return app->help(above);
+}
+
 CommandLine::CommandLine(std::string const& description, std::string const& program)
     : app_(std::make_unique<CLI::App>(description, program)) {}
 
 CommandLine::~CommandLine() = default;
+
+void CommandLine::addVersion(std::function<std::string()> text) {
+    app_->set_version_flag("--version", std::move(text),
+                           "Print the version of the program and of its libraries");
+}
 
 bool CommandLine::read(int argc, char const* const* argv, std::ostream& out) {
     try {

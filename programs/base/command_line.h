@@ -2,6 +2,7 @@
 // The command line of a program: options, subcommands and the help that explains them. One source stands on
 // the parsing library, which costs seconds to compile.
 
+#include "programs/base/command_tree.h"
 #include "programs/base/error.h"
 
 #include <cstddef>
@@ -71,6 +72,11 @@ public:
     /// UsageError.
     void whenNamed(std::function<void()> call) const;
 
+    /// What has been added until now, commands in their order.
+    CommandInfo info() const;
+    /// The help of the command that these words name below this one; empty when there is none.
+    std::string helpOf(std::vector<std::string> const& words) const;
+
 private:
     CLI::App* app_;
 };
@@ -81,8 +87,10 @@ public:
     ~CommandLine();
 
     Command command() const { return Command(*app_); }
-    /// Whether there is something to do: false when help was asked for, which stands in `out` then. Throws
-    /// UsageError.
+    /// Adds --version, which prints what the function gives.
+    void addVersion(std::function<std::string()> text);
+    /// Whether there is something to do: false when help or the version was asked for, which stands in `out`
+    /// then. Throws UsageError.
     bool read(int argc, char const* const* argv, std::ostream& out);
 
 private:

@@ -68,6 +68,8 @@ SharedMemBuffer bufferIn(SQLite::Column const& column) {
 
 } // namespace
 
+std::string databaseVersion() { return SQLite::getLibVersion(); }
+
 Database::DatabaseKind const& packDatabase() {
     static Database::DatabaseKind const kind{"pack database", APPLICATION_ID, {SCHEMA_1}};
     return kind;

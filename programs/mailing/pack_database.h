@@ -15,6 +15,9 @@
 
 namespace Mailing {
 
+/// Of the library that keeps it.
+std::string databaseVersion();
+
 // A database holds any number of packs. A pack is one row of `packs` (id, cfg_id, title, metadata, complete,
 // created_at) and one row of `pages` for each page (pack, position from 0, document, page, data). Metadata
 // and pages are products of PageSaverI::zipDbData. Readers see a pack only when `complete` is 1.

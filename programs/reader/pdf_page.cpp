@@ -65,6 +65,8 @@ struct PdfPageWriter::Parsed {
     std::vector<QPDFPageObjectHelper> pages;
 };
 
+std::string writerVersion() { return QPDF::QPDFVersion(); }
+
 PdfPageWriter::PdfPageWriter(std::string_view pdf, std::string where) : pdf_(pdf), where_(std::move(where)) {}
 
 PdfPageWriter::~PdfPageWriter() = default;

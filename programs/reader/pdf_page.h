@@ -10,6 +10,9 @@
 
 namespace Reader {
 
+/// Of the library that pages are written with.
+std::string writerVersion();
+
 /// Writes pages of one PDF as PDFs of their own. The PDF is parsed when the first page is written.
 class PdfPageWriter {
 public:

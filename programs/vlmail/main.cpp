@@ -1,5 +1,6 @@
 #include "programs/vlmail/commands/command.h"
 
+#include "programs/base/commit.h"
 #include "programs/base/out_of_memory.h"
 #include "programs/base/pending_file.h"
 #include "vlservice/platform/log.h"
@@ -14,7 +15,7 @@ int runOnTerminal(int argc, char** argv) {
     Base::removePendingFilesOnSignals();
     VlMail::Terminal const terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1};
     Log::setSink([&](LogPriority, std::string const& line) { terminal.complain(line); });
-    int const status = VlMail::run(argc, argv, terminal);
+    int const status = VlMail::run(argc, argv, terminal, Base::COMMIT);
     Log::setSink({});
     return status;
 }

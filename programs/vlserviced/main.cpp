@@ -1,3 +1,4 @@
+#include "programs/base/commit.h"
 #include "programs/base/host_port.h"
 #include "programs/base/out_of_memory.h"
 #include "programs/base/plain_log.h"
@@ -27,7 +28,7 @@ void serve(VlServiced::Options const& options) {
 }
 
 int run(int argc, char** argv) {
-    auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr);
+    auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr, Base::COMMIT);
     if (int const* const status = std::get_if<int>(&parsed))
         return *status;
     serve(std::get<VlServiced::Options>(parsed));

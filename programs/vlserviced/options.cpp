@@ -1,17 +1,20 @@
 #include "programs/vlserviced/options.h"
 
 #include "programs/base/command_line.h"
+#include "programs/base/version.h"
+#include "programs/mailing/pack_database.h"
 
 #include <ostream>
 
 namespace VlServiced {
 
-std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::ostream& out,
-                                        std::ostream& err) {
-    Options options;
-    Base::CommandLine line(
-        "Keeps settings for the clients of a network and brings their mailings on the way.", "vlserviced");
-    Base::Command const command = line.command();
+namespace {
+
+constexpr char const* PROGRAM = "vlserviced";
+constexpr char const* DESCRIPTION =
+    "Keeps settings for the clients of a network and brings their mailings on the way.";
+
+void addOptions(Base::Command const& command, Options& options) {
     command
         .addOption("--data", options.data,
                    "Folder with everything that the service keeps; made when it is not there")
@@ -35,12 +38,32 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
     command.addOffFlag("--no-discovery", options.answersDiscovery,
                        "Do not answer clients that look for a service");
     command.addFlag("--verbose", options.verbose, "Log every datagram of discovery");
+}
+
+} // namespace
+
+std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::ostream& out,
+                                        std::ostream& err, std::string const& commit) {
+    Options options;
+    Base::CommandLine line(DESCRIPTION, PROGRAM);
+    line.addVersion([&commit] {
+        return Base::versionText(PROGRAM, commit, {{"SQLite", Mailing::databaseVersion()}});
+    });
+    addOptions(line.command(), options);
     try {
         return line.read(argc, argv, out) ? std::variant<Options, int>(options) : 0;
     } catch (Base::UsageError const& wrong) {
         err << "vlserviced: " << wrong.what() << "; --help explains\n";
         return 1;
     }
+}
+
+Base::CommandInfo commandInfo() {
+    Options options;
+    Base::CommandLine line(DESCRIPTION, PROGRAM);
+    line.addVersion([] { return std::string(); });
+    addOptions(line.command(), options);
+    return line.command().info();
 }
 
 } // namespace VlServiced

@@ -1,6 +1,8 @@
 #pragma once
 // The command line of vlserviced.
 
+#include "programs/base/command_tree.h"
+
 #include <cstdint>
 #include <filesystem>
 #include <iosfwd>
@@ -24,8 +26,12 @@ struct Options {
     bool verbose = false;
 };
 
-/// The options, or the exit status of a run that ends here: help was wanted, or the command line is wrong.
+/// The options, or the exit status of a run that ends here: help or the version was wanted, or the command
+/// line is wrong. `commit` is what --version tells.
 std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::ostream& out,
-                                        std::ostream& err);
+                                        std::ostream& err, std::string const& commit = {});
+
+/// All that the command line knows, for the manual.
+Base::CommandInfo commandInfo();
 
 } // namespace VlServiced

@@ -28,7 +28,7 @@ vlservice/pack
 vlservice/ipc
 vlservice
 programs/base
-programs/patterns programs/protocol programs/database
+programs/manual programs/patterns programs/protocol programs/database
 programs/mailing
 programs/reader
 programs/production programs/policy programs/channel

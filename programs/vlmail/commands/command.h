@@ -5,6 +5,7 @@
 #include "programs/vlmail/terminal/terminal.h"
 
 #include <functional>
+#include <string>
 
 namespace VlMail {
 
@@ -15,6 +16,8 @@ using Task = std::function<int(Terminal const&)>;
 // One source file a subcommand.
 void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);
+/// Goes behind all others: it tells of them.
+void addHelpCommand(Base::Command const& app, Task& task);
 void addLetterCommand(Base::Command const& app, Task& task);
 void addMailCommand(Base::Command const& app, Task& task);
 void addPackCommand(Base::Command const& app, Task& task);
@@ -31,7 +34,10 @@ void addUploadCommand(Base::Command const& app, Task& task);
 extern char const OUT_OF_MEMORY[];
 
 /// Parses the command line, carries it out and gives the exit status. Throws nothing derived from
-/// std::exception.
-int run(int argc, char const* const* argv, Terminal const& terminal);
+/// std::exception. `commit` is what --version tells.
+int run(int argc, char const* const* argv, Terminal const& terminal, std::string const& commit = {});
+
+/// All that the command line knows, for the manual.
+Base::CommandInfo commandInfo();
 
 } // namespace VlMail

@@ -1,6 +1,9 @@
 #include "programs/vlmail/commands/command.h"
 
 #include "programs/base/plain_stream.h"
+#include "programs/base/version.h"
+#include "programs/mailing/pack_database.h"
+#include "programs/reader/library_versions.h"
 
 #include <new>
 #include <ostream>
@@ -26,13 +29,24 @@ void addCommands(Base::Command const& command, Task& task) {
     addStatusCommand(command, task);
     addStrandedCommands(command, task);
     addUploadCommand(command, task);
+    addHelpCommand(command, task);
+}
+
+constexpr char const* PROGRAM = "vlmail";
+constexpr char const* DESCRIPTION =
+    "Sends letters out of documents: reads them, says what was found, and packs mailings.";
+
+std::string versionText(std::string const& commit) {
+    std::vector<Base::LibraryVersion> libraries = Reader::libraryVersions();
+    libraries.push_back({"SQLite", Mailing::databaseVersion()});
+    return Base::versionText(PROGRAM, commit, std::move(libraries));
 }
 
 /// Lets std::bad_alloc out: telling of a failure takes memory, too.
-int runPlainly(int argc, char const* const* argv, Terminal const& terminal) {
+int runPlainly(int argc, char const* const* argv, Terminal const& terminal, std::string const& commit) {
     try {
-        Base::CommandLine line(
-            "Sends letters out of documents: reads them, says what was found, and packs mailings.", "vlmail");
+        Base::CommandLine line(DESCRIPTION, PROGRAM);
+        line.addVersion([&commit] { return versionText(commit); });
         Task task;
         addCommands(line.command(), task);
         return line.read(argc, argv, terminal.out) ? task(terminal) : FINE;
@@ -46,10 +60,10 @@ int runPlainly(int argc, char const* const* argv, Terminal const& terminal) {
     return FAILED;
 }
 
-int runAndFlush(int argc, char const* const* argv, Terminal const& terminal) {
+int runAndFlush(int argc, char const* const* argv, Terminal const& terminal, std::string const& commit) {
     // Names and values from documents, mailings and services stand in what commands print.
     Base::PlainStream out(terminal.out);
-    int const status = runPlainly(argc, argv, {out, terminal.err, terminal.showsProgress});
+    int const status = runPlainly(argc, argv, {out, terminal.err, terminal.showsProgress}, commit);
     if (out.flush())
         return status;
     terminal.complain("the results cannot be written; make room on the disk, or send them elsewhere");
@@ -58,9 +72,17 @@ int runAndFlush(int argc, char const* const* argv, Terminal const& terminal) {
 
 } // namespace
 
-int run(int argc, char const* const* argv, Terminal const& terminal) {
+Base::CommandInfo commandInfo() {
+    Base::CommandLine line(DESCRIPTION, PROGRAM);
+    line.addVersion([] { return std::string(); });
+    Task task;
+    addCommands(line.command(), task);
+    return line.command().info();
+}
+
+int run(int argc, char const* const* argv, Terminal const& terminal, std::string const& commit) {
     try {
-        return runAndFlush(argc, argv, terminal);
+        return runAndFlush(argc, argv, terminal, commit);
     } catch (std::bad_alloc const&) {
         terminal.err << OUT_OF_MEMORY << std::flush;
         return FAILED;

@@ -1,0 +1,10 @@
+# cmake -DOUT=FILE.cpp -DPAGES=A.md,B.md -P EmbedPages.cmake: the pages as constants of a program.
+string(REPLACE "," ";" pages "${PAGES}")
+set(text "#include \"programs/manual/pages.h\"\n\nnamespace Manual {\nnamespace {\n\nconstexpr Page PAGES[] = {\n")
+foreach(page ${pages})
+    get_filename_component(name "${page}" NAME)
+    file(READ "${page}" content)
+    string(APPEND text "{\"${name}\", R\"PAGE(${content})PAGE\"},\n")
+endforeach()
+string(APPEND text "};\n\n} // namespace\n\nstd::span<Page const> pages() { return PAGES; }\n\n} // namespace Manual\n")
+file(WRITE "${OUT}" "${text}")

@@ -1,0 +1,15 @@
+# cmake -DFOLDER=SOURCES -DOUT=FILE.cpp -P WriteCommit.cmake: the commit that is built; touches the file only when it is another one.
+set(commit "")
+find_program(GIT git)
+if(GIT AND EXISTS ${FOLDER}/.git)
+    execute_process(COMMAND ${GIT} -C ${FOLDER} describe --always --dirty=+ --exclude=*
+        OUTPUT_VARIABLE commit OUTPUT_STRIP_TRAILING_WHITESPACE ERROR_QUIET)
+endif()
+set(text "#include \"programs/base/commit.h\"\n\nnamespace Base {\n\nchar const* const COMMIT = \"${commit}\";\n\n} // namespace Base\n")
+set(before "")
+if(EXISTS ${OUT})
+    file(READ ${OUT} before)
+endif()
+if(NOT text STREQUAL before)
+    file(WRITE ${OUT} "${text}")
+endif()

@@ -1,0 +1,44 @@
+#include "programs/vlmail/commands/topics.h"
+
+namespace VlMail {
+namespace {
+
+constexpr char const* CLIENT = "client.md";
+constexpr char const* LETTERS = "letters-and-mailings.md";
+constexpr char const* PRESETS_TOOLS = "presets-tools.md";
+
+constexpr Manual::Topic TOPICS[] = {
+    {"check", "check.md", ""},
+    {"discover", CLIENT, "Looking for the service"},
+    {"letter", LETTERS, "Reading"},
+    {"mail", LETTERS, "Mailing"},
+    {"plan", LETTERS, "Planning"},
+    {"pack list", CLIENT, "The index of a mailing"},
+    {"presets draft", PRESETS_TOOLS, "A preset to begin with"},
+    {"presets match", PRESETS_TOOLS, "Which presets a name gets"},
+    {"presets lint", PRESETS_TOOLS, "What is wrong with settings"},
+    {"presets test", PRESETS_TOOLS, "Whether documents still give what they gave"},
+    {"price", CLIENT, "Prices"},
+    {"settings show", CLIENT, "What counts at a node"},
+    {"settings tree", CLIENT, "All nodes"},
+    {"settings ids", CLIENT, "The nodes of a user"},
+    {"settings service", CLIENT, "The settings of the service"},
+    {"status", CLIENT, "How far mailings are"},
+    // Beside the commands.
+    {Manual::EXIT_STATUS, LETTERS, "Exit status"},
+    {"explain", "explain.md", ""},
+    {"formats", "formats.md", ""},
+    {"jobs", "service.md", "Jobs"},
+    {"reading", "reading.md", ""},
+    {"report", "report.md", ""},
+    {"security", "security.md", ""},
+    {"service", "service.md", ""},
+    {"settings-documents", "settings.md", ""},
+    {"presets-documents", "presets.md", ""},
+};
+
+} // namespace
+
+std::span<Manual::Topic const> topics() { return TOPICS; }
+
+} // namespace VlMail
