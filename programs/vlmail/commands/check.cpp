@@ -32,6 +32,8 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         << '\n';
     for (Production::Finding const& finding : letter.findings)
         out << linesFor(finding, 4);
+    if (!letter.coverAddress.empty())
+        out << "    a cover page with the address goes in front\n";
 }
 
 void print(std::ostream& out, DocumentReading const& reading) {

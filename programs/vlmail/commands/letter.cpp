@@ -70,6 +70,8 @@ void print(std::ostream& out, LetterReading const& letter, std::size_t number, s
         out << "    look at " << warning << '\n';
     for (Production::Finding const& finding : letter.findings)
         out << linesFor(finding, 4);
+    if (!letter.coverAddress.empty())
+        out << "    a cover page with the address goes in front\n";
 }
 
 void printLetters(std::ostream& out, DocumentReading const& reading) {

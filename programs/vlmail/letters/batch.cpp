@@ -23,8 +23,10 @@ std::string pack(ReadResult const& result) {
     message.put(result.sha256);
     message.put(result.report);
     if (result.reading.letters)
-        for (LetterReading const& letter : *result.reading.letters)
+        for (LetterReading const& letter : *result.reading.letters) {
+            put(message, letter.cover);
             put(message, letter.blobs);
+        }
     return message.take();
 }
 
@@ -35,8 +37,10 @@ ReadResult unpack(std::string bytes) {
     result.sha256 = message.text();
     result.report = message.text();
     if (result.reading.letters)
-        for (LetterReading& letter : *result.reading.letters)
+        for (LetterReading& letter : *result.reading.letters) {
+            letter.cover = takeBlobs(message);
             letter.blobs = takeBlobs(message);
+        }
     return result;
 }
 

@@ -1,6 +1,7 @@
 #include "programs/vlmail/letters/checking.h"
 
 #include "programs/production/check_letter.h"
+#include "programs/production/cover_page.h"
 #include "programs/reader/trace.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -16,6 +17,8 @@ void check(LetterReading& letter, OpenDocument const& read, Reader::PageTrace co
     auto const address = Production::postalAddressOf(letter.fields, trace);
     letter.findings =
         Production::checkLetter({read.document, letter.pages, address ? &*address : nullptr}, rules);
+    if (address && Production::repairByCoverPage(letter.findings, address->text, rules.production))
+        letter.coverAddress = address->text;
 }
 
 } // namespace

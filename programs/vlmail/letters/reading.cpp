@@ -7,6 +7,7 @@
 #include "programs/base/utf8.h"
 #include "programs/mailing/page_blob.h"
 #include "programs/production/colour.h"
+#include "programs/production/cover_page.h"
 #include "programs/production/maker.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
@@ -38,6 +39,7 @@ constexpr char const* WARNINGS_KEY = "warnings";
 constexpr char const* DIFFERING_KEY = "differing_pages";
 constexpr char const* NOT_SEPARATED_KEY = "not_separated";
 constexpr char const* FINDINGS_KEY = "findings";
+constexpr char const* COVER_PAGE_KEY = "cover_page";
 constexpr char const* PAGE_KEY = "page";
 constexpr char const* SAYS_KEY = "says";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
@@ -109,6 +111,8 @@ json::Object toJson(LetterReading const& letter) {
         object.set(NOT_SEPARATED_KEY, toJson(letter.doubtfulJoins));
     if (!letter.findings.empty())
         object.set(FINDINGS_KEY, toJson(letter.findings));
+    if (!letter.coverAddress.empty())
+        object.set(COVER_PAGE_KEY, letter.coverAddress);
     setUnlessEmpty(object, MISSING_KEY, letter.missing);
     setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
     return object;
@@ -138,6 +142,7 @@ LetterReading letterFrom(json::Object const& object) {
         letter.differingPages = numbersIn(differing);
     letter.doubtfulJoins = joinsIn(object.get(NOT_SEPARATED_KEY));
     letter.findings = findingsIn(object.get(FINDINGS_KEY));
+    letter.coverAddress = object.get(COVER_PAGE_KEY).textOrEmpty();
     return letter;
 }
 
@@ -211,11 +216,14 @@ void addTo(LetterReading& letter, std::string const& whyNotMade) {
         letter.findings.pop_back();
 }
 
-/// Notes which of the letters cannot be made ready.
+/// Notes which of the letters cannot be made ready. Pages that cannot be read have no size, and are told
+/// already.
 void holdAgainst(std::vector<LetterReading>& letters, Reader::Document& document,
                  Cfg::PackPreset const& preset, MakingReady& making) {
     for (LetterReading& letter : letters)
-        addTo(letter, making.whyNot(preset, sizesOf(letter.pages, document)));
+        if (std::ranges::find(letter.findings, Production::Code::PageUnreadable,
+                              &Production::Finding::code) == letter.findings.end())
+            addTo(letter, making.whyNot(preset, sizesOf(letter.pages, document)));
 }
 
 /// Makes the pages of letters that can go out.
@@ -223,7 +231,7 @@ class PageMaking {
 public:
     /// Without `making` pages stay as they are.
     PageMaking(Reader::Document& document, Cfg::PackPreset const& preset, Along const& along)
-        : document_(document), along_(along),
+        : document_(document), along_(along), rules_(rulesOf(preset)),
           maker_(along.making ? &along.making->makerFor(preset) : nullptr),
           countsColours_(along.making && along.making->countsColours(preset)) {}
 
@@ -231,13 +239,16 @@ public:
         if (!letter.whyNot().empty())
             return;
         try {
+            addCover(letter);
             for (int const page : letter.pages)
                 addPage(letter, page);
         } catch (Unmade const& failure) {
             addTo(letter, Production::DOCUMENT_DAMAGED + Base::validUtf8(failure.what()));
         }
-        if (!letter.whyNot().empty())
+        if (!letter.whyNot().empty()) {
+            letter.cover.clear();
             letter.blobs.clear();
+        }
     }
 
 private:
@@ -246,6 +257,19 @@ private:
     struct Unmade : Base::Error {
         using Base::Error::Error;
     };
+
+    void addCover(LetterReading& letter) {
+        if (letter.coverAddress.empty())
+            return;
+        try {
+            PageBlob& blob = letter.cover.emplace_back();
+            blob.size = rules_.sheet;
+            if (along_.pages == Along::Pages::Yes)
+                blob.data = Mailing::compressed(Production::coverPage(letter.coverAddress, rules_));
+        } catch (Base::Error const& failure) {
+            throw Unmade(failure.what());
+        }
+    }
 
     void addPage(LetterReading& letter, int number) {
         Production::PreparedPage content = contentOf(number);
@@ -296,8 +320,15 @@ private:
             blob.laterData = Mailing::compressed(later.pdf);
     }
 
+    /// What is wrong with them keeps letters from going out before.
+    static Production::ProductionRules rulesOf(Cfg::PackPreset const& preset) {
+        std::vector<Reader::RulesFault> faults;
+        return Production::ProductionRules::of(preset, faults);
+    }
+
     Reader::Document& document_;
     Along const& along_;
+    Production::ProductionRules const rules_;
     Production::Maker* maker_;
     bool countsColours_;
     std::size_t written_ = 0;

@@ -43,6 +43,10 @@ struct LetterReading {
     /// What would go wrong with it on paper, when that was asked for, and why its pages cannot be made ready.
     /// Errors keep it from going out.
     std::vector<Production::Finding> findings = {};
+    /// The address for a cover page in front of the letter; empty without one.
+    std::string coverAddress = {};
+    /// The cover page, when pages were asked for and there is one.
+    std::vector<PageBlob> cover = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.
@@ -69,8 +73,8 @@ struct DocumentReading {
 
     /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
     /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and where there are
-    /// any "missing", the names of obligatory fields, "warnings", "differing_pages", "not_separated" and
-    /// "findings".
+    /// any "missing", the names of obligatory fields, "warnings", "differing_pages", "not_separated",
+    /// "findings" and "cover_page".
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);

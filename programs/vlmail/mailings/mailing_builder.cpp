@@ -54,7 +54,20 @@ void MailingBuilder::add(std::string const& document, LetterReading letter) {
         return;
     }
     byFields_.emplace(groupKey(letter.fields), groups_.size());
-    groups_.push_back({{stored(document, letter.blobs, Place::First)}, std::move(letter.fields)});
+    groups_.push_back({storedCover(std::move(letter.cover)),
+                       {stored(document, letter.blobs, Place::First)},
+                       std::move(letter.fields)});
+}
+
+/// The window shows the first sheet of those that go out as one: only the first letter's counts.
+std::vector<MailingBuilder::Part> MailingBuilder::storedCover(std::vector<PageBlob> cover) {
+    if (cover.empty())
+        return {};
+    if (coverName_.empty())
+        coverName_ = nameFor("cover page");
+    for (PageBlob& page : cover)
+        page.number = ++covers_;
+    return {stored(coverName_, cover, Place::First)};
 }
 
 MailingBuilder::Group* MailingBuilder::joinedGroup(LetterReading const& letter) {
@@ -146,7 +159,7 @@ void MailingBuilder::storeAttachments() {
 
 std::vector<MailingBuilder::Part const*> MailingBuilder::partsOf(Group const& group) const {
     std::vector<Part const*> parts;
-    for (auto const* const some : {&inFront_, &group.letters, &behind_})
+    for (auto const* const some : {&group.cover, &inFront_, &group.letters, &behind_})
         for (Part const& part : *some)
             parts.push_back(&part);
     return parts;

@@ -54,6 +54,8 @@ private:
     };
     /// Letters that go out as one, or a letter alone.
     struct Group {
+        /// A cover page, or nothing.
+        std::vector<Part> cover;
         std::vector<Part> letters;
         Cfg::ExtractedFields fields;
     };
@@ -64,6 +66,7 @@ private:
     Part stored(std::string const& document, std::vector<PageBlob> const& pages, Place place);
     int storedPage(std::string const& document, int number, SharedMemBuffer const& data);
     void save(std::string const& document, int number, SharedMemBuffer const& data);
+    std::vector<Part> storedCover(std::vector<PageBlob> cover);
     void storeAttachments();
     Mailing::MailedLetter composed(Group const& group);
     std::vector<Part const*> partsOf(Group const& group) const;
@@ -82,6 +85,8 @@ private:
     /// In the order in which they go out.
     std::vector<Part> inFront_;
     std::vector<Part> behind_;
+    std::string coverName_;
+    int covers_ = 0;
     std::string blankName_;
     std::map<std::pair<int, int>, int> blankSides_;
     std::size_t letterCount_ = 0;

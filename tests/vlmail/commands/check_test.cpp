@@ -149,4 +149,59 @@ TEST_F(PrintReadiness, WithoutAReadablePartAppIsAFailureOfTheDocument) {
     EXPECT_THAT(ran.err, HasSubstr("cannot use the part \"app\" in \"" + path("node.json") + "\": "));
 }
 
+TEST_F(PrintReadiness, NamesPagesThatCannotBeReadAndLetsOtherLettersGo) {
+    write("bill 3.pdf",
+          onePage(ADDRESS).object(2, "<< /Type /Pages /Kids [3 0 R 99 0 R] /Count 2 >>").bytes());
+    for (std::string const command : {"check", "letter"})
+        EXPECT_THAT(run({command, path("bill 3.pdf")}).out, HasSubstr("    error page-unreadable, page 2: "));
+    Ran const mail = run({"mail", "-o", path("out"), path("bill 1.pdf"), path("bill 3.pdf")});
+    EXPECT_EQ(mail.status, 2);
+    EXPECT_THAT(mail.out, HasSubstr("left out: bill 3.pdf, pages 1-2: page-unreadable: page 2: "));
+    EXPECT_THAT(mail.out, HasSubstr("2 letters: 1 ready, 1 cannot go out"));
+}
+
+constexpr char const* COVERED =
+    R"(, "duplex": true, "production": {"window": {"left": 3000, "top": 4500, "right": 10500, "bottom": 9000},
+        "repair": ["cover-page"]})";
+
+TEST_F(PrintReadiness, IsReachedByACoverPageOnRequest) {
+    settings(COVERED);
+    Ran const check = run({"check", path("bill 1.pdf")});
+    EXPECT_EQ(check.status, 0);
+    EXPECT_THAT(check.out, HasSubstr("    a cover page with the address goes in front\n"));
+    EXPECT_EQ(check.out.find("address-outside-window"), check.out.npos);
+    Ran const mail = run({"mail", "--json", "-o", path("out"), path("bill 1.pdf")});
+    EXPECT_EQ(mail.status, 0);
+    EXPECT_THAT(mail.out, HasSubstr("\"pages\":1,\"sheets\":2,"));
+    std::string const mailing = std::filesystem::directory_iterator(path("out"))->path().string();
+    EXPECT_EQ(runVlMail({"pack", "verify", mailing}).status, 0);
+    EXPECT_EQ(runVlMail({"pack", "extract", mailing, "-o", path("pages")}).status, 0);
+    std::ifstream in(path("pages/metadata.json"));
+    std::string const metadata{std::istreambuf_iterator<char>(in), {}};
+    json::Object const letter =
+        json::strToObject(metadata.data(), metadata.size()).get("letters").toArray().at(0).toObject();
+    std::vector<std::string> parts;
+    for (json::Value const& part : letter.get("documents").toArray())
+        parts.push_back(part.toObject().get("name").textOrEmpty() + ": " +
+                        part.toObject().get("role").textOrEmpty());
+    EXPECT_THAT(parts, ElementsAre("cover page: letter", "blank: blank", "bill 1.pdf: letter"));
+}
+
+TEST_F(PrintReadiness, IsReachedByACoverPageInPlansToo) {
+    settings(COVERED);
+    Ran const plan = run({"plan", "--json", "-o", path("plan.json"), path("bill 1.pdf")});
+    EXPECT_THAT(plan.out, HasSubstr("\"sheets\":2,"));
+    Ran const mail = runVlMail({"mail", "--json", "--plan", path("plan.json"), "-o", path("out")});
+    EXPECT_EQ(mail.status, 0);
+    EXPECT_THAT(mail.out, HasSubstr("\"sheets\":2,"));
+}
+
+TEST_F(PrintReadiness, PutsOneCoverPageInFrontOfLettersThatGoOutAsOne) {
+    settings(COVERED);
+    write("bill 4.pdf", onePage(ADDRESS).bytes());
+    Ran const mail = run({"mail", "--json", "-o", path("out"), path("bill 1.pdf"), path("bill 4.pdf")});
+    EXPECT_EQ(mail.status, 0);
+    EXPECT_THAT(mail.out, HasSubstr("\"letters\":2,\"sent_as\":1,\"pages\":2,\"sheets\":3,"));
+}
+
 } // namespace
