@@ -464,6 +464,23 @@ TEST(ExtractionPatterns, TakeCommentsAndPossessiveRepeatsApartFromEachOther) {
         EXPECT_EQ(extracted(finding(pattern), "ab"), "\"b\"") << pattern;
 }
 
+TEST(Extraction, TakesCharactersOfAllLengthsForwardAndBackward) {
+    for (std::string const one : {"x", "\u00FC", "\u2014", "\U0001F600"}) {
+        std::string const text = "\u00E4" + one + one + "\u20AC" + one + "b";
+        EXPECT_EQ(extracted(finding("^.(?<VAL>.*)(?<=\u20AC.)b$"), text),
+                  print(json::Value(one + one + "\u20AC" + one)));
+        EXPECT_EQ(extracted(finding("(?<VAL>" + one + ")b"), text), print(json::Value(one)));
+    }
+}
+
+TEST(Extraction, FindsNothingWhereAnyPartOfACharacterIsMissing) {
+    VLServiceTest::LogLines const log;
+    for (std::string const part : {"\xFF", "\x80", "\xC3", "\xE2\x82", "\xF0\x9F\x98"})
+        for (std::string const& text :
+             {part, "a" + part, part + "b", "a" + part + "b", "\u00E4" + part + "\u00FC"})
+            EXPECT_EQ(extracted(finding("(?<VAL>^[^z]*$)"), text), "nothing") << text;
+}
+
 TEST(ExtractionFailures, LogTextAndPatternsThatAreNotUtf8) {
     VLServiceTest::LogLines const log;
     std::string const line =

@@ -9,10 +9,11 @@ namespace Cfg {
 
 constinit thread_local MatchClock matchClock;
 
+// Some 100 microseconds.
+constexpr int STEPS_BETWEEN_LOOKS = 1 << 14;
+
 void MatchClock::look() {
-    // Some 100 microseconds.
-    constexpr int STEPS = 1 << 14;
-    stepsToLook = STEPS;
+    stepsToLook = STEPS_BETWEEN_LOOKS;
     if (deadline == Time::max() || std::chrono::steady_clock::now() < deadline)
         return;
     isUp = true;
@@ -23,7 +24,8 @@ MatchTime::MatchTime(std::chrono::steady_clock::duration limit)
     : outerDeadline_(matchClock.deadline), outerIsUp_(matchClock.isUp) {
     matchClock.deadline = std::min(outerDeadline_, std::chrono::steady_clock::now() + limit);
     matchClock.isUp = false;
-    matchClock.stepsToLook = 0;
+    // Where there is time for more, the first look would be for nothing.
+    matchClock.stepsToLook = limit > std::chrono::milliseconds(1) ? STEPS_BETWEEN_LOOKS : 0;
 }
 
 MatchTime::~MatchTime() {

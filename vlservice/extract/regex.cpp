@@ -65,14 +65,42 @@ private:
     Inner inner_ = {};
 };
 
-/// Decodes UTF-8. The matchers run on it as it is: the engine's own wrappers for UTF-8 copy all groups once
-/// more.
-using ClockedDecoder = Clocked<Decoder>;
+/// A place in UTF-8, as the engine's decoder takes it, which is asked only where there is more than ASCII.
+class Utf8Place {
+public:
+    Utf8Place() = default;
+    explicit Utf8Place(char const* at) : at_(at) {}
+
+    UChar32 operator*() const { return isAscii(*at_) ? *at_ : *Decoder(at_); }
+    Utf8Place& operator++() {
+        at_ = isAscii(*at_) ? at_ + 1 : (++Decoder(at_)).base();
+        return *this;
+    }
+    Utf8Place& operator--() {
+        at_ = isAscii(at_[-1]) ? at_ - 1 : (--Decoder(at_)).base();
+        return *this;
+    }
+    friend bool operator==(Utf8Place a, Utf8Place b) { return a.at_ == b.at_; }
+    friend bool operator!=(Utf8Place a, Utf8Place b) { return a.at_ != b.at_; }
+
+    char const* base() const { return at_; }
+
+private:
+    static bool isAscii(char c) { return static_cast<signed char>(c) >= 0; }
+
+    char const* at_ = nullptr;
+};
+
+/// The matchers run on it as it is: the engine's own wrappers for UTF-8 copy all groups once more.
+using ClockedDecoder = Clocked<Utf8Place>;
 using ClockedPoints = Clocked<UChar32 const*>;
 
-ClockedDecoder decoderAt(char const* at, std::string_view text) {
-    return ClockedDecoder(Decoder(at, text.data(), text.data() + text.size()));
+/// Throws std::out_of_range when the text begins or ends within a character.
+void requireWholeEnds(std::string_view text) {
+    static_cast<void>(Decoder(text.data(), text.data(), text.data() + text.size()));
 }
+
+ClockedDecoder decoderAt(char const* at) { return ClockedDecoder(Utf8Place(at)); }
 
 using Groups = boost::match_results<ClockedDecoder>;
 
@@ -111,17 +139,19 @@ FieldRegex::FieldRegex(std::string_view pattern)
 FieldRegex::~FieldRegex() = default;
 
 std::optional<FieldRegex::Found> FieldRegex::search(std::string_view text, std::string_view group) const {
+    requireWholeEnds(text);
     Groups groups;
-    if (!boost::regex_search(decoderAt(text.data(), text), decoderAt(text.data() + text.size(), text), groups,
+    if (!boost::regex_search(decoderAt(text.data()), decoderAt(text.data() + text.size()), groups,
                              compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return Found{piece(groups[0]), groupNamed(groups, group)};
 }
 
 std::optional<RegexGroups> FieldRegex::match(std::string_view text) const {
+    requireWholeEnds(text);
     auto found = std::make_unique<RegexGroups::Results>();
-    if (!boost::regex_match(decoderAt(text.data(), text), decoderAt(text.data() + text.size(), text),
-                            found->groups, compiled_->regex, boost::match_not_dot_newline))
+    if (!boost::regex_match(decoderAt(text.data()), decoderAt(text.data() + text.size()), found->groups,
+                            compiled_->regex, boost::match_not_dot_newline))
         return std::nullopt;
     return RegexGroups(std::move(found));
 }
