@@ -160,6 +160,17 @@ void dropUnusedResources(QPDFPageObjectHelper page) {
     }
 }
 
+void dropLostContents(QPDFPageObjectHelper page) {
+    Handle contents = page.getObjectHandle().getKey("/Contents");
+    if (!contents.isArray())
+        return;
+    Handle kept = Handle::newArray();
+    for (Handle part : contents.getArrayAsVector())
+        if (part.isStream())
+            kept.appendItem(part);
+    page.getObjectHandle().replaceKey("/Contents", kept);
+}
+
 void separateFormFields(QPDFPageObjectHelper page) {
     for (Handle annotation : annotationsOf(page))
         if (isWidget(annotation))

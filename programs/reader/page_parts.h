@@ -14,6 +14,10 @@ namespace Reader {
 /// and pictures of all pages at each of them. Leaves all as it is when a content cannot be understood.
 void dropUnusedResources(QPDFPageObjectHelper page);
 
+/// Takes what is no content out of the page's contents, such as objects that an update has freed: some
+/// readers show nothing of a page with one.
+void dropLostContents(QPDFPageObjectHelper page);
+
 /// Makes each form field on the page one of its own, so that it brings none of the other pages' fields along.
 void separateFormFields(QPDFPageObjectHelper page);
 

@@ -85,6 +85,7 @@ std::string PdfPageWriter::write(int number, int pageCount) {
         if (parsed_->pages.size() != static_cast<std::size_t>(pageCount))
             throw std::runtime_error("Some pages are lost.");
         QPDFPageObjectHelper page = parsed_->pages.at(static_cast<std::size_t>(number - 1));
+        dropLostContents(page);
         dropUnusedResources(page);
         separateFormFields(page);
 

@@ -177,6 +177,7 @@ public:
 
     int pageCount() const override { return source_->pageCount(); }
     Page readPage(int number) override { return source_->readPage(number); }
+    PageSize pageSize(int number) override { return source_->pageSize(number); }
     std::string singlePagePdf(int number) override { return source_->singlePagePdf(number); }
     std::string renderPage(int number, double dots) override { return source_->renderPage(number, dots); }
     bool hasSameObjects(int number, std::string_view pdf) override {

@@ -5,6 +5,10 @@
 
 #include <gmock/gmock.h>
 
+#include <string>
+#include <utility>
+#include <vector>
+
 namespace Reader {
 namespace {
 
@@ -117,6 +121,90 @@ TEST(SinglePages, ShowTheLastOfIncrementalUpdates) {
     EXPECT_NE(pictureOf(all), pictureOf(both));
     EXPECT_EQ(pictureOf(writtenAlone(all)), pictureOf(all));
     EXPECT_EQ(pictureOf(all), pictureOf(onePage(shown(650, "Third") + shown(600, "Second")).bytes()));
+}
+
+/// Ways to write the same update.
+std::vector<std::string> updatesOf(std::string const& first, RawPdf const& update) {
+    return {update.behind(first), update.behindInStream(first), update.behindAsHybrid(first)};
+}
+
+void expectNewest(std::string const& updated, std::string const& expected) {
+    Document document = openDocument(updated, "a.pdf");
+    std::string const picture = document.renderPage(1, 72);
+    EXPECT_EQ(picture, pictureOf(onePage(expected).bytes()));
+    std::string const page = document.singlePagePdf(1);
+    EXPECT_EQ(pictureOf(page), picture);
+    EXPECT_TRUE(document.showsTheSame(1, page));
+}
+
+TEST(SinglePages, ShowTheNewestContentHoweverItWasUpdated) {
+    RawPdf update;
+    update.stream(5, "", shown(600, "Second"));
+    for (std::string const& updated : updatesOf(onePage(shown(700, "First")).bytes(), update))
+        expectNewest(updated, shown(600, "Second"));
+}
+
+TEST(SinglePages, ShowTheNewestPageHoweverItWasUpdated) {
+    RawPdf update;
+    update.object(2, "<< /Type /Pages /Kids [6 0 R] /Count 1 >>").stream(7, "", shown(600, "Second", "G"));
+    update.object(6, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 7 0 R /Resources "
+                     "<< /Font << /G 4 0 R >> >> >>");
+    for (std::string const& updated : updatesOf(onePage(shown(700, "First")).bytes(), update))
+        expectNewest(updated, shown(600, "Second"));
+}
+
+TEST(SinglePages, ShowTheNewestResourcesHoweverTheyWereUpdated) {
+    RawPdf first = onePage(shown(700, "Text"));
+    first.object(4, "<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica /Encoding /WinAnsiEncoding >>");
+    RawPdf update;
+    update.object(4, "<< /Type /Font /Subtype /Type1 /BaseFont /Courier /Encoding /WinAnsiEncoding >>");
+    for (std::string const& updated : updatesOf(first.bytes(), update))
+        expectNewest(updated, shown(700, "Text"));
+}
+
+RawPdf ofTwoContents(std::string const& second) {
+    RawPdf pdf = onePage(shown(700, "Kept"));
+    pdf.object(3, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents [5 0 R 6 0 R] /Resources "
+                  "<< /Font << /F 4 0 R >> >> >>");
+    return pdf.stream(6, "", second);
+}
+
+// Readers may find what was freed all the same, so that such a letter waits for a person.
+TEST(SinglePages, ShowNothingOfContentsThatWereFreedAndAllTheRest) {
+    std::string const freed = RawPdf().freed(6).behind(ofTwoContents(shown(600, "Freed")).bytes());
+    Document document = openDocument(freed, "a.pdf");
+    std::string const page = document.singlePagePdf(1);
+    EXPECT_EQ(pictureOf(page), pictureOf(onePage(shown(700, "Kept")).bytes()));
+    EXPECT_FALSE(document.showsTheSame(1, page));
+}
+
+TEST(SinglePages, KeepStreamsThatCannotBeUnpackedByteForByte) {
+    std::string const packed = VLServiceTest::deflated(shown(700, "Some of this") + std::string(5000, ' '));
+    std::string broken = packed;
+    broken[packed.size() / 2] = static_cast<char>(~broken[packed.size() / 2]);
+    for (auto const& [filter, bytes] : {std::pair<std::string, std::string>("FlateDecode", broken),
+                                        {"FlateDecode", packed.substr(0, packed.size() - 12)},
+                                        {"LZWDecode", "\xFF\xFF\xFF"},
+                                        {"ASCII85Decode", "zz{}"},
+                                        {"Unknown", "what is it"}}) {
+        RawPdf pdf = ofTwoContents("");
+        pdf.stream(6, "/Filter /" + filter, bytes);
+        Document document = openDocument(pdf.bytes(), "a.pdf");
+        std::string const page = document.singlePagePdf(1);
+        EXPECT_NE(page.find(bytes), std::string::npos) << filter;
+        EXPECT_EQ(pictureOf(page), document.renderPage(1, 72)) << filter;
+        EXPECT_TRUE(document.showsTheSame(1, page)) << filter;
+    }
+}
+
+TEST(SinglePages, ShowTheNewestOfManyUpdatesOfAllKinds) {
+    std::string pdf = onePage(shown(700, "First")).bytes();
+    for (int round = 1; round <= 3; ++round) {
+        pdf = RawPdf().stream(5, "", shown(600, "Table")).behind(pdf);
+        pdf = RawPdf().stream(5, "", shown(600, "Hybrid")).behindAsHybrid(pdf);
+        pdf = RawPdf().stream(5, "", shown(600, "Stream")).behindInStream(pdf);
+        expectNewest(pdf, shown(600, "Stream"));
+    }
 }
 
 TEST(PageChecks, TakeAPageThatShowsTheSame) {

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <map>
 #include <string>
+#include <vector>
 #include <zlib.h>
 
 namespace VLServiceTest {
@@ -29,31 +30,95 @@ public:
                                   bytes + "\nendstream");
     }
 
-    std::string bytes() const { return appendedTo("%PDF-1.7\n", 0, ""); }
+    /// An update says that there is no such object any more.
+    RawPdf& freed(int number) {
+        freed_.push_back(number);
+        return *this;
+    }
 
-    /// An incremental update of a PDF that bytes() has given: these objects stand behind it and replace its
-    /// own of the same numbers.
+    std::string bytes() const { return withTable(placedBehind("%PDF-1.7\n"), 0, ""); }
+
+    // An incremental update of a PDF that bytes() or one of these has given: these objects stand behind it
+    // and replace its own of the same numbers.
+
     std::string behind(std::string const& earlier) const {
-        std::size_t const last = earlier.rfind("startxref\n") + 10;
-        int const size = std::stoi(earlier.substr(earlier.rfind("/Size ") + 6));
-        return appendedTo(earlier, size, " /Prev " + earlier.substr(last, earlier.find('\n', last) - last));
+        return withTable(placedBehind(earlier), sizeIn(earlier), previous(earlier));
+    }
+    /// With its references in a stream.
+    std::string behindInStream(std::string const& earlier) const {
+        Placed const placed = placedBehind(earlier);
+        return withStart(withStream(placed, sizeIn(earlier), previous(earlier)), placed.pdf.size());
+    }
+    /// With its references in a stream and a table that does not have them, for readers that know no streams.
+    std::string behindAsHybrid(std::string const& earlier) const {
+        Placed const placed = placedBehind(earlier);
+        std::string const keys = " /XRefStm " + std::to_string(placed.pdf.size()) + previous(earlier);
+        Placed const hidden{withStream(placed, sizeIn(earlier), ""), {}};
+        return withTable(hidden, std::max(sizeIn(earlier), nextNumber() + 1), keys);
     }
 
 private:
-    std::string appendedTo(std::string pdf, int size, std::string const& trailerKeys) const {
-        size = std::max(size, objects_.rbegin()->first + 1);
-        std::string table = "xref\n0 1\n0000000000 65535 f \n";
+    /// Objects with their offsets.
+    struct Placed {
+        std::string pdf;
+        std::map<int, std::size_t> offsets;
+    };
+
+    static std::string previous(std::string const& earlier) {
+        std::size_t const last = earlier.rfind("startxref\n") + 10;
+        return " /Prev " + earlier.substr(last, earlier.find('\n', last) - last);
+    }
+    static int sizeIn(std::string const& earlier) {
+        return std::stoi(earlier.substr(earlier.rfind("/Size ") + 6));
+    }
+    int nextNumber() const { return objects_.empty() ? 1 : objects_.rbegin()->first + 1; }
+
+    Placed placedBehind(std::string const& earlier) const {
+        Placed placed{earlier, {}};
         for (auto const& [number, body] : objects_) {
-            std::string const offset = std::to_string(pdf.size());
-            table += std::to_string(number) + " 1\n" + std::string(10 - offset.size(), '0') + offset +
-                     " 00000 n \n";
-            pdf += std::to_string(number) + " 0 obj\n" + body + "\nendobj\n";
+            placed.offsets[number] = placed.pdf.size();
+            placed.pdf += std::to_string(number) + " 0 obj\n" + body + "\nendobj\n";
         }
-        std::string const start = std::to_string(pdf.size());
-        return pdf + table + "trailer\n<< /Size " + std::to_string(size) + " /Root 1 0 R" + trailerKeys +
-               " >>\nstartxref\n" + start + "\n%%EOF\n";
+        return placed;
     }
 
+    static std::string withStart(std::string const& pdf, std::size_t start) {
+        return pdf + "startxref\n" + std::to_string(start) + "\n%%EOF\n";
+    }
+
+    std::string withTable(Placed const& placed, int size, std::string const& keys) const {
+        std::string table = "xref\n0 1\n0000000000 65535 f \n";
+        for (int const number : freed_)
+            table += std::to_string(number) + " 1\n0000000000 00001 f \n";
+        for (auto const& [number, at] : placed.offsets) {
+            std::string const offset = std::to_string(at);
+            table += std::to_string(number) + " 1\n" + std::string(10 - offset.size(), '0') + offset +
+                     " 00000 n \n";
+        }
+        return withStart(placed.pdf + table + "trailer\n<< /Size " +
+                             std::to_string(std::max(size, nextNumber())) + " /Root 1 0 R" + keys + " >>\n",
+                         placed.pdf.size());
+    }
+
+    std::string withStream(Placed placed, int size, std::string const& keys) const {
+        int const number = std::max(size, nextNumber());
+        placed.offsets[number] = placed.pdf.size();
+        std::string index;
+        std::string entries;
+        for (auto const& [object, at] : placed.offsets) {
+            index += ' ' + std::to_string(object) + " 1";
+            entries += '\1';
+            for (int shift = 24; shift >= 0; shift -= 8)
+                entries += static_cast<char>(at >> shift);
+            entries += '\0';
+        }
+        return placed.pdf + std::to_string(number) +
+               " 0 obj\n<< /Type /XRef /Root 1 0 R /W [1 4 1] /Index [" + index + " ] /Length " +
+               std::to_string(entries.size()) + " /Size " + std::to_string(number + 1) + keys +
+               " >>\nstream\n" + entries + "\nendstream\nendobj\n";
+    }
+
+    std::vector<int> freed_;
     std::map<int, std::string> objects_;
 };
 
