@@ -1,7 +1,10 @@
 #include "programs/production/colour.h"
 
+#include "programs/production/said_colours.h"
+
 #include <algorithm>
 #include <cstddef>
+#include <optional>
 #include <string>
 
 namespace Production {
@@ -27,6 +30,13 @@ bool isColoured(Reader::Picture const& picture) {
             isColoured(static_cast<unsigned char>(points[i]), static_cast<unsigned char>(points[i + 1]),
                        static_cast<unsigned char>(points[i + 2]));
     return coloured > STRAY_POINTS;
+}
+
+bool hasColour(Reader::Document& document, int number, std::string const& pdf) {
+    if (!maySayColour(pdf))
+        return false;
+    std::optional<Reader::Picture> const picture = document.drawPage(number, LOOKED_AT_DOTS_PER_INCH);
+    return picture && isColoured(*picture);
 }
 
 } // namespace Production

@@ -9,7 +9,6 @@
 
 #include <algorithm>
 #include <new>
-#include <optional>
 #include <utility>
 
 namespace Production {
@@ -31,8 +30,7 @@ PreparedPage prepared(Reader::Document& document, int number, std::string const&
     if (!document.showsTheSame(number, made.pdf))
         throw Base::Error(where + ": page " + std::to_string(number) +
                           " would look different when it stands alone; print the document to a new PDF");
-    std::optional<Reader::Picture> const picture = document.drawPage(number, LOOKED_AT_DOTS_PER_INCH);
-    made.isColoured = picture && isColoured(*picture);
+    made.isColoured = hasColour(document, number, made.pdf);
     return made;
 }
 

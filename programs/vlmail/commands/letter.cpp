@@ -105,9 +105,15 @@ void explain(ReadResult& result, OpenDocument const& read) {
     result.reading.trace = explanation;
 }
 
+std::string sectionOf(DocumentReading const& reading, OpenDocument const& read, MakingReady& making) {
+    Report::PrintedPages pages(read.document, read.packPreset, making);
+    return Report::section(Report::describe(reading, pages, read.trace), read.place);
+}
+
 /// What the options want to know beside the letters.
-Along alongFor(Options const& options) {
+Along alongFor(Options const& options, MakingReady* making) {
     Along along;
+    along.making = making;
     along.checks = Along::Checks::Yes;
     if (options.explain)
         along.beforeReading = [](ReadResult& result, Cfg::Presets const& presets) {
@@ -118,8 +124,7 @@ Along alongFor(Options const& options) {
             if (options.explain)
                 explain(result, read);
             if (!options.report.empty())
-                result.report =
-                    Report::section(Report::describe(result.reading, read.document, read.trace), read.place);
+                result.report = sectionOf(result.reading, read, *making);
         };
     return along;
 }
@@ -132,8 +137,7 @@ int showLetters(Options const& options, Terminal const& terminal) {
         report.emplace(options.report);
     MakingReady making(MakingReady::Colours::Ignored);
     making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
-    Along along = alongFor(options);
-    along.making = &making;
+    Along const along = alongFor(options, &making);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(), along, progress,
               [&](std::size_t, ReadResult result) {

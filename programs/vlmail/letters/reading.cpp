@@ -272,9 +272,9 @@ private:
     }
 
     void addPage(LetterReading& letter, int number) {
-        Production::PreparedPage content = contentOf(number);
+        Production::PreparedPage const content = contentOf(number);
         if (along_.pages == Along::Pages::Yes)
-            write(content, letter, number);
+            hold(content.pdf, letter, number);
         int const place = static_cast<int>(letter.blobs.size()) + 1;
         PageBlob& blob = letter.blobs.emplace_back();
         blob.number = number;
@@ -289,16 +289,15 @@ private:
 
     Production::PreparedPage contentOf(int number) {
         Production::PreparedPage content{{}, document_.pageSize(number)};
-        if (countsColours_)
-            if (auto const picture = document_.drawPage(number, Production::LOOKED_AT_DOTS_PER_INCH))
-                content.isColoured = Production::isColoured(*picture);
+        if (along_.pages == Along::Pages::Yes || countsColours_)
+            content.pdf = document_.singlePagePdf(number);
+        content.isColoured = countsColours_ && Production::hasColour(document_, number, content.pdf);
         return content;
     }
 
     /// What is written is held against the document before anything is laid on it.
-    void write(Production::PreparedPage& content, LetterReading& letter, int number) {
-        content.pdf = document_.singlePagePdf(number);
-        if (written_++ % along_.checkEvery == 0 && !document_.showsTheSame(number, content.pdf))
+    void hold(std::string const& pdf, LetterReading& letter, int number) {
+        if (written_++ % along_.checkEvery == 0 && !document_.showsTheSame(number, pdf))
             letter.differingPages.push_back(number);
     }
 
@@ -358,11 +357,12 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
     if (along.joins == Along::Joins::Accept)
         acceptJoins(*reading.letters);
     if (along.checks == Along::Checks::Yes)
-        checkLetters(*reading.letters, {document, extractPreset, trace, place}, packPreset, settings);
+        checkLetters(*reading.letters, {document, extractPreset, packPreset, trace, place}, packPreset,
+                     settings);
     if (along.making)
         holdAgainst(*reading.letters, document, packPreset, *along.making);
     if (along.afterReading)
-        along.afterReading(result, {document, extractPreset, trace, place});
+        along.afterReading(result, {document, extractPreset, packPreset, trace, place});
     addBlobs(*reading.letters, document, packPreset, along);
 }
 

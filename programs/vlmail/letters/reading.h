@@ -95,6 +95,7 @@ json::Array toJsonArray(std::vector<int> const& numbers);
 struct OpenDocument {
     Reader::Document& document;
     Cfg::ExtractPreset const& preset;
+    Cfg::PackPreset const& packPreset;
     Reader::Trace const& trace;
     /// Among those of the batch, from 1.
     std::size_t place;

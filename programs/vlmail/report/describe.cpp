@@ -1,5 +1,6 @@
 #include "programs/vlmail/report/describe.h"
 
+#include "programs/base/error.h"
 #include "programs/base/utf8.h"
 #include "programs/vlmail/letters/field_words.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -93,11 +94,11 @@ Box boxOf(ZoneTrace const& zone) {
     return {point.x, point.y, point.x, point.y};
 }
 
-Sheet sheetOf(int number, Reader::Document& document) {
-    Reader::Page const& page = document.page(number);
-    Sheet sheet{number, page.width, page.height};
+Sheet sheetOf(LetterReading const& letter, int number, PrintedPages& pages) {
+    Production::PageSize const size = pages.size(number);
+    Sheet sheet{number, size.width, size.height};
     try {
-        sheet.png = document.renderPage(number, DOTS_PER_INCH);
+        sheet.png = pages.picture(letter, number, DOTS_PER_INCH);
     } catch (std::bad_alloc const&) {
         // That says nothing of the page.
         throw;
@@ -108,12 +109,30 @@ Sheet sheetOf(int number, Reader::Document& document) {
 }
 
 /// The place of the page among the sheets, to which it is added when it is not there yet.
-std::size_t placeAmong(std::vector<Sheet>& sheets, int page, Reader::Document& document) {
+std::size_t placeAmong(std::vector<Sheet>& sheets, int page, LetterReading const& letter,
+                       PrintedPages& pages) {
     auto const place =
         static_cast<std::size_t>(std::ranges::find(sheets, page, &Sheet::page) - sheets.begin());
     if (place == sheets.size())
-        sheets.push_back(sheetOf(page, document));
+        sheets.push_back(sheetOf(letter, page, pages));
     return place;
+}
+
+/// What was found on a page lies elsewhere on the sheet that it is turned for.
+void turn(Zone& zone, Production::PageSize page, int quarterTurns) {
+    zone.box = turned(zone.box, page, quarterTurns);
+    for (Field& field : zone.fields)
+        for (Box& box : field.match)
+            box = turned(box, page, quarterTurns);
+}
+
+std::vector<Side> sidesOf(LetterReading const& letter, PrintedPages& pages) {
+    try {
+        return pages.sides(letter);
+    } catch (Base::Error const&) {
+        // What keeps the letter from being made ready is said beside it.
+        return {};
+    }
 }
 
 Zone zoneOf(ZoneTrace const& seen, LetterReading const& letter, Reader::Page const& page) {
@@ -128,28 +147,34 @@ Zone zoneOf(ZoneTrace const& seen, LetterReading const& letter, Reader::Page con
 /// Each picture makes the report longer, and one of a kind shows what is wrong.
 constexpr std::size_t MOST_SHEETS = 20;
 
-Fault faultOf(Production::Finding const& finding, Letter& letter, Reader::Document& document) {
+Fault faultOf(Production::Finding const& finding, Letter& letter, LetterReading const& reading,
+              PrintedPages& pages) {
     Fault fault{nameOf(finding.code), finding.isError(),
                 finding.pages.empty() ? "document" : pagesInWords(finding.pages), finding.says, finding.fix};
-    fault.box = finding.box;
-    if (finding.box == Box())
+    if (finding.box == Box() || finding.pages.empty())
         return fault;
+    // Pages of one finding are of one form.
+    int const first = finding.pages.front();
+    fault.box = turned(finding.box, pages.document().pageSize(first), pages.quarterTurns(first));
     for (int const page : finding.pages)
         if (std::ranges::find(letter.sheets, page, &Sheet::page) != letter.sheets.end() ||
             letter.sheets.size() < MOST_SHEETS)
-            fault.sheets.push_back(placeAmong(letter.sheets, page, document));
+            fault.sheets.push_back(placeAmong(letter.sheets, page, reading, pages));
     return fault;
 }
 
-Letter letterOf(LetterReading const& reading, Reader::Document& document, Reader::PageTrace const& trace) {
-    Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(trace.page, document)}};
+Letter letterOf(LetterReading const& reading, PrintedPages& pages, Reader::PageTrace const& trace) {
+    Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(reading, trace.page, pages)}};
     for (ZoneTrace const& seen : trace.zones) {
         int const page = seen.place.page == 0 ? trace.page : seen.place.page;
-        letter.zones.push_back(zoneOf(seen, reading, document.page(page)));
-        letter.zones.back().sheet = placeAmong(letter.sheets, page, document);
+        Reader::Page const& read = pages.document().page(page);
+        letter.zones.push_back(zoneOf(seen, reading, read));
+        turn(letter.zones.back(), read.size(), pages.quarterTurns(page));
+        letter.zones.back().sheet = placeAmong(letter.sheets, page, reading, pages);
     }
     for (Production::Finding const& finding : reading.findings)
-        letter.faults.push_back(faultOf(finding, letter, document));
+        letter.faults.push_back(faultOf(finding, letter, reading, pages));
+    letter.sides = sidesOf(reading, pages);
     return letter;
 }
 
@@ -161,12 +186,12 @@ Document describe(DocumentReading const& reading) {
     return described;
 }
 
-Document describe(DocumentReading const& reading, Reader::Document& document, Reader::Trace const& trace) {
+Document describe(DocumentReading const& reading, PrintedPages& pages, Reader::Trace const& trace) {
     Document described = describe(reading);
     auto letter = reading.letters->begin();
     for (Reader::PageTrace const& page : trace.pages) {
         if (page.beginsLetter)
-            described.letters.push_back(letterOf(*letter++, document, page));
+            described.letters.push_back(letterOf(*letter++, pages, page));
     }
     return described;
 }

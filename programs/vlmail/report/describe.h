@@ -3,6 +3,7 @@
 
 #include "programs/reader/letters.h"
 #include "programs/vlmail/letters/reading.h"
+#include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/report/report.h"
 
 namespace VlMail::Report {
@@ -10,8 +11,8 @@ namespace VlMail::Report {
 /// The document without its letters.
 Document describe(DocumentReading const& reading);
 
-/// The document with its letters and their pictures. A page that cannot be drawn has the reason instead.
-/// Throws Reader::Error when a page cannot be read.
-Document describe(DocumentReading const& reading, Reader::Document& document, Reader::Trace const& trace);
+/// The document with its letters and the pictures of their pages as they are printed. A page that cannot be
+/// drawn has the reason instead. Throws Reader::Error when a page cannot be read.
+Document describe(DocumentReading const& reading, PrintedPages& pages, Reader::Trace const& trace);
 
 } // namespace VlMail::Report

@@ -282,13 +282,30 @@ std::string letterHeading(Letter const& letter, std::string const& anchor, std::
            "</h3>\n";
 }
 
+std::string sideHtml(Side const& side) {
+    std::string const name = isolated(side.name);
+    std::string const picture = side.png.empty() ? "" : "<img alt=\"\" src=\"" + pngUri(side.png) + "\">";
+    return "<li><div class=\"side\" style=\"--w:" + std::to_string(std::max(side.width, 1)) +
+           ";--h:" + std::to_string(std::max(side.height, 1)) + "\">" + picture + "</div>" + name + "</li>\n";
+}
+
+std::string sidesHtml(Letter const& letter) {
+    if (letter.sides.empty())
+        return {};
+    std::string html = "<ol class=\"sides\" aria-label=\"Sides of paper\">\n";
+    for (Side const& side : letter.sides)
+        html += sideHtml(side);
+    return html + "</ol>\n";
+}
+
 std::string letterHtml(Letter const& letter, std::string const& anchor, std::string const& count) {
     std::string const fields = anchor + "t";
     return "<article class=\"letter\" id=\"" + anchor + "\" aria-labelledby=\"" + anchor + "h\">\n" +
            letterHeading(letter, anchor, count) + "<a class=\"skip\" href=\"#" + fields +
            "\">Skip the picture</a>\n<div class=\"beside\">\n" + figuresOf(letter, anchor) +
            "<div class=\"fields\" id=\"" + fields + "\" tabindex=\"-1\">\n" + whyNotOf(letter) +
-           faultsOf(letter, anchor) + tableOf(letter, anchor) + "</div></div>\n</article>\n";
+           faultsOf(letter, anchor) + tableOf(letter, anchor) + "</div></div>\n" + sidesHtml(letter) +
+           "</article>\n";
 }
 
 std::string lettersHtml(Document const& document, std::string const& anchor) {

@@ -73,6 +73,16 @@ struct Fault {
     Reader::Box box = {};
 };
 
+/// A side of paper, small.
+struct Side {
+    std::string name;
+    /// None of a blank side.
+    std::string png = {};
+    /// In 1/100 mm.
+    int width = 0;
+    int height = 0;
+};
+
 struct Letter {
     /// All its pages in words.
     std::string pages;
@@ -82,6 +92,8 @@ struct Letter {
     std::vector<Sheet> sheets = {};
     std::vector<Zone> zones = {};
     std::vector<Fault> faults = {};
+    /// All that goes out, in its order, where that is more than its pages.
+    std::vector<Side> sides = {};
 };
 
 struct Document {
