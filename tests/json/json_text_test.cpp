@@ -8,9 +8,11 @@
 #include <cstdio>
 #include <cstring>
 #include <limits>
+#include <new>
 #include <random>
 #include <sstream>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -102,6 +104,49 @@ TEST(JsonPrinting, OfWhatIsNotUtf8Throws) {
     array.append(json::Object{{"a", json::Object{{"\xff", "b"}}}});
     EXPECT_EQ(messageOf([&] { print(array); }),
               "JSON error: a key that is not valid UTF-8 cannot be printed");
+}
+
+TEST(JsonPrinting, TakesAndRefusesTheKeysThatJanssonDoes) {
+    std::mt19937 random(17);
+    std::vector<unsigned> const bytes{0x01, 0x41, 0x7F, 0x80, 0x8F, 0x90, 0x9F, 0xA0, 0xBF, 0xC0, 0xC1,
+                                      0xC2, 0xDF, 0xE0, 0xE1, 0xED, 0xEF, 0xF0, 0xF1, 0xF4, 0xF5, 0xFF};
+    for (int round = 0; round < 20'000; ++round) {
+        std::string key;
+        for (std::size_t left = 1 + random() % 4; left > 0; --left)
+            key += static_cast<char>(bytes[random() % bytes.size()]);
+        bool const isTaken = static_cast<bool>(json::Value(json_string(key.c_str())));
+        json::Object object;
+        object.set(key, "a");
+        EXPECT_EQ(messageOf([&] { print(object); }),
+                  isTaken ? "nothing was thrown"
+                          : "JSON error: a key that is not valid UTF-8 cannot be printed")
+            << testing::PrintToString(key);
+    }
+}
+
+/// While it lives, jansson gets no memory.
+class NoMemoryForJansson {
+public:
+    NoMemoryForJansson() {
+        json_get_alloc_funcs(&allocate_, &release_);
+        json_set_alloc_funcs([](std::size_t) -> void* { return nullptr; }, release_);
+    }
+    ~NoMemoryForJansson() { json_set_alloc_funcs(allocate_, release_); }
+    NoMemoryForJansson(NoMemoryForJansson const&) = delete;
+    NoMemoryForJansson& operator=(NoMemoryForJansson const&) = delete;
+
+private:
+    json_malloc_t allocate_ = nullptr;
+    json_free_t release_ = nullptr;
+};
+
+TEST(JsonPrinting, TellsMissingMemoryFromTextThatIsNotUtf8) {
+    json::Object const whole = parse(R"({"a": ["\u00FC", {"\u20AC": "b"}]})");
+    json::Object const broken{{"a", "\xff"}};
+    std::ostringstream out;
+    NoMemoryForJansson const none;
+    EXPECT_THROW(out << whole, std::bad_alloc);
+    EXPECT_THROW(out << broken, json::Exc);
 }
 
 struct RealCase {
