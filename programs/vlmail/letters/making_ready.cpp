@@ -216,11 +216,10 @@ void MakingReady::makeAttachments(std::vector<Cfg::PackPreset> const& presets, W
             std::string const& id = preset.attachments()[i].id;
             attachments.made[i].id = id;
             attachments.made[i].document = files_.contains(id) ? files_.at(id).filename().string() : id;
-            jobs.push_back({{Part::Kind::Attachment, id},
-                            documents_.at(id),
-                            makerFor(preset),
-                            attachments.error,
-                            attachments.made[i]});
+            PreparedDocument const& document = documents_.at(id);
+            Production::Maker& maker = makerFor(preset);
+            jobs.push_back(
+                {{Part::Kind::Attachment, id}, document, maker, attachments.error, attachments.made[i]});
         }
     }
     runJobs(
