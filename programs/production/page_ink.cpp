@@ -33,6 +33,10 @@ bool isIn(std::span<Box const> boxes, Reader::Point point) {
 /// The edges of points `from` to `to` of a row or column of a picture.
 int edge(double point, double side) { return static_cast<int>(std::lround(point * side)); }
 
+Box pointAt(int column, int row) {
+    return {edge(column, POINT), edge(row, POINT), edge(column + 1, POINT), edge(row + 1, POINT)};
+}
+
 /// Points of one direction that may have a part in a stretch, and those that have surely all of theirs there.
 struct Stretch {
     int begin = 0;
@@ -46,7 +50,9 @@ struct Stretch {
           sureBegin(from <= 0 ? 0 : clamped(std::ceil(from / POINT) + BLUR, count)),
           sureEnd(to >= edge(count, POINT) ? count : clamped(std::floor(to / POINT) - BLUR, count)) {}
 
-    bool isSure(int point) const { return point >= sureBegin && point < sureEnd; }
+    bool isNearBegin(int point) const { return point < sureBegin; }
+    bool isNearEnd(int point) const { return point >= sureEnd; }
+    bool isSure(int point) const { return !isNearBegin(point) && !isNearEnd(point); }
 
 private:
     static int clamped(double point, int count) {
@@ -70,11 +76,12 @@ std::optional<Box> darkPart(Reader::Picture const& picture, Reader::Raster const
         for (int column = 0; column < picture.width; ++column) {
             auto const at = static_cast<std::size_t>(row) * static_cast<std::size_t>(picture.width) +
                             static_cast<std::size_t>(column);
+            if (!isDarkAt(picture.points, 3 * at))
+                continue;
             Box const point{edge(raster.left + column, across), edge(raster.top + row, down),
                             edge(raster.left + column + 1, across), edge(raster.top + row + 1, down)};
             if (liesIn(zone.left, zone.right, point.left, point.right) &&
-                liesIn(zone.top, zone.bottom, point.top, point.bottom) && isDarkAt(picture.points, 3 * at) &&
-                !isIn(except, point.centre()))
+                liesIn(zone.top, zone.bottom, point.top, point.bottom) && !isIn(except, point.centre()))
                 unite(found, point);
         }
     return found;
@@ -100,6 +107,7 @@ void PageInk::addPicture(Reader::Picture const& picture) {
     columns_ = picture.width;
     rows_ = picture.height;
     dark_.resize(picture.points.size() / 3);
+    std::optional<Box> points;
     for (int row = 0; row < rows_; ++row)
         for (int column = 0; column < columns_; ++column) {
             auto const at = static_cast<std::size_t>(row) * static_cast<std::size_t>(columns_) +
@@ -107,9 +115,10 @@ void PageInk::addPicture(Reader::Picture const& picture) {
             if (!isDarkAt(picture.points, 3 * at))
                 continue;
             dark_[at] = 1;
-            unite(bounds_,
-                  {edge(column, POINT), edge(row, POINT), edge(column + 1, POINT), edge(row + 1, POINT)});
+            unite(points, {column, row, column, row});
         }
+    if (points)
+        bounds_ = pointAt(points->left, points->top).united(pointAt(points->right, points->bottom));
 }
 
 std::optional<Box> PageInk::inside(Box const& zone, std::span<Box const> except) {
@@ -118,20 +127,22 @@ std::optional<Box> PageInk::inside(Box const& zone, std::span<Box const> except)
     Stretch const across(zone.left, zone.right, columns_);
     Stretch const down(zone.top, zone.bottom, rows_);
     std::optional<Box> found;
-    bool isAcrossOpen = false;
-    bool isDownOpen = false;
+    OpenEdges open;
     for (int row = down.begin; row < down.end; ++row)
         for (int column = across.begin; column < across.end; ++column) {
-            Box const point{edge(column, POINT), edge(row, POINT), edge(column + 1, POINT),
-                            edge(row + 1, POINT)};
-            if (!isDark(column, row) || isIn(except, point.centre()))
+            if (!isDark(column, row))
+                continue;
+            Box const point = pointAt(column, row);
+            if (isIn(except, point.centre()))
                 continue;
             if (across.isSure(column) && down.isSure(row))
                 unite(found, point);
-            isAcrossOpen = isAcrossOpen || !across.isSure(column);
-            isDownOpen = isDownOpen || !down.isSure(row);
+            open.left |= across.isNearBegin(column);
+            open.right |= across.isNearEnd(column);
+            open.top |= down.isNearBegin(row);
+            open.bottom |= down.isNearEnd(row);
         }
-    return found ? found : alongEdges(zone, except, isAcrossOpen, isDownOpen);
+    return found ? found : alongEdges(zone, except, open);
 }
 
 std::optional<Box> PageInk::wordsInside(Box const& zone, std::span<Box const> except) const {
@@ -144,19 +155,19 @@ std::optional<Box> PageInk::wordsInside(Box const& zone, std::span<Box const> ex
 }
 
 /// The strips hold all points that may or may not lie in the zone.
-std::optional<Box> PageInk::alongEdges(Box const& zone, std::span<Box const> except, bool across, bool down) {
+std::optional<Box> PageInk::alongEdges(Box const& zone, std::span<Box const> except, OpenEdges const& open) {
     constexpr int HALF = static_cast<int>((BLUR + 2) * POINT);
     std::optional<Box> found;
-    auto const take = [&](Strip const& strip) {
-        if (std::optional<Box> const more = drawnInside(strip, zone, except))
+    auto const look = [&](bool isOpen, bool isUpright, int at) {
+        if (!isOpen)
+            return;
+        if (std::optional<Box> const more = drawnInside({isUpright, at - HALF, at + HALF}, zone, except))
             unite(found, *more);
     };
-    if (across)
-        for (int const at : {zone.left, zone.right})
-            take({true, at - HALF, at + HALF});
-    if (down)
-        for (int const at : {zone.top, zone.bottom})
-            take({false, at - HALF, at + HALF});
+    look(open.left, true, zone.left);
+    look(open.right, true, zone.right);
+    look(open.top, false, zone.top);
+    look(open.bottom, false, zone.bottom);
     return found;
 }
 

@@ -32,7 +32,14 @@ private:
     void addWords();
     void addPicture(Reader::Picture const& picture);
     std::optional<Box> wordsInside(Box const& zone, std::span<Box const> except) const;
-    std::optional<Box> alongEdges(Box const& zone, std::span<Box const> except, bool across, bool down);
+    /// Edges of a zone with something close to them that may lie inside or outside.
+    struct OpenEdges {
+        bool left = false;
+        bool top = false;
+        bool right = false;
+        bool bottom = false;
+    };
+    std::optional<Box> alongEdges(Box const& zone, std::span<Box const> except, OpenEdges const& open);
     /// Upright or across the page.
     struct Strip {
         bool isUpright = true;

@@ -208,6 +208,17 @@ TEST(ClearZones, TakeWhatReachesIntoThemByTheToleranceAndNothingMore) {
     }
 }
 
+TEST(ClearZones, MayBeNarrowerThanWhatIsDrawnCoarsely) {
+    json::Value const narrow =
+        R"({"tolerance": 0, "clear_zones": [{"left": 5000, "top": 5000, "right": 5200, "bottom": 20000}]})"_json;
+    for (Box const& outside : {Box{4000, 9000, 4999, 9500}, Box{5201, 9000, 6000, 9500}})
+        EXPECT_THAT(codesOf(findingsIn(a4Page(box(outside)), printRules(narrow))), IsEmpty()) << outside.left;
+    for (Box const& inside : {Box{4000, 9000, 5001, 9500}, Box{5199, 9000, 6000, 9500},
+                              Box{5080, 9000, 5120, 9500}, Box{4000, 9000, 6000, 9500}})
+        EXPECT_THAT(codesOf(findingsIn(a4Page(box(inside)), printRules(narrow))), ElementsAre("clear-zone"))
+            << inside.left;
+}
+
 TEST(ClearZones, AreOnTheFirstPageOrOnAll) {
     std::string const content = box({5500, 5400, 6500, 5600});
     std::string const pdf = Reader::PdfMaker().page(content, A4_PAGE).page(content, A4_PAGE).bytes();

@@ -232,5 +232,25 @@ TEST(PageChecks, DrawPagesWhosePartsDiffer) {
     }
 }
 
+TEST(Overviews, AreKeptOfTheFirstPagesThatAreAskedForAndOfTheLast) {
+    PdfMaker maker;
+    for (int page = 0; page < 18; ++page)
+        maker.page("");
+    int drawn = 0;
+    Document document("a.pdf", std::make_unique<CountedSource>(maker.bytes(), drawn));
+    for (int const page : {1, 1, 2, 1})
+        EXPECT_EQ(document.overview(page)->width, 298) << page;
+    EXPECT_EQ(drawn, 2);
+    for (int page = 3; page <= 18; ++page)
+        document.overview(page);
+    EXPECT_EQ(drawn, 18);
+    for (int const page : {16, 18, 1})
+        document.overview(page);
+    EXPECT_EQ(drawn, 18);
+    document.overview(17);
+    EXPECT_EQ(drawn, 19);
+    EXPECT_THROW(document.overview(19), std::out_of_range);
+}
+
 } // namespace
 } // namespace Reader
