@@ -102,7 +102,10 @@ void mail(VlMail::ReadResult result, Cfg::Presets const& presets, fs::path const
     Base::PlainStream out(text);
     VlMail::Terminal const terminal{out, out};
     VlMail::MakingReady const making;
-    VlMail::Dispatch dispatch(presets, making, VlMail::mailingsIntoFolder(folder), terminal);
+    // Letters of any length.
+    Policy::SourcedSettings const settings({{"app", json::Object{{"max_letter_sheets", 0}}}}, "here");
+    VlMail::Dispatch dispatch(presets, making, {settings, {0, [](long long) { return 0LL; }}},
+                              VlMail::mailingsIntoFolder(folder), terminal);
     dispatch.take(std::move(result));
     dispatch.finish();
     dispatch.print();

@@ -189,6 +189,8 @@ std::vector<std::string> Rules::parts() {
 long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex) {
     long long sheets = 0;
     for (Mailing::DocumentPages const& document : letter.documents) {
+        if (duplex && document.role == Mailing::DocumentPages::Role::Blank)
+            continue;
         auto const pages = static_cast<long long>(document.pages.size());
         sheets += duplex ? (pages + 1) / 2 : pages;
     }

@@ -51,6 +51,9 @@ TEST(Sheets, AreCountedForEachDocumentOnItsOwn) {
     letter.documents = {{"a.pdf", {1, 2, 3}}, {"b.pdf", {1}}, {"c.pdf", {4, 5}}};
     EXPECT_EQ(Policy::sheetsOf(letter, false), 6);
     EXPECT_EQ(Policy::sheetsOf(letter, true), 4);
+    letter.documents.insert(letter.documents.begin() + 1,
+                            {"blank", {1}, Mailing::DocumentPages::Role::Blank});
+    EXPECT_EQ(Policy::sheetsOf(letter, true), 4);
 }
 
 TEST(LimitsOfMailings, LetEverythingOutThatNothingForbids) {

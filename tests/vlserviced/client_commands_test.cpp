@@ -1,4 +1,5 @@
 // The client's subcommands against a service: the command line in, text and exit status out.
+#include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
@@ -9,11 +10,13 @@
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
 #include "tests/vlserviced/service_process.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <ctime>
 #include <fstream>
 #include <sstream>
 #include <thread>
@@ -360,6 +363,159 @@ TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {
              write("token", std::string(40, 'x'))});
     EXPECT_EQ(stranger.status, VlMail::INCOMPLETE);
     EXPECT_THAT(stranger.out, testing::Not(HasSubstr(R"("connection":"ok")")));
+}
+
+/// Mails to the service what the settings of a node say.
+class MailingsOfANode : public ClientCommands {
+protected:
+    MailingsOfANode() {
+        output({"settings", "service", "upload_folder=" + upload_.string()});
+        output({"settings", "set", "/", "app", "db_host=" + folder_.path().string()});
+        setPackPreset("");
+        letter_ = write("a.txt", "To: Ada\n");
+    }
+
+    /// Keys of the pack preset, such as R"("duplex": true)".
+    void setPackPreset(std::string const& keys) {
+        output(
+            {"settings", "set", "a=acme", "presets",
+             write("presets.json",
+                   R"({"extract_presets": [{"match": ".*", "pack_preset": "Bills", "zones": [)"
+                   R"({"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, )"
+                   R"("fields": [{"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 1, )"
+                   R"("send_to_server": true}]}]}], "pack_presets": [{"name": "Bills", "title": "Bills")" +
+                       (keys.empty() ? "" : ", " + keys) + "}]}")});
+    }
+    /// Mails a letter; the mailing's id.
+    std::string mail(std::vector<std::string> const& more = {}) {
+        std::vector<std::string> arguments{"mail", "--send", "--node", "u=bob/a=acme", "--json", letter_};
+        arguments.insert(arguments.end(), more.begin(), more.end());
+        json::Object const mailed = parse(output(arguments));
+        return mailed.get("mailings").toArray().at(0).toObject().get("id").textOrEmpty();
+    }
+    json::Object jobOf(std::string const& id) {
+        json::Object const answer = parse(vlmail({"status", id, "--json"}).out);
+        return answer.get("jobs").toArray().at(0).toObject();
+    }
+    std::string stateOf(std::string const& id) { return jobOf(id).get("state").textOrEmpty(); }
+    void awaitState(std::string const& id, std::string const& state) {
+        while (stateOf(id) != state)
+            std::this_thread::yield();
+    }
+    bool isHandedOver(std::string const& id) const { return fs::exists(upload_ / (id + ".mailing")); }
+    bool isInOutbox(std::string const& id) const { return fs::exists(data_ / "outbox" / (id + ".mailing")); }
+
+    fs::path upload_ = folder_ / "upload";
+    std::string letter_;
+};
+
+TEST_F(MailingsOfANode, GoOutByThemselvesWhenTheyAreToGoAtOnce) {
+    setPackPreset(R"("process_mode": 3)");
+    std::string const id = mail();
+    awaitState(id, "submitted");
+    EXPECT_TRUE(isHandedOver(id));
+}
+
+TEST_F(MailingsOfANode, AreHeldThroughAnUploadAndAKilledServiceUntilTheyAreReleased) {
+    setPackPreset(R"("process_mode": 8)");
+    std::string const id = mail({"--upload"});
+    EXPECT_EQ(stateOf(id), "held");
+    service_.signal(SIGKILL);
+    service_.wait();
+    ServiceProcess const next({"--data", data_.string(), "--no-discovery"});
+    auto const nextOutput = [&](std::vector<std::string> arguments) {
+        arguments.insert(arguments.end(), {"--service", "127.0.0.1:" + std::to_string(next.port()), "--token",
+                                           (data_ / "token").string()});
+        return run(arguments).out;
+    };
+    EXPECT_THAT(nextOutput({"status", id}), HasSubstr("  held  "));
+    EXPECT_FALSE(isHandedOver(id));
+    EXPECT_EQ(nextOutput({"release", id}), id + ", queued\n");
+    while (nextOutput({"status", id}).find("  submitted  ") == std::string::npos)
+        std::this_thread::yield();
+    EXPECT_TRUE(isHandedOver(id));
+}
+
+TEST_F(MailingsOfANode, WaitForTheirSlotAndTellIt) {
+    setPackPreset(R"("delay": {"count": 300}, "process_mode": 2)");
+    std::string const id = mail({"--upload"});
+    EXPECT_EQ(stateOf(id), "held");
+    long long const due = jobOf(id).get("due").intOrZero();
+    EXPECT_NEAR(static_cast<double>(due - std::time(nullptr)) / 86'400, 299.5, 1);
+    EXPECT_THAT(output({"status", id}), HasSubstr("until "));
+    EXPECT_EQ(output({"hold", id}), id + ", held\n");
+    EXPECT_EQ(jobOf(id).get("due").intOrZero(), 0);
+    EXPECT_EQ(output({"release", id}), id + ", queued\n");
+    awaitState(id, "submitted");
+}
+
+TEST_F(MailingsOfANode, AreCalledBackUntilTheyAreHandedOver) {
+    std::string const one = mail();
+    std::string const two = mail();
+    EXPECT_EQ(output({"cancel", one}), one + ", cancelled\n");
+    EXPECT_EQ(stateOf(one), "cancelled");
+    EXPECT_FALSE(isInOutbox(one));
+    output({"upload"});
+    awaitState(two, "submitted");
+    EXPECT_FALSE(isHandedOver(one));
+    Result const late = vlmail({"cancel", two, one});
+    EXPECT_EQ(late.status, VlMail::INCOMPLETE);
+    EXPECT_EQ(late.out, one + ", cancelled\n");
+    EXPECT_THAT(late.err, testing::StartsWith("vlmail: it is too late to cancel mailing " + two +
+                                              ": the upload folder " + upload_.string() + " has it since "));
+    EXPECT_EQ(vlmail({"hold", two}).status, VlMail::FAILED);
+    EXPECT_EQ(complaint({"release", "none"}), "vlmail: there is no mailing none\n");
+}
+
+TEST_F(MailingsOfANode, AreTriedWithoutBeingHandedOver) {
+    setPackPreset(R"("process_mode": 131)");
+    std::string const id = mail({"--upload"});
+    awaitState(id, "tried");
+    EXPECT_TRUE(isInOutbox(id));
+    EXPECT_FALSE(isHandedOver(id));
+}
+
+TEST_F(MailingsOfANode, AreRefusedByTheClientWithTheNodeThatDoesNotAllowThem) {
+    output({"settings", "set", "a=acme", "app", "max_letter_sheets=1"});
+    letter_ = write("a.txt", "To: Ada\n\fmore\n");
+    Result const result = vlmail({"mail", "--send", "--node", "u=bob/a=acme", letter_});
+    EXPECT_EQ(result.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(result.out, HasSubstr("too-many-sheets: 2 sheets, 1 allowed by a=acme\n"));
+    EXPECT_EQ(output({"status"}), "the service has no such mailings\n");
+}
+
+TEST_F(MailingsOfANode, AreRefusedByTheServiceWhateverTheClientSends) {
+    output({"settings", "set", "a=acme", "app", "max_letter_sheets=2", "enforce_po=true"});
+    fs::path const database = folder_ / "packs.db";
+    storePack(database, "p1", "u=bob/a=acme");
+    auto const client = clientOf(service_, data_);
+    EXPECT_EQ(failureOf([&] { VlMail::sendPack(*client, database, "p1", false); }),
+              "The service refuses: purchase-order-missing: no purchase order, one wanted by a=acme; "
+              "too-many-sheets: 3 "
+              "sheets, 2 allowed by a=acme; pack p1 is not taken");
+}
+
+TEST_F(MailingsOfANode, BearThePurchaseOrderOfTheirNode) {
+    output({"settings", "set", "/", "po", "code=P-1"});
+    std::string const id = mail();
+    PackWrapper container((data_ / "outbox" / (id + ".mailing")).string(), PackWrapper::PURPOSE_IMPORT, "");
+    EXPECT_EQ(Mailing::Metadata::fromBlob(container.inputFullMeta()).purchaseOrder, "P-1");
+}
+
+TEST_F(MailingsOfANode, AreToldToAnOlderClientInStatesThatItKnows) {
+    setPackPreset(R"("process_mode": 8)");
+    std::string const id = mail();
+    auto const client = clientOf(service_, data_);
+    json::Object const answer = client->call<Ipc::CSConfigIdsList>(json::Object{{"query", "jobs"}})->resp();
+    EXPECT_EQ(answer.get("jobs").toArray().at(0).toObject().get("state"), json::Value("queued"));
+}
+
+TEST_F(MailingsOfANode, CannotReplaceALockedPresetBelow) {
+    setPackPreset(R"("lock_pack_ui": true)");
+    EXPECT_EQ(
+        complaint({"settings", "set", "u=bob/a=acme", "presets", R"(pack_presets=[{"name":"Bills"}])"}),
+        "vlmail: the settings \"presets\" were not changed: the pack preset \"Bills\" is locked by a=acme "
+        "(\"lock_pack_ui\"): nodes below cannot replace it\n");
 }
 
 // Without a service.

@@ -18,6 +18,8 @@ void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);
 /// Goes behind all others: it tells of them.
 void addHelpCommand(Base::Command const& app, Task& task);
+/// hold, release and cancel.
+void addJobChangeCommands(Base::Command const& app, Task& task);
 void addLetterCommand(Base::Command const& app, Task& task);
 void addMailCommand(Base::Command const& app, Task& task);
 void addPackCommand(Base::Command const& app, Task& task);

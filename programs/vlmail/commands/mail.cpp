@@ -1,5 +1,6 @@
 // vlmail mail and plan: the whole road from documents to mailings, in one go or decided first and carried out
 // later.
+#include "programs/base/local_offset.h"
 #include "programs/base/pending_file.h"
 #include "programs/vlmail/commands/batch_command.h"
 #include "programs/vlmail/commands/command.h"
@@ -14,6 +15,7 @@
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/json/json_text.h"
 
+#include <ctime>
 #include <filesystem>
 #include <memory>
 #include <ostream>
@@ -63,11 +65,10 @@ struct Destination {
 
 /// What counts at the node, as the service tells it.
 NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
-    auto const settings = fetchSettings(service, nodeId, {Cfg::Presets::PART_NAME, Cfg::App::PART_NAME});
-    json::Object parts;
-    for (std::string const& part : {Cfg::Presets::PART_NAME, Cfg::App::PART_NAME})
-        parts.set(part.c_str(), settings.part(part).values);
-    return NodeSettings::resolved(parts, "the service, at " + nodeInWords(nodeId));
+    std::vector<std::string> parts = Policy::Rules::parts();
+    parts.push_back(Cfg::Presets::PART_NAME);
+    return NodeSettings::resolved(fetchSettings(service, nodeId, parts),
+                                  "the service, at " + nodeInWords(nodeId));
 }
 
 NodeSettings settingsFor(Options const& options, Destination const& destination) {
@@ -83,12 +84,17 @@ MakingReady makingFor(Options const& options, Cfg::Presets const& presets, Makin
     return making;
 }
 
+/// By the clock and the place of this machine.
+MailingPolicies policiesOf(NodeSettings const& settings) {
+    return {settings.sourced(), {std::time(nullptr), &Base::localOffset}};
+}
+
 int mailDocuments(Options const& options, Terminal const& terminal) {
     Destination const destination(options, terminal);
     NodeSettings const settings = settingsFor(options, destination);
     Cfg::Presets const presets = settings.presets();
     MakingReady making = makingFor(options, presets, MakingReady::Colours::Counted);
-    Dispatch dispatch(presets, making, destination.begin, terminal);
+    Dispatch dispatch(presets, making, policiesOf(settings), destination.begin, terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
               {.pages = Along::Pages::Yes,
@@ -109,7 +115,7 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     Cfg::Presets const presets = settings.presets();
     MakingReady making;
     plan.prepare(making, presets, options.reading.workers());
-    Dispatch dispatch(presets, making, destination.begin, terminal);
+    Dispatch dispatch(presets, making, policiesOf(settings), destination.begin, terminal);
     BatchProgress progress(terminal);
     splitBatch(plan.documents(), presets, options.reading.workers(), options.checkEvery, making, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
@@ -123,7 +129,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
     MakingReady making = makingFor(
         options, presets, options.price ? MakingReady::Colours::Counted : MakingReady::Colours::Ignored);
     Plan plan(settings, making.usedDocuments());
-    Dispatch dispatch(presets, making, mailingsNowhere(), terminal);
+    Dispatch dispatch(presets, making, policiesOf(settings), mailingsNowhere(), terminal);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
               {.pages = Along::Pages::Planned,

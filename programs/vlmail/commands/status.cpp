@@ -25,10 +25,12 @@ struct Options {
     bool json = false;
 };
 
-/// What keeps a job from going on, and what should not take so long.
+/// What keeps a job from going on, what should not take so long, and until when it is held.
 std::string noteOn(Protocol::JobReport const& job) {
-    return job.problem.empty() || job.alarm.empty() ? job.problem + job.alarm
-                                                    : job.problem + "; " + job.alarm;
+    std::string note = job.due > 0 ? "until " + LocalTime::toText(job.due) : std::string();
+    for (std::string const& more : {job.problem, job.alarm})
+        note += (note.empty() || more.empty() ? "" : "; ") + more;
+    return note;
 }
 
 void print(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {

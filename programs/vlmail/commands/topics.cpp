@@ -8,8 +8,10 @@ constexpr char const* LETTERS = "letters-and-mailings.md";
 constexpr char const* PRESETS_TOOLS = "presets-tools.md";
 
 constexpr Manual::Topic TOPICS[] = {
+    {"cancel", CLIENT, "Holding, releasing and cancelling"},
     {"check", "check.md", ""},
     {"discover", CLIENT, "Looking for the service"},
+    {"hold", CLIENT, "Holding, releasing and cancelling"},
     {"letter", LETTERS, "Reading"},
     {"mail", LETTERS, "Mailing"},
     {"plan", LETTERS, "Planning"},
@@ -19,6 +21,7 @@ constexpr Manual::Topic TOPICS[] = {
     {"presets lint", PRESETS_TOOLS, "What is wrong with settings"},
     {"presets test", PRESETS_TOOLS, "Whether documents still give what they gave"},
     {"price", CLIENT, "Prices"},
+    {"release", CLIENT, "Holding, releasing and cancelling"},
     {"settings show", CLIENT, "What counts at a node"},
     {"settings tree", CLIENT, "All nodes"},
     {"settings ids", CLIENT, "The nodes of a user"},

@@ -59,6 +59,7 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     if (isPresetsPart(settings.parts_))
         settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};
     requirePartNames(settings.parts_, file);
+    settings.sourced_ = Policy::SourcedSettings(settings.parts_, file.string());
     settings.presets();
     return settings;
 }
@@ -75,6 +76,15 @@ NodeSettings NodeSettings::resolved(json::Object parts, std::string place) {
     settings.place_ = std::move(place);
     // Own presets stand in front of inherited ones, whatever their order.
     settings.sorted_ = false;
+    return settings;
+}
+
+NodeSettings NodeSettings::resolved(Protocol::SettingsAnswer const& answer, std::string place) {
+    json::Object parts;
+    for (auto const& [name, part] : answer.parts)
+        parts.set(name, Protocol::PartSettings(part.toObject()).values);
+    NodeSettings settings = resolved(std::move(parts), std::move(place));
+    settings.sourced_ = Policy::SourcedSettings(answer);
     return settings;
 }
 

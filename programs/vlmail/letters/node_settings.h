@@ -1,6 +1,8 @@
 #pragma once
 // The settings that a command works with, from a JSON document on disk.
 
+#include "programs/policy/sourced_settings.h"
+#include "programs/protocol/settings.h"
 #include "vlservice/cfg/app.h"
 #include "vlservice/json/json.h"
 #include "vlservice/presets/presets.h"
@@ -23,6 +25,8 @@ public:
     static NodeSettings fromFileIfNamed(std::string const& file);
     /// What counts at a node, {"presets": ...} and so on, in the order in which a service has resolved it.
     static NodeSettings resolved(json::Object parts, std::string place);
+    /// The same, with the node that each value comes from.
+    static NodeSettings resolved(Protocol::SettingsAnswer const& answer, std::string place);
 
     /// Completed by the global defaults, so that a pair of presets exists for every document's name.
     /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
@@ -31,6 +35,8 @@ public:
     Cfg::App app() const;
     /// The part's JSON as it stands in the document; the empty handle when it is not there.
     json::Value part(std::string const& name) const { return parts_.get(name); }
+    /// With where each value comes from: a node, or the file.
+    Policy::SourcedSettings const& sourced() const { return sourced_; }
     /// Empty for settings that are not from a file.
     std::filesystem::path const& file() const { return file_; }
     /// Where they come from, as messages say it.
@@ -45,6 +51,7 @@ private:
     std::string place_ = "the settings";
     bool sorted_ = true;
     json::Object parts_;
+    Policy::SourcedSettings sourced_;
 };
 
 } // namespace VlMail

@@ -414,11 +414,10 @@ std::string LetterReading::whyNot() const {
     if (!doubtfulJoins.empty())
         return joinsInWords(*this);
     std::string message;
-    if (isProductionReady(message))
-        return errorsInWords(findings);
-    if (message.empty())
-        return "no address to go to";
-    return message;
+    if (!isProductionReady(message))
+        return message.empty() ? "no address to go to" : message;
+    std::string const faults = errorsInWords(findings);
+    return faults.empty() ? refusal : faults;
 }
 
 json::Object DocumentReading::toJson() const {

@@ -47,6 +47,8 @@ struct LetterReading {
     std::string coverAddress = {};
     /// The cover page, when pages were asked for and there is one.
     std::vector<PageBlob> cover = {};
+    /// What of it the settings do not allow, "code: line". It keeps the letter from going out.
+    std::string refusal = {};
 
     /// Whether the letter can go out. Otherwise `message` has the library's words, which are empty when the
     /// letter has no address to go to.

@@ -5,6 +5,7 @@
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/text_table.h"
+#include "vlservice/json/json_form.h"
 #include "vlservice/pack/container_format.h"
 
 #include <numeric>
@@ -36,13 +37,15 @@ void requireName(DocumentReading& reading) {
 
 } // namespace
 
-Dispatch::Dispatch(Cfg::Presets const& presets, MakingReady const& making, BeginMailing begin,
-                   Terminal const& terminal)
-    : presets_(presets), making_(making), begin_(std::move(begin)), terminal_(terminal) {}
+Dispatch::Dispatch(Cfg::Presets const& presets, MakingReady const& making, MailingPolicies policies,
+                   BeginMailing begin, Terminal const& terminal)
+    : presets_(presets), making_(making), policies_(std::move(policies)), begin_(std::move(begin)),
+      terminal_(terminal) {}
 
 void Dispatch::take(ReadResult result) {
     DocumentReading& reading = result.reading;
     requireName(reading);
+    refuseLetters(reading);
     outcome_.count(reading);
     if (reading.failed()) {
         fail(reading.document, reading.error);
@@ -51,6 +54,18 @@ void Dispatch::take(ReadResult result) {
     } else {
         mailLetters(std::move(reading));
     }
+}
+
+/// What is out for another reason has enough of one.
+void Dispatch::refuseLetters(DocumentReading& reading) {
+    Cfg::PackPreset const* const preset = packPresetNamed(reading.packPreset, presets_);
+    if (!preset || reading.failed() || reading.isAttachment())
+        return;
+    for (LetterReading& letter : *reading.letters)
+        if (letter.whyNot().empty())
+            letter.refusal = policies_.whyNot(
+                sheetsOf(letter, *preset) + sheetsOf(making_.attachmentsOf(reading.packPreset), *preset),
+                *preset);
 }
 
 void Dispatch::mailLetters(DocumentReading reading) {
@@ -77,11 +92,16 @@ void Dispatch::noteNotifications(std::string const& name, LetterReading const& l
 
 OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
     auto& mailing = mailings_[packPreset];
-    if (!mailing) {
-        Cfg::PackPreset const& preset = requirePackPreset(packPreset, presets_);
-        mailing = begin_(preset);
-        mailing->builder().useDocuments(making_.attachmentsOf(packPreset), making_.usedDocumentsOf(preset));
-    }
+    if (mailing)
+        return *mailing;
+    Cfg::PackPreset const& preset = requirePackPreset(packPreset, presets_);
+    mailing = begin_(policies_.asAllowed(preset));
+    MailingBuilder& builder = mailing->builder();
+    builder.useDocuments(making_.attachmentsOf(packPreset), making_.usedDocumentsOf(preset));
+    builder.setPurchaseOrder(policies_.purchaseOrder());
+    builder.limitGroups([this](long long sheets) { return policies_.allows(sheets); });
+    if (std::string note = noteOn(preset); !note.empty())
+        notes_.push_back(std::move(note));
     return *mailing;
 }
 
@@ -131,6 +151,8 @@ void Dispatch::print() const {
     for (LeftBehind const& letter : leftOut_)
         terminal_.out << "left out: " << letter.name << ", " << pagesInWords(letter.pages) << ": "
                       << letter.reason << '\n';
+    for (std::string const& note : notes_)
+        terminal_.out << "note: " << note << '\n';
     terminal_.out << outcome_.inWords() << '\n';
 }
 
@@ -155,6 +177,8 @@ json::Object Dispatch::toJson() const {
                         {"failures", toJson(failures_)}};
     if (!notifications_.empty())
         object.set("notifications", toJson(notifications_));
+    if (!notes_.empty())
+        object.set("notes", json::Form<std::vector<std::string>>::write(notes_));
     return object;
 }
 

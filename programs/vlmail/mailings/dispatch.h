@@ -5,6 +5,7 @@
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/reading.h"
+#include "programs/vlmail/mailings/mailing_policies.h"
 #include "programs/vlmail/mailings/outgoing_mailing.h"
 #include "programs/vlmail/terminal/terminal.h"
 
@@ -18,8 +19,8 @@ namespace VlMail {
 class Dispatch {
 public:
     /// `presets` are those that the documents were read by, `making` is what they were made ready with.
-    Dispatch(Cfg::Presets const& presets, MakingReady const& making, BeginMailing begin,
-             Terminal const& terminal);
+    Dispatch(Cfg::Presets const& presets, MakingReady const& making, MailingPolicies policies,
+             BeginMailing begin, Terminal const& terminal);
 
     /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
     /// of.
@@ -31,7 +32,8 @@ public:
 
     /// A table of the mailings, and a line for each document and letter that stays behind.
     void print() const;
-    /// {"mailings", "left_out", "attachments", "failures"}, and "notifications" where there are any.
+    /// {"mailings", "left_out", "attachments", "failures"}, and "notifications" and "notes" where there are
+    /// any.
     json::Object toJson() const;
     Outcome::End end() const { return outcome_.end(); }
 
@@ -51,6 +53,7 @@ private:
         std::string address;
     };
 
+    void refuseLetters(DocumentReading& reading);
     void mailLetters(DocumentReading reading);
     void noteNotifications(std::string const& name, LetterReading const& letter);
     OutgoingMailing& mailingFor(std::string const& packPreset);
@@ -62,6 +65,7 @@ private:
 
     Cfg::Presets const& presets_;
     MakingReady const& making_;
+    MailingPolicies policies_;
     BeginMailing begin_;
     Terminal const& terminal_;
     /// By the pack preset's name, so that the same documents give the same order of mailings.
@@ -72,6 +76,8 @@ private:
     std::vector<LeftBehind> leftOut_;
     std::vector<LeftBehind> failures_;
     std::vector<std::string> attachments_;
+    /// What a person should know of a mailing.
+    std::vector<std::string> notes_;
     std::vector<Notification> notifications_;
     Outcome outcome_;
 };

@@ -32,7 +32,28 @@ Cfg::ExtractedFields deepCopy(Cfg::ExtractedFields const& fields) {
     return Cfg::ExtractedFields(json::Value(json_deep_copy(fields.serialize().node())).toArray());
 }
 
+Production::Sides sidesOf(Cfg::PackPreset const& packPreset) {
+    return packPreset.duplex() ? Production::Sides::Both : Production::Sides::One;
+}
+
+/// Those of its own pages: what joins a group gets no cover page.
+long long ownSheetsOf(LetterReading const& letter, Cfg::PackPreset const& packPreset) {
+    std::size_t const pages = letter.blobs.empty() ? letter.pages.size() : letter.blobs.size();
+    return Production::sheetsOf({static_cast<int>(pages)}, sidesOf(packPreset));
+}
+
 } // namespace
+
+long long sheetsOf(LetterReading const& letter, Cfg::PackPreset const& packPreset) {
+    return ownSheetsOf(letter, packPreset) + (letter.coverAddress.empty() ? 0 : 1);
+}
+
+long long sheetsOf(std::vector<MadeAttachment> const& attachments, Cfg::PackPreset const& packPreset) {
+    std::vector<int> pageCounts;
+    for (MadeAttachment const& attachment : attachments)
+        pageCounts.push_back(static_cast<int>(attachment.pages.size()));
+    return Production::sheetsOf(pageCounts, sidesOf(packPreset));
+}
 
 MailingBuilder::MailingBuilder(PageSaverI& pages, std::string id, Cfg::PackPreset packPreset,
                                long long created)
@@ -50,13 +71,16 @@ void MailingBuilder::add(std::string const& document, LetterReading letter) {
     pageCount_ += letter.pages.size();
     ++letterCount_;
     if (Group* const group = metadata_.packPreset.noGroup() ? nullptr : joinedGroup(letter)) {
+        group->sheets += ownSheetsOf(letter, metadata_.packPreset);
         group->letters.push_back(stored(document, letter.blobs, Place::Later));
         return;
     }
     byFields_.emplace(groupKey(letter.fields), groups_.size());
+    long long const sheets = sheetsOf(letter, metadata_.packPreset);
     groups_.push_back({storedCover(std::move(letter.cover)),
                        {stored(document, letter.blobs, Place::First)},
-                       std::move(letter.fields)});
+                       std::move(letter.fields),
+                       sheets});
 }
 
 /// The window shows the first sheet of those that go out as one: only the first letter's counts.
@@ -72,8 +96,12 @@ std::vector<MailingBuilder::Part> MailingBuilder::storedCover(std::vector<PageBl
 
 MailingBuilder::Group* MailingBuilder::joinedGroup(LetterReading const& letter) {
     auto const [begin, end] = byFields_.equal_range(groupKey(letter.fields));
-    auto const found = std::find_if(
-        begin, end, [&](auto const& entry) { return groups_[entry.second].fields.sameAs(letter.fields); });
+    long long const more =
+        ownSheetsOf(letter, metadata_.packPreset) + sheetsOf(attachments_, metadata_.packPreset);
+    auto const found = std::find_if(begin, end, [&](auto const& entry) {
+        Group const& group = groups_[entry.second];
+        return group.fields.sameAs(letter.fields) && allows_(group.sheets + more);
+    });
     if (found == end)
         return nullptr;
     Group& group = groups_[found->second];
@@ -166,7 +194,7 @@ std::vector<MailingBuilder::Part const*> MailingBuilder::partsOf(Group const& gr
 }
 
 Mailing::MailedLetter MailingBuilder::composed(Group const& group) {
-    auto const sides = metadata_.packPreset.duplex() ? Production::Sides::Both : Production::Sides::One;
+    Production::Sides const sides = sidesOf(metadata_.packPreset);
     Mailing::MailedLetter letter{{}, group.fields};
     std::vector<int> pageCounts;
     std::vector<Part const*> const parts = partsOf(group);

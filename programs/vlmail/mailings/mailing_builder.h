@@ -9,6 +9,7 @@
 #include "vlservice/pack/page_saver.h"
 
 #include <cstddef>
+#include <functional>
 #include <map>
 #include <string>
 #include <unordered_map>
@@ -17,6 +18,11 @@
 #include <vector>
 
 namespace VlMail {
+
+// Of paper, by the pages of each part and whether the pack preset prints on both sides. A letter that goes
+// out alone, with its cover page.
+long long sheetsOf(LetterReading const& letter, Cfg::PackPreset const& packPreset);
+long long sheetsOf(std::vector<MadeAttachment> const& attachments, Cfg::PackPreset const& packPreset);
 
 class MailingBuilder {
 public:
@@ -35,6 +41,11 @@ public:
     /// Takes the attachments of the pack preset, in the order of its list, and the documents that were used.
     /// Their pages are stored when the mailing has letters.
     void useDocuments(std::vector<MadeAttachment> const& attachments, std::vector<UsedDocument> const& used);
+
+    void setPurchaseOrder(std::string code) { metadata_.purchaseOrder = std::move(code); }
+
+    /// A letter joins no group that would have a number of sheets then that `allows` denies.
+    void limitGroups(std::function<bool(long long sheets)> allows) { allows_ = std::move(allows); }
 
     /// Completes the letters, and stores what they share: attachments and blank sides.
     Mailing::Metadata const& finish();
@@ -58,6 +69,8 @@ private:
         std::vector<Part> cover;
         std::vector<Part> letters;
         Cfg::ExtractedFields fields;
+        /// Of its letters and the cover page.
+        long long sheets = 0;
     };
     enum class Place { First, Later };
 
@@ -82,6 +95,7 @@ private:
     /// Numbers of stored pages by their document's name and their digest.
     std::unordered_map<std::string, int> byContent_;
     std::vector<MadeAttachment> attachments_;
+    std::function<bool(long long sheets)> allows_ = [](long long) { return true; };
     /// In the order in which they go out.
     std::vector<Part> inFront_;
     std::vector<Part> behind_;

@@ -35,9 +35,9 @@ constexpr ActingRow APP[] = {
 constexpr ActingRow INET[] = {
     {"help_url", Nobody},
     {"contact_url", Nobody},
-    {"status_update_hours", Nobody},
-    {"submitted_alarm_hours", Client},
-    {"lodged_alarm_hours", Client},
+    {"status_update_hours", Service},
+    {"submitted_alarm_hours", Service},
+    {"lodged_alarm_hours", Service},
     {"wizard_image", Nobody},
 };
 constexpr ActingRow PO[] = {
@@ -107,7 +107,7 @@ constexpr ActingRow PACK_PRESET[] = {
     {"orientation", Client},
     {"department", ClientAndService},
     {"no_group", Client},
-    {"process_mode", ClientAndService},
+    {"process_mode", Service},
     {"process_mode_client", Nobody},
     {"profile", ClientAndService},
     {"priority_delivery", ClientAndService},

@@ -1,9 +1,12 @@
 // Pack presets: whether each is found, used, and read as it is meant.
+#include "programs/base/local_offset.h"
+#include "programs/policy/limits.h"
 #include "programs/vlmail/presets/checks.h"
 #include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
 
 #include <algorithm>
+#include <ctime>
 #include <exception>
 #include <string>
 #include <vector>
@@ -103,6 +106,18 @@ std::string lostKeys(json::Object const& object) {
     }
 }
 
+/// Empty for a delay that ends, and for one that cannot be read, which is told of its keys.
+std::string whyNeverEnding(json::Value const& delay) {
+    if (!delay.isObject())
+        return {};
+    try {
+        return Policy::whyImpossible(Cfg::PackPreset::DelayInfo(delay.toObject()),
+                                     {std::time(nullptr), &Base::localOffset});
+    } catch (json::Exc const&) {
+        return {};
+    }
+}
+
 } // namespace
 
 void checkPackPresetNames(PresetsDocument const& document, Findings& findings) {
@@ -145,6 +160,23 @@ void checkProcessModes(PresetsDocument const& document, Findings& findings) {
                 findings.add(ProcessModeRefused, pack.place / row.key,
                              {std::to_string(mode.toInt()), why, inWords(row.rules.required)});
         }
+    }
+}
+
+void checkDelays(PresetsDocument const& document, Findings& findings) {
+    for (ListedPackPreset const& pack : document.packPresets())
+        if (std::string const why = whyNeverEnding(pack.json.get("delay")); !why.empty())
+            findings.add(DelayImpossible, pack.place / "delay",
+                         {why, std::to_string(Policy::MAX_DELAY_DAYS)});
+}
+
+void checkEmails(PresetsDocument const& document, Findings& findings) {
+    for (ListedPackPreset const& pack : document.packPresets()) {
+        std::string const email = pack.json.get("customer_email").textOrEmpty();
+        if (!email.empty() && !Policy::isEmailAddress(email))
+            findings.add(EmailMalformed, pack.place / "customer_email", {inQuotes(email)});
+        if (pack.json.get("confirmation_email").isTrue())
+            findings.add(ConfirmationNotSent, pack.place / "confirmation_email");
     }
 }
 

@@ -25,6 +25,8 @@ void checkErasedPresets(PresetsDocument const& document, Findings& findings);
 void checkPackPresetNames(PresetsDocument const& document, Findings& findings);
 void checkPackPresetsUsed(PresetsDocument const& document, Findings& findings);
 void checkProcessModes(PresetsDocument const& document, Findings& findings);
+void checkDelays(PresetsDocument const& document, Findings& findings);
+void checkEmails(PresetsDocument const& document, Findings& findings);
 void checkLetterheads(PresetsDocument const& document, Findings& findings);
 
 // check_patterns.cpp

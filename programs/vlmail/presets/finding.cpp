@@ -97,6 +97,17 @@ constexpr FindingWords WORDS[] = {
      "set one of \"skip_letters\", \"skip_attachments\", \"repeat_last_page\", \"apply_first_grouped_only\" and "
      "\"on_top\" to true"},
 
+    {DelayImpossible, "delay-impossible", Error,
+     "the delay never ends, and no mailing goes out by this preset: {0}",
+     "write days of the week from 0 (Sunday) to 6, days of the month from 1 to 31 and minutes of the day from 0 to 1439 "
+     "that come together within {1} days"},
+    {EmailMalformed, "email-malformed", Error,
+     "{0} is no e-mail address, and no mailing goes out by this preset",
+     "write one address, such as name@example.com"},
+    {ConfirmationNotSent, "confirmation-not-sent", Warning,
+     "nobody gets an e-mail when the mailing is handed over: there is no carrier for e-mails",
+     "remove it, and look with \"vlmail status\""},
+
     {PatternBroken, "broken-pattern", Error,
      "the pattern is broken at character {0} ({1}): {2}",
      "correct the pattern"},

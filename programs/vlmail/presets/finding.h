@@ -40,6 +40,9 @@ enum class FindingKind {
     ErasedPackPresetUsed,
     ProcessModeRefused,
     LetterheadLosesKeys,
+    DelayImpossible,
+    EmailMalformed,
+    ConfirmationNotSent,
     // Patterns.
     PatternBroken,
     RunawayPattern,

@@ -110,6 +110,10 @@ json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query) {
     return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
 }
 
+json::Object ask(Channel::Client& service, Protocol::JobsChange const& change) {
+    return requireAnswer(service.call<Ipc::CSConfigIdsList>(change.serialize())->resp());
+}
+
 fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
     std::string const& app = Cfg::App::PART_NAME;
     json::Object const values = Protocol::SettingsAnswer(ask(service, {nodeId, {app}})).part(app).values;

@@ -45,6 +45,7 @@ void requireNoError(std::string const& error);
 /// Throws Error with the service's line.
 json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query);
 json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query);
+json::Object ask(Channel::Client& service, Protocol::JobsChange const& change);
 
 /// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
 /// otherwise "packs.db" in dataFolder(). Throws Error when the name is not that of a file.

@@ -401,4 +401,128 @@ TEST_F(VlMailTest, RefusesAPlanThatWasEdited) {
                         "\": it was changed since it was made; make it again with vlmail plan\n");
 }
 
+/// The settings with further parts, and further keys of the pack preset.
+std::string settingsWith(std::string const& parts, std::string const& keys = "") {
+    std::string presets = SETTINGS;
+    std::string const duplex = R"("duplex": true)";
+    presets.replace(presets.find(duplex), duplex.size(), duplex + keys);
+    return R"({"presets": )" + presets + ", " + parts + "}";
+}
+
+TEST_F(VlMailTest, LeavesALetterOutThatHasMoreSheetsThanTheSettingsAllow) {
+    write("node.json", settingsWith(R"("app": {"max_letter_sheets": 1})"));
+    write("invoice 1.txt", "No 1\nTo: Ada\n\fmore\n\fmore\n");
+    write("invoice 2.txt", "No 2\nTo: Bob\n\fmore\n");
+    std::string const line = "left out: invoice 1.txt, pages 1-3: too-many-sheets: 2 sheets, 1 allowed by " +
+                             path("node.json") + '\n';
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt", "invoice 2.txt"}, {"-o", path("plan.json")}),
+              VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr(line));
+    EXPECT_THAT(out_, HasSubstr("2 documents, 2 letters: 1 ready, 1 cannot go out\n"));
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt", "invoice 2.txt"}, {"-o", path("out")}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr(line));
+    ASSERT_EQ(mailings().size(), 1u);
+    ASSERT_EQ(metadataOf(mailings()[0]).letters.size(), 1u);
+    EXPECT_EQ(metadataOf(mailings()[0]).letters[0].documents[0].document, "invoice 2.txt");
+    fs::remove_all(folder_ / "out");
+    EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::INCOMPLETE);
+    EXPECT_THAT(out_, HasSubstr(line));
+    EXPECT_EQ(metadataOf(mailings().at(0)).letters.size(), 1u);
+}
+
+TEST_F(VlMailTest, CountsTheSheetsOfAttachmentsWithEachLetter) {
+    write("node.json", settingsWith(R"("app": {"max_letter_sheets": 2})", R"(, "attachments": ["terms"])"));
+    write("documents/terms.txt", "Terms\n\fmore\n");
+    write("invoice 1.txt", "No 1\nTo: Ada\n\fmore\n\fmore\n");
+    write("invoice 2.txt", "No 2\nTo: Bob\n\fmore\n");
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt", "invoice 2.txt"},
+                     {"-o", path("out"), "--documents", path("documents")}),
+              VlMail::INCOMPLETE);
+    EXPECT_THAT(out_,
+                HasSubstr("left out: invoice 1.txt, pages 1-3: too-many-sheets: 3 sheets, 2 allowed by " +
+                          path("node.json") + '\n'))
+        << err_;
+    EXPECT_EQ(metadataOf(mailings().at(0)).letters.size(), 1u);
+}
+
+TEST_F(VlMailTest, PutsNoLettersTogetherThatHaveTooManySheetsAsOne) {
+    std::vector<std::string> letters;
+    for (char const* const name : {"invoice 1.txt", "invoice 2.txt", "invoice 3.txt"}) {
+        write(name, "No 1\nTo: Ada\n");
+        letters.emplace_back(name);
+    }
+    write("node.json", settingsWith(R"("app": {"max_letter_sheets": 2})"));
+    EXPECT_EQ(vlmail("mail", letters, {"-o", path("out")}), VlMail::FINE);
+    Mailing::Metadata const metadata = metadataOf(mailings().at(0));
+    ASSERT_EQ(metadata.letters.size(), 2u);
+    EXPECT_EQ(metadata.letters[0].sheets, 2);
+    EXPECT_EQ(metadata.letters[1].sheets, 1);
+}
+
+TEST_F(VlMailTest, LeavesAllLettersOfAMailingOutThatTheSettingsDoNotAllow) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("invoice 2.txt", "No 2\n");
+    struct {
+        std::string parts;
+        std::string keys;
+        std::string line;
+    } const cases[] = {
+        {R"("app": {"enfoce_dep": true}, "deps": {"vals": ["IT"]})", R"(, "department": "Sales")",
+         "department-not-listed: department \"Sales\", \"IT\" allowed by NODE"},
+        {R"("app": {"enforce_profile": true}, "profiles": {"vals": [{"name": "A"}]})", "",
+         "profile-not-listed: no profile, \"A\" allowed by NODE"},
+        {R"("app": {"enforce_po": true})", "",
+         "purchase-order-missing: no purchase order, one wanted by NODE"},
+        {R"("app": {})", R"(, "customer_email": "ada")",
+         "email-malformed: \"customer_email\" \"ada\", one address NAME@HOST possible, as set by NODE"},
+        {R"("app": {})", R"(, "delay": {"mins": [9999]})",
+         "delay-impossible: 9999 in \"mins\", 0 to 1439 possible, as set by NODE"},
+    };
+    for (auto const& [parts, keys, line] : cases) {
+        write("node.json", settingsWith(parts, keys));
+        std::string wanted = line;
+        wanted.replace(wanted.find("NODE"), 4, path("node.json"));
+        EXPECT_EQ(vlmail("mail", {"invoice 1.txt", "invoice 2.txt"}, {"-o", path("out")}),
+                  VlMail::INCOMPLETE);
+        EXPECT_THAT(out_, HasSubstr("left out: invoice 1.txt, page 1: " + wanted + "\n"));
+        EXPECT_THAT(out_, HasSubstr("left out: invoice 2.txt, page 1: no address to go to\n"));
+        EXPECT_TRUE(mailings().empty());
+        EXPECT_EQ(err_, "");
+    }
+}
+
+TEST_F(VlMailTest, WritesThePurchaseOrderAndThePriorityThatTheSettingsDecide) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("node.json", settingsWith(R"("app": {"priority_delivery": 1}, "po": {"code": "P-1"})",
+                                    R"(, "priority_delivery": true)"));
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FINE);
+    Mailing::Metadata const metadata = metadataOf(mailings().at(0));
+    EXPECT_EQ(metadata.purchaseOrder, "P-1");
+    EXPECT_FALSE(metadata.packPreset.priorityDelivery());
+}
+
+TEST_F(VlMailTest, SaysThatNobodySendsAnEmailOnceAMailingIsHandedOver) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("node.json", settingsWith(R"("app": {})", R"(, "confirmation_email": true)"));
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json")}), VlMail::FINE);
+    std::string const note =
+        "pack preset \"Invoices\" wants an e-mail when its mailing is handed over, which nobody "
+        "sends: there is no carrier for e-mails";
+    EXPECT_THAT(out_, HasSubstr("note: " + note + "\n"));
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json"), "--json"}), VlMail::FINE);
+    json::Array const notes = json::strToObject(out_.data(), out_.size()).get("notes").toArray();
+    ASSERT_EQ(notes.size(), 1u);
+    EXPECT_EQ(notes.at(0), json::Value(note));
+}
+
+TEST_F(VlMailTest, SaysThatItsSettingsCannotBeUsed) {
+    write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("node.json", settingsWith(R"("app": {"max_letter_sheets": "5"})"));
+    EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FAILED);
+    EXPECT_EQ(
+        err_,
+        "vlmail: cannot use the settings: JSON error: Wrong type: string. Expected type: integer; correct "
+        "them there\n");
+}
+
 } // namespace

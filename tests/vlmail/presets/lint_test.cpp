@@ -287,6 +287,37 @@ std::vector<Case> const CASES{
      {"error /pack_presets/0/process_mode: 256 is refused, and all settings of the document with it: it has "
       "more than eight bits | write 0, or a number up to 255 with one of the bits 1, 2, 8 and 128 "
       "[process-mode-refused]"}},
+    {"ADelayThatNeverEnds",
+     partOf(preset(R"_("match": ".*", "pack_preset": "P")_"),
+            R"_({"name": "P", "delay": {"week_days": [1, 9]}})_"),
+     {"error /pack_presets/0/delay: the delay never ends, and no mailing goes out by this preset: 9 in "
+      "\"week_days\", "
+      "0 to 6 possible | write days of the week from 0 (Sunday) to 6, days of the month from 1 to 31 and "
+      "minutes of "
+      "the day from 0 to 1439 that come together within 400 days [delay-impossible]"}},
+    {"ADelayWithoutASlotForYears",
+     partOf(preset(R"_("match": ".*", "pack_preset": "P")_"), R"_({"name": "P", "delay": {"count": 401}})_"),
+     {"error /pack_presets/0/delay: the delay never ends, and no mailing goes out by this preset: slot 401 "
+      "is not "
+      "reached within 400 days | write days of the week from 0 (Sunday) to 6, days of the month from 1 to 31 "
+      "and "
+      "minutes of the day from 0 to 1439 that come together within 400 days [delay-impossible]"}},
+    {"NothingInADelayThatEnds",
+     partOf(
+         preset(R"_("match": ".*", "pack_preset": "P")_"),
+         R"_({"name": "P", "delay": {"week_days": [1], "mins": [480]}, "customer_email": "ada@example.com"})_"),
+     {}},
+    {"AnAddressThatIsNone",
+     partOf(preset(R"_("match": ".*", "pack_preset": "P")_"), R"_({"name": "P", "customer_email": "ada@"})_"),
+     {"error /pack_presets/0/customer_email: \"ada@\" is no e-mail address, and no mailing goes out by this "
+      "preset | "
+      "write one address, such as name@example.com [email-malformed]"}},
+    {"AConfirmationThatNobodySends",
+     partOf(preset(R"_("match": ".*", "pack_preset": "P")_"),
+            R"_({"name": "P", "confirmation_email": true})_"),
+     {"warning /pack_presets/0/confirmation_email: nobody gets an e-mail when the mailing is handed over: "
+      "there is no "
+      "carrier for e-mails | remove it, and look with \"vlmail status\" [confirmation-not-sent]"}},
     {"ALetterheadWithoutFlags",
      partOf(
          preset(R"_("match": "a.*", "pack_preset": "P")_"),
