@@ -64,8 +64,14 @@ public:
     }
 
 private:
+    /// Every first line is an address, and what would go wrong on paper keeps nothing back.
     static std::string settings(std::string const& keys) {
-        return R"({"pack_presets": [{"name": "GLOBAL", "process_mode": 3)" + keys + "}]}";
+        return R"({"app": {"print_area": {"left": 0, "top": 0, "right": 21000, "bottom": 29700},
+            "loose_letter_deviation": true}, "presets": {"extract_presets": [{"match": ".*", "pack_preset": "P",
+            "zones": [{"name": "Page", "location": {"left": 0, "top": 0, "right": 30000, "bottom": 40000},
+            "fields": [{"name": "postal", "value_extract": "^(?<VAL>.*)$", "priority": 1,
+            "send_to_server": true}]}]}], "pack_presets": [{"name": "P", "no_group": true)" +
+               keys + "}]}}";
     }
     void write(char const* name, std::string const& bytes) {
         std::ofstream(folder_ / name, std::ios::binary) << bytes;
