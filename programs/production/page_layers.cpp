@@ -60,47 +60,33 @@ int quarterTurnsOf(QPDFPageObjectHelper page) {
     return degrees % 90 == 0 ? static_cast<int>((degrees + 360) / 90 % 4) : 0;
 }
 
-/// How long a unit of a page is, in points.
-double unitOf(QPDFPageObjectHelper page) {
-    Handle unit = page.getObjectHandle().getKey("/UserUnit");
-    double const value = unit.isNumber() ? unit.getNumericValue() : 1;
-    return value > 0 && value < 1e6 ? value : 1;
-}
-
-/// A page as it is shown.
+/// A page as it is shown. Its /UserUnit is left aside, as readers do who tell how large pages are.
 struct Shown {
     Box box;
     int quarterTurns;
-    double unit;
 
-    explicit Shown(QPDFPageObjectHelper page)
-        : box(shownBox(page)), quarterTurns(quarterTurnsOf(page)), unit(unitOf(page)) {}
+    explicit Shown(QPDFPageObjectHelper page) : box(shownBox(page)), quarterTurns(quarterTurnsOf(page)) {}
 
-    double height() const { return unit * (quarterTurns % 2 == 0 ? box.height() : box.width()); }
+    double height() const { return quarterTurns % 2 == 0 ? box.height() : box.width(); }
 
     /// From places in the content to points from the lower left corner of what is shown.
     QPDFMatrix matrix() const {
-        QPDFMatrix matrix(unit, 0, 0, unit, 0, 0);
         switch (quarterTurns) {
         case 1:
-            matrix.concat({0, -1, 1, 0, -box.bottom, box.right});
-            break;
+            return {0, -1, 1, 0, -box.bottom, box.right};
         case 2:
-            matrix.concat({-1, 0, 0, -1, box.right, box.top});
-            break;
+            return {-1, 0, 0, -1, box.right, box.top};
         case 3:
-            matrix.concat({0, 1, -1, 0, box.top, -box.left});
-            break;
+            return {0, 1, -1, 0, box.top, -box.left};
         default:
-            matrix.concat({1, 0, 0, 1, -box.left, -box.bottom});
+            return {1, 0, 0, 1, -box.left, -box.bottom};
         }
-        return matrix;
     }
 };
 
+/// Of a turn and a move.
 QPDFMatrix inverse(QPDFMatrix const& m) {
-    double const size = m.a * m.d - m.b * m.c;
-    QPDFMatrix const turned(m.d / size, -m.b / size, -m.c / size, m.a / size, 0, 0);
+    QPDFMatrix const turned(m.a, m.c, m.b, m.d, 0, 0);
     double x = 0;
     double y = 0;
     turned.transform(m.e, m.f, x, y);
@@ -165,8 +151,8 @@ void parse(QPDF& pdf, std::string const& bytes, std::string const& where) {
 } // namespace
 
 struct LaidPage::Parsed {
-    Parsed(std::string bytes, std::string const& where) : pdf_(std::move(bytes)) {
-        parse(source, pdf_, where);
+    Parsed(std::string bytes, std::string const& where) : pdf(std::move(bytes)) {
+        parse(source, pdf, where);
         QPDFPageObjectHelper page = onlyPage(source);
         drawAnnotations(source, page);
         shown = std::make_unique<Shown>(page);
@@ -176,12 +162,11 @@ struct LaidPage::Parsed {
             form.getDict().replaceKey("/Group", group);
     }
 
+    /// `source` reads from it.
+    std::string const pdf;
     QPDF source;
     std::unique_ptr<Shown> shown;
     Handle form;
-
-private:
-    std::string const pdf_;
 };
 
 LaidPage::LaidPage(std::string pdf, std::string const& where) {

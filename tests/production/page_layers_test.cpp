@@ -95,6 +95,15 @@ TEST(LaidPages, AreNotScaledWhereSizesDiffer) {
     expectSamePlaces(wordsOn(under(laidPage(content), head)), expected);
 }
 
+TEST(LaidPages, AreNotScaledByUnitsEither) {
+    std::string const head = pageOf(word(72, 800, "Head"), std::string(ON_A4) + " /UserUnit 2");
+    std::string const content = pageOf(word(100, 600, "Dear"));
+    auto expected = wordsOn(head);
+    expected.merge(wordsOn(content));
+    expectSamePlaces(wordsOn(under(laidPage(head), content)), expected);
+    expectSamePlaces(wordsOn(under(laidPage(content), head)), expected);
+}
+
 TEST(LaidPages, LieInTheOrderInWhichTheyAreGiven) {
     LaidPage const red = laidPage(pageOf(box("1 0 0", 100, 742, 200, 50)));
     LaidPage const green = laidPage(pageOf(box("0 1 0", 150, 742, 200, 50)));

@@ -1,6 +1,7 @@
 // Letters on their way to sheets: letterheads, attachments, blank sides, as a person sees them in a mailing.
 #include "programs/mailing/metadata.h"
 #include "programs/reader/document.h"
+#include "tests/support/raw_pdf.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlmail/run_vlmail.h"
 #include "vlservice/json/json_text.h"
@@ -165,8 +166,7 @@ TEST_F(MakeReadyTest, StoresOnceWhatLettersShare) {
     write("a.txt", "Letter\nTo: Ada\fLetter\nTo: Bob\fmore");
     EXPECT_EQ(mail({"a.txt"}).status, 0);
     EXPECT_THAT(storedPages(), ElementsAre("a.txt:1", "a.txt:2", "a.txt:3", "prices.txt:1", "prices.txt:2"));
-    EXPECT_EQ(sides().at(1),
-              (Sides{"Letter To: Bob", "more", "attachment: prices1", "attachment: prices2"}));
+    EXPECT_EQ(sides().at(1), (Sides{"Letter To: Bob", "more", "attachment: prices1", "attachment: prices2"}));
     Ran const verified = runVlMail({"pack", "verify", mailing().string()});
     EXPECT_EQ(verified.status, 0) << verified.out << verified.err;
 }
@@ -340,6 +340,25 @@ TEST_F(UnusableDocuments, AreTooLargeBeforeTheyAreRead) {
     EXPECT_EQ(whyNot(R"("letterheads": ["large"])"),
               "document-size: " + path("docs") +
                   "/large.pdf: has more than 64 MiB; leave out what is not to be printed");
+}
+
+/// Forms that draw each other without end, in a colour, for which they are drawn.
+std::string slowPdf() {
+    std::string pdf = VLServiceTest::formTree(40, 10);
+    std::string const black = "72 700 Td (Hello)";
+    std::string const red = "1 0 0 rg 9 9 Td()";
+    EXPECT_EQ(black.size(), red.size());
+    for (std::size_t at = pdf.find(black); at != std::string::npos; at = pdf.find(black, at))
+        pdf.replace(at, black.size(), red);
+    return pdf;
+}
+
+TEST_F(UnusableDocuments, ThatTakeTooMuchTimeAreEndedOnce) {
+    write("docs/slow.pdf", slowPdf());
+    EXPECT_EQ(whyNot(R"("letterheads": ["slow"], "attachments": ["slow"])", {"--document-seconds", "1"}),
+              "document-damaged: " + path("docs") +
+                  "/slow.pdf: it took more than 1 s of processor time; print it to a new PDF, or give "
+                  "--document-seconds a larger number");
 }
 
 TEST_F(UnusableDocuments, OfOtherSizesAreTold) {
