@@ -111,7 +111,7 @@ void Findings::add(Code code, Place const& place, std::string says, std::string 
 
 std::vector<Finding> Findings::take() {
     std::vector<Finding> all = std::move(findings_);
-    std::ranges::stable_partition(all, &Finding::isError);
+    std::stable_partition(all.begin(), all.end(), [](Finding const& finding) { return finding.isError(); });
     if (all.size() > MOST)
         all.erase(all.begin() + MOST, all.end());
     return all;
