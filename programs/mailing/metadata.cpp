@@ -146,10 +146,8 @@ json::Object Metadata::toJson() const {
 }
 
 Metadata Metadata::fromJson(json::Object const& object) {
-    Metadata metadata{object.get(ID_KEY).toString(),
-                      object.get(CREATED_KEY).toInt(),
-                      Cfg::PackPreset(object, NOT_THE_PRESETS),
-                      {}};
+    Metadata metadata{
+        object.get(ID_KEY).toString(), object.get(CREATED_KEY).toInt(), packPresetIn(object), {}};
     for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
         metadata.letters.push_back(letterFrom(letter.toObject()));
     metadata.madeReady = object.get(MADE_READY_KEY).isTrue();
@@ -173,6 +171,10 @@ SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& d
     } catch (json::Exc const&) {
         return metadata;
     }
+}
+
+Cfg::PackPreset packPresetIn(json::Object const& metadata) {
+    return Cfg::PackPreset(metadata, NOT_THE_PRESETS);
 }
 
 SharedMemBuffer withMembers(SharedMemBuffer metadata, json::Object const& members) {

@@ -79,6 +79,9 @@ struct Metadata {
 /// that has none stays as it is.
 SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& digest);
 
+/// The pack preset that an object of metadata holds beside its own keys. Throws std::exception.
+Cfg::PackPreset packPresetIn(json::Object const& metadata);
+
 /// The same metadata, whatever else is in it, with these members. Throws std::exception when the blob cannot
 /// be read.
 SharedMemBuffer withMembers(SharedMemBuffer metadata, json::Object const& members);

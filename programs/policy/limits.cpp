@@ -186,17 +186,6 @@ std::vector<std::string> Rules::parts() {
     return {Cfg::App::PART_NAME, Cfg::Departments::PART_NAME, Cfg::Profiles::PART_NAME, Cfg::PO::PART_NAME};
 }
 
-long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex) {
-    long long sheets = 0;
-    for (Mailing::DocumentPages const& document : letter.documents) {
-        if (duplex && document.role == Mailing::DocumentPages::Role::Blank)
-            continue;
-        auto const pages = static_cast<long long>(document.pages.size());
-        sheets += duplex ? (pages + 1) / 2 : pages;
-    }
-    return sheets;
-}
-
 std::optional<Refusal> refusalOfSheets(long long sheets, Rules const& rules) {
     auto const& [most, source] = rules.maxLetterSheets;
     if (most <= 0 || sheets <= most)

@@ -62,10 +62,6 @@ struct Rules {
     Sourced<long long> expiry;
 };
 
-/// Of paper, by a letter's documents: each begins on a front side, and a blank one is the other side of the
-/// one in front of it.
-long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex);
-
 /// Nothing when a letter of so many sheets may go out.
 std::optional<Refusal> refusalOfSheets(long long sheets, Rules const& rules);
 

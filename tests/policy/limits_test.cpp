@@ -46,16 +46,6 @@ TEST(LimitOfSheets, IsTheBuiltInOneWhereNoneIsSetAndNoneWhereItIsNothing) {
     EXPECT_FALSE(Policy::refusalOfSheets(1000, rulesOf(parse(R"({"app": {"max_letter_sheets": 0}})"))));
 }
 
-TEST(Sheets, AreCountedForEachDocumentOnItsOwn) {
-    Mailing::MailedLetter letter;
-    letter.documents = {{"a.pdf", {1, 2, 3}}, {"b.pdf", {1}}, {"c.pdf", {4, 5}}};
-    EXPECT_EQ(Policy::sheetsOf(letter, false), 6);
-    EXPECT_EQ(Policy::sheetsOf(letter, true), 4);
-    letter.documents.insert(letter.documents.begin() + 1,
-                            {"blank", {1}, Mailing::DocumentPages::Role::Blank});
-    EXPECT_EQ(Policy::sheetsOf(letter, true), 4);
-}
-
 TEST(LimitsOfMailings, LetEverythingOutThatNothingForbids) {
     EXPECT_THAT(refused(parse(R"({"department": "any", "profile": "any"})"), {}), IsEmpty());
     EXPECT_THAT(

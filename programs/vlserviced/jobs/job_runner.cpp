@@ -3,12 +3,9 @@
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/safe_name.h"
-#include "programs/mailing/metadata.h"
 #include "programs/mailing/pack_database.h"
-#include "programs/policy/course.h"
 #include "programs/vlserviced/jobs/container.h"
 #include "programs/vlserviced/jobs/hand_over.h"
-#include "programs/vlserviced/store/node_id.h"
 #include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
 
@@ -22,8 +19,6 @@ namespace {
 namespace fs = std::filesystem;
 
 using Protocol::JobAction;
-
-constexpr std::size_t MAX_TITLE_BYTES = 500;
 
 /// One spelling for a folder, so that jobs are found again by it.
 std::string folderText(std::string const& folder) {
@@ -52,41 +47,6 @@ void requireSamePack(Job const& known, PackLocation const& pack) {
         throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
     if (known.state == JobState::Cancelled)
         throw Base::Error("pack " + pack.packId + " was cancelled: mail its letters anew");
-}
-
-/// Sheets of the letter that has the most.
-long long mostSheets(Mailing::Metadata const& metadata) {
-    long long most = 0;
-    for (Mailing::MailedLetter const& letter : metadata.letters)
-        most = std::max(most, Policy::sheetsOf(letter, metadata.packPreset.duplex()));
-    return most;
-}
-
-Mailing::Metadata metadataOf(Mailing::PackDatabaseReader& pack) {
-    try {
-        return Mailing::Metadata::fromBlob(pack.metadata());
-    } catch (Database::DatabaseError const&) {
-        throw;
-    } catch (std::exception const&) {
-        // What is wrong would be told with values of letters.
-        throw Base::Error("the metadata of pack " + pack.info().id + " is none of a mailing");
-    }
-}
-
-PackSummary summaryOf(PackLocation const& pack) {
-    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
-    PackSummary summary{pages.info().cfgId, pages.info().title, static_cast<long long>(pages.documentCount()),
-                        static_cast<long long>(pages.pages().size())};
-    if (summary.pages == 0)
-        throw Base::Error("pack " + pack.packId + " has no pages");
-    if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
-        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
-                          std::to_string(MAX_TITLE_BYTES) + " bytes");
-    checkNodeId(summary.cfgId);
-    Mailing::Metadata const metadata = metadataOf(pages);
-    summary.packPreset = metadata.packPreset;
-    summary.sheets = mostSheets(metadata);
-    return summary;
 }
 
 /// Whether the outbox is no place for its container any more.
@@ -193,41 +153,15 @@ void JobRunner::admit(PackLocation const& pack, PackSummary const& summary) {
         requireSamePack(*job, pack);
     } else {
         requireNotDisabled(pack.packId, summary.cfgId);
-        requireAllowed(pack.packId, summary);
-        job = jobFor(pack, summary);
+        Policy::Moment const moment{surroundings_.now(), surroundings_.offset};
+        requireAllowed(
+            pack.packId, summary, surroundings_.rules(summary.cfgId), moment,
+            [&](std::string const& name) { return surroundings_.presetSource(summary.cfgId, name); });
+        job = jobFor(pack, summary, moment);
         jobs_.accept(*job);
         surroundings_.usedPreset(summary.cfgId, summary.packPreset.name());
     }
     proceed(*job);
-}
-
-Job JobRunner::jobFor(PackLocation const& pack, PackSummary const& summary) const {
-    Policy::Moment const moment{surroundings_.now(), surroundings_.offset};
-    Policy::Course const course = Policy::courseOf(summary.packPreset, moment);
-    Job job;
-    job.pack = pack;
-    job.cfgId = summary.cfgId;
-    job.title = summary.title;
-    job.documents = summary.documents;
-    job.pages = summary.pages;
-    job.acceptedAt = moment.now;
-    job.toUpload = course.handsOver;
-    job.toHold = course.holds;
-    job.isTrial = course.isTrial;
-    job.due = course.due;
-    return job;
-}
-
-/// The client has decided by the same rules, unless it is an older one or had others.
-void JobRunner::requireAllowed(std::string const& packId, PackSummary const& summary) const {
-    Policy::Rules const rules = surroundings_.rules(summary.cfgId);
-    std::vector<Policy::Refusal> refusals = Policy::refusalsOf(
-        summary.packPreset, rules, {surroundings_.now(), surroundings_.offset},
-        [&](std::string const& name) { return surroundings_.presetSource(summary.cfgId, name); });
-    if (auto const refusal = Policy::refusalOfSheets(summary.sheets, rules))
-        refusals.push_back(*refusal);
-    if (!refusals.empty())
-        throw Base::Error(Policy::inOneLine(refusals) + "; pack " + packId + " is not taken");
 }
 
 void JobRunner::requireNotDisabled(std::string const& packId, std::string const& cfgId) const {

@@ -4,6 +4,7 @@
 
 #include "programs/base/local_offset.h"
 #include "programs/policy/limits.h"
+#include "programs/vlserviced/jobs/admission.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/job_store.h"
 
@@ -41,17 +42,6 @@ struct JobSurroundings {
     /// Told that a node's mailing was accepted that goes by that pack preset.
     std::function<void(std::string const& node, std::string const& packPreset)> usedPreset =
         [](std::string const&, std::string const&) {};
-};
-
-/// What a pack says of itself.
-struct PackSummary {
-    std::string cfgId;
-    std::string title;
-    long long documents = 0;
-    long long pages = 0;
-    Cfg::PackPreset packPreset = {};
-    /// Of its letter with the most.
-    long long sheets = 0;
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -98,8 +88,6 @@ private:
     void discard(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary);
-    Job jobFor(PackLocation const& pack, PackSummary const& summary) const;
-    void requireAllowed(std::string const& packId, PackSummary const& summary) const;
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
     void removeFromOutbox(std::string const& containerName);
     void sweepOutbox();

@@ -1,0 +1,73 @@
+#include "programs/vlserviced/jobs/admission.h"
+
+#include "programs/base/error.h"
+#include "programs/base/plain_text.h"
+#include "programs/mailing/mailing_outline.h"
+#include "programs/policy/course.h"
+#include "programs/vlserviced/store/node_id.h"
+
+#include <vector>
+
+namespace VlServiced {
+namespace {
+
+constexpr std::size_t MAX_TITLE_BYTES = 500;
+
+Mailing::MailingOutline outlineOf(Mailing::PackDatabaseReader& pack) {
+    SharedMemBuffer const metadata = pack.metadata();
+    try {
+        return Mailing::outlineOf(metadata);
+    } catch (std::exception const&) {
+        // What is wrong would be told with values of letters.
+        throw Base::Error("the metadata of pack " + pack.info().id + " is none of a mailing");
+    }
+}
+
+} // namespace
+
+PackSummary summaryOf(PackLocation const& pack) {
+    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
+    PackSummary summary{pages.info().cfgId, pages.info().title, static_cast<long long>(pages.documentCount()),
+                        static_cast<long long>(pages.pages().size())};
+    if (summary.pages == 0)
+        throw Base::Error("pack " + pack.packId + " has no pages");
+    if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
+        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
+                          std::to_string(MAX_TITLE_BYTES) + " bytes");
+    checkNodeId(summary.cfgId);
+    addOutline(summary, pages);
+    return summary;
+}
+
+void addOutline(PackSummary& summary, Mailing::PackDatabaseReader& pack) {
+    Mailing::MailingOutline const outline = outlineOf(pack);
+    summary.packPreset = outline.packPreset;
+    summary.sheets = outline.mostSheets;
+}
+
+void requireAllowed(std::string const& packId, PackSummary const& summary, Policy::Rules const& rules,
+                    Policy::Moment const& moment, Policy::PresetSource const& sourceOf) {
+    std::vector<Policy::Refusal> refusals = Policy::refusalsOf(summary.packPreset, rules, moment, sourceOf);
+    if (auto const refusal = Policy::refusalOfSheets(summary.sheets, rules))
+        refusals.push_back(*refusal);
+    if (!refusals.empty())
+        throw Base::Error(Policy::inOneLine(refusals) + "; pack " + packId + " is not taken");
+}
+
+Job jobFor(PackLocation const& pack, PackSummary const& summary, Policy::Moment const& moment) {
+    Policy::Course const course = Policy::courseOf(summary.packPreset, moment);
+    Job job;
+    job.pack = pack;
+    job.cfgId = summary.cfgId;
+    job.title = summary.title;
+    job.documents = summary.documents;
+    job.pages = summary.pages;
+    job.acceptedAt = moment.now;
+    job.toUpload = course.handsOver;
+    job.toHold = course.holds;
+    job.isTrial = course.isTrial;
+    job.due = course.due;
+    return job;
+}
+
+} // namespace VlServiced
