@@ -36,6 +36,9 @@ void read(std::string bytes) {
     if (document.pageCount() > MAX_PAGES)
         return;
     search(document, presets.matchExtrPreset("document"));
+    document.extrasOf(1);
+    document.embeddedFiles();
+    document.drawPart(1, {2540, 72, 100, 0, 100, 842});
     std::string const page = document.singlePagePdf(1);
     document.showsTheSame(1, page);
     Reader::Document const single = Reader::openDocument(page, "page");
