@@ -15,7 +15,6 @@ using Production::coverPage;
 using Production::Finding;
 using Production::ProductionRules;
 using Production::Severity;
-using Reader::Box;
 using testing::ElementsAre;
 using testing::IsEmpty;
 

@@ -10,7 +10,6 @@ namespace {
 
 using namespace Production;
 using testing::ElementsAre;
-using testing::IsEmpty;
 using testing::SizeIs;
 
 std::string textOf(json::Object const& object) {

@@ -15,7 +15,6 @@ namespace {
 using namespace VLServiceTest;
 using testing::ElementsAre;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 /// The address in the window of DIN 5008, form B.
 constexpr char const* ADDRESS = "BT /F 11 Tf 71 650 Td (Lena Brandt) Tj 0 -14 Td (Lange Str. 12) Tj 0 -14 Td "
