@@ -13,7 +13,7 @@ using Handle = QPDFObjectHandle;
 std::set<QPDFObjGen> listed(Handle array) {
     std::set<QPDFObjGen> all;
     if (array.isArray())
-        for (Handle item : array.getArrayAsVector())
+        for (Handle const& item : array.getArrayAsVector())
             if (item.isIndirect())
                 all.insert(item.getObjGen());
     return all;

@@ -13,7 +13,6 @@ namespace Production {
 namespace {
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 constexpr PageSize A4{21000, 29700};
 Part const A_LETTER{Part::Kind::FirstLetter};

@@ -55,16 +55,16 @@ std::map<std::string, std::pair<int, int>> wordsOn(std::string const& pdf) {
     return words;
 }
 
-/// The colour at a place in points from the upper left, such as "ff0000".
+/// The colour at a place in points from the upper left, such as "f00".
 std::string colourAt(std::string const& pdf, int x, int y) {
     Reader::Document document = Reader::openDocument(pdf, "made.pdf");
     Reader::Picture const picture = document.drawPage(1, 72).value();
-    std::ostringstream colour;
-    for (int i = 0; i < 3; ++i) {
-        auto const at = static_cast<std::size_t>(3 * (y * picture.width + x) + i);
-        colour << "0123456789abcdef"[static_cast<unsigned char>(picture.points.at(at)) >> 4];
-    }
-    return colour.str();
+    auto const place =
+        static_cast<std::size_t>(y) * static_cast<std::size_t>(picture.width) + static_cast<std::size_t>(x);
+    std::string colour;
+    for (std::size_t at = 3 * place; at < 3 * place + 3; ++at)
+        colour += "0123456789abcdef"[static_cast<unsigned char>(picture.points.at(at)) >> 4];
+    return colour;
 }
 
 void expectSamePlaces(std::map<std::string, std::pair<int, int>> const& places,

@@ -20,7 +20,6 @@ namespace fs = std::filesystem;
 using testing::ElementsAre;
 using testing::EndsWith;
 using testing::HasSubstr;
-using testing::IsEmpty;
 using Role = Mailing::DocumentPages::Role;
 
 /// Text documents throughout: typed pages are of one size, and each says in its lines what it is.
