@@ -37,7 +37,7 @@ public:
         NameCollector collector;
         page.parseContents(&collector);
         follow(collector.names, pageResources_);
-        for (Handle annotation : annotationsOf(page))
+        for (Handle const& annotation : annotationsOf(page))
             followAppearance(annotation);
         while (!waiting_.empty()) {
             auto [content, resources] = std::move(waiting_.back());
@@ -130,7 +130,7 @@ Handle indirect(QPDF& document, Handle object) { return document.makeIndirectObj
 void carryForm(QPDF& document, QPDF& single, QPDFPageObjectHelper page) {
     Handle form = document.getRoot().getKey("/AcroForm");
     Handle fields = Handle::newArray();
-    for (Handle annotation : annotationsOf(page))
+    for (Handle const& annotation : annotationsOf(page))
         if (isWidget(annotation) && annotation.isIndirect())
             fields.appendItem(annotation);
     if (!form.isDictionary() || fields.getArrayNItems() == 0)
@@ -172,7 +172,7 @@ void dropLostContents(QPDFPageObjectHelper page) {
 }
 
 void separateFormFields(QPDFPageObjectHelper page) {
-    for (Handle annotation : annotationsOf(page))
+    for (Handle const& annotation : annotationsOf(page))
         if (isWidget(annotation))
             separate(annotation);
 }

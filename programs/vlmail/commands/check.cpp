@@ -70,7 +70,7 @@ int checkDocuments(Options const& options, Terminal const& terminal) {
     MakingReady making(MakingReady::Colours::Ignored);
     making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
     readBatch(options.files, settings, options.reading.workers(),
-              {.checks = Along::Checks::Yes, .making = &making}, progress,
+              {.checks = Along::Checks::Yes, .limits = Along::Limits::Yes, .making = &making}, progress,
               [&](std::size_t, ReadResult const& result) {
                   outcome.count(result.reading);
                   if (options.json)

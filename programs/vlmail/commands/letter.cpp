@@ -115,6 +115,7 @@ Along alongFor(Options const& options, MakingReady* making) {
     Along along;
     along.making = making;
     along.checks = Along::Checks::Yes;
+    along.limits = Along::Limits::Yes;
     if (options.explain)
         along.beforeReading = [](ReadResult& result, Cfg::Presets const& presets) {
             result.reading.trace = explainPresets(presets, result.reading.document);

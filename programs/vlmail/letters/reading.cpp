@@ -6,6 +6,7 @@
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/mailing/page_blob.h"
+#include "programs/policy/limits.h"
 #include "programs/production/colour.h"
 #include "programs/production/cover_page.h"
 #include "programs/production/maker.h"
@@ -226,6 +227,31 @@ void holdAgainst(std::vector<LetterReading>& letters, Reader::Document& document
             addTo(letter, making.whyNot(preset, sizesOf(letter.pages, document)));
 }
 
+/// Of the letter by itself, with what goes out along with it.
+long long sheetsOf(LetterReading const& letter, Cfg::PackPreset const& preset, MakingReady const* making) {
+    std::vector<int> parts{static_cast<int>(letter.pages.size())};
+    if (!letter.coverAddress.empty())
+        parts.push_back(1);
+    if (making)
+        for (MadeAttachment const& attachment : making->attachmentsOf(preset.name()))
+            parts.push_back(static_cast<int>(attachment.pages.size()));
+    return Production::sheetsOf(parts, preset.duplex() ? Production::Sides::Both : Production::Sides::One);
+}
+
+void holdAgainstLimits(std::vector<LetterReading>& letters, Cfg::PackPreset const& preset,
+                       NodeSettings const& settings, MakingReady const* making) {
+    Policy::Rules const rules(settings.sourced());
+    for (LetterReading& letter : letters)
+        if (auto const refusal = Policy::refusalOfSheets(sheetsOf(letter, preset, making), rules))
+            letter.findings.insert(letter.findings.begin(),
+                                   {Production::Code::TooManySheets,
+                                    Production::Severity::Error,
+                                    {},
+                                    {},
+                                    refusal->says,
+                                    "send it as several letters, or raise \"max_letter_sheets\" there"});
+}
+
 /// Makes the pages of letters that can go out.
 class PageMaking {
 public:
@@ -361,6 +387,8 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
                      settings);
     if (along.making)
         holdAgainst(*reading.letters, document, packPreset, *along.making);
+    if (along.limits == Along::Limits::Yes)
+        holdAgainstLimits(*reading.letters, packPreset, settings, along.making);
     if (along.afterReading)
         along.afterReading(result, {document, extractPreset, packPreset, trace, place});
     addBlobs(*reading.letters, document, packPreset, along);

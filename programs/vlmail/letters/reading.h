@@ -118,6 +118,9 @@ struct Along {
     Digest digest = Digest::No;
     Joins joins = Joins::Doubt;
     Checks checks = Checks::No;
+    /// Whether a letter is held against the settings' limit by itself. Who makes mailings asks for them whole.
+    enum class Limits : bool { No, Yes };
+    Limits limits = Limits::No;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
     std::size_t checkEvery = 1;
     /// What pages are made ready with; they are left as they are without it. It outlives the batch.

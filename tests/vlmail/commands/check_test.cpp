@@ -63,6 +63,23 @@ json::Value findingsIn(std::string const& line) {
     return document.get("letters").toArray().at(0).toObject().get("findings");
 }
 
+TEST_F(PrintReadiness, CountsSheetsAgainstTheLimitOfTheSettings) {
+    settings("", R"({"max_letter_sheets": 1})");
+    EXPECT_EQ(run({"check", path("bill 1.pdf")}).status, VlMail::FINE);
+    settings(R"(, "attachments": ["terms"])", R"({"max_letter_sheets": 1})");
+    write("terms.pdf", onePage("").bytes());
+    for (char const* const command : {"check", "letter"}) {
+        Ran const ran = run({command, "--documents", folder_.path().string(), path("bill 1.pdf")});
+        EXPECT_EQ(ran.status, VlMail::INCOMPLETE) << command;
+        EXPECT_THAT(ran.out, HasSubstr("too-many-sheets")) << command;
+        EXPECT_THAT(ran.out, HasSubstr("2 sheets, 1 allowed by " + path("node.json"))) << command;
+        EXPECT_THAT(ran.out, HasSubstr("raise \"max_letter_sheets\" there")) << command;
+    }
+    settings(R"(, "attachments": ["terms"])", R"({"max_letter_sheets": 2})");
+    EXPECT_EQ(run({"check", "--documents", folder_.path().string(), path("bill 1.pdf")}).status,
+              VlMail::FINE);
+}
+
 TEST_F(PrintReadiness, IsToldOfEachLetterWithRemediesAndAnExitStatus) {
     Ran const ran = run({"check", path("bill 1.pdf"), path("bill 2.pdf")});
     EXPECT_EQ(ran.status, 2);

@@ -11,7 +11,6 @@
 
 using namespace VlMail;
 using testing::ElementsAre;
-using testing::IsEmpty;
 using testing::Optional;
 
 namespace {
