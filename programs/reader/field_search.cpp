@@ -5,6 +5,7 @@
 #include "programs/reader/value_reading.h"
 
 #include <algorithm>
+#include <new>
 #include <string_view>
 #include <utility>
 
@@ -42,7 +43,7 @@ std::shared_ptr<ExtractedField> cutOut(ExtractField const& field, ZoneText& text
     trace.definition = &field;
     std::shared_ptr<ExtractedField> value =
         field.extractField(text.searchedText(), measureFor(field, text, trace),
-                           [&](std::string const& reason) { trace.failure = reason; });
+                           [&](std::string const& reason) { trace.failure = requireMemory(reason); });
     if (value && !value->isValidated())
         trace.rawText = value->rawValue().textOrEmpty();
     return value;
@@ -238,6 +239,13 @@ FieldsFound FieldSearch::finish(PageTrace* trace) {
     if (trace)
         trace->zones = zones();
     return std::move(found_);
+}
+
+std::string const& requireMemory(std::string const& reason) {
+    std::bad_alloc const missing;
+    if (reason == missing.what())
+        throw missing;
+    return reason;
 }
 
 bool separatesLetters(ExtractField const& field) {

@@ -30,6 +30,10 @@ struct FieldsFound {
 /// The next place where a zone may be; nothing when there is no further one.
 using NextView = std::function<std::optional<ZoneView>()>;
 
+/// What the library says of a pattern that cannot be searched in a text. Throws std::bad_alloc when that was
+/// for want of memory: such a field is not one that a letter does not have.
+std::string const& requireMemory(std::string const& reason);
+
 class FieldSearch {
 public:
     /// `document` names it in messages; the rules and the time must live as long as the search.

@@ -1,15 +1,18 @@
 // Addresses as they are printed, and as a person reads them.
+#include "programs/base/log_capture.h"
 #include "programs/reader/clean_text.h"
 #include "programs/reader/field_search.h"
 #include "programs/reader/letters.h"
 #include "programs/reader/writing_direction.h"
 
+#include "tests/support/failing_memory.h"
 #include "tests/support/json_literal.h"
 #include "tests/support/raw_pdf.h"
 #include "tests/support/typesetter.h"
 
 #include <gmock/gmock.h>
 
+#include <new>
 #include <optional>
 #include <string>
 #include <vector>
@@ -264,6 +267,25 @@ TEST(AddressZones, OfPresetsLeaveSendersLinesOut) {
     std::vector<Letter> const letters = readLetters(document, preset, &trace);
     EXPECT_EQ(letters.at(0).fields.begin()->second.valueToStr(), "Lena Brandt\nWeg 5\n34117 Kassel");
     EXPECT_EQ(trace.pages.at(0).zones.at(0).fields.at(0).sendersLine, "Kerzen GmbH, Weg 1, 34117 Kassel");
+}
+
+TEST(Addresses, AreNotMissingWhereMemoryIs) {
+    Base::LogCapture const quiet;
+    Typesetter const set = withSendersLine();
+    Cfg::ExtractField const& field = Cfg::ExtractField::DefPostal();
+    auto const whole = addressIn(set, field).rawText;
+    bool isRefused = true;
+    for (long call = 1; isRefused; ++call) {
+        ZoneText text = windowOf(set);
+        FieldTrace trace;
+        FailingMemory const memory(call);
+        try {
+            cutField(field, text, trace);
+            EXPECT_EQ(trace.rawText, whole) << call;
+        } catch (std::bad_alloc const&) {
+        }
+        isRefused = memory.hasFailed();
+    }
 }
 
 TEST(AddressZones, WithSendersLinesTellOfDoubtfulJoins) {

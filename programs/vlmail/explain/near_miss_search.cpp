@@ -1,6 +1,7 @@
 #include "programs/vlmail/explain/near_miss_search.h"
 
 #include "programs/base/quoting.h"
+#include "programs/reader/field_search.h"
 #include "programs/reader/joined_search.h"
 
 #include <algorithm>
@@ -113,8 +114,9 @@ std::optional<PlainHit> Search::find(ExtractField const& field, std::string text
         hit = PlainHit{static_cast<std::size_t>(offset), static_cast<std::size_t>(offset + length), false};
         return 0;
     };
-    auto const value = field.extractField(text, remember,
-                                          [this](std::string const& reason) { failures_.push_back(reason); });
+    auto const value = field.extractField(text, remember, [this](std::string const& reason) {
+        failures_.push_back(Reader::requireMemory(reason));
+    });
     if (hit && value)
         hit->isValid = isValid(field, *value);
     return hit;
