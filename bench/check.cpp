@@ -2,6 +2,7 @@
 // their fields searched, every page drawn and held against a carrier's rules, by the time that poppler alone
 // takes to give the same words, in turns. The aim is 4.5 times at most. Most of it is drawing; "read" is the
 // ratio without the checks.
+#include "bench/example_letters.h"
 #include "programs/base/read_file.h"
 #include "programs/production/check_letter.h"
 #include "programs/reader/letters.h"
@@ -33,25 +34,6 @@ constexpr char const* PACK_PRESET = R"({"name": "Bills", "production": {
     "window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000},
     "clear_zones": [{"left": 0, "top": 28500, "right": 21000, "bottom": 29700, "pages": "all"}],
     "address_lines": {"min": 3, "max": 6}, "postcode": "\\b\\d{5}\\b"}})";
-
-/// The PDFs of an office and its like.
-std::vector<std::string> const& documents() {
-    static std::vector<std::string> const files = [] {
-        std::vector<std::string> found;
-        for (auto const& entry : fs::recursive_directory_iterator(VLSERVICE_EXAMPLE_LETTERS))
-            if (entry.path().extension() == ".pdf")
-                found.push_back(entry.path().string());
-        return found;
-    }();
-    return files;
-}
-
-Cfg::ExtractPreset addressAlone() {
-    Cfg::ExtractPreset preset;
-    preset.zones().emplace_back(Cfg::ExtractZone::DEF_ZONE_NAME,
-                                std::vector<Cfg::ExtractField>{Cfg::ExtractField::DefPostal()});
-    return preset;
-}
 
 Production::PrintRules carriersRules() {
     Cfg::PackPreset const preset(json::strToObject(PACK_PRESET, std::strlen(PACK_PRESET)), {});
@@ -91,17 +73,18 @@ std::size_t check(std::string const& file, Cfg::ExtractPreset const& preset,
 template<typename Work>
 double secondsOfAll(Work const& work) {
     auto const begin = std::chrono::steady_clock::now();
-    for (std::string const& file : documents())
+    for (std::string const& file : Bench::documents())
         benchmark::DoNotOptimize(work(file));
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
 }
 
 /// All in turns, so that what else the machine does costs all.
 void checkLetters(benchmark::State& state) {
-    Cfg::ExtractPreset const preset = addressAlone();
+    Cfg::ExtractPreset const preset = Bench::addressAlone();
     std::optional<Production::PrintRules> const rules = carriersRules();
     // Poppler sets itself up anew for a document while it has no other; that is not what is compared here.
-    std::unique_ptr<poppler::document> const keptOpen(poppler::document::load_from_file(documents().front()));
+    std::unique_ptr<poppler::document> const keptOpen(
+        poppler::document::load_from_file(Bench::documents().front()));
     double words = 0;
     double reading = 0;
     double checking = 0;
@@ -113,7 +96,7 @@ void checkLetters(benchmark::State& state) {
     state.counters["ratio"] = checking / words;
     state.counters["ratio_read"] = reading / words;
     state.counters["us_a_document"] =
-        checking * 1e6 / static_cast<double>(state.iterations() * documents().size());
+        checking * 1e6 / static_cast<double>(state.iterations() * Bench::documents().size());
 }
 
 BENCHMARK(checkLetters)->Unit(benchmark::kMillisecond)->MinTime(5);

@@ -4,6 +4,7 @@
 // pages, so that their ratio is the highest there is. Pages that are made of the document's objects need not
 // be drawn; "drawn" is what it costs to draw and read them all. The container, which costs the same either
 // way, is left out.
+#include "bench/example_letters.h"
 #include "programs/base/read_file.h"
 #include "programs/mailing/page_blob.h"
 #include "programs/reader/document.h"
@@ -28,25 +29,6 @@ namespace {
 namespace fs = std::filesystem;
 
 enum class Check { No, Yes, Drawn };
-
-/// The PDFs of an office and its like.
-std::vector<std::string> const& documents() {
-    static std::vector<std::string> const files = [] {
-        std::vector<std::string> found;
-        for (auto const& entry : fs::recursive_directory_iterator(VLSERVICE_EXAMPLE_LETTERS))
-            if (entry.path().extension() == ".pdf")
-                found.push_back(entry.path().string());
-        return found;
-    }();
-    return files;
-}
-
-Cfg::ExtractPreset addressAlone() {
-    Cfg::ExtractPreset preset;
-    preset.zones().emplace_back(Cfg::ExtractZone::DEF_ZONE_NAME,
-                                std::vector<Cfg::ExtractField>{Cfg::ExtractField::DefPostal()});
-    return preset;
-}
 
 bool drawsTheSame(Reader::PageSource& source, Reader::Document& document, int page, std::string const& pdf) {
     constexpr double DOTS_PER_INCH = 36;
@@ -76,14 +58,14 @@ std::size_t split(std::string const& file, Cfg::ExtractPreset const& preset, Che
 
 double secondsOfAll(Cfg::ExtractPreset const& preset, Check check, std::size_t& pages) {
     auto const begin = std::chrono::steady_clock::now();
-    for (std::string const& file : documents())
+    for (std::string const& file : Bench::documents())
         pages += split(file, preset, check);
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
 }
 
 /// All in turns, so that what else the machine does costs all.
 void checkEachPage(benchmark::State& state) {
-    Cfg::ExtractPreset const preset = addressAlone();
+    Cfg::ExtractPreset const preset = Bench::addressAlone();
     double with = 0;
     double without = 0;
     double drawn = 0;
