@@ -242,9 +242,8 @@ FieldsFound FieldSearch::finish(PageTrace* trace) {
 }
 
 std::string const& requireMemory(std::string const& reason) {
-    std::bad_alloc const missing;
-    if (reason == missing.what())
-        throw missing;
+    if (reason == std::bad_alloc().what())
+        throw std::bad_alloc();
     return reason;
 }
 
