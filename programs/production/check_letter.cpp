@@ -65,6 +65,7 @@ private:
             Reader::Page const& page = letter_.document.page(number);
             if (checkSize(page, rules_, findings_))
                 checkPlaces(page);
+            checkContents(letter_.document, number, findings_);
             if (rules_.production.isGiven)
                 checkExtras(letter_.document, page, findings_);
         } catch (Base::Error const& failure) {

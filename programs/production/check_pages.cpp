@@ -41,6 +41,13 @@ void checkEmpty(PageOnPaper const& page, PrintRules const& rules, Findings& find
                      "take it out of the document, if it is not meant");
 }
 
+void checkContents(Reader::Document& document, int page, Findings& findings) {
+    if (!document.isWrittenAnew(page))
+        return;
+    Finding const finding = redrawnFinding({page});
+    findings.add(finding.code, {page}, finding.says, finding.fix);
+}
+
 void addUnreadable(int page, std::string const& why, Findings& findings) {
     std::size_t const remedy = why.find("; ");
     findings.add(Code::PageUnreadable, {page}, why.substr(0, remedy),

@@ -22,6 +22,7 @@ struct PageOnPaper {
 /// Whether the page is like the sheet: on another one no place means anything.
 bool checkSize(Reader::Page const& page, PrintRules const& rules, Findings& findings);
 void checkEmpty(PageOnPaper const& page, PrintRules const& rules, Findings& findings);
+void checkContents(Reader::Document& document, int page, Findings& findings);
 void addUnreadable(int page, std::string const& why, Findings& findings);
 
 // check_ink.cpp

@@ -24,6 +24,7 @@ constexpr std::array ROWS{
     CodeRow{Code::PageOrientation, "page-orientation", Error, false},
     CodeRow{Code::PageEmpty, "page-empty", Warning, false},
     CodeRow{Code::PageUnreadable, "page-unreadable", Error, false},
+    CodeRow{Code::PageRedrawn, "page-redrawn", Warning, false},
     CodeRow{Code::ContentOutsidePrintArea, "content-outside-print-area", Error, true},
     CodeRow{Code::AddressOutsideWindow, "address-outside-window", Error, true},
     CodeRow{Code::TextInWindow, "text-in-window", Error, true},
@@ -115,6 +116,15 @@ std::vector<Finding> Findings::take() {
     if (all.size() > MOST)
         all.erase(all.begin() + MOST, all.end());
     return all;
+}
+
+Finding redrawnFinding(std::vector<int> pages, std::string const& whose) {
+    return {Code::PageRedrawn,
+            rowOf(Code::PageRedrawn).severity,
+            std::move(pages),
+            {},
+            whose + "contents are damaged: what can be shown of them is written anew",
+            "look whether all is there, or export the document again"};
 }
 
 } // namespace Production

@@ -22,6 +22,7 @@ enum class Code {
     PageOrientation,
     PageEmpty,
     PageUnreadable,
+    PageRedrawn,
     ContentOutsidePrintArea,
     AddressOutsideWindow,
     TextInWindow,
@@ -104,5 +105,9 @@ private:
 };
 
 char const* inWords(Severity severity);
+
+/// Of pages whose contents cannot be unpacked whole. `whose` stands in front of what it says, for a document
+/// other than the letter's.
+Finding redrawnFinding(std::vector<int> pages, std::string const& whose = {});
 
 } // namespace Production

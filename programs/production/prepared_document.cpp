@@ -25,7 +25,7 @@ std::string hasMoreThan(std::filesystem::path const& name, std::string const& wh
            "; leave out what is not to be printed";
 }
 
-PreparedPage prepared(Reader::Document& document, int number, std::string const& where) {
+PreparedPage preparedPage(Reader::Document& document, int number, std::string const& where) {
     PreparedPage made{document.singlePagePdf(number), document.pageSize(number)};
     if (!document.showsTheSame(number, made.pdf))
         throw Base::Error(where + ": page " + std::to_string(number) +
@@ -34,17 +34,21 @@ PreparedPage prepared(Reader::Document& document, int number, std::string const&
     return made;
 }
 
-std::vector<PreparedPage> pagesOf(std::string bytes, std::filesystem::path const& name) {
+/// Without the digest.
+PreparedDocument takenApart(std::string bytes, std::filesystem::path const& name) {
     std::string const where = name.string();
     if (bytes.size() > MAX_DOCUMENT_BYTES)
         throw Unusable(whyTooLarge(name));
     Reader::Document document = Reader::openDocument(std::move(bytes), name);
     if (document.pageCount() > MAX_DOCUMENT_PAGES)
         throw Unusable(hasMoreThan(name, std::to_string(MAX_DOCUMENT_PAGES) + " pages"));
-    std::vector<PreparedPage> pages;
-    for (int number = 1; number <= document.pageCount(); ++number)
-        pages.push_back(prepared(document, number, where));
-    return pages;
+    PreparedDocument prepared;
+    for (int number = 1; number <= document.pageCount(); ++number) {
+        prepared.pages.push_back(preparedPage(document, number, where));
+        if (document.isWrittenAnew(number))
+            prepared.redrawnPages.push_back(number);
+    }
+    return prepared;
 }
 
 } // namespace
@@ -68,8 +72,10 @@ Finding findingOf(std::string const& line) {
 PreparedDocument prepare(std::string bytes, std::filesystem::path const& name) {
     PreparedDocument document;
     try {
-        document.sha256 = Base::sha256(bytes);
-        document.pages = pagesOf(std::move(bytes), name);
+        std::string sha256 = Base::sha256(bytes);
+        document.sha256 = sha256;
+        document = takenApart(std::move(bytes), name);
+        document.sha256 = std::move(sha256);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (Unusable const& failure) {

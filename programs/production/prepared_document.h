@@ -33,6 +33,8 @@ struct PreparedDocument {
     /// Of the document, 64 hexadecimal digits; empty when there is none.
     std::string sha256 = {};
     std::vector<PreparedPage> pages = {};
+    /// From 1: those with contents that are damaged.
+    std::vector<int> redrawnPages = {};
 };
 
 /// By id.

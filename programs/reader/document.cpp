@@ -57,6 +57,11 @@ std::string Document::singlePagePdf(int number) {
     return source_->singlePagePdf(number);
 }
 
+bool Document::isWrittenAnew(int number) {
+    checkNumber(number);
+    return source_->isWrittenAnew(number);
+}
+
 std::optional<Picture> Document::drawPage(int number, double dotsPerInch) {
     checkNumber(number);
     return source_->drawPage(number, dotsPerInch);

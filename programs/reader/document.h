@@ -41,6 +41,9 @@ public:
     PageSize pageSize(int number);
     /// A PDF of this page alone. The same page gives the same bytes.
     std::string singlePagePdf(int number);
+    /// Whether some contents of the page are damaged, so that singlePagePdf() writes anew what is shown of
+    /// them. It shows when the page is read, drawn or written; before that it is not told.
+    bool isWrittenAnew(int number);
     /// Whether a PDF of one page shows the words and the overview of this page. Both are drawn
     /// unless they are made of the same objects. One that cannot be opened shows nothing. Throws Error
     /// when this page cannot be drawn.

@@ -14,17 +14,6 @@ namespace {
 
 using Handle = QPDFObjectHandle;
 
-class NameCollector : public Handle::ParserCallbacks {
-public:
-    void handleObject(Handle object) override {
-        if (object.isName())
-            names.insert(object.getName());
-    }
-    void handleEOF() override {}
-
-    std::set<std::string> names;
-};
-
 std::vector<Handle> annotationsOf(QPDFPageObjectHelper page) {
     Handle annotations = page.getObjectHandle().getKey("/Annots");
     return annotations.isArray() ? annotations.getArrayAsVector() : std::vector<Handle>();
@@ -33,22 +22,23 @@ std::vector<Handle> annotationsOf(QPDFPageObjectHelper page) {
 /// Follows what a page draws, by the names that its contents say.
 class UsedNames {
 public:
-    explicit UsedNames(QPDFPageObjectHelper page) : pageResources_(page.getAttribute("/Resources", false)) {
-        NameCollector collector;
-        page.parseContents(&collector);
-        follow(collector.names, pageResources_);
+    UsedNames(QPDFPageObjectHelper page, PageContents& contents)
+        : pageResources_(page.getAttribute("/Resources", false)) {
+        follow(contents.ofPage(page), pageResources_);
         for (Handle const& annotation : annotationsOf(page))
             followAppearance(annotation);
         while (!waiting_.empty()) {
-            auto [content, resources] = std::move(waiting_.back());
+            auto const [content, resources] = std::move(waiting_.back());
             waiting_.pop_back();
-            NameCollector inner;
-            content.parseAsContents(&inner);
-            follow(inner.names, resources);
-            follow(inner.names, pageResources_);
+            PageContents::Said const said = contents.of(content);
+            follow(said, resources);
+            follow(said, pageResources_);
         }
     }
 
+    /// Otherwise there may be more.
+    bool areAll() const { return areAll_; }
+    bool areOfContentsWrittenAnew() const { return isWrittenAnew_; }
     bool contains(std::string const& name) const { return names_.count(name) != 0; }
 
 private:
@@ -62,8 +52,11 @@ private:
                 draw(state.second);
     }
 
-    void follow(std::set<std::string> const& names, Handle resources) {
+    void follow(PageContents::Said const& said, Handle resources) {
+        std::set<std::string> const& names = said.names;
         names_.insert(names.begin(), names.end());
+        areAll_ = areAll_ && said.isUnderstood;
+        isWrittenAnew_ = isWrittenAnew_ || said.isWrittenAnew;
         if (!resources.isDictionary())
             return;
         for (char const* const kind : {"/XObject", "/Pattern", "/Font", "/ExtGState"}) {
@@ -92,6 +85,8 @@ private:
 
     Handle pageResources_;
     std::set<std::string> names_;
+    bool areAll_ = true;
+    bool isWrittenAnew_ = false;
     std::set<QPDFObjGen> seen_;
     /// Contents with the resources that they name.
     std::vector<std::pair<Handle, Handle>> waiting_;
@@ -145,12 +140,14 @@ void carryForm(QPDF& document, QPDF& single, QPDFPageObjectHelper page) {
 
 } // namespace
 
-void dropUnusedResources(QPDFPageObjectHelper page) {
+bool dropUnusedResources(QPDFPageObjectHelper page, PageContents& contents) {
+    bool isWrittenAnew = false;
     try {
-        UsedNames const used(page);
+        UsedNames const used(page, contents);
+        isWrittenAnew = used.areOfContentsWrittenAnew();
         Handle resources = page.getAttribute("/Resources", false);
-        if (!resources.isDictionary())
-            return;
+        if (!used.areAll() || !resources.isDictionary())
+            return isWrittenAnew;
         resources = resources.shallowCopy();
         dropUnused(resources, "/Font", used);
         dropUnused(resources, "/XObject", used);
@@ -158,6 +155,7 @@ void dropUnusedResources(QPDFPageObjectHelper page) {
     } catch (std::exception const&) {
         // Too much is carried then, and nothing is lost.
     }
+    return isWrittenAnew;
 }
 
 void dropLostContents(QPDFPageObjectHelper page) {
@@ -184,8 +182,10 @@ void carryCatalog(QPDF& document, QPDF& single, QPDFPageObjectHelper page) {
     carryForm(document, single, page);
 }
 
-std::string bytesOf(QPDF& pdf) {
+std::string bytesOf(QPDF& pdf, Packing packing) {
     QPDFWriter writer(pdf);
+    if (packing == Packing::AsItIs)
+        writer.setStreamDataMode(qpdf_s_preserve);
     writer.setOutputMemory();
     writer.setDeterministicID(true);
     writer.setObjectStreamMode(qpdf_o_generate);

@@ -23,6 +23,9 @@ public:
     /// That of readPage(), without reading the page.
     virtual PageSize pageSize(int number) = 0;
     virtual std::string singlePagePdf(int number) = 0;
+    /// Whether singlePagePdf() writes some contents anew, since they are damaged, as far as that has shown
+    /// when the page was read, drawn or written.
+    virtual bool isWrittenAnew(int /*number*/) { return false; }
     virtual std::string renderPage(int number, double dotsPerInch) = 0;
     /// Whether a PDF of one page is certain to show what the page shows, as its parts tell without drawing.
     virtual bool hasSameObjects(int number, std::string_view pdf) = 0;

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
+#include "programs/reader/page_contents.h"
 #include "programs/reader/page_parts.h"
 
 #include <qpdf/QPDF.hh>
@@ -63,39 +64,36 @@ QPDFObjectHandle fontOf(QPDF& pdf, CarriedFont const& font) {
 struct PdfPageWriter::Parsed {
     QPDF pdf;
     std::vector<QPDFPageObjectHelper> pages;
+    PageContents contents;
+
+    Parsed(std::string_view bytes, std::string const& where, EmbeddedFileReader const& readEmbeddedFile)
+        : contents(pdf, readEmbeddedFile) {
+        pdf.setSuppressWarnings(true);
+        pdf.processMemoryFile(where.c_str(), bytes.data(), bytes.size());
+        QPDFPageDocumentHelper document(pdf);
+        document.pushInheritedAttributesToPage();
+        pages = document.getAllPages();
+    }
 };
 
 std::string writerVersion() { return QPDF::QPDFVersion(); }
 
-PdfPageWriter::PdfPageWriter(std::string_view pdf, std::string where) : pdf_(pdf), where_(std::move(where)) {}
+PdfPageWriter::PdfPageWriter(std::string_view pdf, std::string where, EmbeddedFileReader readEmbeddedFile)
+    : pdf_(pdf), where_(std::move(where)), readEmbeddedFile_(std::move(readEmbeddedFile)) {}
 
 PdfPageWriter::~PdfPageWriter() = default;
 
-std::string PdfPageWriter::write(int number, int pageCount) {
+template<typename Work>
+auto PdfPageWriter::ofPage(int number, int pageCount, Work const& work) {
     try {
-        if (!parsed_) {
-            auto parsed = std::make_unique<Parsed>();
-            parsed->pdf.setSuppressWarnings(true);
-            parsed->pdf.processMemoryFile(where_.c_str(), pdf_.data(), pdf_.size());
-            QPDFPageDocumentHelper document(parsed->pdf);
-            document.pushInheritedAttributesToPage();
-            parsed->pages = document.getAllPages();
-            parsed_ = std::move(parsed);
-        }
+        if (!parsed_)
+            parsed_ = std::make_unique<Parsed>(pdf_, where_, readEmbeddedFile_);
         if (parsed_->pages.size() != static_cast<std::size_t>(pageCount))
             throw std::runtime_error("Some pages are lost.");
         QPDFPageObjectHelper page = parsed_->pages.at(static_cast<std::size_t>(number - 1));
         dropLostContents(page);
-        dropUnusedResources(page);
-        separateFormFields(page);
-
-        QPDF single;
-        single.setSuppressWarnings(true);
-        single.emptyPDF();
-        QPDFPageDocumentHelper added(single);
-        added.addPage(page, false);
-        carryCatalog(parsed_->pdf, single, added.getAllPages().at(0));
-        return bytesOf(single);
+        writesAnew_[number] = dropUnusedResources(page, parsed_->contents);
+        return work(page);
     } catch (QPDFExc const& failure) {
         if (failure.getErrorCode() == qpdf_e_password)
             throw Base::Error(where_ + ": is a PDF whose encryption is not known; save it without one");
@@ -103,6 +101,25 @@ std::string PdfPageWriter::write(int number, int pageCount) {
     } catch (std::exception const&) {
         failToWrite(number);
     }
+}
+
+std::string PdfPageWriter::write(int number, int pageCount) {
+    return ofPage(number, pageCount, [this](QPDFPageObjectHelper page) {
+        separateFormFields(page);
+        QPDF single;
+        single.setSuppressWarnings(true);
+        single.emptyPDF();
+        QPDFPageDocumentHelper added(single);
+        added.addPage(page, false);
+        carryCatalog(parsed_->pdf, single, added.getAllPages().at(0));
+        return bytesOf(single);
+    });
+}
+
+bool PdfPageWriter::writesAnew(int number, int pageCount) {
+    if (auto const known = writesAnew_.find(number); known != writesAnew_.end())
+        return known->second;
+    return ofPage(number, pageCount, [&](QPDFPageObjectHelper) { return writesAnew_[number]; });
 }
 
 void PdfPageWriter::failToWrite(int number) const {

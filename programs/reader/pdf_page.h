@@ -3,8 +3,10 @@
 // Without anything that needs C++20: clang takes qpdf's headers up to C++17 only.
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -13,25 +15,38 @@ namespace Reader {
 /// Of the library that pages are written with.
 std::string writerVersion();
 
+/// Gives the one file that a PDF has inside, unpacked as far as the library that draws pages gets; nothing
+/// when it does not find it.
+using EmbeddedFileReader = std::function<std::optional<std::string>(std::string const& pdf)>;
+
 /// Writes pages of one PDF as PDFs of their own. The PDF is parsed when the first page is written.
 class PdfPageWriter {
 public:
     /// `pdf` must live as long as the writer; `where` names it in messages.
-    PdfPageWriter(std::string_view pdf, std::string where);
+    PdfPageWriter(std::string_view pdf, std::string where, EmbeddedFileReader readEmbeddedFile);
     ~PdfPageWriter();
 
     /// Page `number`, from 1, of a PDF that should have so many pages. The same page gives the same bytes.
     /// Throws Error when the PDF is damaged; pages that cannot be told apart for certain are not written.
+    /// Contents that are damaged are written anew, as far as they are shown.
     std::string write(int number, int pageCount);
+    /// Whether write() writes some contents of the page anew.
+    bool writesAnew(int number, int pageCount);
 
 private:
     struct Parsed;
 
+    /// What `work` gives for the page, with what it needs and no more.
+    template<typename Work>
+    auto ofPage(int number, int pageCount, Work const& work);
     [[noreturn]] void failToWrite(int number) const;
 
     std::string_view pdf_;
     std::string where_;
+    EmbeddedFileReader readEmbeddedFile_;
     std::unique_ptr<Parsed> parsed_;
+    /// Of the pages that were looked through.
+    std::map<int, bool> writesAnew_;
 };
 
 /// A font of which a PDF carries the letters it shows; all are equally wide.

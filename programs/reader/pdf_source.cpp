@@ -10,6 +10,7 @@
 #include "vlservice/platform/log.h"
 
 #include <poppler-document.h>
+#include <poppler-embedded-file.h>
 #include <poppler-font.h>
 #include <poppler-image.h>
 #include <poppler-page-renderer.h>
@@ -18,10 +19,12 @@
 #include <png.h>
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <limits>
 #include <mutex>
 #include <optional>
+#include <set>
 #include <utility>
 
 #ifdef __SANITIZE_ADDRESS__
@@ -52,10 +55,27 @@ constexpr double MAX_PIXELS = 1e8;
 /// As poppler says that it draws nothing of what is written in a font.
 constexpr char const* FONT_FAILURE = "Couldn't create a font for";
 
-/// The last one of this process, which draws one page at a time.
-std::string& fontFailure() {
-    static std::string failure;
-    return failure;
+/// Some of what poppler says of streams that cannot be unpacked, or whose end it has to look for.
+constexpr std::array STREAM_FAILURES{"stream", "filter", "Filter"};
+
+/// What poppler has said in this process, which reads and draws one page at a time.
+struct Sayings {
+    /// The last one.
+    std::string fontFailure;
+    std::size_t streamFailures = 0;
+
+    void take(std::string const& message) {
+        if (std::size_t const at = message.find(FONT_FAILURE); at != std::string::npos)
+            fontFailure = message.substr(at);
+        streamFailures += std::any_of(STREAM_FAILURES.begin(), STREAM_FAILURES.end(), [&](char const* word) {
+            return message.find(word) != std::string::npos;
+        });
+    }
+};
+
+Sayings& sayings() {
+    static Sayings all;
+    return all;
 }
 
 /// Sets poppler up, once for the process.
@@ -63,13 +83,9 @@ void preparePoppler() {
     static std::once_flag once;
     std::call_once(once, [] {
         // What poppler finds wrong with a document shows in what can be read of it, but for letters that it
-        // leaves out of a picture.
-        poppler::set_debug_error_function(
-            [](std::string const& message, void*) {
-                if (message.find(FONT_FAILURE) != std::string::npos)
-                    fontFailure() = message.substr(message.find(FONT_FAILURE));
-            },
-            nullptr);
+        // leaves out of a picture, and for contents that end early.
+        poppler::set_debug_error_function([](std::string const& message, void*) { sayings().take(message); },
+                                          nullptr);
     });
     // poppler drops its tables with the last document and makes them anew for the next, which costs more than
     // opening it does: an empty document keeps them.
@@ -164,14 +180,25 @@ std::string pngOf(poppler::image const& image) {
     return bytes;
 }
 
+std::optional<std::string> embeddedFileIn(std::string const& pdf) {
+    std::unique_ptr<poppler::document> const document(
+        poppler::document::load_from_raw_data(pdf.data(), static_cast<int>(pdf.size())));
+    std::vector<poppler::embedded_file*> const files =
+        document ? document->embedded_files() : std::vector<poppler::embedded_file*>();
+    if (files.size() != 1 || !files.front()->is_valid())
+        return std::nullopt;
+    poppler::byte_array const bytes = files.front()->data();
+    return std::string(bytes.begin(), bytes.end());
+}
+
 /// Of a PDF that cannot be opened: whether it is because of its encryption.
 bool saysEncrypted(std::string_view bytes) { return bytes.find("/Encrypt") != std::string_view::npos; }
 
 class PdfSource : public PageSource {
 public:
     PdfSource(std::string bytes, std::string where)
-        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_), objects_(bytes_),
-          extras_(bytes_, where_) {
+        : bytes_(std::move(bytes)), where_(std::move(where)), writer_(bytes_, where_, embeddedFileIn),
+          objects_(bytes_), extras_(bytes_, where_) {
         preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
             throw Base::Error(where_ + ": is larger than 2 GiB; split it");
@@ -188,6 +215,7 @@ public:
     int pageCount() const override { return document_->pages(); }
 
     Page readPage(int number) override {
+        std::size_t const failures = sayings().streamFailures;
         std::unique_ptr<poppler::page> const source = popplerPage(number);
         Page page;
         page.number = number;
@@ -200,6 +228,7 @@ public:
         for (poppler::text_box const& box : source->text_list(poppler::page::text_list_include_font))
             if (std::optional<Word> word = wordOf(box, fonts); word && visible.contains(word->box.centre()))
                 page.words.push_back(std::move(*word));
+        noteFailures(number, failures);
         return page;
     }
 
@@ -207,17 +236,25 @@ public:
 
     std::string singlePagePdf(int number) override {
         popplerPage(number); // It throws for a page that was not read either.
+        written_.insert(number);
         return writer_.write(number, pageCount());
+    }
+
+    /// What is written is known for certain; otherwise pages are looked through that poppler had trouble
+    /// with.
+    bool isWrittenAnew(int number) override {
+        return (written_.count(number) != 0 || failing_.count(number) != 0) &&
+               writer_.writesAnew(number, pageCount());
     }
 
     bool hasSameObjects(int number, std::string_view pdf) override { return objects_.areSame(number, pdf); }
 
     std::string renderPage(int number, double dotsPerInch) override {
-        fontFailure().clear();
+        sayings().fontFailure.clear();
         poppler::image const image = draw(number, dotsPerInch);
-        if (!fontFailure().empty())
+        if (!sayings().fontFailure.empty())
             Log::Lock(4).logStreamLine()
-                << where_ << ": the picture of page " << number << " lacks letters (" << fontFailure()
+                << where_ << ": the picture of page " << number << " lacks letters (" << sayings().fontFailure
                 << "); draw it again, or embed the document's fonts";
         return pngOf(image);
     }
@@ -284,7 +321,8 @@ private:
         return liesAcross ? size.turned() : size;
     }
 
-    poppler::image draw(int number, double dotsPerInch) const {
+    poppler::image draw(int number, double dotsPerInch) {
+        std::size_t const failures = sayings().streamFailures;
         std::unique_ptr<poppler::page> const page = popplerPage(number);
         poppler::rectf const sheet = page->page_rect();
         double const scale = dotsPerInch / 72;
@@ -298,7 +336,13 @@ private:
         renderer.set_render_hint(poppler::page_renderer::text_antialiasing);
         poppler::image const image = renderer.render_page(page.get(), dotsPerInch, dotsPerInch);
         requireDrawn(image, number);
+        noteFailures(number, failures);
         return image;
+    }
+
+    void noteFailures(int number, std::size_t before) {
+        if (sayings().streamFailures != before)
+            failing_.insert(number);
     }
 
     std::unique_ptr<poppler::page> popplerPage(int number) const {
@@ -316,6 +360,9 @@ private:
     PageObjects objects_;
     PdfExtras extras_;
     std::unique_ptr<poppler::document> document_;
+    /// Pages whose streams poppler has complained of, and those that were written.
+    std::set<int> failing_;
+    std::set<int> written_;
 };
 
 } // namespace

@@ -89,8 +89,8 @@ TEST(CodesOfFindings, AreWarningsWhereNothingKeepsALetterFromGoingOut) {
         if (row.isLoose)
             loose.emplace_back(row.name);
     }
-    EXPECT_THAT(warnings,
-                ElementsAre("page-empty", "font-not-embedded", "annotation-lost", "embedded-file-lost"));
+    EXPECT_THAT(warnings, ElementsAre("page-empty", "page-redrawn", "font-not-embedded", "annotation-lost",
+                                      "embedded-file-lost"));
     EXPECT_THAT(loose, ElementsAre("content-outside-print-area", "address-outside-window", "text-in-window",
                                    "clear-zone"));
 }

@@ -1,6 +1,7 @@
 #include "programs/production/prepared_document.h"
 
 #include "tests/support/pdf_maker.h"
+#include "tests/support/raw_pdf.h"
 
 #include <gmock/gmock.h>
 
@@ -31,6 +32,15 @@ TEST(PreparedDocuments, MayBeText) {
     EXPECT_EQ(document.error, "");
     EXPECT_THAT(document.pages, SizeIs(2));
     EXPECT_FALSE(document.pages.at(0).isColoured);
+}
+
+TEST(PreparedDocuments, TellPagesWhoseContentsAreWrittenAnew) {
+    using VLServiceTest::onePage;
+    EXPECT_THAT(prepare(onePage("0 0 10 10 re f").bytes(), "a.pdf").redrawnPages, IsEmpty());
+    PreparedDocument const damaged =
+        prepare(onePage("").stream(5, "/Filter /FlateDecode", "no deflated bytes").bytes(), "a.pdf");
+    EXPECT_EQ(damaged.error, "");
+    EXPECT_THAT(damaged.redrawnPages, testing::ElementsAre(1));
 }
 
 TEST(PreparedDocuments, SayWhatIsWrongInOneLineWithACode) {

@@ -6,6 +6,7 @@
 #include "programs/base/utf8.h"
 #include "programs/mailing/page_blob.h"
 #include "programs/vlmail/letters/batch.h"
+#include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/letters/worker_message.h"
 
@@ -38,12 +39,15 @@ std::string pack(PreparedDocument const& document) {
         message.put(static_cast<std::uint64_t>(page.size.height));
         message.put(std::uint64_t{page.isColoured});
     }
+    message.put(document.redrawnPages.size());
+    for (int const number : document.redrawnPages)
+        message.put(static_cast<std::uint64_t>(number));
     return message.take();
 }
 
 PreparedDocument unpack(std::string bytes) {
     WorkerMessage message(std::move(bytes));
-    PreparedDocument document{message.text(), message.text(), {}};
+    PreparedDocument document{message.text(), message.text()};
     document.pages.resize(message.number());
     for (PreparedPage& page : document.pages) {
         page.pdf = message.text();
@@ -51,6 +55,9 @@ PreparedDocument unpack(std::string bytes) {
         page.size.height = message.smallNumber();
         page.isColoured = message.number() != 0;
     }
+    document.redrawnPages.resize(message.number());
+    for (int& number : document.redrawnPages)
+        number = message.smallNumber();
     return document;
 }
 
@@ -233,6 +240,17 @@ std::string MakingReady::whyNot(Cfg::PackPreset const& preset,
     if (attachments != attachments_.end() && !attachments->second.error.empty())
         return attachments->second.error;
     return makerFor(preset).whyNot({Part::Kind::FirstLetter}, pages, "the letter");
+}
+
+std::vector<Production::Finding> MakingReady::warningsFor(Cfg::PackPreset const& preset) const {
+    std::vector<Production::Finding> warnings;
+    for (std::string const& id : idsIn({preset})) {
+        auto const document = documents_.find(id);
+        if (document != documents_.end() && !document->second.redrawnPages.empty())
+            warnings.push_back(Production::redrawnFinding({}, pagesInWords(document->second.redrawnPages) +
+                                                                  " of " + Base::inQuotes(id) + ": "));
+    }
+    return warnings;
 }
 
 Production::Maker& MakingReady::makerFor(Cfg::PackPreset const& preset) {

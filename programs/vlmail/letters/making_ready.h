@@ -52,6 +52,8 @@ public:
 
     /// Why no letter of the pack preset can go out: a code and one line; empty when letters can.
     std::string whyNot(Cfg::PackPreset const& preset, std::vector<Production::PageSize> const& pages);
+    /// What a person should know of the documents that its letters go out with.
+    std::vector<Production::Finding> warningsFor(Cfg::PackPreset const& preset) const;
     /// A maker for its letters. It lives as long as this object.
     Production::Maker& makerFor(Cfg::PackPreset const& preset);
     bool countsColours(Cfg::PackPreset const& preset) const;

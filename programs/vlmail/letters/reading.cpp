@@ -217,14 +217,36 @@ void addTo(LetterReading& letter, std::string const& whyNotMade) {
         letter.findings.pop_back();
 }
 
+/// Errors stand first.
+void addWarning(LetterReading& letter, Production::Finding finding) {
+    if (letter.findings.size() < Production::Findings::MOST)
+        letter.findings.push_back(std::move(finding));
+}
+
+/// Looking at the page may have told already.
+void noteWrittenAnew(LetterReading& letter, int page) {
+    auto const told = std::ranges::find_if(letter.findings, [](Production::Finding const& finding) {
+        return finding.code == Production::Code::PageRedrawn && !finding.pages.empty();
+    });
+    if (told == letter.findings.end())
+        return addWarning(letter, Production::redrawnFinding({page}));
+    auto const place = std::ranges::lower_bound(told->pages, page);
+    if (place == told->pages.end() || *place != page)
+        told->pages.insert(place, page);
+}
+
 /// Notes which of the letters cannot be made ready. Pages that cannot be read have no size, and are told
 /// already.
 void holdAgainst(std::vector<LetterReading>& letters, Reader::Document& document,
                  Cfg::PackPreset const& preset, MakingReady& making) {
-    for (LetterReading& letter : letters)
+    std::vector<Production::Finding> const warnings = making.warningsFor(preset);
+    for (LetterReading& letter : letters) {
         if (std::ranges::find(letter.findings, Production::Code::PageUnreadable,
                               &Production::Finding::code) == letter.findings.end())
             addTo(letter, making.whyNot(preset, sizesOf(letter.pages, document)));
+        for (Production::Finding const& warning : warnings)
+            addWarning(letter, warning);
+    }
 }
 
 /// Of the letter by itself, with what goes out along with it.
@@ -299,6 +321,8 @@ private:
 
     void addPage(LetterReading& letter, int number) {
         Production::PreparedPage const content = contentOf(number);
+        if (document_.isWrittenAnew(number))
+            noteWrittenAnew(letter, number);
         if (along_.pages == Along::Pages::Yes)
             hold(content.pdf, letter, number);
         int const place = static_cast<int>(letter.blobs.size()) + 1;

@@ -2,12 +2,14 @@
 
 #include "programs/base/error.h"
 #include "programs/base/quoting.h"
+#include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_form.h"
 #include "vlservice/pack/container_format.h"
 
+#include <algorithm>
 #include <numeric>
 #include <ostream>
 #include <utility>
@@ -80,7 +82,21 @@ void Dispatch::mailLetters(DocumentReading reading) {
         if (name.empty())
             name = mailing.nameFor(reading.document);
         noteNotifications(reading.document, letter);
+        noteRedrawnPages(reading.document, letter);
         mailing.add(name, std::move(letter));
+    }
+}
+
+/// What is said of a letterhead or an attachment holds for the mailing, and is said once.
+void Dispatch::noteRedrawnPages(std::string const& name, LetterReading const& letter) {
+    for (Production::Finding const& finding : letter.findings) {
+        if (finding.code != Production::Code::PageRedrawn)
+            continue;
+        std::string const said = VlMail::inWords(finding);
+        if (!finding.pages.empty())
+            notes_.push_back(name + ": " + said);
+        else if (std::ranges::find(notes_, said) == notes_.end())
+            notes_.push_back(said);
     }
 }
 

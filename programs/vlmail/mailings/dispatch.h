@@ -55,6 +55,7 @@ private:
 
     void refuseLetters(DocumentReading& reading);
     void mailLetters(DocumentReading reading);
+    void noteRedrawnPages(std::string const& name, LetterReading const& letter);
     void noteNotifications(std::string const& name, LetterReading const& letter);
     OutgoingMailing& mailingFor(std::string const& packPreset);
     std::string priceInWords(OutgoingMailing const* mailing) const;

@@ -1,4 +1,5 @@
 // What would go wrong with letters on paper, as the commands tell it.
+#include "programs/base/read_file.h"
 #include "tests/support/json_literal.h"
 #include "tests/support/raw_pdf.h"
 #include "tests/support/temporary_folder.h"
@@ -174,6 +175,67 @@ TEST_F(PrintReadiness, NamesPagesThatCannotBeReadAndLetsOtherLettersGo) {
     EXPECT_EQ(mail.status, 2);
     EXPECT_THAT(mail.out, HasSubstr("left out: bill 3.pdf, pages 1-2: page-unreadable: page 2: "));
     EXPECT_THAT(mail.out, HasSubstr("2 letters: 1 ready, 1 cannot go out"));
+}
+
+/// A page whose contents end early, behind the address.
+std::string damagedBill() {
+    std::string content = ADDRESS;
+    for (int line = 0; line < 30; ++line)
+        content += "BT /F 10 Tf 72 " + std::to_string(500 - 12 * line) + " Td (" +
+                   std::to_string(line * 7919 % 1000) + ") Tj ET ";
+    std::string const packed = deflated(content);
+    return onePage("").stream(5, "/Filter /FlateDecode", packed.substr(0, packed.size() * 2 / 3)).bytes();
+}
+
+constexpr char const* REDRAWN = "contents are damaged: what can be shown of them is written anew";
+constexpr char const* LOOK = "look whether all is there, or export the document again";
+
+TEST_F(PrintReadiness, NamesPagesWhoseContentsAreWrittenAnewAndLetsThemGo) {
+    write("bill 3.pdf", damagedBill());
+    for (std::string const command : {"check", "letter"}) {
+        Ran const ran = run({command, path("bill 3.pdf")});
+        EXPECT_EQ(ran.status, 0);
+        EXPECT_THAT(ran.out, HasSubstr(std::string("    warning page-redrawn, page 1: ") + REDRAWN +
+                                       "\n      " + LOOK + '\n'));
+    }
+    EXPECT_EQ(text(findingsIn(run({"letter", "--json", path("bill 3.pdf")}).out)),
+              std::string(R"([{"code":"page-redrawn","severity":"warning","pages":[1],"box":{},"says":")") +
+                  REDRAWN + R"(","fix":")" + LOOK + "\"}]");
+    run({"letter", "--report", path("report.html"), path("bill 3.pdf")});
+    EXPECT_THAT(Base::readFile(path("report.html")), HasSubstr(REDRAWN));
+}
+
+TEST_F(PrintReadiness, NotesPagesWhoseContentsAreWrittenAnewInMailingsAndPlans) {
+    write("bill 3.pdf", damagedBill());
+    std::string const note = std::string("bill 3.pdf: page-redrawn: page 1: ") + REDRAWN + "; " + LOOK;
+    Ran const mail = run({"mail", "-o", path("out"), path("bill 1.pdf"), path("bill 3.pdf")});
+    EXPECT_EQ(mail.status, 0);
+    EXPECT_THAT(mail.out, HasSubstr("note: " + note + "\n2 documents, 2 letters: 2 ready"));
+    for (std::vector<std::string> const& command :
+         {std::vector<std::string>{"mail", "--json", "-o", path("out"), path("bill 3.pdf")},
+          {"plan", "--json", "-o", path("plan.json"), path("bill 3.pdf")}}) {
+        Ran const ran = run(command);
+        json::Object const outcome = json::strToObject(ran.out.data(), ran.out.size());
+        EXPECT_EQ(text(outcome.get("notes")), "[\"" + note + "\"]");
+    }
+    EXPECT_THAT(runVlMail({"mail", "--plan", path("plan.json"), "-o", path("planned")}).out,
+                HasSubstr("note: " + note + '\n'));
+}
+
+TEST_F(PrintReadiness, NotesOnceWhatIsWrittenAnewOfAttachments) {
+    settings(R"(, "attachments": ["terms"])");
+    std::filesystem::create_directory(path("docs"));
+    write("docs/terms.pdf", damagedBill());
+    write("bill 3.pdf", onePage(ADDRESS).bytes());
+    std::string const said = std::string("page 1 of \"terms\": ") + REDRAWN;
+    EXPECT_THAT(run({"check", "--documents", path("docs"), path("bill 1.pdf")}).out,
+                HasSubstr("    warning page-redrawn: " + said + "\n      " + LOOK + '\n'));
+    Ran const mail =
+        run({"mail", "--documents", path("docs"), "-o", path("out"), path("bill 1.pdf"), path("bill 3.pdf")});
+    EXPECT_EQ(mail.status, 0);
+    std::string const note = "note: page-redrawn: " + said + "; " + LOOK + '\n';
+    EXPECT_THAT(mail.out, HasSubstr(note));
+    EXPECT_EQ(mail.out.find("page-redrawn"), mail.out.rfind("page-redrawn"));
 }
 
 constexpr char const* COVERED =
