@@ -22,6 +22,8 @@ struct MemoryService {
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::SettingsStore store{database};
     VlServiced::SettingsService settings{store};
+    VlServiced::DocumentStore documentStore{database};
+    VlServiced::DocumentService documents{documentStore, store, settings, [] { return 1LL; }};
     VlServiced::JobStore jobs{database};
     VlServiced::JobRunner runner{jobs,
                                  {[](VlServiced::JobSurroundings::Work const&) {},
@@ -29,7 +31,7 @@ struct MemoryService {
                                   [](VlServiced::JobSurroundings::Work const&) {}, [] { return 1LL; },
                                   [this] { return settings.service(); }, "/missing/outbox"}};
     std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, jobs, runner, "/missing/outbox", [] { return 1LL; });
+        settings, documents, jobs, runner, "/missing/outbox", [] { return 1LL; });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

@@ -6,12 +6,6 @@
 #include <utility>
 
 namespace Protocol {
-namespace {
-
-constexpr char const* NODE_ID = "id";
-
-} // namespace
-
 struct SettingsQuery::Keys {
     static constexpr std::tuple TABLE{
         Asked{"parts", &SettingsQuery::parts, TextsForm{MAX_PARTS}},
@@ -48,12 +42,7 @@ struct TreeNode::Keys {
 SettingsQuery::SettingsQuery(std::string nodeId, std::vector<std::string> wantedParts)
     : id(std::move(nodeId)), parts(std::move(wantedParts)) {}
 
-SettingsQuery::SettingsQuery(json::Object const& object) {
-    // A node is never taken for the root because its id is missing.
-    json::Value const node = object.get(NODE_ID);
-    if (!node.isString())
-        throw Base::Error("\"id\" of a query for settings has to be the id of a node");
-    id = node.toString();
+SettingsQuery::SettingsQuery(json::Object const& object) : id(nodeIn(object, IN_WORDS)) {
     json::readKeys(Keys::TABLE, object, *this);
 }
 

@@ -49,9 +49,10 @@ json::Object answerOrError(Ipc::CmdI const& cmd, Operation operation) {
 
 } // namespace
 
-Processor::Processor(SettingsService& settings, JobStore& jobs, JobRunner& runner,
+Processor::Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
                      std::filesystem::path outbox, std::function<long long()> now)
-    : settings_(settings), jobs_(jobs), runner_(runner), outbox_(std::move(outbox)), now_(std::move(now)) {}
+    : settings_(settings), documents_(documents), jobs_(jobs), runner_(runner), outbox_(std::move(outbox)),
+      now_(std::move(now)) {}
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
                          std::function<void(std::string const& failure)> done) {
@@ -81,18 +82,25 @@ void Processor::visit(Ipc::CSConfigIdsList& cmd) {
 
 /// The command has one payload for many questions.
 json::Object Processor::answer(json::Object const& question) {
-    using Protocol::JobsChange;
-    using Protocol::JobsQuery;
-    using Protocol::SettingsQuery;
-    std::string const kind = Protocol::kindOf(question);
+    using namespace Protocol;
+    std::string const kind = kindOf(question);
     if (kind == SettingsQuery::KIND)
         return settings_.effective(SettingsQuery(question)).serialize();
     if (kind == JobsQuery::KIND)
         return listJobs(JobsQuery(question), jobs_, settings_, outbox_, now_()).serialize();
     if (kind == JobsChange::KIND)
         return changeJobs(JobsChange(question));
+    if (kind == DocumentsQuery::KIND)
+        return documents_.list(DocumentsQuery(question)).serialize();
+    if (kind == DocumentPieceQuery::KIND)
+        return documents_.piece(DocumentPieceQuery(question)).serialize();
+    if (kind == DocumentUpload::KIND)
+        return documents_.put(DocumentUpload(question)).serialize();
+    if (kind == DocumentRemoval::KIND)
+        return documents_.remove(DocumentRemoval(question)).serialize();
     throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
-                      JobsQuery::KIND + ", " + JobsChange::KIND);
+                      JobsQuery::KIND + ", " + JobsChange::KIND + ", " + DocumentsQuery::KIND + ", " +
+                      DocumentPieceQuery::KIND + ", " + DocumentUpload::KIND + ", " + DocumentRemoval::KIND);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {

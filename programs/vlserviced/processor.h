@@ -2,6 +2,7 @@
 // Carries out the commands that clients send.
 
 #include "programs/vlserviced/jobs/job_runner.h"
+#include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "vlservice/ipc/cmd_processor_vlsvc.h"
 #include "vlservice/ipc/set_part_base.h"
@@ -17,8 +18,8 @@ namespace VlServiced {
 class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI {
 public:
     /// All have to outlive the processor.
-    Processor(SettingsService& settings, JobStore& jobs, JobRunner& runner, std::filesystem::path outbox,
-              std::function<long long()> now);
+    Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
+              std::filesystem::path outbox, std::function<long long()> now);
 
     /// Carries a command out. `done` is called once, on this thread, possibly later; with the reason, one
     /// line, when the command failed and its response has no room for that.
@@ -47,6 +48,7 @@ private:
     json::Object serviceOverview() const;
 
     SettingsService& settings_;
+    DocumentService& documents_;
     JobStore& jobs_;
     JobRunner& runner_;
     std::filesystem::path outbox_;

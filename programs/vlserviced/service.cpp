@@ -229,6 +229,7 @@ private:
 
     void keepUp() {
         runner_.resume();
+        documents_.dropStalled();
         auto const time = std::chrono::steady_clock::now();
         if (time - lastStatusUpdate_ >= statusUpdateTime()) {
             lastStatusUpdate_ = time;
@@ -293,6 +294,8 @@ private:
     SQLite::Database database_;
     SettingsStore store_{database_};
     SettingsService settings_{store_};
+    DocumentStore documentStore_{database_};
+    DocumentService documents_{documentStore_, store_, settings_, &now};
     JobStore jobs_{database_};
 
     asio::io_context io_{1};
@@ -302,7 +305,7 @@ private:
     HeldQueries held_{io_, jobs_};
     JobRunner runner_{jobs_, surroundings()};
     std::shared_ptr<Processor> processor_ =
-        std::make_shared<Processor>(settings_, jobs_, runner_, outbox_, &now);
+        std::make_shared<Processor>(settings_, documents_, jobs_, runner_, outbox_, &now);
 
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
     asio::steady_timer upkeep_{io_};

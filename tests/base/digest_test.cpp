@@ -37,6 +37,14 @@ TEST(Digest, IsThatOfTheStandard) {
     EXPECT_EQ(Base::sha256("abc"), "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad");
 }
 
+TEST(Digest, IsTheSameOfPiecesAndOfTheWhole) {
+    Base::Sha256 pieces;
+    for (char const* const piece : {"a", "", "bc"})
+        pieces.add(piece);
+    EXPECT_EQ(pieces.digest(), Base::sha256("abc"));
+    EXPECT_EQ(Base::Sha256().digest(), Base::sha256(""));
+}
+
 TEST(Digest, FailsWhenTheCryptoLibraryFindsNoMemoryToBeginWith) {
     // The library begins once: each number of allocations wants a process of its own.
     GTEST_FLAG_SET(death_test_style, "threadsafe");

@@ -53,6 +53,8 @@ protected:
     SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::SettingsStore store_{database_};
     VlServiced::SettingsService settings_{store_};
+    VlServiced::DocumentStore documentStore_{database_};
+    VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; }};
     VlServiced::JobStore jobs_{database_};
     VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
                                              [](VlServiced::JobSurroundings::Work const& work) { work(); },
@@ -62,6 +64,6 @@ protected:
                                              [this] { return settings_.service(); },
                                              outbox_,
                                          }};
-    std::shared_ptr<VlServiced::Processor> processor_ =
-        std::make_shared<VlServiced::Processor>(settings_, jobs_, runner_, outbox_, [] { return 1000LL; });
+    std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
+        settings_, documents_, jobs_, runner_, outbox_, [] { return 1000LL; });
 };

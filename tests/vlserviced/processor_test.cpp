@@ -82,8 +82,12 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
               R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets"})");
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
               R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
-    EXPECT_EQ(send(29, R"({"query":"x"})"), R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs"})");
-    EXPECT_EQ(send(29, "{}"), R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs"})");
+    EXPECT_EQ(send(29, R"({"query":"x"})"),
+              R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
+              R"(document_piece, put_document, remove_document"})");
+    EXPECT_EQ(send(29, "{}"),
+              R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
+              R"(document_piece, put_document, remove_document"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {

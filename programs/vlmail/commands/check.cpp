@@ -1,5 +1,6 @@
 // vlmail check: what would go wrong with letters on paper, for a person or as JSON.
 #include "programs/vlmail/commands/batch_command.h"
+#include "programs/vlmail/commands/batch_sources.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/checking.h"
@@ -16,8 +17,7 @@ namespace {
 
 struct Options {
     std::vector<std::string> files;
-    std::string settings;
-    std::string documents;
+    SourceOptions sources;
     bool json = false;
     WorkerOptions reading;
 };
@@ -64,11 +64,12 @@ json::Object toJson(DocumentReading const& reading) {
 }
 
 int checkDocuments(Options const& options, Terminal const& terminal) {
-    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
+    BatchSources sources(options.sources, terminal);
+    NodeSettings const settings = sources.settings();
     Outcome outcome;
     BatchProgress progress(terminal);
     MakingReady making(MakingReady::Colours::Ignored);
-    making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
+    making.prepareFor(options.files, settings.presets(), sources.documents(), options.reading.workers());
     readBatch(options.files, settings, options.reading.workers(),
               {.checks = Along::Checks::Yes, .limits = Along::Limits::Yes, .making = &making}, progress,
               [&](std::size_t, ReadResult const& result) {
@@ -92,8 +93,7 @@ void addCheckCommand(Base::Command const& app, Task& task) {
     Base::Command const check =
         app.addCommand("check", "Says what would go wrong with the letters in documents on paper");
     check.addOption("FILE", options->files, "PDF or text documents").required();
-    check.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
-    check.addOption("--documents", options->documents, DOCUMENTS_HELP);
+    addSourceOptions(check, options->sources);
     check.addFlag("--json", options->json,
                   "One JSON object a document, each on a line, with the \"findings\" of each letter");
     addWorkerOptions(check, options->reading);

@@ -16,6 +16,7 @@ using Task = std::function<int(Terminal const&)>;
 // One source file a subcommand.
 void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);
+void addDocumentsCommand(Base::Command const& app, Task& task);
 /// Goes behind all others: it tells of them.
 void addHelpCommand(Base::Command const& app, Task& task);
 /// hold, release and cancel.

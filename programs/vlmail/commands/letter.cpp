@@ -1,5 +1,6 @@
 // vlmail letter: what the settings make of each document, for a person or as JSON.
 #include "programs/vlmail/commands/batch_command.h"
+#include "programs/vlmail/commands/batch_sources.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/explain/explain_text.h"
@@ -24,8 +25,7 @@ namespace {
 
 struct Options {
     std::vector<std::string> files;
-    std::string settings;
-    std::string documents;
+    SourceOptions sources;
     std::string report;
     bool json = false;
     bool explain = false;
@@ -131,13 +131,14 @@ Along alongFor(Options const& options, MakingReady* making) {
 }
 
 int showLetters(Options const& options, Terminal const& terminal) {
-    NodeSettings const settings = NodeSettings::fromFileIfNamed(options.settings);
+    BatchSources sources(options.sources, terminal);
+    NodeSettings const settings = sources.settings();
     Outcome outcome;
     std::optional<Report::File> report;
     if (!options.report.empty())
         report.emplace(options.report);
     MakingReady making(MakingReady::Colours::Ignored);
-    making.prepareFor(options.files, settings.presets(), options.documents, options.reading.workers());
+    making.prepareFor(options.files, settings.presets(), sources.documents(), options.reading.workers());
     Along const along = alongFor(options, &making);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(), along, progress,
@@ -167,8 +168,7 @@ void addLetterCommand(Base::Command const& app, Task& task) {
     Base::Command const letter = app.addCommand(
         "letter", "Shows the letters in documents: presets, fields, and whether they can go out");
     letter.addOption("FILE", options->files, "PDF or text documents").required();
-    letter.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
-    letter.addOption("--documents", options->documents, DOCUMENTS_HELP);
+    addSourceOptions(letter, options->sources);
     letter.addFlag("--json", options->json, "One JSON object a document, each on a line");
     letter.addFlag("--explain", options->explain,
                    "Tells how each field came about, and why one was not found; with --json as \"trace\"");

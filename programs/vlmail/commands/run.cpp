@@ -19,6 +19,7 @@ void addCommands(Base::Command const& command, Task& task) {
     command.requireCommand();
     addCheckCommand(command, task);
     addDiscoverCommand(command, task);
+    addDocumentsCommand(command, task);
     addJobChangeCommands(command, task);
     addLetterCommand(command, task);
     addMailCommand(command, task);

@@ -21,7 +21,7 @@ std::string nodeInWords(std::string const& id) { return id.empty() ? "the root" 
 
 Protocol::SettingsAnswer fetchSettings(Channel::Client& service, std::string const& nodeId,
                                        std::vector<std::string> const& parts) {
-    return Protocol::SettingsAnswer(ask(service, {nodeId, parts}));
+    return Protocol::SettingsAnswer(ask(service, Protocol::SettingsQuery(nodeId, parts)));
 }
 
 std::string valueInWords(json::Value const& value) {

@@ -56,18 +56,21 @@ fs::path const* DocumentFolder::Names::find(std::string const& id) const {
     return nullptr;
 }
 
-fs::path DocumentFolder::find(std::string const& id) const {
+FoundDocument DocumentFolder::find(std::string const& id) const {
     if (!Production::isDocumentId(id))
         throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + Base::inQuotes(Base::plainText(id)) +
                           " cannot be the name of a document; correct the pack preset");
     if (auto const fixed = fixed_.find(id); fixed != fixed_.end())
         return fixed->second;
     if (fs::path const* const file = batch_.find(id))
-        return *file;
+        return {fs::absolute(*file)};
     if (fs::path const* const file = listed_.find(id)) {
         requireInside(id, *file);
-        return *file;
+        return {*file};
     }
+    if (elsewhere_)
+        if (std::optional<FoundDocument> found = elsewhere_->find(id))
+            return std::move(*found);
     throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + "there is no document " +
                       Base::inQuotes(id) + places());
 }
@@ -82,9 +85,11 @@ void DocumentFolder::requireInside(std::string const& id, fs::path const& file) 
 }
 
 std::string DocumentFolder::places() const {
-    return folder_.empty()
-               ? "; name the folder that it lies in with --documents, or correct the pack preset"
-               : " in " + Base::inQuotes(folder_.string()) + "; put it there, or correct the pack preset";
+    std::string const inFolder = folder_.empty() ? "" : " in " + Base::inQuotes(folder_.string());
+    if (elsewhere_)
+        return inFolder + (folder_.empty() ? "" : " or") + elsewhere_->place;
+    return folder_.empty() ? "; name the folder that it lies in with --documents, or correct the pack preset"
+                           : inFolder + "; put it there, or correct the pack preset";
 }
 
 } // namespace VlMail

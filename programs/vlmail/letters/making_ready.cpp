@@ -65,7 +65,10 @@ PreparedDocument unusable(char const* code, fs::path const& file, std::string co
     return {code + Base::validUtf8(file.string()) + ": " + why};
 }
 
-PreparedDocument preparedFile(fs::path const& file) {
+PreparedDocument prepared(FoundDocument const& found) {
+    fs::path const& file = found.file;
+    if (found.isOfService())
+        return Production::prepare(*found.bytes, file);
     std::error_code failure;
     if (std::uintmax_t const size = fs::file_size(file, failure);
         !failure && size > Production::MAX_DOCUMENT_BYTES)
@@ -182,36 +185,47 @@ std::vector<Cfg::PackPreset> packPresetsOf(std::vector<std::string> const& files
 
 void MakingReady::prepare(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
                           Workers const& workers) {
-    prepareDocuments(presets, folder, workers);
+    takeDocuments(presets, folder, workers);
     makeAttachments(presets, workers);
 }
 
 void MakingReady::prepareFor(std::vector<std::string> const& files, Cfg::Presets const& presets,
-                             fs::path const& folder, Workers const& workers) {
-    DocumentFolder documents(folder);
-    std::vector<Cfg::PackPreset> const used = packPresetsOf(files, presets, documents);
-    prepare(used, documents, workers);
+                             DocumentFolder folder, Workers const& workers) {
+    std::vector<Cfg::PackPreset> const used = packPresetsOf(files, presets, folder);
+    prepare(used, folder, workers);
 }
 
-void MakingReady::prepareDocuments(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
-                                   Workers const& workers) {
+std::vector<PreparedDocument> prepareDocuments(std::vector<FoundDocument> const& found,
+                                               Workers const& workers) {
+    std::vector<PreparedDocument> documents;
+    runJobs(
+        found.size(), workers, [&](std::size_t index) { return pack(prepared(found[index])); },
+        [&](std::size_t index, JobResult result) {
+            auto const* const failure = std::get_if<JobFailure>(&result);
+            documents.push_back(failure ? unusable(Production::DOCUMENT_DAMAGED, found[index].file,
+                                                   inWords(*failure, workers.limits))
+                                        : unpack(std::get<std::string>(std::move(result))));
+        });
+    return documents;
+}
+
+void MakingReady::takeDocuments(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
+                                Workers const& workers) {
     std::vector<std::string> ids;
+    std::vector<FoundDocument> found;
     for (std::string const& id : idsIn(presets)) {
         try {
-            files_[id] = fs::absolute(folder.find(id));
+            found.push_back(folder.find(id));
             ids.push_back(id);
         } catch (Base::Error const& unknown) {
             documents_[id].error = unknown.what();
         }
     }
-    runJobs(
-        ids.size(), workers, [&](std::size_t index) { return pack(preparedFile(files_.at(ids[index]))); },
-        [&](std::size_t index, JobResult result) {
-            auto const* const failure = std::get_if<JobFailure>(&result);
-            documents_[ids[index]] = failure ? unusable(Production::DOCUMENT_DAMAGED, files_.at(ids[index]),
-                                                        inWords(*failure, workers.limits))
-                                             : unpack(std::get<std::string>(std::move(result)));
-        });
+    std::vector<PreparedDocument> documents = prepareDocuments(found, workers);
+    for (std::size_t i = 0; i < ids.size(); ++i) {
+        used_[ids[i]] = {ids[i], found[i].file, documents[i].sha256, found[i].isOfService()};
+        documents_[ids[i]] = std::move(documents[i]);
+    }
 }
 
 void MakingReady::makeAttachments(std::vector<Cfg::PackPreset> const& presets, Workers const& workers) {
@@ -222,7 +236,7 @@ void MakingReady::makeAttachments(std::vector<Cfg::PackPreset> const& presets, W
         for (std::size_t i = 0; i < preset.attachments().size(); ++i) {
             std::string const& id = preset.attachments()[i].id;
             attachments.made[i].id = id;
-            attachments.made[i].document = files_.contains(id) ? files_.at(id).filename().string() : id;
+            attachments.made[i].document = used_.contains(id) ? used_.at(id).file.filename().string() : id;
             PreparedDocument const& document = documents_.at(id);
             Production::Maker& maker = makerFor(preset);
             jobs.push_back(
@@ -274,7 +288,7 @@ std::vector<UsedDocument> MakingReady::usedDocuments() const {
     std::vector<UsedDocument> used;
     for (auto const& [id, document] : documents_)
         if (document.error.empty())
-            used.push_back({id, files_.at(id), document.sha256});
+            used.push_back(used_.at(id));
     return used;
 }
 

@@ -21,9 +21,10 @@ class PresetIndex;
 /// A document that was used, as a plan records it.
 struct UsedDocument {
     std::string id;
-    /// Absolute.
+    /// As FoundDocument has it.
     std::filesystem::path file;
     std::string sha256;
+    bool isOfService = false;
 };
 
 /// An attachment of a pack preset with what is laid on it.
@@ -33,6 +34,10 @@ struct MadeAttachment {
     std::string document;
     std::vector<PageBlob> pages;
 };
+
+/// Takes documents apart as Production::prepare() does, in worker processes: they may be hostile.
+std::vector<Production::PreparedDocument> prepareDocuments(std::vector<FoundDocument> const& found,
+                                                           Workers const& workers);
 
 /// Used before the workers of a batch are started, which work on with what was prepared, each for itself.
 class MakingReady {
@@ -46,9 +51,9 @@ public:
     void prepare(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
                  Workers const& workers);
 
-    /// The same for the pack presets by which documents of these names are sent; `folder` may be empty.
-    void prepareFor(std::vector<std::string> const& files, Cfg::Presets const& presets,
-                    std::filesystem::path const& folder, Workers const& workers);
+    /// The same for the pack presets by which documents of these names are sent.
+    void prepareFor(std::vector<std::string> const& files, Cfg::Presets const& presets, DocumentFolder folder,
+                    Workers const& workers);
 
     /// Why no letter of the pack preset can go out: a code and one line; empty when letters can.
     std::string whyNot(Cfg::PackPreset const& preset, std::vector<Production::PageSize> const& pages);
@@ -69,14 +74,14 @@ private:
         std::vector<MadeAttachment> made;
     };
 
-    void prepareDocuments(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
-                          Workers const& workers);
+    void takeDocuments(std::vector<Cfg::PackPreset> const& presets, DocumentFolder const& folder,
+                       Workers const& workers);
     void makeAttachments(std::vector<Cfg::PackPreset> const& presets, Workers const& workers);
 
     Colours colours_;
     Production::PreparedDocuments documents_;
-    /// Of the documents, by id.
-    std::map<std::string, std::filesystem::path> files_;
+    /// Of those documents that were found, by id.
+    std::map<std::string, UsedDocument> used_;
     /// By the pack preset's name.
     std::map<std::string, Attachments> attachments_;
     std::map<std::string, std::unique_ptr<Production::Maker>> makers_;

@@ -84,6 +84,7 @@ NodeSettings NodeSettings::resolved(Protocol::SettingsAnswer const& answer, std:
     for (auto const& [name, part] : answer.parts)
         parts.set(name, Protocol::PartSettings(part.toObject()).values);
     NodeSettings settings = resolved(std::move(parts), std::move(place));
+    settings.answer_ = answer.serialize();
     settings.sourced_ = Policy::SourcedSettings(answer);
     return settings;
 }

@@ -39,6 +39,8 @@ public:
     Policy::SourcedSettings const& sourced() const { return sourced_; }
     /// Empty for settings that are not from a file.
     std::filesystem::path const& file() const { return file_; }
+    /// The service's answer that they are; the empty handle for others.
+    json::Value const& answer() const { return answer_; }
     /// Where they come from, as messages say it.
     std::string const& place() const { return place_; }
     /// Of the file as it was read; empty for the defaults. Computed at each call: few want it, and the first
@@ -51,6 +53,7 @@ private:
     std::string place_ = "the settings";
     bool sorted_ = true;
     json::Object parts_;
+    json::Value answer_;
     Policy::SourcedSettings sourced_;
 };
 

@@ -29,6 +29,8 @@ constexpr char const* USED_DOCUMENTS_KEY = "used_documents";
 constexpr char const* ID_KEY = "id";
 constexpr char const* FILE_KEY = "file";
 constexpr char const* SHA256_KEY = "sha256";
+constexpr char const* SERVICE_KEY = "service";
+constexpr char const* PLACE_KEY = "place";
 
 std::string textOf(json::Object const& object) {
     std::ostringstream text;
@@ -55,6 +57,8 @@ json::Array toJson(std::vector<UsedDocument> const& documents) {
     for (UsedDocument const& used : documents) {
         json::Object object = fileToJson(used.file, used.sha256);
         object.set(ID_KEY, used.id);
+        if (used.isOfService)
+            object.set(SERVICE_KEY, true);
         array.append(object);
     }
     return array;
@@ -66,7 +70,7 @@ std::vector<UsedDocument> usedDocumentsIn(json::Value const& array) {
         for (json::Value const& value : array.toArray()) {
             json::Object const& object = value.toObject();
             documents.push_back({object.get(ID_KEY).toString(), object.get(FILE_KEY).toString(),
-                                 object.get(SHA256_KEY).toString()});
+                                 object.get(SHA256_KEY).toString(), object.get(SERVICE_KEY).isTrue()});
         }
     return documents;
 }
@@ -91,7 +95,8 @@ std::string changeOf(fs::path const& file, std::string const& digest) {
 
 } // namespace
 
-Plan::Plan(NodeSettings const& settings, std::vector<UsedDocument> used) : usedDocuments_(std::move(used)) {
+Plan::Plan(NodeSettings const& settings, std::vector<UsedDocument> used)
+    : answer_(settings.answer()), place_(settings.place()), usedDocuments_(std::move(used)) {
     if (settings.file().empty())
         return;
     settingsFile_ = fs::absolute(settings.file());
@@ -107,10 +112,8 @@ Plan Plan::fromFile(fs::path const& file) {
         if (object.get(DIGEST_KEY).textOrEmpty() != digestOf(object))
             throw Base::Error("it was changed since it was made");
         Plan plan;
-        if (json::Value const settings = object.get(SETTINGS_KEY); settings.isObject()) {
-            plan.settingsFile_ = settings.toObject().get(FILE_KEY).toString();
-            plan.settingsSha256_ = settings.toObject().get(SHA256_KEY).toString();
-        }
+        if (json::Value const settings = object.get(SETTINGS_KEY); settings.isObject())
+            plan.readSettings(settings.toObject());
         plan.usedDocuments_ = usedDocumentsIn(object.get(USED_DOCUMENTS_KEY));
         for (json::Value const& value : object.get(DOCUMENTS_KEY).toArray()) {
             json::Object const& document = value.toObject();
@@ -124,6 +127,21 @@ Plan Plan::fromFile(fs::path const& file) {
     }
 }
 
+void Plan::readSettings(json::Object const& settings) {
+    answer_ = settings.get(SERVICE_KEY);
+    place_ = settings.get(PLACE_KEY).textOrEmpty();
+    if (answer_)
+        return;
+    settingsFile_ = settings.get(FILE_KEY).toString();
+    settingsSha256_ = settings.get(SHA256_KEY).toString();
+}
+
+json::Value Plan::settingsToJson() const {
+    if (answer_)
+        return json::Object{{SERVICE_KEY, answer_}, {PLACE_KEY, place_}};
+    return settingsFile_.empty() ? json::Value(json_null()) : fileToJson(settingsFile_, settingsSha256_);
+}
+
 std::string Plan::toText(json::Object const& outcome) const {
     json::Array documents;
     for (DecidedDocument const& document : documents_) {
@@ -133,8 +151,7 @@ std::string Plan::toText(json::Object const& outcome) const {
         documents.append(object);
     }
     json::Object plan{{VERSION_KEY, PLAN_VERSION},
-                      {SETTINGS_KEY, settingsFile_.empty() ? json::Value(json_null())
-                                                           : fileToJson(settingsFile_, settingsSha256_)},
+                      {SETTINGS_KEY, settingsToJson()},
                       {DOCUMENTS_KEY, documents},
                       {OUTCOME_KEY, outcome}};
     if (!usedDocuments_.empty())
@@ -153,7 +170,8 @@ void Plan::requireUnchanged() const {
     if (!settingsFile_.empty())
         check(settingsFile_, settingsSha256_);
     for (UsedDocument const& used : usedDocuments_)
-        check(used.file, used.sha256);
+        if (!used.isOfService)
+            check(used.file, used.sha256);
     for (DecidedDocument const& document : documents_) {
         if (!document.reading.failed())
             check(document.file, document.sha256);
@@ -163,10 +181,33 @@ void Plan::requireUnchanged() const {
 }
 
 NodeSettings Plan::settings() const {
+    if (answer_)
+        return NodeSettings::resolved(Protocol::SettingsAnswer(answer_.toObject()), place_);
     return settingsFile_.empty() ? NodeSettings() : NodeSettings::fromFile(settingsFile_);
 }
 
-void Plan::prepare(MakingReady& making, Cfg::Presets const& presets, Workers const& workers) const {
+bool Plan::usesService() const {
+    return std::any_of(usedDocuments_.begin(), usedDocuments_.end(),
+                       [](UsedDocument const& used) { return used.isOfService; });
+}
+
+DocumentFolder Plan::usedDocuments(Fetch const& fetch) const {
+    DocumentFolder folder;
+    for (UsedDocument const& used : usedDocuments_) {
+        try {
+            folder.fix(used.id,
+                       {used.file, used.isOfService ? std::make_shared<std::string const>(fetch(used.sha256))
+                                                    : nullptr});
+        } catch (Base::Error const& gone) {
+            throw Base::Error("cannot carry out the plan: \"" + used.file.string() + "\": " + gone.what() +
+                              "; make it again with vlmail plan");
+        }
+    }
+    return folder;
+}
+
+void Plan::prepare(MakingReady& making, Cfg::Presets const& presets, Workers const& workers,
+                   Fetch const& fetch) const {
     std::set<std::string> names;
     for (DecidedDocument const& document : documents_)
         names.insert(document.reading.packPreset);
@@ -174,10 +215,7 @@ void Plan::prepare(MakingReady& making, Cfg::Presets const& presets, Workers con
     for (std::string const& name : names)
         if (Cfg::PackPreset const* const preset = packPresetNamed(name, presets))
             used.push_back(*preset);
-    DocumentFolder folder;
-    for (UsedDocument const& document : usedDocuments_)
-        folder.fix(document.id, document.file);
-    making.prepare(used, folder, workers);
+    making.prepare(used, usedDocuments(fetch), workers);
     for (UsedDocument const& document : making.usedDocuments())
         requireSame(document, usedDocuments_);
 }

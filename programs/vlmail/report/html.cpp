@@ -1,8 +1,7 @@
 #include "programs/vlmail/report/html.h"
 
+#include "programs/base/base64.h"
 #include "programs/base/plain_text.h"
-
-#include <openssl/evp.h>
 
 #include <charconv>
 #include <cmath>
@@ -52,13 +51,6 @@ std::string percent(double part, double whole) {
     return std::string(digits, end.ptr) + '%';
 }
 
-std::string pngUri(std::string_view png) {
-    std::string base64((png.size() + 2) / 3 * 4 + 1, '\0');
-    int const length =
-        EVP_EncodeBlock(reinterpret_cast<unsigned char*>(base64.data()),
-                        reinterpret_cast<unsigned char const*>(png.data()), static_cast<int>(png.size()));
-    base64.resize(static_cast<std::size_t>(length));
-    return "data:image/png;base64," + base64;
-}
+std::string pngUri(std::string_view png) { return "data:image/png;base64," + Base::toBase64(png); }
 
 } // namespace VlMail::Report

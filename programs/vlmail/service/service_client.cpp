@@ -7,7 +7,6 @@
 #include "programs/protocol/failure.h"
 #include "programs/vlmail/service/service_search.h"
 #include "vlservice/cfg/app.h"
-#include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/upload_queued.h"
 
@@ -102,21 +101,10 @@ void requireNoError(std::string const& error) {
         throw Base::Error(error);
 }
 
-json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query) {
-    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
-}
-
-json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query) {
-    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
-}
-
-json::Object ask(Channel::Client& service, Protocol::JobsChange const& change) {
-    return requireAnswer(service.call<Ipc::CSConfigIdsList>(change.serialize())->resp());
-}
-
 fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
     std::string const& app = Cfg::App::PART_NAME;
-    json::Object const values = Protocol::SettingsAnswer(ask(service, {nodeId, {app}})).part(app).values;
+    json::Object const values =
+        Protocol::SettingsAnswer(ask(service, Protocol::SettingsQuery(nodeId, {app}))).part(app).values;
     fs::path const folder = values.get("db_host").textOrEmpty();
     std::string const name = values.get("db_name").textOrEmpty();
     if (!name.empty() && Base::safeFileName(name) != name)

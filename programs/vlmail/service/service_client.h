@@ -5,6 +5,7 @@
 #include "programs/protocol/job.h"
 #include "programs/protocol/settings.h"
 #include "programs/vlmail/service/service_address.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/json/json.h"
 
 #include <filesystem>
@@ -43,9 +44,10 @@ json::Object const& requireAnswer(json::Object const& answer);
 void requireNoError(std::string const& error);
 /// Asks a question and gives the answer as it came, in the form of the type that belongs to the question.
 /// Throws Error with the service's line.
-json::Object ask(Channel::Client& service, Protocol::SettingsQuery const& query);
-json::Object ask(Channel::Client& service, Protocol::JobsQuery const& query);
-json::Object ask(Channel::Client& service, Protocol::JobsChange const& change);
+template<typename Query>
+json::Object ask(Channel::Client& service, Query const& query) {
+    return requireAnswer(service.call<Ipc::CSConfigIdsList>(query.serialize())->resp());
+}
 
 /// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
 /// otherwise "packs.db" in dataFolder(). Throws Error when the name is not that of a file.

@@ -59,6 +59,9 @@ public:
     /// Removes the presets of all nodes that expire and that nobody has used for long.
     void removeUnusedPresets();
 
+    /// Throws Error while changes are held back.
+    void requireChangeable() const;
+
     ServiceSettings service() const;
     /// An upload folder gets a mark, and its identity goes on record with it.
     void changeService(json::Object const& changes);
@@ -70,7 +73,6 @@ public:
 
 private:
     static Policy::Moment localClock();
-    void requireChangeable() const;
     bool holdsChangesBack() const;
 
     SettingsStore& store_;

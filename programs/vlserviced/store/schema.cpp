@@ -68,11 +68,43 @@ ALTER TABLE jobs ADD COLUMN trial INTEGER NOT NULL DEFAULT 0;
 CREATE INDEX jobs_by_due ON jobs (due, pack) WHERE state = 'held' AND due IS NOT NULL;
 )sql";
 
+/// A document is a name at a node and a content, which is kept once however many there are of it, in pieces,
+/// and goes with the last of them. One without a digest is still on its way.
+constexpr char const* SCHEMA_5 = R"sql(
+CREATE TABLE document_contents (
+    number INTEGER NOT NULL PRIMARY KEY,
+    sha256 TEXT UNIQUE,
+    bytes  INTEGER NOT NULL
+);
+CREATE TABLE document_pieces (
+    content INTEGER NOT NULL REFERENCES document_contents (number) ON DELETE CASCADE,
+    place   INTEGER NOT NULL,
+    data    BLOB NOT NULL,
+    PRIMARY KEY (content, place)
+);
+CREATE TABLE documents (
+    node    TEXT NOT NULL REFERENCES nodes (id) ON DELETE CASCADE,
+    name    TEXT NOT NULL,
+    content INTEGER NOT NULL REFERENCES document_contents (number),
+    put_at  INTEGER NOT NULL,
+    PRIMARY KEY (node, name)
+) WITHOUT ROWID;
+CREATE INDEX documents_by_content ON documents (content);
+CREATE TRIGGER document_removed AFTER DELETE ON documents
+WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
+    DELETE FROM document_contents WHERE number = old.content;
+END;
+CREATE TRIGGER document_replaced AFTER UPDATE OF content ON documents
+WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
+    DELETE FROM document_contents WHERE number = old.content;
+END;
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
     static Database::DatabaseKind const kind{
-        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4}};
+        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, SCHEMA_5}};
     return kind;
 }
 

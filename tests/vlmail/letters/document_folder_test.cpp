@@ -1,6 +1,7 @@
 #include "programs/vlmail/letters/document_folder.h"
 
 #include "programs/base/error.h"
+#include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 
 #include <gmock/gmock.h>
@@ -21,7 +22,7 @@ protected:
     void write(std::string const& name) const { std::ofstream(root_ / name) << name; }
     std::string found(std::string const& id) const {
         try {
-            return DocumentFolder(root_).find(id).lexically_relative(root_).string();
+            return DocumentFolder(root_).find(id).file.lexically_relative(root_).string();
         } catch (Base::Error const& failure) {
             return failure.what();
         }
@@ -73,10 +74,38 @@ TEST_F(DocumentFolderTest, TakesDocumentsOfTheBatchFirstAndThoseThatAreFixedBefo
     DocumentFolder folder(root_);
     folder.add("/batch/blue.txt");
     folder.add("/later/blue.txt");
-    EXPECT_EQ(folder.find("blue"), "/batch/blue.txt");
-    EXPECT_EQ(folder.find("blue.pdf"), root_ / "blue.pdf");
-    folder.fix("blue", "/fixed/green.pdf");
-    EXPECT_EQ(folder.find("blue"), "/fixed/green.pdf");
+    EXPECT_EQ(folder.find("blue").file, "/batch/blue.txt");
+    EXPECT_EQ(folder.find("blue.pdf").file, root_ / "blue.pdf");
+    folder.fix("blue", {"/fixed/green.pdf"});
+    EXPECT_EQ(folder.find("blue").file, "/fixed/green.pdf");
+}
+
+TEST_F(DocumentFolderTest, LooksElsewhereForWhatLiesNeitherInTheBatchNorInTheFolder) {
+    write("blue.pdf");
+    std::vector<std::string> asked;
+    VlMail::DocumentsElsewhere const elsewhere{
+        [&](std::string const& id) {
+            asked.push_back(id);
+            return id == "red" ? std::optional<FoundDocument>(
+                                     {"service:a=acme/red.pdf", std::make_shared<std::string const>("%PDF-")})
+                               : std::nullopt;
+        },
+        " at a=acme in the service; put it there"};
+    DocumentFolder folder(root_);
+    folder.orElse(elsewhere);
+    EXPECT_FALSE(folder.find("blue").isOfService());
+    EXPECT_EQ(folder.find("red").file, "service:a=acme/red.pdf");
+    EXPECT_EQ(*folder.find("red").bytes, "%PDF-");
+    EXPECT_EQ(failureOf([&] { folder.find("gone"); }),
+              "document-unknown: there is no document \"gone\" in \"" + root_.string() +
+                  "\" or at a=acme in the service; put it there");
+    DocumentFolder none;
+    none.orElse(elsewhere);
+    EXPECT_EQ(failureOf([&] { none.find("gone"); }),
+              "document-unknown: there is no document \"gone\" at a=acme in the service; put it there");
+    EXPECT_EQ(failureOf([&] { none.find("../up"); }),
+              "document-unknown: \"../up\" cannot be the name of a document; correct the pack preset");
+    EXPECT_THAT(asked, testing::ElementsAre("red", "red", "gone", "gone"));
 }
 
 TEST_F(DocumentFolderTest, KnowsNoUnsafeNames) {
