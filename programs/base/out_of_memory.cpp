@@ -1,5 +1,6 @@
 #include "programs/base/out_of_memory.h"
 
+#include "programs/base/library_memory.h"
 #include "programs/base/pending_file.h"
 
 #include <cstdlib>
@@ -11,16 +12,10 @@
 namespace Base {
 namespace {
 
-/// Enough to tell of a failure and to clean up behind it.
-constexpr std::size_t ENOUGH_TO_GO_ON = std::size_t{1} << 16;
-
 char const* lastLine = "there is not enough memory\n";
 
-void endUnlessThereIsSome() {
-    void* const probe = std::malloc(ENOUGH_TO_GO_ON);
-    if (!probe)
-        endOutOfMemory();
-    std::free(probe);
+void endOrThrow() {
+    endUnlessThereIsSome();
     throw std::bad_alloc();
 }
 
@@ -28,7 +23,15 @@ void endUnlessThereIsSome() {
 
 void endWhenOutOfMemory(char const* line) noexcept {
     lastLine = line;
-    std::set_new_handler(endUnlessThereIsSome);
+    std::set_new_handler(endOrThrow);
+    holdLibraryMemory({&std::malloc, &std::realloc});
+}
+
+void endUnlessThereIsSome() noexcept {
+    void* const probe = std::malloc(ENOUGH_TO_GO_ON);
+    if (!probe)
+        endOutOfMemory();
+    std::free(probe);
 }
 
 void endOutOfMemory() noexcept {

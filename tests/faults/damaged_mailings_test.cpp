@@ -29,7 +29,7 @@ protected:
     }
 
     Ended run(std::vector<std::string> const& arguments) {
-        return Faults::runWith({}, VLMAIL_PROGRAM, arguments, folder_);
+        return Faults::runWith({}, VLMAIL_PROGRAM, arguments, {folder_});
     }
     static std::string contentOf(fs::path const& file) {
         std::ifstream in(file, std::ios::binary);

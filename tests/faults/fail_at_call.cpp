@@ -4,7 +4,10 @@
 //     FAULT        CLASS:ERROR:NUMBER, such as write:28:3; the error 0 kills; a "+" behind it fails all
 //                  later ones too. The class "durable" is all that make something durable or visible.
 //     FAULT_CALLS  a file of 8 bytes, where the calls of the class are counted
+//     FAULT_SERVER a socket, at which runs are asked for that begin at main(); see serve_forks.cpp
 // Syncing does nothing else: a process that is killed leaves what it wrote to the system.
+
+#include "tests/faults/serve_forks.h"
 
 #include <atomic>
 #include <cerrno>
@@ -102,10 +105,13 @@ Function original(Function /* for its type */, char const* name) {
 using Main = int (*)(int, char**, char**);
 Main programMain;
 
-int countingMain(int argc, char** argv, char** environment) {
+int countingMain(int argc, char** argv, char** /* may grow */) {
+    Arguments arguments{argc, argv};
+    if (int const socket = serverSocket(); socket >= 0)
+        arguments = serveForks(socket, argv[0]);
     readFault();
     isCounting = true;
-    int const status = programMain(argc, argv, environment);
+    int const status = programMain(arguments.count, arguments.words, environ);
     isCounting = false;
     return status;
 }

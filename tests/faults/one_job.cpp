@@ -1,5 +1,6 @@
 #include "tests/faults/one_job.h"
 
+#include "tests/faults/fork_server.h"
 #include "tests/faults/process.h"
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
@@ -22,14 +23,16 @@ using Clock = std::chrono::steady_clock;
 constexpr char const* DATABASE = "packs.db";
 constexpr char const* PACK = "p1";
 
-/// "" when the service does not know it.
-std::string stateOfJob(Channel::Client& client) {
+/// Empty when the service does not know it.
+json::Object jobIn(Channel::Client& client) {
     json::Object const answer = client.call<Ipc::CSConfigIdsList>(json::Object{{"query", "jobs"}})->resp();
     for (json::Value const& job : answer.get("jobs").toArray())
         if (job.toObject().get("id").textOrEmpty() == PACK)
-            return job.toObject().get("state").textOrEmpty();
-    return "";
+            return job.toObject();
+    return {};
 }
+
+std::string stateOfJob(Channel::Client& client) { return jobIn(client).get("state").textOrEmpty(); }
 
 /// Asks until the job is handed over or the time is up.
 bool isSubmitted(Channel::Client& client, std::chrono::seconds limit) {
@@ -38,6 +41,34 @@ bool isSubmitted(Channel::Client& client, std::chrono::seconds limit) {
             return true;
     return false;
 }
+
+/// Asks until the job is handed over or something is in its way, or the time is up.
+void awaitStandstill(Channel::Client& client, std::chrono::seconds limit) {
+    for (auto const end = Clock::now() + limit; Clock::now() < end;)
+        if (json::Object const job = jobIn(client);
+            job.get("state").textOrEmpty() == "submitted" || !job.get("problem").textOrEmpty().empty())
+            return;
+}
+
+/// Begins the service without linking it again.
+class Forked : public ServiceProcess::Starter {
+public:
+    explicit Forked(fs::path folder) : folder_(std::move(folder)) {}
+
+    pid_t start(std::vector<std::string> const& arguments, ServiceProcess::Environment const& more, int out,
+                int err) override {
+        process_ = server_.start({folder_, more, arguments, out, err});
+        return process_;
+    }
+    int wait() override {
+        return awaitEndOrKill(server_, process_, std::chrono::minutes(2)).value_or(SIGKILL);
+    }
+
+private:
+    ForkServer& server_ = ForkServer::of(VLSERVICED_PROGRAM);
+    fs::path folder_;
+    pid_t process_ = -1;
+};
 
 /// Made once: storing it takes its time.
 fs::path packDatabase() {
@@ -77,7 +108,8 @@ void OneJob::prepare() {
 }
 
 void OneJob::runWith(Fault const& fault) {
-    ServiceProcess service(arguments(), environmentOf(fault, counter_));
+    Forked forked(folder_);
+    ServiceProcess service(arguments(), environmentOf(fault, counter_), &forked);
     if (service.port() != 0) {
         send(service);
         service.signal(SIGTERM);
@@ -97,8 +129,8 @@ void OneJob::send(ServiceProcess const& service) {
         client->call<Ipc::ProcessPack>(folder_.string(), DATABASE, PACK);
         acknowledged_.insert(PACK);
         client->call<Ipc::UploadQueued>(folder_.string(), DATABASE);
-        // What failed once may be waited for; the next start has to bring it to its end.
-        isSubmitted(*client, std::chrono::seconds(2));
+        // What failed is tried again later; the next start has to bring it to its end.
+        awaitStandstill(*client, std::chrono::seconds(2));
     } catch (std::exception const&) {
         // It was killed, or has told its failure: nothing is acknowledged then.
     }
@@ -126,7 +158,8 @@ void OneJob::takeMailings() {
 }
 
 void OneJob::finish() {
-    ServiceProcess service(arguments());
+    Forked forked(folder_);
+    ServiceProcess service(arguments(), {}, &forked);
     if (service.port() == 0) {
         service.wait();
         return find("the service does not start again: " + service.errors());

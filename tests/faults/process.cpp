@@ -1,14 +1,17 @@
 #include "tests/faults/process.h"
 
+#include "tests/faults/fork_server.h"
+#include "tests/faults/patience.h"
+
 #include <algorithm>
 #include <cerrno>
 #include <csignal>
-#include <cstdlib>
-#include <fstream>
-#include <iterator>
+#include <optional>
+#include <system_error>
+#include <utility>
 
-#include <fcntl.h>
-#include <sys/wait.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace Faults {
@@ -16,79 +19,74 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// Of the clock, which goes on while a busy machine does other things.
-constexpr int LATE_SECONDS = 120;
+/// A file without a name, which a program writes to as to any other.
+class Output {
+public:
+    Output() : file_(::memfd_create("output", MFD_CLOEXEC)) {
+        if (file_ < 0)
+            throw std::system_error(errno, std::generic_category(), "no file for output");
+    }
+    ~Output() { ::close(file_); }
+    Output(Output const&) = delete;
+    Output& operator=(Output const&) = delete;
 
-/// Children's ends are waited for and must not get lost meanwhile; `how` is SIG_BLOCK or SIG_UNBLOCK.
-void holdChildSignals(int how) {
-    sigset_t child;
-    sigemptyset(&child);
-    sigaddset(&child, SIGCHLD);
-    ::sigprocmask(how, &child, nullptr);
-}
+    int file() const { return file_; }
+    std::string content() const {
+        struct stat status {};
+        ::fstat(file_, &status);
+        std::string text(static_cast<std::size_t>(status.st_size), '\0');
+        text.resize(
+            static_cast<std::size_t>(std::max(ssize_t(0), ::pread(file_, text.data(), text.size(), 0))));
+        return text;
+    }
 
-std::string contentOf(fs::path const& file) {
-    std::ifstream in(file, std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), {}};
-}
+private:
+    int file_;
+};
 
-void writeInto(fs::path const& file, int descriptor) {
-    int const opened = ::open(file.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    ::dup2(opened, descriptor);
-    ::close(opened);
-}
-
-[[noreturn]] void become(fs::path const& program, std::vector<std::string> arguments, fs::path const& folder,
-                         std::map<std::string, std::string> const& environment) {
-    holdChildSignals(SIG_UNBLOCK);
-    // What is late is killed with all that has come of it.
-    ::setpgid(0, 0);
-    writeInto(folder.string() + ".out", STDOUT_FILENO);
-    writeInto(folder.string() + ".err", STDERR_FILENO);
-    for (auto const& [name, value] : environment)
-        ::setenv(name.c_str(), value.c_str(), 1);
-    arguments.insert(arguments.begin(), program.string());
-    std::vector<char*> pointers;
-    for (std::string& argument : arguments)
-        pointers.push_back(argument.data());
-    pointers.push_back(nullptr);
-    if (::chdir(folder.c_str()) == 0)
-        ::execv(program.c_str(), pointers.data());
-    ::_exit(127);
-}
-
-/// False when the time is up.
-bool awaitEnd(pid_t process, int& status) {
-    sigset_t child;
-    sigemptyset(&child);
-    sigaddset(&child, SIGCHLD);
-    timespec const limit{LATE_SECONDS, 0};
-    while (::waitpid(process, &status, WNOHANG) == 0)
-        if (::sigtimedwait(&child, nullptr, &limit) < 0 && errno == EAGAIN)
-            return false;
-    return true;
+/// Nothing when it is late.
+std::optional<int> awaitEnd(ForkServer& server, std::chrono::milliseconds limit) {
+    using Clock = std::chrono::steady_clock;
+    Patience patience(limit);
+    std::chrono::milliseconds const look = std::min(limit, std::chrono::milliseconds(1000));
+    auto before = Clock::now();
+    for (std::chrono::nanoseconds starvedBefore{0}; !patience.isOver();) {
+        if (auto const waited = server.awaitEnd(look))
+            return waited;
+        auto const now = Clock::now();
+        auto const starved = starvedTimeOf(::getpid());
+        patience.pass(now - std::exchange(before, now), starved - std::exchange(starvedBefore, starved));
+    }
+    return std::nullopt;
 }
 
 } // namespace
 
-Ended runWith(Fault const& fault, fs::path const& program, std::vector<std::string> arguments,
-              fs::path const& folder) {
-    fs::path const counter = folder.string() + ".calls";
-    auto const environment = environmentOf(fault, counter);
-    holdChildSignals(SIG_BLOCK);
-    pid_t const process = ::fork();
-    if (process == 0)
-        become(program, std::move(arguments), folder, environment);
-    Ended ended;
-    int status = 0;
-    ended.isLate = !awaitEnd(process, status);
-    // Workers that outlive a killed program go with it.
+std::optional<int> awaitEndOrKill(ForkServer& server, pid_t process, std::chrono::milliseconds limit) {
+    std::optional<int> const waited = awaitEnd(server, limit);
+    // Workers may outlive a program that was killed.
     ::kill(-process, SIGKILL);
-    if (ended.isLate)
-        ::waitpid(process, &status, 0);
-    ended.status = WIFSIGNALED(status) ? -WTERMSIG(status) : WEXITSTATUS(status);
-    ended.out = contentOf(folder.string() + ".out");
-    ended.err = contentOf(folder.string() + ".err");
+    if (!waited)
+        server.awaitKilled();
+    return waited;
+}
+
+Ended runWith(Fault const& fault, fs::path const& program, std::vector<std::string> arguments,
+              Place const& place, std::chrono::milliseconds limit) {
+    fs::path const counter = place.folder.string() + ".calls";
+    auto environment = environmentOf(fault, counter);
+    environment.insert(place.environment.begin(), place.environment.end());
+    Output const out;
+    Output const err;
+    ForkServer& server = ForkServer::of(program);
+    pid_t const process =
+        server.start({place.folder, std::move(environment), std::move(arguments), out.file(), err.file()});
+    std::optional<int> const waited = awaitEndOrKill(server, process, limit);
+    Ended ended;
+    ended.isLate = !waited;
+    ended.status = statusIn(waited.value_or(SIGKILL));
+    ended.out = out.content();
+    ended.err = err.content();
     ended.calls = callsIn(counter);
     return ended;
 }

@@ -54,7 +54,7 @@ bool mayShowLess(Fault const& fault, Ended const& ended) {
 
 std::string verifiedAs(fs::path const& mailing) {
     Ended const ended =
-        runWith({}, VLMAIL_PROGRAM, {"pack", "verify", mailing.filename()}, mailing.parent_path());
+        runWith({}, VLMAIL_PROGRAM, {"pack", "verify", mailing.filename()}, {mailing.parent_path()});
     return withoutIds(ended.out + ended.err);
 }
 
@@ -89,7 +89,7 @@ Ended Scenario::runOnce(Fault const& fault) {
     fs::create_directory(folder_);
     command_.prepare(folder_);
     before_ = files();
-    Ended ended = runWith(fault, VLMAIL_PROGRAM, command_.arguments, folder_);
+    Ended ended = runWith(fault, VLMAIL_PROGRAM, command_.arguments, {folder_});
     ended.out = withoutIds(ended.out);
     return ended;
 }

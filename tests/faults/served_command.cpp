@@ -31,8 +31,6 @@ std::vector<std::string> const ServedCommand::NAMES{SET, SEND};
 ServedCommand::ServedCommand(std::string name) : name_(std::move(name)) {
     std::filesystem::create_directory(folder_);
     std::ofstream(folder_ / "letter.txt") << "Dear Mr Smith,\nhello.\n";
-    // Where the client keeps mailings until the service has them.
-    ::setenv("XDG_DATA_HOME", (root_ / "home").c_str(), 1);
 }
 
 long ServedCommand::callsOf(std::string const& call) { return runOnce({call, 1, 0, false}).calls; }
@@ -49,7 +47,8 @@ Ended ServedCommand::vlmail(std::vector<std::string> arguments, Fault const& fau
     for (std::string const& more : {std::string("--service"), "127.0.0.1:" + std::to_string(service_.port()),
                                     std::string("--token"), (data_ / "token").string()})
         arguments.push_back(more);
-    return runWith(fault, VLMAIL_PROGRAM, arguments, folder_);
+    // Where the client keeps mailings until the service has them.
+    return runWith(fault, VLMAIL_PROGRAM, arguments, {folder_, {{"XDG_DATA_HOME", root_ / "home"}}});
 }
 
 Ended ServedCommand::runOnce(Fault const& fault) {
@@ -88,7 +87,7 @@ void ServedCommand::checkMailing(Ended const& ended) {
     for (std::string const& id : after)
         if (!before_.contains(id) &&
             !isSaid(runWith({}, VLMAIL_PROGRAM,
-                            {"pack", "verify", (data_ / "outbox" / (id + ".mailing")).string()}, folder_)
+                            {"pack", "verify", (data_ / "outbox" / (id + ".mailing")).string()}, {folder_})
                         .out,
                     "all whole"))
             find("sends the mailing " + id + ", which is not whole");

@@ -22,9 +22,9 @@ fs::path newFile() {
 }
 
 [[noreturn]] void become(std::vector<std::string> arguments, ServiceProcess::Environment const& more,
-                         int output, fs::path const& errors) {
+                         int output, int errors) {
     ::dup2(output, STDOUT_FILENO);
-    ::dup2(::open(errors.c_str(), O_WRONLY | O_CLOEXEC), STDERR_FILENO);
+    ::dup2(errors, STDERR_FILENO);
     for (auto const& [name, value] : more)
         ::setenv(name.c_str(), value.c_str(), 1);
     arguments.insert(arguments.begin(), VLSERVICED_PROGRAM);
@@ -45,14 +45,16 @@ std::string lineFrom(int file) {
 
 } // namespace
 
-ServiceProcess::ServiceProcess(std::vector<std::string> arguments, Environment const& more)
-    : errors_(newFile()) {
+ServiceProcess::ServiceProcess(std::vector<std::string> arguments, Environment const& more, Starter* starter)
+    : starter_(starter), errors_(newFile()) {
     int ends[2];
     if (::pipe2(ends, O_CLOEXEC) != 0)
         throw std::runtime_error("no pipe");
-    process_ = ::fork();
+    int const errors = ::open(errors_.c_str(), O_WRONLY | O_CLOEXEC);
+    process_ = starter_ ? starter_->start(arguments, more, ends[1], errors) : ::fork();
     if (process_ == 0)
-        become(std::move(arguments), more, ends[1], errors_);
+        become(std::move(arguments), more, ends[1], errors);
+    ::close(errors);
     ::close(ends[1]);
     firstLine_ = lineFrom(ends[0]);
     ::close(ends[0]);
@@ -78,9 +80,15 @@ void ServiceProcess::signal(int number) const {
         ::kill(process_, number);
 }
 
+bool ServiceProcess::awaitEnd(int& status) const {
+    if (process_ > 0 && starter_)
+        status = starter_->wait();
+    return process_ > 0 && (starter_ || ::waitpid(process_, &status, 0) == process_);
+}
+
 int ServiceProcess::wait() {
     int status = 0;
-    if (process_ > 0 && ::waitpid(process_, &status, 0) == process_) {
+    if (awaitEnd(status)) {
         process_ = -1;
         status_ = WIFSIGNALED(status) ? -WTERMSIG(status) : WEXITSTATUS(status);
     }

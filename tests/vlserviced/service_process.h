@@ -15,8 +15,19 @@ class ServiceProcess {
 public:
     using Environment = std::map<std::string, std::string>;
 
-    /// Starts the program and waits for its first line, or for its end.
-    ServiceProcess(std::vector<std::string> arguments, Environment const& more = {});
+    /// Another way to begin the program than from a file, as a child of another process.
+    class Starter {
+    public:
+        virtual ~Starter() = default;
+        virtual pid_t start(std::vector<std::string> const& arguments, Environment const& more, int out,
+                            int err) = 0;
+        /// What waitpid() says of it in the end.
+        virtual int wait() = 0;
+    };
+
+    /// Starts the program and waits for its first line, or for its end. `starter` lives longer.
+    ServiceProcess(std::vector<std::string> arguments, Environment const& more = {},
+                   Starter* starter = nullptr);
     /// Kills it if it still runs.
     ~ServiceProcess();
     ServiceProcess(ServiceProcess const&) = delete;
@@ -34,6 +45,10 @@ public:
     std::string errors() const;
 
 private:
+    /// Waits for the end; false when there is none to wait for.
+    bool awaitEnd(int& status) const;
+
+    Starter* starter_;
     pid_t process_ = -1;
     int status_ = 0;
     std::filesystem::path errors_;

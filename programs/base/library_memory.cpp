@@ -1,0 +1,47 @@
+#include "programs/base/library_memory.h"
+
+#include "programs/base/out_of_memory.h"
+
+#include <jansson.h>
+#include <unicode/uclean.h>
+
+#include <cstdlib>
+
+namespace Base {
+namespace {
+
+MemorySource source;
+
+/// Large pieces are texts that grow, which the libraries look after.
+template<typename Ask>
+void* smallOnesForCertain(std::size_t size, Ask ask) {
+    void* const block = ask();
+    if (block || size > ENOUGH_TO_GO_ON)
+        return block;
+    endUnlessThereIsSome();
+    void* const again = ask();
+    if (!again)
+        endOutOfMemory();
+    return again;
+}
+
+void* allocate(std::size_t size) {
+    return smallOnesForCertain(size, [size] { return source.allocate(size); });
+}
+
+void* U_CALLCONV allocateForUnicode(void const* /*context*/, std::size_t size) { return allocate(size); }
+void* U_CALLCONV reallocateForUnicode(void const* /*context*/, void* block, std::size_t size) {
+    return smallOnesForCertain(size, [=] { return source.reallocate(block, size); });
+}
+void U_CALLCONV releaseOfUnicode(void const* /*context*/, void* block) { std::free(block); }
+
+} // namespace
+
+void holdLibraryMemory(MemorySource from) noexcept {
+    source = from;
+    UErrorCode status = U_ZERO_ERROR;
+    u_setMemoryFunctions(nullptr, &allocateForUnicode, &reallocateForUnicode, &releaseOfUnicode, &status);
+    json_set_alloc_funcs(&allocate, &std::free);
+}
+
+} // namespace Base
