@@ -1,6 +1,8 @@
 // Bytes from the other side of a connection, in pieces of a size that the first byte tells: they are refused,
-// or cut into messages that are written as the same bytes, however they were cut.
+// or cut into messages that are written as the same bytes, however they were cut. The texts of data are
+// refused or written as the same text.
 #include "programs/base/error.h"
+#include "programs/channel/data_message.h"
 #include "programs/channel/frame.h"
 #include "programs/channel/message_text.h"
 
@@ -17,10 +19,21 @@ struct Outcome {
     bool isRefused = false;
 };
 
+void requireSameData(std::string_view text) {
+    try {
+        if (Channel::printData(Channel::parseData(text)) != text)
+            std::abort();
+    } catch (Base::Error const&) {
+        // No data.
+    }
+}
+
 void take(Channel::FrameDecoder& decoder, Outcome& outcome) {
     while (auto const frame = decoder.next()) {
         Channel::appendFrame(outcome.rewritten, *frame);
         Channel::reasonOf(frame->text);
+        if (frame->kind == Channel::Kind::Data)
+            requireSameData(frame->text);
         ++outcome.messages;
     }
 }

@@ -5,6 +5,7 @@
 
 #include <boost/asio/io_context.hpp>
 
+#include <exception>
 #include <optional>
 
 namespace Channel {
@@ -20,6 +21,26 @@ public:
 
     std::shared_ptr<Ipc::CmdProcessorI> processor() const { return connection_; }
     bool isOpen() const { return connection_->isOpen(); }
+    bool takesData() const { return connection_->takesData(); }
+    void sendData(DataSource const& source) {
+        // What the source throws ends the connection as a line; it is more than that.
+        std::exception_ptr thrown;
+        auto const guarded = [&]() -> std::optional<std::string> {
+            try {
+                return source();
+            } catch (...) {
+                thrown = std::current_exception();
+                throw;
+            }
+        };
+        try {
+            wait([&](ClientConnection::Done done) { connection_->submitData(guarded, std::move(done)); });
+        } catch (Base::Error const&) {
+            if (thrown)
+                std::rethrow_exception(thrown);
+            throw;
+        }
+    }
     void send(std::shared_ptr<Ipc::CmdI> const& cmd) {
         wait([&](ClientConnection::Done done) {
             connection_->submit(cmd, std::move(done));
@@ -49,6 +70,8 @@ Client::~Client() = default;
 
 std::shared_ptr<Ipc::CmdProcessorI> Client::processor() const { return impl_->processor(); }
 bool Client::isOpen() const { return impl_->isOpen(); }
+bool Client::takesData() const { return impl_->takesData(); }
+void Client::sendData(DataSource const& source) { impl_->sendData(source); }
 void Client::send(std::shared_ptr<Ipc::CmdI> const& cmd) { impl_->send(cmd); }
 
 } // namespace Channel

@@ -4,7 +4,10 @@
 #include "programs/channel/client_settings.h"
 #include "vlservice/platform/cmd.h"
 
+#include <functional>
 #include <memory>
+#include <optional>
+#include <string>
 #include <utility>
 
 namespace Channel {
@@ -30,6 +33,15 @@ public:
         send(cmd);
         return cmd;
     }
+
+    /// Gives the text of the next data message; nothing when there is no more.
+    using DataSource = std::function<std::optional<std::string>()>;
+
+    /// Whether the service takes data on this connection.
+    bool takesData() const;
+    /// Sends data messages, as many at once as may be under way, and returns when the service has stored all
+    /// of them. Throws Error, and what the source throws, which ends the connection.
+    void sendData(DataSource const& source);
 
     /// Whether it can be used further: a failure that leaves it open is one that the service has answered
     /// with.

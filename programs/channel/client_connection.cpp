@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/host_port.h"
+#include "programs/channel/data_message.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/pin_store.h"
 #include "programs/channel/token.h"
@@ -26,6 +27,10 @@ std::string inSeconds(std::chrono::milliseconds time) {
     if (milliseconds != 0)
         text += '.' + std::to_string(1000 + milliseconds).substr(1);
     return text + " s";
+}
+
+std::uint32_t nextSequence(std::uint32_t sequence) {
+    return sequence == std::numeric_limits<std::uint32_t>::max() ? FIRST_COMMAND : sequence + 1;
 }
 
 Deadline::Clock::time_point dueAfter(std::chrono::milliseconds time) {
@@ -158,6 +163,7 @@ void ClientConnection::onGreeting(Frame const& message) {
         return write(step.reply->frame(),
                      [this] { receive([this](Frame const& next) { onGreeting(next); }); });
     case GreetingStep::Verdict::Welcome:
+        takesData_ = step.takesData;
         return onWelcome(step.seals);
     case GreetingStep::Verdict::Refused:
         return fail(step.reason);
@@ -213,6 +219,16 @@ void ClientConnection::submit(std::shared_ptr<Ipc::CmdI> cmd, Done done) {
     pump();
 }
 
+void ClientConnection::submitData(Client::DataSource source, Done done) {
+    auto const time = settings_.requestTime(Ipc::Timeouts::TIMEOUT_ID_2);
+    Request request{nullptr, std::move(done), time, dueAfter(time), std::move(source)};
+    if (state_ == State::Closed)
+        return failRequest(request, failure_);
+    deadline_->setNoLaterThan(request.due);
+    requests_.push_back(std::move(request));
+    pump();
+}
+
 void ClientConnection::sendNext() {
     isHeld_ = false;
     pump();
@@ -226,6 +242,8 @@ void ClientConnection::pump() {
 void ClientConnection::begin() {
     isBusy_ = true;
     isSent_ = false;
+    if (requests_.front().source)
+        return orFail([&] { beginData(); });
     auto const cmd = requests_.front().cmd;
     try {
         cmd->sendReq();
@@ -284,8 +302,8 @@ void ClientConnection::endRequest(std::string const& failure) {
     Request request = std::move(requests_.front());
     requests_.pop_front();
     taken_ = nullptr;
-    sequence_ = sequence_ == std::numeric_limits<std::uint32_t>::max() ? FIRST_COMMAND : sequence_ + 1;
-    isHeld_ = !request.cmd->sendNextReqAfterDone();
+    sequence_ = nextSequence(sequence_);
+    isHeld_ = request.cmd && !request.cmd->sendNextReqAfterDone();
     // Still busy, so that what the functions submit waits for its turn.
     if (!failure.empty())
         failRequest(request, failure);
@@ -295,7 +313,8 @@ void ClientConnection::endRequest(std::string const& failure) {
 }
 
 void ClientConnection::failRequest(Request& request, std::string const& reason) {
-    request.cmd->onTransferError(reason);
+    if (request.cmd)
+        request.cmd->onTransferError(reason);
     if (request.done)
         request.done(reason);
 }
@@ -316,6 +335,79 @@ void ClientConnection::onDue() {
     deadline_->setNoLaterThan(next);
     for (Request& request : late)
         failRequest(request, "Its turn did not come within " + inSeconds(request.time) + '.');
+}
+
+// --- data
+
+void ClientConnection::beginData() {
+    if (!takesData_)
+        return endRequest("The service takes no data on this connection.");
+    upload_.emplace();
+    pumpData();
+}
+
+/// Goes on as far as it can; the next word of the service's, or the end of a message, brings it here again.
+void ClientConnection::pumpData() {
+    DataUnderWay& upload = *upload_;
+    if (upload.isWriting)
+        return;
+    if (!upload.isAtEnd && upload.refusal.empty() && upload.bytes + MAX_DATA_TEXT <= DATA_WINDOW) {
+        if (auto const text = requests_.front().source())
+            return sendPiece(*text);
+        upload.isAtEnd = true;
+    }
+    if (upload.refusal.empty() && !(upload.isAtEnd && upload.messages.empty()))
+        return;
+    std::string const refusal = upload.refusal;
+    upload_.reset();
+    endRequest(refusal);
+    pump();
+}
+
+void ClientConnection::sendPiece(std::string const& text) {
+    DataUnderWay& upload = *upload_;
+    upload.messages.emplace_back(sequence_, text.size());
+    upload.bytes += text.size();
+    upload.isWriting = true;
+    write({PACK_DATA, Kind::Data, sequence_, text}, [this] {
+        upload_->isWriting = false;
+        pumpData();
+    });
+    sequence_ = nextSequence(sequence_);
+    if (!upload.isReceiving)
+        awaitStored();
+}
+
+void ClientConnection::awaitStored() {
+    Request& request = requests_.front();
+    request.due = dueAfter(request.time);
+    deadline_->setNoLaterThan(request.due);
+    upload_->isReceiving = true;
+    receive([this](Frame const& message) {
+        upload_->isReceiving = false;
+        onStored(message);
+        pumpData();
+        if (upload_ && !upload_->isReceiving && !upload_->messages.empty() && upload_->refusal.empty())
+            awaitStored();
+    });
+}
+
+void ClientConnection::onStored(Frame const& message) {
+    DataUnderWay& upload = *upload_;
+    auto const last = std::find_if(upload.messages.begin(), upload.messages.end(),
+                                   [&](auto const& piece) { return piece.first == message.sequence; });
+    bool const isOfData = message.command == PACK_DATA && last != upload.messages.end();
+    if (isOfData && message.kind == Kind::Stored) {
+        for (auto piece = upload.messages.begin(); piece != last + 1; ++piece)
+            upload.bytes -= piece->second;
+        upload.messages.erase(upload.messages.begin(), last + 1);
+    } else if (message.kind != Kind::Error) {
+        throw Base::Error("It answers what was not asked.");
+    } else if (isOfData) {
+        upload.refusal = "The service refuses: " + reasonOf(message.text);
+    } else {
+        throw Base::Error("It closes the connection: " + reasonOf(message.text));
+    }
 }
 
 // --- the connection
@@ -367,6 +459,7 @@ void ClientConnection::end(std::string const& reason) {
         link_->close();
     link_.reset();
     taken_ = nullptr;
+    upload_.reset();
     auto const requests = std::exchange(requests_, {});
     if (auto const connected = std::exchange(connected_, nullptr))
         connected(failure_);

@@ -7,13 +7,27 @@
 #include "programs/channel/greeting.h"
 #include "programs/channel/link.h"
 
+#include <cstddef>
+#include <cstdint>
 #include <deque>
 #include <functional>
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace Channel {
+
+/// Data that a client is sending.
+struct DataUnderWay {
+    /// Numbers and sizes of the messages that are not stored yet.
+    std::deque<std::pair<std::uint32_t, std::size_t>> messages = {};
+    std::size_t bytes = 0;
+    bool isWriting = false;
+    bool isReceiving = false;
+    bool isAtEnd = false;
+    std::string refusal = {};
+};
 
 /// The processor and the carrier of its commands. Everything happens on the thread that runs the io_context.
 /// Requests go out in the order of their submission, each when the one before has been answered. Each has its
@@ -34,6 +48,11 @@ public:
     void submit(std::shared_ptr<Ipc::CmdI> cmd) override { submit(std::move(cmd), {}); }
     /// A failure is told to the command's onTransferError first.
     void submit(std::shared_ptr<Ipc::CmdI> cmd, Done done);
+    /// Sends data when its turn comes, in the queue of the commands. It has its time from each word of the
+    /// service's to the next.
+    void submitData(Client::DataSource source, Done done);
+    /// Whether the service takes data; known when connected.
+    bool takesData() const { return takesData_; }
     /// Goes on after a command that did not want the next request to be sent.
     void sendNext();
     /// What is waiting fails.
@@ -50,11 +69,13 @@ public:
 private:
     enum class State { New, Connecting, Ready, Closed };
 
+    /// A command, or data.
     struct Request {
         std::shared_ptr<Ipc::CmdI> cmd;
         Done done;
         std::chrono::milliseconds time;
         Deadline::Clock::time_point due;
+        Client::DataSource source = {};
     };
 
     ClientConnection(boost::asio::io_context& io, ClientSettings settings);
@@ -79,6 +100,13 @@ private:
     void takeAnswer(Frame const& message);
     void endRequest(std::string const& failure);
     void onDue();
+
+    // Data.
+    void beginData();
+    void pumpData();
+    void sendPiece(std::string const& text);
+    void awaitStored();
+    void onStored(Frame const& message);
 
     void write(Frame const& message, std::function<void()> gone);
     /// Hands on the next message; whatever else happens is the end.
@@ -114,6 +142,8 @@ private:
     bool isHeld_ = false;
     std::uint32_t sequence_ = 0;
     std::function<void(json::Object const&)> taken_;
+    bool takesData_ = false;
+    std::optional<DataUnderWay> upload_;
 };
 
 } // namespace Channel

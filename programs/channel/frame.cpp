@@ -1,6 +1,8 @@
 #include "programs/channel/frame.h"
 
 #include "programs/base/error.h"
+#include "programs/channel/data_message.h"
+#include "programs/channel/network_order.h"
 #include "programs/channel/proof.h"
 
 #include <algorithm>
@@ -13,20 +15,6 @@ constexpr std::size_t PIECE = 8 * 1024;
 /// An idle connection keeps no more memory than this.
 constexpr std::size_t KEPT = 64 * 1024;
 
-template<typename Number>
-void appendNumber(std::string& bytes, Number number) {
-    for (int shift = 8 * (static_cast<int>(sizeof number) - 1); shift >= 0; shift -= 8)
-        bytes += static_cast<char>(number >> shift & 0xff);
-}
-
-template<typename Number>
-Number numberAt(std::string_view bytes, std::size_t offset) {
-    Number number = 0;
-    for (char const byte : bytes.substr(offset, sizeof number))
-        number = static_cast<Number>(number << 8 | static_cast<unsigned char>(byte));
-    return number;
-}
-
 // Offsets in the header.
 constexpr std::size_t COMMAND_AT = 0;
 constexpr std::size_t KIND_AT = 1;
@@ -38,8 +26,20 @@ constexpr std::size_t LENGTH_AT = 6;
                       std::to_string(limit) + ".");
 }
 
-bool isKind(std::uint8_t kind) {
-    return kind >= static_cast<std::uint8_t>(Kind::Request) && kind <= static_cast<std::uint8_t>(Kind::Error);
+bool isKind(std::uint8_t kind, std::uint16_t version) {
+    Kind const last = version == VERSION_1 ? Kind::Error : Kind::Stored;
+    return kind >= static_cast<std::uint8_t>(Kind::Request) && kind <= static_cast<std::uint8_t>(last);
+}
+
+std::uint32_t limitOf(Kind kind, std::uint32_t limit) {
+    switch (kind) {
+    case Kind::Data:
+        return std::min<std::uint32_t>(limit, MAX_DATA_TEXT);
+    case Kind::Stored:
+        return 0;
+    default:
+        return limit;
+    }
 }
 
 } // namespace
@@ -101,11 +101,12 @@ std::size_t FrameDecoder::announced() const {
     if (version_ == 0 || unread().size() < HEADER_SIZE)
         return 0;
     auto const kind = numberAt<std::uint8_t>(unread(), KIND_AT);
-    if (!isKind(kind))
+    if (!isKind(kind, version_))
         throw Base::Error("There is no message of kind " + std::to_string(kind) + ".");
     auto const length = numberAt<std::uint32_t>(unread(), LENGTH_AT);
-    if (length > limit_)
-        refuseLength(length, limit_);
+    std::uint32_t const limit = limitOf(static_cast<Kind>(kind), limit_);
+    if (length > limit)
+        refuseLength(length, limit);
     return HEADER_SIZE + length + (seal_ ? Seal::SIZE : 0);
 }
 

@@ -8,7 +8,8 @@
 //
 // A seal of 32 bytes stands behind each message of version 2 on a connection without TLS, once the greeting
 // is over; else there is none. Numbers are in network order. Command 0 is the greeting. A response or an
-// error has its request's command and sequence number; an error's text is an object with the key "err".
+// error has its request's command and sequence number; an error's text is an object with the key "err". Data
+// and what says that it is stored are of version 2 alone, and their texts are no JSON.
 
 #include "programs/channel/seal.h"
 
@@ -29,7 +30,15 @@ constexpr std::size_t HEADER_SIZE = 10;
 constexpr std::uint32_t MAX_TEXT = 16 * 1024 * 1024;
 constexpr std::uint8_t GREETING = 0;
 
-enum class Kind : std::uint8_t { Request = 1, Response = 2, Error = 3 };
+enum class Kind : std::uint8_t {
+    Request = 1,
+    Response = 2,
+    Error = 3,
+    /// A piece of a page, as data_message.h tells.
+    Data = 4,
+    /// The data up to that sequence number is stored; without a text.
+    Stored = 5,
+};
 
 struct Frame {
     std::uint8_t command = 0;

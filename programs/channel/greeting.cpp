@@ -76,8 +76,10 @@ GreetingStep ServiceGreeting::checkProof(Frame const& message) {
     std::string const expected = makeProof(Side::Client, terms_, clientNonce_, nonce_);
     if (!isSameProof(textUnder(PROOF, message, PROVING), expected))
         return refusal("Its access token is not the one of this service.");
+    bool const tells = takesData_ == TakesData::Yes && terms_.version > VERSION_1;
+    json::Object const welcome = tells ? json::Object{{TAKES_DATA, true}} : json::Object();
     return {Verdict::Welcome,
-            GreetingStep::Reply{Kind::Response, PROVING, "{}"},
+            GreetingStep::Reply{Kind::Response, PROVING, print(welcome)},
             {},
             sealsFor(terms_, clientNonce_, nonce_)};
 }
@@ -95,8 +97,7 @@ GreetingStep ClientGreeting::take(Frame const& message) {
         case State::Challenge:
             return prove(message);
         case State::Proof:
-            answerIn(message, PROVING);
-            return {Verdict::Welcome, std::nullopt, {}, sealsFor(terms_, nonce_, serviceNonce_)};
+            return welcomed(message);
         case State::Over:
             break;
         }
@@ -104,6 +105,15 @@ GreetingStep ClientGreeting::take(Frame const& message) {
         return refusal(e.what());
     }
     return refusal("The greeting is over.");
+}
+
+GreetingStep ClientGreeting::welcomed(Frame const& message) const {
+    bool const takesData = json_is_true(answerIn(message, PROVING).get(TAKES_DATA).node());
+    return {Verdict::Welcome,
+            std::nullopt,
+            {},
+            sealsFor(terms_, nonce_, serviceNonce_),
+            takesData && terms_.version > VERSION_1};
 }
 
 GreetingStep ClientGreeting::prove(Frame const& message) {

@@ -6,6 +6,8 @@
 //     client:  {"proof"}              request 1
 //     service: {}                     response 1, or an error
 //
+// In version 2 a service that takes data says {"data": true} in the end.
+//
 // Each side is a machine without a socket or a clock: messages go in, messages and a verdict come out.
 
 #include "programs/channel/frame.h"
@@ -21,6 +23,7 @@ namespace Channel {
 
 constexpr char const* NONCE = "nonce";
 constexpr char const* PROOF = "proof";
+constexpr char const* TAKES_DATA = "data";
 
 constexpr std::uint32_t CHALLENGE = 0;
 constexpr std::uint32_t PROVING = 1;
@@ -48,13 +51,18 @@ struct GreetingStep {
     std::string reason;
     /// With a welcome in version 2 without TLS: what seals all that follows.
     std::optional<SealKeys> seals = std::nullopt;
+    /// With a welcome: whether the service takes data.
+    bool takesData = false;
 };
+
+enum class TakesData { No, Yes };
 
 /// The side that lets in.
 class ServiceGreeting {
 public:
     /// The nonce is new for each connection.
-    ServiceGreeting(Terms terms, std::string nonce) : terms_(std::move(terms)), nonce_(std::move(nonce)) {}
+    ServiceGreeting(Terms terms, std::string nonce, TakesData takesData = TakesData::No)
+        : terms_(std::move(terms)), nonce_(std::move(nonce)), takesData_(takesData) {}
 
     /// Takes the client's next message. After a welcome or a refusal everything is refused.
     GreetingStep take(Frame const& message);
@@ -67,6 +75,7 @@ private:
 
     Terms terms_;
     std::string nonce_;
+    TakesData takesData_;
     std::string clientNonce_;
     State state_ = State::Challenge;
 };
@@ -86,6 +95,7 @@ private:
     enum class State { Challenge, Proof, Over };
 
     GreetingStep prove(Frame const& message);
+    GreetingStep welcomed(Frame const& message) const;
 
     Terms terms_;
     std::string nonce_;

@@ -1,6 +1,7 @@
 #include "programs/channel/peer.h"
 
 #include "programs/base/error.h"
+#include "programs/channel/data_message.h"
 #include "programs/channel/message_text.h"
 #include "programs/channel/token.h"
 
@@ -10,6 +11,7 @@
 #include <boost/asio/dispatch.hpp>
 #include <boost/asio/error.hpp>
 #include <boost/asio/io_context.hpp>
+#include <boost/asio/post.hpp>
 
 #include <array>
 #include <atomic>
@@ -58,6 +60,40 @@ private:
     std::atomic<bool> isEnded_ = false;
 };
 
+class DataStored::State {
+public:
+    State(asio::io_context& io, std::weak_ptr<PeerContext> context, std::weak_ptr<Peer> peer,
+          std::uint32_t sequence, std::size_t size, std::uint32_t round, std::size_t reserved)
+        : io_(io), context_(std::move(context)), peer_(std::move(peer)), sequence_(sequence), size_(size),
+          round_(round), reserved_(reserved) {}
+    ~State() { end("The service has lost it."); }
+
+    void end(std::optional<std::string> failure) {
+        if (isEnded_.exchange(true) || context_.expired())
+            return;
+        asio::dispatch(io_, [context = context_, peer = peer_, sequence = sequence_, size = size_,
+                             round = round_, reserved = reserved_, failure = std::move(failure)] {
+            if (auto const told = peer.lock())
+                told->dataStored(sequence, size, round, failure);
+            if (auto const shared = context.lock())
+                shared->release(reserved);
+        });
+    }
+
+private:
+    asio::io_context& io_;
+    std::weak_ptr<PeerContext> context_;
+    std::weak_ptr<Peer> peer_;
+    std::uint32_t sequence_;
+    std::size_t size_;
+    std::uint32_t round_;
+    std::size_t reserved_;
+    std::atomic<bool> isEnded_ = false;
+};
+
+void DataStored::operator()() const { state_->end(std::nullopt); }
+void DataStored::fail(std::string const& reason) const { state_->end(reason); }
+
 void Answer::operator()() const { state_->end(std::nullopt); }
 void Answer::fail(std::string const& reason) const { state_->end(reason); }
 
@@ -69,6 +105,10 @@ std::shared_ptr<Peer> Peer::make(asio::io_context& io, std::shared_ptr<PeerConte
     peer->deadline_.emplace(io, [weak = std::weak_ptr(peer)] {
         if (auto const self = weak.lock())
             self->onDue();
+    });
+    peer->writeDeadline_.emplace(io, [weak = std::weak_ptr(peer)] {
+        if (auto const self = weak.lock())
+            self->giveUp("It does not take its answer.");
     });
     return peer;
 }
@@ -184,6 +224,8 @@ void Peer::onReserved(std::size_t size) {
     if (state_ == State::Closed)
         return context_->release(size);
     reserved_ = size;
+    if (data_)
+        return takeData();
     link_->allow(size);
     receive();
 }
@@ -205,7 +247,7 @@ void Peer::onMessage(Frame const& message) {
 void Peer::onGreeting(Frame const& message) {
     if (!greeting_) {
         link_->speak(link_->heardVersion());
-        greeting_.emplace(terms(), makeNonce());
+        greeting_.emplace(terms(), makeNonce(), context_->dataHandler() ? TakesData::Yes : TakesData::No);
     }
     GreetingStep const step = greeting_->take(message);
     switch (step.verdict) {
@@ -239,8 +281,12 @@ void Peer::onWelcome(std::optional<SealKeys> const& seals) {
 void Peer::onRequest(Frame const& message) {
     isInsideMessage_ = false;
     deadline_->clear();
+    if (message.kind == Kind::Data)
+        return onData(message);
     if (message.kind != Kind::Request)
         return refuse("Only requests are expected here.");
+    ++round_;
+    passesDataOver_ = false;
     request_ = Request{message, {}};
     try {
         takeRequest(message.command);
@@ -325,22 +371,106 @@ void Peer::endRequest() {
         receive();
 }
 
+// --- data
+
+void Peer::onData(Frame const& message) {
+    if (!context_->dataHandler() || message.command != PACK_DATA)
+        return refuse("This service takes no such data.");
+    data_ = Data{message.sequence, std::string(message.text)};
+    // A small piece, too, counts until it is stored: there may be many of them.
+    if (reserved_ > 0)
+        takeData();
+    else
+        context_->reserve(HEADER_SIZE + message.text.size(), shared_from_this());
+}
+
+void Peer::takeData() {
+    auto [sequence, text] = *std::exchange(data_, std::nullopt);
+    std::size_t const size = text.size();
+    unstored_ += size;
+    DataStored const stored(std::make_shared<DataStored::State>(io_, context_, weak_from_this(), sequence,
+                                                                size, round_, std::exchange(reserved_, 0)));
+    link_->allow(Link::SMALL);
+    if (unstored_ > DATA_WINDOW)
+        return refuse("It sends more data at once than it may.");
+    try {
+        parseData(text);
+    } catch (Base::Error const& malformed) {
+        return refuse(malformed.what());
+    }
+    if (!passesDataOver_)
+        handOver(std::move(text), stored);
+    // Behind what others want.
+    asio::post(io_, [self = shared_from_this()] {
+        if (self->state_ == State::Ready)
+            self->receive();
+    });
+}
+
+void Peer::handOver(std::string text, DataStored const& stored) {
+    try {
+        context_->dataHandler()({shared_from_this(), std::move(text)}, stored);
+    } catch (std::exception const& e) {
+        stored.fail(e.what());
+    }
+}
+
+void Peer::dataStored(std::uint32_t sequence, std::size_t size, std::uint32_t round,
+                      std::optional<std::string> const& failure) {
+    unstored_ -= size;
+    if (state_ != State::Ready || round != round_ || passesDataOver_)
+        return;
+    orGiveUp([&] {
+        if (!failure)
+            return tellStored(sequence);
+        log(FAILED, "Its data is refused: " + *failure);
+        passesDataOver_ = true;
+        write({PACK_DATA, Kind::Error, sequence, printError(*failure)}, [] {});
+    });
+}
+
+void Peer::tellStored(std::uint32_t sequence) {
+    // One word for all that it has not been told yet.
+    if (!outgoing_.empty() && outgoing_.back().kind == Kind::Stored)
+        outgoing_.back().sequence = sequence;
+    else
+        write({PACK_DATA, Kind::Stored, sequence, {}}, [] {});
+}
+
 // --- writing
 
 void Peer::write(Frame const& message, std::function<void()> gone) {
+    if (!isWriting_ && outgoing_.empty())
+        return writeNow(message, std::move(gone));
+    outgoing_.push_back(
+        {message.command, message.kind, message.sequence, std::string(message.text), std::move(gone)});
+    writeWaiting();
+}
+
+void Peer::writeWaiting() {
+    if (outgoing_.empty() || isWriting_ || state_ == State::Closed)
+        return;
+    Outgoing const next = std::move(outgoing_.front());
+    outgoing_.pop_front();
+    writeNow({next.command, next.kind, next.sequence, next.text}, next.gone);
+}
+
+void Peer::writeNow(Frame const& message, std::function<void()> gone) {
     // Greeting and leaving have a time as a whole.
     if (state_ == State::Ready)
-        setDeadline(context_->settings().messageTime, "It does not take its answer.");
+        writeDeadline_->set(context_->settings().messageTime);
     link_->send(message, [self = shared_from_this(), gone = std::move(gone)](error_code const& ec) {
         if (self->state_ == State::Closed)
             return;
         self->context_->holdAnswer(self, 0);
+        self->isWriting_ = false;
         if (ec)
             return self->giveUp(ec.message() + '.');
-        if (self->state_ == State::Ready)
-            self->deadline_->clear();
+        self->writeDeadline_->clear();
         self->orGiveUp(gone);
+        self->orGiveUp([&] { self->writeWaiting(); });
     });
+    isWriting_ = true;
     context_->holdAnswer(shared_from_this(), link_->sending());
 }
 
@@ -376,6 +506,7 @@ void Peer::close() {
     // The command holds this object as its processor.
     request_.reset();
     deadline_.reset();
+    writeDeadline_.reset();
     socket_.reset();
     if (link_)
         link_->close();

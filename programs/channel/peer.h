@@ -6,6 +6,9 @@
 #include "programs/channel/link.h"
 #include "programs/channel/server.h"
 
+#include <cstdint>
+#include <deque>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -25,9 +28,12 @@ public:
     virtual boost::asio::ssl::context* tls() = 0;
     virtual Server::Factory const& factory() const = 0;
     virtual Server::Handler const& handler() const = 0;
+    /// Empty where no data is taken.
+    virtual Server::DataHandler const& dataHandler() const = 0;
     virtual bool isStopping() const = 0;
 
-    /// Takes memory for a large request and calls the peer's onReserved, now or as soon as there is some.
+    /// Takes memory for a large request or for data and calls the peer's onReserved, now or as soon as there
+    /// is some.
     virtual void reserve(std::size_t size, std::shared_ptr<Peer> peer) = 0;
     virtual void release(std::size_t size) = 0;
     /// Counts an answer that is on its way, of a size or of none any more.
@@ -47,7 +53,7 @@ public:
                                       tcp::socket socket);
 
     void start();
-    /// A large request may go on.
+    /// A large request, or data, may go on.
     void onReserved(std::size_t size);
     /// Closes at once, or when the command that is being handled has been answered.
     void stop();
@@ -58,6 +64,10 @@ public:
     void giveUp(std::string const& reason);
     /// The handling has ended, with the reason when it failed.
     void answered(std::optional<std::string> const& failure);
+    /// What became of data that counts that many bytes. Failures of another round than the one at hand are
+    /// those of pieces that nobody waits for any more.
+    void dataStored(std::uint32_t sequence, std::size_t size, std::uint32_t round,
+                    std::optional<std::string> const& failure);
 
     // A service sends no requests of its own.
     void submit(std::shared_ptr<Ipc::CmdI> cmd) override;
@@ -78,6 +88,21 @@ private:
         bool isAnswered = false;
     };
 
+    /// A data message that waits for memory.
+    struct Data {
+        std::uint32_t sequence = 0;
+        std::string text;
+    };
+
+    /// A message that waits until the one in front of it is written.
+    struct Outgoing {
+        std::uint8_t command;
+        Kind kind;
+        std::uint32_t sequence;
+        std::string text;
+        std::function<void()> gone;
+    };
+
     Peer(boost::asio::io_context& io, std::shared_ptr<PeerContext> context, tcp::socket socket);
 
     void expectTls();
@@ -94,7 +119,14 @@ private:
     void onRequest(Frame const& message);
     void takeRequest(std::uint8_t command);
 
+    void onData(Frame const& message);
+    void takeData();
+    void handOver(std::string text, DataStored const& stored);
+    void tellStored(std::uint32_t sequence);
+
     void write(Frame const& message, std::function<void()> gone);
+    void writeNow(Frame const& message, std::function<void()> gone);
+    void writeWaiting();
     /// Runs a step; what it throws is the end of the connection.
     template<typename Step>
     void orGiveUp(Step step);
@@ -124,6 +156,16 @@ private:
     Ends ends_;
     std::optional<Request> request_;
     std::size_t reserved_ = 0;
+    std::optional<Data> data_;
+    /// Of data that is not stored yet.
+    std::size_t unstored_ = 0;
+    /// Grows with each request: what the data in front of it came to is over then.
+    std::uint32_t round_ = 0;
+    /// Whether data is passed over, since some of it was refused.
+    bool passesDataOver_ = false;
+    std::optional<Deadline> writeDeadline_;
+    bool isWriting_ = false;
+    std::deque<Outgoing> outgoing_;
 };
 
 } // namespace Channel

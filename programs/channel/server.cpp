@@ -70,9 +70,10 @@ tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint) {
 
 class Server::Impl : public PeerContext, public std::enable_shared_from_this<Impl> {
 public:
-    Impl(asio::io_context& io, ServerSettings settings, Factory factory, Handler handler)
-        : io_(io), settings_(std::move(settings)), factory_(std::move(factory)),
-          handler_(std::move(handler)) {
+    Impl(asio::io_context& io, ServerSettings settings, Factory factory, Handler handler,
+         DataHandler dataHandler)
+        : io_(io), settings_(std::move(settings)), factory_(std::move(factory)), handler_(std::move(handler)),
+          dataHandler_(std::move(dataHandler)) {
         tcp::endpoint const endpoint = endpointOf(settings_);
         if (settings_.token.size() < MIN_TOKEN_LENGTH)
             throw Base::Error("An access token has at least " + std::to_string(MIN_TOKEN_LENGTH) +
@@ -128,6 +129,7 @@ public:
     asio::ssl::context* tls() override { return tls_.get(); }
     Factory const& factory() const override { return factory_; }
     Handler const& handler() const override { return handler_; }
+    DataHandler const& dataHandler() const override { return dataHandler_; }
     bool isStopping() const override { return isStopping_; }
 
     void reserve(std::size_t size, std::shared_ptr<Peer> peer) override {
@@ -246,6 +248,7 @@ private:
     ServerSettings settings_;
     Factory factory_;
     Handler handler_;
+    DataHandler dataHandler_;
     std::unique_ptr<asio::ssl::context> tls_;
     std::string fingerprint_;
     std::uint16_t port_ = 0;
@@ -264,8 +267,10 @@ private:
     bool isStopping_ = false;
 };
 
-Server::Server(asio::io_context& io, ServerSettings settings, Factory factory, Handler handler)
-    : impl_(std::make_shared<Impl>(io, std::move(settings), std::move(factory), std::move(handler))) {
+Server::Server(asio::io_context& io, ServerSettings settings, Factory factory, Handler handler,
+               DataHandler dataHandler)
+    : impl_(std::make_shared<Impl>(io, std::move(settings), std::move(factory), std::move(handler),
+                                   std::move(dataHandler))) {
     impl_->accept();
 }
 

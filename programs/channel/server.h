@@ -34,6 +34,30 @@ private:
     std::shared_ptr<State> state_;
 };
 
+/// Tells the client that a piece of a page is stored; copies are the same word. May be called from any
+/// thread, once. Until then the piece counts towards the memory that all may have. A word that goes without a
+/// call is a failure.
+class DataStored {
+public:
+    class State;
+    explicit DataStored(std::shared_ptr<State> state) : state_(std::move(state)) {}
+
+    void operator()() const;
+    /// What the client sends of data is passed over from here to its next request.
+    void fail(std::string const& reason) const;
+
+private:
+    std::shared_ptr<State> state_;
+};
+
+/// A piece of a page as it came.
+struct ReceivedData {
+    /// The connection, as the commands that come on it have it for their processor.
+    std::shared_ptr<Ipc::CmdProcessorI> connection;
+    /// Which parseData() takes.
+    std::string text;
+};
+
 /// Everything happens on the thread that runs the io_context. A connection's next request is read when the
 /// one before has been answered, so that a connection is answered in order and costs one request's memory.
 class Server {
@@ -45,8 +69,13 @@ public:
     /// Carries out a command whose request has been read. What it throws is answered as a failure.
     using Handler = std::function<void(std::shared_ptr<Ipc::CmdI> cmd, Answer answer)>;
 
-    /// Listens from now on. Raises the limit of open files as far as the system lets it. Throws Error.
-    Server(boost::asio::io_context& io, ServerSettings settings, Factory factory, Handler handler);
+    /// Takes a piece of a page, several of a connection at once. What it throws is answered as a failure.
+    using DataHandler = std::function<void(ReceivedData data, DataStored stored)>;
+
+    /// Listens from now on. Raises the limit of open files as far as the system lets it. Without a function
+    /// for data none is taken. Throws Error.
+    Server(boost::asio::io_context& io, ServerSettings settings, Factory factory, Handler handler,
+           DataHandler dataHandler = {});
     /// Closes all connections at once.
     ~Server();
     Server(Server const&) = delete;

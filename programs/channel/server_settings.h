@@ -32,7 +32,7 @@ struct ServerSettings {
     std::chrono::milliseconds greetingTime = std::chrono::seconds(10);
     /// For the rest of a message whose first byte is there, and for a peer to take an answer.
     std::chrono::milliseconds messageTime = std::chrono::seconds(60);
-    /// For all large requests at once; further ones wait.
+    /// For all large requests and all data that is not stored yet; further ones wait.
     std::size_t requestMemory = 64 * 1024 * 1024;
     /// For all answers that their clients have not taken yet; when there are more, the oldest goes with its
     /// connection.

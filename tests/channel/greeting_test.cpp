@@ -67,6 +67,27 @@ TEST(Greetings, GiveBothSidesTheSameSealsInVersion2WithoutTls) {
         EXPECT_FALSE(greet(terms, terms).service.seals);
 }
 
+/// The service's last word.
+GreetingStep::Reply welcomeOf(Terms const& terms, TakesData takesData) {
+    ServiceGreeting service(terms, SERVICE_NONCE, takesData);
+    ClientGreeting client = makeClient(terms);
+    auto const proof = client.take(service.take(client.challenge().frame()).reply->frame()).reply;
+    return service.take(proof->frame()).reply.value();
+}
+
+TEST(Greetings, TellInVersion2WhetherTheServiceTakesData) {
+    EXPECT_EQ(welcomeOf(plainTerms(), TakesData::Yes).text, R"({"data":true})");
+    EXPECT_EQ(welcomeOf(plainTerms(), TakesData::No).text, "{}");
+    EXPECT_EQ(welcomeOf(plainTerms(VERSION_1), TakesData::Yes).text, "{}");
+    for (auto const& [text, takesData] :
+         {std::pair{R"({"data":true})", true}, {R"({"data":1})", false}, {R"({})", false}}) {
+        ClientGreeting client = makeClient();
+        ServiceGreeting service = makeService();
+        client.take(service.take(client.challenge().frame()).reply->frame());
+        EXPECT_EQ(client.take({GREETING, Kind::Response, PROVING, text}).takesData, takesData) << text;
+    }
+}
+
 /// That the client refuses the service, which learns nothing.
 void expectNoProof(Terms const& ofClient, Terms const& ofService, std::string const& reason) {
     Outcome const outcome = greet(ofClient, ofService);

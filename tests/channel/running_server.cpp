@@ -42,14 +42,15 @@ struct RunningServer::Running {
     std::thread thread;
 };
 
-RunningServer::RunningServer(Channel::ServerSettings settings, Channel::Server::Handler handler)
+RunningServer::RunningServer(Channel::ServerSettings settings, Channel::Server::Handler handler,
+                             Channel::Server::DataHandler dataHandler)
     : running_(std::make_unique<Running>()) {
     if (settings.token.empty())
         settings.token = TOKEN;
     if (!handler)
         handler = Channel::acceptAtOnce(std::make_shared<Echo>());
     running_->server = std::make_unique<Channel::Server>(running_->io, std::move(settings), Ipc::makeEmptyCmd,
-                                                         std::move(handler));
+                                                         std::move(handler), std::move(dataHandler));
     port_ = running_->server->port();
     running_->thread = std::thread([this] {
         auto const work = asio::make_work_guard(running_->io);
@@ -108,10 +109,17 @@ std::vector<std::string> SharedLog::lines() {
 
 bool SharedLog::hasLogged(std::string const& part) {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, PATIENCE, [&] {
-        return std::any_of(lines_.begin(), lines_.end(),
-                           [&](std::string const& line) { return line.find(part) != std::string::npos; });
-    });
+    return changed_.wait_for(lock, PATIENCE, [&] { return has(part); });
+}
+
+bool SharedLog::hasLoggedYet(std::string const& part) {
+    std::lock_guard const guard(mutex_);
+    return has(part);
+}
+
+bool SharedLog::has(std::string const& part) const {
+    return std::any_of(lines_.begin(), lines_.end(),
+                       [&](std::string const& line) { return line.find(part) != std::string::npos; });
 }
 
 // --- RawPeer
@@ -161,7 +169,7 @@ void RawPeer::takeSeals(std::string const& own, std::string const& other) {
 
 void RawPeer::finish() { socket_->socket.shutdown(asio::ip::tcp::socket::shutdown_send); }
 
-void RawPeer::welcome(std::uint16_t version) {
+void RawPeer::welcome(std::uint16_t version, std::string const& text) {
     auto const ends = Channel::endsOf(socket_->socket);
     Channel::Terms const terms{version, TOKEN, "", ends.other, ends.own};
     std::string const nonce = Channel::makeNonce();
@@ -172,7 +180,7 @@ void RawPeer::welcome(std::uint16_t version) {
     send(Channel::GREETING, Channel::Kind::Response, Channel::CHALLENGE,
          Channel::print({{Channel::NONCE, nonce}, {Channel::PROOF, proof}}));
     receive().value();
-    send(Channel::GREETING, Channel::Kind::Response, Channel::PROVING, "{}");
+    send(Channel::GREETING, Channel::Kind::Response, Channel::PROVING, text);
     if (version > Channel::VERSION_1)
         takeSeals(makeSealKey(Channel::Side::Service, terms, clientNonce, nonce),
                   makeSealKey(Channel::Side::Client, terms, clientNonce, nonce));
@@ -205,7 +213,7 @@ void RawPeer::greet(std::uint16_t version) {
     std::string const proof = Channel::makeProof(Channel::Side::Client, terms, nonce, serviceNonce);
     send(Channel::GREETING, Channel::Kind::Request, Channel::PROVING,
          Channel::print({{Channel::PROOF, proof}}));
-    if (receive().value().text != "{}")
+    if (receive().value().kind != Channel::Kind::Response)
         throw std::runtime_error("The service does not welcome its peer.");
     if (version > Channel::VERSION_1)
         takeSeals(makeSealKey(Channel::Side::Client, terms, nonce, serviceNonce),

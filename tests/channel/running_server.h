@@ -38,7 +38,8 @@ inline Channel::ServerSettings patient() {
 class RunningServer {
 public:
     explicit RunningServer(Channel::ServerSettings settings = patient(),
-                           Channel::Server::Handler handler = {});
+                           Channel::Server::Handler handler = {},
+                           Channel::Server::DataHandler dataHandler = {});
     ~RunningServer();
     RunningServer(RunningServer const&) = delete;
     RunningServer& operator=(RunningServer const&) = delete;
@@ -80,8 +81,11 @@ public:
     std::vector<std::string> lines();
     /// Waits, within a minute, for a line with that in it.
     bool hasLogged(std::string const& part);
+    bool hasLoggedYet(std::string const& part);
 
 private:
+    bool has(std::string const& part) const;
+
     std::mutex mutex_;
     std::condition_variable changed_;
     std::vector<std::string> lines_;
@@ -129,7 +133,7 @@ public:
     std::string sealed(std::string const& bytes);
     /// The preface and the exchange of proofs, as a client and as a service.
     void greet(std::uint16_t version = Channel::VERSION_1);
-    void welcome(std::uint16_t version = Channel::VERSION);
+    void welcome(std::uint16_t version = Channel::VERSION, std::string const& text = "{}");
     /// The next message; none when the other side has closed the connection.
     std::optional<Message> receive();
     /// The reason in the error message that comes next, and that the connection is closed behind it.
