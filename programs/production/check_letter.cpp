@@ -74,7 +74,15 @@ private:
     }
 
     void checkPlaces(Reader::Page const& page) {
-        PageInk ink(letter_.document, page.number);
+        std::optional<Reader::Document> printed = letter_.document.printed(page.number);
+        if (!printed)
+            return checkPlaces(page, PageInk(letter_.document, page.number));
+        Reader::Page asPrinted = printed->page(1);
+        asPrinted.number = page.number;
+        checkPlaces(asPrinted, PageInk(*printed, 1));
+    }
+
+    void checkPlaces(Reader::Page const& page, PageInk ink) {
         PlacedAddress const* const address = letter_.address;
         PageOnPaper const paper{page, ink, page.number == letter_.pages.front(),
                                 address && address->page == page.number ? address : nullptr};

@@ -35,7 +35,10 @@ bool isColoured(Reader::Picture const& picture) {
 bool hasColour(Reader::Document& document, int number, std::string const& pdf) {
     if (!maySayColour(pdf))
         return false;
-    std::optional<Reader::Picture> const picture = document.drawPage(number, LOOKED_AT_DOTS_PER_INCH);
+    std::optional<Reader::Document> printed = document.printed(number);
+    std::optional<Reader::Picture> const picture = printed
+                                                       ? printed->drawPage(1, LOOKED_AT_DOTS_PER_INCH)
+                                                       : document.drawPage(number, LOOKED_AT_DOTS_PER_INCH);
     return picture && isColoured(*picture);
 }
 

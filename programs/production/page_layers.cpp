@@ -3,6 +3,7 @@
 #include "programs/base/error.h"
 #include "programs/production/shown_layers.h"
 #include "programs/reader/page_parts.h"
+#include "programs/reader/printed_annotations.h"
 
 #include <qpdf/QPDF.hh>
 #include <qpdf/QPDFMatrix.hh>
@@ -126,10 +127,12 @@ bool hasAnnotations(QPDFPageObjectHelper page) {
     return annotations.isArray() && annotations.getArrayNItems() > 0;
 }
 
-/// Otherwise they would lie above all that is laid on the page.
+/// Otherwise they would lie above all that is laid on the page. What no print has stays out.
 void drawAnnotations(QPDF& pdf, QPDFPageObjectHelper page) {
-    if (hasAnnotations(page))
-        QPDFPageDocumentHelper(pdf).flattenAnnotations();
+    if (!hasAnnotations(page))
+        return;
+    Reader::keepPrintedAnnotations(page);
+    QPDFPageDocumentHelper(pdf).flattenAnnotations();
 }
 
 QPDFPageObjectHelper onlyPage(QPDF& pdf) {

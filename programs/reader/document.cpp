@@ -98,6 +98,12 @@ PageExtras Document::extrasOf(int number) {
 
 std::vector<std::string> Document::embeddedFiles() { return source_->embeddedFiles(); }
 
+std::optional<Document> Document::printed(int number) {
+    checkNumber(number);
+    std::string pdf = source_->printedPdf(number);
+    return pdf.empty() ? std::nullopt : std::optional(Document(name_, openPdf(std::move(pdf), name_)));
+}
+
 bool Document::showsTheSame(int number, std::string const& pdf) {
     checkNumber(number);
     if (source_->hasSameObjects(number, pdf))

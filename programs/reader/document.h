@@ -56,6 +56,9 @@ public:
     std::optional<Picture> drawPart(int number, Raster const& raster);
     PageExtras extrasOf(int number);
     std::vector<std::string> embeddedFiles();
+    /// The page by itself as a print shows it; nothing where that is what is read and drawn of it here, as a
+    /// screen shows it. Annotations may be meant for one of them alone.
+    std::optional<Document> printed(int number);
     /// A PNG picture of the page.
     std::string renderPage(int number, double dotsPerInch);
 

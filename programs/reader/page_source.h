@@ -35,6 +35,8 @@ public:
     virtual std::optional<Picture> drawPart(int /*number*/, Raster const& /*raster*/) { return std::nullopt; }
     /// What a sheet of paper cannot show of the page, or may show otherwise.
     virtual PageExtras extrasOf(int /*number*/) { return {}; }
+    /// A PDF of one page that shows what a print of the page does; empty where that is what is drawn.
+    virtual std::string printedPdf(int /*number*/) { return {}; }
     /// The names of the files inside the document.
     virtual std::vector<std::string> embeddedFiles() { return {}; }
 };

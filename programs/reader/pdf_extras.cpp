@@ -1,5 +1,8 @@
 #include "programs/reader/pdf_extras.h"
 
+#include "programs/reader/page_parts.h"
+#include "programs/reader/printed_annotations.h"
+
 #include <qpdf/QPDF.hh>
 #include <qpdf/QPDFEmbeddedFileDocumentHelper.hh>
 #include <qpdf/QPDFObjectHandle.hh>
@@ -13,40 +16,11 @@ namespace {
 
 using Handle = QPDFObjectHandle;
 
-constexpr int HIDDEN = 1 << 1;
-constexpr int PRINT = 1 << 2;
-constexpr int NO_VIEW = 1 << 5;
 /// Of a form's button.
 constexpr int PUSH_BUTTON = 1 << 16;
 /// More are hardly a page's.
 constexpr std::size_t MOST_ANNOTATIONS = 1000;
 constexpr std::size_t MOST_FILES = 1000;
-
-struct KindRow {
-    char const* subtype;
-    /// For people; null where nothing is lost.
-    char const* kind;
-    /// It is more than a picture can show.
-    bool isNeverPrinted;
-};
-
-constexpr KindRow KINDS[] = {
-    {"/Text", "a note", true},      {"/FileAttachment", "an attached file", true},
-    {"/Sound", "a sound", true},    {"/Movie", "a film", true},
-    {"/Screen", "a film", true},    {"/RichMedia", "a film", true},
-    {"/3D", "a model", true},       {"/Link", nullptr, false},
-    {"/Popup", nullptr, false},     {"/PrinterMark", nullptr, false},
-    {"/TrapNet", nullptr, false},   {"/FreeText", "a text", false},
-    {"/Stamp", "a stamp", false},   {"/Widget", "a form's field", false},
-    {"/Watermark", nullptr, false},
-};
-
-KindRow rowOf(std::string const& subtype) {
-    for (KindRow const& row : KINDS)
-        if (subtype == row.subtype)
-            return row;
-    return {"", "a mark", false};
-}
 
 int intIn(Handle dictionary, char const* key) {
     Handle value = dictionary.getKey(key);
@@ -61,11 +35,8 @@ bool isPushButton(Handle annotation) {
 char const* kindOfLost(Handle annotation) {
     if (!annotation.isDictionary() || !annotation.getKey("/Subtype").isName())
         return nullptr;
-    KindRow const row = rowOf(annotation.getKey("/Subtype").getName());
-    int const flags = intIn(annotation, "/F");
-    bool const isSeen = (flags & (HIDDEN | NO_VIEW)) == 0;
-    bool const isPrinted = (flags & PRINT) != 0 && !row.isNeverPrinted;
-    return isSeen && !isPrinted && !isPushButton(annotation) ? row.kind : nullptr;
+    bool const isLost = isOnScreen(annotation) && !isPrinted(annotation) && !isPushButton(annotation);
+    return isLost ? kindOf(annotation).inWords : nullptr;
 }
 
 /// A box of the page, told from the top left of the page as it is shown.
@@ -114,6 +85,25 @@ PdfExtras::Parsed* PdfExtras::parsed() {
         // Its pages are not written either, which is told then.
     }
     return parsed_.get();
+}
+
+bool PdfExtras::printsOtherwise(int number, int pageCount) {
+    if (!parsed() || parsed_->pages.size() != static_cast<std::size_t>(pageCount))
+        return false;
+    try {
+        return printsOtherAnnotations(parsed_->pages.at(static_cast<std::size_t>(number) - 1));
+    } catch (std::exception const&) {
+        return false;
+    }
+}
+
+std::string printedPage(std::string const& pdf, std::string const& where) {
+    QPDF page;
+    page.setSuppressWarnings(true);
+    page.processMemoryFile(where.c_str(), pdf.data(), pdf.size());
+    for (QPDFPageObjectHelper const& only : QPDFPageDocumentHelper(page).getAllPages())
+        keepPrintedAnnotations(only);
+    return bytesOf(page, Packing::AsItIs);
 }
 
 std::vector<PdfAnnotation> PdfExtras::lostAnnotations(int number, int pageCount) {

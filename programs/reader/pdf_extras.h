@@ -28,6 +28,8 @@ public:
     /// Those that a screen shows on the page, from 1, of a PDF that should have so many pages, and that no
     /// print has.
     std::vector<PdfAnnotation> lostAnnotations(int number, int pageCount);
+    /// Whether a print of that page shows other annotations than a screen.
+    bool printsOtherwise(int number, int pageCount);
     /// The names of the files inside it.
     std::vector<std::string> embeddedFiles();
 
@@ -42,5 +44,8 @@ private:
     bool isTried_ = false;
     std::unique_ptr<Parsed> parsed_;
 };
+
+/// A PDF that shows on a screen what a print of this one shows. Throws std::exception.
+std::string printedPage(std::string const& pdf, std::string const& where);
 
 } // namespace Reader

@@ -286,6 +286,19 @@ public:
         return extras;
     }
 
+    std::string printedPdf(int number) override {
+        if (!extras_.printsOtherwise(number, pageCount()))
+            return {};
+        try {
+            return printedPage(singlePagePdf(number), where_);
+        } catch (std::bad_alloc const&) {
+            throw;
+        } catch (std::exception const&) {
+            throw Base::Error(where_ + ": page " + std::to_string(number) +
+                              " cannot be shown as it is printed; print the document to a new PDF");
+        }
+    }
+
     std::vector<std::string> embeddedFiles() override { return extras_.embeddedFiles(); }
 
 private:

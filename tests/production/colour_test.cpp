@@ -1,5 +1,7 @@
 #include "programs/production/colour.h"
 
+#include "tests/support/raw_pdf.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -32,6 +34,23 @@ TEST(Colour, IsNotWhatPicturesOfGreyPaperHave) {
     EXPECT_TRUE(isColoured(withPoints(100, 225, 220, 200)));
     EXPECT_TRUE(isColoured(withPoints(100, 200, 225, 220)));
     EXPECT_TRUE(isColoured(withPoints(100, 200, 220, 225)));
+}
+
+TEST(Colour, IsThatOfAPrintAndNotOfAScreen) {
+    auto const isColouredWith = [](std::string const& flags) {
+        std::string const pdf =
+            VLServiceTest::onePage("", "", "/Annots [6 0 R]")
+                .object(6, "<< /Type /Annot /Subtype /Stamp /Rect [100 100 200 200] /AP << /N 7 0 R >> /F " +
+                               flags + " >>")
+                .stream(7, "/Type /XObject /Subtype /Form /BBox [0 0 100 100]", "1 0 0 rg 0 0 100 100 re f")
+                .bytes();
+        Reader::Document document = Reader::openDocument(pdf, "a.pdf");
+        return hasColour(document, 1, pdf);
+    };
+    EXPECT_TRUE(isColouredWith("4"));
+    EXPECT_TRUE(isColouredWith("36"));
+    EXPECT_FALSE(isColouredWith("0"));
+    EXPECT_FALSE(isColouredWith("6"));
 }
 
 } // namespace

@@ -228,10 +228,11 @@ TEST(LaidPages, KeepTheirHiddenLayersHidden) {
     EXPECT_EQ(colourAt(over(laidPage(red), pageOf("")), 125, 75), "fff");
 }
 
-/// A note with an appearance of that colour.
-RawPdf annotated(std::string const& colour) {
+/// A stamp with an appearance of that colour.
+RawPdf annotated(std::string const& colour, std::string const& flags = "4") {
     RawPdf pdf = onePage("", "", "/Annots [7 0 R]");
-    pdf.object(7, "<< /Type /Annot /Subtype /Stamp /F 4 /Rect [100 742 150 792] /AP << /N 8 0 R >> >>");
+    pdf.object(7, "<< /Type /Annot /Subtype /Stamp /F " + flags +
+                      " /Rect [100 742 150 792] /AP << /N 8 0 R >> >>");
     return pdf.stream(8, "/Type /XObject /Subtype /Form /BBox [0 0 50 50]", box(colour, 0, 0, 50, 50));
 }
 
@@ -243,6 +244,16 @@ TEST(LaidPages, TakeAnnotationsForContent) {
     EXPECT_EQ(colourAt(under(green, red), 125, 75), "f00");
     EXPECT_EQ(colourAt(under(laidPage(red), pageOf("")), 125, 75), "f00");
     EXPECT_EQ(colourAt(over(laidPage(red), pageOf(box("0 0 1", 100, 742, 50, 50))), 125, 75), "f00");
+}
+
+TEST(LaidPages, LeaveAnnotationsOutThatNoPrintHas) {
+    LaidPage const white = laidPage(pageOf(""));
+    for (char const* const flags : {"0", "2", "6", "32"}) {
+        std::string const red = annotated("1 0 0", flags).bytes();
+        EXPECT_EQ(colourAt(over(white, red), 125, 75), "fff") << flags;
+        EXPECT_EQ(colourAt(over(laidPage(red), pageOf("")), 125, 75), "fff") << flags;
+    }
+    EXPECT_EQ(colourAt(over(white, annotated("1 0 0", "36").bytes()), 125, 75), "f00") << "not on a screen";
 }
 
 TEST(LaidPages, DoNotTakeWhatMeansNothingInAContentForAForm) {

@@ -465,6 +465,83 @@ TEST(Annotations, AreFineWhenTheyArePrintedOrNotMeantToBe) {
         EXPECT_EQ(codesOf(findingsIn(annotated(keys), printRules("{}"_json))), codes) << keys;
 }
 
+/// An annotation that shows a black box, on a page that shows nothing else. A place of no area is none.
+std::string boxOnTop(Box const& place, std::string const& keys) {
+    std::string const width = inPoints(place.width());
+    std::string const height = inPoints(place.height());
+    return onePage("", "", std::string(A4_PAGE) + " /Annots [6 0 R]", "/AcroForm << /Fields [6 0 R] >>")
+        .object(6, "<< /Type /Annot /Rect [" + inPoints(place.left) + inPoints(29700 - place.bottom) +
+                       inPoints(place.right) + inPoints(29700 - place.top) +
+                       "] /T (box) /AP << /N 7 0 R >> " + keys + " >>")
+        .stream(7, "/Type /XObject /Subtype /Form /BBox [0 0 " + width + height + "]",
+                "0 g 0 0 " + width + height + "re f")
+        .bytes();
+}
+
+/// The kinds that a print has, as fields of forms and people's stamps are meant.
+constexpr char const* PRINTED[] = {"/Subtype /Widget /FT /Tx /F 4", "/Subtype /Widget /FT /Btn /F 4",
+                                   "/Subtype /Stamp /F 4", "/Subtype /FreeText /F 4",
+                                   "/Subtype /Stamp /F 36"};
+
+std::vector<std::string> codesOnTop(Box const& place, std::string const& keys,
+                                    std::optional<Production::PlacedAddress> const& address = {}) {
+    json::Value const production = R"({"window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000},
+        "clear_zones": [{"left": 0, "top": 20000, "right": 2000, "bottom": 22000}]})"_json;
+    return codesOf(findingsIn(boxOnTop(place, keys), printRules(production), address));
+}
+
+TEST(WhatAPrintHasOnTop, IsContentForEachCheck) {
+    Production::PlacedAddress const address{"Ada\nLondon", 1, {{2100, 4600, 6000, 5500}}};
+    for (char const* const keys : PRINTED) {
+        EXPECT_THAT(codesOnTop(MIDDLE, keys), IsEmpty()) << keys;
+        EXPECT_THAT(codesOnTop({100, 14000, 9000, 15000}, keys), ElementsAre(OUTSIDE)) << keys;
+        EXPECT_THAT(codesOnTop({500, 20500, 1500, 21500}, keys), ElementsAre("clear-zone")) << keys;
+        EXPECT_THAT(codesOnTop({8000, 7000, 9000, 8000}, keys, address), ElementsAre("text-in-window"))
+            << keys;
+    }
+}
+
+TEST(WhatAPrintHasOnTop, CountsFromAHundredthOfAMillimetre) {
+    for (char const* const keys : PRINTED) {
+        EXPECT_THAT(codesOnTop({201, 14000, 9000, 15000}, keys), IsEmpty()) << keys;
+        EXPECT_THAT(codesOnTop({199, 14000, 9000, 15000}, keys), ElementsAre(OUTSIDE)) << keys;
+        EXPECT_THAT(codesOnTop({1901, 20500, 3000, 21500}, keys), IsEmpty()) << keys;
+        EXPECT_THAT(codesOnTop({1899, 20500, 3000, 21500}, keys), ElementsAre("clear-zone")) << keys;
+    }
+}
+
+TEST(WhatAPrintHasNotOnTop, IsNoContentAndLeavesThePageEmpty) {
+    std::map<std::string, std::vector<std::string>> const table{
+        {"/Subtype /Stamp", {"page-empty", "annotation-lost"}},
+        {"/Subtype /Widget /FT /Tx", {"page-empty", "annotation-lost"}},
+        {"/Subtype /Text /F 4", {"page-empty", "annotation-lost"}},
+        {"/Subtype /Stamp /F 2", {"page-empty"}},
+        {"/Subtype /Stamp /F 6", {"page-empty"}},
+        {"/Subtype /Stamp /F 32", {"page-empty"}},
+        {"/Subtype /Link /Border [0 0 9]", {"page-empty"}},
+    };
+    for (auto const& [keys, codes] : table)
+        EXPECT_EQ(codesOnTop({100, 20500, 9000, 21500}, keys), codes) << keys;
+}
+
+TEST(WhatAPrintHasOnTop, IsSaidWithTheWordsOfAFieldAndNotWithThoseOfANote) {
+    auto const findings = [](std::string const& flags) {
+        std::string const pdf =
+            onePage("", "", std::string(A4_PAGE) + " /Annots [6 0 R]", "/AcroForm << /Fields [6 0 R] >>")
+                .object(6, "<< /Type /Annot /Subtype /Widget /FT /Tx /T (name) /Rect [0 400 200 420] " +
+                               flags + " /AP << /N 7 0 R >> >>")
+                .object(8, "<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica >>")
+                .stream(
+                    7,
+                    "/Type /XObject /Subtype /Form /BBox [0 0 200 20] /Resources << /Font << /F 8 0 R >> >>",
+                    "BT /F 10 Tf 2 5 Td (Ada) Tj ET")
+                .bytes();
+        return withoutFonts(findingsIn(pdf, printRules("{}"_json)));
+    };
+    EXPECT_THAT(only(findings("/F 4")).says, testing::StartsWith("\"Ada\" reaches "));
+    EXPECT_THAT(codesOf(findings("/F 0")), ElementsAre("page-empty", "annotation-lost"));
+}
+
 TEST(EmbeddedFiles, AreToldOfTheDocument) {
     auto const found = [](std::string const& name) {
         RawPdf pdf = onePage("", "", "", "/Names << /EmbeddedFiles << /Names [(" + name + ") 6 0 R] >> >>");

@@ -5,6 +5,7 @@
 #include "programs/production/maker.h"
 
 #include <algorithm>
+#include <optional>
 #include <utility>
 
 namespace VlMail::Report {
@@ -17,8 +18,14 @@ constexpr double SMALL_DOTS_PER_INCH = 36;
 /// A letter of more shows its first.
 constexpr std::size_t MOST_SIDES = 40;
 
+std::string pictureOf(Reader::Document& document, int page, double dotsPerInch) {
+    std::optional<Reader::Document> printed = document.printed(page);
+    return printed ? printed->renderPage(1, dotsPerInch) : document.renderPage(page, dotsPerInch);
+}
+
 std::string pictureOf(std::string pdf, double dotsPerInch) {
-    return Reader::openDocument(std::move(pdf), "page.pdf").renderPage(1, dotsPerInch);
+    Reader::Document page = Reader::openDocument(std::move(pdf), "page.pdf");
+    return pictureOf(page, 1, dotsPerInch);
 }
 
 std::string pictureOf(PageBlob const& page) {
@@ -44,11 +51,11 @@ PageSize PrintedPages::size(int page) const {
 std::string PrintedPages::picture(LetterReading const& letter, int page, double dotsPerInch) {
     auto const place = std::find(letter.pages.begin(), letter.pages.end(), page);
     if (place == letter.pages.end())
-        return document_.renderPage(page, dotsPerInch);
+        return pictureOf(document_, page, dotsPerInch);
     Production::PreparedPage const content{document_.singlePagePdf(page), document_.pageSize(page)};
     Production::PreparedPage made = making_.makerFor(preset_).make(
         content, {Production::Part::Kind::FirstLetter}, static_cast<int>(place - letter.pages.begin()) + 1);
-    return made.pdf == content.pdf ? document_.renderPage(page, dotsPerInch)
+    return made.pdf == content.pdf ? pictureOf(document_, page, dotsPerInch)
                                    : pictureOf(std::move(made.pdf), dotsPerInch);
 }
 
