@@ -1,5 +1,9 @@
 # cmake -DFOLDER=SOURCES -DOUT=FILE.cpp -P WriteCommit.cmake: the commit that is built; touches the file only when it is another one.
-set(commit "")
+# Sources that "git archive" wrote have no repository; their commit stands in a file.
+file(STRINGS ${CMAKE_CURRENT_LIST_DIR}/commit.txt commit)
+if(commit MATCHES "^.Format")
+    set(commit "")
+endif()
 find_program(GIT git)
 if(GIT AND EXISTS ${FOLDER}/.git)
     execute_process(COMMAND ${GIT} -C ${FOLDER} describe --always --dirty=+ --exclude=*
