@@ -1,5 +1,7 @@
 #include "programs/base/command_line.h"
 
+#include "programs/base/option_lines.h"
+
 #include <CLI/CLI.hpp>
 
 #include <charconv>
@@ -43,6 +45,23 @@ CommandInfo infoOf(CLI::App const& app) {
         info.commands.push_back(infoOf(*command));
     return info;
 }
+
+/// A file of options, in the terms of the parsing library.
+class OptionFile : public CLI::Config {
+public:
+    explicit OptionFile(CommandInfo command) : command_(std::move(command)) {}
+
+    std::string to_config(CLI::App const*, bool, bool, std::string) const override { return {}; }
+    std::vector<CLI::ConfigItem> from_config(std::istream& lines) const override {
+        std::vector<CLI::ConfigItem> options;
+        for (OptionLine& line : readOptionLines(lines, command_))
+            options.push_back({{}, std::move(line.name), {std::move(line.value)}});
+        return options;
+    }
+
+private:
+    CommandInfo command_;
+};
 
 } // namespace
 
@@ -136,10 +155,17 @@ void CommandLine::addVersion(std::function<std::string()> text) {
                            "Print the version of the program and of its libraries");
 }
 
+void CommandLine::addConfigFile() {
+    app_->config_formatter(std::make_shared<OptionFile>(command().info()));
+    app_->set_config("--config", "", "File with options, a line for each: name = value")->type_name("FILE");
+}
+
 bool CommandLine::read(int argc, char const* const* argv, std::ostream& out) {
     try {
         app_->parse(argc, argv);
         return true;
+    } catch (OptionLineError const& wrong) {
+        throw UsageError(app_->get_config_ptr()->as<std::string>() + ", " + wrong.what());
     } catch (CLI::ParseError const& wrong) {
         // Asking for help is one of them.
         if (wrong.get_exit_code() != 0)

@@ -89,6 +89,9 @@ public:
     Command command() const { return Command(*app_); }
     /// Adds --version, which prints what the function gives.
     void addVersion(std::function<std::string()> text);
+    /// Adds --config FILE for the options that were added before; what the command line says counts before
+    /// what the file says.
+    void addConfigFile();
     /// Whether there is something to do: false when help or the version was asked for, which stands in `out`
     /// then. Throws UsageError.
     bool read(int argc, char const* const* argv, std::ostream& out);

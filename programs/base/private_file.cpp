@@ -38,7 +38,8 @@ void requirePrivate(int descriptor, std::string const& file) {
         throw Error("\"" + file + "\" is not a file.");
     if (status.st_uid != ::geteuid() && status.st_uid != 0)
         throw Error("The file \"" + file + "\" belongs to another user.");
-    if ((status.st_mode & OF_OTHERS) != 0)
+    mode_t const refused = status.st_uid == ::geteuid() ? OF_OTHERS : OF_OTHERS & ~S_IRGRP;
+    if ((status.st_mode & refused) != 0)
         throw Error("The file \"" + file + "\" is open to others (mode " +
                     octal(status.st_mode & PERMISSIONS) + "); make it private with chmod 600.");
 }

@@ -56,9 +56,9 @@ std::unique_ptr<asio::ssl::context> tlsFor(tcp::endpoint const& endpoint, Server
     return makeServiceContext(settings.certificateFile, settings.keyFile);
 }
 
-tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint) {
+tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint, int socket) {
     try {
-        return tcp::acceptor(io, endpoint);
+        return socket < 0 ? tcp::acceptor(io, endpoint) : tcp::acceptor(io, endpoint.protocol(), socket);
     } catch (boost::system::system_error const& e) {
         std::ostringstream message;
         message << "Cannot listen on " << endpoint << ": " << e.code().message() << '.';
@@ -82,7 +82,7 @@ public:
         if (tls_)
             fingerprint_ = fingerprintOf(*tls_);
         raiseFileLimit();
-        acceptor_.emplace(listenOn(io, endpoint));
+        acceptor_.emplace(listenOn(io, endpoint, settings_.socket));
         port_ = acceptor_->local_endpoint().port();
         retryTimer_.emplace(io);
     }

@@ -15,6 +15,8 @@ struct ServerSettings {
     std::string address = "127.0.0.1";
     /// 0 takes a free port.
     std::uint16_t port = 0;
+    /// Listens at that address and port already, and is the server's from now on; below 0 when there is none.
+    int socket = -1;
     std::string token;
     Tls tls = Tls::Auto;
     /// PEM files that TLS wants. The key's must be private.

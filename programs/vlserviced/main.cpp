@@ -5,6 +5,7 @@
 #include "programs/base/plain_text.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
+#include "programs/vlserviced/system_manager.h"
 #include "vlservice/platform/log.h"
 
 #include <exception>
@@ -16,7 +17,8 @@ namespace {
 constexpr char const* OUT_OF_MEMORY =
     "vlserviced: there is not enough memory; nothing that was acknowledged is lost, start it again\n";
 
-void serve(VlServiced::Options const& options) {
+void serve(VlServiced::Options options) {
+    VlServiced::takeHandedOver(options);
     g_LogVerbose = options.verbose;
     Base::PlainLog const plainLog;
     VlServiced::Service service(options);

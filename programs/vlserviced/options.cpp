@@ -22,6 +22,8 @@ void addOptions(Base::Command const& command, Options& options) {
         .valueName("FOLDER");
     command.addOption("--outbox", options.outbox, "Folder for finished mailings [outbox in the data folder]")
         .valueName("FOLDER");
+    command.addOption("--token", options.token, "File with the access token [token in the data folder]")
+        .valueName("FILE");
     command
         .addOption("--listen", options.listen, "IP address to listen on; all but loopback want a certificate")
         .showDefault()
@@ -50,6 +52,7 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
         return Base::versionText(PROGRAM, commit, {{"SQLite", Mailing::databaseVersion()}});
     });
     addOptions(line.command(), options);
+    line.addConfigFile();
     try {
         return line.read(argc, argv, out) ? std::variant<Options, int>(options) : 0;
     } catch (Base::UsageError const& wrong) {
@@ -63,6 +66,7 @@ Base::CommandInfo commandInfo() {
     Base::CommandLine line(DESCRIPTION, PROGRAM);
     line.addVersion([] { return std::string(); });
     addOptions(line.command(), options);
+    line.addConfigFile();
     return line.command().info();
 }
 

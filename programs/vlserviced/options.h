@@ -15,6 +15,8 @@ struct Options {
     std::filesystem::path data;
     /// Empty for the data folder's own.
     std::filesystem::path outbox;
+    /// File with the access token; empty for the data folder's own.
+    std::string token;
     std::string listen = "127.0.0.1";
     std::uint16_t port = 0;
     std::string certificate;
@@ -23,6 +25,8 @@ struct Options {
     /// the host's name.
     std::string announce;
     bool answersDiscovery = true;
+    /// Listens already, at `listen` and `port`; below 0 when there is none.
+    int socket = -1;
     bool verbose = false;
 };
 

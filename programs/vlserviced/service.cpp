@@ -12,6 +12,7 @@
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/schema.h"
+#include "programs/vlserviced/system_manager.h"
 #include "vlservice/cfg/inet.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/make_empty_cmd.h"
@@ -92,11 +93,18 @@ std::string announcedHost(Options const& options) {
     return asio::ip::make_address(options.listen).is_unspecified() ? asio::ip::host_name() : options.listen;
 }
 
+/// The first start makes one, where none is named.
+std::string tokenFor(Options const& options, DataFolder const& data) {
+    return options.token.empty() ? Channel::readOrCreateToken(data.token().string())
+                                 : Channel::readToken(options.token);
+}
+
 Channel::ServerSettings serverSettings(Options const& options, DataFolder const& data) {
     Channel::ServerSettings settings;
     settings.address = options.listen;
     settings.port = options.port;
-    settings.token = Channel::readOrCreateToken(data.token().string());
+    settings.socket = options.socket;
+    settings.token = tokenFor(options, data);
     settings.certificateFile = options.certificate;
     settings.keyFile = options.key;
     return settings;
@@ -120,8 +128,7 @@ public:
         removeUnfinished(outbox_);
         recogniseUploadFolder();
         if (options.answersDiscovery)
-            discovery_.emplace(io_, announcedHost(options), server_->port(),
-                               Channel::readToken(data_.token().string()));
+            discovery_.emplace(io_, announcedHost(options), server_->port(), tokenFor(options, data_));
     }
 
     ~Impl() { endThreads(); }
@@ -138,6 +145,7 @@ public:
             runner_.resume();
         });
         asio::post(io_, [this] { sweepPresets(); });
+        manager_.onReady("listening on port " + std::to_string(server_->port()));
         awaitUpkeep();
         runHandlers();
         // What the worker has finished by now goes on record; the rest is taken up at the next start.
@@ -191,6 +199,7 @@ private:
     }
 
     void stop() {
+        manager_.onStopping();
         held_.releaseAll();
         server_->stop();
         discovery_.reset();
@@ -307,6 +316,7 @@ private:
     std::shared_ptr<Processor> processor_ =
         std::make_shared<Processor>(settings_, documents_, jobs_, runner_, outbox_, &now);
 
+    SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
     asio::steady_timer upkeep_{io_};
     /// For the next job that is held and due.

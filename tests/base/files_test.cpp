@@ -7,6 +7,7 @@
 #include "programs/base/read_file.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
+#include "tests/support/without_rights.h"
 
 #include <gtest/gtest.h>
 
@@ -120,6 +121,30 @@ TEST_F(FilesTest, ThatAreSecretBelongToOneUser) {
     EXPECT_EQ(failureOf([&] { Base::appendToPrivateFile(name, "x"); }), refusal);
     EXPECT_EQ(failureOf([&] { Base::readPrivateFile(file("none").string()); }),
               "Cannot open \"" + file("none").string() + "\": No such file or directory.");
+}
+
+TEST_F(FilesTest, ThatAreSecretMayBeOpenedToAGroupByTheAdministratorAlone) {
+    if (::geteuid() != 0)
+        GTEST_SKIP() << "only root has files of the administrator";
+    std::string const name = file("token").string();
+    EXPECT_TRUE(Base::createPrivateFile(name, "secret"));
+    fs::permissions(folder_, fs::perms::others_exec | fs::perms::owner_all);
+    ASSERT_EQ(::chown(name.c_str(), 0, VLServiceTest::WithoutRights::NOBODY), 0);
+    fs::permissions(name, fs::perms::owner_read | fs::perms::group_read);
+    gid_t const before = ::getegid();
+    ASSERT_EQ(::setegid(VLServiceTest::WithoutRights::NOBODY), 0);
+    {
+        VLServiceTest::WithoutRights const guard;
+        EXPECT_EQ(Base::readPrivateFile(name), "secret");
+    }
+    fs::permissions(name, fs::perms::group_write, fs::perm_options::add);
+    {
+        VLServiceTest::WithoutRights const guard;
+        EXPECT_EQ(failureOf([&] { Base::readPrivateFile(name); }),
+                  "The file \"" + name +
+                      "\" is open to others (mode 0460); make it private with chmod 600.");
+    }
+    ASSERT_EQ(::setegid(before), 0);
 }
 
 } // namespace

@@ -3,14 +3,13 @@
 #include "programs/base/error.h"
 #include "programs/reader/layout.h"
 #include "tests/reader/line_texts.h"
+#include "tests/support/without_rights.h"
 
 #include <gmock/gmock.h>
 
-#include <cstdlib>
 #include <fstream>
 #include <map>
 #include <set>
-#include <unistd.h>
 
 namespace Reader {
 namespace {
@@ -67,30 +66,11 @@ TEST_F(Documents, ThatCannotBeOpenedSayWhyAndWhatToDo) {
     EXPECT_EQ(complaint(file("a.txt", "x") / "b.txt"), "there is no such file; check the name");
 }
 
-/// Gives up the rights of root, who may read everything, for a while.
-class WithoutRights {
-public:
-    WithoutRights() : user_(::geteuid()) {
-        if (user_ == 0 && ::seteuid(NOBODY) != 0)
-            std::abort();
-    }
-    ~WithoutRights() {
-        if (user_ == 0 && ::seteuid(user_) != 0)
-            std::abort();
-    }
-    WithoutRights(WithoutRights const&) = delete;
-    WithoutRights& operator=(WithoutRights const&) = delete;
-
-private:
-    static constexpr uid_t NOBODY = 65534;
-    uid_t user_;
-};
-
 TEST_F(Documents, WithoutTheRightToReadSaySo) {
     fs::path const path = file("secret.pdf", "%PDF-");
     fs::permissions(path, fs::perms::none);
     fs::permissions(folder_, fs::perms::all);
-    WithoutRights const guard;
+    VLServiceTest::WithoutRights const guard;
     EXPECT_EQ(complaint(path), "no right to read it; change its permissions");
 }
 

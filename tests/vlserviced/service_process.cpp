@@ -21,10 +21,19 @@ fs::path newFile() {
     return name;
 }
 
+/// As the third file, for the process of that number.
+void handOver(int socket) {
+    ::dup2(socket, STDERR_FILENO + 1);
+    ::setenv("LISTEN_FDS", "1", 1);
+    ::setenv("LISTEN_PID", std::to_string(::getpid()).c_str(), 1);
+}
+
 [[noreturn]] void become(std::vector<std::string> arguments, ServiceProcess::Environment const& more,
-                         int output, int errors) {
+                         int output, int errors, int socket) {
     ::dup2(output, STDOUT_FILENO);
     ::dup2(errors, STDERR_FILENO);
+    if (socket >= 0)
+        handOver(socket);
     for (auto const& [name, value] : more)
         ::setenv(name.c_str(), value.c_str(), 1);
     arguments.insert(arguments.begin(), VLSERVICED_PROGRAM);
@@ -45,7 +54,8 @@ std::string lineFrom(int file) {
 
 } // namespace
 
-ServiceProcess::ServiceProcess(std::vector<std::string> arguments, Environment const& more, Starter* starter)
+ServiceProcess::ServiceProcess(std::vector<std::string> arguments, Environment const& more, Starter* starter,
+                               int socket)
     : starter_(starter), errors_(newFile()) {
     int ends[2];
     if (::pipe2(ends, O_CLOEXEC) != 0)
@@ -53,7 +63,7 @@ ServiceProcess::ServiceProcess(std::vector<std::string> arguments, Environment c
     int const errors = ::open(errors_.c_str(), O_WRONLY | O_CLOEXEC);
     process_ = starter_ ? starter_->start(arguments, more, ends[1], errors) : ::fork();
     if (process_ == 0)
-        become(std::move(arguments), more, ends[1], errors);
+        become(std::move(arguments), more, ends[1], errors, socket);
     ::close(errors);
     ::close(ends[1]);
     firstLine_ = lineFrom(ends[0]);

@@ -26,8 +26,9 @@ public:
     };
 
     /// Starts the program and waits for its first line, or for its end. `starter` lives longer.
+    /// A socket of 0 or above is handed over as the system's manager does it.
     ServiceProcess(std::vector<std::string> arguments, Environment const& more = {},
-                   Starter* starter = nullptr);
+                   Starter* starter = nullptr, int socket = -1);
     /// Kills it if it still runs.
     ~ServiceProcess();
     ServiceProcess(ServiceProcess const&) = delete;
