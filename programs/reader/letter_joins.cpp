@@ -129,7 +129,8 @@ std::optional<Address> addressIn(ZoneTrace const& zone) {
 
 class JoinWatch::Looks {
 public:
-    Looks(Cfg::ExtractPreset const& preset, PatternLimits const& limits) : marks_(preset), time_(limits) {
+    Looks(Cfg::ExtractPreset const& preset, ReadingRules const& rules, PatternLimits const& limits)
+        : marks_(preset, rules), time_(limits) {
         for (Cfg::ExtractZone const& zone : preset.zones())
             if (zone.hasAddress())
                 addressZones_.push_back(&zone);
@@ -154,9 +155,9 @@ public:
     std::vector<DoubtfulJoin> doubtful() const {
         std::vector<DoubtfulJoin> joins;
         for (auto const& [letter, look] : joined_) {
-            std::string says = suspicion(firsts_[letter], look);
-            if (!says.empty())
-                joins.push_back({look.page, std::move(says)});
+            Suspicion suspicion = this->suspicion(firsts_[letter], look);
+            if (!suspicion.says.empty())
+                joins.push_back({look.page, std::move(suspicion.says), suspicion.box});
         }
         return joins;
     }
@@ -189,23 +190,29 @@ private:
         countsLetters_ = countsLetters_ && !countsOn(look);
     }
 
-    /// Why the page may begin a letter; empty when nothing strong enough says so.
-    std::string suspicion(Look const& first, Look const& look) const {
-        std::string says = bySomeNumbering(look);
-        if (!says.empty() || (countsLetters_ && countsOn(look)))
-            return says;
+    /// Why a page may begin a letter, and where that stands; empty when nothing strong enough says so.
+    struct Suspicion {
+        std::string says = {};
+        Box box = {};
+    };
+
+    Suspicion suspicion(Look const& first, Look const& look) const {
+        Suspicion const numbering = bySomeNumbering(look);
+        if (!numbering.says.empty() || (countsLetters_ && countsOn(look)))
+            return numbering;
         for (MarkSighting const& mark : look.marks)
-            if (says.empty() && isMark(first, mark))
-                says = quoted(mark.text) + " nearly is the mark \"" + marks_.nameOf(mark.mark) + "\", " +
-                       mark.difference;
-        return says.empty() ? bySomeAddress(first, look) : says;
+            if (isMark(first, mark))
+                return {quoted(mark.text) + " nearly is the mark \"" + marks_.nameOf(mark.mark) + "\", " +
+                            mark.difference,
+                        mark.box};
+        return bySomeAddress(first, look);
     }
 
-    std::string bySomeNumbering(Look const& look) const {
+    Suspicion bySomeNumbering(Look const& look) const {
         for (PageNumbering const& numbering : look.numberings)
             if (numbering.number == 1 &&
                 firstNumberPlaces_.any([&](Box const& place) { return isSamePrint(place, numbering.box); }))
-                return "it counts its pages from 1 again: " + quoted(numbering.line);
+                return {"it counts its pages from 1 again: " + quoted(numbering.line), numbering.box};
         return {};
     }
 
@@ -231,14 +238,14 @@ private:
         return places.isEmpty() || places.any(isNear);
     }
 
-    std::string bySomeAddress(Look const& first, Look const& look) const {
+    Suspicion bySomeAddress(Look const& first, Look const& look) const {
         for (std::size_t zone = 0; zone < look.addresses.size(); ++zone) {
             std::optional<Address> const& address = look.addresses[zone];
             if (!address || (first.addresses[zone] && isOneRecipient(*first.addresses[zone], *address)))
                 continue;
             if (addressPlaces_[zone].any(
                     [&](Box const& place) { return isWithin(place, address->box, SAME_PLACE); }))
-                return "it has another address where letters begin: " + quoted(address->text);
+                return {"it has another address where letters begin: " + quoted(address->text), address->box};
         }
         return {};
     }
@@ -256,8 +263,8 @@ private:
     bool countsLetters_ = true;
 };
 
-JoinWatch::JoinWatch(Cfg::ExtractPreset const& preset, PatternLimits const& limits)
-    : looks_(std::make_unique<Looks>(preset, limits)) {}
+JoinWatch::JoinWatch(Cfg::ExtractPreset const& preset, ReadingRules const& rules, PatternLimits const& limits)
+    : looks_(std::make_unique<Looks>(preset, rules, limits)) {}
 JoinWatch::~JoinWatch() = default;
 
 void JoinWatch::see(Page const& page, Layout const& layout, PageTrace const& trace) {

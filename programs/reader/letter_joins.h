@@ -19,14 +19,16 @@ struct DoubtfulJoin {
     int page = 0;
     /// What makes it look like that, as a clause.
     std::string says;
+    /// Where that stands on the page.
+    Box box = {};
 };
 
 /// Looks at all pages of a document whose letters are told apart by marks, and says which joins to doubt.
 /// The evidence is strong: a page that repeats the head of its letter, or counts on, is never told.
 class JoinWatch {
 public:
-    /// The preset must live longer.
-    JoinWatch(Cfg::ExtractPreset const& preset, PatternLimits const& limits);
+    /// The preset and the rules must live longer.
+    JoinWatch(Cfg::ExtractPreset const& preset, ReadingRules const& rules, PatternLimits const& limits);
     ~JoinWatch();
 
     /// The next page with what was searched on it.

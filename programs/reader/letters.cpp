@@ -46,7 +46,7 @@ public:
                  ReadingRules const& rules, PatternLimits const& limits)
         : document_(document), preset_(preset), trace_(trace), rules_(rules), time_(limits) {
         if (maySeparateLetters(preset.zones(), rules))
-            joins_.emplace(preset, limits);
+            joins_.emplace(preset, rules, limits);
     }
 
     void read(int page) {
@@ -159,11 +159,20 @@ private:
         return viewOf(*page.page, page.layout, zone, rules ? *rules : ZoneRules());
     }
 
+    void noteInTrace(DoubtfulJoin const& join) {
+        if (!trace_)
+            return;
+        auto const page = std::ranges::find(trace_->pages, join.page, &PageTrace::page);
+        if (page != trace_->pages.end())
+            page->doubtfulJoin = PageTrace::Doubt{join.says, join.box};
+    }
+
     void doubtJoins() {
         std::size_t letter = 0;
         for (DoubtfulJoin& join : joins_->doubtful()) {
             while (letters_[letter].pages.back() < join.page)
                 ++letter;
+            noteInTrace(join);
             letters_[letter].doubtfulJoins.push_back(std::move(join));
         }
         if (int const page = joins_->givenUpAt(); page > 0)

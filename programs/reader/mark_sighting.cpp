@@ -74,7 +74,7 @@ bool isTelling(std::string const& label) {
     return characters >= MIN_LABEL_CHARACTERS;
 }
 
-Box grown(Cfg::Rect const& at) {
+Box grown(Box const& at) {
     auto const moved = [](int edge, long long by) {
         return static_cast<int>(std::clamp<long long>(edge + by, std::numeric_limits<int>::min(),
                                                       std::numeric_limits<int>::max()));
@@ -84,7 +84,7 @@ Box grown(Cfg::Rect const& at) {
 }
 
 /// How far the box reaches out of the location where it does most.
-int reach(Box const& box, Cfg::Rect const& location) {
+int reach(Box const& box, Box const& location) {
     return std::max({location.left - box.left, location.top - box.top, box.right - location.right,
                      box.bottom - location.bottom, 0});
 }
@@ -108,18 +108,20 @@ std::string comparable(std::string_view text) {
     return folded;
 }
 
-MarkWatch::MarkWatch(Cfg::ExtractPreset const& preset) {
+MarkWatch::MarkWatch(Cfg::ExtractPreset const& preset, ReadingRules const& rules) {
     for (Cfg::ExtractZone const& zone : preset.zones())
         for (ExtractField const& field : zone.fields())
-            if (separatesLetters(field) && !field.strRegex().empty())
-                marks_.push_back(markOf(zone, field));
+            if (separatesLetters(field) && !field.strRegex().empty() && rules.isOnFirstPage(zone.name()))
+                marks_.push_back(markOf(zone, rules.forZone(zone.name()), field));
 }
 
-MarkWatch::Mark MarkWatch::markOf(Cfg::ExtractZone const& zone, ExtractField const& field) {
+MarkWatch::Mark MarkWatch::markOf(Cfg::ExtractZone const& zone, ZoneRules const* rules,
+                                  ExtractField const& field) {
     std::string const& pattern = field.strRegex();
     std::string const plain = Patterns::withPlainMarks(pattern);
     std::string const loose = "(?i)" + Patterns::withAnyBlanks(plain);
     Mark mark{&zone,
+              rules ? *rules : ZoneRules(),
               &field,
               {withPattern(field, loose), true, OTHER_WAYS},
               {{withPattern(field, "(?i)" + pattern), false, OTHER_CASE},
@@ -158,7 +160,8 @@ std::vector<MarkSighting> MarkWatch::nearly(Page const& page, Layout const& layo
 
 std::optional<MarkSighting> MarkWatch::nearly(Mark const& mark, Page const& page,
                                               Layout const& layout) const {
-    ZoneText const text = textOf(page, layout, *mark.zone);
+    ZoneView const view = viewOf(page, layout, *mark.zone, mark.rules);
+    ZoneText const& text = view.text;
     auto const foundBy = [](Reading const& reading, ZoneText const& in) {
         return find(reading.field, reading.isOfPlainText ? Patterns::withPlainMarks(in.text()) : in.text());
     };
@@ -169,9 +172,10 @@ std::optional<MarkSighting> MarkWatch::nearly(Mark const& mark, Page const& page
         return sighting(Nearness::Nearly, std::move(*hit), text,
                         single == mark.single.end() ? OTHER_WAYS : single->difference);
     }
-    if (mark.zone->hasLocation() && !mark.field->strRegex().starts_with("\\A")) {
-        Cfg::Rect const& location = mark.zone->location();
-        ZoneText const wider = ZoneText::inside(page, layout, grown(location));
+    bool const liesSomewhere = view.place.location && view.place.whyNowhere.empty();
+    if (liesSomewhere && !mark.field->strRegex().starts_with("\\A")) {
+        Box const& location = *view.place.location;
+        ZoneText const wider = ZoneText::inside(page, layout, grown(location), view.place.order);
         if (auto hit = foundBy(mark.loose, wider)) {
             MarkSighting beyond = sighting(Nearness::Nearly, std::move(*hit), wider, {});
             beyond.difference = Base::withMillimetres(reach(beyond.box, location)) + " beyond the zone \"" +

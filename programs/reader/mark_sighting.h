@@ -3,6 +3,7 @@
 
 #include "programs/reader/layout.h"
 #include "programs/reader/pattern_time.h"
+#include "programs/reader/reading_rules.h"
 #include "programs/reader/trace.h"
 
 #include "vlservice/extract/extract_preset.h"
@@ -35,8 +36,8 @@ struct MarkSighting {
 /// The marks of a preset and what is like them.
 class MarkWatch {
 public:
-    /// The preset must live longer.
-    explicit MarkWatch(Cfg::ExtractPreset const& preset);
+    /// Both must live longer. Zones that the rules put on other pages than a letter's first have no marks.
+    MarkWatch(Cfg::ExtractPreset const& preset, ReadingRules const& rules);
 
     std::size_t count() const { return marks_.size(); }
     std::string const& nameOf(std::size_t mark) const { return marks_[mark].field->name(); }
@@ -55,6 +56,7 @@ private:
     };
     struct Mark {
         Cfg::ExtractZone const* zone;
+        ZoneRules rules;
         Cfg::ExtractField const* field;
         /// Taken in all these ways together, then in one each.
         Reading loose;
@@ -63,7 +65,7 @@ private:
         std::optional<Reading> label;
     };
 
-    static Mark markOf(Cfg::ExtractZone const& zone, Cfg::ExtractField const& field);
+    static Mark markOf(Cfg::ExtractZone const& zone, ZoneRules const* rules, Cfg::ExtractField const& field);
     std::optional<MarkSighting> nearly(Mark const& mark, Page const& page, Layout const& layout) const;
 
     std::vector<Mark> marks_;

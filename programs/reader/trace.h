@@ -66,6 +66,12 @@ struct PageTrace {
     bool beginsLetter = false;
     /// In the order of the preset. Those that "reading" puts on other pages are there when a letter begins.
     std::vector<ZoneTrace> zones;
+    /// What makes a page that begins no letter look like one that does, and where that stands.
+    struct Doubt {
+        std::string says;
+        Box box = {};
+    };
+    std::optional<Doubt> doubtfulJoin = {};
 
     /// The field of that name whose value counts; null when none of them has a value.
     FieldTrace const* counting(std::string const& name) const;

@@ -19,6 +19,7 @@ constexpr Box EVERYWHERE{std::numeric_limits<int>::min(), std::numeric_limits<in
 ZonePlace placeOn(Page const& page, ExtractZone const& zone, Point origin) {
     ZonePlace place;
     place.page = page.number;
+    place.hasAddress = zone.hasAddress();
     Cfg::Rect const& at = zone.location();
     if (zone.hasLocation())
         place.location = Box{at.left, at.top, at.right, at.bottom}.movedBy(origin);
@@ -71,8 +72,10 @@ ZoneText textOf(Page const& page, Layout const& layout, ExtractZone const& zone)
 ZoneText textAt(Page const& page, Layout const& layout, ZonePlace const& place) {
     if (!place.whyNowhere.empty())
         return {};
-    return place.location ? ZoneText::inside(page, layout, *place.location, place.order)
-                          : ZoneText::nearest(page, layout, place.point);
+    if (place.location)
+        return ZoneText::inside(page, layout, *place.location, place.order);
+    return place.hasAddress ? ZoneText::nearestAddress(page, layout, place.point)
+                            : ZoneText::nearest(page, layout, place.point);
 }
 
 } // namespace Reader

@@ -21,6 +21,8 @@ struct ZonePlace {
     /// ... which is here.
     Point point = {};
     ReadingOrder order = ReadingOrder::Rows;
+    /// A postal address may be in it.
+    bool hasAddress = false;
     /// Why the zone lies nowhere, as a clause; empty when it does.
     std::string whyNowhere = {};
     /// The anchor took so long that it was given up.

@@ -1,6 +1,7 @@
 #include "programs/reader/zone_text.h"
 
 #include "programs/base/utf8.h"
+#include "programs/reader/address_text.h"
 
 #include <algorithm>
 #include <optional>
@@ -9,6 +10,9 @@
 
 namespace Reader {
 namespace {
+
+/// Between the blocks of one address, in font sizes: a blank line, and what a form leaves free.
+constexpr int MOST_FREE_LINES = 3;
 
 /// The part of a word's box that some of its characters take, as if all were equally wide.
 Box partOf(Word const& word, std::size_t begin, std::size_t end) {
@@ -54,6 +58,53 @@ std::vector<Line const*> linesOf(std::vector<Block> const& blocks, Layout const&
 /// From this ratio on a line is set smaller than another, as blocks have it.
 bool isSmaller(int size, int other) { return size * 6LL <= other * 5LL; }
 
+/// Whether the lower block goes on in the same column and print, with a few blank lines between them at most.
+bool goesOnIn(Block const& upper, Block const& lower, Layout const& layout) {
+    Line const& above = layout.lines[upper.endLine - 1];
+    Line const& below = layout.lines[lower.firstLine];
+    Frame const a = frameOf(upper.box, above.turn);
+    Frame const b = frameOf(lower.box, below.turn);
+    return above.turn == below.turn && !isSmaller(above.size, below.size) &&
+           !isSmaller(below.size, above.size) && std::abs(a.start - b.start) <= above.size &&
+           b.top >= a.bottom - above.size / 2 && b.top - a.bottom <= MOST_FREE_LINES * above.size;
+}
+
+using Blocks = std::vector<Block const*>;
+
+/// The nearest block that the condition fits, as its distance in height tells; null without one.
+template<typename Condition>
+Block const* nearestBlock(Block const& block, Layout const& layout, Condition const& fits) {
+    Block const* nearest = nullptr;
+    for (Block const& other : layout.blocks)
+        if (&other != &block && fits(other) &&
+            (!nearest ||
+             std::abs(other.box.top - block.box.top) < std::abs(nearest->box.top - block.box.top)))
+            nearest = &other;
+    return nearest;
+}
+
+/// Two and three blocks that stand below one another, one of which is the given one; the fewest first.
+std::vector<Blocks> groupsAround(Block const& block, Layout const& layout) {
+    auto const below = [&](Block const& upper) {
+        return nearestBlock(upper, layout,
+                            [&](Block const& other) { return goesOnIn(upper, other, layout); });
+    };
+    auto const above = [&](Block const& lower) {
+        return nearestBlock(lower, layout,
+                            [&](Block const& other) { return goesOnIn(other, lower, layout); });
+    };
+    Block const* const next = below(block);
+    Block const* const last = above(block);
+    std::vector<Blocks> groups{{&block, next}, {last, &block}};
+    groups.push_back({last, &block, next});
+    groups.push_back({&block, next, next ? below(*next) : nullptr});
+    groups.push_back({last ? above(*last) : nullptr, last, &block});
+    std::erase_if(groups, [](Blocks const& group) {
+        return std::find(group.begin(), group.end(), nullptr) != group.end();
+    });
+    return groups;
+}
+
 } // namespace
 
 ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& location, ReadingOrder order) {
@@ -68,14 +119,31 @@ ZoneText ZoneText::inside(Page const& page, Layout const& layout, Box const& loc
     return zone;
 }
 
-ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) {
+ZoneText ZoneText::ofBlocks(Page const& page, Layout const& layout, std::vector<Block const*> const& blocks) {
     ZoneText zone;
-    if (Block const* const block = layout.nearestBlock(point)) {
+    for (Block const* const block : blocks) {
         for (std::size_t i = block->firstLine; i < block->endLine; ++i)
             zone.addLine(page, layout.lines[i]);
         zone.addBlock(*block);
     }
     return zone;
+}
+
+ZoneText ZoneText::nearest(Page const& page, Layout const& layout, Point point) {
+    Block const* const block = layout.nearestBlock(point);
+    return block ? ofBlocks(page, layout, {block}) : ZoneText();
+}
+
+ZoneText ZoneText::nearestAddress(Page const& page, Layout const& layout, Point point) {
+    ZoneText nearest = ZoneText::nearest(page, layout, point);
+    if (nearest.lines_.empty() || looksLikePostalAddress(nearest.text()))
+        return nearest;
+    for (auto const& blocks : groupsAround(*layout.nearestBlock(point), layout)) {
+        ZoneText joined = ofBlocks(page, layout, blocks);
+        if (looksLikePostalAddress(joined.text()))
+            return joined;
+    }
+    return nearest;
 }
 
 ZoneText ZoneText::given(std::string const& text) {

@@ -33,6 +33,9 @@ public:
                            ReadingOrder order = ReadingOrder::Rows);
     /// The block nearest to the point.
     static ZoneText nearest(Page const& page, Layout const& layout, Point point);
+    /// The same block, and the ones right above and below it where only all of them together read as a postal
+    /// address, from top to bottom.
+    static ZoneText nearestAddress(Page const& page, Layout const& layout, Point point);
     /// Text that stands on no page; its lines are cut as those of a page are.
     static ZoneText given(std::string const& text);
 
@@ -77,6 +80,7 @@ private:
         std::size_t textEnd = 0;
     };
 
+    static ZoneText ofBlocks(Page const& page, Layout const& layout, std::vector<Block const*> const& blocks);
     void addBlock(Block const& block);
     void addLine(Page const& page, Line const& line);
     std::size_t countSmallerLinesAbove() const;

@@ -131,6 +131,53 @@ TEST(Addresses, InSeveralBlocksAreJoinedFromTopToBottom) {
     EXPECT_EQ(windowOf(set).text(), "Lena\nOrchard Close\nCT5\nUnited Kingdom");
 }
 
+/// Of a zone that is found by its point, 45 mm across and 62 mm down.
+std::string nearestText(Typesetter const& set,
+                        std::string const& fields = R"({"name": "postal", "priority": 1,
+    "value_extract": "\\A(?<VAL>(.+\\n?)+)\\Z"})") {
+    std::string const zone = R"({"name": "_Address", "fields": [)" + fields + "]}";
+    return textOf(set.page, layOut(set.page), Cfg::ExtractZone(json::strToObject(zone.data(), zone.size())))
+        .text();
+}
+
+Typesetter withATownApart() {
+    Typesetter set;
+    set.line(2500, 5000, "Candle Works Ltd, 1 Wick Lane, Leeds LS1 4AP", SMALL);
+    set.line(2500, 6000, "Lena Brandt");
+    set.line(2500, 6480, "3 Orchard Close");
+    set.line(2500, 7440, "Whitstable CT5 1AA");
+    set.line(2500, 9500, "Dear Ms Brandt,");
+    return set;
+}
+
+TEST(Addresses, InSeveralBlocksAreJoinedWithoutALocationToo) {
+    EXPECT_EQ(nearestText(withATownApart()), "Lena Brandt\n3 Orchard Close\nWhitstable CT5 1AA");
+    Typesetter scattered;
+    scattered.line(2500, 4600, "Lena Brandt");
+    scattered.line(2500, 5600, "3 Orchard Close");
+    scattered.line(2500, 6600, "Whitstable CT5 1AA");
+    EXPECT_EQ(nearestText(scattered), "Lena Brandt\n3 Orchard Close\nWhitstable CT5 1AA");
+}
+
+TEST(Addresses, AreJoinedOnlyWhereTheBlocksTogetherReadAsOne) {
+    std::string const upper = "Lena Brandt\n3 Orchard Close";
+    EXPECT_EQ(nearestText(withATownApart(), R"({"name": "total", "value_extract": "x"})"), upper);
+    for (auto const& [left, base, town, size] :
+         {std::tuple(2500, 9000, "Whitstable CT5 1AA", Typesetter::SIZE),
+          {6000, 7440, "Whitstable CT5 1AA", Typesetter::SIZE},
+          {2500, 7440, "Whitstable CT5 1AA", SMALL},
+          {2500, 7440, "Our order of May", Typesetter::SIZE}}) {
+        Typesetter set;
+        set.line(2500, 6000, "Lena Brandt");
+        set.line(2500, 6480, "3 Orchard Close");
+        set.line(left, base, town, size);
+        EXPECT_EQ(nearestText(set), upper) << left << ' ' << base << town << size;
+    }
+    Typesetter whole = withSendersLine();
+    whole.line(2500, 7900, "United Kingdom");
+    EXPECT_EQ(nearestText(whole), "Lena Brandt\n3 Orchard Close\nWhitstable CT5 1AA");
+}
+
 TEST(Addresses, BesideOtherTextAreReadBlockByBlock) {
     Typesetter set;
     set.line(2500, 6000, "Lena Brandt");

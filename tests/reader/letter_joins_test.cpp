@@ -107,6 +107,64 @@ TEST(DoubtfulJoins, AreMarksThatStandALittleBeyondTheirZone) {
         IsEmpty());
 }
 
+ReadingRules headRules(std::string const& rules) {
+    std::string const all = R"({"zones": {"Head": )" + rules + "}}";
+    std::vector<RulesFault> faults;
+    ReadingRules const read = ReadingRules::from(json::strToObject(all.data(), all.size()), faults);
+    EXPECT_THAT(faults, IsEmpty());
+    return read;
+}
+
+TEST(DoubtfulJoins, AreMarksInZonesThatAnAnchorPlaces) {
+    auto const preset = presetWith(NUMBER_MARK, R"({"left": 0, "top": 0, "right": 9000, "bottom": 900})");
+    ReadingRules const rules = headRules(R"({"anchor": "^Acme"})");
+    auto const doubtsIn = [&](std::string const& head) {
+        Document document =
+            openDocument(typed(ADA, "Acme\nInvoice No. 4711") + '\f' + typed(TABLE, head), "batch.txt");
+        return readLetters(document, preset, nullptr, rules).at(0).doubtfulJoins;
+    };
+    ASSERT_THAT(doubtsIn("\nAcme\nINVOICE NO. 4712"), SizeIs(1));
+    EXPECT_THAT(doubtsIn("Acme\n\n\nInvoice No. 4712").at(0).says, HasSubstr("mm beyond the zone \"Head\""));
+    EXPECT_THAT(doubtsIn("INVOICE NO. 4712"), IsEmpty());
+}
+
+TEST(DoubtfulJoins, AreMarksInZonesThatAreReadByColumns) {
+    std::string const mark = "^Invoice\\\\nNo. (?<VAL>\\\\d+)$";
+    ReadingRules const rules = headRules(R"({"column": true})");
+    auto const lettersIn = [&](std::string const& head) {
+        Document document = openDocument(typed(ADA, "Invoice              Date\nNo. 4711             5 May") +
+                                             '\f' + typed(TABLE, head),
+                                         "batch.txt");
+        return readLetters(document, presetWith(mark), nullptr, rules);
+    };
+    EXPECT_THAT(lettersIn("Invoice              Date\nNo. 4712             5 May"), SizeIs(2));
+    EXPECT_THAT(lettersIn("INVOICE              Date\nNO. 4712             5 May").at(0).doubtfulJoins,
+                SizeIs(1));
+}
+
+TEST(DoubtfulJoins, AreNoMarksOfOtherPages) {
+    Document document =
+        openDocument(typed(ADA, "Invoice No. 4711") + '\f' + typed(TABLE, "INVOICE NO. 4712"), "batch.txt");
+    EXPECT_THAT(readLetters(document, presetWith(NUMBER_MARK), nullptr, headRules(R"({"page": 2})"))
+                    .at(0)
+                    .doubtfulJoins,
+                IsEmpty());
+}
+
+TEST(DoubtfulJoins, SayWhereThePageLooksLikeThat) {
+    Document document =
+        openDocument(typed(ADA, "Invoice No. 4711") + '\f' + typed(TABLE, "INVOICE NO. 4712"), "batch.txt");
+    Trace trace;
+    auto const letters = readLetters(document, presetWith(NUMBER_MARK), &trace);
+    ASSERT_THAT(letters.at(0).doubtfulJoins, SizeIs(1));
+    DoubtfulJoin const& join = letters[0].doubtfulJoins[0];
+    EXPECT_NE(join.box, Box());
+    EXPECT_FALSE(trace.pages.at(0).doubtfulJoin);
+    ASSERT_TRUE(trace.pages.at(1).doubtfulJoin);
+    EXPECT_EQ(trace.pages[1].doubtfulJoin->says, join.says);
+    EXPECT_EQ(trace.pages[1].doubtfulJoin->box, join.box);
+}
+
 TEST(DoubtfulJoins, AreAllLettersOfABatchWhereTheMarkIsNowhere) {
     EXPECT_THAT(doubtsOf({typed("", "INVOICE NO. 4711"), typed("", "more"), typed("", "INVOICE NO. 4712"),
                           typed("", "INVOICE NO. 4713")},

@@ -101,7 +101,8 @@ void print(std::ostream& out, DocumentReading const& reading) {
 
 void explain(ReadResult& result, OpenDocument const& read) {
     json::Object explanation = result.reading.trace.toObject();
-    explainPages(explanation, read.document, read.preset, read.trace);
+    explainPages(explanation, read.document, read.preset, Reader::ReadingRules::of(read.packPreset),
+                 read.trace);
     result.reading.trace = explanation;
 }
 

@@ -101,14 +101,18 @@ bool isFoundOn(PageTrace const& page, std::string const& name) {
 class PageExplainer {
 public:
     PageExplainer(PageTrace const& trace, std::vector<int> otherPages, Cfg::ExtractPreset const& preset,
-                  ReadPages& pages, Reader::PatternTime& time)
-        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), pages_(pages), time_(time) {}
+                  Reader::ReadingRules const& rules, ReadPages& pages, Reader::PatternTime& time)
+        : trace_(trace), otherPages_(std::move(otherPages)), preset_(preset), rules_(rules), pages_(pages),
+          time_(time) {}
 
     json::Object explain() const {
         json::Array zones;
         for (ZoneTrace const& zone : trace_.zones)
             zones.append(explain(zone));
         json::Object object{{PAGE, trace_.page}, {BEGINS_LETTER, trace_.beginsLetter}, {ZONES, zones}};
+        if (trace_.doubtfulJoin)
+            object.set(MAY_BEGIN_LETTER, json::Object{{SAYS, trace_.doubtfulJoin->says},
+                                                      {BOX, toJson(trace_.doubtfulJoin->box)}});
         if (LaidOutPage const* const page = pages_.page(trace_.page)) {
             object.set(WIDTH, page->page->width);
             object.set(HEIGHT, page->page->height);
@@ -187,7 +191,7 @@ private:
         if (!trace_.beginsLetter || isFoundOn(trace_, trace.definition->name()))
             return;
         json::Array misses;
-        MissedField const missed{preset_, zone, trace, trace_.page, otherPagesThan(zone.place.page)};
+        MissedField const missed{preset_, rules_, zone, trace, trace_.page, otherPagesThan(zone.place.page)};
         for (NearMiss const& miss : nearMissesOf(missed, pages_, time_))
             misses.append(toJson(miss));
         if (!misses.empty())
@@ -204,6 +208,7 @@ private:
     PageTrace const& trace_;
     std::vector<int> otherPages_;
     Cfg::ExtractPreset const& preset_;
+    Reader::ReadingRules const& rules_;
     ReadPages& pages_;
     Reader::PatternTime& time_;
 };
@@ -233,13 +238,14 @@ json::Object explainPresets(Cfg::Presets const& presets, std::string const& docu
 }
 
 void explainPages(json::Object& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
-                  Reader::Trace const& trace, Reader::PatternLimits const& limits) {
+                  Reader::ReadingRules const& rules, Reader::Trace const& trace,
+                  Reader::PatternLimits const& limits) {
     ReadPages pages(document, Reader::rulesOf(preset));
     Reader::PatternTime time(limits);
     json::Array explained;
     for (std::size_t i = 0; i < trace.pages.size(); ++i)
         explained.append(
-            PageExplainer(trace.pages[i], otherPagesOf(i, trace, pages.count()), preset, pages, time)
+            PageExplainer(trace.pages[i], otherPagesOf(i, trace, pages.count()), preset, rules, pages, time)
                 .explain());
     explanation.set(PAGE_COUNT, pages.count());
     explanation.set(PAGES, explained);

@@ -18,10 +18,11 @@ json::Object explainPresets(Cfg::Presets const& presets, std::string const& docu
 constexpr Reader::PatternLimits NEAR_MISS_LIMITS{std::chrono::seconds(2), std::chrono::seconds(10)};
 
 /// Adds what was seen on the pages to what explainPresets() gave. The trace is that of reading the document
-/// by the preset. Near misses are sought on all pages of a letter, so that this costs more than the reading
-/// itself; `limits` are those of all patterns that are tried for a field, and for all.
+/// by the preset and the rules. Near misses are sought on all pages of a letter, so that this costs more than
+/// the reading itself; `limits` are those of all patterns that are tried for a field, and for all.
 void explainPages(json::Object& explanation, Reader::Document& document, Cfg::ExtractPreset const& preset,
-                  Reader::Trace const& trace, Reader::PatternLimits const& limits = NEAR_MISS_LIMITS);
+                  Reader::ReadingRules const& rules, Reader::Trace const& trace,
+                  Reader::PatternLimits const& limits = NEAR_MISS_LIMITS);
 
 /// The keys and words of an explanation, shared by those who read it.
 namespace Explanation {
@@ -59,6 +60,7 @@ constexpr char const* WHY = "why";
 constexpr char const* WIDTH = "width";
 constexpr char const* HEIGHT = "height";
 constexpr char const* BEGINS_LETTER = "begins_letter";
+constexpr char const* MAY_BEGIN_LETTER = "may_begin_letter";
 
 // Of a zone.
 constexpr char const* LOCATION = "location";

@@ -76,6 +76,9 @@ private:
                     millimetres(page.get(WIDTH).intOrZero()) + " by " +
                     millimetres(page.get(HEIGHT).intOrZero()) +
                     (page.get(BEGINS_LETTER).isTrue() ? ": a letter begins here" : ": begins no letter"));
+        if (json::Value const doubt = page.get(MAY_BEGIN_LETTER))
+            line(6, "it may begin a letter all the same: " + textOf(doubt.toObject(), SAYS) + ", at " +
+                        placeInWords(doubt.toObject().get(BOX)));
         isLetter_ = page.get(BEGINS_LETTER).isTrue();
         for (json::Value const& zone : page.get(ZONES).toArray())
             printZone(zone.toObject());

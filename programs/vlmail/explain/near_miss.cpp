@@ -3,6 +3,7 @@
 #include "programs/base/log_capture.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 
+#include <algorithm>
 #include <array>
 #include <optional>
 #include <utility>
@@ -120,6 +121,21 @@ NearMiss outOfTime(Reader::PatternTime const& time) {
 }
 
 } // namespace
+
+int MissedField::lastPage() const {
+    int last = std::max(firstPage, page());
+    for (int const other : otherPages)
+        last = std::max(last, other);
+    return last;
+}
+
+bool MissedField::mayLieOn(int number, Cfg::ExtractZone const& one) const {
+    using Pages = Reader::ZoneRules::Pages;
+    Reader::ZoneRules const said = rulesFor(one) ? *rulesFor(one) : Reader::ZoneRules();
+    if (said.pages == Pages::Any)
+        return number >= firstPage;
+    return number == (said.pages == Pages::Last ? lastPage() : firstPage + said.page - 1);
+}
 
 char const* nameOf(NearMissKind kind) { return WAYS[static_cast<std::size_t>(kind)].name; }
 

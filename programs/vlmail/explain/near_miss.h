@@ -53,6 +53,7 @@ struct NearMiss {
 /// A field that a letter lacks or has an invalid value of, with the search for it.
 struct MissedField {
     Cfg::ExtractPreset const& preset;
+    Reader::ReadingRules const& rules;
     Reader::ZoneTrace const& zone;
     /// One of the zone's.
     Reader::FieldTrace const& field;
@@ -63,6 +64,11 @@ struct MissedField {
 
     /// Where it was searched; 0 when the letter has no such page.
     int page() const { return zone.place.page; }
+    int lastPage() const;
+    /// Null for a zone that nothing is said about.
+    Reader::ZoneRules const* rulesFor(Cfg::ExtractZone const& one) const { return rules.forZone(one.name()); }
+    /// Whether that zone of the preset may lie on the page.
+    bool mayLieOn(int number, Cfg::ExtractZone const& one) const;
 };
 
 /// At most three, the likeliest first; those that would give a valid value stand in front of those that would

@@ -43,16 +43,18 @@ constexpr std::array SMALLER_DISTANCES{1.6, 1.4, 1.2};
 constexpr Rule LINE_DISTANCE{"max_line_distance", &LayoutRules::maxLineDistance, LARGER_DISTANCES,
                              SMALLER_DISTANCES};
 
-/// The names of the preset's fields that are found on the page as it is laid out; none when that fails.
-std::set<std::string> foundOn(LaidOutPage const& page, Cfg::ExtractPreset const& preset) {
+/// The names of the preset's fields that are found on the page as it is laid out, in the zones that lie on
+/// it; none when that fails.
+std::set<std::string> foundOn(Search const& search, LaidOutPage const& page) {
+    MissedField const& missed = search.missed();
     Reader::PageTrace trace;
     Reader::PatternTime time;
-    Reader::ReadingRules const rules;
-    Reader::FieldSearch fields({}, rules, time);
+    Reader::FieldSearch fields({}, missed.rules, time);
     std::set<std::string> names;
     try {
-        for (Cfg::ExtractZone const& zone : preset.zones())
-            fields.search(zone, {Reader::textOf(*page.page, page.layout, zone), {}});
+        for (Cfg::ExtractZone const& zone : missed.preset.zones())
+            if (missed.mayLieOn(page.page->number, zone))
+                fields.search(zone, {search.textOn(page, zone), {}});
         fields.searchJoinedLines();
         fields.finish(&trace);
     } catch (Base::Error const&) {
@@ -68,10 +70,9 @@ std::set<std::string> foundOn(LaidOutPage const& page, Cfg::ExtractPreset const&
 /// What a layout that holds for the whole preset would lose, as the end of a sentence; empty when it loses
 /// nothing.
 std::string lossesBy(Search const& search, LaidOutPage const& changed) {
-    Cfg::ExtractPreset const& preset = search.missed().preset;
-    std::set<std::string> const after = foundOn(changed, preset);
+    std::set<std::string> const after = foundOn(search, changed);
     std::string lost;
-    for (std::string const& name : foundOn(search.page(), preset))
+    for (std::string const& name : foundOn(search, search.page()))
         if (!after.contains(name))
             lost += (lost.empty() ? "" : ", ") + Base::inQuotes(name);
     return lost.empty() ? lost : ", but would lose " + lost;
@@ -176,6 +177,9 @@ std::string otherPageAdvice(Search const& search, int page) {
     int const first = search.missed().firstPage;
     if (page < first)
         return "the preset skips the first page: leave \"skip_first_page\" out";
+    Reader::ZoneRules const* const rules = search.missed().rulesFor(search.zone());
+    if (rules && rules->pages == Reader::ZoneRules::Pages::Any)
+        return "the zone lies on any page: move it, or give the field a zone of its own";
     std::string const rule = search.pageNumber() == first
                                  ? "fields are searched on the first page of a letter"
                                  : "the zone lies on page " + std::to_string(search.pageNumber());
@@ -266,9 +270,9 @@ std::optional<Found> otherZone(Search const& search) {
         return std::nullopt;
     Best best;
     for (Cfg::ExtractZone const& zone : search.missed().preset.zones()) {
-        if (&zone == &search.zone())
+        if (&zone == &search.zone() || !search.missed().mayLieOn(search.pageNumber(), zone))
             continue;
-        auto const hit = search.find(textOf(*search.page().page, search.page().layout, zone));
+        auto const hit = search.find(search.textOn(search.page(), zone));
         best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
             return "would match " + excerpt(at.match.text) + " in the zone " + Base::inQuotes(zone.name()) +
                    ": move the field there";

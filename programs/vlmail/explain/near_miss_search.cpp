@@ -3,6 +3,7 @@
 #include "programs/base/quoting.h"
 #include "programs/reader/field_search.h"
 #include "programs/reader/joined_search.h"
+#include "programs/reader/value_reading.h"
 
 #include <algorithm>
 #include <limits>
@@ -24,9 +25,9 @@ constexpr std::size_t MAX_FAILURES = 2;
 constexpr Box EVERYWHERE{std::numeric_limits<int>::min(), std::numeric_limits<int>::min(),
                          std::numeric_limits<int>::max(), std::numeric_limits<int>::max()};
 
-bool isValid(ExtractField const& field, ExtractedField value) {
+bool isValid(ExtractField const& field, ExtractedField value, Reader::ReadingRules const& rules) {
     try {
-        field.validate(value);
+        Reader::readValue(field, value, rules);
         return value.isValid();
     } catch (std::exception const&) {
         return false;
@@ -43,8 +44,9 @@ std::vector<int> Search::otherPages() const {
     return pages;
 }
 
-ZoneText Search::textOn(LaidOutPage const& page) const {
-    return textAt(*page.page, page.layout, missed_.zone.place);
+ZoneText Search::textOn(LaidOutPage const& page, Cfg::ExtractZone const& zone) const {
+    Reader::ZoneRules const* const rules = missed_.rulesFor(zone);
+    return viewOf(*page.page, page.layout, zone, rules ? *rules : Reader::ZoneRules()).text;
 }
 
 ZoneText Search::textInside(Box const& location) const {
@@ -95,14 +97,14 @@ std::optional<Hit> Search::cut(ExtractField const& field, ZoneText& text) const 
     std::shared_ptr<ExtractedField> value = cutAsItStands(field, text, trace);
     if (trace.wantsJoinedLines() && !isGivenUp()) {
         value = cutJoinedField(field, text, trace, [&](ExtractedField const& found) {
-            return isValid(field, found) ? Reader::Worth::Good : Reader::Worth::Poor;
+            return isValid(field, found, missed_.rules) ? Reader::Worth::Good : Reader::Worth::Poor;
         });
         if (trace.failure)
             failures_.push_back(*trace.failure);
     }
     if (!trace.match)
         return std::nullopt;
-    return Hit{std::move(*trace.match), trace.rawText && value && isValid(field, *value)};
+    return Hit{std::move(*trace.match), trace.rawText && value && isValid(field, *value, missed_.rules)};
 }
 
 std::optional<PlainHit> Search::find(ExtractField const& field, std::string text) const {
@@ -118,7 +120,7 @@ std::optional<PlainHit> Search::find(ExtractField const& field, std::string text
         failures_.push_back(Reader::requireMemory(reason));
     });
     if (hit && value)
-        hit->isValid = isValid(field, *value);
+        hit->isValid = isValid(field, *value, missed_.rules);
     return hit;
 }
 

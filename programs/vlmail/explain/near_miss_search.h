@@ -69,8 +69,10 @@ public:
     /// Whether a hit says anything: another refused value is no help where there is one already.
     bool helps(bool isValid) const { return isValid || !isRefused(); }
 
-    /// The zone's text on that page.
-    Reader::ZoneText textOn(LaidOutPage const& page) const;
+    /// The zone's text on that page; its anchor, where it has one, is searched there.
+    Reader::ZoneText textOn(LaidOutPage const& page) const { return textOn(page, zone()); }
+    /// The same of another zone of the preset.
+    Reader::ZoneText textOn(LaidOutPage const& page, Cfg::ExtractZone const& zone) const;
     /// The same with another location.
     Reader::ZoneText textInside(Reader::Box const& location) const;
     static Reader::ZoneText everythingOn(LaidOutPage const& page);

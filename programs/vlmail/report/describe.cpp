@@ -163,6 +163,21 @@ Fault faultOf(Production::Finding const& finding, Letter& letter, LetterReading 
     return fault;
 }
 
+/// A page that may begin another letter: what makes it look like that is drawn on it.
+Fault faultOf(Reader::DoubtfulJoin const& join, Letter& letter, LetterReading const& reading,
+              PrintedPages& pages) {
+    Fault fault{"letter-not-separated", true, pagesInWords({join.page}),
+                "may begin another letter: " + join.says,
+                "correct the mark or the document, or mail them as one letter with --accept-joined"};
+    if (join.box == Box())
+        return fault;
+    fault.box = turned(join.box, pages.document().pageSize(join.page), pages.quarterTurns(join.page));
+    if (std::ranges::find(letter.sheets, join.page, &Sheet::page) != letter.sheets.end() ||
+        letter.sheets.size() < MOST_SHEETS)
+        fault.sheets.push_back(placeAmong(letter.sheets, join.page, reading, pages));
+    return fault;
+}
+
 Letter letterOf(LetterReading const& reading, PrintedPages& pages, Reader::PageTrace const& trace) {
     Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(reading, trace.page, pages)}};
     for (ZoneTrace const& seen : trace.zones) {
@@ -172,6 +187,8 @@ Letter letterOf(LetterReading const& reading, PrintedPages& pages, Reader::PageT
         turn(letter.zones.back(), read.size(), pages.quarterTurns(page));
         letter.zones.back().sheet = placeAmong(letter.sheets, page, reading, pages);
     }
+    for (Reader::DoubtfulJoin const& join : reading.doubtfulJoins)
+        letter.faults.push_back(faultOf(join, letter, reading, pages));
     for (Production::Finding const& finding : reading.findings)
         letter.faults.push_back(faultOf(finding, letter, reading, pages));
     letter.sides = sidesOf(reading, pages);

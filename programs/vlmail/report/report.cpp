@@ -186,7 +186,7 @@ std::string figureOf(Letter const& letter, std::size_t place, std::string const&
            ";--h:" + std::to_string(std::max(sheet.height, 1)) + "\">\n" + pictureOf(sheet) +
            overlaysOf(letter, place, anchor) + "</div>\n<figcaption>Page " + std::to_string(sheet.page) +
            (isSearched(letter, place) ? ", on which the fields of this letter were searched"
-                                      : ", on which something is wrong on paper") +
+                                      : ", on which something is wrong") +
            ".</figcaption></figure>\n";
 }
 
@@ -262,7 +262,7 @@ std::string rowOf(Fault const& fault, std::string const& anchor) {
 std::string faultsOf(Letter const& letter, std::string const& anchor) {
     if (letter.faults.empty())
         return {};
-    std::string html = "<table><caption>On paper</caption>\n<thead><tr><th scope=\"col\">Found</th><th "
+    std::string html = "<table><caption>What is wrong</caption>\n<thead><tr><th scope=\"col\">Found</th><th "
                        "scope=\"col\">State</th><th scope=\"col\">What and remedy</th></tr></thead>\n";
     for (std::size_t i = 0; i < letter.faults.size(); ++i)
         html += rowOf(letter.faults[i], numbered(anchor, 'p', i));
@@ -357,7 +357,7 @@ constexpr char const* LEGEND = R"html(<ul class="legend" aria-label="Marks on th
 <li><span class="match"></span>found</li>
 <li><span class="match quiet"></span>matched, but not used</li>
 <li><span class="match bad"></span>&#10007; invalid</li>
-<li><span class="fault"></span>&#10007; wrong on paper</li>
+<li><span class="fault"></span>&#10007; wrong</li>
 </ul>
 )html";
 

@@ -162,6 +162,27 @@ TEST_F(ExplanationTest, ForPeopleSaysWhichLinesWereJoined) {
     EXPECT_THAT(out_, HasSubstr("            matches \"Date: today\", joined with the line below, at "));
 }
 
+constexpr char const* MARKED =
+    R"text({"name": "number", "mark": 1, "value_extract": "^Invoice (?<VAL>\\d+)$"},
+    {"name": "to", "priority": 1, "send_to_server": true, "value_extract": "^To: (?<VAL>.+)$"})text";
+
+TEST_F(ExplanationTest, TellsThatAPageMayBeginALetterAndWhere) {
+    json::Object const reading = explainedFields("Invoice 17\nTo: Ada\n\fINVOICE 18\nTo: Lena\n", MARKED);
+    json::Array const pages = reading.get("trace").toObject().get("pages").toArray();
+    EXPECT_FALSE(pages.at(0).toObject().get("may_begin_letter"));
+    EXPECT_EQ(text(pages.at(1).toObject().get("may_begin_letter")), text(R"({
+        "says": "\"INVOICE 18\" nearly is the mark \"number\", with another letter case",
+        "box": {"left": 2500, "top": 1000, "right": 4617, "bottom": 1353}})"_json));
+}
+
+TEST_F(ExplanationTest, ForPeopleSaysThatAPageMayBeginALetter) {
+    explainedFields("Invoice 17\nTo: Ada\n\fINVOICE 18\nTo: Lena\n", MARKED);
+    vlmail({"letter", "--explain", "--settings", (folder_ / "settings.json").string(),
+            (folder_ / "letter.txt").string()});
+    EXPECT_THAT(out_, HasSubstr("      it may begin a letter all the same: \"INVOICE 18\" nearly is the mark "
+                                "\"number\", with another letter case, at left 25 mm, top 10 mm, "));
+}
+
 constexpr char const* PLACED =
     R"text({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
     {"name": "Total", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 900}, "fields": [

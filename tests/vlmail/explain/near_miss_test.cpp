@@ -196,6 +196,55 @@ TEST_F(NearMissTest, OfAZoneOfAnotherPageIsTheLettersOtherPages) {
             "set the zone's \"page\" in \"reading\" to 1, or move the text"));
 }
 
+TEST_F(NearMissTest, OfAnAnchoredZoneIsSoughtAtTheAnchorOfEachPage) {
+    EXPECT_THAT(
+        nearMissesIn(fieldOf(explainedText("\n\n\nSum\nTotal: 17\n\fSum\n", ELSEWHERE_PLACED), "total")),
+        ElementsAre(
+            "other_page: would match \"Total: 17\" on page 1 in the zone \"Top\"; the zone lies on page 2: "
+            "set the zone's \"page\" in \"reading\" to 1, or move the text"));
+}
+
+TEST_F(NearMissTest, OfAZoneOnAnyPageIsAPlaceOnThem) {
+    json::Object const reading =
+        explainedText("Sum\n\fSum" + std::string(15, '\n') + "Total: 17\n",
+                      R"_({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+        {"name": "Top", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 600}, "fields": [
+            {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"}]}]}],
+        "pack_presets": [{"name": "P", "reading": {"zones": {"Top": {"page": "any", "anchor": "^Sum"}}}}]})_");
+    EXPECT_THAT(
+        nearMissesIn(fieldOf(reading, "total")),
+        ElementsAre("other_page: would match \"Total: 17\" on page 2 outside the zone \"Top\"; the zone "
+                    "lies on any page: move it, or give the field a zone of its own"));
+}
+
+TEST_F(NearMissTest, ReadsValuesAsReadingSays) {
+    std::string const settings =
+        R"_({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+        {"name": "Top", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
+            {"name": "total", "value_type": 2, "value_extract": "^Total: (?<VAL>\\S+)$"}]}]}],
+        "pack_presets": [{"name": "P", "reading": {"decimal": ",", "grouping": "."}}]})_";
+    EXPECT_THAT(nearMissesIn(fieldOf(explainedText("TOTAL: 1.234,56\n", settings), "total")),
+                ElementsAre(StartsWith("letter_case: ")));
+}
+
+TEST_F(NearMissTest, LooksIntoOtherZonesWhereReadingPutsThem) {
+    auto const missesWith = [&](std::string const& other) {
+        return nearMissesIn(fieldOf(
+            explainedText("Top\n\n\n\n\n\n\n\n\n\n\n\n\n\nSum\nTotal: 17\n",
+                          R"_({"extract_presets": [{"match": "letter.*", "pack_preset": "P", "zones": [
+        {"name": "Top", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 1500}, "fields": [
+            {"name": "total", "value_extract": "^Total: (?<VAL>\\d+)$"}]},
+        {"name": "Sum", "location": {"left": 0, "top": 0, "right": 9000, "bottom": 900}, "fields": []}]}],
+        "pack_presets": [{"name": "P", "reading": {"zones": {"Sum": )_" +
+                              other + "}}}]}"),
+            "total"));
+    };
+    EXPECT_THAT(
+        missesWith(R"({"anchor": "^Sum"})"),
+        testing::Contains("other_zone: would match \"Total: 17\" in the zone \"Sum\": move the field there"));
+    EXPECT_THAT(missesWith(R"({"anchor": "^Sum", "page": 2})"), testing::Each(StartsWith("elsewhere: ")));
+}
+
 TEST_F(NearMissTest, IsNotSoughtForAZoneThatLiesNowhere) {
     EXPECT_THAT(nearMissesIn(fieldOf(explainedText("Sum\nTotal: 17\n", ELSEWHERE_PLACED), "total")),
                 IsEmpty());
@@ -318,7 +367,7 @@ TEST_F(NearMissTest, HaveATimeForEachDocumentAndSayWhenItIsUp) {
     Reader::Trace trace;
     Reader::readLetters(document, preset, &trace);
     json::Object explanation;
-    explainPages(explanation, document, preset, trace, {30ms, 30ms});
+    explainPages(explanation, document, preset, {}, trace, {30ms, 30ms});
     json::Object const reading{{"trace", explanation}};
     EXPECT_THAT(nearMisses(reading, "a"), testing::Contains(StartsWith("letter_case: ")));
     EXPECT_THAT(nearMisses(reading, "b"),

@@ -119,6 +119,26 @@ TEST_F(ReportCommand, PutsTheNameOfAMatchWhereItHidesNoText) {
     }
 }
 
+TEST_F(ReportCommand, DrawsWhatMakesAPageLookLikeTheFirstOfALetter) {
+    write("node.json", R"({"extract_presets": [{"match": ".*", "pack_preset": "P", "zones": [
+        {"name": "All", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, "fields": [
+            {"name": "number", "mark": 1, "value_extract": "^No (?<VAL>.*)$"}]}]}], "pack_presets": [{"name": "P"}]})");
+    write("two.txt", "No 1\n\fNO 2\n");
+    report({"two.txt"});
+    std::string const page = contentOf(path("report.html"));
+    EXPECT_THAT(page, HasSubstr("letter-not-separated"));
+    EXPECT_THAT(page, HasSubstr("may begin another letter: &quot;NO 2&quot; nearly is the mark "
+                                "&quot;number&quot;, with another letter case"));
+    EXPECT_THAT(page, HasSubstr("<figcaption>Page 2, on which something is wrong.</figcaption>"));
+    EXPECT_THAT(page, HasSubstr("<a class=\"fault\" id=\"d1l1p1\""));
+}
+
+TEST_F(ReportCommand, DrawsJoinedLinesWithAnInvalidValueLikeSureOnes) {
+    write("apart.txt", "To: Ada\n\n\n\n\n\n\nNo             twelve\n");
+    report({"apart.txt"});
+    EXPECT_THAT(contentOf(path("report.html")), HasSubstr("joined with the line to the right"));
+}
+
 TEST_F(ReportCommand, IsTheSameOnOneProcessAndOnTwo) {
     write("two.txt", LETTER);
     report({"one.txt", "two.txt"});

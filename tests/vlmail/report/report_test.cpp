@@ -332,7 +332,7 @@ TEST(FaultsOnPaper, AreDrawnOnEachOfTheirSheetsAndToldInATable) {
                                 "href=\"#d1l1p1\">clear-zone</a></th>"));
     EXPECT_THAT(html, HasSubstr("<small>pages 1-2</small>"));
     EXPECT_THAT(html, HasSubstr("<th scope=\"row\">embedded-file-lost</th>"));
-    EXPECT_THAT(html, HasSubstr("Page 2, on which something is wrong on paper."));
+    EXPECT_THAT(html, HasSubstr("Page 2, on which something is wrong."));
     EXPECT_THAT(html, Not(HasSubstr("d1l1p2\"")));
 }
 
