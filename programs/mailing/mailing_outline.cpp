@@ -1,6 +1,7 @@
 #include "programs/mailing/mailing_outline.h"
 
 #include "programs/base/error.h"
+#include "programs/mailing/json_walk.h"
 #include "programs/mailing/metadata.h"
 #include "programs/mailing/page_blob.h"
 #include "vlservice/json/json_text.h"
@@ -16,105 +17,6 @@ namespace {
 constexpr std::uint64_t MAX_BYTES = 256 << 20;
 
 [[noreturn]] void fail() { throw Base::Error("it is no metadata of a mailing"); }
-
-/// Walks over JSON text from the front.
-class JsonWalk {
-public:
-    explicit JsonWalk(std::string_view text) : text_(text) {}
-
-    /// Calls `member` with each key, in its quotes; it has to walk over the value.
-    template<typename Member>
-    void object(Member member) {
-        list('{', '}', [&] {
-            std::string_view const key = string();
-            take(':');
-            member(key);
-        });
-    }
-    /// Calls `element` for each; it has to walk over it.
-    template<typename Element>
-    void array(Element element) {
-        list('[', ']', element);
-    }
-    /// Walks over a value, whose text it gives.
-    std::string_view value() {
-        std::size_t const begin = next();
-        std::size_t depth = 0;
-        do {
-            depth = valueStep(depth);
-        } while (depth > 0);
-        return text_.substr(begin, at_ - begin);
-    }
-    void end() {
-        at_ = text_.find_first_not_of(SPACE, at_);
-        if (at_ != text_.npos)
-            fail();
-    }
-
-private:
-    static constexpr std::string_view SPACE = " \t\r\n";
-
-    /// Of what comes next but blanks.
-    std::size_t next() {
-        at_ = std::min(text_.find_first_not_of(SPACE, at_), text_.size());
-        if (at_ == text_.size())
-            fail();
-        return at_;
-    }
-    char peek() { return text_[next()]; }
-    void take(char wanted) {
-        if (peek() != wanted)
-            fail();
-        ++at_;
-    }
-    template<typename Element>
-    void list(char open, char close, Element element) {
-        take(open);
-        if (peek() == close)
-            return take(close);
-        for (;;) {
-            element();
-            if (peek() == close)
-                return take(close);
-            take(',');
-        }
-    }
-    std::string_view string() {
-        std::size_t const begin = next();
-        take('"');
-        for (; at_ < text_.size() && text_[at_] != '"'; ++at_)
-            if (text_[at_] == '\\')
-                ++at_;
-        if (at_ >= text_.size())
-            fail();
-        ++at_;
-        return text_.substr(begin, at_ - begin);
-    }
-    /// A bracket, a string, or a run of what stands between them; how deep it is behind that.
-    std::size_t valueStep(std::size_t depth) {
-        char const c = peek();
-        if (c == '"') {
-            string();
-        } else if (c == '{' || c == '[') {
-            ++at_;
-            return depth + 1;
-        } else if (c == '}' || c == ']') {
-            if (depth == 0)
-                fail();
-            ++at_;
-            return depth - 1;
-        } else if (depth == 0 && (c == ',' || c == ':')) {
-            fail();
-        } else {
-            // Inside of brackets commas and colons are passed over with the rest.
-            at_ = std::min(text_.find_first_of(depth == 0 ? "\"{}[],: \t\r\n" : "\"{}[]", at_), text_.size());
-        }
-        return depth;
-    }
-
-    std::string_view text_;
-    std::size_t at_ = 0;
-};
 
 struct Sheets {
     long long oneSided = 0;

@@ -98,13 +98,21 @@ Cfg::Presets NodeSettings::presets() const {
     }
 }
 
-Cfg::App NodeSettings::app() const {
+Cfg::App const& NodeSettings::app() const {
     try {
-        return {part(Cfg::App::PART_NAME), true, sorted_};
+        if (!app_)
+            app_ = std::make_shared<Cfg::App const>(part(Cfg::App::PART_NAME), true, sorted_);
+        return *app_;
     } catch (std::exception const& wrong) {
         throw Base::Error("cannot use the part \"app\" in " + place_ + ": " + wrong.what() +
                           "; correct it there");
     }
+}
+
+Policy::Rules const& NodeSettings::rules() const {
+    if (!rules_)
+        rules_ = std::make_shared<Policy::Rules const>(sourced_);
+    return *rules_;
 }
 
 } // namespace VlMail

@@ -1,6 +1,7 @@
 #pragma once
 // The settings that a command works with, from a JSON document on disk.
 
+#include "programs/policy/limits.h"
 #include "programs/policy/sourced_settings.h"
 #include "programs/protocol/settings.h"
 #include "vlservice/cfg/app.h"
@@ -8,6 +9,7 @@
 #include "vlservice/presets/presets.h"
 
 #include <filesystem>
+#include <memory>
 #include <string>
 
 namespace VlMail {
@@ -31,8 +33,11 @@ public:
     /// Completed by the global defaults, so that a pair of presets exists for every document's name.
     /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
     Cfg::Presets presets() const;
-    /// The part "app", completed by the global defaults. Throws Error when it cannot be understood.
-    Cfg::App app() const;
+    /// The part "app", completed by the global defaults. Throws Error when it cannot be understood. Read at
+    /// the first call, as rules().
+    Cfg::App const& app() const;
+    /// What they allow. Throws std::exception when a part cannot be understood.
+    Policy::Rules const& rules() const;
     /// The part's JSON as it stands in the document; the empty handle when it is not there.
     json::Value part(std::string const& name) const { return parts_.get(name); }
     /// With where each value comes from: a node, or the file.
@@ -55,6 +60,8 @@ private:
     json::Object parts_;
     json::Value answer_;
     Policy::SourcedSettings sourced_;
+    mutable std::shared_ptr<Cfg::App const> app_;
+    mutable std::shared_ptr<Policy::Rules const> rules_;
 };
 
 } // namespace VlMail

@@ -262,9 +262,8 @@ long long sheetsOf(LetterReading const& letter, Cfg::PackPreset const& preset, M
 
 void holdAgainstLimits(std::vector<LetterReading>& letters, Cfg::PackPreset const& preset,
                        NodeSettings const& settings, MakingReady const* making) {
-    Policy::Rules const rules(settings.sourced());
     for (LetterReading& letter : letters)
-        if (auto const refusal = Policy::refusalOfSheets(sheetsOf(letter, preset, making), rules))
+        if (auto const refusal = Policy::refusalOfSheets(sheetsOf(letter, preset, making), settings.rules()))
             letter.findings.insert(letter.findings.begin(),
                                    {Production::Code::TooManySheets,
                                     Production::Severity::Error,

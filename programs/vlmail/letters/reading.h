@@ -118,7 +118,8 @@ struct Along {
     Digest digest = Digest::No;
     Joins joins = Joins::Doubt;
     Checks checks = Checks::No;
-    /// Whether a letter is held against the settings' limit by itself. Who makes mailings asks for them whole.
+    /// Whether a letter is held against the settings' limit by itself. Who makes mailings asks for them
+    /// whole.
     enum class Limits : bool { No, Yes };
     Limits limits = Limits::No;
     /// Of the pages that are written, the first and every so many behind it are held against the document's.
