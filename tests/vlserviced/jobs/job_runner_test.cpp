@@ -749,6 +749,32 @@ TEST_F(JobRunnerTest, KeepsTrialsAndCancelledMailingsBehindARestart) {
     EXPECT_FALSE(fs::exists(outbox_ / "p2.mailing"));
 }
 
+TEST_F(JobRunnerTest, GoesOnBehindTheHandingOverWhereItWas) {
+    for (char const* id : {"waits", "taken", "done", "returned"})
+        acceptStored(id);
+    runner_->upload("", "");
+    doWork();
+    restart();
+    for (char const* id : {"taken", "done", "returned"})
+        fs::remove(upload_ / (id + std::string(".mailing")));
+    runner_->updateStatus("", "");
+    EXPECT_EQ(state("waits"), "submitted");
+    restart();
+    EXPECT_EQ(state("taken"), "lodged");
+    std::ofstream(upload_ / "done.mailing.status") << R"({"state":"delivered"})";
+    std::ofstream(upload_ / "returned.mailing.status") << R"({"state":"failed","text":"no such street"})";
+    runner_->updateStatus("", "");
+    for (int restarts = 0; restarts < 2; ++restarts) {
+        restart();
+        EXPECT_EQ(state("waits"), "submitted");
+        EXPECT_EQ(state("taken"), "lodged");
+        EXPECT_EQ(state("done"), "delivered");
+        EXPECT_EQ(state("returned"), "failed: the carrier: no such street");
+    }
+    EXPECT_TRUE(fs::exists(upload_ / "waits.mailing"));
+    EXPECT_FALSE(fs::exists(outbox_ / "waits.mailing"));
+}
+
 TEST_F(JobRunnerTest, RemovesBehindARestartWhatIsLeftOfACancelledMailing) {
     acceptStored("p1");
     doWork();
