@@ -1,11 +1,10 @@
 #include "programs/mailing/mailing_outline.h"
 
-#include "programs/base/error.h"
 #include "programs/mailing/json_walk.h"
 #include "programs/mailing/metadata.h"
+#include "programs/mailing/metadata_text.h"
 #include "programs/mailing/page_blob.h"
 #include "vlservice/json/json_text.h"
-#include "vlservice/pack/blob_format.h"
 
 #include <algorithm>
 #include <string>
@@ -14,20 +13,10 @@
 namespace Mailing {
 namespace {
 
-constexpr std::uint64_t MAX_BYTES = 256 << 20;
-
-[[noreturn]] void fail() { throw Base::Error("it is no metadata of a mailing"); }
-
 struct Sheets {
     long long oneSided = 0;
     long long bothSided = 0;
 };
-
-/// A key has to be there once. Any other way to spell it is none of ours.
-void takeOnce(bool& isTaken) {
-    if (std::exchange(isTaken, true))
-        fail();
-}
 
 Sheets sheetsOfDocument(JsonWalk& walk) {
     bool hasPages = false;
@@ -46,7 +35,7 @@ Sheets sheetsOfDocument(JsonWalk& walk) {
         }
     });
     if (!hasPages)
-        fail();
+        failAsMetadata();
     return {pages, isBlank ? 0 : (pages + 1) / 2};
 }
 
@@ -66,7 +55,7 @@ Sheets sheetsOfLetter(JsonWalk& walk) {
         });
     });
     if (!hasDocuments)
-        fail();
+        failAsMetadata();
     return sheets;
 }
 
@@ -78,15 +67,6 @@ Sheets mostSheets(JsonWalk& walk) {
         most.bothSided = std::max(most.bothSided, sheets.bothSided);
     });
     return most;
-}
-
-/// What its blob claims to hold.
-std::uint64_t claimedBytes(SharedMemBuffer const& blob) {
-    std::uint64_t bytes = 0;
-    for (std::size_t i = DB_ZIP_HEADER_SIZE; blob.size() >= DB_ZIP_HEADER_SIZE && i > DB_ZIP_MAGIC.size();
-         --i)
-        bytes = bytes << 8 | blob.data()[i - 1];
-    return bytes;
 }
 
 } // namespace
@@ -108,16 +88,14 @@ MailingOutline outlineIn(std::string_view text) {
     rest = '{' + rest + '}';
     json::Object const preset = json::strToObject(rest.data(), rest.size());
     if (!hasLetters || preset.get("letters"))
-        fail();
+        failAsMetadata();
     MailingOutline outline{packPresetIn(preset), 0};
     outline.mostSheets = outline.packPreset.duplex() ? most.bothSided : most.oneSided;
     return outline;
 }
 
 MailingOutline outlineOf(SharedMemBuffer metadata) {
-    if (claimedBytes(metadata) > MAX_BYTES)
-        fail();
-    SharedMemBuffer const text = expanded(std::move(metadata));
+    SharedMemBuffer const text = expandedMetadata(std::move(metadata));
     return outlineIn(viewOf(text));
 }
 

@@ -87,15 +87,6 @@ json::Object madeReadyToJson(MailedLetter const& letter) {
     return object;
 }
 
-MailedLetter letterFrom(json::Object const& object) {
-    MailedLetter letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
-    for (json::Value const& document : object.get(DOCUMENTS_KEY).toArray())
-        letter.documents.push_back(documentFrom(document.toObject()));
-    letter.sheets = object.get(SHEETS_KEY).intOrZero();
-    letter.colouredPages = object.get(COLOURED_PAGES_KEY).intOrZero();
-    return letter;
-}
-
 json::Array toJson(std::vector<UsedDocument> const& documents) {
     json::Array array;
     for (UsedDocument const& document : documents)
@@ -149,7 +140,7 @@ Metadata Metadata::fromJson(json::Object const& object) {
     Metadata metadata{
         object.get(ID_KEY).toString(), object.get(CREATED_KEY).toInt(), packPresetIn(object), {}};
     for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
-        metadata.letters.push_back(letterFrom(letter.toObject()));
+        metadata.letters.push_back(letterIn(letter.toObject()));
     metadata.madeReady = object.get(MADE_READY_KEY).isTrue();
     metadata.usedDocuments = usedDocumentsIn(object.get(USED_DOCUMENTS_KEY));
     metadata.entriesDigest = object.get(ENTRIES_DIGEST_KEY).textOrEmpty();
@@ -171,6 +162,15 @@ SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& d
     } catch (json::Exc const&) {
         return metadata;
     }
+}
+
+MailedLetter letterIn(json::Object const& object) {
+    MailedLetter letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
+    for (json::Value const& document : object.get(DOCUMENTS_KEY).toArray())
+        letter.documents.push_back(documentFrom(document.toObject()));
+    letter.sheets = object.get(SHEETS_KEY).intOrZero();
+    letter.colouredPages = object.get(COLOURED_PAGES_KEY).intOrZero();
+    return letter;
 }
 
 Cfg::PackPreset packPresetIn(json::Object const& metadata) {

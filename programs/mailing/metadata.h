@@ -79,6 +79,9 @@ struct Metadata {
 /// that has none stays as it is.
 SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& digest);
 
+/// The letter that an object among "letters" stands for. Throws std::exception.
+MailedLetter letterIn(json::Object const& object);
+
 /// The pack preset that an object of metadata holds beside its own keys. Throws std::exception.
 Cfg::PackPreset packPresetIn(json::Object const& metadata);
 

@@ -28,6 +28,7 @@ constexpr StateRow STATES[] = {
     {JobState::Failed, "failed", JobState::Failed},
     {JobState::Cancelled, "cancelled", JobState::Failed},
     {JobState::Tried, "tried", JobState::Queued},
+    {JobState::Delivering, "delivering", JobState::Submitted},
 };
 static_assert(std::size(STATES) == ALL_JOB_STATES.size());
 
@@ -64,6 +65,7 @@ struct JobsQuery::Keys {
         Asked{"ids", &JobsQuery::ids, TextsForm{MAX_JOBS}},
         Asked{"limit", &JobsQuery::limit, IntegerForm{.lowest = 1}, MAX_JOBS},
         Asked{"wait", &JobsQuery::wait, IntegerForm{}},
+        Asked{"letters", &JobsQuery::letters, FlagForm{}},
         Asked{"states", &JobsQuery::knownStates, TextsForm{MAX_STATES}},
     };
 };
@@ -85,6 +87,8 @@ struct JobReport::Keys {
         json::Key{"to_upload", &JobReport::toUpload},
         json::Key{"due", &JobReport::due},
         json::Key{"container", &JobReport::container},
+        json::Key{"letters", &JobReport::letters},
+        json::Key{"letters_left_out", &JobReport::lettersLeftOut},
     };
 };
 

@@ -1,6 +1,7 @@
 #pragma once
 // Jobs as client and service speak of them: their states, questions about them, changes and the answers.
 
+#include "programs/protocol/letter.h"
 #include "vlservice/json/json.h"
 
 #include <array>
@@ -32,11 +33,14 @@ enum class JobState {
     Cancelled,
     /// A trial run: the container is in the outbox, and nothing is handed over.
     Tried,
+    /// Its letters go out by carriers, each by itself.
+    Delivering,
 };
 
-inline constexpr std::array ALL_JOB_STATES{
-    JobState::Accepted, JobState::Held,      JobState::Queued, JobState::Submitting, JobState::Submitted,
-    JobState::Lodged,   JobState::Delivered, JobState::Failed, JobState::Cancelled,  JobState::Tried};
+inline constexpr std::array ALL_JOB_STATES{JobState::Accepted,   JobState::Held,      JobState::Queued,
+                                           JobState::Submitting, JobState::Submitted, JobState::Lodged,
+                                           JobState::Delivered,  JobState::Failed,    JobState::Cancelled,
+                                           JobState::Tried,      JobState::Delivering};
 
 /// The name under which a state is kept and told.
 char const* stateName(JobState state);
@@ -56,6 +60,8 @@ struct JobsQuery {
     /// How long an answer is held at most, in milliseconds.
     static constexpr long long MAX_WAIT = 20'000;
     static constexpr std::size_t MAX_STATES = 100;
+    /// How many letters are told of at most, those of the first jobs.
+    static constexpr std::size_t MAX_LETTERS = 10'000;
 
     /// The pack database.
     std::string folder;
@@ -67,6 +73,8 @@ struct JobsQuery {
     /// How long the answer may be held while one of the jobs of `ids` waits for its pages to be fetched and
     /// nothing is in its way; milliseconds.
     long long wait = 0;
+    /// Whether the jobs' letters are to be told of.
+    bool letters = false;
     /// The later states that the asker knows. Others are told it as what they come closest to.
     std::vector<std::string> knownStates = laterStates();
 
@@ -102,6 +110,10 @@ struct JobReport {
     long long due = 0;
     /// Where the container lies.
     std::string container;
+    /// Where they were asked for and go by carriers, or some of them do; in their order.
+    std::vector<LetterReport> letters;
+    /// How many of its letters are not told of since there are too many.
+    long long lettersLeftOut = 0;
 
     JobReport() = default;
     /// Throws Error on a state that is not known.

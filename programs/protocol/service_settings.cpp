@@ -6,9 +6,8 @@ namespace Protocol {
 
 struct ServiceSettings::Keys {
     static constexpr std::tuple TABLE{
-        Always{UPLOAD_FOLDER, &ServiceSettings::uploadFolder},
-        Always{TARIFF, &ServiceSettings::tariff},
-        Always{DISABLED, &ServiceSettings::disabled},
+        Always{UPLOAD_FOLDER, &ServiceSettings::uploadFolder}, Always{TARIFF, &ServiceSettings::tariff},
+        Always{CARRIERS, &ServiceSettings::carriers},          Always{DISABLED, &ServiceSettings::disabled},
         Always{SUSPENDED, &ServiceSettings::suspended},
     };
 };

@@ -22,6 +22,7 @@ enum class Suspended : int {
 struct ServiceSettings {
     static constexpr char const* UPLOAD_FOLDER = "upload_folder";
     static constexpr char const* TARIFF = "tariff";
+    static constexpr char const* CARRIERS = "carriers";
     static constexpr char const* DISABLED = "disabled";
     static constexpr char const* SUSPENDED = "suspended";
 
@@ -29,6 +30,8 @@ struct ServiceSettings {
     std::string uploadFolder;
     /// The form of Tariff; empty when there is none.
     json::Object tariff;
+    /// The form of carriersIn(); empty when there are none.
+    json::Object carriers;
     /// Ids of nodes that nobody may send for, with all below them.
     std::vector<std::string> disabled;
     /// Bits of Suspended.
@@ -54,6 +57,7 @@ struct ServiceSetting {
 inline constexpr ServiceSetting SETTABLE[] = {
     {ServiceSettings::UPLOAD_FOLDER, SettingForm::Text, "PATH"},
     {ServiceSettings::TARIFF, SettingForm::Document, "FILE"},
+    {ServiceSettings::CARRIERS, SettingForm::Document, "FILE"},
     {ServiceSettings::DISABLED, SettingForm::List, "[...]"},
 };
 

@@ -47,12 +47,26 @@ json::Object answerOrError(Ipc::CmdI const& cmd, Operation operation) {
     return error.empty() ? answer : Protocol::failureAnswer(error);
 }
 
+/// Empty for all other questions.
+std::string channelToTest(json::Object const& question) {
+    using Protocol::CarrierChange;
+    if (Protocol::kindOf(question) != CarrierChange::KIND)
+        return {};
+    try {
+        CarrierChange const change(question);
+        return change.action == Protocol::CarrierAction::Test ? change.channel : std::string();
+    } catch (std::exception const&) {
+        // What is wrong with it is told as the answer.
+        return {};
+    }
+}
+
 } // namespace
 
 Processor::Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-                     std::filesystem::path outbox, std::function<long long()> now)
-    : settings_(settings), documents_(documents), jobs_(jobs), runner_(runner), outbox_(std::move(outbox)),
-      now_(std::move(now)) {}
+                     LetterRunner& letters, std::filesystem::path outbox, std::function<long long()> now)
+    : settings_(settings), documents_(documents), jobs_(jobs), runner_(runner), letters_(letters),
+      outbox_(std::move(outbox)), now_(std::move(now)) {}
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
                          std::function<void(std::string const& failure)> done) {
@@ -74,9 +88,12 @@ void Processor::submit(std::shared_ptr<Ipc::CmdI> cmd) {
 void Processor::visit(Ipc::CSConfigSrvChange& cmd) {
     settings_.suspend(static_cast<int>(cmd.suspend()));
     runner_.resume();
+    letters_.proceed();
 }
 
 void Processor::visit(Ipc::CSConfigIdsList& cmd) {
+    if (std::string const channel = channelToTest(cmd.reqParams()); !channel.empty())
+        return testCarrier(channel, cmd);
     cmd.setResp(answerOrError(cmd, [&] { return answer(cmd.reqParams()); }));
 }
 
@@ -87,7 +104,7 @@ json::Object Processor::answer(json::Object const& question) {
     if (kind == SettingsQuery::KIND)
         return settings_.effective(SettingsQuery(question)).serialize();
     if (kind == JobsQuery::KIND)
-        return listJobs(JobsQuery(question), jobs_, settings_, outbox_, now_()).serialize();
+        return listed(JobsQuery(question)).serialize();
     if (kind == JobsChange::KIND)
         return changeJobs(JobsChange(question));
     if (kind == DocumentsQuery::KIND)
@@ -98,9 +115,16 @@ json::Object Processor::answer(json::Object const& question) {
         return documents_.put(DocumentUpload(question)).serialize();
     if (kind == DocumentRemoval::KIND)
         return documents_.remove(DocumentRemoval(question)).serialize();
+    if (kind == LetterChange::KIND)
+        return changeLetter(LetterChange(question));
+    if (kind == CarriersQuery::KIND)
+        return letters_.list().serialize();
+    if (kind == CarrierChange::KIND)
+        return changeCarrier(CarrierChange(question));
     throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
                       JobsQuery::KIND + ", " + JobsChange::KIND + ", " + DocumentsQuery::KIND + ", " +
-                      DocumentPieceQuery::KIND + ", " + DocumentUpload::KIND + ", " + DocumentRemoval::KIND);
+                      DocumentPieceQuery::KIND + ", " + DocumentUpload::KIND + ", " + DocumentRemoval::KIND +
+                      ", " + LetterChange::KIND + ", " + CarriersQuery::KIND + ", " + CarrierChange::KIND);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
@@ -115,13 +139,52 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
         }
     }
     if (!changed.ids.empty())
-        answer.jobs = listJobs(changed, jobs_, settings_, outbox_, now_()).jobs;
+        answer.jobs = listed(changed).jobs;
     return answer.serialize();
+}
+
+Protocol::JobsAnswer Processor::listed(Protocol::JobsQuery const& query) const {
+    return listJobs(query, jobs_, letters_.store(), settings_, outbox_, now_());
+}
+
+json::Object Processor::changeLetter(Protocol::LetterChange const& change) {
+    letters_.decide(change);
+    Protocol::JobsQuery changed;
+    changed.ids = {change.id};
+    changed.letters = true;
+    return listed(changed).serialize();
+}
+
+json::Object Processor::changeCarrier(Protocol::CarrierChange const& change) {
+    if (change.action == Protocol::CarrierAction::Pause)
+        letters_.pause(change.channel);
+    else
+        letters_.resume(change.channel);
+    return letters_.list().serialize();
+}
+
+void Processor::testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd) {
+    auto const done = done_;
+    std::string const refused = errorOf(cmd, [&] {
+        letters_.test(channel, [&cmd, done](std::string const& says, std::string const& failure) {
+            Protocol::CarrierTestAnswer answer;
+            answer.says = says;
+            cmd.setResp(failure.empty() ? answer.serialize() : Protocol::failureAnswer(failure));
+            done({});
+        });
+    });
+    if (refused.empty())
+        done_ = {};
+    else
+        cmd.setResp(Protocol::failureAnswer(refused));
 }
 
 void Processor::visit(Ipc::GuiFwd&) { throw Base::Error("the service forwards nothing to a user interface"); }
 
-void Processor::visit(Ipc::SetSvcCfg& cmd) { settings_.changeService(cmd.req()); }
+void Processor::visit(Ipc::SetSvcCfg& cmd) {
+    settings_.changeService(cmd.req());
+    letters_.proceed();
+}
 
 void Processor::visit(Ipc::GetSvcCfg& cmd) {
     cmd.setResp(answerOrError(cmd, [&] { return serviceOverview(); }));

@@ -2,6 +2,7 @@
 // Carries out the commands that clients send.
 
 #include "programs/vlserviced/jobs/job_runner.h"
+#include "programs/vlserviced/jobs/letter_runner.h"
 #include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "vlservice/ipc/cmd_processor_vlsvc.h"
@@ -19,7 +20,7 @@ class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI 
 public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-              std::filesystem::path outbox, std::function<long long()> now);
+              LetterRunner& letters, std::filesystem::path outbox, std::function<long long()> now);
 
     /// Carries a command out. `done` is called once, on this thread, possibly later; with the reason, one
     /// line, when the command failed and its response has no room for that.
@@ -45,12 +46,17 @@ public:
 private:
     json::Object answer(json::Object const& question);
     json::Object changeJobs(Protocol::JobsChange const& change);
+    json::Object changeLetter(Protocol::LetterChange const& change);
+    json::Object changeCarrier(Protocol::CarrierChange const& change);
+    Protocol::JobsAnswer listed(Protocol::JobsQuery const& query) const;
+    void testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd);
     json::Object serviceOverview() const;
 
     SettingsService& settings_;
     DocumentService& documents_;
     JobStore& jobs_;
     JobRunner& runner_;
+    LetterRunner& letters_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
     std::function<void(std::string const& failure)> done_;

@@ -30,6 +30,7 @@
 #include <chrono>
 #include <csignal>
 #include <ctime>
+#include <map>
 #include <new>
 #include <optional>
 #include <utility>
@@ -63,10 +64,11 @@ bool isUnfinished(fs::path const& file) {
     return name.size() == 12 && name.starts_with('.') && name.ends_with(".part");
 }
 
-/// What a process that was killed was writing.
+/// What a process that was killed was writing; nothing where there is no such folder.
 void removeUnfinished(fs::path const& outbox) {
     std::vector<fs::path> unfinished;
-    for (fs::directory_entry const& entry : fs::directory_iterator(outbox))
+    std::error_code missing;
+    for (fs::directory_entry const& entry : fs::directory_iterator(outbox, missing))
         if (isUnfinished(entry.path()))
             unfinished.push_back(entry.path());
     std::error_code ignored;
@@ -112,6 +114,39 @@ Channel::ServerSettings serverSettings(Options const& options, DataFolder const&
 
 } // namespace
 
+/// Threads for the work of carriers, so that one that hangs holds up no other channel.
+class CarrierThreads {
+public:
+    /// Work of a channel, so many of it side by side.
+    asio::thread_pool& of(std::string const& channel, std::size_t atOnce) {
+        auto& [threads, number] = byChannel_[channel];
+        if (number < atOnce) {
+            // What the former ones have begun they finish.
+            if (threads)
+                former_.push_back(std::move(threads));
+            threads = std::make_unique<asio::thread_pool>(atOnce);
+            number = atOnce;
+        }
+        return *threads;
+    }
+    void end() {
+        for (auto& [channel, threads] : byChannel_)
+            former_.push_back(std::move(threads.first));
+        byChannel_.clear();
+        for (auto const& threads : former_)
+            threads->stop();
+        for (auto const& threads : former_)
+            threads->join();
+        former_.clear();
+    }
+
+private:
+    using Threads = std::unique_ptr<asio::thread_pool>;
+
+    std::map<std::string, std::pair<Threads, std::size_t>> byChannel_;
+    std::vector<Threads> former_;
+};
+
 class Service::Impl {
 public:
     explicit Impl(Options const& options)
@@ -126,6 +161,7 @@ public:
             awaitDue();
         });
         removeUnfinished(outbox_);
+        removeUnfinished(outbox_ / JobRunner::REST_FOLDER);
         recogniseUploadFolder();
         if (options.answersDiscovery)
             discovery_.emplace(io_, announcedHost(options), server_->port(), tokenFor(options, data_));
@@ -143,6 +179,7 @@ public:
         asio::post(io_, [this] {
             awaitDue();
             runner_.resume();
+            letterRunner_.proceed();
         });
         asio::post(io_, [this] { sweepPresets(); });
         manager_.onReady("listening on port " + std::to_string(server_->port()));
@@ -164,6 +201,7 @@ private:
             threads->stop();
             threads->join();
         }
+        carrierThreads_.end();
     }
 
     void recogniseUploadFolder() {
@@ -205,6 +243,7 @@ private:
         discovery_.reset();
         upkeep_.cancel();
         due_.cancel();
+        lettersDue_.cancel();
         isStopping_ = true;
         signals_.cancel();
     }
@@ -226,6 +265,20 @@ private:
         });
     }
 
+    void awaitLetters() {
+        std::optional<long long> const next = isStopping_ ? std::nullopt : letterRunner_.nextTime();
+        if (!next) {
+            lettersDue_.cancel();
+            return;
+        }
+        lettersDue_.expires_after(std::clamp(std::chrono::seconds(*next - now()), std::chrono::seconds(0),
+                                             std::chrono::seconds(RETRY_TIME)));
+        lettersDue_.async_wait([this](boost::system::error_code const& ec) {
+            if (!ec)
+                letterRunner_.proceed();
+        });
+    }
+
     void awaitUpkeep() {
         upkeep_.expires_after(RETRY_TIME);
         upkeep_.async_wait([this](boost::system::error_code const& ec) {
@@ -238,6 +291,7 @@ private:
 
     void keepUp() {
         runner_.resume();
+        letterRunner_.proceed();
         documents_.dropStalled();
         auto const time = std::chrono::steady_clock::now();
         if (time - lastStatusUpdate_ >= statusUpdateTime()) {
@@ -295,7 +349,23 @@ private:
                 &Base::localOffset,
                 [this](std::string const& node, std::string const& packPreset) {
                     notePresetUse(node, packPreset);
-                }};
+                },
+                &letterRunner_};
+    }
+
+    LetterSurroundings letterSurroundings() {
+        return {[this](std::string const& channel, std::size_t atOnce, LetterSurroundings::Work work) {
+                    runOn(carrierThreads_.of(channel, atOnce), std::move(work));
+                },
+                [this](LetterSurroundings::Work work) { runOn(reader_, std::move(work)); },
+                [this](LetterSurroundings::Work work) { asio::post(io_, std::move(work)); },
+                &now,
+                [this] { return settings_.service(); },
+                outbox_,
+                &Base::localOffset,
+                &Carriers::makeCarrier,
+                [this](std::string const& packId) { runner_.onLettersTaken(packId); },
+                [this] { awaitLetters(); }};
     }
 
     DataFolder data_;
@@ -306,21 +376,26 @@ private:
     DocumentStore documentStore_{database_};
     DocumentService documents_{documentStore_, store_, settings_, &now};
     JobStore jobs_{database_};
+    LetterStore letters_{database_, jobs_};
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
     /// As many as may wait for databases that somebody holds, before others have to wait for them.
     asio::thread_pool reader_{8};
+    CarrierThreads carrierThreads_;
     HeldQueries held_{io_, jobs_};
+    LetterRunner letterRunner_{letters_, jobs_, letterSurroundings()};
     JobRunner runner_{jobs_, surroundings()};
     std::shared_ptr<Processor> processor_ =
-        std::make_shared<Processor>(settings_, documents_, jobs_, runner_, outbox_, &now);
+        std::make_shared<Processor>(settings_, documents_, jobs_, runner_, letterRunner_, outbox_, &now);
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
     asio::steady_timer upkeep_{io_};
     /// For the next job that is held and due.
     asio::steady_timer due_{io_};
+    /// For the next letter that waits for the clock.
+    asio::steady_timer lettersDue_{io_};
     bool isStopping_ = false;
     std::chrono::steady_clock::time_point lastStatusUpdate_ = std::chrono::steady_clock::now();
     std::chrono::steady_clock::time_point lastSweep_ = std::chrono::steady_clock::now();

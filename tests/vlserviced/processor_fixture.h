@@ -56,6 +56,17 @@ protected:
     VlServiced::DocumentStore documentStore_{database_};
     VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; }};
     VlServiced::JobStore jobs_{database_};
+    VlServiced::LetterStore letters_{database_, jobs_};
+    VlServiced::LetterRunner carriers_{
+        letters_, jobs_,
+        VlServiced::LetterSurroundings{
+            [](std::string const&, std::size_t, VlServiced::LetterSurroundings::Work const& work) { work(); },
+            [](VlServiced::LetterSurroundings::Work const& work) { work(); },
+            [](VlServiced::LetterSurroundings::Work const& work) { work(); },
+            [] { return 1000LL; },
+            [this] { return settings_.service(); },
+            outbox_,
+        }};
     VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
                                              [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                              [](VlServiced::JobSurroundings::Work const& work) { work(); },
@@ -65,5 +76,5 @@ protected:
                                              outbox_,
                                          }};
     std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, jobs_, runner_, outbox_, [] { return 1000LL; });
+        settings_, documents_, jobs_, runner_, carriers_, outbox_, [] { return 1000LL; });
 };

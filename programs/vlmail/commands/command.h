@@ -14,6 +14,7 @@ using Task = std::function<int(Terminal const&)>;
 
 // Each adds its subcommand to `app` and, when the command line names it, leaves its task in `task`.
 // One source file a subcommand.
+void addCarriersCommand(Base::Command const& app, Task& task);
 void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);
 void addDocumentsCommand(Base::Command const& app, Task& task);
@@ -22,6 +23,8 @@ void addHelpCommand(Base::Command const& app, Task& task);
 /// hold, release and cancel.
 void addJobChangeCommands(Base::Command const& app, Task& task);
 void addLetterCommand(Base::Command const& app, Task& task);
+/// settle and resend.
+void addLetterChangeCommands(Base::Command const& app, Task& task);
 void addMailCommand(Base::Command const& app, Task& task);
 void addPackCommand(Base::Command const& app, Task& task);
 void addPlanCommand(Base::Command const& app, Task& task);

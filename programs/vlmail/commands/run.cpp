@@ -17,10 +17,12 @@ namespace {
 
 void addCommands(Base::Command const& command, Task& task) {
     command.requireCommand();
+    addCarriersCommand(command, task);
     addCheckCommand(command, task);
     addDiscoverCommand(command, task);
     addDocumentsCommand(command, task);
     addJobChangeCommands(command, task);
+    addLetterChangeCommands(command, task);
     addLetterCommand(command, task);
     addMailCommand(command, task);
     addPackCommand(command, task);

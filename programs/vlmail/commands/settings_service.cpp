@@ -64,11 +64,27 @@ json::Object changesIn(std::vector<std::string> const& assignments) {
     return changes;
 }
 
+/// Carriers that cannot be had at the moment are set all the same.
+void warnOfCarriers(Channel::Client& service, json::Object const& changes, Terminal const& terminal) {
+    json::Value const carriers = changes.get(Protocol::ServiceSettings::CARRIERS);
+    if (!carriers.isObject())
+        return;
+    for (auto const& [channel, settings] : carriers.toObject()) {
+        try {
+            ask(service, Protocol::CarrierChange(Protocol::CarrierAction::Test, channel));
+        } catch (Base::Error const& failure) {
+            terminal.complain("the carrier of " + channel +
+                              " is set and cannot be had yet: " + failure.what());
+        }
+    }
+}
+
 int serviceSettings(Options const& options, Terminal const& terminal) {
     json::Object const changes = changesIn(options.assignments);
     auto const service = connectToService(options.service, terminal.err);
     if (!changes.empty()) {
         service->call<Ipc::SetSvcCfg>(changes);
+        warnOfCarriers(*service, changes, terminal);
         return FINE;
     }
     json::Object const settings = requireAnswer(service->call<Ipc::GetSvcCfg>()->resp());
@@ -106,9 +122,9 @@ void addSettingsServiceCommands(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
     Base::Command const service =
         settings.addCommand("service", "Shows or changes the settings of the service itself");
-    service.addOption(
-        "KEY=VALUE", options->assignments,
-        "upload_folder=PATH, tariff=FILE, disabled=[NODE...]; nothing behind the sign erases it");
+    service.addOption("KEY=VALUE", options->assignments,
+                      "upload_folder=PATH, tariff=FILE, carriers=FILE, disabled=[NODE...]; nothing behind "
+                      "the sign erases it");
     service.addFlag("--json", options->json, "The settings as one JSON object");
     addServiceOptions(service, options->service);
     service.whenNamed(

@@ -46,6 +46,24 @@ void print(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
         table.print(out);
 }
 
+/// Of jobs whose letters go by carriers, or some of them do.
+void printLetters(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
+    TextTable table(
+        {{"mailing"}, {"letter", TextTable::Align::Right}, {"channel"}, {"state"}, {"since"}, {"note"}});
+    for (Protocol::JobReport const& job : jobs)
+        for (Protocol::LetterReport const& letter : job.letters)
+            table.addRow({job.id, std::to_string(letter.number), letter.channel,
+                          Protocol::letterStateName(letter.state), LocalTime::toText(letter.changed),
+                          letter.says});
+    if (table.empty())
+        return;
+    out << '\n';
+    table.print(out);
+    for (Protocol::JobReport const& job : jobs)
+        if (job.lettersLeftOut > 0)
+            out << job.lettersLeftOut << " more letters of mailing " << job.id << " are not shown\n";
+}
+
 bool anyFailed(std::vector<Protocol::JobReport> const& jobs) {
     return std::ranges::any_of(
         jobs, [](Protocol::JobReport const& job) { return job.state == Protocol::JobState::Failed; });
@@ -85,14 +103,18 @@ int showStatus(Options const& options, Terminal const& terminal) {
     query.folder = database.parent_path().string();
     query.database = database.filename().string();
     query.ids = options.packs;
+    // Of all mailings they are more than a person looks at.
+    query.letters = options.json || !options.packs.empty();
     if (options.update)
         service->call<Ipc::UpdateStatus>(query.folder, query.database);
     json::Object const answer = ask(*service, query);
     std::vector<Protocol::JobReport> const jobs = Protocol::JobsAnswer(answer).jobs;
     if (options.json)
         terminal.out << answer << '\n';
-    else
+    else {
         print(terminal.out, jobs);
+        printLetters(terminal.out, jobs);
+    }
     return anyFailed(jobs) ? INCOMPLETE : FINE;
 }
 

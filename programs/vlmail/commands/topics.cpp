@@ -9,6 +9,10 @@ constexpr char const* PRESETS_TOOLS = "presets-tools.md";
 
 constexpr Manual::Topic TOPICS[] = {
     {"cancel", CLIENT, "Holding, releasing and cancelling"},
+    {"carriers list", "carriers.md", "How carriers are doing"},
+    {"carriers pause", "carriers.md", "How carriers are doing"},
+    {"carriers resume", "carriers.md", "How carriers are doing"},
+    {"carriers test", "carriers.md", "How carriers are doing"},
     {"check", "check.md", ""},
     {"discover", CLIENT, "Looking for the service"},
     {"documents get", CLIENT, "Documents of nodes"},
@@ -26,13 +30,16 @@ constexpr Manual::Topic TOPICS[] = {
     {"presets test", PRESETS_TOOLS, "Whether documents still give what they gave"},
     {"price", CLIENT, "Prices"},
     {"release", CLIENT, "Holding, releasing and cancelling"},
+    {"resend", "carriers.md", "Letters that are uncertain"},
     {"settings show", CLIENT, "What counts at a node"},
     {"settings tree", CLIENT, "All nodes"},
     {"settings ids", CLIENT, "The nodes of a user"},
     {"settings service", CLIENT, "The settings of the service"},
+    {"settle", "carriers.md", "Letters that are uncertain"},
     {"status", CLIENT, "How far mailings are"},
     // Beside the commands.
     {Manual::EXIT_STATUS, LETTERS, "Exit status"},
+    {"carriers-documents", "carriers.md", ""},
     {"explain", "explain.md", ""},
     {"formats", "formats.md", ""},
     {"jobs", "service.md", "Jobs"},

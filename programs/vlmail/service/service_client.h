@@ -2,6 +2,7 @@
 // How the subcommands reach the service: by a name or by discovery, with the access token.
 
 #include "programs/channel/client.h"
+#include "programs/protocol/carrier.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/settings.h"
 #include "programs/vlmail/service/service_address.h"

@@ -66,6 +66,7 @@ std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
     case JobState::Queued:
     case JobState::Submitting:
     case JobState::Tried:
+    case JobState::Delivering:
         return (outbox / job.containerName()).string();
     case JobState::Submitted:
         return (std::filesystem::path(job.uploadFolder) / job.containerName()).string();
@@ -74,10 +75,72 @@ std::string containerOf(Job const& job, std::filesystem::path const& outbox) {
     }
 }
 
+/// Of both, the container's state and that of the letters that go by carriers, the one that is behind.
+JobState stateOf(Job const& job) {
+    constexpr JobState FROM_BEHIND[] = {JobState::Queued,     JobState::Submitting, JobState::Submitted,
+                                        JobState::Delivering, JobState::Failed,     JobState::Lodged};
+    for (JobState const state : FROM_BEHIND)
+        if (job.lettersState && (job.state == state || job.lettersState == state))
+            return state;
+    return job.state;
+}
+
+std::string problemOf(Job const& job) {
+    std::string const between = job.problem.empty() || job.lettersProblem.empty() ? "" : "; ";
+    return job.problem + between + job.lettersProblem;
+}
+
+/// A letter in a container is where that is.
+LetterState stateInContainer(JobState container) {
+    switch (container) {
+    case JobState::Submitted:
+        return LetterState::HandedOver;
+    case JobState::Lodged:
+        return LetterState::Accepted;
+    case JobState::Delivered:
+        return LetterState::Delivered;
+    case JobState::Failed:
+        return LetterState::Failed;
+    default:
+        return LetterState::Waiting;
+    }
+}
+
+Protocol::LetterReport reportOf(StoredLetter const& letter, Job const& job) {
+    Protocol::LetterReport report;
+    report.number = letter.id.number;
+    report.key = letter.id.key();
+    report.channel = letter.channel;
+    report.state = letter.byCarrier ? letter.state : stateInContainer(job.state);
+    report.says = letter.byCarrier ? letter.says : "in the mailing's container";
+    report.changed = letter.byCarrier ? letter.changedAt : job.changedAt;
+    return report;
+}
+
+/// Tells of letters until there are too many for one answer.
+class LetterList {
+public:
+    explicit LetterList(LetterStore const& letters) : letters_(letters) {}
+
+    void tell(Job const& job, Protocol::JobReport& report) {
+        if (!job.isDivided)
+            return;
+        for (StoredLetter const& letter : letters_.ofJob(job.pack.packId, left_))
+            report.letters.push_back(reportOf(letter, job));
+        left_ -= report.letters.size();
+        report.lettersLeftOut =
+            letters_.countOfJob(job.pack.packId) - static_cast<long long>(report.letters.size());
+    }
+
+private:
+    LetterStore const& letters_;
+    std::size_t left_ = Protocol::JobsQuery::MAX_LETTERS;
+};
+
 Protocol::JobReport reportOf(Job const& job) {
     Protocol::JobReport report;
     report.id = job.pack.packId;
-    report.state = job.state;
+    report.state = stateOf(job);
     report.title = job.title;
     report.cfgId = job.cfgId;
     report.folder = job.pack.folder;
@@ -86,7 +149,7 @@ Protocol::JobReport reportOf(Job const& job) {
     report.pages = job.pages;
     report.accepted = job.acceptedAt;
     report.changed = job.changedAt;
-    report.problem = job.problem;
+    report.problem = problemOf(job);
     report.toUpload = job.toUpload;
     report.due = job.state == JobState::Accepted || job.state == JobState::Held ? job.due : 0;
     return report;
@@ -102,16 +165,19 @@ void tellAs(JobState state, Protocol::JobReport& report) {
 } // namespace
 
 Protocol::JobsAnswer listJobs(Protocol::JobsQuery const& query, JobStore const& jobs,
-                              SettingsService const& settings, std::filesystem::path const& outbox,
-                              long long now) {
+                              LetterStore const& letters, SettingsService const& settings,
+                              std::filesystem::path const& outbox, long long now) {
     Alarms alarms(settings, now);
+    LetterList letterList(letters);
     Protocol::JobsAnswer answer;
     auto const limit = static_cast<std::size_t>(std::min(query.limit, Protocol::JobsQuery::MAX_JOBS));
     for (Job const& job : jobs.matching({query.folder, query.database, query.ids}, limit)) {
         Protocol::JobReport& report = answer.jobs.emplace_back(reportOf(job));
         report.alarm = alarms.of(job);
         report.container = containerOf(job, outbox);
-        tellAs(Protocol::toldTo(query.knownStates, job.state), report);
+        if (query.letters)
+            letterList.tell(job, report);
+        tellAs(Protocol::toldTo(query.knownStates, report.state), report);
     }
     return answer;
 }

@@ -3,7 +3,7 @@
 
 #include "programs/protocol/job.h"
 #include "programs/vlserviced/settings/settings_service.h"
-#include "programs/vlserviced/store/job_store.h"
+#include "programs/vlserviced/store/letter_store.h"
 
 #include <filesystem>
 
@@ -12,7 +12,7 @@ namespace VlServiced {
 /// Answers a question about jobs as they are at `now` (seconds since the epoch). Alarms follow from the
 /// settings of their nodes.
 Protocol::JobsAnswer listJobs(Protocol::JobsQuery const& query, JobStore const& jobs,
-                              SettingsService const& settings, std::filesystem::path const& outbox,
-                              long long now);
+                              LetterStore const& letters, SettingsService const& settings,
+                              std::filesystem::path const& outbox, long long now);
 
 } // namespace VlServiced

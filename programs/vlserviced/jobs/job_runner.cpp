@@ -5,7 +5,9 @@
 #include "programs/base/safe_name.h"
 #include "programs/mailing/pack_database.h"
 #include "programs/vlserviced/jobs/container.h"
+#include "programs/vlserviced/jobs/division.h"
 #include "programs/vlserviced/jobs/hand_over.h"
+#include "programs/vlserviced/jobs/letter_runner.h"
 #include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
 
@@ -49,15 +51,24 @@ void requireSamePack(Job const& known, PackLocation const& pack) {
         throw Base::Error("pack " + pack.packId + " was cancelled: mail its letters anew");
 }
 
-/// Whether the outbox is no place for its container any more.
-bool hasLeftOutbox(JobState state) {
+/// Whether the outbox is no place for the container any more that goes to the upload folder.
+bool hasLeft(JobState state) {
     return state == JobState::Submitted || state == JobState::Lodged || state == JobState::Delivered ||
            state == JobState::Cancelled;
 }
 
+/// Whether the outbox is no place for the mailing any more.
+bool hasLeftOutbox(Job const& job) {
+    return hasLeft(job.state) && hasLeft(job.lettersState.value_or(job.state));
+}
+
 /// How far a job has got that it is too late for.
 std::string whoHas(Job const& job) {
+    if (job.lettersState)
+        return "letters of it are going out by carriers";
     switch (job.state) {
+    case JobState::Delivering:
+        return "its letters are going out by carriers";
     case JobState::Submitting:
         return "it is being handed over to the upload folder " + job.uploadFolder;
     case JobState::Submitted:
@@ -175,7 +186,7 @@ void JobRunner::proceed(Job const& job) {
     if (job.state == JobState::Accepted)
         startPacking(job);
     else if (job.state == JobState::Queued && job.toUpload)
-        startStaging(job);
+        startHandingOver(job);
     else if (job.state == JobState::Submitting)
         finishSubmitting(job);
 }
@@ -206,6 +217,40 @@ void JobRunner::onPacked(std::string const& packId, Outcome const& outcome) {
     }
 }
 
+void JobRunner::startHandingOver(Job const& job) {
+    bool const isToDivide =
+        surroundings_.letters && !job.isDivided && !surroundings_.settings().carriers().empty();
+    isToDivide ? startDividing(job) : startStaging(job);
+}
+
+void JobRunner::startDividing(Job const& job) {
+    auto const letters = std::make_shared<std::vector<DividedLetter>>();
+    inBackground(
+        job.pack.packId,
+        [letters, container = surroundings_.outbox / job.containerName(),
+         rest = surroundings_.outbox / REST_FOLDER / job.containerName(),
+         carriers = surroundings_.settings().carriers()] {
+            *letters = divide(container, rest,
+                              [&](std::string const& channel) { return carriers.contains(channel); });
+        },
+        [this, packId = job.pack.packId, letters](Outcome const& outcome) {
+            if (outcome.kind != Outcome::Kind::Done)
+                return noteProblem(packId, outcome.why);
+            surroundings_.letters->record(packId, *letters);
+            proceed(jobs_.find(packId).value());
+        });
+}
+
+void JobRunner::onLettersTaken(std::string const& packId) {
+    if (std::optional<Job> const job = jobs_.find(packId); job && hasLeftOutbox(*job))
+        clearOutbox(*job);
+}
+
+fs::path JobRunner::containerToStage(Job const& job) const {
+    return (job.lettersState ? surroundings_.outbox / REST_FOLDER : surroundings_.outbox) /
+           job.containerName();
+}
+
 void JobRunner::startStaging(Job const& job) {
     std::string const folder = surroundings_.settings().uploadFolder();
     // The job list tells that there is none.
@@ -214,7 +259,7 @@ void JobRunner::startStaging(Job const& job) {
     auto const identity = std::make_shared<std::string>(surroundings_.settings().uploadFolderIdentity());
     inBackground(
         job.pack.packId,
-        [container = surroundings_.outbox / job.containerName(), folder, identity] {
+        [container = containerToStage(job), folder, identity] {
             UploadFolder const target(folder, *identity);
             stage(container, target);
             *identity = target.identity().text();
@@ -248,8 +293,8 @@ void JobRunner::discard(Job const& job) {
     if (unstaged.kind != Outcome::Kind::Done)
         Log::Lock(4).logStreamLine() << "Pack " << job.pack.packId << " may lie in the upload folder under a "
                                      << "temporary name: " << unstaged.why;
-    if (hasLeftOutbox(job.state))
-        removeFromOutbox(job.containerName());
+    if (hasLeftOutbox(job))
+        clearOutbox(job);
 }
 
 void JobRunner::change(JobAction action, std::string const& packId) {
@@ -274,18 +319,27 @@ void JobRunner::finishSubmitting(Job const& job) {
     if (outcome.kind != Outcome::Kind::Done)
         return noteProblem(job.pack.packId, outcome.why);
     // While the job is on record as Submitting, so that a container that stays behind is seen to again.
-    removeFromOutbox(job.containerName());
+    removeFromOutbox(containerToStage(job));
     jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
+    if (job.lettersState)
+        onLettersTaken(job.pack.packId);
 }
 
-void JobRunner::removeFromOutbox(std::string const& containerName) {
+/// The mailing's container goes last, so that a later start finds what is left to do.
+void JobRunner::clearOutbox(Job const& job) {
+    if (job.lettersState)
+        removeFromOutbox(containerToStage(job));
+    removeFromOutbox(surroundings_.outbox / job.containerName());
+}
+
+void JobRunner::removeFromOutbox(fs::path const& container) {
     std::error_code failure;
-    fs::remove(surroundings_.outbox / containerName, failure);
+    fs::remove(container, failure);
     if (!failure)
-        leftInOutbox_.erase(containerName);
-    else if (leftInOutbox_.insert(containerName).second)
+        leftInOutbox_.erase(container);
+    else if (leftInOutbox_.insert(container).second)
         Log::Lock(4).logStreamLine()
-            << "The container " << containerName
+            << "The container " << container.filename().string()
             << " was handed on and cannot be removed from the outbox, which is tried "
                "again: "
             << failure.message();
@@ -297,14 +351,15 @@ void JobRunner::sweepOutbox() {
     if (!std::exchange(isSwept_, true))
         for (fs::directory_entry const& entry : fs::directory_iterator(surroundings_.outbox, unreadable))
             if (std::optional<Job> const job = jobs_.find(entry.path().stem().string());
-                job && hasLeftOutbox(job->state) && entry.path().filename() == job->containerName())
+                job && hasLeftOutbox(*job) && entry.path().filename() == job->containerName())
                 discard(*job);
-    for (std::string const& name : std::set<std::string>(leftInOutbox_))
-        removeFromOutbox(name);
+    for (fs::path const& container : std::set<fs::path>(leftInOutbox_))
+        removeFromOutbox(container);
 }
 
 void JobRunner::upload(std::string const& folder, std::string const& database) {
-    if (surroundings_.settings().uploadFolder().empty())
+    ServiceSettings const settings = surroundings_.settings();
+    if (settings.uploadFolder().empty() && settings.carriers().empty())
         throw Base::Error(
             "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
     jobs_.wantUpload(folder.empty() ? folder : folderText(folder), database);
@@ -321,6 +376,9 @@ void JobRunner::updateStatus(std::string const& folder, std::string const& datab
 }
 
 void JobRunner::refresh(Job const& job) {
+    // All of its letters went by carriers.
+    if (job.uploadFolder.empty())
+        return;
     Outcome const outcome = outcomeOf([&] {
         UploadFolder const folder(job.uploadFolder, job.uploadFolderIdentity);
         bool const waits = liesIn(folder, job.containerName());

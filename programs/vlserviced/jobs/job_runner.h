@@ -15,6 +15,8 @@
 
 namespace VlServiced {
 
+class LetterRunner;
+
 /// What a runner needs around it.
 struct JobSurroundings {
     using Work = std::function<void()>;
@@ -42,6 +44,8 @@ struct JobSurroundings {
     /// Told that a node's mailing was accepted that goes by that pack preset.
     std::function<void(std::string const& node, std::string const& packPreset)> usedPreset =
         [](std::string const&, std::string const&) {};
+    /// Takes the letters of channels that have carriers; null where there are none.
+    LetterRunner* letters = nullptr;
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -50,6 +54,9 @@ struct JobSurroundings {
 /// restriction.
 class JobRunner {
 public:
+    /// In the outbox: containers of what carriers leave of mailings.
+    static constexpr char const* REST_FOLDER = "rest";
+
     /// The store has to outlive the runner, and the runner has to outlive the work on its own thread.
     JobRunner(JobStore& jobs, JobSurroundings surroundings);
 
@@ -66,6 +73,8 @@ public:
     void upload(std::string const& folder, std::string const& database);
     /// Brings the states of these jobs up to date with the upload folder, and tries again what failed before.
     void updateStatus(std::string const& folder, std::string const& database);
+    /// Told that the letters of a job that go by carriers were all taken on.
+    void onLettersTaken(std::string const& packId);
     /// Holds a job, lets it go on, or calls it back. What is so already stays so. Throws Error, which says
     /// where the job has got to, when it is too late.
     void change(Protocol::JobAction action, std::string const& packId);
@@ -79,6 +88,8 @@ private:
 
     void proceed(Job const& job);
     void startPacking(Job const& job);
+    void startHandingOver(Job const& job);
+    void startDividing(Job const& job);
     void startStaging(Job const& job);
     void finishSubmitting(Job const& job);
     void onPacked(std::string const& packId, Outcome const& outcome);
@@ -89,7 +100,10 @@ private:
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary);
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
-    void removeFromOutbox(std::string const& containerName);
+    /// The container that goes to the upload folder.
+    std::filesystem::path containerToStage(Job const& job) const;
+    void clearOutbox(Job const& job);
+    void removeFromOutbox(std::filesystem::path const& container);
     void sweepOutbox();
     /// Runs `work` on the worker and hands its outcome to `then` on the own thread.
     void inBackground(std::string const& packId, std::function<void()> work,
@@ -101,7 +115,7 @@ private:
     /// Pack ids that the worker is busy with, or will be.
     std::set<std::string> busy_;
     /// Containers that were handed on and are still in the outbox.
-    std::set<std::string> leftInOutbox_;
+    std::set<std::filesystem::path> leftInOutbox_;
     bool isSwept_ = false;
 };
 

@@ -40,11 +40,19 @@ void checkDisabled(json::Value const& value) {
     }
 }
 
+void checkCarriers(json::Value const& value) {
+    if (!value.isObject())
+        throw Base::Error("\"carriers\" has to be an object with the names of channels");
+    Protocol::carriersIn(value.toObject());
+}
+
 void checkValue(std::string const& key, json::Value const& value) {
     if (key == Values::UPLOAD_FOLDER)
         checkUploadFolder(value);
     else if (key == Values::TARIFF)
         checkTariff(value);
+    else if (key == Values::CARRIERS)
+        checkCarriers(value);
     else
         checkDisabled(value);
 }

@@ -1,6 +1,7 @@
 #pragma once
 // The service's own settings, beside those of the nodes.
 
+#include "programs/protocol/carrier.h"
 #include "programs/protocol/price.h"
 #include "programs/protocol/service_settings.h"
 #include "vlservice/json/json.h"
@@ -27,6 +28,8 @@ public:
     std::string uploadFolderIdentity() const;
     /// Throws Error when there is none yet.
     Protocol::Tariff tariff() const;
+    /// By their channels.
+    Protocol::Carriers carriers() const { return Protocol::carriersIn(values_.carriers); }
     /// Whether the node, or one above it, is among the disabled ones.
     bool isDisabled(std::string const& nodeId) const;
     bool isSuspended(Suspended what) const;

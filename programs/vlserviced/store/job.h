@@ -4,6 +4,7 @@
 #include "programs/protocol/job.h"
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 namespace VlServiced {
@@ -42,6 +43,11 @@ struct Job {
     std::string uploadFolder;
     /// Which of all folders of that name it is, as FolderIdentity tells it.
     std::string uploadFolderIdentity;
+    /// Whether its letters were divided among the channels.
+    bool isDivided = false;
+    /// Where some of its letters go by carriers and others in a container: how far the former are.
+    std::optional<JobState> lettersState = {};
+    std::string lettersProblem = {};
     /// Seconds since the epoch.
     long long acceptedAt = 0;
     long long changedAt = 0;

@@ -17,8 +17,8 @@ using Protocol::stateNamed;
 
 constexpr char const* SELECT_JOBS =
     "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
-    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity, due, to_hold, trial FROM "
-    "jobs ";
+    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity, due, to_hold, trial, "
+    "divided, letters_state, letters_problem FROM jobs ";
 
 /// The states of which there are few: the others are where jobs rest, or end.
 constexpr JobState UNDER_WAY[] = {JobState::Accepted, JobState::Queued, JobState::Submitting,
@@ -43,6 +43,10 @@ Job jobIn(SQLite::Statement& row) {
     job.due = row.getColumn(14).getInt64();
     job.toHold = row.getColumn(15).getInt() != 0;
     job.isTrial = row.getColumn(16).getInt() != 0;
+    job.isDivided = row.getColumn(17).getInt() != 0;
+    if (std::string const state = row.getColumn(18).getString(); !state.empty())
+        job.lettersState = stateNamed(state);
+    job.lettersProblem = row.getColumn(19).getString();
     return job;
 }
 
@@ -204,7 +208,8 @@ bool JobStore::beginSubmitting(std::string const& packId, std::string const& upl
 
 bool JobStore::changeAtRest(std::string const& assignments, std::string const& packId, long long now) {
     SQLite::Statement change(database_, "UPDATE jobs SET problem = '', " + assignments +
-                                            " WHERE pack = ?1 AND state IN ('accepted', 'held', 'queued')");
+                                            " WHERE pack = ?1 AND letters_state = '' AND "
+                                            "state IN ('accepted', 'held', 'queued')");
     change.bind(1, packId);
     change.bind(2, static_cast<std::int64_t>(now));
     bool const isChanged = change.exec() == 1;
@@ -234,6 +239,39 @@ void JobStore::fail(std::string const& packId, std::string const& reason, long l
                              "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
     change.bind(1, stateName(JobState::Failed));
     change.bind(2, reason);
+    change.bind(3, static_cast<std::int64_t>(now));
+    change.bind(4, packId);
+    change.exec();
+    changed(packId);
+}
+
+bool JobStore::divide(std::string const& packId, LettersByCarriers byCarriers, long long now) {
+    SQLite::Statement change(database_, "UPDATE jobs SET problem = '', divided = 1, state = ?, "
+                                        "letters_state = ?, changed_at = iif(state = ?1, changed_at, ?) "
+                                        "WHERE pack = ? AND state = ? AND divided = 0");
+    bool const isAll = byCarriers == LettersByCarriers::All;
+    change.bind(1, stateName(isAll ? JobState::Delivering : JobState::Queued));
+    change.bind(2, byCarriers == LettersByCarriers::Some ? stateName(JobState::Delivering) : "");
+    change.bind(3, static_cast<std::int64_t>(now));
+    change.bind(4, packId);
+    change.bind(5, stateName(JobState::Queued));
+    bool const isDivided = change.exec() == 1;
+    if (isDivided)
+        changed(packId);
+    return isDivided;
+}
+
+void JobStore::setLettersState(std::string const& packId, JobState state, std::string const& problem,
+                               long long now) {
+    SQLite::Statement change(
+        database_, "UPDATE jobs SET "
+                   "changed_at = iif(letters_state <> '' OR state = ?1, changed_at, ?3), "
+                   "state = iif(letters_state = '', ?1, state), "
+                   "problem = iif(letters_state = '', ?2, problem), "
+                   "letters_problem = iif(letters_state = '', '', ?2), "
+                   "letters_state = iif(letters_state = '', '', ?1) WHERE pack = ?4 AND divided = 1");
+    change.bind(1, stateName(state));
+    change.bind(2, problem);
     change.bind(3, static_cast<std::int64_t>(now));
     change.bind(4, packId);
     change.exec();

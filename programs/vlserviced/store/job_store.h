@@ -13,6 +13,9 @@
 
 namespace VlServiced {
 
+/// How many letters of a job go by carriers.
+enum class LettersByCarriers { None, Some, All };
+
 /// Which jobs a query is about; an empty text is no restriction.
 struct JobFilter {
     std::string folder;
@@ -61,6 +64,13 @@ public:
     bool release(std::string const& packId, long long now);
     /// Calls a job back; false, and no change, once it is on its way.
     bool cancel(std::string const& packId, long long now);
+    /// Notes that a queued job's letters were divided: `byCarriers` of them go by carriers, the others in the
+    /// container. False, and no change, when the job is not queued or was divided before.
+    bool divide(std::string const& packId, LettersByCarriers byCarriers, long long now);
+    /// Notes how far the letters of a divided job are that go by carriers; the job's state is theirs when
+    /// none is in the container.
+    void setLettersState(std::string const& packId, JobState state, std::string const& problem,
+                         long long now);
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.

@@ -98,13 +98,47 @@ CREATE TRIGGER document_replaced AFTER UPDATE OF content ON documents
 WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
     DELETE FROM document_contents WHERE number = old.content;
 END;
+/// Letters in the order in which they were divided among the channels. Those of channels without a carrier
+/// stand for themselves in the container, and bear its state. `letters_state` is that of the others, where a
+/// job has both.
+constexpr char const* SCHEMA_6 = R"sql(
+CREATE TABLE letters (
+    id         INTEGER NOT NULL PRIMARY KEY,
+    pack       TEXT NOT NULL REFERENCES jobs (pack) ON DELETE CASCADE,
+    number     INTEGER NOT NULL,
+    channel    TEXT NOT NULL,
+    by_carrier INTEGER NOT NULL,
+    state      TEXT NOT NULL,
+    says       TEXT NOT NULL DEFAULT '',
+    changed_at INTEGER NOT NULL,
+    attempts   INTEGER NOT NULL DEFAULT 0,
+    first_try  INTEGER NOT NULL DEFAULT 0,
+    due        INTEGER NOT NULL DEFAULT 0,
+    UNIQUE (pack, number)
+);
+CREATE INDEX letters_to_go ON letters (channel, due, id) WHERE state = 'waiting' AND by_carrier = 1;
+CREATE INDEX letters_in_doubt ON letters (channel) WHERE state IN ('handed over', 'uncertain');
+CREATE INDEX letters_by_state ON letters (pack, state, number) WHERE by_carrier = 1;
+
+CREATE TABLE carriers (
+    channel  TEXT NOT NULL PRIMARY KEY,
+    paused   INTEGER NOT NULL,
+    failures INTEGER NOT NULL,
+    says     TEXT NOT NULL,
+    since    INTEGER NOT NULL,
+    try_at   INTEGER NOT NULL
+) WITHOUT ROWID;
+
+ALTER TABLE jobs ADD COLUMN divided INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE jobs ADD COLUMN letters_state TEXT NOT NULL DEFAULT '';
+ALTER TABLE jobs ADD COLUMN letters_problem TEXT NOT NULL DEFAULT '';
 )sql";
 
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
     static Database::DatabaseKind const kind{
-        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, SCHEMA_5}};
+        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, SCHEMA_5, SCHEMA_6}};
     return kind;
 }
 

@@ -1,0 +1,77 @@
+#pragma once
+// A way out for letters: one interface in front of all carriers.
+
+#include "programs/protocol/carrier.h"
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace Carriers {
+
+/// A letter as a carrier takes it.
+struct OutgoingLetter {
+    /// From 1, its place in the mailing.
+    long long number = 0;
+    /// The same at every attempt; a safe file name.
+    std::string key;
+    std::string address;
+    /// Names and values, in their order.
+    std::vector<std::pair<std::string, std::string>> fields;
+    /// Sides in the document, from 1.
+    long long firstPage = 1;
+    long long pages = 0;
+    /// Of paper.
+    long long sheets = 0;
+    long long colouredPages = 0;
+};
+
+/// What is handed over at once: a letter, or those of a mailing that go by the channel.
+struct Parcel {
+    /// The same at every attempt; a safe file name.
+    std::string key;
+    /// The mailing's id.
+    std::string mailing;
+    bool isDuplex = false;
+    /// At least one, in their order.
+    std::vector<OutgoingLetter> letters;
+    /// Of all letters; a PDF.
+    std::string document;
+    long long pages = 0;
+};
+
+/// How handing over has ended.
+struct Outcome {
+    enum class Kind {
+        /// The other side has taken it on.
+        Accepted,
+        /// The other side does not want it, now and later.
+        Refused,
+        /// The carrier itself failed, and nobody has it: to be tried again.
+        Failed,
+    };
+
+    Kind kind = Kind::Accepted;
+    /// In the other side's words, or what failed; one line without secrets.
+    std::string says;
+};
+
+/// Used by one thread at a time.
+class Carrier {
+public:
+    virtual ~Carrier() = default;
+
+    /// What is handed over again under a key replaces what the other side has of it. Throws std::exception
+    /// with one line where the carrier failed and nobody has it.
+    virtual Outcome handOver(Parcel const& parcel) = 0;
+    /// Tries the other side without sending anything, and says in one line what it offers. Throws
+    /// std::exception with one line.
+    virtual std::string test() = 0;
+};
+
+/// The carrier that the settings name.
+std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings);
+
+} // namespace Carriers

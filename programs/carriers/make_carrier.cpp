@@ -1,0 +1,15 @@
+#include "programs/base/error.h"
+#include "programs/carriers/carrier.h"
+#include "programs/carriers/folder_carrier.h"
+
+namespace Carriers {
+
+std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) {
+    switch (settings.type) {
+    case Protocol::CarrierType::Folder:
+        return std::make_unique<FolderCarrier>(settings.folder);
+    }
+    throw Base::Error("there is no such carrier");
+}
+
+} // namespace Carriers

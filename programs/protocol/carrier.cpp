@@ -1,0 +1,251 @@
+#include "programs/protocol/carrier.h"
+
+#include "programs/base/plain_text.h"
+#include "programs/base/quoting.h"
+#include "programs/protocol/query.h"
+#include "programs/protocol/rows.h"
+
+#include <algorithm>
+#include <iterator>
+#include <utility>
+
+namespace Protocol {
+namespace {
+
+constexpr char const* TYPE = "type";
+constexpr char const* ACTION = "action";
+constexpr std::size_t MAX_CHANNELS = 16;
+constexpr std::size_t MAX_CHANNEL_BYTES = 32;
+
+struct PathForm {
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        return text.starts_with('/') && Base::isPlainText(text, CarrierSettings::MAX_PATH_BYTES);
+    }
+    static std::string wanted() { return "an absolute path"; }
+};
+
+struct UnitForm {
+    static bool fits(json::Value const& node) {
+        return node.textOrEmpty() == "letter" || node.textOrEmpty() == "mailing";
+    }
+    static std::string wanted() { return "\"letter\" or \"mailing\""; }
+};
+
+bool isDigit(char c) { return c >= '0' && c <= '9'; }
+
+/// Of "08:00", in minutes; nothing for what is no time of the day.
+std::optional<int> minutesIn(std::string_view text) {
+    if (text.size() != 5 || text[2] != ':' || !isDigit(text[0]) || !isDigit(text[1]) || !isDigit(text[3]) ||
+        !isDigit(text[4]))
+        return std::nullopt;
+    int const hours = (text[0] - '0') * 10 + text[1] - '0';
+    int const minutes = (text[3] - '0') * 10 + text[4] - '0';
+    if (hours > 23 || minutes > 59)
+        return std::nullopt;
+    return hours * 60 + minutes;
+}
+
+std::optional<DayWindow> windowIn(std::string const& text) {
+    std::size_t const dash = text.find('-');
+    if (dash == std::string::npos)
+        return std::nullopt;
+    auto const begin = minutesIn(std::string_view(text).substr(0, dash));
+    auto const end = minutesIn(std::string_view(text).substr(dash + 1));
+    if (!begin || !end || *begin == *end)
+        return std::nullopt;
+    return DayWindow{*begin, *end};
+}
+
+struct HoursForm {
+    static bool fits(json::Value const& node) { return windowIn(node.textOrEmpty()).has_value(); }
+    static std::string wanted() { return "a window of the day such as \"08:00-18:00\""; }
+};
+
+} // namespace
+
+struct CarrierSettings::Keys {
+    static constexpr long long MAX_RETRY_SECONDS = 3600;
+    static constexpr long long MAX_GIVE_UP_HOURS = 24LL * 365;
+
+    /// Those of all types, beside "type".
+    static constexpr std::tuple COMMON{
+        Asked{"retry_seconds", &CarrierSettings::retrySeconds, IntegerForm{1, MAX_RETRY_SECONDS}, 30LL},
+        Asked{"give_up_hours", &CarrierSettings::giveUpHours, IntegerForm{1, MAX_GIVE_UP_HOURS}, 120LL},
+        Asked{"per_minute", &CarrierSettings::perMinute, IntegerForm{1, 100'000}},
+        Asked{"at_once", &CarrierSettings::atOnce, IntegerForm{1, 16}, 1LL},
+        Asked{"hours", &CarrierSettings::hours, HoursForm{}},
+    };
+    static constexpr std::tuple FOLDER{
+        Asked{"folder", &CarrierSettings::folder, PathForm{}},
+        Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
+    };
+};
+
+namespace {
+
+/// What settings of a type may have, and must.
+struct TypeRow {
+    CarrierType type;
+    char const* name;
+    void (*read)(json::Object const&, CarrierSettings&);
+    bool (*hasKey)(std::string const&);
+    /// Separated by blanks.
+    char const* required;
+};
+
+template<auto const& TABLE>
+void readTable(json::Object const& from, CarrierSettings& into) {
+    json::readKeys(CarrierSettings::Keys::COMMON, from, into);
+    json::readKeys(TABLE, from, into);
+}
+
+template<auto const& TABLE>
+bool tableHasKey(std::string const& key) {
+    return key == TYPE || hasKey(CarrierSettings::Keys::COMMON, key) || hasKey(TABLE, key);
+}
+
+template<auto const& TABLE>
+constexpr TypeRow typeRow(CarrierType type, char const* name, char const* required) {
+    return {type, name, &readTable<TABLE>, &tableHasKey<TABLE>, required};
+}
+
+constexpr TypeRow TYPES[] = {
+    typeRow<CarrierSettings::Keys::FOLDER>(CarrierType::Folder, "folder", "folder"),
+};
+
+std::string typeNames() {
+    std::string names;
+    for (TypeRow const& row : TYPES)
+        names += (names.empty() ? "" : ", ") + std::string(row.name);
+    return names;
+}
+
+TypeRow const& typeRowNamed(std::string const& name) {
+    auto const found = std::ranges::find(TYPES, name, &TypeRow::name);
+    if (found == std::end(TYPES))
+        throw Base::Error("\"type\" of a carrier has to be one of " + typeNames());
+    return *found;
+}
+
+void requireKeys(json::Object const& object, TypeRow const& row) {
+    for (auto const& [key, value] : object)
+        if (!row.hasKey(key))
+            throw Base::Error("a carrier of the type " + std::string(row.name) + " has no key " +
+                              Base::inQuotes(Base::oneLine(key)));
+    if (!object.get(row.required))
+        throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
+                          Base::inQuotes(row.required));
+}
+
+bool isChannel(std::string const& name) {
+    return !name.empty() && name.size() <= MAX_CHANNEL_BYTES && name.front() >= 'a' && name.front() <= 'z' &&
+           std::ranges::all_of(name, [](char c) { return (c >= 'a' && c <= 'z') || isDigit(c) || c == '_'; });
+}
+
+CarrierSettings carrierIn(std::string const& channel, json::Value const& value) {
+    if (!isChannel(channel))
+        throw Base::Error("\"carriers\" has " + Base::inQuotes(Base::oneLine(channel)) +
+                          ", which is no name of an address such as postal, email, fax or sms");
+    if (!value.isObject())
+        throw Base::Error("the carrier of " + channel + " has to be an object");
+    try {
+        return CarrierSettings(value.toObject());
+    } catch (Base::Error const& wrong) {
+        throw Base::Error("the carrier of " + channel + ": " + wrong.what());
+    }
+}
+
+constexpr std::pair<CarrierAction, char const*> ACTIONS[] = {
+    {CarrierAction::Test, "test"},
+    {CarrierAction::Pause, "pause"},
+    {CarrierAction::Resume, "resume"},
+};
+
+} // namespace
+
+struct CarrierReport::Keys {
+    static constexpr std::tuple TABLE{
+        Always{"channel", &CarrierReport::channel},     Always{"type", &CarrierReport::type},
+        Always{"state", &CarrierReport::state},         Always{"says", &CarrierReport::says},
+        Always{"since", &CarrierReport::since},         Always{"waiting", &CarrierReport::waiting},
+        Always{"uncertain", &CarrierReport::uncertain},
+    };
+};
+
+struct CarriersAnswer::Keys {
+    static constexpr std::tuple TABLE{
+        Always{"carriers", &CarriersAnswer::carriers},
+    };
+};
+
+struct CarrierChange::Keys {
+    /// "action" is not among them.
+    static constexpr std::tuple TABLE{
+        Asked{"channel", &CarrierChange::channel, TextForm{}},
+    };
+};
+
+struct CarrierTestAnswer::Keys {
+    static constexpr std::tuple TABLE{
+        Always{"says", &CarrierTestAnswer::says},
+    };
+};
+
+char const* carrierTypeName(CarrierType type) { return std::ranges::find(TYPES, type, &TypeRow::type)->name; }
+
+CarrierSettings::CarrierSettings(json::Object const& object) {
+    TypeRow const& row = typeRowNamed(object.get(TYPE).textOrEmpty());
+    requireKeys(object, row);
+    type = row.type;
+    row.read(object, *this);
+}
+
+std::optional<DayWindow> CarrierSettings::window() const { return windowIn(hours); }
+
+Carriers carriersIn(json::Object const& object) {
+    Carriers carriers;
+    for (auto const& [channel, value] : object)
+        carriers.emplace(channel, carrierIn(channel, value));
+    if (carriers.size() > MAX_CHANNELS)
+        throw Base::Error("\"carriers\" has more than " + std::to_string(MAX_CHANNELS) + " channels");
+    return carriers;
+}
+
+json::Object CarriersQuery::serialize() { return question(KIND); }
+
+CarrierReport::CarrierReport(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
+json::Object CarrierReport::serialize() const { return writeRecord(*this); }
+
+CarriersAnswer::CarriersAnswer(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
+json::Object CarriersAnswer::serialize() const { return writeRecord(*this); }
+
+char const* carrierActionName(CarrierAction action) {
+    return std::ranges::find(ACTIONS, action, &std::pair<CarrierAction, char const*>::first)->second;
+}
+
+CarrierChange::CarrierChange(CarrierAction wanted, std::string ofChannel)
+    : action(wanted), channel(std::move(ofChannel)) {}
+
+CarrierChange::CarrierChange(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+    std::string const name = object.get(ACTION).textOrEmpty();
+    auto const found = std::ranges::find_if(ACTIONS, [&](auto const& row) { return row.second == name; });
+    if (found == std::end(ACTIONS))
+        throw Base::Error("\"action\" of a change of a carrier has to be \"test\", \"pause\" or \"resume\"");
+    action = found->first;
+}
+
+json::Object CarrierChange::serialize() const {
+    json::Object object = question(KIND);
+    object.set(ACTION, carrierActionName(action));
+    json::writeKeys(Keys::TABLE, *this, object);
+    return object;
+}
+
+CarrierTestAnswer::CarrierTestAnswer(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+}
+json::Object CarrierTestAnswer::serialize() const { return writeRecord(*this); }
+
+} // namespace Protocol

@@ -1,0 +1,149 @@
+#pragma once
+// Carriers as client and service speak of them: the settings of each channel's, how it is doing, and what is
+// asked of it.
+
+#include "vlservice/json/json.h"
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace Protocol {
+
+enum class CarrierType {
+    /// Files in a folder that a print shop takes them from.
+    Folder,
+};
+
+/// The name that settings have for it.
+char const* carrierTypeName(CarrierType type);
+
+/// What becomes one file, or one job of a printer.
+enum class CarrierUnit { Letter, Mailing };
+
+/// Minutes of the day, the begin within and the end outside; an end that is not behind the begin is one of
+/// the next day.
+struct DayWindow {
+    int begin = 0;
+    int end = 0;
+};
+
+/// The settings of a carrier: those that all have, and those of its type.
+struct CarrierSettings {
+    static constexpr char const* IN_WORDS = "a carrier";
+    static constexpr std::size_t MAX_PATH_BYTES = 1000;
+
+    CarrierType type = CarrierType::Folder;
+    /// The first pause behind an attempt that failed; each further one is twice as long, up to an hour.
+    long long retrySeconds = 30;
+    /// Behind the first attempt.
+    long long giveUpHours = 120;
+    /// Letters that are handed over within a minute at most; 0 is no limit.
+    long long perMinute = 0;
+    /// Letters that are handed over side by side.
+    long long atOnce = 1;
+    /// "08:00-18:00", on the service's clock; empty for all day.
+    std::string hours;
+
+    std::string folder;
+    /// "letter" or "mailing".
+    std::string unit = "letter";
+
+    CarrierSettings() = default;
+    /// Throws Error on a type that there is not, an unknown key, one that is missing, and a bad value.
+    explicit CarrierSettings(json::Object const& object);
+
+    CarrierUnit unitOfFiles() const { return unit == "mailing" ? CarrierUnit::Mailing : CarrierUnit::Letter; }
+    /// When letters may be handed over; nothing when that is all day.
+    std::optional<DayWindow> window() const;
+
+    bool operator==(CarrierSettings const&) const = default;
+
+    struct Keys;
+};
+
+/// By the channel's name.
+using Carriers = std::map<std::string, CarrierSettings>;
+
+/// The value of the service's setting "carriers". Throws Error, which names the channel.
+Carriers carriersIn(json::Object const& object);
+
+/// Asks how the carriers are doing.
+struct CarriersQuery {
+    static constexpr char const* KIND = "carriers";
+
+    static json::Object serialize();
+};
+
+/// How a carrier is doing.
+struct CarrierReport {
+    std::string channel;
+    std::string type;
+    /// "working"; "paused" by a person; "failing", when it is tried now and then alone.
+    std::string state;
+    /// What its last failure was, or what a person wants of it; one line.
+    std::string says;
+    /// Since when it is in its state, seconds since the epoch; 0 for ever.
+    long long since = 0;
+    /// Letters by their state.
+    long long waiting = 0;
+    long long uncertain = 0;
+
+    CarrierReport() = default;
+    explicit CarrierReport(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// By their channels' names.
+struct CarriersAnswer {
+    std::vector<CarrierReport> carriers;
+
+    CarriersAnswer() = default;
+    explicit CarriersAnswer(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+enum class CarrierAction {
+    /// Tries it without sending anything.
+    Test,
+    Pause,
+    Resume,
+};
+
+/// "pause"
+char const* carrierActionName(CarrierAction action);
+
+/// Asks something of the carrier of one channel.
+struct CarrierChange {
+    static constexpr char const* KIND = "change_carrier";
+    static constexpr char const* IN_WORDS = "a change of a carrier";
+
+    CarrierAction action = CarrierAction::Test;
+    std::string channel;
+
+    CarrierChange() = default;
+    CarrierChange(CarrierAction wanted, std::string ofChannel);
+    /// Throws Error on an action that there is not, and on a wrong type.
+    explicit CarrierChange(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// The answer to a test: what the other side offers.
+struct CarrierTestAnswer {
+    std::string says;
+
+    CarrierTestAnswer() = default;
+    explicit CarrierTestAnswer(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+} // namespace Protocol

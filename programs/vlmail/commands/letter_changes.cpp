@@ -1,0 +1,78 @@
+// vlmail settle and resend: what a person decides of a letter that a carrier has.
+#include "programs/base/error.h"
+#include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/service/service_client.h"
+#include "vlservice/json/json_text.h"
+
+#include <memory>
+#include <ostream>
+
+namespace VlMail {
+namespace {
+
+using Protocol::LetterAction;
+
+struct Options {
+    ServiceOptions service;
+    std::string mailing;
+    long long letter = 0;
+    std::string outcome;
+    bool json = false;
+};
+
+int change(Options const& options, LetterAction action, Terminal const& terminal) {
+    auto const service = connectToService(options.service, terminal.err);
+    json::Object const answer =
+        ask(*service, Protocol::LetterChange(action, options.mailing, options.letter));
+    if (options.json) {
+        terminal.out << answer << '\n';
+        return FINE;
+    }
+    for (Protocol::JobReport const& job : Protocol::JobsAnswer(answer).jobs)
+        for (Protocol::LetterReport const& letter : job.letters)
+            if (letter.number == options.letter)
+                terminal.out << letter.key << ", " << Protocol::letterStateName(letter.state) << '\n';
+    return FINE;
+}
+
+int settle(Options const& options, Terminal const& terminal) {
+    if (options.outcome != "delivered" && options.outcome != "failed")
+        throw Base::Error("a letter is settled as delivered or failed, not as \"" + options.outcome + '"');
+    return change(options,
+                  options.outcome == "delivered" ? LetterAction::SettleDelivered : LetterAction::SettleFailed,
+                  terminal);
+}
+
+int resend(Options const& options, Terminal const& terminal) {
+    return change(options, LetterAction::Resend, terminal);
+}
+
+Base::Command addCommand(Base::Command const& app, Task& task, char const* name, char const* description,
+                         int (*run)(Options const&, Terminal const&),
+                         std::shared_ptr<Options> const& options) {
+    Base::Command const command = app.addCommand(name, description);
+    command.addOption("MAILING", options->mailing, "The id of a mailing").required();
+    command.addOption("LETTER", options->letter, "The number of the letter, as vlmail status MAILING has it")
+        .required();
+    command.addFlag("--json", options->json, "The service's answer as one JSON object");
+    addServiceOptions(command, options->service);
+    command.whenNamed(
+        [=, &task] { task = [=](Terminal const& terminal) { return run(*options, terminal); }; });
+    return command;
+}
+
+} // namespace
+
+void addLetterChangeCommands(Base::Command const& app, Task& task) {
+    auto const settled = std::make_shared<Options>();
+    addCommand(app, task, "settle", "Says what became of a letter that a carrier may have taken or not",
+               &settle, settled)
+        .addOption("OUTCOME", settled->outcome, "delivered or failed")
+        .required();
+    addCommand(app, task, "resend",
+               "Has a letter handed over once more that is uncertain, failed or came back", &resend,
+               std::make_shared<Options>());
+}
+
+} // namespace VlMail

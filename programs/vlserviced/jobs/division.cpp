@@ -1,0 +1,65 @@
+#include "programs/vlserviced/jobs/division.h"
+
+#include "programs/mailing/container_writer.h"
+#include "programs/mailing/entries_digest.h"
+#include "programs/vlserviced/jobs/outbox_mailing.h"
+
+#include <algorithm>
+#include <set>
+
+namespace VlServiced {
+namespace {
+
+std::string channelOf(Mailing::MailedLetter const& letter) {
+    Cfg::ExtractedField const* const address = letter.fields.primaryAddressField();
+    return address ? address->name() : std::string();
+}
+
+/// What stays in the container.
+struct Rest {
+    std::vector<std::size_t> letters;
+    /// In the container's order.
+    std::set<unsigned long long> entries;
+
+    void add(std::size_t index, std::set<unsigned long long> const& ofLetter) {
+        letters.push_back(index);
+        entries.insert(ofLetter.begin(), ofLetter.end());
+    }
+};
+
+void write(Rest const& rest, OutboxMailing& mailing, std::filesystem::path const& target) {
+    std::filesystem::create_directories(target.parent_path());
+    Mailing::ContainerWriter container(target, mailing.id());
+    Mailing::EntriesDigest digest(mailing.id());
+    for (unsigned long long const at : rest.entries) {
+        PackWrapper::BinEntry const& entry = mailing.entry(at);
+        SharedMemBuffer const blob = mailing.blob(at);
+        digest.add(entry.document, entry.name, blob);
+        container.savePage(entry.document, entry.name, blob);
+    }
+    container.finish(mailing.letters().withLetters(rest.letters, digest.text()), "make room on the disk");
+}
+
+} // namespace
+
+std::vector<DividedLetter> divide(std::filesystem::path const& container, std::filesystem::path const& rest,
+                                  HasCarrier const& hasCarrier) {
+    OutboxMailing mailing(container);
+    std::vector<DividedLetter> letters;
+    if (!mailing.letters().mailing().madeReady)
+        return letters;
+    Rest others;
+    for (std::size_t i = 0; i < mailing.letters().size(); ++i) {
+        Mailing::MailedLetter const letter = mailing.letters().letter(i);
+        std::string const channel = channelOf(letter);
+        bool const byCarrier = hasCarrier(channel);
+        letters.push_back({static_cast<long long>(i) + 1, channel, byCarrier});
+        if (!byCarrier)
+            others.add(i, mailing.entriesOf(letter));
+    }
+    if (!others.letters.empty() && others.letters.size() < letters.size())
+        write(others, mailing, rest);
+    return letters;
+}
+
+} // namespace VlServiced

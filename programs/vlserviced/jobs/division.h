@@ -1,0 +1,22 @@
+#pragma once
+// Which of a mailing's letters go by carriers, and a container for the others.
+
+#include "programs/vlserviced/store/letter_store.h"
+
+#include <filesystem>
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace VlServiced {
+
+using HasCarrier = std::function<bool(std::string const& channel)>;
+
+/// The letters of the mailing in a container, each with its channel, the name of its primary address. Where
+/// some go by carriers and others do not, `rest` becomes a container of the others. A mailing whose pages are
+/// not those that are printed goes as it is: none of its letters is told. Throws Error, and std::system_error
+/// when `rest` cannot be written.
+std::vector<DividedLetter> divide(std::filesystem::path const& container, std::filesystem::path const& rest,
+                                  HasCarrier const& hasCarrier);
+
+} // namespace VlServiced

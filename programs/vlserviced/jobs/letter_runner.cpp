@@ -1,0 +1,407 @@
+#include "programs/vlserviced/jobs/letter_runner.h"
+
+#include "programs/base/error.h"
+#include "programs/base/plain_text.h"
+#include "vlservice/platform/log.h"
+
+#include <algorithm>
+#include <limits>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+using Carriers::Outcome;
+using Protocol::CarrierUnit;
+using Protocol::JobState;
+
+/// So many failures in a row, and a carrier is tried now and then alone.
+constexpr long long MANY_FAILURES = 10;
+constexpr long long SECONDS_BETWEEN_TRIES = 15 * 60;
+/// Containers that are kept open.
+constexpr std::size_t MAX_SOURCES = 4;
+
+bool isFailing(CarrierRecord const& record) { return record.failures >= MANY_FAILURES; }
+
+std::string lettersInWords(long long count) {
+    return std::to_string(count) + (count == 1 ? " letter" : " letters");
+}
+
+/// "working", "paused", "failing".
+char const* stateOf(CarrierRecord const& record) {
+    if (record.isPaused)
+        return "paused";
+    return isFailing(record) ? "failing" : "working";
+}
+
+} // namespace
+
+std::vector<LetterId> LetterRunner::HandOver::ids() const {
+    std::vector<LetterId> ids;
+    for (StoredLetter const& letter : letters)
+        ids.push_back(letter.id);
+    return ids;
+}
+
+LetterRunner::LetterRunner(LetterStore& letters, JobStore& jobs, LetterSurroundings surroundings)
+    : letters_(letters), jobs_(jobs), surroundings_(std::move(surroundings)) {}
+
+LetterRunner::Channel& LetterRunner::channelOf(std::string const& name,
+                                               Protocol::CarrierSettings const& settings) {
+    Channel& channel = channels_[name];
+    if (!(channel.settings == settings))
+        channel.idle.clear();
+    channel.settings = settings;
+    return channel;
+}
+
+void LetterRunner::proceed() {
+    proceedAll();
+    surroundings_.proceeded();
+}
+
+void LetterRunner::proceedAll() {
+    for (auto const& handOver : std::exchange(unrecorded_, {}))
+        settle(handOver);
+    ServiceSettings const settings = surroundings_.settings();
+    if (settings.isSuspended(Suspended::Jobs))
+        return;
+    for (auto const& [name, carrier] : settings.carriers())
+        proceed(name, channelOf(name, carrier));
+}
+
+void LetterRunner::proceed(std::string const& name, Channel& channel) {
+    CarrierRecord const record = letters_.carrier(name);
+    std::size_t const most = isFailing(record) ? 1 : static_cast<std::size_t>(channel.settings.atOnce);
+    while (!record.isPaused && channel.busy < most && freeAt(name, channel) <= surroundings_.now()) {
+        std::vector<StoredLetter> letters = next(name, channel);
+        if (letters.empty())
+            return;
+        start(name, channel, std::move(letters));
+    }
+}
+
+long long LetterRunner::freeAt(std::string const& name, Channel& channel) const {
+    long long const now = surroundings_.now();
+    CarrierRecord const record = letters_.carrier(name);
+    return std::max({opensAt(channel.settings, {now, surroundings_.offset}),
+                     channel.rate.freeAt(channel.settings, now), isFailing(record) ? record.tryAt : now});
+}
+
+std::optional<long long> LetterRunner::nextTime() {
+    constexpr long long EVER = std::numeric_limits<long long>::max();
+    std::optional<long long> next;
+    ServiceSettings const service = surroundings_.settings();
+    if (service.isSuspended(Suspended::Jobs))
+        return next;
+    for (auto const& [name, settings] : service.carriers()) {
+        Channel& channel = channelOf(name, settings);
+        // Whoever comes back from its work goes on with the next.
+        if (letters_.carrier(name).isPaused || channel.busy >= static_cast<std::size_t>(settings.atOnce))
+            continue;
+        if (auto const letter = firstToGo(name, channel, EVER)) {
+            long long const at = std::max(letter->due, freeAt(name, channel));
+            next = std::min(next.value_or(EVER), at);
+        }
+    }
+    return next;
+}
+
+std::optional<StoredLetter> LetterRunner::firstToGo(std::string const& name, Channel const& channel,
+                                                    long long by) const {
+    for (StoredLetter const& letter : letters_.toGo(name, by, channel.inHand.size() + 1))
+        if (!channel.inHand.contains(letter.id))
+            return letter;
+    return std::nullopt;
+}
+
+std::vector<StoredLetter> LetterRunner::next(std::string const& name, Channel const& channel) const {
+    long long const now = surroundings_.now();
+    std::optional<StoredLetter> const first = firstToGo(name, channel, now);
+    if (!first)
+        return {};
+    if (channel.settings.unitOfFiles() == CarrierUnit::Letter)
+        return {*first};
+    std::vector<StoredLetter> together = letters_.toGoTogether(first->id.packId, name, now);
+    std::erase_if(together, [&](StoredLetter const& one) { return channel.inHand.contains(one.id); });
+    return together;
+}
+
+LetterRunner::CarrierPtr LetterRunner::idleOrNew(Channel& channel) const {
+    if (channel.idle.empty())
+        return surroundings_.makeCarrier(channel.settings);
+    CarrierPtr carrier = channel.idle.back();
+    channel.idle.pop_back();
+    return carrier;
+}
+
+void LetterRunner::start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters) {
+    auto const handOver = std::make_shared<HandOver>();
+    bool const isOne = channel.settings.unitOfFiles() == CarrierUnit::Letter;
+    handOver->channel = name;
+    handOver->settings = channel.settings;
+    handOver->key = isOne ? letters.front().id.key() : letters.front().id.packId + '-' + name;
+    handOver->source = sourceOf(letters.front().id.packId);
+    handOver->letters = std::move(letters);
+    handOver->carrier = idleOrNew(channel);
+    for (StoredLetter const& letter : handOver->letters)
+        channel.inHand.insert(letter.id);
+    ++channel.busy;
+    channel.rate.add(surroundings_.now());
+    surroundings_.onCarrier(name, static_cast<std::size_t>(channel.settings.atOnce),
+                            [this, handOver, onOwnThread = surroundings_.onOwnThread] {
+                                carryOut(*handOver);
+                                onOwnThread([this, handOver] { onDone(handOver); });
+                            });
+}
+
+void LetterRunner::carryOut(HandOver& handOver) {
+    handOver.isCarriersFault = false;
+    try {
+        MadeParcel const made = handOver.source->parcelOf(handOver.letters, handOver.key);
+        handOver.bad = made.bad;
+        handOver.isCarriersFault = true;
+        if (!made.parcel.letters.empty())
+            handOver.outcome = handOver.carrier->handOver(made.parcel);
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (std::exception const& failure) {
+        handOver.outcome = {Outcome::Kind::Failed, failure.what()};
+    }
+    handOver.outcome.says = Base::oneLine(handOver.outcome.says);
+    for (BadLetter const& bad : handOver.bad)
+        std::erase_if(handOver.letters, [&](StoredLetter const& letter) { return letter.id == bad.id; });
+}
+
+void LetterRunner::onDone(std::shared_ptr<HandOver> const& handOver) {
+    Channel& channel = channels_.at(handOver->channel);
+    --channel.busy;
+    if (channel.settings == handOver->settings)
+        channel.idle.push_back(std::move(handOver->carrier));
+    settle(handOver);
+    proceed();
+}
+
+void LetterRunner::settle(std::shared_ptr<HandOver> const& handOver) {
+    try {
+        recordOutcome(*handOver);
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (std::exception const& failure) {
+        // They stay in hand, so that nobody has them twice.
+        Log::Lock(3).logStreamLine() << "What became of " << handOver->key << " cannot be recorded. "
+                                     << Base::oneLine(failure.what());
+        unrecorded_.push_back(handOver);
+        return;
+    }
+    Channel& channel = channels_.at(handOver->channel);
+    for (LetterId const& id : handOver->ids())
+        channel.inHand.erase(id);
+    for (BadLetter const& bad : handOver->bad)
+        channel.inHand.erase(bad.id);
+    settleJob(handOver->source->packId());
+}
+
+void LetterRunner::recordOutcome(HandOver const& handOver) {
+    for (BadLetter const& bad : handOver.bad)
+        letters_.finish({bad.id}, LetterState::Failed, Base::oneLine(bad.why), surroundings_.now());
+    if (handOver.letters.empty())
+        return;
+    noteCarrier(handOver);
+    Outcome const& outcome = handOver.outcome;
+    if (outcome.kind == Outcome::Kind::Failed)
+        return postpone(handOver);
+    letters_.finish(handOver.ids(),
+                    outcome.kind == Outcome::Kind::Accepted ? LetterState::Accepted : LetterState::Failed,
+                    outcome.says, surroundings_.now());
+}
+
+void LetterRunner::postpone(HandOver const& handOver) {
+    long long const now = surroundings_.now();
+    std::string const& says = handOver.outcome.says;
+    for (StoredLetter const& letter : handOver.letters) {
+        if (isGivenUp(letter.firstTry, now, handOver.settings))
+            letters_.finish({letter.id}, LetterState::Failed,
+                            Base::oneLine("given up after " + std::to_string(handOver.settings.giveUpHours) +
+                                          " hours: " + says),
+                            now);
+        else
+            letters_.postpone({letter.id}, says, now + pauseBehind(letter.attempts + 1, handOver.settings),
+                              now);
+    }
+}
+
+void LetterRunner::noteCarrier(HandOver const& handOver) {
+    CarrierRecord record = letters_.carrier(handOver.channel);
+    bool const wasFailing = isFailing(record);
+    bool const fails = handOver.outcome.kind == Outcome::Kind::Failed;
+    if (fails ? !handOver.isCarriersFault : record.failures == 0)
+        return;
+    long long const now = surroundings_.now();
+    record.failures = fails ? record.failures + 1 : 0;
+    record.says = fails ? handOver.outcome.says : std::string();
+    record.tryAt = now + SECONDS_BETWEEN_TRIES;
+    if (wasFailing != isFailing(record)) {
+        record.since = now;
+        // Its words may tell of a recipient.
+        Log::Lock(4).logStreamLine() << "The carrier of " << handOver.channel
+                                     << (fails ? " fails and is tried every 15 minutes: \"vlmail carriers "
+                                                 "list\" says why"
+                                               : " works again");
+    }
+    letters_.setCarrier(handOver.channel, record);
+}
+
+void LetterRunner::record(std::string const& packId, std::vector<DividedLetter> const& letters) {
+    letters_.divide(packId, letters, surroundings_.now());
+    proceed();
+}
+
+void LetterRunner::settleJob(std::string const& packId) {
+    bool const isUnderWay = letters_.isUnderWay(packId);
+    LetterCounts const counts = isUnderWay ? LetterCounts() : letters_.counts(packId);
+    auto const has = [&](LetterState state) { return counts.contains(state); };
+    JobState state = JobState::Lodged;
+    if (isUnderWay || has(LetterState::Uncertain))
+        state = JobState::Delivering;
+    else if (has(LetterState::Failed) || has(LetterState::Returned))
+        state = JobState::Failed;
+    else if (!has(LetterState::Accepted))
+        state = JobState::Delivered;
+    if (isUnderWay && isDelivering(packId))
+        return;
+    jobs_.setLettersState(packId, state, problemOf(packId, counts), surroundings_.now());
+    if (state == JobState::Lodged || state == JobState::Delivered) {
+        sources_.remove_if([&](auto const& source) { return source->packId() == packId; });
+        surroundings_.taken(packId);
+    }
+}
+
+bool LetterRunner::isDelivering(std::string const& packId) const {
+    std::optional<Job> const job = jobs_.find(packId);
+    return job && job->lettersState.value_or(job->state) == JobState::Delivering;
+}
+
+std::string LetterRunner::problemOf(std::string const& packId, LetterCounts const& counts) const {
+    std::string problem;
+    for (LetterState const state : {LetterState::Uncertain, LetterState::Failed, LetterState::Returned}) {
+        auto const count = counts.find(state);
+        if (count == counts.end())
+            continue;
+        StoredLetter const first = letters_.firstIn(packId, state).value();
+        problem += (problem.empty() ? "" : "; ") + lettersInWords(count->second) + ' ' +
+                   Protocol::letterStateName(state) + ", letter " + std::to_string(first.id.number) + ": " +
+                   first.says;
+    }
+    return Base::oneLine(problem);
+}
+
+std::shared_ptr<LetterSource> LetterRunner::sourceOf(std::string const& packId) {
+    auto const found =
+        std::ranges::find_if(sources_, [&](auto const& source) { return source->packId() == packId; });
+    if (found != sources_.end()) {
+        sources_.splice(sources_.begin(), sources_, found);
+        return sources_.front();
+    }
+    sources_.push_front(std::make_shared<LetterSource>(surroundings_.outbox, packId));
+    if (sources_.size() > MAX_SOURCES)
+        sources_.pop_back();
+    return sources_.front();
+}
+
+void LetterRunner::decide(Protocol::LetterChange const& change) {
+    LetterId const id{change.id, change.number};
+    std::string const name =
+        "letter " + std::to_string(id.number) + " of mailing " + Base::oneLine(id.packId);
+    std::optional<StoredLetter> const letter = letters_.find(id);
+    if (!letter)
+        throw Base::Error("there is no " + name);
+    if (!letter->byCarrier)
+        throw Base::Error(name + " goes in the mailing's container");
+    bool const isResent = change.action == Protocol::LetterAction::Resend;
+    if (isResent && !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
+        throw Base::Error("the pages of " + name + " are gone: mail it anew");
+    bool const isDecided =
+        isResent ? letters_.decide(id, {LetterState::Uncertain, LetterState::Failed, LetterState::Returned},
+                                   LetterState::Waiting, "a person has it sent again", surroundings_.now())
+                 : letters_.decide(id, {LetterState::Uncertain},
+                                   change.action == Protocol::LetterAction::SettleDelivered
+                                       ? LetterState::Delivered
+                                       : LetterState::Failed,
+                                   "a person says so", surroundings_.now());
+    if (!isDecided)
+        throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) + ": " +
+                          (isResent ? "only one that is uncertain, failed or returned is sent again"
+                                    : "only one that is uncertain can be settled"));
+    settleJob(id.packId);
+    proceed();
+}
+
+Protocol::CarriersAnswer LetterRunner::list() const {
+    Protocol::Carriers const carriers = surroundings_.settings().carriers();
+    std::set<std::string> channels;
+    for (auto const& [channel, settings] : carriers)
+        channels.insert(channel);
+    for (std::string const& channel : letters_.channelsToGo())
+        channels.insert(channel);
+    Protocol::CarriersAnswer answer;
+    for (std::string const& channel : channels) {
+        Protocol::CarrierReport& report = answer.carriers.emplace_back();
+        CarrierRecord const record = letters_.carrier(channel);
+        auto const settings = carriers.find(channel);
+        bool const isThere = settings != carriers.end();
+        report.channel = channel;
+        report.type = isThere ? carrierTypeName(settings->second.type) : "";
+        report.state = isThere ? stateOf(record) : "missing";
+        report.says = isThere ? record.says : "letters wait for a carrier: set one, or cancel them";
+        report.since = record.since;
+        report.waiting = letters_.waiting(channel);
+        report.uncertain = letters_.uncertain(channel);
+    }
+    return answer;
+}
+
+void LetterRunner::pause(std::string const& channel) {
+    settingsOf(channel);
+    CarrierRecord record = letters_.carrier(channel);
+    if (!std::exchange(record.isPaused, true))
+        record.since = surroundings_.now();
+    letters_.setCarrier(channel, record);
+}
+
+void LetterRunner::resume(std::string const& channel) {
+    settingsOf(channel);
+    CarrierRecord record = letters_.carrier(channel);
+    if (record.isPaused || isFailing(record))
+        record = {false, 0, {}, surroundings_.now(), 0};
+    letters_.setCarrier(channel, record);
+    proceed();
+}
+
+void LetterRunner::test(std::string const& channel,
+                        std::function<void(std::string const& says, std::string const& failure)> done) {
+    std::shared_ptr<Carriers::Carrier> const carrier = surroundings_.makeCarrier(settingsOf(channel));
+    surroundings_.onTest([carrier, done = std::move(done), onOwnThread = surroundings_.onOwnThread] {
+        std::string says;
+        std::string failed;
+        try {
+            says = Base::oneLine(carrier->test());
+        } catch (std::bad_alloc const&) {
+            throw;
+        } catch (std::exception const& failure) {
+            failed = Base::oneLine(failure.what());
+        }
+        onOwnThread([done, says, failed] { done(says, failed); });
+    });
+}
+
+Protocol::CarrierSettings LetterRunner::settingsOf(std::string const& channel) const {
+    Protocol::Carriers const carriers = surroundings_.settings().carriers();
+    auto const found = carriers.find(channel);
+    if (found == carriers.end())
+        throw Base::Error("there is no carrier of " + Base::oneLine(channel) +
+                          ": \"vlmail carriers list\" shows those that there are");
+    return found->second;
+}
+
+} // namespace VlServiced

@@ -1,0 +1,136 @@
+#pragma once
+// Hands letters over to the carriers of their channels, each once, and keeps on record what became of them.
+
+#include "programs/base/local_offset.h"
+#include "programs/carriers/carrier.h"
+#include "programs/vlserviced/jobs/carrier_pace.h"
+#include "programs/vlserviced/jobs/letter_parcel.h"
+#include "programs/vlserviced/settings/service_settings.h"
+
+#include <filesystem>
+#include <functional>
+#include <list>
+#include <map>
+#include <memory>
+#include <optional>
+#include <set>
+#include <string>
+#include <vector>
+
+namespace VlServiced {
+
+/// What a runner of letters needs around it.
+struct LetterSurroundings {
+    using Work = std::function<void()>;
+
+    /// Runs work of a channel's carrier away from the caller's thread, `atOnce` side by side.
+    std::function<void(std::string const& channel, std::size_t atOnce, Work)> onCarrier;
+    /// Runs the test of a carrier away from the caller's thread.
+    std::function<void(Work)> onTest;
+    /// Runs work on the runner's own thread; may be called from any.
+    std::function<void(Work)> onOwnThread;
+    /// Seconds since the epoch.
+    std::function<long long()> now;
+    /// The service's settings as they are at that moment.
+    std::function<ServiceSettings()> settings;
+    std::filesystem::path outbox;
+    /// The clock of the place that carriers' hours are meant for.
+    Policy::UtcOffset offset = &Base::localOffset;
+    std::function<std::unique_ptr<Carriers::Carrier>(Protocol::CarrierSettings const&)> makeCarrier =
+        &Carriers::makeCarrier;
+    /// Told when the last of a job's letters was taken on, with the pack id.
+    std::function<void(std::string const& packId)> taken = [](std::string const&) {};
+    /// Told whenever nextTime() may be another.
+    std::function<void()> proceeded = [] {};
+};
+
+/// Used by one thread; the work it hands to carriers touches nothing of it.
+class LetterRunner {
+public:
+    /// All have to outlive the runner, and the runner has to outlive the work on its own thread.
+    LetterRunner(LetterStore& letters, JobStore& jobs, LetterSurroundings surroundings);
+
+    LetterStore const& store() const { return letters_; }
+
+    /// Hands over what may be handed over by now.
+    void proceed();
+    /// When something could be handed over that cannot by now; nothing when nothing waits for the clock.
+    std::optional<long long> nextTime();
+
+    /// Puts the letters of a queued job on record.
+    void record(std::string const& packId, std::vector<DividedLetter> const& letters);
+
+    /// Throws Error when the letter is not one that this can be decided of.
+    void decide(Protocol::LetterChange const& change);
+    Protocol::CarriersAnswer list() const;
+    void pause(std::string const& channel);
+    void resume(std::string const& channel);
+    /// `done` is called on the own thread, with what the other side offers and an empty text, or the other
+    /// way round with what failed. Throws Error when the channel has no carrier.
+    void test(std::string const& channel,
+              std::function<void(std::string const& says, std::string const& failure)> done);
+
+private:
+    using CarrierPtr = std::shared_ptr<Carriers::Carrier>;
+
+    /// What there is of a channel beside its record.
+    struct Channel {
+        Protocol::CarrierSettings settings;
+        /// That are at no work, by these settings.
+        std::vector<CarrierPtr> idle;
+        std::size_t busy = 0;
+        std::set<LetterId> inHand;
+        MinuteRate rate;
+    };
+
+    /// Letters that are handed over together, and what became of them.
+    struct HandOver {
+        std::string channel;
+        std::vector<StoredLetter> letters;
+        Protocol::CarrierSettings settings;
+        CarrierPtr carrier;
+        std::shared_ptr<LetterSource> source;
+        std::string key;
+        std::vector<BadLetter> bad;
+        Carriers::Outcome outcome;
+        /// Whether it was the carrier that failed, where the outcome says so.
+        bool isCarriersFault = true;
+
+        std::vector<LetterId> ids() const;
+    };
+
+    Channel& channelOf(std::string const& name, Protocol::CarrierSettings const& settings);
+    void proceedAll();
+    void proceed(std::string const& name, Channel& channel);
+    /// When the channel's carrier may be given something, as far as the clock goes.
+    long long freeAt(std::string const& name, Channel& channel) const;
+    /// The first that is due by then and in nobody's hands.
+    std::optional<StoredLetter> firstToGo(std::string const& name, Channel const& channel,
+                                          long long by) const;
+    std::vector<StoredLetter> next(std::string const& name, Channel const& channel) const;
+    void start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters);
+    static void carryOut(HandOver& handOver);
+    CarrierPtr idleOrNew(Channel& channel) const;
+    void onDone(std::shared_ptr<HandOver> const& handOver);
+    /// What cannot be put on record is kept and tried again.
+    void settle(std::shared_ptr<HandOver> const& handOver);
+    void recordOutcome(HandOver const& handOver);
+    void postpone(HandOver const& handOver);
+    void noteCarrier(HandOver const& handOver);
+    void settleJob(std::string const& packId);
+    bool isDelivering(std::string const& packId) const;
+    std::string problemOf(std::string const& packId, LetterCounts const& counts) const;
+    std::shared_ptr<LetterSource> sourceOf(std::string const& packId);
+    Protocol::CarrierSettings settingsOf(std::string const& channel) const;
+
+    LetterStore& letters_;
+    JobStore& jobs_;
+    LetterSurroundings surroundings_;
+    std::map<std::string, Channel> channels_;
+    /// Of mailings that letters were taken from last, the latest first.
+    std::list<std::shared_ptr<LetterSource>> sources_;
+    /// What the database could not take.
+    std::vector<std::shared_ptr<HandOver>> unrecorded_;
+};
+
+} // namespace VlServiced

@@ -1,0 +1,121 @@
+#pragma once
+// Letters that were divided among the channels, and how their carriers are doing, as the database keeps them.
+
+#include "programs/protocol/letter.h"
+#include "programs/vlserviced/store/job_store.h"
+
+#include <SQLiteCpp/Database.h>
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace VlServiced {
+
+using Protocol::LetterState;
+
+/// Which letter of which mailing.
+struct LetterId {
+    std::string packId;
+    /// From 1, its place in the mailing.
+    long long number = 0;
+
+    auto operator<=>(LetterId const&) const = default;
+    /// Under which it is handed over: a safe file name, which no other letter and no mailing has.
+    std::string key() const { return packId + '-' + std::to_string(number); }
+};
+
+/// A letter of a mailing that is divided.
+struct DividedLetter {
+    long long number = 0;
+    std::string channel;
+    /// Otherwise it goes in the container.
+    bool byCarrier = false;
+};
+
+struct StoredLetter {
+    LetterId id;
+    std::string channel;
+    bool byCarrier = false;
+    LetterState state = LetterState::Waiting;
+    /// One line.
+    std::string says;
+    /// Seconds since the epoch.
+    long long changedAt = 0;
+    long long attempts = 0;
+    /// When it was tried first; 0 before.
+    long long firstTry = 0;
+    /// When it may be tried next.
+    long long due = 0;
+};
+
+/// How many letters of a job that go by carriers are in each state.
+using LetterCounts = std::map<LetterState, long long>;
+
+/// How a carrier is doing.
+struct CarrierRecord {
+    bool isPaused = false;
+    /// In a row.
+    long long failures = 0;
+    std::string says;
+    /// Seconds since the epoch.
+    long long since = 0;
+    /// When it may be tried again while it fails.
+    long long tryAt = 0;
+};
+
+/// Every change is one transaction and on the disk when the operation returns.
+class LetterStore {
+public:
+    /// Both have to outlive the store.
+    LetterStore(SQLite::Database& database, JobStore& jobs) : database_(database), jobs_(jobs) {}
+
+    /// Records the letters of a queued job. False, and no change, when it is not queued or was divided
+    /// before.
+    bool divide(std::string const& packId, std::vector<DividedLetter> const& letters, long long now);
+
+    std::optional<StoredLetter> find(LetterId const& letter) const;
+    /// Of a job, in their order, at most `limit`.
+    std::vector<StoredLetter> ofJob(std::string const& packId, std::size_t limit) const;
+    long long countOfJob(std::string const& packId) const;
+    /// Of those that wait for a channel's carrier and are due by then, the first few in the order of their
+    /// time and of their division. Costs what the answer is large.
+    std::vector<StoredLetter> toGo(std::string const& channel, long long now, std::size_t limit) const;
+    /// Those of one job, all of them, in their order.
+    std::vector<StoredLetter> toGoTogether(std::string const& packId, std::string const& channel,
+                                           long long now) const;
+    /// The channels that letters wait for.
+    std::vector<std::string> channelsToGo() const;
+    long long waiting(std::string const& channel) const;
+    long long uncertain(std::string const& channel) const;
+    LetterCounts counts(std::string const& packId) const;
+    /// Whether any letter of a job waits, or is being handed over.
+    bool isUnderWay(std::string const& packId) const;
+    /// The first of a job in that state.
+    std::optional<StoredLetter> firstIn(std::string const& packId, LetterState state) const;
+
+    /// Notes that from here on the other side may have them.
+    void beginHandingOver(std::vector<LetterId> const& letters, long long now);
+    /// Notes what became of them.
+    void finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
+                long long now);
+    /// Notes an attempt that failed, and when the next one is due.
+    void postpone(std::vector<LetterId> const& letters, std::string const& says, long long due,
+                  long long now);
+    /// Moves a letter that goes by a carrier to another state; false, and no change, unless it is in one of
+    /// `from`. One that waits again is due at once and its attempts count anew.
+    bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
+                std::string const& says, long long now);
+    /// Those that were being handed over when a process ended become uncertain. Gives their jobs.
+    std::vector<std::string> doubt(std::string const& says, long long now);
+
+    CarrierRecord carrier(std::string const& channel) const;
+    void setCarrier(std::string const& channel, CarrierRecord const& record);
+
+private:
+    SQLite::Database& database_;
+    JobStore& jobs_;
+};
+
+} // namespace VlServiced
