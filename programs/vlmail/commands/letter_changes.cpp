@@ -5,6 +5,7 @@
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/json/json_text.h"
 
+#include <charconv>
 #include <memory>
 #include <ostream>
 
@@ -16,22 +17,30 @@ using Protocol::LetterAction;
 struct Options {
     ServiceOptions service;
     std::string mailing;
-    long long letter = 0;
+    std::string letter;
     std::string outcome;
     bool json = false;
 };
 
+long long numberIn(std::string const& text) {
+    long long number = 0;
+    auto const [end, failure] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (failure != std::errc() || end != text.data() + text.size() || number < 1)
+        throw Base::Error("\"" + text + "\" is no number of a letter: vlmail status MAILING shows them");
+    return number;
+}
+
 int change(Options const& options, LetterAction action, Terminal const& terminal) {
+    long long const number = numberIn(options.letter);
     auto const service = connectToService(options.service, terminal.err);
-    json::Object const answer =
-        ask(*service, Protocol::LetterChange(action, options.mailing, options.letter));
+    json::Object const answer = ask(*service, Protocol::LetterChange(action, options.mailing, number));
     if (options.json) {
         terminal.out << answer << '\n';
         return FINE;
     }
     for (Protocol::JobReport const& job : Protocol::JobsAnswer(answer).jobs)
         for (Protocol::LetterReport const& letter : job.letters)
-            if (letter.number == options.letter)
+            if (letter.number == number)
                 terminal.out << letter.key << ", " << Protocol::letterStateName(letter.state) << '\n';
     return FINE;
 }

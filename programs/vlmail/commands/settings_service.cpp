@@ -73,7 +73,7 @@ void warnOfCarriers(Channel::Client& service, json::Object const& changes, Termi
         try {
             ask(service, Protocol::CarrierChange(Protocol::CarrierAction::Test, channel));
         } catch (Base::Error const& failure) {
-            terminal.complain("the carrier of " + channel +
+            terminal.complain(std::string("the carrier of ") + channel +
                               " is set and cannot be had yet: " + failure.what());
         }
     }

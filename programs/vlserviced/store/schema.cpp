@@ -98,6 +98,8 @@ CREATE TRIGGER document_replaced AFTER UPDATE OF content ON documents
 WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
     DELETE FROM document_contents WHERE number = old.content;
 END;
+)sql";
+
 /// Letters in the order in which they were divided among the channels. Those of channels without a carrier
 /// stand for themselves in the container, and bear its state. `letters_state` is that of the others, where a
 /// job has both.
