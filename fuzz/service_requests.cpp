@@ -25,13 +25,21 @@ struct MemoryService {
     VlServiced::DocumentStore documentStore{database};
     VlServiced::DocumentService documents{documentStore, store, settings, [] { return 1LL; }};
     VlServiced::JobStore jobs{database};
+    VlServiced::LetterStore letters{database, jobs};
+    VlServiced::LetterRunner letterRunner{
+        letters, jobs,
+        VlServiced::LetterSurroundings{
+            [](std::string const&, std::size_t, VlServiced::LetterSurroundings::Work const&) {},
+            [](VlServiced::LetterSurroundings::Work const&) {},
+            [](VlServiced::LetterSurroundings::Work const&) {}, [] { return 1LL; },
+            [this] { return settings.service(); }, "/missing/outbox"}};
     VlServiced::JobRunner runner{jobs,
                                  {[](VlServiced::JobSurroundings::Work const&) {},
                                   [](VlServiced::JobSurroundings::Work const&) {},
                                   [](VlServiced::JobSurroundings::Work const&) {}, [] { return 1LL; },
                                   [this] { return settings.service(); }, "/missing/outbox"}};
     std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, documents, jobs, runner, "/missing/outbox", [] { return 1LL; });
+        settings, documents, jobs, runner, letterRunner, "/missing/outbox", [] { return 1LL; });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

@@ -179,7 +179,7 @@ public:
         asio::post(io_, [this] {
             awaitDue();
             runner_.resume();
-            letterRunner_.proceed();
+            letterRunner_.resume();
         });
         asio::post(io_, [this] { sweepPresets(); });
         manager_.onReady("listening on port " + std::to_string(server_->port()));

@@ -15,11 +15,12 @@ using Protocol::JobState;
 
 TEST(JobStates, AreKeptAndToldByTheirNames) {
     std::pair<JobState, char const*> const names[] = {
-        {JobState::Accepted, "accepted"},   {JobState::Held, "held"},
-        {JobState::Queued, "queued"},       {JobState::Submitting, "submitting"},
-        {JobState::Submitted, "submitted"}, {JobState::Lodged, "lodged"},
-        {JobState::Delivered, "delivered"}, {JobState::Failed, "failed"},
-        {JobState::Cancelled, "cancelled"}, {JobState::Tried, "tried"},
+        {JobState::Accepted, "accepted"},     {JobState::Held, "held"},
+        {JobState::Queued, "queued"},         {JobState::Submitting, "submitting"},
+        {JobState::Submitted, "submitted"},   {JobState::Lodged, "lodged"},
+        {JobState::Delivered, "delivered"},   {JobState::Failed, "failed"},
+        {JobState::Cancelled, "cancelled"},   {JobState::Tried, "tried"},
+        {JobState::Delivering, "delivering"},
     };
     EXPECT_EQ(std::size(names), Protocol::ALL_JOB_STATES.size());
     for (auto const& [state, name] : names) {
@@ -32,12 +33,14 @@ TEST(JobStates, AreKeptAndToldByTheirNames) {
 }
 
 TEST(JobStates, AreToldToClientsThatDoNotKnowThemAsTheNearestOne) {
-    EXPECT_EQ(Protocol::laterStates(), (std::vector<std::string>{"held", "cancelled", "tried"}));
+    EXPECT_EQ(Protocol::laterStates(),
+              (std::vector<std::string>{"held", "cancelled", "tried", "delivering"}));
     for (JobState const state : Protocol::ALL_JOB_STATES)
         EXPECT_EQ(Protocol::toldTo(Protocol::laterStates(), state), state);
     EXPECT_EQ(Protocol::toldTo({}, JobState::Held), JobState::Queued);
     EXPECT_EQ(Protocol::toldTo({"held", "some"}, JobState::Held), JobState::Held);
     EXPECT_EQ(Protocol::toldTo({"held"}, JobState::Tried), JobState::Queued);
+    EXPECT_EQ(Protocol::toldTo({}, JobState::Delivering), JobState::Submitted);
     EXPECT_EQ(Protocol::toldTo({"held"}, JobState::Cancelled), JobState::Failed);
     EXPECT_EQ(Protocol::toldTo({}, JobState::Submitted), JobState::Submitted);
 }
@@ -65,7 +68,8 @@ TEST(JobsQueryReading, RefusesWrongTypes) {
 }
 
 TEST(JobsQueryWriting, SaysWhatIsAskedAndNoMore) {
-    EXPECT_EQ(print(JobsQuery().serialize()), R"({"query":"jobs","states":["held","cancelled","tried"]})");
+    EXPECT_EQ(print(JobsQuery().serialize()),
+              R"({"query":"jobs","states":["held","cancelled","tried","delivering"]})");
     JobsQuery query;
     query.folder = "/srv";
     query.database = "packs.db";
@@ -74,7 +78,7 @@ TEST(JobsQueryWriting, SaysWhatIsAskedAndNoMore) {
     query.wait = 100;
     std::string const text =
         R"({"query":"jobs","db_host":"/srv","db_name":"packs.db","ids":["p1","p2"],"limit":5,"wait":100,)"
-        R"("states":["held","cancelled","tried"]})";
+        R"("states":["held","cancelled","tried","delivering"]})";
     EXPECT_EQ(print(query.serialize()), text);
     EXPECT_EQ(print(JobsQuery(query.serialize()).serialize()), text);
     EXPECT_EQ(Protocol::kindOf(query.serialize()), JobsQuery::KIND);

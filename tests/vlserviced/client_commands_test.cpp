@@ -8,6 +8,7 @@
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
+#include "tests/vlserviced/letter_help.h"
 #include "tests/vlserviced/pack_help.h"
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
@@ -76,6 +77,58 @@ protected:
     fs::path data_ = folder_ / "data";
     ServiceProcess service_{{"--data", data_.string(), "--no-discovery"}};
 };
+
+TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
+    std::string const shop = (folder_ / "shop").string();
+    std::string const file =
+        write("carriers.json", R"({"postal":{"type":"folder","folder":")" + shop + "\"}}");
+    EXPECT_EQ(output({"carriers", "list"}),
+              "the service has no carriers: \"vlmail settings service carriers=FILE\" sets some\n");
+    Result const set = vlmail({"settings", "service", "carriers=" + file});
+    EXPECT_EQ(set.status, VlMail::FINE);
+    EXPECT_EQ(set.err, "vlmail: the carrier of postal is set and cannot be had yet: cannot write into " +
+                           shop + ": No such file or directory\n");
+    EXPECT_EQ(complaint({"carriers", "test", "postal"}),
+              "vlmail: cannot write into " + shop + ": No such file or directory\n");
+    fs::create_directory(shop);
+    EXPECT_THAT(output({"carriers", "test", "postal"}),
+                HasSubstr(shop + " can be written into and has room for "));
+    EXPECT_EQ(output({"settings", "service", "carriers=" + file}), "");
+    EXPECT_EQ(output({"carriers", "list"}), "channel  type    state    since  waiting  uncertain  note\n"
+                                            "postal   folder  working               0          0\n");
+    EXPECT_THAT(output({"carriers", "pause", "postal"}), HasSubstr("postal   folder  paused"));
+    EXPECT_THAT(output({"carriers", "resume", "postal", "--json"}), HasSubstr(R"("state":"working")"));
+    EXPECT_EQ(complaint({"carriers", "pause", "fax"}),
+              "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are\n");
+    EXPECT_THAT(complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
+                HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder"));
+}
+
+TEST_F(ClientCommands, LettersAreShownWhereTheyAre) {
+    fs::create_directory(folder_ / "shop");
+    output({"settings", "service",
+            R"(carriers={"postal":{"type":"folder","folder":")" + (folder_ / "shop").string() + "\"}}"});
+    storeLetters(folder_ / "packs.db", "p1", {"postal", "email"});
+    output({"resume", "p1", "--database", (folder_ / "packs.db").string(), "--upload"});
+    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+    std::string shown;
+    do {
+        shown = output({"status", "p1"});
+    } while (shown.find("accepted") == std::string::npos && std::chrono::steady_clock::now() < end);
+    EXPECT_THAT(shown, HasSubstr("\nmailing  letter  channel  state     since                note\n"
+                                 "p1            1  postal   accepted  "));
+    EXPECT_THAT(shown, HasSubstr("\np1            2  email    waiting   "));
+    EXPECT_THAT(output({"status", "--json"}),
+                HasSubstr(R"("letters":[{"number":1,"key":"p1-1","channel":"postal",)"
+                          R"("state":"accepted","says":"in )"));
+    EXPECT_EQ(complaint({"settle", "p1", "1", "failed"}),
+              "vlmail: letter 1 of mailing p1 is accepted: only one that is uncertain can be settled\n");
+    EXPECT_EQ(complaint({"settle", "p1", "1", "lost"}),
+              "vlmail: a letter is settled as delivered or failed, not as \"lost\"\n");
+    EXPECT_EQ(complaint({"resend", "p1", "one"}),
+              "vlmail: \"one\" is no number of a letter: vlmail status MAILING shows them\n");
+    EXPECT_EQ(complaint({"resend", "p1", "3"}), "vlmail: there is no letter 3 of mailing p1\n");
+}
 
 TEST_F(ClientCommands, SettingsAreSetAndShownWithTheirOrigin) {
     EXPECT_EQ(output({"settings", "set", "/", "po", "code=R-1"}), "");

@@ -84,17 +84,18 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
               R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
     EXPECT_EQ(send(29, R"({"query":"x"})"),
               R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
-              R"(document_piece, put_document, remove_document"})");
+              R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier"})");
     EXPECT_EQ(send(29, "{}"),
               R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
-              R"(document_piece, put_document, remove_document"})");
+              R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {
     EXPECT_EQ(send(26, "{}"), R"({"outbox":")" + outbox_.string() + R"(","jobs":{}})");
     EXPECT_EQ(send(27, R"({"tariff":{"currency":"EUR","sheet":10}})"), "{}");
-    EXPECT_EQ(send(27, R"({"x":1})"),
-              R"(failed: the service has no setting "x"; there are upload_folder, tariff, disabled)");
+    EXPECT_EQ(
+        send(27, R"({"x":1})"),
+        R"(failed: the service has no setting "x"; there are upload_folder, tariff, carriers, disabled)");
     EXPECT_EQ(send(26, "{}"),
               R"({"tariff":{"currency":"EUR","sheet":10},"outbox":")" + outbox_.string() + R"(","jobs":{}})");
 }

@@ -69,12 +69,14 @@ std::string whoHas(Job const& job) {
     switch (job.state) {
     case JobState::Delivering:
         return "its letters are going out by carriers";
+    case JobState::Lodged:
+        return job.uploadFolder.empty()
+                   ? "the carriers have its letters"
+                   : "the carrier has taken it from the upload folder " + job.uploadFolder;
     case JobState::Submitting:
         return "it is being handed over to the upload folder " + job.uploadFolder;
     case JobState::Submitted:
         return "the upload folder " + job.uploadFolder + " has it since " + LocalTime::toText(job.changedAt);
-    case JobState::Lodged:
-        return "the carrier has taken it from the upload folder " + job.uploadFolder;
     case JobState::Delivered:
         return "the carrier has delivered it";
     case JobState::Cancelled:

@@ -55,6 +55,12 @@ LetterRunner::Channel& LetterRunner::channelOf(std::string const& name,
     return channel;
 }
 
+void LetterRunner::resume() {
+    for (std::string const& packId : jobs_.delivering())
+        unsettled_.insert(packId);
+    proceed();
+}
+
 void LetterRunner::proceed() {
     proceedAll();
     surroundings_.proceeded();
@@ -63,6 +69,7 @@ void LetterRunner::proceed() {
 void LetterRunner::proceedAll() {
     for (auto const& handOver : std::exchange(unrecorded_, {}))
         settle(handOver);
+    settleJobs();
     ServiceSettings const settings = surroundings_.settings();
     if (settings.isSuspended(Suspended::Jobs))
         return;
@@ -199,7 +206,7 @@ void LetterRunner::settle(std::shared_ptr<HandOver> const& handOver) {
         channel.inHand.erase(id);
     for (BadLetter const& bad : handOver->bad)
         channel.inHand.erase(bad.id);
-    settleJob(handOver->source->packId());
+    unsettled_.insert(handOver->source->packId());
 }
 
 void LetterRunner::recordOutcome(HandOver const& handOver) {
@@ -255,6 +262,13 @@ void LetterRunner::noteCarrier(HandOver const& handOver) {
 void LetterRunner::record(std::string const& packId, std::vector<DividedLetter> const& letters) {
     letters_.divide(packId, letters, surroundings_.now());
     proceed();
+}
+
+void LetterRunner::settleJobs() {
+    while (!unsettled_.empty()) {
+        settleJob(*unsettled_.begin());
+        unsettled_.erase(unsettled_.begin());
+    }
 }
 
 void LetterRunner::settleJob(std::string const& packId) {
@@ -333,7 +347,7 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
         throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) + ": " +
                           (isResent ? "only one that is uncertain, failed or returned is sent again"
                                     : "only one that is uncertain can be settled"));
-    settleJob(id.packId);
+    unsettled_.insert(id.packId);
     proceed();
 }
 

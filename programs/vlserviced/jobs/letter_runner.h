@@ -52,6 +52,8 @@ public:
 
     LetterStore const& store() const { return letters_; }
 
+    /// Takes up what an earlier process left.
+    void resume();
     /// Hands over what may be handed over by now.
     void proceed();
     /// When something could be handed over that cannot by now; nothing when nothing waits for the clock.
@@ -117,6 +119,7 @@ private:
     void recordOutcome(HandOver const& handOver);
     void postpone(HandOver const& handOver);
     void noteCarrier(HandOver const& handOver);
+    void settleJobs();
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;
     std::string problemOf(std::string const& packId, LetterCounts const& counts) const;
@@ -129,6 +132,8 @@ private:
     std::map<std::string, Channel> channels_;
     /// Of mailings that letters were taken from last, the latest first.
     std::list<std::shared_ptr<LetterSource>> sources_;
+    /// Jobs whose state may have to follow from their letters'.
+    std::set<std::string> unsettled_;
     /// What the database could not take.
     std::vector<std::shared_ptr<HandOver>> unrecorded_;
 };

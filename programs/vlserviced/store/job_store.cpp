@@ -278,6 +278,15 @@ void JobStore::setLettersState(std::string const& packId, JobState state, std::s
     changed(packId);
 }
 
+std::vector<std::string> JobStore::delivering() const {
+    SQLite::Statement query(database_, "SELECT pack FROM jobs WHERE state = 'delivering' UNION ALL "
+                                       "SELECT pack FROM jobs WHERE letters_state = 'delivering'");
+    std::vector<std::string> packIds;
+    while (query.executeStep())
+        packIds.push_back(query.getColumn(0).getString());
+    return packIds;
+}
+
 void JobStore::setProblem(std::string const& packId, std::string const& problem) {
     SQLite::Statement change(database_, "UPDATE jobs SET problem = ? WHERE pack = ?");
     change.bind(1, problem);

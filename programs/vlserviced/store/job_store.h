@@ -71,6 +71,8 @@ public:
     /// none is in the container.
     void setLettersState(std::string const& packId, JobState state, std::string const& problem,
                          long long now);
+    /// The pack ids of jobs whose letters are on their way, or were when that was noted.
+    std::vector<std::string> delivering() const;
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.

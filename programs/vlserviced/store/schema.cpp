@@ -134,6 +134,7 @@ CREATE TABLE carriers (
 ALTER TABLE jobs ADD COLUMN divided INTEGER NOT NULL DEFAULT 0;
 ALTER TABLE jobs ADD COLUMN letters_state TEXT NOT NULL DEFAULT '';
 ALTER TABLE jobs ADD COLUMN letters_problem TEXT NOT NULL DEFAULT '';
+CREATE INDEX jobs_with_letters ON jobs (pack) WHERE letters_state = 'delivering';
 )sql";
 
 } // namespace

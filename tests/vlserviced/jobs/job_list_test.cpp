@@ -24,7 +24,8 @@ protected:
         jobs_.accept(job);
     }
     json::Object list(std::string const& query, long long now = 0) {
-        return listJobs(Protocol::JobsQuery(parse(query)), jobs_, settings_, "/var/outbox", now).serialize();
+        return listJobs(Protocol::JobsQuery(parse(query)), jobs_, letters_, settings_, "/var/outbox", now)
+            .serialize();
     }
     std::string ids(std::string const& query) {
         std::string all;
@@ -44,6 +45,7 @@ protected:
     TemporaryFolder folder_;
     SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::JobStore jobs_{database_};
+    VlServiced::LetterStore letters_{database_, jobs_};
     VlServiced::SettingsStore store_{database_};
     VlServiced::SettingsService settings_{store_};
 };

@@ -42,9 +42,9 @@ TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
         char const* message;
     } const cases[] = {
         {R"({"colour":"red"})",
-         R"(the service has no setting "colour"; there are upload_folder, tariff, disabled)"},
+         R"(the service has no setting "colour"; there are upload_folder, tariff, carriers, disabled)"},
         {R"({"suspended":1})",
-         R"(the service has no setting "suspended"; there are upload_folder, tariff, disabled)"},
+         R"(the service has no setting "suspended"; there are upload_folder, tariff, carriers, disabled)"},
         {R"({"upload_folder":"relative"})",
          R"("upload_folder" has to be the absolute path of a folder that is there)"},
         {R"({"upload_folder":"/missing/folder"})",
@@ -53,6 +53,9 @@ TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
          R"("upload_folder" has to be the absolute path of a folder that is there)"},
         {R"({"tariff":7})", R"("tariff" has to be an object)"},
         {R"({"tariff":{}})", R"("currency" of the tariff has to be three capital letters)"},
+        {R"({"carriers":[]})", R"("carriers" has to be an object with the names of channels)"},
+        {R"({"carriers":{"postal":{}}})",
+         R"(the carrier of postal: "type" of a carrier has to be one of folder)"},
         {R"({"disabled":"a=acme"})", R"("disabled" has to be an array of node ids)"},
         {R"({"disabled":[7]})",
          R"("disabled" has to be an array of node ids, and the root cannot be disabled)"},

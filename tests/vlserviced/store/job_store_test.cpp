@@ -181,6 +181,7 @@ TEST_F(JobStoreTest, HoldsReleasesAndCallsBackWhatIsNotOnItsWay) {
         {JobState::Failed, JobState::Failed, JobState::Failed, JobState::Failed},
         {JobState::Cancelled, JobState::Cancelled, JobState::Cancelled, JobState::Cancelled},
         {JobState::Tried, JobState::Tried, JobState::Tried, JobState::Tried},
+        {JobState::Delivering, JobState::Delivering, JobState::Delivering, JobState::Delivering},
     };
     static_assert(std::size(cases) == Protocol::ALL_JOB_STATES.size());
     int number = 0;
@@ -330,9 +331,10 @@ TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
 }
 
 TEST_F(JobStoreTest, OrdersWhatIsDueByItsIndexAlone) {
-    SQLite::Statement plan(database_,
-                           "EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND due <= 7 "
-                           "ORDER BY due, pack");
+    SQLite::Statement plan(
+        database_,
+        "EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND due <= 7 "
+        "ORDER BY due, pack");
     std::vector<std::string> steps;
     while (plan.executeStep())
         steps.push_back(plan.getColumn(3).getString());

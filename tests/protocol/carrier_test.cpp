@@ -1,0 +1,118 @@
+#include "programs/protocol/carrier.h"
+#include "programs/protocol/letter.h"
+
+#include "tests/support/failure_of.h"
+#include "tests/vlserviced/json_help.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using Protocol::Carriers;
+using Protocol::carriersIn;
+
+std::string refusal(std::string const& text) {
+    return failureOf([&] { carriersIn(parse(text)); });
+}
+
+TEST(CarrierSettings, HaveDefaultsBesideWhatTheirTypeNeeds) {
+    Carriers const carriers = carriersIn(parse(R"({"postal": {"type": "folder", "folder": "/srv/shop"}})"));
+    Protocol::CarrierSettings const& postal = carriers.at("postal");
+    EXPECT_EQ(postal.type, Protocol::CarrierType::Folder);
+    EXPECT_EQ(postal.folder, "/srv/shop");
+    EXPECT_EQ(postal.unitOfFiles(), Protocol::CarrierUnit::Letter);
+    EXPECT_EQ(postal.retrySeconds, 30);
+    EXPECT_EQ(postal.giveUpHours, 120);
+    EXPECT_EQ(postal.perMinute, 0);
+    EXPECT_EQ(postal.atOnce, 1);
+    EXPECT_FALSE(postal.window());
+}
+
+TEST(CarrierSettings, AreReadAsTheyAreSaid) {
+    Carriers const carriers = carriersIn(parse(
+        R"({"fax": {"type": "folder", "folder": "/f", "unit": "mailing", "retry_seconds": 5, "give_up_hours": 2,
+            "per_minute": 60, "at_once": 4, "hours": "22:30-06:00"}})"));
+    Protocol::CarrierSettings const& fax = carriers.at("fax");
+    EXPECT_EQ(fax.unitOfFiles(), Protocol::CarrierUnit::Mailing);
+    EXPECT_EQ(fax.retrySeconds, 5);
+    EXPECT_EQ(fax.giveUpHours, 2);
+    EXPECT_EQ(fax.perMinute, 60);
+    EXPECT_EQ(fax.atOnce, 4);
+    EXPECT_EQ(fax.window()->begin, 22 * 60 + 30);
+    EXPECT_EQ(fax.window()->end, 6 * 60);
+}
+
+TEST(CarrierSettings, RefuseWhatTheyDoNotKnow) {
+    struct {
+        char const* settings;
+        char const* message;
+    } const cases[] = {
+        {R"({"Postal": {}})",
+         R"("carriers" has "Postal", which is no name of an address such as postal, email, fax or sms)"},
+        {R"({"a/b": {}})",
+         R"("carriers" has "a/b", which is no name of an address such as postal, email, fax or sms)"},
+        {R"({"postal": 7})", "the carrier of postal has to be an object"},
+        {R"({"postal": {}})", R"(the carrier of postal: "type" of a carrier has to be one of folder)"},
+        {R"({"postal": {"type": "pigeon"}})",
+         R"(the carrier of postal: "type" of a carrier has to be one of folder)"},
+        {R"({"postal": {"type": "folder"}})",
+         R"(the carrier of postal: a carrier of the type folder needs the key "folder")"},
+        {R"({"postal": {"type": "folder", "folder": "shop"}})",
+         R"(the carrier of postal: "folder" of a carrier has to be an absolute path)"},
+        {R"({"postal": {"type": "folder", "folder": "/a\nb"}})",
+         R"(the carrier of postal: "folder" of a carrier has to be an absolute path)"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "colour": 1}})",
+         R"(the carrier of postal: a carrier of the type folder has no key "colour")"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "unit": "page"}})",
+         R"(the carrier of postal: "unit" of a carrier has to be "letter" or "mailing")"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "at_once": 17}})",
+         R"(the carrier of postal: "at_once" of a carrier has to be an integer from 1 to 16)"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "retry_seconds": 0}})",
+         R"(the carrier of postal: "retry_seconds" of a carrier has to be an integer from 1 to 3600)"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "give_up_hours": 9000}})",
+         R"(the carrier of postal: "give_up_hours" of a carrier has to be an integer from 1 to 8760)"},
+        {R"({"postal": {"type": "folder", "folder": "/f", "per_minute": 0}})",
+         R"(the carrier of postal: "per_minute" of a carrier has to be an integer from 1 to 100000)"},
+    };
+    for (auto const& [settings, message] : cases)
+        EXPECT_EQ(refusal(settings), message) << settings;
+}
+
+TEST(CarrierSettings, TakeHoursOfTheDayAlone) {
+    auto const refused = [](std::string const& hours) {
+        return refusal(R"({"postal": {"type": "folder", "folder": "/f", "hours": ")" + hours + "\"}}");
+    };
+    EXPECT_EQ(refused("00:00-23:59"), "nothing was thrown");
+    for (char const* const hours :
+         {"8-18", "08:00", "08:00-24:00", "08:60-09:00", "08:00-08:00", "08:00-18:00 "})
+        EXPECT_EQ(refused(hours),
+                  "the carrier of postal: \"hours\" of a carrier has to be a window of the day such "
+                  "as \"08:00-18:00\"")
+            << hours;
+}
+
+TEST(CarrierSettings, AreOfSixteenChannelsAtMost) {
+    json::Object many;
+    for (int i = 0; i < 17; ++i)
+        many.set("channel" + std::to_string(i), parse(R"({"type": "folder", "folder": "/f"})"));
+    EXPECT_EQ(failureOf([&] { carriersIn(many); }), "\"carriers\" has more than 16 channels");
+}
+
+TEST(CarrierChangeReading, RefusesAnActionThatThereIsNot) {
+    EXPECT_EQ(failureOf([] { Protocol::CarrierChange(parse(R"({"action": "burn", "channel": "fax"})")); }),
+              "\"action\" of a change of a carrier has to be \"test\", \"pause\" or \"resume\"");
+}
+
+TEST(LetterChangeReading, RefusesWhatNamesNoLetter) {
+    auto const refused = [](char const* text) {
+        return failureOf([&] { Protocol::LetterChange const change(parse(text)); });
+    };
+    EXPECT_EQ(refused(R"({"action": "burn", "id": "p1", "letter": 1})"),
+              "\"action\" of a change of a letter has to be \"delivered\", \"failed\" or \"resend\"");
+    EXPECT_EQ(refused(R"({"action": "resend", "id": "p1"})"),
+              "a change of a letter needs the \"id\" of its mailing and its number, \"letter\"");
+    EXPECT_EQ(refused(R"({"action": "resend", "id": "p1", "letter": 0})"),
+              "\"letter\" of a change of a letter has to be an integer above 0");
+}
+
+} // namespace

@@ -1,0 +1,184 @@
+// A service that hands letters over to carriers, ended at any of the calls that make something durable or
+// visible: what the other side has of them is counted.
+#include "tests/faults/fault.h"
+#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/letter_help.h"
+#include "tests/vlserviced/service_process.h"
+#include "vlservice/ipc/cs_config_ids_list.h"
+#include "vlservice/ipc/process_pack.h"
+#include "vlservice/ipc/set_svc_cfg.h"
+#include "vlservice/ipc/upload_queued.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <csignal>
+#include <fstream>
+#include <set>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using testing::ElementsAre;
+
+/// Two mailings of which letters go to a print shop and others in containers.
+class CarriedLetters : public testing::Test {
+protected:
+    CarriedLetters() {
+        for (fs::path const& made : {shop_, upload_, taken_})
+            fs::create_directories(made);
+        fs::copy_file(storedPacks(), folder_ / "packs.db");
+    }
+
+    /// Made once: syncing it takes its time.
+    static fs::path storedPacks() {
+        static TemporaryFolder const folder;
+        static bool const isStored = [] {
+            storeLetters(folder / "packs.db", "p1", {"postal", "email", "postal"});
+            storeLetters(folder / "packs.db", "p2", {"postal", "postal"});
+            return true;
+        }();
+        return isStored ? folder / "packs.db" : fs::path();
+    }
+
+    std::vector<std::string> arguments() const { return {"--data", data_.string(), "--no-discovery"}; }
+
+    /// Says what is wanted, as a client does that had no answer, and waits for its end. False when the
+    /// service was gone before.
+    bool sendAll(ServiceProcess const& service) {
+        try {
+            auto const client = clientOf(service, data_);
+            client->call<Ipc::SetSvcCfg>(json::Object{
+                {"upload_folder", upload_.string()},
+                {"carriers",
+                 json::Object{{"postal", json::Object{{"type", "folder"}, {"folder", shop_.string()}}}}}});
+            for (char const* const id : {"p1", "p2"})
+                client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", id);
+            client->call<Ipc::UploadQueued>(folder_.path().string(), "packs.db");
+            awaitEnd(*client);
+            return true;
+        } catch (std::exception const&) {
+            return false;
+        }
+    }
+
+    /// The states of jobs and of their letters, as one text.
+    static std::string told(Channel::Client& client) {
+        json::Object const answer =
+            client.call<Ipc::CSConfigIdsList>(parse(R"({"query":"jobs","letters":true})"))->resp();
+        std::string text;
+        for (json::Value const& one : answer.get("jobs").toArray()) {
+            json::Object const job = one.toObject();
+            text += job.get("id").textOrEmpty() + ' ' + job.get("state").textOrEmpty() + ':';
+            if (job.get("letters"))
+                for (json::Value const& letter : job.get("letters").toArray())
+                    text += ' ' + letter.toObject().get("state").textOrEmpty();
+            text += '\n';
+        }
+        return text;
+    }
+
+    void awaitEnd(Channel::Client& client) {
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (told(client) != ENDED && std::chrono::steady_clock::now() < end) {
+        }
+        EXPECT_EQ(told(client), ENDED);
+    }
+
+    /// What the print shop does: takes everything that is whole. A key that comes once more has to be the
+    /// same.
+    void takeLetters(std::string const& when) {
+        for (fs::directory_entry const& entry : fs::directory_iterator(shop_)) {
+            fs::path const file = entry.path();
+            if (file.extension() != ".json")
+                continue;
+            for (char const* const ending : {".json", ".csv", ".pdf"}) {
+                fs::path const found = fs::path(file).replace_extension(ending);
+                ASSERT_TRUE(fs::exists(found)) << found << ' ' << when;
+                std::string const text = textOf(found);
+                auto const [known, isNew] = letters_.try_emplace(found.filename().string(), text);
+                EXPECT_EQ(known->second, text) << when;
+            }
+        }
+    }
+    void takeContainers(std::string const& when) {
+        for (fs::directory_entry const& entry : fs::directory_iterator(upload_)) {
+            std::string const name = entry.path().filename().string();
+            if (name.starts_with('.'))
+                continue;
+            EXPECT_TRUE(containers_.insert(name).second) << name << " was handed on twice, " << when;
+            fs::rename(entry.path(), taken_ / name);
+        }
+    }
+    static std::string textOf(fs::path const& file) {
+        std::ifstream in(file, std::ios::binary);
+        return {std::istreambuf_iterator<char>(in), {}};
+    }
+
+    void finish(std::string const& when) {
+        ServiceProcess service(arguments(), Faults::environmentOf({"durable", 0, 0}, folder_ / "calls"));
+        ASSERT_NE(service.port(), 0) << service.errors() << when;
+        EXPECT_TRUE(sendAll(service)) << when;
+        takeLetters(when);
+        takeContainers(when);
+        std::vector<std::string> keys;
+        for (auto const& [name, text] : letters_)
+            if (name.ends_with(".json"))
+                keys.push_back(name);
+        EXPECT_THAT(keys, ElementsAre("p1-1.json", "p1-3.json", "p2-1.json", "p2-2.json")) << when;
+        EXPECT_THAT(containers_, ElementsAre("p1.mailing")) << when;
+        service.signal(SIGTERM);
+        EXPECT_EQ(service.wait(), 0) << when;
+        for (fs::path const& folder : {data_ / "outbox", data_ / "outbox" / "rest", shop_, upload_})
+            for (fs::directory_entry const& left : fs::directory_iterator(folder))
+                EXPECT_FALSE(left.path().extension() == ".part" || left.path().extension() == ".mailing")
+                    << left.path() << ' ' << when;
+    }
+
+    static constexpr char const* ENDED =
+        "p1 submitted: accepted handed over accepted\np2 lodged: accepted accepted\n";
+
+    TemporaryFolder folder_;
+    fs::path data_ = folder_ / "data";
+    fs::path shop_ = folder_ / "shop";
+    fs::path upload_ = folder_ / "upload";
+    fs::path taken_ = folder_ / "taken";
+    /// What the print shop has, by its files' names.
+    std::map<std::string, std::string> letters_;
+    std::set<std::string> containers_;
+};
+
+class OneKillAmongLetters : public CarriedLetters {
+public:
+    /// False when the service got to the end alive.
+    bool killedAt(int call) {
+        std::string const when = "killed at call " + std::to_string(call);
+        ServiceProcess service(arguments(), Faults::environmentOf({"durable", 0, call}, folder_ / "calls"));
+        bool const survived = service.port() != 0 && sendAll(service);
+        service.signal(SIGKILL);
+        service.wait();
+        takeLetters(when);
+        finish(when);
+        return !survived;
+    }
+
+private:
+    void TestBody() override {}
+};
+
+/// Every fourth call, from the parameter on.
+class ServiceThatIsKilledAmongLetters : public testing::TestWithParam<int> {};
+
+TEST_P(ServiceThatIsKilledAmongLetters, HandsEachOverUnderItsKeyAndLosesNone) {
+    int call = GetParam();
+    while (OneKillAmongLetters().killedAt(call) && !HasFailure())
+        call += 4;
+    // Each letter is three files, which are synced, renamed and put on record.
+    EXPECT_GT(call, 100);
+}
+
+INSTANTIATE_TEST_SUITE_P(AtEveryCall, ServiceThatIsKilledAmongLetters, testing::Range(1, 5));
+
+} // namespace

@@ -1,0 +1,508 @@
+#include "programs/vlserviced/jobs/letter_runner.h"
+
+#include "programs/vlserviced/jobs/job_list.h"
+#include "programs/vlserviced/jobs/job_runner.h"
+#include "programs/vlserviced/store/schema.h"
+#include "tests/support/failure_of.h"
+#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/letter_help.h"
+#include "vlservice/platform/log.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <deque>
+#include <optional>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using Carriers::Outcome;
+using Carriers::Parcel;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Pair;
+using testing::UnorderedElementsAre;
+using VlServiced::JobRunner;
+using VlServiced::JobState;
+using VlServiced::LetterRunner;
+using VlServiced::LetterState;
+
+/// What the other side does, by the key that it is given something under.
+struct OtherSide {
+    std::vector<std::string> taken;
+    std::map<std::string, Outcome> answers;
+    /// What all are told that have no answer of their own.
+    std::optional<Outcome> answer;
+};
+
+class FakeCarrier : public Carriers::Carrier {
+public:
+    explicit FakeCarrier(OtherSide& other) : other_(other) {}
+
+    Outcome handOver(Parcel const& parcel) override {
+        other_.taken.push_back(parcel.key);
+        if (auto const own = other_.answers.find(parcel.key); own != other_.answers.end())
+            return own->second;
+        return other_.answer.value_or(Outcome{Outcome::Kind::Accepted, "thanks"});
+    }
+    std::string test() override { return "a fake"; }
+
+private:
+    OtherSide& other_;
+};
+
+/// Work of carriers is done when the test says so. Whatever was not done by then is lost when a new process
+/// takes over.
+class LetterRunnerTest : public testing::Test {
+protected:
+    LetterRunnerTest() {
+        fs::create_directory(outbox_);
+        fs::create_directory(upload_);
+        formerSink_ = Log::setSink([this](int, std::string const& line) { log_.push_back(line); });
+        setCarriers(R"("postal": {"type": "folder", "folder": "/shop"})");
+        start();
+    }
+    ~LetterRunnerTest() override { Log::setSink(formerSink_); }
+
+    void setCarriers(std::string const& carriers) {
+        settings_ = parse(R"({"upload_folder":")" + upload_.string() + R"(","carriers":{)" + carriers + "}}");
+    }
+    void start() {
+        using Work = VlServiced::LetterSurroundings::Work;
+        work_.clear();
+        letterRunner_.emplace(
+            letters_, jobs_,
+            VlServiced::LetterSurroundings{
+                [this](std::string const& channel, std::size_t, Work work) {
+                    work_.emplace_back(channel, std::move(work));
+                },
+                [](Work const& work) { work(); },
+                [](Work const& work) { work(); },
+                [this] { return now_; },
+                [this] { return VlServiced::ServiceSettings(settings_); },
+                outbox_,
+                [](long long) { return 0LL; },
+                [this](Protocol::CarrierSettings const&) { return std::make_unique<FakeCarrier>(other_); },
+                [this](std::string const& packId) { runner_->onLettersTaken(packId); },
+            });
+        VlServiced::JobSurroundings surroundings{
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [this] { return now_; },
+            [this] { return VlServiced::ServiceSettings(settings_); },
+            outbox_};
+        surroundings.letters = &*letterRunner_;
+        runner_.emplace(jobs_, std::move(surroundings));
+    }
+    void restart() {
+        start();
+        runner_->resume();
+        letterRunner_->resume();
+    }
+
+    /// Has a mailing accepted that is handed over at once.
+    void send(std::string const& id, std::vector<std::string> const& channels,
+              std::string const& preset = "\"process_mode\": 2, ") {
+        storeLetters(folder_ / "packs.db", id, channels, preset);
+        runner_->accept({folder_.path().string(), "packs.db", id},
+                        [](std::string const& failure) { EXPECT_EQ(failure, ""); });
+    }
+    /// The next piece of work that carriers have been given.
+    void doOne() {
+        auto const [channel, work] = work_.front();
+        work_.pop_front();
+        work();
+    }
+    void doWork() {
+        while (!work_.empty())
+            doOne();
+    }
+    std::string state(std::string const& id, long long number) {
+        auto const letter = letters_.find({id, number});
+        return letter ? Protocol::letterStateName(letter->state) +
+                            (letter->says.empty() ? "" : ": " + letter->says)
+                      : std::string("none");
+    }
+    Protocol::JobReport report(std::string const& id) {
+        Protocol::JobsQuery query;
+        query.ids = {id};
+        query.letters = true;
+        VlServiced::SettingsStore store(database_);
+        VlServiced::SettingsService const settings(store);
+        return listJobs(query, jobs_, letters_, settings, outbox_, now_).jobs.at(0);
+    }
+    /// The job's state and problem.
+    std::string job(std::string const& id) {
+        Protocol::JobReport const told = report(id);
+        return Protocol::stateName(told.state) + (told.problem.empty() ? "" : ": " + told.problem);
+    }
+    std::string decision(Protocol::LetterAction action, std::string const& id, long long number) {
+        return failureOf([&] { letterRunner_->decide({action, id, number}); });
+    }
+
+    TemporaryFolder folder_;
+    fs::path outbox_ = folder_ / "outbox";
+    fs::path upload_ = folder_ / "upload";
+    std::vector<std::string> log_;
+    Log::Sink formerSink_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{database_};
+    VlServiced::LetterStore letters_{database_, jobs_};
+    json::Object settings_;
+    long long now_ = 1000;
+    OtherSide other_;
+    std::deque<std::pair<std::string, std::function<void()>>> work_;
+    std::optional<LetterRunner> letterRunner_;
+    std::optional<JobRunner> runner_;
+};
+
+TEST_F(LetterRunnerTest, HandsEachLetterOverUnderItsKey) {
+    send("p1", {"postal", "postal"});
+    EXPECT_EQ(job("p1"), "delivering");
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+}
+
+TEST_F(LetterRunnerTest, LeavesChannelsWithoutACarrierToTheUploadFolder) {
+    send("p1", {"postal", "email"});
+    EXPECT_TRUE(fs::exists(upload_ / "p1.mailing"));
+    EXPECT_EQ(job("p1"), "submitted");
+    std::vector<Protocol::LetterReport> const letters = report("p1").letters;
+    EXPECT_EQ(letters.at(0).state, LetterState::Waiting);
+    EXPECT_EQ(letters.at(1).state, LetterState::HandedOver);
+    EXPECT_EQ(letters.at(1).says, "in the mailing's container");
+    EXPECT_TRUE(fs::exists(outbox_ / "p1.mailing"));
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1"));
+    EXPECT_EQ(job("p1"), "submitted");
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_FALSE(fs::exists(outbox_ / "rest" / "p1.mailing"));
+    fs::remove(upload_ / "p1.mailing");
+    runner_->updateStatus("", "");
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, LeavesAMailingAsItIsThatNoCarrierTakesLettersOf) {
+    send("p1", {"email", "fax"});
+    EXPECT_EQ(job("p1"), "submitted");
+    EXPECT_THAT(work_, IsEmpty());
+    EXPECT_EQ(report("p1").letters.size(), 2U);
+}
+
+TEST_F(LetterRunnerTest, TellsOfBothWhatTheContainersStateAndTheCarriersHaveLeftToDo) {
+    send("p1", {"postal", "email"});
+    fs::remove(upload_ / "p1.mailing");
+    runner_->updateStatus("", "");
+    EXPECT_EQ(job("p1"), "delivering");
+    other_.answer = Outcome{Outcome::Kind::Refused, "no"};
+    doWork();
+    EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 1: no");
+}
+
+TEST_F(LetterRunnerTest, NeedsNoUploadFolderWhereThereAreCarriers) {
+    settings_ = parse(R"({"carriers":{"postal": {"type": "folder", "folder": "/shop"}}})");
+    send("p1", {"postal"}, "");
+    EXPECT_EQ(failureOf([&] { runner_->upload("", ""); }), "nothing was thrown");
+    doWork();
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, TakesNoLetterBeforeItsMailingIsReleased) {
+    send("p1", {"postal"}, "\"process_mode\": 8, ");
+    letterRunner_->proceed();
+    EXPECT_THAT(work_, IsEmpty());
+    send("p2", {"postal"}, "\"process_mode\": 128, ");
+    EXPECT_EQ(job("p2"), "tried");
+    runner_->change(Protocol::JobAction::Release, "p1");
+    runner_->upload("", "");
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1"));
+}
+
+TEST_F(LetterRunnerTest, CallsNothingBackThatIsGoingOut) {
+    send("p1", {"postal"});
+    EXPECT_EQ(failureOf([&] { runner_->change(Protocol::JobAction::Cancel, "p1"); }),
+              "it is too late to cancel mailing p1: its letters are going out by carriers");
+    settings_.set("upload_folder", (folder_ / "gone").string());
+    send("p2", {"postal", "email"});
+    EXPECT_EQ(failureOf([&] { runner_->change(Protocol::JobAction::Hold, "p2"); }),
+              "it is too late to hold mailing p2: letters of it are going out by carriers");
+    doWork();
+    EXPECT_EQ(failureOf([&] { runner_->change(Protocol::JobAction::Cancel, "p1"); }),
+              "it is too late to cancel mailing p1: the carriers have its letters");
+}
+
+TEST_F(LetterRunnerTest, GivesALetterUpThatIsRefusedAndGoesOnWithTheOthers) {
+    other_.answers["p1-1"] = {Outcome::Kind::Refused, "no such street"};
+    send("p1", {"postal", "postal"});
+    doWork();
+    EXPECT_EQ(state("p1", 1), "failed: no such street");
+    EXPECT_EQ(state("p1", 2), "accepted: thanks");
+    EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 1: no such street");
+    EXPECT_TRUE(fs::exists(outbox_ / "p1.mailing"));
+}
+
+TEST_F(LetterRunnerTest, TriesALetterAgainBehindPausesThatDouble) {
+    other_.answers["p1-1"] = {Outcome::Kind::Failed, "no connection"};
+    send("p1", {"postal"});
+    for (long long const pause : {30, 60, 120}) {
+        doWork();
+        EXPECT_EQ(state("p1", 1), "waiting: no connection");
+        EXPECT_EQ(letterRunner_->nextTime(), now_ + pause);
+        now_ += pause - 1;
+        letterRunner_->proceed();
+        EXPECT_THAT(work_, IsEmpty());
+        ++now_;
+        letterRunner_->proceed();
+        EXPECT_EQ(work_.size(), 1U);
+    }
+    other_.answers.clear();
+    doWork();
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+}
+
+TEST_F(LetterRunnerTest, GivesALetterUpInTime) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "give_up_hours": 1})");
+    other_.answer = Outcome{Outcome::Kind::Failed, "no connection"};
+    send("p1", {"postal"});
+    doWork();
+    now_ += 3600;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 1), "failed: given up after 1 hours: no connection");
+    EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 1: given up after 1 hours: no connection");
+}
+
+TEST_F(LetterRunnerTest, TriesACarrierEveryQuarterOfAnHourThatFailsTenTimesInARow) {
+    other_.answer = Outcome{Outcome::Kind::Failed, "no connection for ada@example.org"};
+    send("p1", std::vector<std::string>(12, "postal"));
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 10U);
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).state, "failing");
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).says, "no connection for ada@example.org");
+    EXPECT_THAT(log_,
+                ElementsAre("The carrier of postal fails and is tried every 15 minutes: \"vlmail carriers "
+                            "list\" says why"));
+    EXPECT_EQ(letterRunner_->nextTime(), now_ + 900);
+    now_ += 900;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 11U);
+    restart();
+    EXPECT_THAT(work_, IsEmpty());
+    other_.answer.reset();
+    now_ += 900;
+    letterRunner_->proceed();
+    EXPECT_EQ(work_.size(), 1U);
+    doWork();
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).state, "working");
+}
+
+TEST_F(LetterRunnerTest, CountsNoRefusalAsAFailureOfTheCarrier) {
+    other_.answer = Outcome{Outcome::Kind::Refused, "no"};
+    send("p1", std::vector<std::string>(20, "postal"));
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 20U);
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).state, "working");
+}
+
+TEST_F(LetterRunnerTest, HandsOverSideBySideAsManyAsItMay) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "at_once": 3})");
+    send("p1", std::vector<std::string>(5, "postal"));
+    EXPECT_EQ(work_.size(), 3U);
+    doOne();
+    EXPECT_EQ(work_.size(), 3U);
+    doWork();
+    EXPECT_THAT(other_.taken, UnorderedElementsAre("p1-1", "p1-2", "p1-3", "p1-4", "p1-5"));
+}
+
+TEST_F(LetterRunnerTest, HoldsUpNoOtherChannel) {
+    setCarriers(
+        R"("postal": {"type": "folder", "folder": "/shop"}, "fax": {"type": "folder", "folder": "/fax"})");
+    send("p1", {"postal", "postal", "fax"});
+    std::vector<std::string> channels;
+    for (auto const& [channel, work] : work_)
+        channels.push_back(channel);
+    EXPECT_THAT(channels, UnorderedElementsAre("postal", "fax"));
+}
+
+TEST_F(LetterRunnerTest, KeepsToTheHoursOfACarrier) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "hours": "08:00-18:00"})");
+    now_ = 7 * 3600;
+    send("p1", {"postal"});
+    EXPECT_THAT(work_, IsEmpty());
+    EXPECT_EQ(letterRunner_->nextTime(), 8 * 3600);
+    now_ = 8 * 3600;
+    letterRunner_->proceed();
+    EXPECT_EQ(work_.size(), 1U);
+}
+
+TEST_F(LetterRunnerTest, KeepsToTheRateOfACarrier) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "per_minute": 2})");
+    send("p1", {"postal", "postal", "postal"});
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 2U);
+    EXPECT_EQ(letterRunner_->nextTime(), now_ + 60);
+    now_ += 60;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 3U);
+}
+
+TEST_F(LetterRunnerTest, HandsNothingOverToACarrierThatIsPaused) {
+    send("p1", {"postal", "postal"});
+    letterRunner_->pause("postal");
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 1U);
+    EXPECT_EQ(letterRunner_->nextTime(), std::nullopt);
+    restart();
+    EXPECT_THAT(work_, IsEmpty());
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).state, "paused");
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).waiting, 1);
+    letterRunner_->resume("postal");
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 2U);
+    EXPECT_EQ(failureOf([&] { letterRunner_->pause("fax"); }),
+              "there is no carrier of fax: \"vlmail carriers list\" shows those that there are");
+}
+
+TEST_F(LetterRunnerTest, HandsNothingOverWhileJobsAreHeldBack) {
+    send("p1", {"postal", "postal"});
+    settings_.set("suspended", 2);
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 1U);
+    EXPECT_EQ(letterRunner_->nextTime(), std::nullopt);
+    settings_.set("suspended", 0);
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(other_.taken.size(), 2U);
+}
+
+TEST_F(LetterRunnerTest, HandsOverAMailingAsOneWhereTheCarrierWantsIt) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "unit": "mailing"})");
+    send("p1", {"postal", "postal", "email"});
+    send("p2", {"postal"});
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-postal", "p2-postal"));
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_EQ(state("p1", 2), "accepted: thanks");
+}
+
+TEST_F(LetterRunnerTest, GoesOnWhereAProcessWasEnded) {
+    send("p1", {"postal", "postal"});
+    doOne();
+    restart();
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, BringsAJobUpToDateWhoseLastLetterAProcessHadJustRecorded) {
+    send("p1", {"postal"});
+    send("p2", {"postal", "email"});
+    letters_.finish({{"p1", 1}, {"p2", 1}}, LetterState::Accepted, "thanks", now_);
+    restart();
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_EQ(job("p2"), "submitted");
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+    EXPECT_FALSE(fs::exists(outbox_ / "p2.mailing"));
+}
+
+TEST_F(LetterRunnerTest, KeepsALetterInHandWhoseOutcomeCannotBeRecorded) {
+    send("p1", {"postal"});
+    database_.exec(
+        "CREATE TEMP TRIGGER full BEFORE UPDATE ON letters BEGIN SELECT raise(FAIL, 'disk full'); END");
+    doWork();
+    letterRunner_->proceed();
+    EXPECT_THAT(work_, IsEmpty());
+    EXPECT_THAT(log_, testing::Contains(HasSubstr("What became of p1-1 cannot be recorded. ")));
+    database_.exec("DROP TRIGGER full");
+    letterRunner_->proceed();
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1"));
+}
+
+TEST_F(LetterRunnerTest, TakesNoFaultOfAContainerForOneOfTheCarrier) {
+    send("p1", {"postal"});
+    fs::rename(outbox_ / "p1.mailing", outbox_ / "away");
+    doWork();
+    EXPECT_EQ(state("p1", 1),
+              "waiting: the container " + (outbox_ / "p1.mailing").string() + " cannot be read");
+    EXPECT_EQ(letters_.carrier("postal").failures, 0);
+    fs::rename(outbox_ / "away", outbox_ / "p1.mailing");
+    now_ += 30;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+}
+
+TEST_F(LetterRunnerTest, SendsALetterAgainWhenAPersonWantsIt) {
+    other_.answers["p1-1"] = {Outcome::Kind::Refused, "no such street"};
+    send("p1", {"postal", "postal"});
+    doWork();
+    other_.answers.clear();
+    EXPECT_EQ(
+        decision(Protocol::LetterAction::Resend, "p1", 2),
+        "letter 2 of mailing p1 is accepted: only one that is uncertain, failed or returned is sent again");
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 1), "nothing was thrown");
+    EXPECT_EQ(state("p1", 1), "waiting: a person has it sent again");
+    EXPECT_EQ(job("p1"), "delivering");
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2", "p1-1"));
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, LetsAPersonSettleALetterThatIsUncertain) {
+    send("p1", {"postal", "email"});
+    doWork();
+    letters_.finish({{"p1", 1}}, LetterState::Uncertain, "cut", now_);
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleDelivered, "p1", 1), "nothing was thrown");
+    EXPECT_EQ(state("p1", 1), "delivered: a person says so");
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleFailed, "p1", 1),
+              "letter 1 of mailing p1 is delivered: only one that is uncertain can be settled");
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleFailed, "p1", 2),
+              "letter 2 of mailing p1 goes in the mailing's container");
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 9), "there is no letter 9 of mailing p1");
+}
+
+TEST_F(LetterRunnerTest, TellsOfLettersWhoseCarrierIsGone) {
+    send("p1", {"postal", "postal"});
+    setCarriers("");
+    doOne();
+    EXPECT_THAT(work_, IsEmpty());
+    Protocol::CarrierReport const report = letterRunner_->list().carriers.at(0);
+    EXPECT_EQ(report.state, "missing");
+    EXPECT_EQ(report.waiting, 1);
+}
+
+TEST_F(LetterRunnerTest, TestsACarrierWithoutSendingAnything) {
+    std::string told;
+    letterRunner_->test(
+        "postal", [&](std::string const& says, std::string const& failure) { told = says + '|' + failure; });
+    EXPECT_EQ(told, "a fake|");
+    EXPECT_THAT(other_.taken, IsEmpty());
+}
+
+TEST_F(LetterRunnerTest, LeavesAnOlderMailingAsItIsWhosePagesAreNotThoseThatArePrinted) {
+    storePack(folder_ / "packs.db", "p1", "a=acme", "\"process_mode\": 2, ");
+    runner_->accept({folder_.path().string(), "packs.db", "p1"}, [](std::string const&) {});
+    EXPECT_EQ(job("p1"), "submitted");
+    EXPECT_THAT(report("p1").letters, IsEmpty());
+}
+
+TEST_F(LetterRunnerTest, LetsAMailingWaitWhoseContainerIsDamaged) {
+    send("p1", {"postal"}, "");
+    fs::resize_file(outbox_ / "p1.mailing", 40);
+    runner_->upload("", "");
+    EXPECT_EQ(job("p1"), "queued: the container " + (outbox_ / "p1.mailing").string() + " cannot be read");
+}
+
+} // namespace

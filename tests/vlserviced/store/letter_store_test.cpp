@@ -1,0 +1,170 @@
+#include "programs/vlserviced/store/letter_store.h"
+
+#include "programs/vlserviced/store/schema.h"
+#include "tests/support/temporary_folder.h"
+
+#include <SQLiteCpp/Statement.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::Pair;
+using VlServiced::DividedLetter;
+using VlServiced::Job;
+using VlServiced::JobState;
+using VlServiced::LetterId;
+using VlServiced::LetterState;
+using VlServiced::LetterStore;
+using VlServiced::StoredLetter;
+
+class LetterStoreTest : public testing::Test {
+protected:
+    void queue(std::string const& packId) {
+        Job job;
+        job.pack = {"/srv", "packs.db", packId};
+        jobs_.accept(job);
+        jobs_.advance(packId, JobState::Accepted, JobState::Queued, 1);
+    }
+    void divide(std::string const& packId, std::vector<DividedLetter> const& letters) {
+        queue(packId);
+        EXPECT_TRUE(letters_.divide(packId, letters, 5));
+    }
+    std::vector<std::string> toGo(std::string const& channel, long long now, std::size_t limit = 100) {
+        std::vector<std::string> keys;
+        for (StoredLetter const& letter : letters_.toGo(channel, now, limit))
+            keys.push_back(letter.id.key());
+        return keys;
+    }
+    LetterState state(std::string const& packId, long long number) {
+        return letters_.find({packId, number})->state;
+    }
+
+    TemporaryFolder folder_;
+    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{database_};
+    LetterStore letters_{database_, jobs_};
+};
+
+TEST_F(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
+    divide("p1", {{1, "postal", true}, {2, "email", true}});
+    EXPECT_EQ(jobs_.find("p1")->state, JobState::Delivering);
+    EXPECT_TRUE(jobs_.find("p1")->isDivided);
+    EXPECT_FALSE(jobs_.find("p1")->lettersState);
+    EXPECT_FALSE(letters_.divide("p1", {{1, "fax", true}}, 6));
+    StoredLetter const letter = letters_.find({"p1", 2}).value();
+    EXPECT_EQ(letter.channel, "email");
+    EXPECT_EQ(letter.state, LetterState::Waiting);
+    EXPECT_EQ(letter.changedAt, 5);
+    EXPECT_EQ(letters_.ofJob("p1", 100).size(), 2U);
+    EXPECT_EQ(letters_.ofJob("p1", 1).size(), 1U);
+    EXPECT_EQ(letters_.countOfJob("p1"), 2);
+}
+
+TEST_F(LetterStoreTest, LeavesAJobOnItsWayWhoseLettersAreNotAllCarried) {
+    divide("p1", {{1, "postal", true}, {2, "email", false}});
+    EXPECT_EQ(jobs_.find("p1")->state, JobState::Queued);
+    EXPECT_EQ(jobs_.find("p1")->lettersState, JobState::Delivering);
+    divide("p2", {{1, "email", false}});
+    EXPECT_EQ(jobs_.find("p2")->state, JobState::Queued);
+    EXPECT_FALSE(jobs_.find("p2")->lettersState);
+    EXPECT_TRUE(jobs_.find("p2")->isDivided);
+}
+
+TEST_F(LetterStoreTest, DividesNothingThatIsNotQueued) {
+    queue("p1");
+    jobs_.hold("p1", 2);
+    EXPECT_FALSE(letters_.divide("p1", {{1, "postal", true}}, 5));
+    EXPECT_THAT(letters_.ofJob("p1", 100), IsEmpty());
+}
+
+TEST_F(LetterStoreTest, GivesLettersInTheOrderOfTheirTimeAndOfTheirDivision) {
+    divide("p2", {{1, "postal", true}, {2, "email", true}, {3, "postal", true}});
+    divide("p1", {{1, "postal", true}, {2, "postal", false}});
+    EXPECT_THAT(toGo("postal", 10), ElementsAre("p2-1", "p2-3", "p1-1"));
+    EXPECT_THAT(toGo("postal", 10, 2), ElementsAre("p2-1", "p2-3"));
+    letters_.postpone({{"p2", 1}}, "no connection", 20, 10);
+    EXPECT_THAT(toGo("postal", 10), ElementsAre("p2-3", "p1-1"));
+    EXPECT_THAT(toGo("postal", 20), ElementsAre("p2-3", "p1-1", "p2-1"));
+    StoredLetter const letter = letters_.find({"p2", 1}).value();
+    EXPECT_EQ(letter.says, "no connection");
+    EXPECT_EQ(letter.attempts, 1);
+    EXPECT_EQ(letter.firstTry, 10);
+    EXPECT_EQ(letter.due, 20);
+    EXPECT_THAT(letters_.channelsToGo(), ElementsAre("email", "postal"));
+    EXPECT_EQ(letters_.waiting("postal"), 3);
+}
+
+TEST_F(LetterStoreTest, GivesTheLettersOfAJobTogether) {
+    divide("p1", {{3, "postal", true}, {1, "postal", true}, {2, "email", true}, {4, "postal", true}});
+    letters_.finish({{"p1", 4}}, LetterState::Accepted, "", 9);
+    std::vector<long long> numbers;
+    for (StoredLetter const& letter : letters_.toGoTogether("p1", "postal", 10))
+        numbers.push_back(letter.id.number);
+    EXPECT_THAT(numbers, ElementsAre(1, 3));
+}
+
+TEST_F(LetterStoreTest, CountsWhatBecameOfAJobsLetters) {
+    divide("p1", {{1, "postal", true}, {2, "postal", true}, {3, "postal", true}, {4, "email", false}});
+    EXPECT_TRUE(letters_.isUnderWay("p1"));
+    letters_.finish({{"p1", 1}, {"p1", 2}}, LetterState::Failed, "no such street", 9);
+    letters_.finish({{"p1", 3}}, LetterState::Accepted, "thanks", 9);
+    EXPECT_FALSE(letters_.isUnderWay("p1"));
+    EXPECT_THAT(letters_.counts("p1"),
+                ElementsAre(Pair(LetterState::Accepted, 1), Pair(LetterState::Failed, 2)));
+    EXPECT_EQ(letters_.firstIn("p1", LetterState::Failed)->says, "no such street");
+    EXPECT_FALSE(letters_.firstIn("p1", LetterState::Returned));
+}
+
+TEST_F(LetterStoreTest, LetsAPersonDecideOfCertainStatesAlone) {
+    divide("p1", {{1, "postal", true}, {2, "email", false}});
+    letters_.postpone({{"p1", 1}}, "busy", 50, 10);
+    EXPECT_FALSE(letters_.decide({"p1", 1}, {LetterState::Failed}, LetterState::Waiting, "again", 11));
+    EXPECT_FALSE(letters_.decide({"p1", 2}, {LetterState::Waiting}, LetterState::Failed, "no", 11));
+    letters_.finish({{"p1", 1}}, LetterState::Failed, "given up", 12);
+    EXPECT_TRUE(letters_.decide({"p1", 1}, {LetterState::Returned, LetterState::Failed}, LetterState::Waiting,
+                                "again", 13));
+    StoredLetter const letter = letters_.find({"p1", 1}).value();
+    EXPECT_EQ(letter.says, "again");
+    EXPECT_EQ(letter.attempts, 0);
+    EXPECT_EQ(letter.firstTry, 0);
+    EXPECT_THAT(toGo("postal", 0), ElementsAre("p1-1"));
+}
+
+TEST_F(LetterStoreTest, KeepsHowCarriersAreDoing) {
+    EXPECT_FALSE(letters_.carrier("fax").isPaused);
+    EXPECT_EQ(letters_.carrier("fax").failures, 0);
+    letters_.setCarrier("fax", {true, 11, "no line", 70, 80});
+    VlServiced::CarrierRecord const record = letters_.carrier("fax");
+    EXPECT_TRUE(record.isPaused);
+    EXPECT_EQ(record.failures, 11);
+    EXPECT_EQ(record.says, "no line");
+    EXPECT_EQ(record.since, 70);
+    EXPECT_EQ(record.tryAt, 80);
+}
+
+TEST_F(LetterStoreTest, LetsLettersGoWithTheirJob) {
+    divide("p1", {{1, "postal", true}});
+    database_.exec("DELETE FROM jobs");
+    EXPECT_FALSE(letters_.find({"p1", 1}));
+}
+
+TEST_F(LetterStoreTest, LooksForWaitingLettersByTheIndexThatHoldsThem) {
+    SQLite::Statement query(database_,
+                            "EXPLAIN QUERY PLAN SELECT * FROM letters INDEXED BY letters_to_go WHERE "
+                            "channel = 'x' AND due <= 5 AND state = 'waiting' AND by_carrier = 1 "
+                            "ORDER BY due, id LIMIT 3");
+    std::string plan;
+    while (query.executeStep())
+        plan += query.getColumn(3).getString() + '\n';
+    EXPECT_EQ(plan, "SEARCH letters USING INDEX letters_to_go (channel=? AND due<?)\n");
+}
+
+TEST(LetterKeys, AreNoneOfAnotherLetterOrOfAMailing) {
+    EXPECT_EQ((LetterId{"p1", 3}.key()), "p1-3");
+    EXPECT_NE((LetterId{"p1-3", 1}.key()), (LetterId{"p1", 31}.key()));
+}
+
+} // namespace
