@@ -16,7 +16,6 @@ namespace {
 namespace fs = std::filesystem;
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
 using VlServiced::DividedLetter;
 using VlServiced::LetterSource;

@@ -23,10 +23,8 @@ using Carriers::Parcel;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::Pair;
 using testing::UnorderedElementsAre;
 using VlServiced::JobRunner;
-using VlServiced::JobState;
 using VlServiced::LetterRunner;
 using VlServiced::LetterState;
 
