@@ -402,9 +402,9 @@ TEST_F(ClientCommands, TheServicesSettingsAreShown) {
                                                    "jobs           {}\n");
     output({"settings", "service", "upload_folder="});
     EXPECT_THAT(output({"settings", "service", "--json"}), testing::StartsWith("{\"outbox\":"));
-    EXPECT_EQ(
-        complaint({"settings", "service", "colour=red"}),
-        "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE or disabled=[...]\n");
+    EXPECT_EQ(complaint({"settings", "service", "colour=red"}),
+              "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE, carriers=FILE or "
+              "disabled=[...]\n");
 }
 
 TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {
