@@ -184,10 +184,6 @@ std::optional<StoredLetter> LetterStore::firstIn(std::string const& packId, Lett
     return firstLetterIn(query);
 }
 
-void LetterStore::beginHandingOver(std::vector<LetterId> const& letters, long long now) {
-    finish(letters, LetterState::HandedOver, {}, now);
-}
-
 void LetterStore::finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
                          long long now) {
     SQLite::Statement change(database_, "UPDATE letters SET state = ?, says = ?, changed_at = ? "
@@ -225,21 +221,6 @@ bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const&
     change.bind(4, letter.packId);
     bind(change, 5, letter.number);
     return change.exec() == 1;
-}
-
-std::vector<std::string> LetterStore::doubt(std::string const& says, long long now) {
-    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
-    SQLite::Statement query(database_, "SELECT DISTINCT pack FROM letters WHERE state = 'handed over'");
-    std::vector<std::string> packs;
-    while (query.executeStep())
-        packs.push_back(query.getColumn(0).getString());
-    SQLite::Statement change(database_, "UPDATE letters SET state = 'uncertain', says = ?, changed_at = ? "
-                                        "WHERE state = 'handed over'");
-    change.bind(1, says);
-    bind(change, 2, now);
-    change.exec();
-    transaction.commit();
-    return packs;
 }
 
 CarrierRecord LetterStore::carrier(std::string const& channel) const {
