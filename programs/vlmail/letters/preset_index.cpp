@@ -19,7 +19,7 @@ namespace {
 using enum Cfg::PresetFieldIdxs;
 
 /// Fewer are walked as fast.
-constexpr std::size_t WORTH_AN_INDEX = 20;
+constexpr std::size_t WORTH_AN_INDEX = 6;
 /// An expression may be too complex for a longer name, which must be told.
 constexpr std::size_t LONGEST_NAME = 200;
 constexpr std::size_t PIECE = 3;
@@ -73,6 +73,14 @@ std::vector<Words> wordsOf(Cfg::ExtractPreset const& preset) {
     return std::move(*alternatives);
 }
 
+/// Whether no name makes the expression take long: at most one thing in it repeats.
+bool isQuick(Cfg::ExtractPreset const& preset) {
+    std::string const& pattern = preset.strRegex();
+    auto const repeats = std::ranges::count_if(
+        pattern, [](char c) { return std::string_view("*+?{").find(c) != std::string_view::npos; });
+    return !preset.isCompiled() && repeats <= 1 && pattern.find_first_of("(|") == std::string::npos;
+}
+
 using Counts = std::unordered_map<std::uint32_t, std::size_t>;
 
 Counts countPieces(std::vector<std::vector<Words>> const& presets) {
@@ -105,6 +113,7 @@ PresetIndex::PresetIndex(Cfg::Presets const& presets, std::chrono::milliseconds 
     }
     for (auto const& element : presets.elements<PackPresets>())
         packPresets_.emplace(element.value.name(), &element.value);
+    isWalked_ = !isIndexed_ && std::ranges::all_of(extractPresets_, [](auto* one) { return isQuick(*one); });
     if (!isIndexed_)
         return;
     std::vector<std::vector<Words>> words;
@@ -168,6 +177,8 @@ std::optional<PresetIndex::Match> PresetIndex::findInTime(std::string const& nam
 }
 
 PresetIndex::Match PresetIndex::findMatch(std::string const& name) const {
+    if (isWalked_)
+        return presets_.findMatch(name);
     std::optional<Match> const match = findInTime(name);
     // The walk says what is missing, in time: all patterns before that have been tried.
     return match ? *match : presets_.findMatch(name);

@@ -51,6 +51,8 @@ private:
     std::vector<Cfg::ExtractPreset const*> extractPresets_;
     Positions all_;
     bool isIndexed_;
+    /// Few presets, none of which needs a limit of time.
+    bool isWalked_ = false;
     /// Of presets that are tried for every name; rising.
     Positions always_;
     std::unordered_map<std::uint32_t, Positions> byPiece_;
