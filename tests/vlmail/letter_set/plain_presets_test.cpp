@@ -96,4 +96,23 @@ TEST_F(PlainPresets, HaveNoErrorsInTheEyesOfLint) {
     EXPECT_THAT(ran.out, testing::HasSubstr(": 0 errors, ")) << ran.out;
 }
 
+TEST_F(PlainPresets, SendPagesThatLookAsTheyDid) {
+    std::vector<std::string> arguments{"mail",    "--json", "--settings",
+                                       settings_, "-o",     (folder_ / "out").string()};
+    for (LetterSet::Letter const& letter : letters_)
+        arguments.push_back((folder_ / letter.name.c_str()).string());
+    Ran const ran = runVlMail(arguments);
+    json::Object const outcome = json::strToObject(ran.out.data(), ran.out.size());
+    for (char const* const told : {"left_out", "failures", "notes"}) {
+        std::string const all = outcome.get(told) ? inText(outcome.get(told)) : "";
+        EXPECT_EQ(all.find("page-differs"), std::string::npos) << all;
+        EXPECT_EQ(all.find("page-redrawn"), std::string::npos) << all;
+        EXPECT_EQ(all.find("damaged"), std::string::npos) << all;
+    }
+    long long sent = 0;
+    for (json::Value const& mailing : outcome.get("mailings").toArray())
+        sent += mailing.toObject().get("letters").toInt();
+    EXPECT_EQ(sent, 42) << inText(outcome.get("left_out"));
+}
+
 } // namespace

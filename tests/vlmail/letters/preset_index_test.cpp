@@ -166,7 +166,8 @@ TEST(PresetIndex, AgreesWithTheWalkOnAnyExpressionsAndNames) {
             expressions.push_back(randomExpression(random));
         if (seed % 3 != 0)
             std::erase_if(expressions, [](std::string const& one) { return !Patterns::requiredWords(one); });
-        expressions.resize(40, "zzz");
+        // So few are walked.
+        expressions.resize(seed % 4 == 0 ? 1 + seed % 5 : 40, "zzz");
         Cfg::Presets const presets = presetsFor(expressions);
         PresetIndex const index(presets);
         for (int i = 0; i < 40; ++i) {
@@ -189,6 +190,16 @@ TEST(PresetIndex, EndsInTimeAndNamesTheExpressionThatWasTriedLast) {
                     testing::MatchesRegex("the patterns of presets took longer than 0\\.030 s for the "
                                           "document's name, \"\\(\\?i\\)\\.\\*\\.\\*\\.\\*:[0-9]+\" last"));
     }
+}
+
+TEST(PresetIndex, HoldsFewPresetsToTheTimeToo) {
+    using std::chrono_literals::operator""ms;
+    Cfg::Presets const presets = presetsFor({"invoice.*", "(?i).*.*.*.*.*:1", ".*"});
+    PresetIndex const index(presets, 30ms);
+    EXPECT_EQ(foundBy(index, "Invoice 1"), foundBy(presets, "Invoice 1"));
+    EXPECT_EQ(foundBy(index, std::string(190, 'x')),
+              "the patterns of presets took longer than 0.030 s for the document's name, "
+              "\"(?i).*.*.*.*.*:1\" last");
 }
 
 TEST(PresetIndex, TellsOfExpressionsThatAreTooComplexAsTheWalkDoes) {
