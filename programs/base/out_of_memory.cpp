@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <cstring>
+#include <exception>
 #include <new>
 
 #include <unistd.h>
@@ -19,11 +20,28 @@ void endOrThrow() {
     throw std::bad_alloc();
 }
 
+std::terminate_handler otherwise = nullptr;
+
+/// std::bad_alloc may come where nothing may be thrown.
+[[noreturn]] void endOrTerminate() {
+    try {
+        if (std::current_exception())
+            throw;
+    } catch (std::bad_alloc const&) {
+        endOutOfMemory();
+    } catch (...) {
+        // Whatever else it is, is told by who tells it anyway.
+    }
+    otherwise();
+    std::abort();
+}
+
 } // namespace
 
 void endWhenOutOfMemory(char const* line) noexcept {
     lastLine = line;
     std::set_new_handler(endOrThrow);
+    otherwise = std::set_terminate(endOrTerminate);
     holdLibraryMemory({&std::malloc, &std::realloc});
 }
 

@@ -9,8 +9,9 @@ namespace Base {
 constexpr std::size_t ENOUGH_TO_GO_ON = std::size_t{1} << 16;
 
 /// From here on the process ends as endOutOfMemory() does when operator new, or a library of those in
-/// library_memory.h, finds no memory at all. A request that alone is too large fails as ever. `line` must
-/// live as long as the process. To be called before anything of the library for Unicode is.
+/// library_memory.h, finds no memory at all, and when std::bad_alloc comes where nothing may be thrown. A
+/// request that alone is too large fails as ever. `line` must live as long as the process. To be called
+/// before anything of the library for Unicode is.
 void endWhenOutOfMemory(char const* line) noexcept;
 
 /// Ends the process as endOutOfMemory() does where there is no memory to go on with.

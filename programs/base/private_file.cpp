@@ -9,6 +9,7 @@
 
 #include <cerrno>
 #include <cstring>
+#include <filesystem>
 #include <string_view>
 #include <system_error>
 #include <utility>
@@ -62,6 +63,12 @@ void writeWhole(FileDescriptor descriptor, std::string_view contents, std::strin
     });
 }
 
+/// Hidden, should the process be killed before it is linked to its name.
+std::string draftOf(std::string const& file) {
+    std::filesystem::path const path(file);
+    return path.parent_path() / ('.' + path.filename().string() + '.' + std::to_string(::getpid()) + ".part");
+}
+
 } // namespace
 
 std::string readPrivateFile(std::string const& file, std::size_t limit) {
@@ -78,7 +85,7 @@ std::string readPrivateFile(std::string const& file, std::size_t limit) {
 }
 
 bool createPrivateFile(std::string const& file, std::string const& contents) {
-    std::string const draft = file + ".new." + std::to_string(::getpid());
+    std::string const draft = draftOf(file);
     ::unlink(draft.c_str());
     auto descriptor = orError("Cannot create", file, [&] {
         return FileDescriptor(draft, O_WRONLY | O_CREAT | O_EXCL, S_IRUSR | S_IWUSR);

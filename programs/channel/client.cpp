@@ -6,6 +6,7 @@
 #include <boost/asio/io_context.hpp>
 
 #include <exception>
+#include <new>
 #include <optional>
 
 namespace Channel {
@@ -15,7 +16,13 @@ public:
     explicit Impl(ClientSettings settings) : connection_(ClientConnection::make(io_, std::move(settings))) {
         wait([&](ClientConnection::Done done) { connection_->connect(std::move(done)); });
     }
-    ~Impl() { connection_->close(); }
+    ~Impl() {
+        try {
+            connection_->close();
+        } catch (std::bad_alloc const&) {
+            // What was asked for is done, and the socket closes with its owner.
+        }
+    }
     Impl(Impl const&) = delete;
     Impl& operator=(Impl const&) = delete;
 
@@ -56,7 +63,8 @@ private:
         start([result](std::string const& failure) { *result = failure; });
         io_.restart();
         while (!*result)
-            io_.run_one();
+            if (io_.run_one() == 0)
+                throw Base::Error("The connection was lost.");
         if (!(*result)->empty())
             throw Base::Error(**result);
     }

@@ -6,9 +6,11 @@
 
 #include <gmock/gmock.h>
 
+#include <csignal>
 #include <cstdlib>
 #include <list>
 #include <new>
+#include <stdexcept>
 #include <sys/resource.h>
 #include <vector>
 
@@ -18,6 +20,11 @@ namespace fs = std::filesystem;
 using testing::ExitedWithCode;
 
 constexpr char const* LINE = "program: there is not enough memory; close others\n";
+
+template<typename Failure>
+void fail(Failure const& failure) {
+    throw failure;
+}
 
 class WithoutMemory : public testing::Test {
 protected:
@@ -52,6 +59,24 @@ TEST_F(WithoutMemory, AProgramEndsAlsoWhereNothingMayBeThrown) {
             []() noexcept { takeAll(); }();
         },
         ExitedWithCode(1), "^program: ");
+}
+
+TEST_F(WithoutMemory, AProgramEndsAlsoWhenOneRequestFailsWhereNothingMayBeThrown) {
+    EXPECT_EXIT(
+        {
+            Base::endWhenOutOfMemory(LINE);
+            []() noexcept { fail(std::bad_alloc()); }();
+        },
+        ExitedWithCode(1), "^program: there is not enough memory; close others\n$");
+}
+
+TEST_F(WithoutMemory, OtherFailuresWhereNothingMayBeThrownAreToldAsEver) {
+    EXPECT_EXIT(
+        {
+            Base::endWhenOutOfMemory(LINE);
+            []() noexcept { fail(std::runtime_error("something else")); }();
+        },
+        testing::KilledBySignal(SIGABRT), "something else");
 }
 
 TEST_F(WithoutMemory, NothingThatWasPendingIsLeft) {

@@ -71,6 +71,8 @@ void putPlan(fs::path const& folder) {
 
 std::vector<Command> const& commands() {
     static std::vector<Command> const all{
+        {"check", {"check", "letter.txt", "brief.pdf", "--jobs", "1"}, putDocuments},
+        {"help", {"help"}, putDocuments},
         {"letter", {"letter", "letter.txt", "brief.pdf", "--jobs", "1"}, putDocuments},
         {"letter_report",
          {"letter", "letter.txt", "--explain", "--json", "--report", "r.html", "--jobs", "1"},
@@ -82,6 +84,7 @@ std::vector<Command> const& commands() {
         {"pack_verify", {"pack", "verify", "m.mailing"}, putMailing},
         {"pack_extract", {"pack", "extract", "m.mailing", "-o", "x"}, putMailing},
         {"pack_salvage", {"pack", "salvage", "m.mailing", "-o", "s.mailing"}, putMailing},
+        {"presets_draft", {"presets", "draft", "letter.txt", "-o", "d.json"}, putDocuments},
         {"presets_lint", {"presets", "lint", "node.json"}, putSettings},
         {"presets_match", {"presets", "match", "letter.txt", "--settings", "node.json"}, putSettings},
         {"presets_test", {"presets", "test", ".", "--update", "--jobs", "1"}, putSettings},

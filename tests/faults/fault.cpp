@@ -32,13 +32,13 @@ std::vector<Fault> faultsOf(std::string const& call) {
     if (call == "write")
         return {{call, ENOSPC, 0, true}, {call, EIO, 0, false}, killed};
     if (call == "memory")
-        return {{call, ENOMEM, 0, false}, {call, ENOMEM, 0, true}};
+        return {{call, ENOMEM, 0, false}, {call, ENOMEM, 0, true}, killed};
     if (call == "open")
         return {{call, EMFILE, 0, false}, {call, EACCES, 0, false}, killed};
     if (call == "send" || call == "receive")
         return {{call, ECONNRESET, 0, false}, killed};
     if (call == "start")
-        return {{call, EAGAIN, 0, false}};
+        return {{call, EAGAIN, 0, false}, killed};
     return {{call, EIO, 0, false}, killed};
 }
 

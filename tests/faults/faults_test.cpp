@@ -1,73 +1,125 @@
 // Each command of vlmail, and vlserviced with one job, while their calls fail, one after the other.
 // scripts/torture goes through all of them.
+#include "programs/vlmail/commands/command.h"
+#include "tests/faults/asked_command.h"
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
-#include "tests/faults/served_command.h"
+#include "tests/faults/sent_mail.h"
 #include "tests/support/sanitized.h"
 
 #include <gmock/gmock.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <set>
 
 namespace {
 
 using namespace Faults;
 
-/// Every call is tried up to so many; of more, so many at even distances.
-constexpr long MAX_POINTS = 100;
-/// Of those that there are hundreds or tens of thousands of, and that differ less.
-constexpr long MAX_POINTS_OF_OFTEN = 16;
-constexpr long MAX_POINTS_OF_SERVICE = 12;
+/// Every call is tried up to that one; of what comes behind it, so many at even distances up to the last.
+constexpr long EVERY_UP_TO = 100;
+constexpr long BEHIND = 8;
 
-/// Of each kind of call; the command that waits for a job takes the longest.
-long maxPointsOfServed(std::string const& command) { return command == "mail_send" ? 8 : 40; }
+constexpr char const* SERVICE = "service";
 
-/// One command in which no allocation of its beginning, which all commands share, is left out.
-constexpr char const* LIGHTEST = "pack_list";
-
-std::vector<long> pointsOf(long calls, long limit) {
-    long const count = std::min(calls, limit);
+std::vector<long> pointsOf(long calls) {
     std::vector<long> points;
-    for (long i = 0; i < count; ++i)
-        points.push_back(1 + i * calls / count);
+    for (long point = 1; point <= std::min(calls, EVERY_UP_TO); ++point)
+        points.push_back(point);
+    for (long i = 1; i <= std::min(BEHIND, calls - EVERY_UP_TO); ++i)
+        points.push_back(EVERY_UP_TO + i * (calls - EVERY_UP_TO) / std::min(BEHIND, calls - EVERY_UP_TO));
     return points;
 }
 
-bool isOften(std::string const& call) { return call == "memory" || call == "read"; }
+/// What takes longest: of these each call fails in one way, which is another for the next call.
+std::set<std::string> const IN_TURN{"letter_report", "mail",         "mail_plan",
+                                    "documents_put", SentMail::NAME, SERVICE};
+
+std::vector<Fault> faultsAt(long point, std::string const& call, std::string const& name) {
+    std::vector<Fault> faults = faultsOf(call);
+    if (IN_TURN.contains(name))
+        faults = {faults[static_cast<std::size_t>(point) % faults.size()]};
+    for (Fault& fault : faults)
+        fault.number = point;
+    return faults;
+}
+
+/// Fails each of those calls. Gives how many there were.
+template<typename Subject>
+long failEach(Subject& subject, std::string const& name, std::string const& call) {
+    long tried = 0;
+    for (long const point : pointsOf(subject.callsOf(call)))
+        for (Fault const& fault : faultsAt(point, call, name)) {
+            ++tried;
+            EXPECT_THAT(subject.run(fault), testing::IsEmpty())
+                << "to repeat: scripts/torture --repeat " << name << ' ' << fault.text();
+        }
+    return tried;
+}
+
+template<typename Subject>
+void failAll(Subject& subject, std::string const& name) {
+    long tried = 0;
+    for (std::string const& call : CALLS)
+        tried += failEach(subject, name, call);
+    // Every command opens and reads something at least.
+    EXPECT_GT(tried, 3);
+}
 
 class CommandsWhoseCallsFail : public testing::TestWithParam<Command> {};
 
 TEST_P(CommandsWhoseCallsFail, KeepTheirPromises) {
     Scenario scenario(GetParam());
-    long tried = 0;
-    for (std::string const& call : CALLS) {
-        std::vector<Fault> const faults = faultsOf(call);
-        for (long const point :
-             pointsOf(scenario.callsOf(call), isOften(call) ? MAX_POINTS_OF_OFTEN : MAX_POINTS)) {
-            Fault fault = faults[static_cast<std::size_t>(tried++) % faults.size()];
-            fault.number = point;
-            EXPECT_THAT(scenario.run(fault), testing::IsEmpty())
-                << "to repeat: scripts/torture --repeat " << GetParam().name << ' ' << fault.text();
-        }
-    }
-    // Every command opens and reads something at least.
-    EXPECT_GT(tried, 3);
+    failAll(scenario, GetParam().name);
 }
 
 INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsWhoseCallsFail, testing::ValuesIn(commands()),
                          [](auto const& each) { return each.param.name; });
 
-TEST(CommandsWithoutMemory, KeepTheirPromisesWhicheverOfTheFirstAllocationsFails) {
-    if (VLServiceTest::SANITIZED)
-        GTEST_SKIP() << "a sanitizer brings an allocator of its own";
-    Scenario scenario(*std::ranges::find(commands(), LIGHTEST, &Command::name));
-    std::vector<Fault> const faults = faultsOf("memory");
-    for (long point = 1; point <= MAX_POINTS; ++point) {
-        Fault fault = faults[static_cast<std::size_t>(point) % faults.size()];
-        fault.number = point;
-        EXPECT_THAT(scenario.run(fault), testing::IsEmpty()) << fault.text();
-    }
+class CommandsThatAskAService : public testing::TestWithParam<Question> {};
+
+TEST_P(CommandsThatAskAService, AreDoneOrNotAndSayWhich) {
+    AskedCommand command(GetParam());
+    failAll(command, GetParam().name);
+}
+
+INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsThatAskAService, testing::ValuesIn(questions()),
+                         [](auto const& each) { return each.param.name; });
+
+class MailThatIsSent : public testing::TestWithParam<std::string> {};
+
+TEST_P(MailThatIsSent, IsNotLostAndNotDoubledWhenItsCallsFail) {
+    SentMail mail;
+    failEach(mail, SentMail::NAME, GetParam());
+}
+
+INSTANTIATE_TEST_SUITE_P(OfAKind, MailThatIsSent, testing::ValuesIn(CALLS),
+                         [](auto const& each) { return each.param; });
+
+/// The names of the commands that do something, as they are typed.
+void leavesOf(Base::CommandInfo const& command, std::string const& before, std::set<std::string>& names) {
+    if (command.commands.empty())
+        names.insert(before);
+    for (Base::CommandInfo const& each : command.commands)
+        leavesOf(each, before.empty() ? each.name : before + ' ' + each.name, names);
+}
+
+TEST(TheCommandsWhoseCallsFail, AreAllOfVlMail) {
+    std::set<std::string> all;
+    leavesOf(VlMail::commandInfo(), "", all);
+    std::set<std::string> missing = all;
+    auto const strike = [&](std::vector<std::string> const& arguments) {
+        missing.erase(arguments.front());
+        if (arguments.size() > 1)
+            missing.erase(arguments[0] + ' ' + arguments[1]);
+    };
+    for (Command const& command : commands())
+        strike(command.arguments);
+    for (Question const& question : questions())
+        strike(question.arguments);
+    EXPECT_GT(all.size(), 20u);
+    EXPECT_THAT(missing, testing::IsEmpty());
 }
 
 TEST(ACheckOfAMailing, DoesNotTakeADiskThatFailsForDamage) {
@@ -81,42 +133,13 @@ TEST(ACheckOfAMailing, DoesNotTakeADiskThatFailsForDamage) {
     }
 }
 
-class CommandsThatAskAService : public testing::TestWithParam<std::string> {};
-
-TEST_P(CommandsThatAskAService, LoseNothingAndDoubleNothingWhenTheirCallsFail) {
-    ServedCommand command(GetParam());
-    long tried = 0;
-    for (std::string const& call : CALLS) {
-        std::vector<Fault> const faults = faultsOf(call);
-        for (long const point : pointsOf(command.callsOf(call), maxPointsOfServed(GetParam()))) {
-            Fault fault = faults[static_cast<std::size_t>(tried++) % faults.size()];
-            fault.number = point;
-            EXPECT_THAT(command.run(fault), testing::IsEmpty())
-                << "to repeat: scripts/torture --repeat " << GetParam() << ' ' << fault.text();
-        }
-    }
-    EXPECT_GT(tried, 3);
-}
-
-INSTANTIATE_TEST_SUITE_P(OfVlMail, CommandsThatAskAService, testing::ValuesIn(ServedCommand::NAMES),
-                         [](auto const& each) { return each.param; });
-
 class AServiceWhoseCallsFail : public testing::TestWithParam<std::string> {};
 
 TEST_P(AServiceWhoseCallsFail, LosesNothingAndDoublesNothing) {
     if (VLServiceTest::SANITIZED && GetParam() == "memory")
         GTEST_SKIP() << "a sanitizer brings an allocator of its own";
     OneJob job;
-    std::vector<Fault> const faults = faultsOf(GetParam());
-    long const calls = job.callsOf(GetParam());
-    EXPECT_GT(calls, 0);
-    std::size_t tried = 0;
-    for (long const point : pointsOf(calls, MAX_POINTS_OF_SERVICE)) {
-        Fault fault = faults[tried++ % faults.size()];
-        fault.number = point;
-        EXPECT_THAT(job.run(fault), testing::IsEmpty())
-            << "to repeat: scripts/torture --repeat service " << fault.text();
-    }
+    EXPECT_GT(failEach(job, SERVICE, GetParam()), 0);
 }
 
 INSTANTIATE_TEST_SUITE_P(OfAKind, AServiceWhoseCallsFail,

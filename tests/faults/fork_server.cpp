@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+#include <stdexcept>
 #include <system_error>
 
 #include <poll.h>
@@ -54,17 +55,19 @@ void sendWithFiles(int socket, std::string packet, int out, int err) {
     head->cmsg_type = SCM_RIGHTS;
     head->cmsg_len = CMSG_LEN(sizeof files);
     std::memcpy(CMSG_DATA(head), files, sizeof files);
-    if (::sendmsg(socket, &message, MSG_NOSIGNAL) < 0)
+    if (::sendmsg(socket, &message, MSG_NOSIGNAL) < 0 && errno != EPIPE)
         fail("cannot ask for a process");
 }
 
 template<typename Value>
-Value answerAt(int socket) {
+Value answerAt(int socket, pid_t server) {
     Value value{};
-    errno = ECHILD;
-    if (::recv(socket, &value, sizeof value, 0) != sizeof value)
-        fail("the program cannot be begun");
-    return value;
+    if (::recv(socket, &value, sizeof value, 0) == sizeof value)
+        return value;
+    int status = 0;
+    ::waitpid(server, &status, 0);
+    throw std::runtime_error("the program that is to be forked has ended with " +
+                             std::to_string(statusIn(status)));
 }
 
 } // namespace
@@ -100,7 +103,7 @@ ForkServer& ForkServer::of(fs::path const& program) {
 
 pid_t ForkServer::start(Start const& start) const {
     sendWithFiles(socket_, packetOf(start), start.out, start.err);
-    auto const process = answerAt<pid_t>(socket_);
+    auto const process = answerAt<pid_t>(socket_, process_);
     if (process < 0)
         fail("cannot begin a process");
     return process;
@@ -110,7 +113,7 @@ std::optional<int> ForkServer::awaitEnd(std::chrono::milliseconds time) {
     pollfd polled{socket_, POLLIN, 0};
     if (::poll(&polled, 1, static_cast<int>(time.count())) <= 0)
         return std::nullopt;
-    return answerAt<int>(socket_);
+    return answerAt<int>(socket_, process_);
 }
 
 int statusIn(int waited) { return WIFSIGNALED(waited) ? -WTERMSIG(waited) : WEXITSTATUS(waited); }

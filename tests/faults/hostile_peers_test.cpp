@@ -25,7 +25,8 @@ protected:
     Ended askForJobs(std::uint16_t port, fs::path const& token) {
         return Faults::runWith(
             {}, VLMAIL_PROGRAM,
-            {"status", "--service", "127.0.0.1:" + std::to_string(port), "--token", token.string()}, {folder_});
+            {"status", "--service", "127.0.0.1:" + std::to_string(port), "--token", token.string()},
+            {folder_});
     }
 
     TemporaryFolder root_;

@@ -1,10 +1,10 @@
 #include "tests/faults/scenario.h"
 
+#include "tests/faults/service_at_hand.h"
+
 #include <algorithm>
 #include <fstream>
 #include <iterator>
-#include <regex>
-#include <sstream>
 #include <utility>
 
 namespace Faults {
@@ -19,21 +19,10 @@ std::string contentOf(fs::path const& file) {
 
 bool isHidden(std::string const& name) { return fs::path(name).filename().string().starts_with('.'); }
 
-/// Whether a line says what failed. Libraries may have lines of their own.
-bool saysWhy(std::string const& errors) {
-    return errors.starts_with("vlmail: ") || errors.find("\nvlmail: ") != std::string::npos;
-}
-
 /// Whether a text is not cut off: it ends as the other one does.
 bool endsLike(std::string const& text, std::string const& whole) {
     constexpr std::size_t ENDING = 2;
     return text.size() >= ENDING && whole.ends_with(text.substr(text.size() - ENDING));
-}
-
-/// The ids of mailings differ from run to run.
-std::string withoutIds(std::string const& text) {
-    static std::regex const id("[0-9]{8}T[0-9]{6}Z-[0-9a-f]{8}");
-    return std::regex_replace(text, id, "ID");
 }
 
 /// Of a report: what is not drawn but written. In a picture's place may stand why there is none.
@@ -112,14 +101,10 @@ Scenario::Files Scenario::files() const {
 }
 
 void Scenario::checkEnd(Fault const& fault, Ended const& ended, Files const& after) {
-    if (ended.isLate)
-        find("does not end within two minutes");
-    if (ended.status < 0 && !fault.kills())
-        find("dies of signal " + std::to_string(-ended.status));
+    for (std::string const& wrong : faultsInEnd(fault, ended))
+        find(wrong);
     if (ended.status < 0)
         return;
-    if (ended.status > 2)
-        find("ends with status " + std::to_string(ended.status));
     // What is wrong with a mailing is the result of "pack verify", and so stands with the others.
     if (ended.status != clean_.status && !saysWhy(ended.err) && ended.out == clean_.out)
         find("fails without a line that says why");

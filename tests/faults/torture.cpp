@@ -3,9 +3,10 @@
 //     torture MINUTES [SEED]           says each finding, and how to repeat it; status 1 when there was one
 //     torture --repeat COMMAND FAULT   runs one, such as "mail write:28:3+"
 //     torture --each COMMAND CALL [STEP]   each call of a kind, or each so many, in each way that it can fail
+#include "tests/faults/asked_command.h"
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
-#include "tests/faults/served_command.h"
+#include "tests/faults/sent_mail.h"
 
 #include <algorithm>
 #include <chrono>
@@ -52,8 +53,9 @@ std::vector<Subject> allSubjects() {
     std::vector<Subject> subjects;
     for (Command const& command : commands())
         subjects.push_back(subjectOf<Scenario>(command.name, command));
-    for (std::string const& name : ServedCommand::NAMES)
-        subjects.push_back(subjectOf<ServedCommand>(name, name));
+    for (Question const& question : questions())
+        subjects.push_back(subjectOf<AskedCommand>(question.name, question));
+    subjects.push_back(subjectOf<SentMail>(SentMail::NAME));
     subjects.push_back(subjectOf<OneJob>(SERVICE));
     return subjects;
 }

@@ -35,6 +35,8 @@ struct Options {
 std::string printed(json::Object const& settings) {
     std::unique_ptr<char, decltype(&std::free)> const text(json_dumps(settings.node(), JSON_INDENT(2)),
                                                            std::free);
+    if (!text)
+        throw std::bad_alloc();
     return std::string(text.get()) + '\n';
 }
 

@@ -1,0 +1,69 @@
+#include "tests/faults/sent_mail.h"
+
+#include <chrono>
+#include <iterator>
+#include <regex>
+#include <utility>
+
+namespace Faults {
+namespace {
+
+std::vector<std::string> idsIn(std::string const& json) {
+    static std::regex const id("\"id\":\"([^\"]*)\"");
+    std::vector<std::string> ids;
+    for (std::sregex_iterator found(json.begin(), json.end(), id), end; found != end; ++found)
+        ids.push_back((*found)[1]);
+    return ids;
+}
+
+bool isSaid(std::string const& text, std::string const& part) { return text.find(part) != std::string::npos; }
+
+} // namespace
+
+std::vector<std::string> SentMail::run(Fault const& fault) {
+    before_ = mailings();
+    Ended const ended = send(fault);
+    for (std::string const& wrong : faultsInEnd(fault, ended))
+        find(wrong);
+    if (ended.status > 0 && !saysWhy(ended.err + ended.out))
+        find("fails without a line that says why: " + ended.out + ended.err);
+    check(ended);
+    return std::exchange(findings_, {});
+}
+
+Ended SentMail::send(Fault const& fault) const {
+    return service_.vlmail({"mail", "letter.txt", "--send", "--node", "a=acme", "--jobs", "1"}, fault);
+}
+
+void SentMail::check(Ended const& ended) {
+    if (ended.status == 0 && mailings().size() != before_.size() + 1)
+        find("says that a mailing was sent, and it is not there: " + ended.out);
+    resumeStranded();
+    std::multiset<std::string> const after = mailings();
+    if (after.size() > before_.size() + 1 ||
+        std::set<std::string>(after.begin(), after.end()).size() != after.size())
+        find("sends a mailing twice");
+    for (std::string const& id : after)
+        if (!before_.contains(id) &&
+            !isSaid(service_.verify(service_.data() / "outbox" / (id + ".mailing")), "all whole"))
+            find("sends the mailing " + id + ", which is not whole");
+}
+
+void SentMail::resumeStranded() {
+    Ended const stranded = service_.vlmail({"status", "--stranded", "--node", "a=acme", "--json"});
+    for (std::string const& id : idsIn(stranded.out))
+        if (Ended const ended = service_.vlmail({"resume", id, "--node", "a=acme"}); ended.status != 0)
+            find("leaves the mailing " + id + ", which cannot be resumed: " + ended.err);
+}
+
+std::multiset<std::string> SentMail::mailings() const {
+    auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(2);
+    std::string listed;
+    do
+        listed = service_.vlmail({"status", "--json"}).out;
+    while (isSaid(listed, "\"state\":\"accepted\"") && std::chrono::steady_clock::now() < end);
+    std::vector<std::string> const ids = idsIn(listed);
+    return {ids.begin(), ids.end()};
+}
+
+} // namespace Faults

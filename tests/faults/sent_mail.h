@@ -1,0 +1,34 @@
+#pragma once
+// "vlmail mail --send" while its calls fail and the service's do not: what it says was sent is there, what it
+// says was not may be resumed, and nothing is lost or there twice.
+
+#include "tests/faults/service_at_hand.h"
+
+#include <set>
+
+namespace Faults {
+
+/// The service runs as long as the object lives.
+class SentMail {
+public:
+    static constexpr char const* NAME = "mail_send";
+
+    long callsOf(std::string const& call) { return send({call, 1, 0, false}).calls; }
+    /// What was promised and not kept; empty when all was.
+    std::vector<std::string> run(Fault const& fault);
+
+private:
+    Ended send(Fault const& fault) const;
+    void check(Ended const& ended);
+    void resumeStranded();
+    /// The ids of all mailings, once the service has fetched them.
+    std::multiset<std::string> mailings() const;
+    void find(std::string const& what) { findings_.push_back(what); }
+
+    ServiceAtHand service_;
+    /// Those of the runs before.
+    std::multiset<std::string> before_;
+    std::vector<std::string> findings_;
+};
+
+} // namespace Faults
