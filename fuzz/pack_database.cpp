@@ -57,7 +57,8 @@ std::optional<std::size_t> readPack() {
 void makeContainer(std::size_t pages) {
     fs::path const container = privateFolder() / "p1.mailing";
     try {
-        VlServiced::writeContainer({privateFolder(), "packs.db", PACK}, container);
+        Mailing::PackDatabaseReader source(databaseFile(), PACK);
+        VlServiced::writeContainer(source, container);
     } catch (Base::Error const&) {
         require(!fs::exists(container));
         return;

@@ -38,8 +38,14 @@ struct MemoryService {
                                   [](VlServiced::JobSurroundings::Work const&) {},
                                   [](VlServiced::JobSurroundings::Work const&) {}, [] { return 1LL; },
                                   [this] { return settings.service(); }, "/missing/outbox"}};
+    VlServiced::PackReception packs{VlServiced::openSqlitePackStore(":memory:"),
+                                    jobs,
+                                    {[](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                     [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                     [] { return 1LL; }, [](std::string const&) { return std::nullopt; },
+                                     [](std::string const&) { return false; }}};
     std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, documents, jobs, runner, letterRunner, "/missing/outbox", [] { return 1LL; });
+        settings, documents, jobs, runner, letterRunner, packs, "/missing/outbox", [] { return 1LL; });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

@@ -27,6 +27,8 @@ struct DatabaseKind {
     int applicationId;
     /// Script i leads from schema version i to i + 1; the version that a program knows is their number.
     std::vector<char const*> migrations;
+    /// Run on a new file, in front of all else: what cannot be changed later.
+    char const* beginning = "";
 };
 
 /// "the pack database /srv/packs.db".

@@ -54,6 +54,7 @@ void keepToOwner(fs::path const& file) {
 SQLite::Database openAndMigrate(fs::path const& file, DatabaseKind const& kind, Journal journal) {
     SQLite::Database database(file, SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE, BUSY_TIMEOUT_MS);
     database.exec("PRAGMA trusted_schema = OFF");
+    database.exec(kind.beginning);
     requireKind(database, kind, file);
     keepToOwner(file);
     database.exec(journal == Journal::WriteAhead ? "PRAGMA journal_mode = WAL"

@@ -1,17 +1,11 @@
 #include "programs/mailing/entries_digest.h"
 
 #include "programs/base/digest.h"
+#include "programs/mailing/measured.h"
 
 #include <zlib.h>
 
 namespace Mailing {
-namespace {
-
-/// With its length in front no text runs into the next.
-std::string measured(std::string const& text) { return std::to_string(text.size()) + ':' + text; }
-
-} // namespace
-
 EntriesDigest::EntriesDigest(std::string const& packId) : text_(Base::sha256(packId)) {}
 
 void EntriesDigest::add(std::string const& document, std::string const& page, std::uint32_t length,

@@ -173,6 +173,18 @@ MailedLetter letterIn(json::Object const& object) {
     return letter;
 }
 
+bool isSameMailing(SharedMemBuffer const& a, SharedMemBuffer const& b) {
+    auto const lasting = [](SharedMemBuffer const& metadata) {
+        json::Object members;
+        for (auto const& [key, value] : objectIn(metadata))
+            if (key != std::string_view(ID_KEY) && key != std::string_view(CREATED_KEY) &&
+                key != std::string_view(ENTRIES_DIGEST_KEY))
+                members.set(key, value);
+        return members;
+    };
+    return lasting(a) == lasting(b);
+}
+
 Cfg::PackPreset packPresetIn(json::Object const& metadata) {
     return Cfg::PackPreset(metadata, NOT_THE_PRESETS);
 }

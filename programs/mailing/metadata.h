@@ -82,6 +82,10 @@ SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& d
 /// The letter that an object among "letters" stands for. Throws std::exception.
 MailedLetter letterIn(json::Object const& object);
 
+/// Whether two mailings' metadata say the same but for id and time, and what is computed with the id. Throws
+/// std::exception when a blob cannot be read.
+bool isSameMailing(SharedMemBuffer const& a, SharedMemBuffer const& b);
+
 /// The pack preset that an object of metadata holds beside its own keys. Throws std::exception.
 Cfg::PackPreset packPresetIn(json::Object const& metadata);
 

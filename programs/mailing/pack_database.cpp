@@ -1,14 +1,11 @@
 #include "programs/mailing/pack_database.h"
 
-#include "programs/base/safe_name.h"
-
 #include <SQLiteCpp/Transaction.h>
 
 #include <SQLiteCpp/Exception.h>
 
 #include <chrono>
 #include <ctime>
-#include <unordered_set>
 #include <utility>
 
 namespace Mailing {
@@ -43,9 +40,6 @@ CREATE TABLE pages (
 constexpr unsigned long long BATCH_BYTES = 16ULL << 20;
 /// What a client left unfinished so long ago is what a crash left.
 constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
-/// More than any page needs, and a bound for what a forged database makes its reader allocate.
-constexpr int MAX_BLOB_BYTES = 256 << 20;
-constexpr std::size_t MAX_PACK_ID_BYTES = 128;
 /// The names of all pages of a pack together: a few million pages.
 constexpr std::size_t MAX_NAMES_BYTES = 256 << 20;
 /// For one page, or for the names of all.
@@ -66,6 +60,45 @@ SharedMemBuffer bufferIn(SQLite::Column const& column) {
     return SharedMemBuffer::copyOf(data, static_cast<unsigned long long>(column.getBytes()));
 }
 
+PackInfo infoIn(SQLite::Database& database, fs::path const& file, std::string const& packId) {
+    SQLite::Statement query(database, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
+    query.bind(1, packId);
+    if (!query.executeStep())
+        throw Database::DatabaseError("the pack database " + file.string() + " has no finished pack " +
+                                      packId);
+    return {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
+}
+
+std::vector<PackSource::PageName> namesIn(SQLite::Database& database, std::string const& packId) {
+    SQLite::Statement query(database, "SELECT document, page FROM pages WHERE pack = ? ORDER BY position");
+    query.bind(1, packId);
+    std::vector<PackSource::PageName> names;
+    std::size_t bytes = 0;
+    while (query.executeStep()) {
+        PackSource::PageName const& name =
+            names.emplace_back(query.getColumn(0).getString(), query.getColumn(1).getString());
+        bytes += sizeof name + name.document.size() + name.page.size();
+        if (bytes > MAX_NAMES_BYTES)
+            throw Database::DatabaseError("pack " + packId + " has more pages than a mailing can hold");
+    }
+    return names;
+}
+
+SharedMemBuffer pageIn(SQLite::Database& database, std::string const& packId, std::string const& document,
+                       std::string const& page) {
+    SQLite::Statement query(database, "SELECT data FROM pages WHERE pack = ? AND document = ? AND page = ?");
+    query.bindNoCopy(1, packId);
+    query.bindNoCopy(2, document);
+    query.bindNoCopy(3, page);
+    return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
+}
+
+SharedMemBuffer metadataIn(SQLite::Database& database, std::string const& packId) {
+    SQLite::Statement query(database, "SELECT metadata FROM packs WHERE id = ?");
+    query.bindNoCopy(1, packId);
+    return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
+}
+
 } // namespace
 
 std::string databaseVersion() { return SQLite::getLibVersion(); }
@@ -73,10 +106,6 @@ std::string databaseVersion() { return SQLite::getLibVersion(); }
 Database::DatabaseKind const& packDatabase() {
     static Database::DatabaseKind const kind{"pack database", APPLICATION_ID, {SCHEMA_1}};
     return kind;
-}
-
-bool isPackId(std::string const& id) {
-    return id.size() <= MAX_PACK_ID_BYTES && Base::safeFileName(id) == id;
 }
 
 PackDatabaseWriter::PackDatabaseWriter(fs::path const& file, PackInfo const& pack)
@@ -170,64 +199,36 @@ void PackDatabaseWriter::eraseUnfinished() {
 }
 
 PackDatabaseReader::PackDatabaseReader(fs::path const& file, std::string const& packId)
-    : PageLoaderI(packId), file_(file, packDatabase(), MAX_BLOB_BYTES, OPERATION_TIME) {
-    orDatabaseError(file_.path(), [&] {
-        readInfo();
-        readPageNames();
+    : PackSource(packId), file_(file, packDatabase(), MAX_BLOB_BYTES, OPERATION_TIME) {
+    orDatabaseError(file, [&] {
+        info_ = infoIn(file_.begin(), file, packId);
+        pages_ = namesIn(file_.begin(), packId);
     });
 }
 
-void PackDatabaseReader::readInfo() {
-    SQLite::Statement query(file_.begin(),
-                            "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
-    query.bind(1, packId());
-    if (!query.executeStep())
-        throw Database::DatabaseError("the pack database " + file_.path().string() +
-                                      " has no finished pack " + packId());
-    info_ = {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
-}
-
-void PackDatabaseReader::readPageNames() {
-    SQLite::Statement query(file_.begin(),
-                            "SELECT document, page FROM pages WHERE pack = ? ORDER BY position");
-    query.bind(1, packId());
-    std::size_t bytes = 0;
-    while (query.executeStep()) {
-        PageName const& name =
-            pages_.emplace_back(query.getColumn(0).getString(), query.getColumn(1).getString());
-        bytes += sizeof name + name.document.size() + name.page.size();
-        if (bytes > MAX_NAMES_BYTES)
-            throw Database::DatabaseError("pack " + packId() + " has more pages than a mailing can hold");
-    }
-}
-
-std::size_t PackDatabaseReader::documentCount() const {
-    std::unordered_set<std::string> documents;
-    for (PageName const& name : pages_)
-        documents.insert(name.document);
-    return documents.size();
-}
-
-void PackDatabaseReader::requestPageData(std::string const& document, std::string const& page,
-                                         PageFunc func) {
-    PageLoaderI::requestPageData(document, page, std::move(func));
-    SharedMemBuffer data = orDatabaseError(file_.path(), [&] {
-        SQLite::Statement query(file_.begin(),
-                                "SELECT data FROM pages WHERE pack = ? AND document = ? AND page = ?");
-        query.bindNoCopy(1, packId());
-        query.bindNoCopy(2, document);
-        query.bindNoCopy(3, page);
-        return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
-    });
-    callPgFunc(document, page, std::move(data));
+SharedMemBuffer PackDatabaseReader::load(std::string const& document, std::string const& page) {
+    return orDatabaseError(file_.path(), [&] { return pageIn(file_.begin(), packId(), document, page); });
 }
 
 SharedMemBuffer PackDatabaseReader::metadata() {
-    return orDatabaseError(file_.path(), [&] {
-        SQLite::Statement query(file_.begin(), "SELECT metadata FROM packs WHERE id = ?");
-        query.bindNoCopy(1, packId());
-        return query.executeStep() ? bufferIn(query.getColumn(0)) : SharedMemBuffer();
+    return orDatabaseError(file_.path(), [&] { return metadataIn(file_.begin(), packId()); });
+}
+
+OwnPackReader::OwnPackReader(fs::path const& file, std::string const& packId)
+    : PackSource(packId), file_(file),
+      database_(Database::openDatabase(file, packDatabase(), Database::Journal::Rollback)) {
+    orDatabaseError(file, [&] {
+        info_ = infoIn(database_, file, packId);
+        pages_ = namesIn(database_, packId);
     });
+}
+
+SharedMemBuffer OwnPackReader::load(std::string const& document, std::string const& page) {
+    return orDatabaseError(file_, [&] { return pageIn(database_, packId(), document, page); });
+}
+
+SharedMemBuffer OwnPackReader::metadata() {
+    return orDatabaseError(file_, [&] { return metadataIn(database_, packId()); });
 }
 
 void removePack(fs::path const& file, std::string const& packId) {

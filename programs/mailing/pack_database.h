@@ -3,7 +3,7 @@
 
 #include "programs/database/foreign_file.h"
 #include "programs/database/sqlite_file.h"
-#include "vlservice/pack/page_loader.h"
+#include "programs/mailing/pack_source.h"
 #include "vlservice/pack/page_saver.h"
 
 #include <SQLiteCpp/Statement.h>
@@ -22,18 +22,6 @@ std::string databaseVersion();
 // created_at) and one row of `pages` for each page (pack, position from 0, document, page, data). Metadata
 // and pages are products of PageSaverI::zipDbData. Readers see a pack only when `complete` is 1.
 Database::DatabaseKind const& packDatabase();
-
-/// Whether a pack can bear this id: it names a file later on, so it has to be a safe file name of at most 128
-/// bytes.
-bool isPackId(std::string const& id);
-
-/// What a pack is beside its pages.
-struct PackInfo {
-    std::string id;
-    /// The settings node that it is sent for; the empty text is the root.
-    std::string cfgId;
-    std::string title;
-};
 
 /// Stores one pack. What was stored disappears with the object unless finish() was called. Every operation
 /// throws Database::DatabaseError when the database cannot do its part.
@@ -73,36 +61,41 @@ private:
     bool finished_ = false;
 };
 
-/// The pages of one finished pack, each read when it is asked for and answered at once. The database is taken
-/// for one that somebody has forged; nobody can change it while it is being read.
-class PackDatabaseReader : public PageLoaderI {
+/// The pages of one finished pack, each read when it is asked for. The database is taken for one that
+/// somebody has forged; nobody can change it while it is being read. Every operation throws
+/// Database::DatabaseError when the database cannot be read.
+class PackDatabaseReader : public PackSource {
 public:
-    struct PageName {
-        std::string document;
-        std::string page;
-
-        PageName(std::string documentName, std::string pageName)
-            : document(std::move(documentName)), page(std::move(pageName)) {}
-    };
-
     /// Throws Database::DatabaseError when there is no such finished pack.
     PackDatabaseReader(std::filesystem::path const& file, std::string const& packId);
 
-    PackInfo const& info() const { return info_; }
-    /// In the order in which they were stored.
-    std::vector<PageName> const& pages() const { return pages_; }
-    std::size_t documentCount() const;
-
-    /// Calls `func` before it returns, with the empty buffer when there is no such page.
-    /// Throws Database::DatabaseError when the database cannot be read.
-    void requestPageData(std::string const& document, std::string const& page, PageFunc func) override;
-    SharedMemBuffer metadata();
+    PackInfo const& info() const override { return info_; }
+    std::vector<PageName> const& pages() const override { return pages_; }
+    SharedMemBuffer metadata() override;
 
 private:
-    void readInfo();
-    void readPageNames();
+    SharedMemBuffer load(std::string const& document, std::string const& page) override;
 
     Database::ForeignFile file_;
+    PackInfo info_;
+    std::vector<PageName> pages_;
+};
+
+/// The same of a database of the user's own, in which others may store packs meanwhile.
+class OwnPackReader : public PackSource {
+public:
+    /// Throws Database::DatabaseError when there is no such finished pack.
+    OwnPackReader(std::filesystem::path const& file, std::string const& packId);
+
+    PackInfo const& info() const override { return info_; }
+    std::vector<PageName> const& pages() const override { return pages_; }
+    SharedMemBuffer metadata() override;
+
+private:
+    SharedMemBuffer load(std::string const& document, std::string const& page) override;
+
+    std::filesystem::path file_;
+    SQLite::Database database_;
     PackInfo info_;
     std::vector<PageName> pages_;
 };

@@ -40,6 +40,7 @@ constexpr std::pair<JobAction, char const*> ACTIONS[] = {
     {JobAction::Hold, "hold"},
     {JobAction::Release, "release"},
     {JobAction::Cancel, "cancel"},
+    {JobAction::Upload, "upload"},
 };
 
 /// A state stands as its name, and one that is missing is no state.
@@ -168,7 +169,8 @@ JobsChange::JobsChange(json::Object const& object) {
     std::string const name = object.get(ACTION).textOrEmpty();
     auto const found = std::ranges::find_if(ACTIONS, [&](auto const& row) { return row.second == name; });
     if (found == std::end(ACTIONS))
-        throw Base::Error("\"action\" of a change of jobs has to be \"hold\", \"release\" or \"cancel\"");
+        throw Base::Error(
+            "\"action\" of a change of jobs has to be \"hold\", \"release\", \"cancel\" or \"upload\"");
     action = found->first;
     if (ids.empty())
         throw Base::Error("\"ids\" of a change of jobs has to name one at least");

@@ -141,7 +141,13 @@ struct JobsAnswer {
 };
 
 /// What a person may do to a job.
-enum class JobAction { Hold, Release, Cancel };
+enum class JobAction {
+    Hold,
+    Release,
+    Cancel,
+    /// Has it handed on, as soon as that can be.
+    Upload,
+};
 
 /// "hold"
 char const* actionName(JobAction action);

@@ -6,8 +6,12 @@ namespace Protocol {
 
 struct ServiceSettings::Keys {
     static constexpr std::tuple TABLE{
-        Always{UPLOAD_FOLDER, &ServiceSettings::uploadFolder}, Always{TARIFF, &ServiceSettings::tariff},
-        Always{CARRIERS, &ServiceSettings::carriers},          Always{DISABLED, &ServiceSettings::disabled},
+        Always{UPLOAD_FOLDER, &ServiceSettings::uploadFolder},
+        Always{TARIFF, &ServiceSettings::tariff},
+        Always{CARRIERS, &ServiceSettings::carriers},
+        Always{DISABLED, &ServiceSettings::disabled},
+        Always{QUOTA, &ServiceSettings::quota},
+        json::Key{RETENTION_DAYS, &ServiceSettings::retentionDays, RETENTION_DAYS_UNLESS_SET},
         Always{SUSPENDED, &ServiceSettings::suspended},
     };
 };

@@ -24,7 +24,10 @@ struct ServiceSettings {
     static constexpr char const* TARIFF = "tariff";
     static constexpr char const* CARRIERS = "carriers";
     static constexpr char const* DISABLED = "disabled";
+    static constexpr char const* QUOTA = "quota";
+    static constexpr char const* RETENTION_DAYS = "retention_days";
     static constexpr char const* SUSPENDED = "suspended";
+    static constexpr int RETENTION_DAYS_UNLESS_SET = 90;
 
     /// Where finished containers are handed on; empty when nothing was set.
     std::string uploadFolder;
@@ -34,6 +37,11 @@ struct ServiceSettings {
     json::Object carriers;
     /// Ids of nodes that nobody may send for, with all below them.
     std::vector<std::string> disabled;
+    /// MiB that the packs of a node may have with the service at once, by the node's id; nodes below that
+    /// have none of their own have the same.
+    json::Object quota;
+    /// How long jobs and containers are kept after their end; 0 is for ever.
+    int retentionDays = RETENTION_DAYS_UNLESS_SET;
     /// Bits of Suspended.
     int suspended = 0;
 
@@ -44,7 +52,7 @@ struct ServiceSettings {
 };
 
 /// What a value of a setting is.
-enum class SettingForm { Text, List, Document };
+enum class SettingForm { Text, Number, List, Document };
 
 /// A setting that a change may name, and its form.
 struct ServiceSetting {
@@ -59,6 +67,8 @@ inline constexpr ServiceSetting SETTABLE[] = {
     {ServiceSettings::TARIFF, SettingForm::Document, "FILE"},
     {ServiceSettings::CARRIERS, SettingForm::Document, "FILE"},
     {ServiceSettings::DISABLED, SettingForm::List, "[...]"},
+    {ServiceSettings::QUOTA, SettingForm::Document, "{...}"},
+    {ServiceSettings::RETENTION_DAYS, SettingForm::Number, "N"},
 };
 
 /// What the service tells of itself beside its settings: its outbox, and how many jobs are in each state that

@@ -25,6 +25,11 @@ void addOptions(Base::Command const& command, Options& options) {
     command.addOption("--token", options.token, "File with the access token [token in the data folder]")
         .valueName("FILE");
     command
+        .addOption(
+            "--local-packs", options.localPacks,
+            "Folder below which clients on this machine may name pack databases, instead of sending pages")
+        .valueName("FOLDER");
+    command
         .addOption("--listen", options.listen, "IP address to listen on; all but loopback want a certificate")
         .showDefault()
         .valueName("ADDRESS");

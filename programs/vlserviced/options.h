@@ -17,6 +17,8 @@ struct Options {
     std::filesystem::path outbox;
     /// File with the access token; empty for the data folder's own.
     std::string token;
+    /// Below which clients may name pack databases; empty where they may name none.
+    std::filesystem::path localPacks;
     std::string listen = "127.0.0.1";
     std::uint16_t port = 0;
     std::string certificate;

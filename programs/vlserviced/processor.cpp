@@ -64,9 +64,10 @@ std::string channelToTest(json::Object const& question) {
 } // namespace
 
 Processor::Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-                     LetterRunner& letters, std::filesystem::path outbox, std::function<long long()> now)
+                     LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
+                     std::function<long long()> now)
     : settings_(settings), documents_(documents), jobs_(jobs), runner_(runner), letters_(letters),
-      outbox_(std::move(outbox)), now_(std::move(now)) {}
+      packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)) {}
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
                          std::function<void(std::string const& failure)> done) {
@@ -94,7 +95,26 @@ void Processor::visit(Ipc::CSConfigSrvChange& cmd) {
 void Processor::visit(Ipc::CSConfigIdsList& cmd) {
     if (std::string const channel = channelToTest(cmd.reqParams()); !channel.empty())
         return testCarrier(channel, cmd);
+    if (Protocol::kindOf(cmd.reqParams()) == Protocol::BeginPack::KIND)
+        return beginPack(cmd);
     cmd.setResp(answerOrError(cmd, [&] { return answer(cmd.reqParams()); }));
+}
+
+/// Its answer comes when the pack store has been asked.
+void Processor::beginPack(Ipc::CSConfigIdsList& cmd) {
+    Protocol::BeginPack pack;
+    std::string const malformed = errorOf(cmd, [&] { pack = Protocol::BeginPack(cmd.reqParams()); });
+    if (!malformed.empty())
+        return cmd.setResp(Protocol::failureAnswer(malformed));
+    auto const answered = std::static_pointer_cast<Ipc::CSConfigIdsList>(cmd.shared_from_this());
+    packs_.begin(pack, cmd.processor(),
+                 [answered, done = std::exchange(done_, {})](Protocol::BeginPackAnswer const& answer,
+                                                             std::string const& failure) {
+                     answered->setResp(answerOrError(*answered, [&] {
+                         return failure.empty() ? answer.serialize() : throw Base::Error(failure);
+                     }));
+                     done({});
+                 });
 }
 
 /// The command has one payload for many questions.
@@ -124,7 +144,8 @@ json::Object Processor::answer(json::Object const& question) {
     throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
                       JobsQuery::KIND + ", " + JobsChange::KIND + ", " + DocumentsQuery::KIND + ", " +
                       DocumentPieceQuery::KIND + ", " + DocumentUpload::KIND + ", " + DocumentRemoval::KIND +
-                      ", " + LetterChange::KIND + ", " + CarriersQuery::KIND + ", " + CarrierChange::KIND);
+                      ", " + LetterChange::KIND + ", " + CarriersQuery::KIND + ", " + CarrierChange::KIND +
+                      ", " + BeginPack::KIND);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
@@ -198,7 +219,17 @@ json::Object Processor::serviceOverview() const {
 }
 
 void Processor::visit(Ipc::ProcessPack& cmd) {
-    runner_.accept({cmd.dbHostPort(), cmd.dbName(), cmd.packId()}, std::exchange(done_, {}));
+    PackLocation pack{cmd.dbHostPort(), cmd.dbName(), cmd.packId()};
+    auto done = std::exchange(done_, {});
+    if (!pack.isWithService())
+        return runner_.accept(pack, std::move(done));
+    pack.database = Protocol::PACKS_OF_CONNECTION;
+    // Of a job that is on record the pages may be gone.
+    if (jobs_.find(pack.packId))
+        return runner_.accept(pack, std::move(done));
+    packs_.complete(pack.packId, [this, pack, done = std::move(done)](std::string const& failure) {
+        failure.empty() ? runner_.accept(pack, done) : done(failure);
+    });
 }
 
 void Processor::visit(Ipc::PriceEst& cmd) {

@@ -3,6 +3,7 @@
 
 #include "programs/vlserviced/jobs/job_runner.h"
 #include "programs/vlserviced/jobs/letter_runner.h"
+#include "programs/vlserviced/jobs/pack_reception.h"
 #include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "vlservice/ipc/cmd_processor_vlsvc.h"
@@ -20,7 +21,8 @@ class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI 
 public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-              LetterRunner& letters, std::filesystem::path outbox, std::function<long long()> now);
+              LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
+              std::function<long long()> now);
 
     /// Carries a command out. `done` is called once, on this thread, possibly later; with the reason, one
     /// line, when the command failed and its response has no room for that.
@@ -45,6 +47,7 @@ public:
 
 private:
     json::Object answer(json::Object const& question);
+    void beginPack(Ipc::CSConfigIdsList& cmd);
     json::Object changeJobs(Protocol::JobsChange const& change);
     json::Object changeLetter(Protocol::LetterChange const& change);
     json::Object changeCarrier(Protocol::CarrierChange const& change);
@@ -57,6 +60,7 @@ private:
     JobStore& jobs_;
     JobRunner& runner_;
     LetterRunner& letters_;
+    PackReception& packs_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
     std::function<void(std::string const& failure)> done_;

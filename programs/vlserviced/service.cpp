@@ -9,6 +9,9 @@
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/discovery_answer.h"
 #include "programs/vlserviced/jobs/held_queries.h"
+#include "programs/vlserviced/jobs/local_packs.h"
+#include "programs/vlserviced/jobs/pack_reception.h"
+#include "programs/vlserviced/jobs/retention.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/schema.h"
@@ -46,6 +49,8 @@ namespace fs = std::filesystem;
 constexpr std::chrono::minutes RETRY_TIME{1};
 /// How often unused presets are looked for.
 constexpr std::chrono::hours SWEEP_TIME{24};
+/// How often packs are looked for that nobody needs, and jobs whose time is up.
+constexpr std::chrono::hours ENDED_SWEEP_TIME{1};
 constexpr std::size_t MAX_PATH_BYTES = 1000;
 
 long long now() { return std::time(nullptr); }
@@ -151,13 +156,21 @@ class Service::Impl {
 public:
     explicit Impl(Options const& options)
         : data_(options.data), outbox_(preparedOutbox(options, data_)),
-          database_(openServiceDatabase(data_.database())),
-          server_(std::in_place, io_, serverSettings(options, data_), &Ipc::makeEmptyCmd,
-                  [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-                      handle(cmd, answer);
-                  }) {
+          database_(openServiceDatabase(data_.database())), localPacks_(options.localPacks),
+          packStore_(openSqlitePackStore(data_.packs())),
+          server_(
+              std::in_place, io_, serverSettings(options, data_), &Ipc::makeEmptyCmd,
+              [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+                  handle(cmd, answer);
+              },
+              [this](Channel::ReceivedData data, Channel::DataStored const& stored) {
+                  packs_.take(data.connection, std::move(data.text), [stored](std::string const& failure) {
+                      failure.empty() ? stored() : stored.fail(failure);
+                  });
+              }) {
         jobs_.onChange([this](std::string const& packId) {
             held_.onChange(packId);
+            packs_.onJobChanged(packId);
             awaitDue();
         });
         removeUnfinished(outbox_);
@@ -181,7 +194,10 @@ public:
             runner_.resume();
             letterRunner_.resume();
         });
-        asio::post(io_, [this] { sweepPresets(); });
+        asio::post(io_, [this] {
+            sweepPresets();
+            sweepEnded();
+        });
         manager_.onReady("listening on port " + std::to_string(server_->port()));
         awaitUpkeep();
         runHandlers();
@@ -197,7 +213,7 @@ public:
 
 private:
     void endThreads() {
-        for (asio::thread_pool* const threads : {&worker_, &reader_}) {
+        for (asio::thread_pool* const threads : {&worker_, &reader_, &storeThread_}) {
             threads->stop();
             threads->join();
         }
@@ -300,6 +316,25 @@ private:
         }
         if (time - lastSweep_ >= SWEEP_TIME)
             sweepPresets();
+        if (time - lastEndedSweep_ >= ENDED_SWEEP_TIME) {
+            lastEndedSweep_ = time;
+            sweepEnded();
+        }
+    }
+
+    void sweepEnded() {
+        packs_.sweep();
+        removeEndedJobs();
+    }
+
+    /// A few at a time: others get their turn in between.
+    void removeEndedJobs() {
+        if (isStopping_)
+            return;
+        if (retention_.removeSome())
+            asio::post(io_, [this] { removeEndedJobs(); });
+        else
+            retention_.finish();
     }
 
     void sweepPresets() {
@@ -350,7 +385,10 @@ private:
                 [this](std::string const& node, std::string const& packPreset) {
                     notePresetUse(node, packPreset);
                 },
-                &letterRunner_};
+                &letterRunner_,
+                [this](PackLocation const& pack) {
+                    return pack.isWithService() ? packStore_->open(pack.packId) : localPacks_.open(pack);
+                }};
     }
 
     LetterSurroundings letterSurroundings() {
@@ -368,6 +406,13 @@ private:
                 [this] { awaitLetters(); }};
     }
 
+    ReceptionSurroundings receptionSurroundings() {
+        return {[this](ReceptionSurroundings::Work work) { runOn(storeThread_, std::move(work)); },
+                [this](ReceptionSurroundings::Work work) { asio::post(io_, std::move(work)); }, &now,
+                [this](std::string const& node) { return settings_.service().quotaOf(node); },
+                [this](std::string const& node) { return settings_.service().isDisabled(node); }};
+    }
+
     DataFolder data_;
     fs::path outbox_;
     SQLite::Database database_;
@@ -377,17 +422,23 @@ private:
     DocumentService documents_{documentStore_, store_, settings_, &now};
     JobStore jobs_{database_};
     LetterStore letters_{database_, jobs_};
+    LocalPacks localPacks_;
+    std::shared_ptr<PackStore> packStore_;
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
     /// As many as may wait for databases that somebody holds, before others have to wait for them.
     asio::thread_pool reader_{8};
     CarrierThreads carrierThreads_;
+    /// For the pack store alone, which is used by one thread.
+    asio::thread_pool storeThread_{1};
     HeldQueries held_{io_, jobs_};
     LetterRunner letterRunner_{letters_, jobs_, letterSurroundings()};
     JobRunner runner_{jobs_, surroundings()};
-    std::shared_ptr<Processor> processor_ =
-        std::make_shared<Processor>(settings_, documents_, jobs_, runner_, letterRunner_, outbox_, &now);
+    Retention retention_{jobs_, outbox_, [this] { return settings_.service(); }, &now};
+    PackReception packs_{packStore_, jobs_, receptionSurroundings()};
+    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(settings_, documents_, jobs_, runner_,
+                                                                        letterRunner_, packs_, outbox_, &now);
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
@@ -399,6 +450,7 @@ private:
     bool isStopping_ = false;
     std::chrono::steady_clock::time_point lastStatusUpdate_ = std::chrono::steady_clock::now();
     std::chrono::steady_clock::time_point lastSweep_ = std::chrono::steady_clock::now();
+    std::chrono::steady_clock::time_point lastEndedSweep_ = std::chrono::steady_clock::now();
     std::optional<Channel::Server> server_;
     std::optional<DiscoveryAnswer> discovery_;
 };

@@ -105,7 +105,8 @@ TEST_P(FilesOfAnOlderVersion, ArePackDatabasesThatAreFetched) {
     ASSERT_THAT(packs, SizeIs(2));
     for (Mailing::StoredPack const& pack : packs) {
         fs::path const file = folder_ / "fetched.mailing";
-        VlServiced::writeContainer({folder_.path().string(), "packs.db", pack.info.id}, file);
+        Mailing::PackDatabaseReader pages(folder_ / "packs.db", pack.info.id);
+        VlServiced::writeContainer(pages, file);
         VlMail::ContainerFile container(file);
         EXPECT_THAT(VlMail::checkContainer(container).damages, IsEmpty());
         EXPECT_EQ(container.packId(), pack.info.id);
@@ -116,7 +117,8 @@ TEST_P(FilesOfAnOlderVersion, AreDatabasesThatTheServiceGoesOnWith) {
     fs::create_directory(folder_ / "data");
     fs::permissions(folder_ / "data", fs::perms::owner_all);
     fs::rename(copied("service.db"), folder_ / "data" / "service.db");
-    ServiceProcess const service({"--data", (folder_ / "data").string(), "--no-discovery"});
+    ServiceProcess const service(
+        {"--data", (folder_ / "data").string(), "--no-discovery", "--local-packs", folder_.path().string()});
     auto const output = [&](std::vector<std::string> arguments) {
         arguments.insert(arguments.end(), {"--service", "127.0.0.1:" + std::to_string(service.port()),
                                            "--token", (folder_ / "data" / "token").string()});

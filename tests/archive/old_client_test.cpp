@@ -231,7 +231,8 @@ protected:
 
     TemporaryFolder folder_;
     fs::path data_ = folder_ / "service";
-    ServiceProcess service_{{"--data", data_.string(), "--no-discovery"}};
+    ServiceProcess service_{
+        {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.path().string()}};
     std::string token_ = Channel::readToken((data_ / "token").string());
     std::size_t replayed_ = 0;
 };

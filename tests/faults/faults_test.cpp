@@ -118,6 +118,9 @@ TEST(TheCommandsWhoseCallsFail, AreAllOfVlMail) {
         strike(command.arguments);
     for (Question const& question : questions())
         strike(question.arguments);
+    // What it does of its own is reading, as pack verify does; its way to the service is that of
+    // MailThatIsSent.
+    missing.erase("send");
     EXPECT_GT(all.size(), 20u);
     EXPECT_THAT(missing, testing::IsEmpty());
 }

@@ -33,7 +33,9 @@ private:
     void takeMailings();
     void finish();
     void find(std::string const& what) { findings_.push_back(what); }
-    std::vector<std::string> arguments() const { return {"--data", data_.string(), "--no-discovery"}; }
+    std::vector<std::string> arguments() const {
+        return {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.string()};
+    }
 
     TemporaryFolder root_;
     std::filesystem::path folder_ = root_ / "work";

@@ -122,11 +122,12 @@ TEST(JobsChangeReading, TakesWhatAClientWrites) {
 
 TEST(JobsChangeReading, RefusesWhatIsNoChange) {
     std::pair<char const*, char const*> const cases[] = {
-        {R"({"ids":["p1"]})", R"("action" of a change of jobs has to be "hold", "release" or "cancel")"},
+        {R"({"ids":["p1"]})",
+         R"("action" of a change of jobs has to be "hold", "release", "cancel" or "upload")"},
         {R"({"action":"stop","ids":["p1"]})",
-         R"("action" of a change of jobs has to be "hold", "release" or "cancel")"},
+         R"("action" of a change of jobs has to be "hold", "release", "cancel" or "upload")"},
         {R"({"action":7,"ids":["p1"]})",
-         R"("action" of a change of jobs has to be "hold", "release" or "cancel")"},
+         R"("action" of a change of jobs has to be "hold", "release", "cancel" or "upload")"},
         {R"({"action":"hold","ids":"p1"})",
          R"("ids" of a change of jobs has to be an array of at most 1000 texts)"},
         {R"({"action":"hold"})", R"("ids" of a change of jobs has to name one at least)"},

@@ -8,7 +8,6 @@
 
 namespace {
 
-using Protocol::ServiceSettings;
 using Protocol::SettingsAnswer;
 using Protocol::SettingsQuery;
 using Protocol::TreeNode;
@@ -72,13 +71,13 @@ TEST(TreeNodeReading, FollowsTheTreeAsDeepAsAnAnswerCanBe) {
 }
 
 TEST(ServiceSettingsReading, LeavesOutWhatHasAWrongType) {
-    ServiceSettings const settings(
+    Protocol::ServiceSettings const settings(
         parse(R"({"upload_folder":"/up","tariff":{"currency":"EUR"},"disabled":["a=x"],"suspended":2})"));
     EXPECT_EQ(settings.uploadFolder, "/up");
     EXPECT_EQ(print(settings.tariff), R"({"currency":"EUR"})");
     EXPECT_EQ(settings.disabled, std::vector<std::string>{"a=x"});
     EXPECT_EQ(settings.suspended, 2);
-    ServiceSettings const wrong(parse(R"({"upload_folder":7,"tariff":[],"suspended":"2"})"));
+    Protocol::ServiceSettings const wrong(parse(R"({"upload_folder":7,"tariff":[],"suspended":"2"})"));
     EXPECT_EQ(wrong.uploadFolder, "");
     EXPECT_TRUE(wrong.tariff.empty());
     EXPECT_EQ(wrong.suspended, 0);

@@ -1,6 +1,7 @@
 #pragma once
 // A disk that is soon full.
 
+#include <sched.h>
 #include <sys/mount.h>
 #include <unistd.h>
 
@@ -37,6 +38,25 @@ public:
 private:
     int context_;
     int disk_ = -1;
+    std::string whyNot_;
+};
+
+/// A file system in memory in place of a folder, for this process alone, as long as it lives. For what looks
+/// through links, as databases do.
+class MountedDisk {
+public:
+    MountedDisk(std::string const& folder, char const* options) {
+        bool const isThere = ::unshare(CLONE_NEWNS) == 0 &&
+                             ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+                             ::mount("tmpfs", folder.c_str(), "tmpfs", 0, options) == 0;
+        if (!isThere)
+            whyNot_ = std::generic_category().message(errno);
+    }
+
+    /// Empty when it is there.
+    std::string const& whyNot() const { return whyNot_; }
+
+private:
     std::string whyNot_;
 };
 

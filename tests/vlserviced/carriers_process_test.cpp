@@ -43,7 +43,9 @@ protected:
         return isStored ? folder / "packs.db" : fs::path();
     }
 
-    std::vector<std::string> arguments() const { return {"--data", data_.string(), "--no-discovery"}; }
+    std::vector<std::string> arguments() const {
+        return {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.path().string()};
+    }
 
     /// Says what is wanted, as a client does that had no answer, and waits for its end. False when the
     /// service was gone before.

@@ -75,7 +75,8 @@ protected:
 
     TemporaryFolder folder_;
     fs::path data_ = folder_ / "data";
-    ServiceProcess service_{{"--data", data_.string(), "--no-discovery"}};
+    ServiceProcess service_{
+        {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.path().string()}};
 };
 
 TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
@@ -301,7 +302,7 @@ TEST_F(ClientCommands, AMailingIsSentOverANewConnectionWhenTheOldOneBreaks) {
 TEST_F(ClientCommands, AMailingThatCannotBeSentIsNamedWithWhatCanBeDone) {
     fs::path const database = folder_ / "packs.db";
     storePack(database, "p1");
-    VlMail::ServiceLine line([this] { return clientOf(service_, data_); });
+    VlMail::ServiceLine line([this] { return clientOf(service_, data_); }, {.time = {}, .pause = {}});
     service_.signal(SIGKILL);
     service_.wait();
     std::string const text = failureOf([&] { VlMail::deliverPack(line, database, "p1", false); });
@@ -321,7 +322,7 @@ TEST_F(ClientCommands, WhatTheServiceRefusesIsNotRepeated) {
         return clientOf(service_, data_);
     });
     EXPECT_THAT(failureOf([&] { VlMail::deliverPack(line, database, "p1", false); }),
-                HasSubstr("mailing p1: The service refuses: node id \"acme\" is not valid"));
+                HasSubstr("mailing p1: node id \"acme\" is not valid"));
     EXPECT_EQ(connections, 1);
 }
 
@@ -403,8 +404,8 @@ TEST_F(ClientCommands, TheServicesSettingsAreShown) {
     output({"settings", "service", "upload_folder="});
     EXPECT_THAT(output({"settings", "service", "--json"}), testing::StartsWith("{\"outbox\":"));
     EXPECT_EQ(complaint({"settings", "service", "colour=red"}),
-              "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE, carriers=FILE or "
-              "disabled=[...]\n");
+              "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE, carriers=FILE, "
+              "disabled=[...], quota={...} or retention_days=N\n");
 }
 
 TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {

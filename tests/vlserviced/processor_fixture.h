@@ -75,6 +75,14 @@ protected:
                                              [this] { return settings_.service(); },
                                              outbox_,
                                          }};
+    VlServiced::PackReception packs_{VlServiced::openSqlitePackStore(folder_ / "packs-of-service.db"), jobs_,
+                                     VlServiced::ReceptionSurroundings{
+                                         [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                         [](VlServiced::JobSurroundings::Work const& work) { work(); },
+                                         [] { return 1000LL; },
+                                         [](std::string const&) { return std::nullopt; },
+                                         [](std::string const&) { return false; },
+                                     }};
     std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, jobs_, runner_, carriers_, outbox_, [] { return 1000LL; });
+        settings_, documents_, jobs_, runner_, carriers_, packs_, outbox_, [] { return 1000LL; });
 };

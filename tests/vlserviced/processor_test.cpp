@@ -82,12 +82,14 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
               R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets"})");
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
               R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
-    EXPECT_EQ(send(29, R"({"query":"x"})"),
-              R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
-              R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier"})");
-    EXPECT_EQ(send(29, "{}"),
-              R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
-              R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier"})");
+    EXPECT_EQ(
+        send(29, R"({"query":"x"})"),
+        R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
+        R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier, begin_pack"})");
+    EXPECT_EQ(
+        send(29, "{}"),
+        R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
+        R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier, begin_pack"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {
@@ -95,7 +97,7 @@ TEST_F(ProcessorTest, KeepsTheServicesSettings) {
     EXPECT_EQ(send(27, R"({"tariff":{"currency":"EUR","sheet":10}})"), "{}");
     EXPECT_EQ(
         send(27, R"({"x":1})"),
-        R"(failed: the service has no setting "x"; there are upload_folder, tariff, carriers, disabled)");
+        R"(failed: the service has no setting "x"; there are upload_folder, tariff, carriers, disabled, quota, retention_days)");
     EXPECT_EQ(send(26, "{}"),
               R"({"tariff":{"currency":"EUR","sheet":10},"outbox":")" + outbox_.string() + R"(","jobs":{}})");
 }
@@ -160,8 +162,9 @@ TEST_F(ProcessorTest, HoldsReleasesAndCancelsJobs) {
     EXPECT_EQ(change("release", R"("p2")"), "p2 queued;");
     EXPECT_EQ(change("cancel", R"("p1")"), "p1 cancelled;");
     EXPECT_EQ(change("hold", R"("p1")"), "p1: it is too late to hold mailing p1: it was cancelled;");
-    EXPECT_EQ(send(29, R"({"query":"change_jobs","action":"stop","ids":["p1"]})"),
-              R"({"err":"\"action\" of a change of jobs has to be \"hold\", \"release\" or \"cancel\""})");
+    EXPECT_EQ(
+        send(29, R"({"query":"change_jobs","action":"stop","ids":["p1"]})"),
+        R"({"err":"\"action\" of a change of jobs has to be \"hold\", \"release\", \"cancel\" or \"upload\""})");
 }
 
 } // namespace

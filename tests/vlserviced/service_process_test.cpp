@@ -33,7 +33,8 @@ namespace fs = std::filesystem;
 class ServiceProcessTest : public testing::Test {
 protected:
     std::vector<std::string> arguments(std::vector<std::string> const& more = {}) const {
-        std::vector<std::string> all{"--data", data_.string(), "--no-discovery"};
+        std::vector<std::string> all{"--data", data_.string(), "--no-discovery", "--local-packs",
+                                     folder_.path().string()};
         all.insert(all.end(), more.begin(), more.end());
         return all;
     }

@@ -141,7 +141,8 @@ protected:
     }
 
     fs::path data_ = folder_ / "data";
-    ServiceProcess service_{{"--data", data_.string(), "--no-discovery", "--verbose"}};
+    ServiceProcess service_{
+        {"--data", data_.string(), "--no-discovery", "--verbose", "--local-packs", folder_.path().string()}};
 };
 
 constexpr char const* SETTINGS_OF_THE_WAY = R"({

@@ -30,6 +30,7 @@ void addPackCommand(Base::Command const& app, Task& task);
 void addPlanCommand(Base::Command const& app, Task& task);
 void addPresetsCommand(Base::Command const& app, Task& task);
 void addPriceCommand(Base::Command const& app, Task& task);
+void addSendCommand(Base::Command const& app, Task& task);
 void addSettingsCommand(Base::Command const& app, Task& task);
 /// resume and discard.
 void addStrandedCommands(Base::Command const& app, Task& task);

@@ -9,6 +9,7 @@
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/mailings/dispatch.h"
+#include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/mailings/plan.h"
 #include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/service/service_client.h"
@@ -53,6 +54,20 @@ BeginMailing destinationOf(Options const& options, BatchSources& sources) {
                         : mailingsIntoFolder(options.output);
 }
 
+/// Erases what is left of earlier mailings that the service has. A run that was broken off may be made again
+/// within the day: what is left of it tells that its letters are on their way.
+void settleEarlier(Options const& options, BatchSources& sources) {
+    constexpr long long DAY = 24 * 60 * 60;
+    if (!options.send)
+        return;
+    try {
+        Channel::Client& service = sources.service()->client();
+        settlePacks(service, packDatabaseOf(service, options.sources.nodeId()), DAY);
+    } catch (std::exception const&) {
+        // The next mailing settles it.
+    }
+}
+
 /// Prepares what the documents' pack presets name.
 MakingReady makingFor(Options const& options, BatchSources& sources, Cfg::Presets const& presets,
                       MakingReady::Colours colours) {
@@ -81,6 +96,7 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
                .making = &making},
               progress, [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
+    settleEarlier(options, sources);
     return report(dispatch, options, terminal);
 }
 
@@ -100,6 +116,7 @@ int mailPlan(Options const& options, Terminal const& terminal) {
     splitBatch(plan.documents(), presets, options.reading.workers(), options.checkEvery, making, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
     dispatch.finish();
+    settleEarlier(options, sources);
     return report(dispatch, options, terminal);
 }
 

@@ -29,6 +29,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addPlanCommand(command, task);
     addPresetsCommand(command, task);
     addPriceCommand(command, task);
+    addSendCommand(command, task);
     addSettingsCommand(command, task);
     addStatusCommand(command, task);
     addStrandedCommands(command, task);

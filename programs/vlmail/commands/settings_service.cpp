@@ -26,6 +26,17 @@ struct Options {
 
 using Protocol::SettingForm;
 
+json::Value exampleOf(SettingForm form) {
+    switch (form) {
+    case SettingForm::Number:
+        return 0;
+    case SettingForm::List:
+        return json::Array();
+    default:
+        return json::Object();
+    }
+}
+
 json::Value parsed(std::string const& key, std::string const& text, SettingForm form) {
     if (text.empty())
         return json::Value(json_null());
@@ -34,8 +45,7 @@ json::Value parsed(std::string const& key, std::string const& text, SettingForm 
     // A document is given as it is or by its file.
     if (form == SettingForm::Document && text.front() != '{')
         return readDocument(text);
-    return valueIn(key, text,
-                   form == SettingForm::List ? json::Value(json::Array()) : json::Value(json::Object()));
+    return valueIn(key, text, exampleOf(form));
 }
 
 /// "upload_folder=PATH, tariff=FILE or disabled=[...]".
@@ -122,9 +132,10 @@ void addSettingsServiceCommands(Base::Command const& settings, Task& task) {
     auto const options = std::make_shared<Options>();
     Base::Command const service =
         settings.addCommand("service", "Shows or changes the settings of the service itself");
-    service.addOption("KEY=VALUE", options->assignments,
-                      "upload_folder=PATH, tariff=FILE, carriers=FILE, disabled=[NODE...]; nothing behind "
-                      "the sign erases it");
+    service.addOption(
+        "KEY=VALUE", options->assignments,
+        "upload_folder=PATH, tariff=FILE, carriers=FILE, disabled=[NODE...], quota={NODE: MIB...}, "
+        "retention_days=N; nothing behind the sign erases it");
     service.addFlag("--json", options->json, "The settings as one JSON object");
     addServiceOptions(service, options->service);
     service.whenNamed(

@@ -31,6 +31,7 @@ constexpr Manual::Topic TOPICS[] = {
     {"price", CLIENT, "Prices"},
     {"release", CLIENT, "Holding, releasing and cancelling"},
     {"resend", "carriers.md", "Letters that are uncertain"},
+    {"send", CLIENT, "Sending mailing files"},
     {"settings show", CLIENT, "What counts at a node"},
     {"settings tree", CLIENT, "All nodes"},
     {"settings ids", CLIENT, "The nodes of a user"},

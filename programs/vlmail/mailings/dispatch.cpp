@@ -228,8 +228,8 @@ json::Object Dispatch::toJson(OutgoingMailing& mailing) const {
                         {"pages", mailing.builder().pageCount()},
                         {"sheets", sumOf(metadata, &Mailing::MailedLetter::sheets)},
                         {"coloured_pages", sumOf(metadata, &Mailing::MailedLetter::colouredPages)}};
-    if (!metadata.id.empty()) {
-        object.set("id", metadata.id);
+    if (std::string const id = mailing.id(); !id.empty()) {
+        object.set("id", id);
         object.set("place", mailing.place());
     }
     if (auto const price = prices_.find(&mailing); price != prices_.end())

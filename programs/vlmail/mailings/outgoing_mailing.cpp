@@ -8,6 +8,7 @@
 #include "programs/vlmail/service/service_client.h"
 
 #include <iomanip>
+#include <optional>
 #include <random>
 #include <sstream>
 #include <utility>
@@ -30,6 +31,7 @@ public:
         container_.finish(builder_.finish().toBlob(), "make room on the disk and mail again");
     }
 
+    std::string id() const override { return builder_.metadata().id; }
     std::string place() const override { return container_.target().string(); }
 
 private:
@@ -51,12 +53,24 @@ public:
 
     void finish() override {
         pack_.finish(builder_.finish().toBlob());
+        goOnWithWhatWasLeftBehind();
         state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_).state);
     }
+
+    std::string id() const override { return id_; }
 
     std::string place() const override { return id_ + ", " + state_; }
 
 private:
+    /// The same letters under the id that the service may know already, so that none goes out twice.
+    void goOnWithWhatWasLeftBehind() {
+        std::optional<std::string> const left = samePackLeftBehind(database_, id_);
+        if (!left)
+            return;
+        Mailing::removePack(database_, id_);
+        id_ = *left;
+    }
+
     ServiceLine& service_;
     fs::path database_;
     bool upload_;
@@ -72,6 +86,7 @@ public:
 
     MailingBuilder& builder() override { return builder_; }
     void finish() override { builder_.finish(); }
+    std::string id() const override { return {}; }
     std::string place() const override { return {}; }
 
 private:
@@ -111,7 +126,6 @@ BeginMailing mailingsToService(ServiceLine& service, std::string const& nodeId, 
     fs::path const database = packDatabaseOf(service.client(), nodeId);
     makeFolder(database.parent_path(), ForOwner::Alone,
                "name another in the settings \"db_host\" of the node");
-    settlePacks(service.client(), database);
     return [&service, nodeId, upload, database](Cfg::PackPreset const& preset) {
         return std::make_unique<SentMailing>(service, database, nodeId, upload, preset, std::time(nullptr));
     };

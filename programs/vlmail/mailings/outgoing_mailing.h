@@ -19,6 +19,8 @@ public:
     virtual MailingBuilder& builder() = 0;
     /// Lets the mailing arrive. Throws std::exception with a line for people; nothing has arrived then.
     virtual void finish() = 0;
+    /// Once it has arrived; empty when it arrives nowhere.
+    virtual std::string id() const = 0;
     /// Where it is once it has arrived.
     virtual std::string place() const = 0;
 };
@@ -31,8 +33,8 @@ using BeginMailing = std::function<std::unique_ptr<OutgoingMailing>(Cfg::PackPre
 BeginMailing mailingsIntoFolder(std::filesystem::path const& folder);
 
 /// Mailings that a service is to process: stored in the pack database of a node and announced to the service,
-/// which must outlive the function. With `upload` the service hands them on at once. What the service has
-/// fetched meanwhile of earlier packs is erased. Throws std::exception with a line for people.
+/// which must outlive the function. With `upload` the service hands them on at once. A mailing that is left
+/// of an earlier run and says the same goes instead. Throws std::exception with a line for people.
 BeginMailing mailingsToService(ServiceLine& service, std::string const& nodeId, bool upload);
 
 /// Mailings that are only decided: their pages are thrown away.

@@ -4,23 +4,36 @@
 
 #include "programs/mailing/pack_database.h"
 #include "programs/protocol/job.h"
+#include "programs/vlmail/mailings/pack_upload.h"
 #include "programs/vlmail/service/service_line.h"
 
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <vector>
 
 namespace VlMail {
 
-/// Has a finished pack processed and, with `upload`, handed on; repeated when the connection breaks. Waits
-/// some seconds for the service to fetch the pages, and erases the pack when it has. Throws Error, whose line
-/// names the pack and what can be done with it.
+/// Sends a finished pack of a pack database over the connection, to an older service by its path, and has it
+/// processed and, with `upload`, handed on; goes on when the connection breaks. Waits some seconds for the
+/// service to make its container, and erases the pack when the service has its pages. Throws Error, whose
+/// line names the pack and what can be done with it.
 Protocol::JobReport deliverPack(ServiceLine& service, std::filesystem::path const& database,
-                                std::string const& packId, bool upload);
+                                std::string const& packId, bool upload, UploadWatcher const& watcher = {});
 
-/// Erases the packs that the service has fetched, and gives those that it has no job of, the oldest first.
-/// Throws std::exception with a line for people.
-std::vector<Mailing::StoredPack> settlePacks(Channel::Client& service, std::filesystem::path const& database);
+/// The same for a pack that lies elsewhere, and stays there.
+Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack, bool upload,
+                                UploadWatcher const& watcher = {});
+
+/// The id of another finished pack of the database that says the same in the same pages, for the same node:
+/// what is left of a sending that was not finished. Throws Error.
+std::optional<std::string> samePackLeftBehind(std::filesystem::path const& database,
+                                              std::string const& packId);
+
+/// Erases the packs that the service has fetched, of those that are older than so many seconds, and gives
+/// those that it has no job of, the oldest first. Throws std::exception with a line for people.
+std::vector<Mailing::StoredPack> settlePacks(Channel::Client& service, std::filesystem::path const& database,
+                                             long long olderThan = -1);
 
 /// Erases a pack that the service does not need any more, or never will. Throws Error when the service is
 /// about to fetch it, and when there is none.

@@ -53,8 +53,9 @@ json::Object ask(Channel::Client& service, Query const& query) {
 /// Where the packs of a node lie: its settings "db_host", when that is an absolute path, and "db_name";
 /// otherwise "packs.db" in dataFolder(). Throws Error when the name is not that of a file.
 std::filesystem::path packDatabaseOf(Channel::Client& service, std::string const& nodeId);
-/// Has a finished pack processed and, with `upload`, handed on. Returns when the pack is on record; it has to
-/// stay in the database until its job is beyond "accepted". Sending a pack again changes nothing.
+/// Has a finished pack processed by its path and, with `upload`, handed on. Returns when the pack is on
+/// record; it has to stay in the database until its job is beyond "accepted". Sending a pack again changes
+/// nothing.
 void sendPack(Channel::Client& service, std::filesystem::path const& database, std::string const& packId,
               bool upload);
 /// What the service knows of a pack's job, as soon as the job has left "accepted" or has a problem, or when

@@ -47,4 +47,19 @@ void ProgressLine::show() {
     visible_ = true;
 }
 
+UploadLine::~UploadLine() {
+    if (visible_)
+        terminal_.err << CLEAR_LINE << std::flush;
+}
+
+void UploadLine::show(long long done, long long all) {
+    auto const now = std::chrono::steady_clock::now();
+    if (!terminal_.showsProgress || now - lastShown_ < 100ms)
+        return;
+    lastShown_ = now;
+    visible_ = true;
+    terminal_.err << CLEAR_LINE << "sending " << name_ << ": " << (done >> 20) << " of " << (all >> 20)
+                  << " MiB" << std::flush;
+}
+
 } // namespace VlMail

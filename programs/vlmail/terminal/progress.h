@@ -5,6 +5,8 @@
 
 #include <chrono>
 #include <cstddef>
+#include <string>
+#include <utility>
 
 namespace VlMail {
 
@@ -30,6 +32,24 @@ private:
     std::size_t letters_ = 0;
     bool visible_ = false;
     std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
+    std::chrono::steady_clock::time_point lastShown_;
+};
+
+/// One line that tells how much of a mailing is on its way. It is taken away when the object is destroyed.
+class UploadLine {
+public:
+    UploadLine(Terminal const& terminal, std::string name) : terminal_(terminal), name_(std::move(name)) {}
+    ~UploadLine();
+    UploadLine(UploadLine const&) = delete;
+    UploadLine& operator=(UploadLine const&) = delete;
+
+    /// In bytes.
+    void show(long long done, long long all);
+
+private:
+    Terminal const& terminal_;
+    std::string name_;
+    bool visible_ = false;
     std::chrono::steady_clock::time_point lastShown_;
 };
 

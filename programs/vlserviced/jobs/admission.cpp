@@ -13,7 +13,7 @@ namespace {
 
 constexpr std::size_t MAX_TITLE_BYTES = 500;
 
-Mailing::MailingOutline outlineOf(Mailing::PackDatabaseReader& pack) {
+Mailing::MailingOutline outlineOf(Mailing::PackSource& pack) {
     SharedMemBuffer const metadata = pack.metadata();
     try {
         return Mailing::outlineOf(metadata);
@@ -25,21 +25,20 @@ Mailing::MailingOutline outlineOf(Mailing::PackDatabaseReader& pack) {
 
 } // namespace
 
-PackSummary summaryOf(PackLocation const& pack) {
-    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
-    PackSummary summary{pages.info().cfgId, pages.info().title, static_cast<long long>(pages.documentCount()),
-                        static_cast<long long>(pages.pages().size())};
+PackSummary summaryOf(Mailing::PackSource& pack) {
+    PackSummary summary{pack.info().cfgId, pack.info().title, static_cast<long long>(pack.documentCount()),
+                        static_cast<long long>(pack.pages().size())};
     if (summary.pages == 0)
-        throw Base::Error("pack " + pack.packId + " has no pages");
+        throw Base::Error("pack " + pack.packId() + " has no pages");
     if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
-        throw Base::Error("the title of pack " + pack.packId + " is not a line of text of at most " +
+        throw Base::Error("the title of pack " + pack.packId() + " is not a line of text of at most " +
                           std::to_string(MAX_TITLE_BYTES) + " bytes");
     checkNodeId(summary.cfgId);
-    addOutline(summary, pages);
+    addOutline(summary, pack);
     return summary;
 }
 
-void addOutline(PackSummary& summary, Mailing::PackDatabaseReader& pack) {
+void addOutline(PackSummary& summary, Mailing::PackSource& pack) {
     Mailing::MailingOutline const outline = outlineOf(pack);
     summary.packPreset = outline.packPreset;
     summary.sheets = outline.mostSheets;

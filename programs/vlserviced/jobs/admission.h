@@ -1,7 +1,7 @@
 #pragma once
 // What a pack says of itself, and whether and how it becomes a job.
 
-#include "programs/mailing/pack_database.h"
+#include "programs/mailing/pack_source.h"
 #include "programs/policy/limits.h"
 #include "programs/vlserviced/store/job.h"
 
@@ -19,10 +19,10 @@ struct PackSummary {
     long long sheets = 0;
 };
 
-/// Throws Error when there is no such pack or it can be no job, and Database::DatabaseError.
-PackSummary summaryOf(PackLocation const& pack);
+/// Throws Error when it can be no job, or cannot be read.
+PackSummary summaryOf(Mailing::PackSource& pack);
 /// The part of it that its metadata tells: what decides whether and how it goes out.
-void addOutline(PackSummary& summary, Mailing::PackDatabaseReader& pack);
+void addOutline(PackSummary& summary, Mailing::PackSource& pack);
 
 /// Throws Error with the lines of what the node's settings do not allow. The client has decided by the same
 /// rules, unless it is an older one or had others.

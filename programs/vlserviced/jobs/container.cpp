@@ -2,7 +2,6 @@
 
 #include "programs/mailing/container_writer.h"
 #include "programs/mailing/metadata.h"
-#include "programs/mailing/pack_database.h"
 #include "vlservice/pack/blob_format.h"
 #include "vlservice/pack/container_format.h"
 #include "vlservice/pack/page_saver.h"
@@ -23,11 +22,11 @@ bool isCompressed(SharedMemBuffer const& blob) {
     throw BadPack("page " + std::to_string(position) + " of the pack " + why);
 }
 
-void copyPages(Mailing::PackDatabaseReader& pages, PageSaverI& container) {
+void copyPages(Mailing::PackSource& pack, PageSaverI& container) {
     std::size_t position = 0;
-    for (auto const& [document, page] : pages.pages()) {
+    for (auto const& [document, page] : pack.pages()) {
         ++position;
-        pages.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
+        pack.requestPageData(document, page, [&, &document = document, &page = page](SharedMemBuffer blob) {
             if (!Container::mayStandInIndex(document) || !Container::mayStandInIndex(page))
                 refuse(position, "has a name that a container cannot hold");
             if (!isCompressed(blob))
@@ -50,15 +49,14 @@ SharedMemBuffer decidedMetadata(SharedMemBuffer const& metadata, std::string con
 
 } // namespace
 
-void writeContainer(PackLocation const& pack, std::filesystem::path const& target,
+void writeContainer(Mailing::PackSource& pack, std::filesystem::path const& target,
                     json::Object const& decided) {
-    Mailing::PackDatabaseReader pages(pack.file(), pack.packId);
-    SharedMemBuffer const metadata = pages.metadata();
+    SharedMemBuffer const metadata = pack.metadata();
     if (!isCompressed(metadata))
-        throw BadPack("the metadata of pack " + pack.packId + " is not compressed");
-    Mailing::ContainerWriter container(target, pack.packId);
-    copyPages(pages, container);
-    container.finish(decidedMetadata(metadata, pack.packId, decided), "make room on the disk");
+        throw BadPack("the metadata of pack " + pack.packId() + " is not compressed");
+    Mailing::ContainerWriter container(target, pack.packId());
+    copyPages(pack, container);
+    container.finish(decidedMetadata(metadata, pack.packId(), decided), "make room on the disk");
 }
 
 } // namespace VlServiced

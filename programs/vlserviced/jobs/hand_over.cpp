@@ -23,6 +23,7 @@ constexpr std::size_t MAX_REPORT_BYTES = 64 << 10;
 constexpr std::size_t COPY_BYTES = 1 << 20;
 
 std::string temporaryOf(std::string const& name) { return "." + name + ".part"; }
+std::string reportOf(std::string const& name) { return name + ".status"; }
 
 [[noreturn]] void fail(std::string const& what) {
     throw std::system_error(errno, std::generic_category(), what);
@@ -72,6 +73,13 @@ void stage(fs::path const& container, UploadFolder const& folder) {
     syncFolder(folder);
 }
 
+void discardHandedOver(std::string const& name, UploadFolder const& folder) {
+    for (std::string const& file : {name, reportOf(name)})
+        if (::unlinkat(folder.descriptor(), file.c_str(), 0) != 0 && errno != ENOENT)
+            fail("cannot remove " + (folder.path() / file).string());
+    syncFolder(folder);
+}
+
 void unstage(std::string const& name, UploadFolder const& folder) {
     std::string const temporary = temporaryOf(name);
     if (::unlinkat(folder.descriptor(), temporary.c_str(), 0) != 0 && errno != ENOENT)
@@ -90,7 +98,7 @@ void publish(std::string const& name, UploadFolder const& folder) {
 bool liesIn(UploadFolder const& folder, std::string const& name) { return isThere(folder, name); }
 
 std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::string const& name) {
-    std::string const file = name + ".status";
+    std::string const file = reportOf(name);
     // A pipe of that name would hold up its reader.
     int const descriptor =
         ::openat(folder.descriptor(), file.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);

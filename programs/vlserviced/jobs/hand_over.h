@@ -24,6 +24,9 @@ namespace VlServiced {
 void stage(std::filesystem::path const& container, UploadFolder const& folder);
 /// Takes back what was staged and is not to be published. Throws std::system_error.
 void unstage(std::string const& name, UploadFolder const& folder);
+/// Removes what lies there of a container that was handed over, and what was reported of it. Throws
+/// std::system_error.
+void discardHandedOver(std::string const& name, UploadFolder const& folder);
 /// Throws std::system_error.
 void publish(std::string const& name, UploadFolder const& folder);
 

@@ -31,10 +31,12 @@ std::string folderText(std::string const& folder) {
 PackLocation checkedLocation(PackLocation const& pack) {
     if (!Mailing::isPackId(pack.packId))
         throw Base::Error("the pack id \"" + pack.packId + "\" cannot name a file");
+    if (pack.isWithService())
+        return pack;
     if (!fs::path(pack.folder).is_absolute())
         throw Base::Error(
-            "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a "
-            "folder, and \"" +
+            "pages come over the connection or from a pack database below the folder of --local-packs: "
+            "\"db_conn\" has to be the absolute path of a folder there, and \"" +
             pack.folder + "\" is none");
     if (Base::safeFileName(pack.database) != pack.database)
         throw Base::Error("\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
@@ -44,7 +46,8 @@ PackLocation checkedLocation(PackLocation const& pack) {
 /// A job that is there already: the pack is taken, or it cannot be.
 void requireSamePack(Job const& known, PackLocation const& pack) {
     if (!(known.pack == pack))
-        throw Base::Error("there is another pack " + pack.packId + ", from " + known.pack.file().string());
+        throw Base::Error("there is another pack " + pack.packId + ", from " +
+                          (known.pack.isWithService() ? "a connection" : known.pack.file().string()));
     if (known.state == JobState::Failed)
         throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
     if (known.state == JobState::Cancelled)
@@ -95,10 +98,21 @@ bool record(JobStore& jobs, JobAction action, std::string const& packId, long lo
         return jobs.hold(packId, now);
     case JobAction::Release:
         return jobs.release(packId, now);
+    case JobAction::Upload:
+        return jobs.wantUpload(packId);
     case JobAction::Cancel:
         break;
     }
     return jobs.cancel(packId, now);
+}
+
+/// Whether a job that is past a change is as the change wants it.
+bool isSoAlready(Job const& job, JobAction action) {
+    if (action == JobAction::Upload)
+        return job.state == JobState::Submitting || job.state == JobState::Submitted ||
+               job.state == JobState::Lodged || job.state == JobState::Delivering ||
+               job.state == JobState::Delivered || job.state == JobState::Tried;
+    return action == JobAction::Cancel && job.state == JobState::Cancelled;
 }
 
 /// The state of a job whose container is made.
@@ -109,6 +123,10 @@ JobState stateBehindPacking(Job const& job, long long now) {
 }
 
 } // namespace
+
+std::unique_ptr<Mailing::PackSource> openPackDatabase(PackLocation const& pack) {
+    return std::make_unique<Mailing::PackDatabaseReader>(pack.file(), pack.packId);
+}
 
 JobRunner::JobRunner(JobStore& jobs, JobSurroundings surroundings)
     : jobs_(jobs), surroundings_(std::move(surroundings)) {}
@@ -146,17 +164,18 @@ void JobRunner::accept(PackLocation const& pack, std::function<void(std::string 
         return finish([&] { throw Base::Error(checked.why); });
     if (known)
         return finish([&] { proceed(*known); });
-    surroundings_.onReader([this, location, finish, onOwnThread = surroundings_.onOwnThread] {
-        auto const summary = std::make_shared<PackSummary>();
-        Outcome const read = outcomeOf([&] { *summary = summaryOf(location); });
-        onOwnThread([this, location, finish, summary, read] {
-            finish([&] {
-                if (read.kind != Outcome::Kind::Done)
-                    throw Base::Error(read.why);
-                admit(location, *summary);
+    surroundings_.onReader(
+        [this, location, finish, open = surroundings_.openPack, onOwnThread = surroundings_.onOwnThread] {
+            auto const summary = std::make_shared<PackSummary>();
+            Outcome const read = outcomeOf([&] { *summary = summaryOf(*open(location)); });
+            onOwnThread([this, location, finish, summary, read] {
+                finish([&] {
+                    if (read.kind != Outcome::Kind::Done)
+                        throw Base::Error(read.why);
+                    admit(location, *summary);
+                });
             });
         });
-    });
 }
 
 void JobRunner::admit(PackLocation const& pack, PackSummary const& summary) {
@@ -196,9 +215,9 @@ void JobRunner::proceed(Job const& job) {
 void JobRunner::startPacking(Job const& job) {
     inBackground(
         job.pack.packId,
-        [pack = job.pack, target = surroundings_.outbox / job.containerName(),
+        [pack = job.pack, open = surroundings_.openPack, target = surroundings_.outbox / job.containerName(),
          decided = Policy::decidedMembers(surroundings_.rules(job.cfgId))] {
-            writeContainer(pack, target, decided);
+            writeContainer(*open(pack), target, decided);
         },
         [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
 }
@@ -303,8 +322,9 @@ void JobRunner::change(JobAction action, std::string const& packId) {
     std::optional<Job> const job = jobs_.find(packId);
     if (!job)
         throw Base::Error("there is no mailing " + Base::oneLine(packId));
-    bool const isSo = action == JobAction::Cancel && job->state == JobState::Cancelled;
-    if (!record(jobs_, action, packId, surroundings_.now()) && !isSo)
+    if (action == JobAction::Upload)
+        requireUploadFolder();
+    if (!record(jobs_, action, packId, surroundings_.now()) && !isSoAlready(*job, action))
         throw Base::Error("it is too late to " + std::string(actionName(action)) + " mailing " + packId +
                           ": " + whoHas(*job));
     Job const changed = jobs_.find(packId).value();
@@ -359,11 +379,15 @@ void JobRunner::sweepOutbox() {
         removeFromOutbox(container);
 }
 
-void JobRunner::upload(std::string const& folder, std::string const& database) {
+void JobRunner::requireUploadFolder() const {
     ServiceSettings const settings = surroundings_.settings();
     if (settings.uploadFolder().empty() && settings.carriers().empty())
         throw Base::Error(
             "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
+}
+
+void JobRunner::upload(std::string const& folder, std::string const& database) {
+    requireUploadFolder();
     jobs_.wantUpload(folder.empty() ? folder : folderText(folder), database);
     resume();
 }

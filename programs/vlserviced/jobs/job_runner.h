@@ -3,6 +3,7 @@
 // and on with what the carrier reports.
 
 #include "programs/base/local_offset.h"
+#include "programs/mailing/pack_source.h"
 #include "programs/policy/limits.h"
 #include "programs/vlserviced/jobs/admission.h"
 #include "programs/vlserviced/settings/service_settings.h"
@@ -10,12 +11,19 @@
 
 #include <filesystem>
 #include <functional>
+#include <memory>
 #include <set>
 #include <string>
 
 namespace VlServiced {
 
 class LetterRunner;
+
+/// Opens a finished pack; called away from the runner's thread. Throws Error.
+using OpenPack = std::function<std::unique_ptr<Mailing::PackSource>(PackLocation const&)>;
+
+/// The pages of a pack database, wherever it lies.
+std::unique_ptr<Mailing::PackSource> openPackDatabase(PackLocation const& pack);
 
 /// What a runner needs around it.
 struct JobSurroundings {
@@ -46,6 +54,7 @@ struct JobSurroundings {
         [](std::string const&, std::string const&) {};
     /// Takes the letters of channels that have carriers; null where there are none.
     LetterRunner* letters = nullptr;
+    OpenPack openPack = &openPackDatabase;
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -75,8 +84,8 @@ public:
     void updateStatus(std::string const& folder, std::string const& database);
     /// Told that the letters of a job that go by carriers were all taken on.
     void onLettersTaken(std::string const& packId);
-    /// Holds a job, lets it go on, or calls it back. What is so already stays so. Throws Error, which says
-    /// where the job has got to, when it is too late.
+    /// Holds a job, lets it go on, has it handed on, or calls it back. What is so already stays so. Throws
+    /// Error, which says where the job has got to, when it is too late.
     void change(Protocol::JobAction action, std::string const& packId);
 
 private:
@@ -99,6 +108,7 @@ private:
     void discard(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary);
+    void requireUploadFolder() const;
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
     /// The container that goes to the upload folder.
     std::filesystem::path containerToStage(Job const& job) const;

@@ -46,6 +46,28 @@ void checkCarriers(json::Value const& value) {
     Protocol::carriersIn(value.toObject());
 }
 
+bool isWithin(json::Value const& value, long long highest) {
+    return value.isInt() && value.toInt() >= 0 && value.toInt() <= highest;
+}
+
+void checkQuota(json::Value const& value) {
+    constexpr long long MAX_MEBIBYTES = 1LL << 30;
+    if (!value.isObject())
+        throw Base::Error("\"quota\" has to be an object of node ids and numbers of MiB");
+    for (auto const& [node, mebibytes] : value.toObject()) {
+        checkNodeId(node);
+        if (!isWithin(mebibytes, MAX_MEBIBYTES))
+            throw Base::Error("the \"quota\" of node \"" + std::string(node) +
+                              "\" has to be an integer from 0 to " + std::to_string(MAX_MEBIBYTES));
+    }
+}
+
+void checkRetention(json::Value const& value) {
+    constexpr long long MAX_DAYS = 36'500;
+    if (!isWithin(value, MAX_DAYS))
+        throw Base::Error("\"retention_days\" has to be an integer from 0 to " + std::to_string(MAX_DAYS));
+}
+
 void checkValue(std::string const& key, json::Value const& value) {
     if (key == Values::UPLOAD_FOLDER)
         checkUploadFolder(value);
@@ -53,6 +75,10 @@ void checkValue(std::string const& key, json::Value const& value) {
         checkTariff(value);
     else if (key == Values::CARRIERS)
         checkCarriers(value);
+    else if (key == Values::QUOTA)
+        checkQuota(value);
+    else if (key == Values::RETENTION_DAYS)
+        checkRetention(value);
     else
         checkDisabled(value);
 }
@@ -115,6 +141,15 @@ bool ServiceSettings::isDisabled(std::string const& nodeId) const {
         if (disabled_.contains(at))
             return true;
     return false;
+}
+
+std::optional<long long> ServiceSettings::quotaOf(std::string const& nodeId) const {
+    for (std::string at = nodeId;; at = parentNodeId(at)) {
+        if (json::Value const mebibytes = values_.quota.get(at.c_str()))
+            return mebibytes.toInt() << 20;
+        if (at.empty())
+            return std::nullopt;
+    }
 }
 
 bool ServiceSettings::isSuspended(Suspended what) const {

@@ -6,6 +6,7 @@
 #include "programs/protocol/service_settings.h"
 #include "vlservice/json/json.h"
 
+#include <optional>
 #include <string>
 #include <unordered_set>
 
@@ -33,6 +34,11 @@ public:
     /// Whether the node, or one above it, is among the disabled ones.
     bool isDisabled(std::string const& nodeId) const;
     bool isSuspended(Suspended what) const;
+    /// How many bytes the packs of a node may have with the service at once, by its own quota or that of the
+    /// nearest node above; nothing when there is none.
+    std::optional<long long> quotaOf(std::string const& nodeId) const;
+    /// 0 is for ever.
+    int retentionDays() const { return values_.retentionDays; }
 
     /// The settings with the keys of `changes` replaced; JSON null erases a key.
     /// Throws Error on keys that are none of Protocol::SETTABLE, and on bad values.

@@ -12,14 +12,16 @@ namespace VlServiced {
 class DataFolder {
 public:
     /// Makes the folder, which only its owner may enter, unless it is there, and takes hold of it until
-    /// destruction. Throws Error when it cannot be written, when another process has it, and when it belongs to
-    /// another user or others may write it.
+    /// destruction. Throws Error when it cannot be written, when another process has it, and when it belongs
+    /// to another user or others may write it.
     explicit DataFolder(std::filesystem::path folder);
     DataFolder(DataFolder const&) = delete;
     DataFolder& operator=(DataFolder const&) = delete;
 
     std::filesystem::path const& path() const { return folder_; }
     std::filesystem::path database() const { return folder_ / "service.db"; }
+    /// The packs that clients have sent over connections.
+    std::filesystem::path packs() const { return folder_ / "packs.db"; }
     std::filesystem::path token() const { return folder_ / "token"; }
     /// Where finished containers wait unless another folder was named.
     std::filesystem::path outbox() const { return folder_ / "outbox"; }

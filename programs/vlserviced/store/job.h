@@ -2,6 +2,7 @@
 // What the service knows of a mailing that it was given.
 
 #include "programs/protocol/job.h"
+#include "programs/protocol/pack_upload.h"
 
 #include <filesystem>
 #include <optional>
@@ -17,6 +18,8 @@ struct PackLocation {
     std::string database;
     std::string packId;
 
+    /// Whether they came over a connection and lie in the service's own store.
+    bool isWithService() const { return folder == Protocol::OVER_CONNECTION; }
     std::filesystem::path file() const { return std::filesystem::path(folder) / database; }
     bool operator==(PackLocation const&) const = default;
 };
@@ -55,5 +58,11 @@ struct Job {
     /// The name of its container in the outbox and in the upload folder.
     std::string containerName() const { return pack.packId + ".mailing"; }
 };
+
+/// Whether the pages of a job in that state are of no use any more: its container was handed over, or never
+/// will be.
+bool isDoneWithPages(JobState state);
+/// Whether nothing more will happen to a job in that state.
+bool hasEnded(JobState state);
 
 } // namespace VlServiced

@@ -234,6 +234,13 @@ bool JobStore::cancel(std::string const& packId, long long now) {
     return changeAtRest("due = NULL, changed_at = ?2, state = 'cancelled'", packId, now);
 }
 
+bool JobStore::wantUpload(std::string const& packId) {
+    SQLite::Statement change(database_, "UPDATE jobs SET to_upload = 1 WHERE pack = ? AND state IN "
+                                        "('accepted', 'held', 'queued')");
+    change.bind(1, packId);
+    return change.exec() == 1;
+}
+
 void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
     SQLite::Statement change(database_,
                              "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
@@ -302,6 +309,32 @@ void JobStore::wantUpload(std::string const& folder, std::string const& database
     change.bind(2, database);
     change.exec();
 }
+
+// A job is accepted before it ends, so that the index on states bounds the search.
+std::vector<Job> JobStore::endedBefore(long long time, std::size_t limit) const {
+    std::vector<Job> ended;
+    for (JobState const state : Protocol::ALL_JOB_STATES) {
+        if (!hasEnded(state) || ended.size() >= limit)
+            continue;
+        SQLite::Statement query(database_, std::string(SELECT_JOBS) +
+                                               "WHERE state = ?1 AND accepted_at < ?2 AND changed_at < ?2 "
+                                               "ORDER BY accepted_at, pack LIMIT " +
+                                               std::to_string(limit - ended.size()));
+        query.bind(1, stateName(state));
+        query.bind(2, static_cast<std::int64_t>(time));
+        for (Job& job : jobsIn(query))
+            ended.push_back(std::move(job));
+    }
+    return ended;
+}
+
+void JobStore::forget(std::string const& packId) {
+    SQLite::Statement deletion(database_, "DELETE FROM jobs WHERE pack = ?");
+    deletion.bind(1, packId);
+    deletion.exec();
+}
+
+void JobStore::emptyLog() { database_.exec("PRAGMA wal_checkpoint(TRUNCATE)"); }
 
 void JobStore::changed(std::string const& packId) const {
     if (tell_)

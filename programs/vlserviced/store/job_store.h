@@ -73,6 +73,8 @@ public:
                          long long now);
     /// The pack ids of jobs whose letters are on their way, or were when that was noted.
     std::vector<std::string> delivering() const;
+    /// Has a job handed on that is not yet; false, and no change, once it is on its way.
+    bool wantUpload(std::string const& packId);
     /// Gives a job up for the reason told.
     void fail(std::string const& packId, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.
@@ -80,6 +82,13 @@ public:
     /// Marks the jobs of a pack database that are not handed on yet as to be handed on; empty texts are no
     /// restriction.
     void wantUpload(std::string const& folder, std::string const& database);
+
+    /// Those that ended before that time, a few of them.
+    std::vector<Job> endedBefore(long long time, std::size_t limit) const;
+    /// Removes what is on record of a job.
+    void forget(std::string const& packId);
+    /// Writes what the log holds into the database, and empties it: nothing of what was removed stays in it.
+    void emptyLog();
 
     /// Has a function called after each change of a job's state or problem, with the pack id.
     void onChange(std::function<void(std::string const&)> tell) { tell_ = std::move(tell); }

@@ -20,9 +20,11 @@ protected:
     Container() { fs::create_directory(outbox_); }
 
     std::string writingFailure(std::string const& packId) {
-        return failureOf([&] {
-            VlServiced::writeContainer({folder_.path().string(), "packs.db", packId}, target_);
-        });
+        return failureOf([&] { write(packId); });
+    }
+    void write(std::string const& packId) {
+        Mailing::PackDatabaseReader pages(file_, packId);
+        VlServiced::writeContainer(pages, target_);
     }
     std::ptrdiff_t filesInOutbox() const { return std::distance(fs::directory_iterator(outbox_), {}); }
     void run(char const* sql) { SQLite::Database(file_, SQLite::OPEN_READWRITE).exec(sql); }
@@ -55,8 +57,7 @@ TEST_F(Container, IsNotWrittenOfPagesThatAreNotCompressed) {
                             "UPDATE pages SET data = 5 WHERE position = 1"}) {
         run(sql);
         EXPECT_EQ(writingFailure("p1"), "page 2 of the pack is not a compressed page") << sql;
-        EXPECT_THROW(VlServiced::writeContainer({folder_.path().string(), "packs.db", "p1"}, target_),
-                     VlServiced::BadPack);
+        EXPECT_THROW(write("p1"), VlServiced::BadPack);
     }
     EXPECT_EQ(filesInOutbox(), 0);
 }

@@ -187,13 +187,11 @@ TEST_F(JobRunnerTest, RefusesPacksThatItCannotTake) {
         std::string message;
     } const cases[] = {
         {"db.example:5432", "packs", "p1",
-         "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a folder, "
-         "and "
-         "\"db.example:5432\" is none"},
+         "pages come over the connection or from a pack database below the folder of --local-packs: "
+         "\"db_conn\" has to be the absolute path of a folder there, and \"db.example:5432\" is none"},
         {"", "packs.db", "p1",
-         "this service reads pack databases from files: \"db_conn\" has to be the absolute path of a folder, "
-         "and "
-         "\"\" is none"},
+         "pages come over the connection or from a pack database below the folder of --local-packs: "
+         "\"db_conn\" has to be the absolute path of a folder there, and \"\" is none"},
         {folder, "../packs.db", "p1",
          "\"db_name\" has to be the name of a file, and \"../packs.db\" is none"},
         {folder, "", "p1", "\"db_name\" has to be the name of a file, and \"\" is none"},

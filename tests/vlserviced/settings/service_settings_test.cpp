@@ -42,9 +42,9 @@ TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
         char const* message;
     } const cases[] = {
         {R"({"colour":"red"})",
-         R"(the service has no setting "colour"; there are upload_folder, tariff, carriers, disabled)"},
+         R"(the service has no setting "colour"; there are upload_folder, tariff, carriers, disabled, quota, retention_days)"},
         {R"({"suspended":1})",
-         R"(the service has no setting "suspended"; there are upload_folder, tariff, carriers, disabled)"},
+         R"(the service has no setting "suspended"; there are upload_folder, tariff, carriers, disabled, quota, retention_days)"},
         {R"({"upload_folder":"relative"})",
          R"("upload_folder" has to be the absolute path of a folder that is there)"},
         {R"({"upload_folder":"/missing/folder"})",
@@ -63,6 +63,15 @@ TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
          R"("disabled" has to be an array of node ids, and the root cannot be disabled)"},
         {R"({"disabled":["acme"]})", "node id \"acme\" is not valid: wanted is a path like "
                                      "u=NAME/ou=GROUP/a=ACCOUNT, or the same without its front"},
+        {R"({"quota":5})", R"("quota" has to be an object of node ids and numbers of MiB)"},
+        {R"({"quota":{"a=acme":-1}})",
+         R"(the "quota" of node "a=acme" has to be an integer from 0 to 1073741824)"},
+        {R"({"quota":{"a=acme":"5"}})",
+         R"(the "quota" of node "a=acme" has to be an integer from 0 to 1073741824)"},
+        {R"({"quota":{"acme":5}})", "node id \"acme\" is not valid: wanted is a path like "
+                                    "u=NAME/ou=GROUP/a=ACCOUNT, or the same without its front"},
+        {R"({"retention_days":-1})", R"("retention_days" has to be an integer from 0 to 36500)"},
+        {R"({"retention_days":true})", R"("retention_days" has to be an integer from 0 to 36500)"},
     };
     for (auto const& [change, message] : cases)
         EXPECT_EQ(failureOf([&change = change] { settings("{}").withChanges(parse(change)); }), message);
@@ -76,6 +85,20 @@ TEST(ServiceSettings, DisableANodeWithAllBelowIt) {
     EXPECT_FALSE(some.isDisabled("u=bob/a=acme"));
     EXPECT_FALSE(some.isDisabled("ou=presales/a=acme"));
     EXPECT_FALSE(some.isDisabled(""));
+}
+
+TEST(ServiceSettings, GiveANodeTheQuotaOfTheNearestNodeThatHasOne) {
+    ServiceSettings const some = settings(R"({"quota":{"a=acme":3,"u=bob/ou=sales/a=acme":0}})");
+    EXPECT_EQ(some.quotaOf("a=acme"), 3 << 20);
+    EXPECT_EQ(some.quotaOf("ou=sales/a=acme"), 3 << 20);
+    EXPECT_EQ(some.quotaOf("u=bob/ou=sales/a=acme"), 0);
+    EXPECT_EQ(some.quotaOf("a=other"), std::nullopt);
+    EXPECT_EQ(settings(R"({"quota":{"":5}})").quotaOf("a=other"), 5 << 20);
+}
+
+TEST(ServiceSettings, KeepJobsFor90DaysUnlessTheySayOtherwise) {
+    EXPECT_EQ(settings("{}").retentionDays(), 90);
+    EXPECT_EQ(settings("{}").withChanges(parse(R"({"retention_days":0})")).retentionDays(), 0);
 }
 
 TEST(ServiceSettings, AreSuspendedByBits) {

@@ -1,0 +1,373 @@
+#include "programs/vlserviced/jobs/pack_reception.h"
+
+#include "programs/base/error.h"
+#include "programs/base/plain_text.h"
+#include "programs/channel/data_message.h"
+#include "programs/vlserviced/jobs/incoming_pack.h"
+#include "programs/vlserviced/store/node_id.h"
+#include "vlservice/platform/log.h"
+
+#include <algorithm>
+#include <utility>
+
+namespace VlServiced {
+namespace {
+
+using Protocol::BeginPack;
+using Protocol::BeginPackAnswer;
+
+constexpr std::size_t MAX_TITLE_BYTES = 500;
+constexpr std::size_t DIGEST_DIGITS = 64;
+/// How long a pack waits for its rest, or for its Process Pack.
+constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
+
+bool isDigest(std::string const& text) {
+    return text.size() == DIGEST_DIGITS && text.find_first_not_of("0123456789abcdef") == std::string::npos;
+}
+
+void checkBeginning(BeginPack const& pack) {
+    if (!Mailing::isPackId(pack.id))
+        throw Base::Error("the pack id \"" + pack.id + "\" cannot name a file");
+    if (!Base::isPlainText(pack.title, MAX_TITLE_BYTES))
+        throw Base::Error("the title of pack " + pack.id + " is not a line of text of at most " +
+                          std::to_string(MAX_TITLE_BYTES) + " bytes");
+    checkNodeId(pack.cfgId);
+    if (pack.pages < 1 || pack.bytes < 1)
+        throw Base::Error("pack " + pack.id + " has no pages");
+    if (!isDigest(pack.sha256))
+        throw Base::Error("the digest of pack " + pack.id + " is none of 64 hexadecimal digits");
+}
+
+PackHead headOf(BeginPack const& pack) {
+    return {{pack.id, pack.cfgId, pack.title}, pack.pages, pack.bytes, pack.sha256};
+}
+
+/// An erased pack has lost its title.
+bool isSame(PackHead const& kept, PackHead const& said) {
+    PackHead titled = kept;
+    titled.info.title = said.info.title;
+    return titled == said;
+}
+
+[[noreturn]] void refuseOther(std::string const& packId) {
+    throw Base::Error("there is another pack " + packId +
+                      " with other pages: give this one an id of its own");
+}
+
+std::string notItsOwn(std::string const& packId) {
+    return "pack " + Base::oneLine(packId) +
+           " is none that this connection sends: another one goes on with it, or nobody has begun it";
+}
+
+std::string inMebibytes(long long bytes) { return std::to_string((bytes + (1 << 20) - 1) >> 20) + " MiB"; }
+
+/// The line, or nothing.
+template<typename Operation>
+std::string failureOf(Operation operation) {
+    try {
+        operation();
+        return {};
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (std::exception const& failure) {
+        return Base::oneLine(failure.what());
+    }
+}
+
+} // namespace
+
+class PackReception::Shelf {
+public:
+    Shelf(std::shared_ptr<PackStore> store, std::function<long long()> now)
+        : store_(std::move(store)), now_(std::move(now)) {}
+
+    /// `isKnown` says that a job of it is on record.
+    BeginPackAnswer begin(PackHead const& head, bool isKnown, std::optional<long long> quota) {
+        if (isKnown)
+            return ask(head, isKnown);
+        std::string const& id = head.info.id;
+        std::optional<KeptPack> kept = store_->find(id);
+        if (kept && kept->state == KeptPack::State::Erased) {
+            store_->forget(id);
+            kept.reset();
+        }
+        if (kept && !isSame(kept->head, head))
+            refuseOther(id);
+        if (kept && kept->state == KeptPack::State::Complete)
+            return ask(head, isKnown);
+        if (!kept)
+            add(head, quota);
+        return goOn(head);
+    }
+
+    /// What is there, without any change.
+    BeginPackAnswer ask(PackHead const& head, bool isKnown) {
+        std::optional<KeptPack> const kept = store_->find(head.info.id);
+        if (kept && !isSame(kept->head, head))
+            refuseOther(head.info.id);
+        BeginPackAnswer answer;
+        answer.isAccepted = isKnown;
+        if (kept)
+            answer.have = static_cast<long long>(store_->pagesOf(head.info.id).size());
+        return answer;
+    }
+
+    /// Pieces of one pack; the failure of one is that of all behind it.
+    void store(Pieces const& pieces, std::size_t from, std::size_t to) {
+        std::string const& packId = pieces[from].packId;
+        bool isOpen = false;
+        std::string const failure = failureOf([&] {
+            IncomingPack& pack = incoming(packId);
+            isOpen = true;
+            std::vector<PagePiece> taken;
+            for (std::size_t i = from; i < to; ++i)
+                taken.push_back(pack.take(Channel::parseData(pieces[i].text)));
+            store_->store(packId, taken, now_());
+        });
+        // One that is complete may be that of a job.
+        if (!failure.empty() && isOpen)
+            drop(packId);
+        for (std::size_t i = from; i < to; ++i)
+            pieces[i].stored(failure);
+    }
+
+    void complete(std::string const& packId) {
+        std::optional<KeptPack> const kept = store_->find(packId);
+        if (!kept || kept->state == KeptPack::State::Erased)
+            throw Base::Error("the service has no pack " + packId + ": send it again");
+        if (kept->state == KeptPack::State::Complete)
+            return;
+        try {
+            incoming(packId).requireWhole();
+            store_->complete(packId, now_());
+            incoming_.erase(packId);
+        } catch (std::exception const&) {
+            drop(packId);
+            throw;
+        }
+    }
+
+    std::vector<KeptPack> all() { return store_->all(); }
+
+    /// Those that were refused since it was asked last.
+    std::set<std::string> dropped() { return std::exchange(dropped_, {}); }
+
+    /// A step of it; false when nothing is left to erase.
+    bool eraseSome(std::string const& packId) {
+        incoming_.erase(packId);
+        return store_->find(packId) && store_->eraseSome(packId);
+    }
+    /// The same of one that is erased already, and has not come anew since.
+    bool eraseMore(std::string const& packId) {
+        std::optional<KeptPack> const kept = store_->find(packId);
+        return kept && kept->state == KeptPack::State::Erased && store_->eraseSome(packId);
+    }
+    void forget(std::string const& packId) { store_->forget(packId); }
+
+private:
+    void add(PackHead const& head, std::optional<long long> quota) {
+        long long const used = quota ? store_->bytesOf(head.info.cfgId) : 0;
+        if (quota && used + head.bytes > *quota)
+            throw Base::Error("node " + head.info.cfgId + " may have " + inMebibytes(*quota) +
+                              " of packs with the service at once, and has " + inMebibytes(used) + ": pack " +
+                              head.info.id + " of " + inMebibytes(head.bytes) +
+                              " is not taken before some of them were handed over");
+        store_->add(head, now_());
+    }
+
+    BeginPackAnswer goOn(PackHead const& head) {
+        store_->dropUnfinishedPage(head.info.id);
+        auto pack = std::make_unique<IncomingPack>(head, store_->pagesOf(head.info.id));
+        BeginPackAnswer answer;
+        answer.have = pack->have();
+        incoming_[head.info.id] = std::move(pack);
+        return answer;
+    }
+
+    IncomingPack& incoming(std::string const& packId) {
+        auto& pack = incoming_[packId];
+        if (!pack) {
+            std::optional<KeptPack> const kept = store_->find(packId);
+            if (!kept || kept->state != KeptPack::State::Open)
+                throw Base::Error("pack " + packId + " is none that pages are wanted of");
+            pack = std::make_unique<IncomingPack>(kept->head, store_->pagesOf(packId));
+        }
+        return *pack;
+    }
+
+    /// From here on it is erased, so that it may come anew; the rest goes step by step.
+    void drop(std::string const& packId) {
+        incoming_.erase(packId);
+        dropped_.insert(packId);
+        std::string const failure = failureOf([&] { store_->eraseSome(packId); });
+        if (!failure.empty())
+            Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot be erased yet. " << failure;
+    }
+
+    std::shared_ptr<PackStore> store_;
+    std::function<long long()> now_;
+    std::map<std::string, std::unique_ptr<IncomingPack>> incoming_;
+    /// Refused, and not erased yet.
+    std::set<std::string> dropped_;
+};
+
+PackReception::PackReception(std::shared_ptr<PackStore> store, JobStore const& jobs,
+                             ReceptionSurroundings surroundings)
+    : jobs_(jobs), surroundings_(std::move(surroundings)),
+      shelf_(std::make_shared<Shelf>(std::move(store), surroundings_.now)) {}
+
+PackReception::~PackReception() = default;
+
+void PackReception::begin(BeginPack const& pack, Sender const& sender,
+                          std::function<void(BeginPackAnswer const&, std::string const& failure)> done) {
+    bool isKnown = false;
+    std::string const refused = failureOf([&] {
+        checkBeginning(pack);
+        std::optional<Job> const job = jobs_.find(pack.id);
+        if (job && !job->pack.isWithService())
+            refuseOther(pack.id);
+        isKnown = job.has_value();
+        if (!isKnown && surroundings_.isDisabled(pack.cfgId))
+            throw Base::Error("node " + pack.cfgId + " is disabled: pack " + pack.id + " is not taken");
+    });
+    if (!refused.empty())
+        return done({}, refused);
+    if (!pack.asks)
+        letSend(pack.id, sender);
+    surroundings_.onStoreThread([head = headOf(pack), asks = pack.asks, isKnown,
+                                 quota = surroundings_.quota(pack.cfgId), shelf = shelf_,
+                                 onOwnThread = surroundings_.onOwnThread, done] {
+        BeginPackAnswer answer;
+        std::string const failure = failureOf(
+            [&] { answer = asks ? shelf->ask(head, isKnown) : shelf->begin(head, isKnown, quota); });
+        onOwnThread([done, answer, failure] { done(answer, failure); });
+    });
+}
+
+/// What another connection has sent and is not on its way to the disk would come behind the answer.
+void PackReception::letSend(std::string const& packId, Sender const& sender) {
+    senders_[packId] = sender;
+    Pieces const all = std::exchange(waiting_, {});
+    for (Piece const& piece : all)
+        piece.packId == packId ? piece.stored(notItsOwn(packId)) : waiting_.push_back(piece);
+}
+
+bool PackReception::maySend(std::string const& packId,
+                            std::shared_ptr<Ipc::CmdProcessorI> const& connection) const {
+    auto const sender = senders_.find(packId);
+    return sender != senders_.end() && sender->second.lock() == connection;
+}
+
+void PackReception::take(std::shared_ptr<Ipc::CmdProcessorI> const& connection, std::string text,
+                         Stored stored) {
+    std::string packId(Channel::parseData(text).packId);
+    if (!maySend(packId, connection))
+        return stored(notItsOwn(packId));
+    waiting_.push_back({std::move(packId), std::move(text), std::move(stored)});
+    storeWaiting();
+}
+
+/// All that came while the disk was busy goes there at once.
+void PackReception::storeWaiting() {
+    if (waiting_.empty() || std::exchange(isStoring_, true))
+        return;
+    auto const pieces = std::make_shared<Pieces>(std::exchange(waiting_, {}));
+    surroundings_.onStoreThread([this, pieces, shelf = shelf_, onOwnThread = surroundings_.onOwnThread] {
+        std::stable_sort(pieces->begin(), pieces->end(),
+                         [](Piece const& a, Piece const& b) { return a.packId < b.packId; });
+        for (std::size_t from = 0, to = 0; from < pieces->size(); from = to) {
+            while (to < pieces->size() && (*pieces)[to].packId == (*pieces)[from].packId)
+                ++to;
+            shelf->store(*pieces, from, to);
+        }
+        onOwnThread([this, dropped = shelf->dropped()] {
+            isStoring_ = false;
+            eraseAll(dropped);
+            storeWaiting();
+        });
+    });
+}
+
+void PackReception::eraseAll(std::set<std::string> const& packIds) {
+    for (std::string const& packId : packIds)
+        eraseMore(packId);
+}
+
+void PackReception::complete(std::string const& packId,
+                             std::function<void(std::string const& failure)> done) {
+    surroundings_.onStoreThread(
+        [this, packId, shelf = shelf_, onOwnThread = surroundings_.onOwnThread, done] {
+            std::string const failure = failureOf([&] { shelf->complete(packId); });
+            onOwnThread([this, done, failure, dropped = shelf->dropped()] {
+                eraseAll(dropped);
+                done(failure);
+            });
+        });
+}
+
+void PackReception::onJobChanged(std::string const& packId) {
+    std::optional<Job> const job = jobs_.find(packId);
+    if (job && job->pack.isWithService() && isDoneWithPages(job->state))
+        erase(packId);
+}
+
+void PackReception::erase(std::string const& packId) {
+    senders_.erase(packId);
+    eraseBy(packId, [packId, shelf = shelf_] { return shelf->eraseSome(packId); });
+}
+
+void PackReception::eraseMore(std::string const& packId) {
+    eraseBy(packId, [packId, shelf = shelf_] { return shelf->eraseMore(packId); });
+}
+
+/// Step by step, so that others who wait for the store get their turn.
+void PackReception::eraseBy(std::string const& packId, std::function<bool()> const& step) {
+    surroundings_.onStoreThread([this, packId, step, onOwnThread = surroundings_.onOwnThread] {
+        bool isLeft = false;
+        std::string const failure = failureOf([&] { isLeft = step(); });
+        onOwnThread([this, packId, isLeft, failure] {
+            if (failure.empty())
+                return isLeft ? eraseMore(packId) : void();
+            Log::Lock(4).logStreamLine()
+                << "Pack " << packId << " cannot be erased, which is tried again. " << failure;
+            unerased_.insert(packId);
+        });
+    });
+}
+
+void PackReception::sweep() {
+    eraseAll(std::exchange(unerased_, {}));
+    surroundings_.onStoreThread([this, shelf = shelf_, onOwnThread = surroundings_.onOwnThread] {
+        std::vector<KeptPack> packs;
+        std::string const failure = failureOf([&] { packs = shelf->all(); });
+        if (!failure.empty())
+            Log::Lock(4).logStreamLine() << "The packs cannot be looked through. " << failure;
+        onOwnThread([this, packs = std::move(packs)] { eraseUnneeded(packs); });
+    });
+}
+
+bool PackReception::isOfUse(KeptPack const& pack) const {
+    if (std::optional<Job> const job = jobs_.find(pack.head.info.id))
+        return !isDoneWithPages(job->state);
+    return pack.touchedAt > surroundings_.now() - UNFINISHED_SECONDS;
+}
+
+void PackReception::eraseUnneeded(std::vector<KeptPack> const& packs) {
+    for (KeptPack const& pack : packs) {
+        std::string const& id = pack.head.info.id;
+        if (isOfUse(pack))
+            continue;
+        if (jobs_.find(id)) {
+            erase(id);
+            continue;
+        }
+        senders_.erase(id);
+        surroundings_.onStoreThread([id, shelf = shelf_] {
+            std::string const failure = failureOf([&] { shelf->forget(id); });
+            if (!failure.empty())
+                Log::Lock(4).logStreamLine() << "Pack " << id << " cannot be forgotten. " << failure;
+        });
+    }
+}
+
+} // namespace VlServiced
