@@ -91,7 +91,8 @@ bool fails(char const* call) {
     return true;
 }
 
-/// What a disk does to writing happens to files alone, not to pipes and sockets.
+/// What a disk does to reading and writing happens to files alone. A pipe within a process does not fail:
+/// what comes by it, such as a signal, would be lost.
 bool isFile(int descriptor) {
     struct stat status {};
     return ::fstat(descriptor, &status) == 0 && S_ISREG(status.st_mode);
@@ -150,10 +151,13 @@ FAILING_IF(isFile(file), write, ssize_t, pwrite64, (int file, void const* data, 
 FAILING_IF(isFile(file), write, int, ftruncate, (int file, off_t size), (file, size))
 FAILING_IF(isFile(file), write, int, ftruncate64, (int file, off64_t size), (file, size))
 
-FAILING(read, ssize_t, read, (int file, void* data, size_t size), (file, data, size))
-FAILING(read, ssize_t, readv, (int file, iovec const* parts, int count), (file, parts, count))
-FAILING(read, ssize_t, pread, (int file, void* data, size_t size, off_t at), (file, data, size, at))
-FAILING(read, ssize_t, pread64, (int file, void* data, size_t size, off64_t at), (file, data, size, at))
+FAILING_IF(isFile(file), read, ssize_t, read, (int file, void* data, size_t size), (file, data, size))
+FAILING_IF(isFile(file), read, ssize_t, readv, (int file, iovec const* parts, int count),
+           (file, parts, count))
+FAILING_IF(isFile(file), read, ssize_t, pread, (int file, void* data, size_t size, off_t at),
+           (file, data, size, at))
+FAILING_IF(isFile(file), read, ssize_t, pread64, (int file, void* data, size_t size, off64_t at),
+           (file, data, size, at))
 
 EXPORTED int fsync(int) { return fails("sync") ? -1 : 0; }
 EXPORTED int fdatasync(int) { return fails("sync") ? -1 : 0; }
