@@ -55,6 +55,18 @@ std::string stranded(ServiceAtHand const& service) {
     return id;
 }
 
+constexpr char const* FILE_AT_HAND = "../home/vlmail/out/m.mailing";
+
+/// Finished in a file, and with no service yet.
+std::string inAFile(ServiceAtHand const& service) {
+    fs::path const file = service.folder() / FILE_AT_HAND;
+    fs::remove_all(file.parent_path());
+    service.vlmail({"mail", "letter.txt", "-o", file.parent_path().string(), "--jobs", "1"});
+    fs::path const made = fs::directory_iterator(file.parent_path())->path();
+    fs::rename(made, file);
+    return made.stem().string();
+}
+
 /// The service has it and does not hand it on yet.
 std::string waiting(ServiceAtHand const& service) {
     service.vlmail({"settings", "suspend", "nothing"});
@@ -174,6 +186,7 @@ std::vector<Question> const& questions() {
          {"settings", "service"}},
         {"settings_tree", {"settings", "tree"}},
         {"resend", {"resend", "{}", "1"}, &mailed, {"status", "{}"}, Expected::Refused},
+        {"send", {"send", FILE_AT_HAND}, &inAFile, {"status", "{}"}},
         {"settle", {"settle", "{}", "1", "failed"}, &mailed, {"status", "{}"}, Expected::Refused},
         {"status", {"status"}},
         {"discard",
