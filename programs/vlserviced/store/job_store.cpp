@@ -318,6 +318,7 @@ std::vector<Job> JobStore::endedBefore(long long time, std::size_t limit) const 
             continue;
         SQLite::Statement query(database_, std::string(SELECT_JOBS) +
                                                "WHERE state = ?1 AND accepted_at < ?2 AND changed_at < ?2 "
+                                               "AND letters_state <> 'delivering' "
                                                "ORDER BY accepted_at, pack LIMIT " +
                                                std::to_string(limit - ended.size()));
         query.bind(1, stateName(state));

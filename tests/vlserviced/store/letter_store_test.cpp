@@ -145,6 +145,14 @@ TEST_F(LetterStoreTest, KeepsHowCarriersAreDoing) {
     EXPECT_EQ(record.tryAt, 80);
 }
 
+TEST_F(LetterStoreTest, TakesNoJobForEndedWhoseLettersAreStillOnTheirWay) {
+    divide("p1", {{1, "postal", true}, {2, "email", false}});
+    jobs_.advance("p1", JobState::Queued, JobState::Lodged, 10);
+    EXPECT_THAT(jobs_.endedBefore(1000, 10), IsEmpty());
+    jobs_.setLettersState("p1", JobState::Lodged, "", 20);
+    EXPECT_EQ(jobs_.endedBefore(1000, 10).size(), 1U);
+}
+
 TEST_F(LetterStoreTest, LetsLettersGoWithTheirJob) {
     divide("p1", {{1, "postal", true}});
     database_.exec("DELETE FROM jobs");
