@@ -19,7 +19,7 @@ using Handle = QPDFObjectHandle;
 
 void appendAll(Handle from, Handle to) {
     if (from.isArray())
-        for (Handle item : from.getArrayAsVector())
+        for (Handle const& item : from.getArrayAsVector())
             to.appendItem(item);
 }
 
@@ -31,10 +31,10 @@ std::vector<Handle> hiddenLayers(Handle layers, Handle configuration) {
     }
     std::set<QPDFObjGen> shown;
     if (Handle on = configuration.getKey("/ON"); on.isArray())
-        for (Handle layer : on.getArrayAsVector())
+        for (Handle const& layer : on.getArrayAsVector())
             shown.insert(layer.getObjGen());
     std::vector<Handle> hidden;
-    for (Handle layer : layers.getArrayAsVector())
+    for (Handle const& layer : layers.getArrayAsVector())
         if (shown.count(layer.getObjGen()) == 0)
             hidden.push_back(layer);
     return hidden;
@@ -71,7 +71,7 @@ void carryLayers(QPDF& pdf, QPDF& target) {
     Handle own = said.getKey("/D");
     if (!own.isDictionary())
         return;
-    for (Handle layer : hiddenLayers(said.getKey("/OCGs"), own))
+    for (Handle const& layer : hiddenLayers(said.getKey("/OCGs"), own))
         arrayIn(configuration, "/OFF").appendItem(layer);
     appendAll(own.getKey("/AS"), arrayIn(configuration, "/AS"));
 }
