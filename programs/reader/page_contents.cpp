@@ -43,9 +43,9 @@ std::string asEmbeddedFile(Handle stream) {
     Handle file = pdf.newStream();
     file.replaceStreamData(stream.getRawStreamData(), copied(stream.getDict(), "/Filter"),
                            copied(stream.getDict(), "/DecodeParms"));
-    Handle specification = pdf.makeIndirectObject(Handle::parse("<< /Type /Filespec /F (content) >>"));
-    specification.replaceKey("/EF", Handle::newDictionary({{"/F", file}}));
-    Handle names = Handle::newArray({Handle::newString("content"), specification});
+    Handle filespec = pdf.makeIndirectObject(Handle::parse("<< /Type /Filespec /F (content) >>"));
+    filespec.replaceKey("/EF", Handle::newDictionary({{"/F", file}}));
+    Handle names = Handle::newArray({Handle::newString("content"), filespec});
     pdf.getRoot().replaceKey(
         "/Names", Handle::newDictionary({{"/EmbeddedFiles", Handle::newDictionary({{"/Names", names}})}}));
     return bytesOf(pdf, Packing::AsItIs);

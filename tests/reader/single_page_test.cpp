@@ -96,13 +96,19 @@ TEST(SinglePages, KeepTheFontsThatFormsTakeFromThem) {
     expectKept(pdf);
 }
 
-TEST(SinglePages, KeepTheFontsThatTypeThreeFontsTakeFromThem) {
+/// Its glyph, which is object 7, is missing.
+RawPdf onePageInATypeThreeFont() {
     RawPdf pdf = onePage("BT /T3 20 Tf 72 700 Td (aaa) Tj ET");
     pdf.object(3, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 5 0 R /Resources << /Font "
                   "<< /F 4 0 R /T3 6 0 R >> >> >>");
     pdf.object(6, "<< /Type /Font /Subtype /Type3 /FontBBox [0 0 10 10] /FontMatrix [0.1 0 0 0.1 0 0] "
                   "/CharProcs << /a 7 0 R >> /Encoding << /Type /Encoding /Differences [97 /a] >> "
                   "/FirstChar 97 /LastChar 97 /Widths [10] >>");
+    return pdf;
+}
+
+TEST(SinglePages, KeepTheFontsThatTypeThreeFontsTakeFromThem) {
+    RawPdf pdf = onePageInATypeThreeFont();
     pdf.stream(7, "", "10 0 d0 BT /F 10 Tf (Q) Tj ET");
     expectKept(pdf);
 }
@@ -252,12 +258,7 @@ TEST(SinglePages, HaveFormsWrittenAnewThatAreDamaged) {
 
 TEST(SinglePages, HaveGlyphsWrittenAnewThatAreDamaged) {
     std::string const packed = VLServiceTest::deflated("10 0 d0 BT /F 10 Tf (Q) Tj ET " + manyLines());
-    RawPdf pdf = onePage("BT /T3 20 Tf 72 700 Td (aaa) Tj ET");
-    pdf.object(3, "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 5 0 R /Resources << /Font "
-                  "<< /F 4 0 R /T3 6 0 R >> >> >>");
-    pdf.object(6, "<< /Type /Font /Subtype /Type3 /FontBBox [0 0 10 10] /FontMatrix [0.1 0 0 0.1 0 0] "
-                  "/CharProcs << /a 7 0 R >> /Encoding << /Type /Encoding /Differences [97 /a] >> "
-                  "/FirstChar 97 /LastChar 97 /Widths [10] >>");
+    RawPdf pdf = onePageInATypeThreeFont();
     pdf.stream(7, "/Filter /FlateDecode", packed.substr(0, packed.size() - 20));
     expectWrittenAnew(pdf.bytes(), "glyph");
 }
