@@ -51,6 +51,8 @@ struct Outcome {
         Refused,
         /// The carrier itself failed, and nobody has it: to be tried again.
         Failed,
+        /// The other side may have it or not.
+        Uncertain,
     };
 
     Kind kind = Kind::Accepted;
@@ -63,8 +65,10 @@ class Carrier {
 public:
     virtual ~Carrier() = default;
 
-    /// What is handed over again under a key replaces what the other side has of it. Throws std::exception
-    /// with one line where the carrier failed and nobody has it.
+    /// Whether what is handed over again under a key replaces what the other side has of it. What is handed
+    /// over to others goes on record as such before.
+    virtual bool isRepeatable() const = 0;
+    /// Throws std::exception with one line where the carrier failed and nobody has it.
     virtual Outcome handOver(Parcel const& parcel) = 0;
     /// Tries the other side without sending anything, and says in one line what it offers. Throws
     /// std::exception with one line.

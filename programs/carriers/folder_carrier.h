@@ -13,6 +13,7 @@ class FolderCarrier : public Carrier {
 public:
     explicit FolderCarrier(std::filesystem::path folder);
 
+    bool isRepeatable() const override { return true; }
     Outcome handOver(Parcel const& parcel) override;
     std::string test() override;
 

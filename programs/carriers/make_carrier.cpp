@@ -1,5 +1,6 @@
 #include "programs/base/error.h"
 #include "programs/carriers/carrier.h"
+#include "programs/carriers/command_carrier.h"
 #include "programs/carriers/folder_carrier.h"
 
 namespace Carriers {
@@ -8,6 +9,8 @@ std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) 
     switch (settings.type) {
     case Protocol::CarrierType::Folder:
         return std::make_unique<FolderCarrier>(settings.folder);
+    case Protocol::CarrierType::Command:
+        return std::make_unique<CommandCarrier>(settings);
     }
     throw Base::Error("there is no such carrier");
 }

@@ -80,6 +80,13 @@ struct CarrierSettings::Keys {
         Asked{"folder", &CarrierSettings::folder, PathForm{}},
         Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
     };
+    static constexpr std::tuple COMMAND{
+        Asked{"program", &CarrierSettings::program, PathForm{}},
+        Asked{"arguments", &CarrierSettings::arguments, TextsForm{100}},
+        Asked{"time_limit", &CarrierSettings::timeLimit, IntegerForm{1, 3600}, 60LL},
+        Asked{"output_limit", &CarrierSettings::outputLimit, IntegerForm{1, 1 << 20}, 65'536LL},
+        Asked{"user", &CarrierSettings::user, TextForm{}},
+    };
 };
 
 namespace {
@@ -112,6 +119,7 @@ constexpr TypeRow typeRow(CarrierType type, char const* name, char const* requir
 
 constexpr TypeRow TYPES[] = {
     typeRow<CarrierSettings::Keys::FOLDER>(CarrierType::Folder, "folder", "folder"),
+    typeRow<CarrierSettings::Keys::COMMAND>(CarrierType::Command, "command", "program"),
 };
 
 std::string typeNames() {

@@ -14,6 +14,8 @@ namespace Protocol {
 enum class CarrierType {
     /// Files in a folder that a print shop takes them from.
     Folder,
+    /// A program that is run for each letter.
+    Command,
 };
 
 /// The name that settings have for it.
@@ -49,6 +51,17 @@ struct CarrierSettings {
     std::string folder;
     /// "letter" or "mailing".
     std::string unit = "letter";
+
+    /// An absolute path.
+    std::string program;
+    /// With placeholders.
+    std::vector<std::string> arguments;
+    /// In seconds.
+    long long timeLimit = 60;
+    /// In bytes.
+    long long outputLimit = 65'536;
+    /// That the program runs as; empty for the service's.
+    std::string user;
 
     CarrierSettings() = default;
     /// Throws Error on a type that there is not, an unknown key, one that is missing, and a bad value.

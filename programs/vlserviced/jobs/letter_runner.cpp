@@ -27,6 +27,20 @@ std::string lettersInWords(long long count) {
     return std::to_string(count) + (count == 1 ? " letter" : " letters");
 }
 
+LetterState stateBehind(Outcome::Kind kind) {
+    switch (kind) {
+    case Outcome::Kind::Accepted:
+        return LetterState::Accepted;
+    case Outcome::Kind::Refused:
+        return LetterState::Failed;
+    case Outcome::Kind::Failed:
+        return LetterState::Waiting;
+    case Outcome::Kind::Uncertain:
+        break;
+    }
+    return LetterState::Uncertain;
+}
+
 /// "working", "paused", "failing".
 char const* stateOf(CarrierRecord const& record) {
     if (record.isPaused)
@@ -56,6 +70,7 @@ LetterRunner::Channel& LetterRunner::channelOf(std::string const& name,
 }
 
 void LetterRunner::resume() {
+    letters_.doubt("the service was ended while it was handed over", surroundings_.now());
     for (std::string const& packId : jobs_.delivering())
         unsettled_.insert(packId);
     proceed();
@@ -151,6 +166,9 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     handOver->source = sourceOf(letters.front().id.packId);
     handOver->letters = std::move(letters);
     handOver->carrier = idleOrNew(channel);
+    // Whoever finds it so on record cannot know whether the other side has it.
+    if (!handOver->carrier->isRepeatable())
+        letters_.beginHandingOver(handOver->ids(), surroundings_.now());
     for (StoredLetter const& letter : handOver->letters)
         channel.inHand.insert(letter.id);
     ++channel.busy;
@@ -218,9 +236,7 @@ void LetterRunner::recordOutcome(HandOver const& handOver) {
     Outcome const& outcome = handOver.outcome;
     if (outcome.kind == Outcome::Kind::Failed)
         return postpone(handOver);
-    letters_.finish(handOver.ids(),
-                    outcome.kind == Outcome::Kind::Accepted ? LetterState::Accepted : LetterState::Failed,
-                    outcome.says, surroundings_.now());
+    letters_.finish(handOver.ids(), stateBehind(outcome.kind), outcome.says, surroundings_.now());
 }
 
 void LetterRunner::postpone(HandOver const& handOver) {

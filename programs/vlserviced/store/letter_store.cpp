@@ -184,6 +184,10 @@ std::optional<StoredLetter> LetterStore::firstIn(std::string const& packId, Lett
     return firstLetterIn(query);
 }
 
+void LetterStore::beginHandingOver(std::vector<LetterId> const& letters, long long now) {
+    finish(letters, LetterState::HandedOver, {}, now);
+}
+
 void LetterStore::finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
                          long long now) {
     SQLite::Statement change(database_, "UPDATE letters SET state = ?, says = ?, changed_at = ? "
@@ -221,6 +225,14 @@ bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const&
     change.bind(4, letter.packId);
     bind(change, 5, letter.number);
     return change.exec() == 1;
+}
+
+void LetterStore::doubt(std::string const& says, long long now) {
+    SQLite::Statement change(database_, "UPDATE letters SET state = 'uncertain', says = ?, changed_at = ? "
+                                        "WHERE state = 'handed over'");
+    change.bind(1, says);
+    bind(change, 2, now);
+    change.exec();
 }
 
 CarrierRecord LetterStore::carrier(std::string const& channel) const {

@@ -95,6 +95,8 @@ public:
     /// The first of a job in that state.
     std::optional<StoredLetter> firstIn(std::string const& packId, LetterState state) const;
 
+    /// Notes that from here on the other side may have them.
+    void beginHandingOver(std::vector<LetterId> const& letters, long long now);
     /// Notes what became of them.
     void finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
                 long long now);
@@ -105,6 +107,9 @@ public:
     /// `from`. One that waits again is due at once and its attempts count anew.
     bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
                 std::string const& says, long long now);
+
+    /// Those that were being handed over when a process ended become uncertain.
+    void doubt(std::string const& says, long long now);
 
     CarrierRecord carrier(std::string const& channel) const;
     void setCarrier(std::string const& channel, CarrierRecord const& record);

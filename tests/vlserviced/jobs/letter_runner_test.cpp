@@ -31,6 +31,7 @@ using VlServiced::LetterState;
 /// What the other side does, by the key that it is given something under.
 struct OtherSide {
     std::vector<std::string> taken;
+    bool isRepeatable = true;
     std::map<std::string, Outcome> answers;
     /// What all are told that have no answer of their own.
     std::optional<Outcome> answer;
@@ -40,6 +41,7 @@ class FakeCarrier : public Carriers::Carrier {
 public:
     explicit FakeCarrier(OtherSide& other) : other_(other) {}
 
+    bool isRepeatable() const override { return other_.isRepeatable; }
     Outcome handOver(Parcel const& parcel) override {
         other_.taken.push_back(parcel.key);
         if (auto const own = other_.answers.find(parcel.key); own != other_.answers.end())
@@ -456,6 +458,37 @@ TEST_F(LetterRunnerTest, SendsALetterAgainWhenAPersonWantsIt) {
     doWork();
     EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2", "p1-1"));
     EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, NeverSendsALetterAgainByItselfThatTheOtherSideMayHave) {
+    other_.isRepeatable = false;
+    send("p1", {"postal", "postal", "postal"});
+    doOne();
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_EQ(state("p1", 2), "handed over");
+    restart();
+    EXPECT_EQ(state("p1", 2), "uncertain: the service was ended while it was handed over");
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-3"));
+    EXPECT_EQ(job("p1"),
+              "delivering: 1 letter uncertain, letter 2: the service was ended while it was handed over");
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 2), "nothing was thrown");
+    other_.answer = Outcome{Outcome::Kind::Uncertain, "cut"};
+    doWork();
+    EXPECT_EQ(state("p1", 2), "uncertain: cut");
+    EXPECT_EQ(letterRunner_->nextTime(), std::nullopt);
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleDelivered, "p1", 2), "nothing was thrown");
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, TriesALetterAgainThatNobodyHasAlthoughItWasOnRecordAsHandedOver) {
+    other_.isRepeatable = false;
+    other_.answer = Outcome{Outcome::Kind::Failed, "no connection"};
+    send("p1", {"postal"});
+    doWork();
+    EXPECT_EQ(state("p1", 1), "waiting: no connection");
+    restart();
+    EXPECT_EQ(state("p1", 1), "waiting: no connection");
 }
 
 TEST_F(LetterRunnerTest, LetsAPersonSettleALetterThatIsUncertain) {
