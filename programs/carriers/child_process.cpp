@@ -159,12 +159,13 @@ pid_t startChild(Child const& child) {
     return number;
 }
 
-/// False at the end of what it writes.
-bool readMore(FileDescriptor& from, std::string& output) {
+/// What is there by now; false at the end of what it writes.
+bool readMore(int from, std::string& output) {
     std::array<char, 4096> buffer{};
-    std::size_t const size = from.read(buffer.data(), buffer.size());
-    output.append(buffer.data(), size);
-    return size > 0;
+    ssize_t const size = ::read(from, buffer.data(), buffer.size());
+    if (size > 0)
+        output.append(buffer.data(), static_cast<std::size_t>(size));
+    return size > 0 || (size < 0 && errno == EINTR);
 }
 
 bool isReadable(int file) {
@@ -173,7 +174,7 @@ bool isReadable(int file) {
 }
 
 /// Reads until the process ends or is beyond a limit.
-ProgramEnd::Kind follow(ProgramToRun const& program, FileDescriptor& output, int processEnd,
+ProgramEnd::Kind follow(ProgramToRun const& program, FileDescriptor const& output, int processEnd,
                         std::string& text) {
     auto const due = Clock::now() + program.timeLimit;
     bool isOpen = true;
@@ -186,7 +187,7 @@ ProgramEnd::Kind follow(ProgramToRun const& program, FileDescriptor& output, int
         // What it has written by its end; others that it left behind may go on writing.
         do {
             if (isOpen && isReadable(output.number()))
-                isOpen = readMore(output, text);
+                isOpen = readMore(output.number(), text);
             if (text.size() > program.outputLimit)
                 return ProgramEnd::Kind::TooMuchOutput;
         } while (isOver && isOpen && isReadable(output.number()));
