@@ -1,6 +1,5 @@
 #include "programs/carriers/command_carrier.h"
 
-#include "programs/carriers/placeholders.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 
@@ -15,7 +14,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-using Carriers::filledIn;
 using Carriers::Outcome;
 
 Carriers::Parcel smsOf(std::string const& number, std::string const& text = "Hello") {

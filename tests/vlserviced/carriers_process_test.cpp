@@ -16,6 +16,7 @@
 #include <csignal>
 #include <fstream>
 #include <set>
+#include <sstream>
 
 namespace {
 
@@ -170,6 +171,81 @@ private:
     void TestBody() override {}
 };
 
+/// A program that counts how often it has had each letter.
+class CommandedLetters : public CarriedLetters {
+public:
+    CommandedLetters() {
+        std::ofstream(program_) << "#!/bin/sh\necho $1 >>'" + (folder_ / "had").string() + "'\n";
+        fs::permissions(program_, fs::perms::owner_all);
+        storeLetters(folder_ / "sms.db", "s1", {"sms", "sms", "sms", "sms"});
+    }
+
+    /// False when the service got to the end alive.
+    bool killedAt(int call) {
+        std::string const when = "killed at call " + std::to_string(call);
+        bool survived = false;
+        {
+            ServiceProcess service(arguments(),
+                                   Faults::environmentOf({"durable", 0, call}, folder_ / "calls"));
+            survived = service.port() != 0 && send(service);
+            service.signal(SIGKILL);
+            service.wait();
+        }
+        ServiceProcess const service(arguments(),
+                                     Faults::environmentOf({"durable", 0, 0}, folder_ / "calls"));
+        EXPECT_TRUE(send(service)) << when;
+        requireOnce(told(*clientOf(service, data_)), when);
+        return !survived;
+    }
+
+private:
+    void TestBody() override {}
+
+    bool send(ServiceProcess const& service) {
+        try {
+            auto const client = clientOf(service, data_);
+            json::Object const carrier{{"type", "command"},
+                                       {"program", program_.string()},
+                                       {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
+            client->call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{"sms", carrier}}}});
+            client->call<Ipc::ProcessPack>(folder_.path().string(), "sms.db", "s1");
+            client->call<Ipc::UploadQueued>(folder_.path().string(), "sms.db");
+            auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+            auto const isUnderWay = [&](std::string const& states) {
+                return states.find("accepted:") != std::string::npos ||
+                       states.find("queued:") != std::string::npos ||
+                       states.find(" waiting") != std::string::npos ||
+                       states.find("handed over") != std::string::npos;
+            };
+            while (isUnderWay(told(*client)) && std::chrono::steady_clock::now() < end) {
+            }
+            return !isUnderWay(told(*client));
+        } catch (std::exception const&) {
+            return false;
+        }
+    }
+
+    void requireOnce(std::string const& states, std::string const& when) {
+        std::istringstream had(textOf(folder_ / "had"));
+        std::map<std::string, int> times;
+        for (std::string key; had >> key;)
+            ++times[key];
+        std::istringstream words(states);
+        std::string state;
+        words >> state >> state;
+        int uncertain = 0;
+        for (int letter = 1; words >> state; ++letter) {
+            int const known = times["s1-" + std::to_string(letter)];
+            uncertain += state == "uncertain" ? 1 : 0;
+            EXPECT_TRUE(known == 1 || (known == 0 && state == "uncertain"))
+                << letter << ' ' << state << ' ' << known << ' ' << when;
+        }
+        EXPECT_LE(uncertain, 1) << when;
+    }
+
+    fs::path program_ = folder_ / "program";
+};
+
 /// Every fourth call, from the parameter on.
 class ServiceThatIsKilledAmongLetters : public testing::TestWithParam<int> {};
 
@@ -179,6 +255,13 @@ TEST_P(ServiceThatIsKilledAmongLetters, HandsEachOverUnderItsKeyAndLosesNone) {
         call += 4;
     // Each letter is three files, which are synced, renamed and put on record.
     EXPECT_GT(call, 100);
+}
+
+TEST_P(ServiceThatIsKilledAmongLetters, GivesNoneToAProgramTwiceAndTellsOfOneAsUncertainAtMost) {
+    int call = GetParam();
+    while (CommandedLetters().killedAt(call) && !HasFailure())
+        call += 4;
+    EXPECT_GT(call, 40);
 }
 
 INSTANTIATE_TEST_SUITE_P(AtEveryCall, ServiceThatIsKilledAmongLetters, testing::Range(1, 5));
