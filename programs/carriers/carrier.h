@@ -60,16 +60,19 @@ struct Outcome {
     std::string says;
 };
 
+/// Puts on record, until the disk has it, that the other side may have a parcel from here on. Throws
+/// std::exception when that cannot be done: the parcel stays here then.
+using PutOnRecord = std::function<void()>;
+
 /// Used by one thread at a time.
 class Carrier {
 public:
     virtual ~Carrier() = default;
 
-    /// Whether what is handed over again under a key replaces what the other side has of it. What is handed
-    /// over to others goes on record as such before.
-    virtual bool isRepeatable() const = 0;
-    /// Throws std::exception with one line where the carrier failed and nobody has it.
-    virtual Outcome handOver(Parcel const& parcel) = 0;
+    /// Throws std::exception with one line where the carrier failed and nobody has it. `mayHaveIt` is called
+    /// before the step from which on the other side may act; not by a carrier under whose keys anything can
+    /// be handed over again, where it replaces what is there.
+    virtual Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) = 0;
     /// Tries the other side without sending anything, and says in one line what it offers. Throws
     /// std::exception with one line.
     virtual std::string test() = 0;

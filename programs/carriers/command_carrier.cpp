@@ -74,18 +74,26 @@ std::vector<std::string> CommandCarrier::argumentsFor(Parcel const& parcel) cons
     return arguments;
 }
 
-Outcome CommandCarrier::handOver(Parcel const& parcel) {
+std::string CommandCarrier::inputFor(Parcel const& parcel) const {
+    return settings_.text.empty() ? parcel.document
+                                  : filledIn(settings_.text, parcel.letters.front(), parcel.mailing);
+}
+
+Outcome CommandCarrier::handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) {
     ProgramToRun program{settings_.program,
                          {},
                          settings_.user,
                          std::chrono::seconds(settings_.timeLimit),
                          static_cast<std::size_t>(settings_.outputLimit)};
+    std::string input;
     try {
         program.arguments = argumentsFor(parcel);
+        input = inputFor(parcel);
     } catch (Base::Error const& bad) {
         return {Outcome::Kind::Refused, bad.what()};
     }
-    return outcomeOf(run(program, parcel.document, fieldsInJson(parcel)), program);
+    mayHaveIt();
+    return outcomeOf(run(program, input, fieldsInJson(parcel)), program);
 }
 
 std::string CommandCarrier::test() {

@@ -11,12 +11,13 @@ class CommandCarrier : public Carrier {
 public:
     explicit CommandCarrier(Protocol::CarrierSettings settings);
 
-    bool isRepeatable() const override { return false; }
-    Outcome handOver(Parcel const& parcel) override;
+    Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
     std::string test() override;
 
 private:
     std::vector<std::string> argumentsFor(Parcel const& parcel) const;
+    /// What the program reads on standard input.
+    std::string inputFor(Parcel const& parcel) const;
 
     Protocol::CarrierSettings settings_;
 };

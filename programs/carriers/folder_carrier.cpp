@@ -60,7 +60,7 @@ void writeFile(fs::path const& target, std::string_view bytes) {
 
 FolderCarrier::FolderCarrier(fs::path folder) : folder_(std::move(folder)) {}
 
-Outcome FolderCarrier::handOver(Parcel const& parcel) {
+Outcome FolderCarrier::handOver(Parcel const& parcel, PutOnRecord const& /*mayHaveIt*/) {
     std::string const document = parcel.key + ".pdf";
     writeFile(folder_ / document, parcel.document);
     writeFile(folder_ / (parcel.key + ".csv"), controlCsv(parcel, document));

@@ -13,8 +13,7 @@ class FolderCarrier : public Carrier {
 public:
     explicit FolderCarrier(std::filesystem::path folder);
 
-    bool isRepeatable() const override { return true; }
-    Outcome handOver(Parcel const& parcel) override;
+    Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
     std::string test() override;
 
 private:

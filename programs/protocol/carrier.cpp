@@ -86,6 +86,7 @@ struct CarrierSettings::Keys {
         Asked{"time_limit", &CarrierSettings::timeLimit, IntegerForm{1, 3600}, 60LL},
         Asked{"output_limit", &CarrierSettings::outputLimit, IntegerForm{1, 1 << 20}, 65'536LL},
         Asked{"user", &CarrierSettings::user, TextForm{}},
+        Asked{"text", &CarrierSettings::text, TextForm{}},
     };
 };
 

@@ -62,6 +62,8 @@ struct CarrierSettings {
     long long outputLimit = 65'536;
     /// That the program runs as; empty for the service's.
     std::string user;
+    /// What the program reads in place of the document, with placeholders.
+    std::string text;
 
     CarrierSettings() = default;
     /// Throws Error on a type that there is not, an unknown key, one that is missing, and a bad value.

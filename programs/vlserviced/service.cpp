@@ -21,6 +21,7 @@
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/platform/log.h"
 
+#include <boost/asio/executor_work_guard.hpp>
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/ip/address.hpp>
 #include <boost/asio/ip/host_name.hpp>
@@ -33,9 +34,12 @@
 #include <chrono>
 #include <csignal>
 #include <ctime>
+#include <functional>
+#include <future>
 #include <map>
 #include <new>
 #include <optional>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -180,7 +184,10 @@ public:
             discovery_.emplace(io_, announcedHost(options), server_->port(), tokenFor(options, data_));
     }
 
-    ~Impl() { endThreads(); }
+    ~Impl() {
+        endThreads();
+        carrierThreads_.end();
+    }
 
     Channel::Server const& server() const { return *server_; }
 
@@ -203,8 +210,7 @@ public:
         runHandlers();
         // What the worker has finished by now goes on record; the rest is taken up at the next start.
         endThreads();
-        io_.restart();
-        runHandlers();
+        endCarriers();
     }
 
     void stopFromAnywhere() {
@@ -217,7 +223,18 @@ private:
             threads->stop();
             threads->join();
         }
-        carrierThreads_.end();
+    }
+
+    /// What carriers have begun they finish, and put on record meanwhile.
+    void endCarriers() {
+        io_.restart();
+        auto guard = asio::make_work_guard(io_);
+        std::thread ending([&] {
+            carrierThreads_.end();
+            guard.reset();
+        });
+        runHandlers();
+        ending.join();
     }
 
     void recogniseUploadFolder() {
@@ -370,6 +387,14 @@ private:
         });
     }
 
+    /// Called from other threads, which wait for it.
+    void doOnOwnThread(LetterSurroundings::Work const& work) {
+        std::packaged_task<void()> task(work);
+        std::future<void> done = task.get_future();
+        asio::post(io_, std::move(task));
+        done.get();
+    }
+
     JobSurroundings surroundings() {
         return {[this](JobSurroundings::Work work) { runOn(worker_, std::move(work)); },
                 [this](JobSurroundings::Work work) { runOn(reader_, std::move(work)); },
@@ -393,7 +418,9 @@ private:
 
     LetterSurroundings letterSurroundings() {
         return {[this](std::string const& channel, std::size_t atOnce, LetterSurroundings::Work work) {
-                    runOn(carrierThreads_.of(channel, atOnce), std::move(work));
+                    // What waits is taken up at the next start.
+                    if (!isStopping_)
+                        runOn(carrierThreads_.of(channel, atOnce), std::move(work));
                 },
                 [this](LetterSurroundings::Work work) { runOn(reader_, std::move(work)); },
                 [this](LetterSurroundings::Work work) { asio::post(io_, std::move(work)); },
@@ -403,7 +430,8 @@ private:
                 &Base::localOffset,
                 &Carriers::makeCarrier,
                 [this](std::string const& packId) { runner_.onLettersTaken(packId); },
-                [this] { awaitLetters(); }};
+                [this] { awaitLetters(); },
+                [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); }};
     }
 
     ReceptionSurroundings receptionSurroundings() {

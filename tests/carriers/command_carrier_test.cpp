@@ -38,7 +38,8 @@ protected:
         std::ofstream(settings_.program)
             << "#!/bin/sh\ncd '" + folder_.path().string() + "'\n" + script + "\n";
         fs::permissions(settings_.program, fs::perms::owner_all);
-        return Carriers::CommandCarrier(settings_).handOver(parcel_);
+        return Carriers::CommandCarrier(settings_).handOver(
+            parcel_, [this] { std::ofstream(folder_ / "record") << fs::exists(folder_ / "ran"); });
     }
     std::string told(std::string const& script, std::vector<std::string> const& arguments = {}) {
         constexpr char const* KINDS[] = {"accepted", "refused", "failed", "uncertain"};
@@ -83,6 +84,27 @@ TEST_F(CommandCarrierTest, GivesTheDocumentAndTheFields) {
     EXPECT_THAT(fileText("environment"), testing::Not(testing::HasSubstr("HOME=")));
 }
 
+TEST_F(CommandCarrierTest, GivesATextWhereTheSettingsHaveOne) {
+    settings_.text = "Invoice {id}: {text} {key}, {}\nYours";
+    parcel_ = smsOf("+49 30 1", "due {key}\r\ntoday");
+    handOver("cat >document");
+    EXPECT_EQ(fileText("document"), "Invoice p1: due {key}  today p1-2, {}\nYours");
+    settings_.text = "{fax}";
+    EXPECT_EQ(told("touch ran"), "refused: the letter has no field \"fax\", which its carrier needs");
+    EXPECT_FALSE(fs::exists(folder_ / "ran"));
+}
+
+TEST_F(CommandCarrierTest, PutsOnRecordThatTheOtherSideMayHaveTheLetterBeforeTheProgramRuns) {
+    EXPECT_EQ(told("touch ran"), "accepted: ");
+    EXPECT_EQ(fileText("record"), "0");
+    fs::remove(folder_ / "ran");
+    Carriers::CommandCarrier carrier(settings_);
+    EXPECT_EQ(
+        failureOf([&] { carrier.handOver(parcel_, [] { throw std::runtime_error("the disk is full"); }); }),
+        "the disk is full");
+    EXPECT_FALSE(fs::exists(folder_ / "ran"));
+}
+
 TEST_F(CommandCarrierTest, KeepsEachArgumentOne) {
     parcel_ = smsOf("+49 30 1", "two words; rm -rf \"$HOME\" {key}\nline");
     handOver("for a; do echo \"[$a]\"; done >arguments",
@@ -125,12 +147,12 @@ TEST_F(CommandCarrierTest, IsNotHeldUpByWhatItLeavesBehind) {
 TEST_F(CommandCarrierTest, FailsWhereTheProgramCannotBeRun) {
     settings_.program = (folder_ / "gone").string();
     Carriers::CommandCarrier carrier(settings_);
-    EXPECT_EQ(failureOf([&] { carrier.handOver(parcel_); }),
+    EXPECT_EQ(failureOf([&] { carrier.handOver(parcel_, [] {}); }),
               "cannot start " + settings_.program + ": No such file or directory");
     EXPECT_EQ(failureOf([&] { carrier.test(); }),
               "there is no program " + settings_.program + " that may be run");
     settings_.user = "no such user";
-    EXPECT_EQ(failureOf([&] { Carriers::CommandCarrier(settings_).handOver(parcel_); }),
+    EXPECT_EQ(failureOf([&] { Carriers::CommandCarrier(settings_).handOver(parcel_, [] {}); }),
               "there is no user no such user that a program could run as");
 }
 
@@ -141,7 +163,7 @@ TEST_F(CommandCarrierTest, RunsAsAnotherUserWhereItIsTold) {
     fs::permissions(folder_.path(), fs::perms::all);
     settings_.program = "/usr/bin/id";
     settings_.arguments = {"-un"};
-    EXPECT_EQ(Carriers::CommandCarrier(settings_).handOver(parcel_).says, "nobody");
+    EXPECT_EQ(Carriers::CommandCarrier(settings_).handOver(parcel_, [] {}).says, "nobody");
 }
 
 } // namespace

@@ -40,6 +40,9 @@ Carriers::Parcel parcelOf(std::string const& key, std::vector<std::string> const
     return parcel;
 }
 
+/// What can be handed over again is put on record afterwards alone.
+void noRecord() { ADD_FAILURE() << "was put on record before"; }
+
 std::set<std::string> namesIn(fs::path const& folder) {
     std::set<std::string> names;
     for (fs::directory_entry const& entry : fs::directory_iterator(folder))
@@ -50,7 +53,7 @@ std::set<std::string> namesIn(fs::path const& folder) {
 TEST(FolderCarrier, WritesADocumentAndTwoControlFilesUnderTheKey) {
     TemporaryFolder const folder;
     Carriers::FolderCarrier carrier(folder.path());
-    Carriers::Outcome const outcome = carrier.handOver(parcelOf("p1-1", {"Ada\nLong St 1"}));
+    Carriers::Outcome const outcome = carrier.handOver(parcelOf("p1-1", {"Ada\nLong St 1"}), noRecord);
     EXPECT_EQ(outcome.kind, Carriers::Outcome::Kind::Accepted);
     EXPECT_EQ(outcome.says, "in " + folder.path().string());
     EXPECT_THAT(namesIn(folder.path()), ElementsAre("p1-1.csv", "p1-1.json", "p1-1.pdf"));
@@ -67,10 +70,10 @@ TEST(FolderCarrier, WritesADocumentAndTwoControlFilesUnderTheKey) {
 TEST(FolderCarrier, ReplacesWhatItHandedOverBeforeUnderTheKey) {
     TemporaryFolder const folder;
     Carriers::FolderCarrier carrier(folder.path());
-    carrier.handOver(parcelOf("p1-1", {"Ada"}));
+    carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord);
     fs::remove(folder / "p1-1.json");
     fs::create_symlink("/etc/passwd", folder / "p1-1.json");
-    carrier.handOver(parcelOf("p1-1", {"Bert"}));
+    carrier.handOver(parcelOf("p1-1", {"Bert"}), noRecord);
     EXPECT_EQ(namesIn(folder.path()).size(), 3U);
     EXPECT_FALSE(fs::is_symlink(folder / "p1-1.json"));
     EXPECT_THAT(Base::readFile(folder / "p1-1.json"), HasSubstr("Bert"));
@@ -81,7 +84,7 @@ TEST(FolderCarrier, FailsWhereTheFolderIsGone) {
     Carriers::FolderCarrier carrier(folder / "gone");
     std::string const text =
         "cannot write into " + (folder / "gone").string() + ": No such file or directory";
-    EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"})); }), text);
+    EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord); }), text);
     EXPECT_EQ(failureOf([&] { carrier.test(); }), text);
 }
 
@@ -92,7 +95,7 @@ TEST(FolderCarrier, LeavesNothingHalfOnAFullDisk) {
     Carriers::FolderCarrier carrier(disk.path());
     Carriers::Parcel parcel = parcelOf("p1-1", {"Ada"});
     parcel.document.assign(100'000, 'x');
-    EXPECT_THAT(failureOf([&] { carrier.handOver(parcel); }), HasSubstr("No space left on device"));
+    EXPECT_THAT(failureOf([&] { carrier.handOver(parcel, noRecord); }), HasSubstr("No space left on device"));
     EXPECT_THAT(namesIn(disk.path()), ElementsAre());
 }
 

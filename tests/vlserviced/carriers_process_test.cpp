@@ -175,8 +175,7 @@ private:
 class CommandedLetters : public CarriedLetters {
 public:
     CommandedLetters() {
-        std::ofstream(program_) << "#!/bin/sh\necho $1 >>'" + (folder_ / "had").string() + "'\n";
-        fs::permissions(program_, fs::perms::owner_all);
+        setProgram("echo $1 >>had");
         storeLetters(folder_ / "sms.db", "s1", {"sms", "sms", "sms", "sms"});
     }
 
@@ -198,18 +197,46 @@ public:
         return !survived;
     }
 
+    /// Ends the service while the program has the first letter.
+    void endWithALetterOnItsWay() {
+        setProgram("echo $1 >>had; until [ -e go ]; do :; done");
+        ServiceProcess service(arguments());
+        auto const client = clientOf(service, data_);
+        begin(*client);
+        while (textOf(folder_ / "had").empty()) {
+        }
+        service.signal(SIGTERM);
+        std::ofstream(folder_ / "go").close();
+        EXPECT_EQ(service.wait(), 0);
+    }
+    void goOn() {
+        ServiceProcess const service(arguments());
+        EXPECT_TRUE(send(service));
+        EXPECT_EQ(told(*clientOf(service, data_)), "s1 lodged: accepted accepted accepted accepted\n");
+        EXPECT_EQ(textOf(folder_ / "had"), "s1-1\ns1-2\ns1-3\ns1-4\n");
+    }
+
 private:
     void TestBody() override {}
+
+    void setProgram(std::string const& script) {
+        std::ofstream(program_) << "#!/bin/sh\ncd '" + folder_.path().string() + "'\n" + script + '\n';
+        fs::permissions(program_, fs::perms::owner_all);
+    }
+
+    void begin(Channel::Client& client) {
+        json::Object const carrier{{"type", "command"},
+                                   {"program", program_.string()},
+                                   {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
+        client.call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{"sms", carrier}}}});
+        client.call<Ipc::ProcessPack>(folder_.path().string(), "sms.db", "s1");
+        client.call<Ipc::UploadQueued>(folder_.path().string(), "sms.db");
+    }
 
     bool send(ServiceProcess const& service) {
         try {
             auto const client = clientOf(service, data_);
-            json::Object const carrier{{"type", "command"},
-                                       {"program", program_.string()},
-                                       {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
-            client->call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{"sms", carrier}}}});
-            client->call<Ipc::ProcessPack>(folder_.path().string(), "sms.db", "s1");
-            client->call<Ipc::UploadQueued>(folder_.path().string(), "sms.db");
+            begin(*client);
             auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
             auto const isUnderWay = [&](std::string const& states) {
                 return states.find("accepted:") != std::string::npos ||
@@ -245,6 +272,12 @@ private:
 
     fs::path program_ = folder_ / "program";
 };
+
+TEST(ServiceThatIsEndedAmongLetters, FinishesThoseThatAreOnTheirWayAndPutsThemOnRecord) {
+    CommandedLetters letters;
+    letters.endWithALetterOnItsWay();
+    letters.goOn();
+}
 
 /// Every fourth call, from the parameter on.
 class ServiceThatIsKilledAmongLetters : public testing::TestWithParam<int> {};

@@ -57,6 +57,12 @@ std::vector<LetterId> LetterRunner::HandOver::ids() const {
     return ids;
 }
 
+void LetterRunner::HandOver::setBad(std::vector<BadLetter> const& found) {
+    bad = found;
+    for (BadLetter const& one : bad)
+        std::erase_if(letters, [&](StoredLetter const& letter) { return letter.id == one.id; });
+}
+
 LetterRunner::LetterRunner(LetterStore& letters, JobStore& jobs, LetterSurroundings surroundings)
     : letters_(letters), jobs_(jobs), surroundings_(std::move(surroundings)) {}
 
@@ -166,36 +172,36 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     handOver->source = sourceOf(letters.front().id.packId);
     handOver->letters = std::move(letters);
     handOver->carrier = idleOrNew(channel);
-    // Whoever finds it so on record cannot know whether the other side has it.
-    if (!handOver->carrier->isRepeatable())
-        letters_.beginHandingOver(handOver->ids(), surroundings_.now());
     for (StoredLetter const& letter : handOver->letters)
         channel.inHand.insert(letter.id);
     ++channel.busy;
     channel.rate.add(surroundings_.now());
-    surroundings_.onCarrier(name, static_cast<std::size_t>(channel.settings.atOnce),
-                            [this, handOver, onOwnThread = surroundings_.onOwnThread] {
-                                carryOut(*handOver);
-                                onOwnThread([this, handOver] { onDone(handOver); });
-                            });
+    surroundings_.onCarrier(
+        name, static_cast<std::size_t>(channel.settings.atOnce),
+        [this, handOver, onOwnThread = surroundings_.onOwnThread,
+         doneOnOwnThread = surroundings_.doneOnOwnThread] {
+            // Whoever finds them so on record cannot know whether the other side has them.
+            carryOut(*handOver, [&] {
+                doneOnOwnThread([&] { letters_.beginHandingOver(handOver->ids(), surroundings_.now()); });
+            });
+            onOwnThread([this, handOver] { onDone(handOver); });
+        });
 }
 
-void LetterRunner::carryOut(HandOver& handOver) {
+void LetterRunner::carryOut(HandOver& handOver, Carriers::PutOnRecord const& mayHaveThem) {
     handOver.isCarriersFault = false;
     try {
         MadeParcel const made = handOver.source->parcelOf(handOver.letters, handOver.key);
-        handOver.bad = made.bad;
+        handOver.setBad(made.bad);
         handOver.isCarriersFault = true;
         if (!made.parcel.letters.empty())
-            handOver.outcome = handOver.carrier->handOver(made.parcel);
+            handOver.outcome = handOver.carrier->handOver(made.parcel, mayHaveThem);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const& failure) {
         handOver.outcome = {Outcome::Kind::Failed, failure.what()};
     }
     handOver.outcome.says = Base::oneLine(handOver.outcome.says);
-    for (BadLetter const& bad : handOver.bad)
-        std::erase_if(handOver.letters, [&](StoredLetter const& letter) { return letter.id == bad.id; });
 }
 
 void LetterRunner::onDone(std::shared_ptr<HandOver> const& handOver) {

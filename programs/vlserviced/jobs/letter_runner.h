@@ -42,6 +42,9 @@ struct LetterSurroundings {
     std::function<void(std::string const& packId)> taken = [](std::string const&) {};
     /// Told whenever nextTime() may be another.
     std::function<void()> proceeded = [] {};
+    /// Runs work on the runner's own thread and returns when it is done, with what it throws; called from the
+    /// threads of carriers.
+    std::function<void(Work const&)> doneOnOwnThread = [](Work const& work) { work(); };
 };
 
 /// Used by one thread; the work it hands to carriers touches nothing of it.
@@ -99,6 +102,8 @@ private:
         bool isCarriersFault = true;
 
         std::vector<LetterId> ids() const;
+        /// Takes them from the letters.
+        void setBad(std::vector<BadLetter> const& found);
     };
 
     Channel& channelOf(std::string const& name, Protocol::CarrierSettings const& settings);
@@ -111,7 +116,7 @@ private:
                                           long long by) const;
     std::vector<StoredLetter> next(std::string const& name, Channel const& channel) const;
     void start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters);
-    static void carryOut(HandOver& handOver);
+    static void carryOut(HandOver& handOver, Carriers::PutOnRecord const& mayHaveThem);
     CarrierPtr idleOrNew(Channel& channel) const;
     void onDone(std::shared_ptr<HandOver> const& handOver);
     /// What cannot be put on record is kept and tried again.

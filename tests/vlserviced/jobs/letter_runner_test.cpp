@@ -32,17 +32,24 @@ using VlServiced::LetterState;
 struct OtherSide {
     std::vector<std::string> taken;
     bool isRepeatable = true;
+    /// The key under which something is on its way when the process ends.
+    std::string last;
     std::map<std::string, Outcome> answers;
     /// What all are told that have no answer of their own.
     std::optional<Outcome> answer;
 };
 
+struct EndOfProcess {};
+
 class FakeCarrier : public Carriers::Carrier {
 public:
     explicit FakeCarrier(OtherSide& other) : other_(other) {}
 
-    bool isRepeatable() const override { return other_.isRepeatable; }
-    Outcome handOver(Parcel const& parcel) override {
+    Outcome handOver(Parcel const& parcel, Carriers::PutOnRecord const& mayHaveIt) override {
+        if (!other_.isRepeatable)
+            mayHaveIt();
+        if (parcel.key == other_.last)
+            throw EndOfProcess();
         other_.taken.push_back(parcel.key);
         if (auto const own = other_.answers.find(parcel.key); own != other_.answers.end())
             return own->second;
@@ -463,9 +470,13 @@ TEST_F(LetterRunnerTest, SendsALetterAgainWhenAPersonWantsIt) {
 TEST_F(LetterRunnerTest, NeverSendsALetterAgainByItselfThatTheOtherSideMayHave) {
     other_.isRepeatable = false;
     send("p1", {"postal", "postal", "postal"});
+    other_.last = "p1-2";
     doOne();
     EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_EQ(state("p1", 2), "waiting");
+    EXPECT_THROW(doOne(), EndOfProcess);
     EXPECT_EQ(state("p1", 2), "handed over");
+    other_.last.clear();
     restart();
     EXPECT_EQ(state("p1", 2), "uncertain: the service was ended while it was handed over");
     doWork();
