@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <fcntl.h>
 #include <grp.h>
+#include <linux/close_range.h>
 #include <poll.h>
 #include <pwd.h>
 #include <sys/mman.h>
@@ -94,7 +95,7 @@ struct Child {
         ::signal(SIGPIPE, SIG_DFL);
         int const nowhere = ::open("/dev/null", O_WRONLY | O_CLOEXEC);
         return ::dup2(input, 0) == 0 && ::dup2(output, 1) == 1 && ::dup2(nowhere, 2) == 2 &&
-               ::dup2(more, 3) == 3;
+               ::dup2(more, 3) == 3 && ::close_range(4, ~0U, CLOSE_RANGE_CLOEXEC) == 0;
     }
 };
 

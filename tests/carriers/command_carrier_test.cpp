@@ -8,7 +8,9 @@
 
 #include <chrono>
 #include <csignal>
+#include <fcntl.h>
 #include <fstream>
+#include <unistd.h>
 
 namespace {
 
@@ -77,7 +79,11 @@ TEST_F(CommandCarrierTest, TellsByItsStatusAndItsFirstLineWhatBecameOfTheLetter)
 }
 
 TEST_F(CommandCarrierTest, GivesTheDocumentAndTheFields) {
-    handOver("cat >document; cat <&3 >fields; env >environment");
+    int const ofTheService = ::fcntl(0, F_DUPFD, 200);
+    handOver("cat >document; cat <&3 >fields; env >environment; [ -e /proc/self/fd/" +
+             std::to_string(ofTheService) + " ] && touch ran");
+    ::close(ofTheService);
+    EXPECT_FALSE(fs::exists(folder_ / "ran"));
     EXPECT_EQ(fileText("document"), "%PDF of p1-2");
     EXPECT_EQ(fileText("fields"), R"({"key":"p1-2","id":"p1","address":"+49 30 1","pages":1,)"
                                   R"("fields":{"sms":"+49 30 1","text":"Hello"}})");
@@ -136,11 +142,12 @@ TEST_F(CommandCarrierTest, IsEndedWithItsGroupWhenItHangs) {
 TEST_F(CommandCarrierTest, IsEndedWhenItFloods) {
     settings_.outputLimit = 1000;
     EXPECT_EQ(told("exec yes"), "uncertain: PROGRAM wrote more than 1000 bytes and was ended");
-    EXPECT_EQ(told("yes >&2 & exit 0"), "accepted: ");
+    EXPECT_EQ(told("yes >&2 & echo $! >child; exit 0"), "accepted: ");
+    ::kill(std::stoi(fileText("child")), SIGKILL);
 }
 
 TEST_F(CommandCarrierTest, IsNotHeldUpByWhatItLeavesBehind) {
-    EXPECT_EQ(told("(sleep 1000; echo late) & echo $! >child; echo done"), "accepted: done");
+    EXPECT_EQ(told("sleep 1000 & echo $! >child; echo done"), "accepted: done");
     ::kill(std::stoi(fileText("child")), SIGKILL);
 }
 
