@@ -38,6 +38,15 @@ std::string onOneLine(std::string const& text) {
 
 } // namespace
 
+void forEachFile(
+    Parcel const& parcel,
+    std::function<void(std::string const& name, std::string_view bytes, bool isLast)> const& write) {
+    std::string const document = parcel.key + ".pdf";
+    write(document, parcel.document, false);
+    write(parcel.key + ".csv", controlCsv(parcel, document), false);
+    write(parcel.key + ".json", controlJson(parcel, document), true);
+}
+
 std::string csvField(std::string const& text) {
     std::string field = onOneLine(text);
     if (!field.empty() && std::string_view("=+-@").find(field.front()) != std::string_view::npos)

@@ -1,11 +1,18 @@
 #pragma once
-// What a print shop is told of a file with letters.
+// What a print shop gets of letters: a file with their pages, and what it is told of that file.
 
 #include "programs/carriers/carrier.h"
 
+#include <functional>
 #include <string>
+#include <string_view>
 
 namespace Carriers {
+
+/// Calls `write` for KEY.pdf, KEY.csv and last KEY.json: whoever finds the last one is to find the others.
+void forEachFile(
+    Parcel const& parcel,
+    std::function<void(std::string const& name, std::string_view bytes, bool isLast)> const& write);
 
 /// One object; docs/carriers.md has its keys. `file` is the name of the PDF.
 std::string controlJson(Parcel const& parcel, std::string const& file);

@@ -8,7 +8,7 @@ namespace Carriers {
 std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) {
     switch (settings.type) {
     case Protocol::CarrierType::Folder:
-        return std::make_unique<FolderCarrier>(settings.folder);
+        return std::make_unique<FolderCarrier>(settings.folder, settings.folderIdentity);
     case Protocol::CarrierType::Command:
         return std::make_unique<CommandCarrier>(settings);
     }

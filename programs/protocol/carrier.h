@@ -49,6 +49,8 @@ struct CarrierSettings {
     std::string hours;
 
     std::string folder;
+    /// Which of all folders of that name it is, as the service has it on record; no key.
+    std::string folderIdentity;
     /// "letter" or "mailing".
     std::string unit = "letter";
 

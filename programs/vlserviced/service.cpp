@@ -179,7 +179,7 @@ public:
         });
         removeUnfinished(outbox_);
         removeUnfinished(outbox_ / JobRunner::REST_FOLDER);
-        recogniseUploadFolder();
+        recogniseFolders();
         if (options.answersDiscovery)
             discovery_.emplace(io_, announcedHost(options), server_->port(), tokenFor(options, data_));
     }
@@ -237,8 +237,9 @@ private:
         ending.join();
     }
 
-    void recogniseUploadFolder() {
+    void recogniseFolders() {
         try {
+            settings_.recogniseCarrierFolders();
             settings_.recogniseUploadFolder();
         } catch (std::exception const& failure) {
             Log::Lock(4).logStreamLine() << "The upload folder is not known yet. " << failure.what();

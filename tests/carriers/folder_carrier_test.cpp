@@ -47,12 +47,18 @@ std::set<std::string> namesIn(fs::path const& folder) {
     std::set<std::string> names;
     for (fs::directory_entry const& entry : fs::directory_iterator(folder))
         names.insert(entry.path().filename().string());
+    names.erase(Base::MarkedFolder::MARK_FILE);
     return names;
+}
+
+/// Knows the folder as it is.
+Carriers::FolderCarrier carrierOf(fs::path const& folder) {
+    return {folder, Carriers::identityOfFolder(folder)};
 }
 
 TEST(FolderCarrier, WritesADocumentAndTwoControlFilesUnderTheKey) {
     TemporaryFolder const folder;
-    Carriers::FolderCarrier carrier(folder.path());
+    Carriers::FolderCarrier carrier = carrierOf(folder.path());
     Carriers::Outcome const outcome = carrier.handOver(parcelOf("p1-1", {"Ada\nLong St 1"}), noRecord);
     EXPECT_EQ(outcome.kind, Carriers::Outcome::Kind::Accepted);
     EXPECT_EQ(outcome.says, "in " + folder.path().string());
@@ -69,7 +75,7 @@ TEST(FolderCarrier, WritesADocumentAndTwoControlFilesUnderTheKey) {
 
 TEST(FolderCarrier, ReplacesWhatItHandedOverBeforeUnderTheKey) {
     TemporaryFolder const folder;
-    Carriers::FolderCarrier carrier(folder.path());
+    Carriers::FolderCarrier carrier = carrierOf(folder.path());
     carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord);
     fs::remove(folder / "p1-1.json");
     fs::create_symlink("/etc/passwd", folder / "p1-1.json");
@@ -81,18 +87,49 @@ TEST(FolderCarrier, ReplacesWhatItHandedOverBeforeUnderTheKey) {
 
 TEST(FolderCarrier, FailsWhereTheFolderIsGone) {
     TemporaryFolder const folder;
-    Carriers::FolderCarrier carrier(folder / "gone");
+    fs::create_directory(folder / "gone");
+    Carriers::FolderCarrier carrier = carrierOf(folder / "gone");
+    fs::remove_all(folder / "gone");
     std::string const text =
-        "cannot write into " + (folder / "gone").string() + ": No such file or directory";
+        "there is no folder " + (folder / "gone").string() + ": No such file or directory";
     EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord); }), text);
     EXPECT_EQ(failureOf([&] { carrier.test(); }), text);
+}
+
+TEST(FolderCarrier, WritesNothingWhereAShareIsNotMounted) {
+    TemporaryFolder const folder;
+    fs::path const shop = folder / "shop";
+    fs::create_directory(shop);
+    Carriers::FolderCarrier carrier = carrierOf(shop);
+    std::string const mark = Base::readFile(shop / ".vlserviced");
+    fs::rename(shop, folder / "unmounted");
+    fs::create_directory(shop);
+    std::string const text = "the folder " + shop.string() +
+                             " is another one than before: mount the one whose file .vlserviced reads " +
+                             mark;
+    EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord); }), text);
+    EXPECT_EQ(failureOf([&] { carrier.test(); }), text);
+    EXPECT_TRUE(fs::is_empty(shop));
+    fs::remove(shop);
+    fs::rename(folder / "unmounted", shop);
+    EXPECT_EQ(carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord).kind, Carriers::Outcome::Kind::Accepted);
+}
+
+TEST(FolderCarrier, WritesNothingIntoAFolderThatNobodyKnows) {
+    TemporaryFolder const folder;
+    Carriers::FolderCarrier carrier(folder.path(), {});
+    std::string const text =
+        "the folder " + folder.path().string() +
+        " could not be written into when it was set: set \"carriers\" once more when it can";
+    EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord); }), text);
+    EXPECT_TRUE(fs::is_empty(folder.path()));
 }
 
 TEST(FolderCarrier, LeavesNothingHalfOnAFullDisk) {
     VLServiceTest::SmallDisk const disk;
     if (!disk.whyNot().empty())
         GTEST_SKIP() << disk.whyNot();
-    Carriers::FolderCarrier carrier(disk.path());
+    Carriers::FolderCarrier carrier = carrierOf(disk.path());
     Carriers::Parcel parcel = parcelOf("p1-1", {"Ada"});
     parcel.document.assign(100'000, 'x');
     EXPECT_THAT(failureOf([&] { carrier.handOver(parcel, noRecord); }), HasSubstr("No space left on device"));
@@ -101,7 +138,7 @@ TEST(FolderCarrier, LeavesNothingHalfOnAFullDisk) {
 
 TEST(FolderCarrier, SaysWhatRoomThereIsAndLeavesNothing) {
     TemporaryFolder const folder;
-    EXPECT_THAT(Carriers::FolderCarrier(folder.path()).test(),
+    EXPECT_THAT(carrierOf(folder.path()).test(),
                 StartsWith(folder.path().string() + " can be written into and has room for "));
     EXPECT_THAT(namesIn(folder.path()), ElementsAre());
 }

@@ -5,12 +5,8 @@
 #include "vlservice/json/json_text.h"
 #include "vlservice/platform/log.h"
 
-#include <cerrno>
 #include <fcntl.h>
 #include <sys/stat.h>
-#include <system_error>
-#include <unistd.h>
-#include <utility>
 #include <vector>
 
 namespace VlServiced {
@@ -22,36 +18,7 @@ namespace fs = std::filesystem;
 constexpr std::size_t MAX_REPORT_BYTES = 64 << 10;
 constexpr std::size_t COPY_BYTES = 1 << 20;
 
-std::string temporaryOf(std::string const& name) { return "." + name + ".part"; }
 std::string reportOf(std::string const& name) { return name + ".status"; }
-
-[[noreturn]] void fail(std::string const& what) {
-    throw std::system_error(errno, std::generic_category(), what);
-}
-
-void syncFolder(UploadFolder const& folder) {
-    if (::fsync(folder.descriptor()) != 0)
-        fail("cannot sync " + folder.path().string());
-}
-
-bool isThere(UploadFolder const& folder, std::string const& name) {
-    struct stat status {};
-    if (::fstatat(folder.descriptor(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0)
-        return true;
-    if (errno != ENOENT)
-        fail("cannot look for " + (folder.path() / name).string());
-    return false;
-}
-
-/// A new file: whatever had its name, a link to some other file say, is gone and was not written to.
-Base::FileDescriptor newFileIn(UploadFolder const& folder, std::string const& name) {
-    ::unlinkat(folder.descriptor(), name.c_str(), 0);
-    int const file = ::openat(folder.descriptor(), name.c_str(),
-                              O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600);
-    if (file < 0)
-        fail("cannot write " + (folder.path() / name).string());
-    return {file, folder.path() / name};
-}
 
 mode_t modeOf(Base::FileDescriptor const& file) {
     struct stat status {};
@@ -63,39 +30,35 @@ mode_t modeOf(Base::FileDescriptor const& file) {
 
 void stage(fs::path const& container, UploadFolder const& folder) {
     Base::FileDescriptor source(container, O_RDONLY);
-    Base::FileDescriptor target = newFileIn(folder, temporaryOf(container.filename().string()));
+    Base::FileDescriptor target = folder.newFile(Base::temporaryOf(container.filename().string()), 0600);
     std::vector<char> buffer(COPY_BYTES);
     while (std::size_t const size = source.read(buffer.data(), buffer.size()))
         target.writeAll({buffer.data(), size});
     ::fchmod(target.number(), modeOf(source) & 0777);
     target.sync();
     target.close();
-    syncFolder(folder);
+    folder.sync();
 }
 
 void discardHandedOver(std::string const& name, UploadFolder const& folder) {
     for (std::string const& file : {name, reportOf(name)})
-        if (::unlinkat(folder.descriptor(), file.c_str(), 0) != 0 && errno != ENOENT)
-            fail("cannot remove " + (folder.path() / file).string());
-    syncFolder(folder);
+        folder.removeIfThere(file);
+    folder.sync();
 }
 
 void unstage(std::string const& name, UploadFolder const& folder) {
-    std::string const temporary = temporaryOf(name);
-    if (::unlinkat(folder.descriptor(), temporary.c_str(), 0) != 0 && errno != ENOENT)
-        fail("cannot remove " + (folder.path() / temporary).string());
+    folder.removeIfThere(Base::temporaryOf(name));
 }
 
 void publish(std::string const& name, UploadFolder const& folder) {
-    std::string const temporary = temporaryOf(name);
-    if (!isThere(folder, temporary))
+    std::string const temporary = Base::temporaryOf(name);
+    if (!folder.has(temporary))
         return;
-    if (::renameat(folder.descriptor(), temporary.c_str(), folder.descriptor(), name.c_str()) != 0)
-        fail("cannot write " + (folder.path() / name).string());
-    syncFolder(folder);
+    folder.rename(temporary, name);
+    folder.sync();
 }
 
-bool liesIn(UploadFolder const& folder, std::string const& name) { return isThere(folder, name); }
+bool liesIn(UploadFolder const& folder, std::string const& name) { return folder.has(name); }
 
 std::optional<CarrierReport> carrierReport(UploadFolder const& folder, std::string const& name) {
     std::string const file = reportOf(name);

@@ -14,6 +14,8 @@ namespace {
 using Values = Protocol::ServiceSettings;
 
 constexpr char const* FOLDER_IDENTITY = "upload_folder_identity";
+/// An object of channels.
+constexpr char const* CARRIER_FOLDERS = "carrier_folder_identities";
 
 void checkUploadFolder(json::Value const& value) {
     std::filesystem::path const folder = value.textOrEmpty();
@@ -102,30 +104,52 @@ void checkChange(std::string const& key, json::Value const& value) {
         checkValue(key, value);
 }
 
+json::Object without(char const* key, json::Object const& settings) {
+    json::Object less;
+    for (auto const& [name, value] : settings)
+        if (name != std::string_view(key))
+            less.set(name, value);
+    return less;
+}
+
 } // namespace
 
 ServiceSettings::ServiceSettings(json::Object stored)
     : stored_(std::move(stored)), values_(stored_),
       disabled_(values_.disabled.begin(), values_.disabled.end()) {}
 
-json::Object ServiceSettings::told() const { return without(FOLDER_IDENTITY); }
+json::Object ServiceSettings::told() const {
+    return without(FOLDER_IDENTITY, without(CARRIER_FOLDERS, stored_));
+}
 
 std::string ServiceSettings::uploadFolderIdentity() const {
     return stored_.get(FOLDER_IDENTITY).textOrEmpty();
 }
 
-json::Object ServiceSettings::without(char const* key) const {
-    json::Object less;
-    for (auto const& [name, value] : stored_)
-        if (name != std::string_view(key))
-            less.set(name, value);
-    return less;
+Protocol::Carriers ServiceSettings::carriers() const {
+    Protocol::Carriers carriers = Protocol::carriersIn(values_.carriers);
+    json::Value const identities = stored_.get(CARRIER_FOLDERS);
+    if (identities.isObject())
+        for (auto& [channel, settings] : carriers)
+            settings.folderIdentity = identities.toObject().get(channel).textOrEmpty();
+    return carriers;
 }
 
 ServiceSettings ServiceSettings::withFolderIdentity(std::string const& identity) const {
-    json::Object changed = without(FOLDER_IDENTITY);
+    json::Object changed = without(FOLDER_IDENTITY, stored_);
     if (!identity.empty())
         changed.set(FOLDER_IDENTITY, identity);
+    return ServiceSettings(std::move(changed));
+}
+
+ServiceSettings
+ServiceSettings::withCarrierFolders(std::map<std::string, std::string> const& identities) const {
+    json::Object changed = without(CARRIER_FOLDERS, stored_);
+    json::Object channels;
+    for (auto const& [channel, identity] : identities)
+        channels.set(channel, identity);
+    if (!channels.empty())
+        changed.set(CARRIER_FOLDERS, channels);
     return ServiceSettings(std::move(changed));
 }
 

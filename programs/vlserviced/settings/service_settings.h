@@ -6,6 +6,7 @@
 #include "programs/protocol/service_settings.h"
 #include "vlservice/json/json.h"
 
+#include <map>
 #include <optional>
 #include <string>
 #include <unordered_set>
@@ -25,12 +26,13 @@ public:
     json::Object told() const;
     /// Where finished containers are handed on; empty when nothing was set.
     std::string const& uploadFolder() const { return values_.uploadFolder; }
-    /// Which of all folders of that name it is, as FolderIdentity tells it; empty when that is not known.
+    /// Which of all folders of that name it is, as Base::FolderIdentity tells it; empty when that is not
+    /// known.
     std::string uploadFolderIdentity() const;
     /// Throws Error when there is none yet.
     Protocol::Tariff tariff() const;
     /// By their channels.
-    Protocol::Carriers carriers() const { return Protocol::carriersIn(values_.carriers); }
+    Protocol::Carriers carriers() const;
     /// Whether the node, or one above it, is among the disabled ones.
     bool isDisabled(std::string const& nodeId) const;
     bool isSuspended(Suspended what) const;
@@ -45,13 +47,12 @@ public:
     ServiceSettings withChanges(json::Object const& changes) const;
     /// The empty text is none.
     ServiceSettings withFolderIdentity(std::string const& identity) const;
+    /// Which folders those of the carriers are, by their channels.
+    ServiceSettings withCarrierFolders(std::map<std::string, std::string> const& identities) const;
     /// Throws Error when the number has bits that mean nothing.
     ServiceSettings withSuspended(int bits) const;
 
 private:
-    /// The settings less one key.
-    json::Object without(char const* key) const;
-
     json::Object stored_;
     Protocol::ServiceSettings values_;
     std::unordered_set<std::string> disabled_;

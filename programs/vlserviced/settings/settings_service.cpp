@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/local_offset.h"
+#include "programs/carriers/folder_carrier.h"
 #include "programs/policy/auto_presets.h"
 #include "programs/vlserviced/settings/parts.h"
 #include "programs/vlserviced/settings/preset_rules.h"
@@ -39,6 +40,33 @@ bool isNodeOf(std::string const& user, std::string const& id) {
 /// The empty text for no folder.
 std::string identityOf(std::string const& uploadFolder) {
     return uploadFolder.empty() ? std::string() : UploadFolder(uploadFolder, {}).identity().text();
+}
+
+/// The empty text for one that cannot be had.
+std::string identityOfCarriers(std::string const& folder) {
+    try {
+        return Carriers::identityOfFolder(folder);
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (std::exception const&) {
+        return {};
+    }
+}
+
+/// A folder that a channel had before stays the one that it was: an empty place where a share is to be
+/// mounted has the same name.
+std::map<std::string, std::string> carrierFolders(Protocol::Carriers const& carriers,
+                                                  Protocol::Carriers const& before) {
+    std::map<std::string, std::string> identities;
+    for (auto const& [channel, settings] : carriers) {
+        if (settings.folder.empty())
+            continue;
+        auto const former = before.find(channel);
+        bool const isKnown = former != before.end() && former->second.folder == settings.folder &&
+                             !former->second.folderIdentity.empty();
+        identities[channel] = isKnown ? former->second.folderIdentity : identityOfCarriers(settings.folder);
+    }
+    return identities;
 }
 
 } // namespace
@@ -164,6 +192,8 @@ void SettingsService::changeService(json::Object const& changes) {
     ServiceSettings changed = service().withChanges(changes);
     if (changes.get(Protocol::ServiceSettings::UPLOAD_FOLDER))
         changed = changed.withFolderIdentity(identityOf(changed.uploadFolder()));
+    if (changes.get(Protocol::ServiceSettings::CARRIERS))
+        changed = changed.withCarrierFolders(carrierFolders(changed.carriers(), service().carriers()));
     store_.setServiceSettings(changed.stored());
 }
 
@@ -171,6 +201,14 @@ void SettingsService::recogniseUploadFolder() {
     ServiceSettings const settings = service();
     if (!settings.uploadFolder().empty() && settings.uploadFolderIdentity().empty())
         store_.setServiceSettings(settings.withFolderIdentity(identityOf(settings.uploadFolder())).stored());
+}
+
+void SettingsService::recogniseCarrierFolders() {
+    ServiceSettings const settings = service();
+    Protocol::Carriers const carriers = settings.carriers();
+    ServiceSettings const known = settings.withCarrierFolders(carrierFolders(carriers, carriers));
+    if (known.carriers() != carriers)
+        store_.setServiceSettings(known.stored());
 }
 
 void SettingsService::suspend(int bits) { store_.setServiceSettings(service().withSuspended(bits).stored()); }

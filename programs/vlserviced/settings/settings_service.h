@@ -63,11 +63,14 @@ public:
     void requireChangeable() const;
 
     ServiceSettings service() const;
-    /// An upload folder gets a mark, and its identity goes on record with it.
+    /// The folders of uploads and carriers get marks, and their identities go on record with them. A
+    /// carrier's folder that was set before stays the one that it was.
     void changeService(json::Object const& changes);
     /// Puts the identity of the upload folder on record when it is not. Throws std::exception when the folder
     /// is not there.
     void recogniseUploadFolder();
+    /// The same for those of carriers, as far as they are there.
+    void recogniseCarrierFolders();
     /// Works while changes are held back: it is what lifts that.
     void suspend(int bits);
 

@@ -192,6 +192,42 @@ TEST_F(SettingsServiceTest, RecognisesAnUploadFolderThatWasSetWithoutAnIdentity)
     EXPECT_EQ(service_.service().uploadFolderIdentity(), identity) << "what is on record stays";
 }
 
+TEST_F(SettingsServiceTest, PutsTheIdentitiesOfCarriersFoldersOnRecord) {
+    TemporaryFolder const folder;
+    fs::path const shop = folder / "shop";
+    auto const identity = [&] { return service_.service().carriers().at("postal").folderIdentity; };
+    auto const set = [&](int perMinute) {
+        json::Object const postal{{"type", "folder"}, {"folder", shop.string()}, {"per_minute", perMinute}};
+        service_.changeService({{"carriers", json::Object{{"postal", postal}}}});
+    };
+    set(1);
+    EXPECT_EQ(identity(), "") << "there is no such folder yet";
+    fs::create_directory(shop);
+    set(1);
+    std::string const known = identity();
+    EXPECT_EQ(known, VlServiced::UploadFolder(shop, {}).identity().text());
+    EXPECT_FALSE(service_.service().told().get("carrier_folder_identities"));
+    fs::rename(shop, folder / "unmounted");
+    fs::create_directory(shop);
+    set(2);
+    service_.recogniseCarrierFolders();
+    EXPECT_EQ(identity(), known) << "what is on record stays";
+    EXPECT_TRUE(fs::is_empty(shop));
+    service_.changeService(parse(R"({"carriers":null})"));
+    set(1);
+    EXPECT_NE(identity(), known) << "it was taken out and set again";
+}
+
+TEST_F(SettingsServiceTest, RecognisesCarriersFoldersThatWereSetWithoutAnIdentity) {
+    TemporaryFolder const shop;
+    json::Object const postal{{"type", "folder"}, {"folder", shop.path().string()}};
+    json::Object const gone{{"type", "folder"}, {"folder", (shop / "gone").string()}};
+    store_.setServiceSettings({{"carriers", json::Object{{"postal", postal}, {"fax", gone}}}});
+    service_.recogniseCarrierFolders();
+    EXPECT_NE(service_.service().carriers().at("postal").folderIdentity, "");
+    EXPECT_EQ(service_.service().carriers().at("fax").folderIdentity, "");
+}
+
 /// A settings service whose clock the test sets.
 class PresetRules : public testing::Test {
 protected:
