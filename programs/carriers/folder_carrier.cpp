@@ -4,6 +4,7 @@
 #include "programs/base/file_descriptor.h"
 #include "programs/carriers/control_file.h"
 
+#include <fcntl.h>
 #include <string_view>
 #include <unistd.h>
 #include <utility>
@@ -46,10 +47,11 @@ FolderCarrier::FolderCarrier(fs::path folder, std::string identity)
     : folder_(std::move(folder)), identity_(std::move(identity)) {}
 
 Base::MarkedFolder FolderCarrier::opened() const {
-    if (identity_.empty())
-        throw Base::Error(
-            "the folder " + folder_.string() +
-            " could not be written into when it was set: set \"carriers\" once more when it can");
+    if (identity_.empty()) {
+        Base::FileDescriptor const there(folder_, O_RDONLY | O_DIRECTORY);
+        throw Base::Error("the folder " + folder_.string() +
+                          " could not be had when it was set: set \"carriers\" once more");
+    }
     return {IN_WORDS, folder_, identity_};
 }
 

@@ -118,9 +118,8 @@ TEST(FolderCarrier, WritesNothingWhereAShareIsNotMounted) {
 TEST(FolderCarrier, WritesNothingIntoAFolderThatNobodyKnows) {
     TemporaryFolder const folder;
     Carriers::FolderCarrier carrier(folder.path(), {});
-    std::string const text =
-        "the folder " + folder.path().string() +
-        " could not be written into when it was set: set \"carriers\" once more when it can";
+    std::string const text = "the folder " + folder.path().string() +
+                             " could not be had when it was set: set \"carriers\" once more";
     EXPECT_EQ(failureOf([&] { carrier.handOver(parcelOf("p1-1", {"Ada"}), noRecord); }), text);
     EXPECT_TRUE(fs::is_empty(folder.path()));
 }

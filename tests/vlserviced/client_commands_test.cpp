@@ -87,14 +87,17 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
               "the service has no carriers: \"vlmail settings service carriers=FILE\" sets some\n");
     Result const set = vlmail({"settings", "service", "carriers=" + file});
     EXPECT_EQ(set.status, VlMail::FINE);
-    EXPECT_EQ(set.err, "vlmail: the carrier of postal is set and cannot be had yet: cannot write into " +
-                           shop + ": No such file or directory\n");
+    EXPECT_EQ(set.err, "vlmail: the carrier of postal is set and cannot be had yet: cannot open " + shop +
+                           ": No such file or directory\n");
     EXPECT_EQ(complaint({"carriers", "test", "postal"}),
-              "vlmail: cannot write into " + shop + ": No such file or directory\n");
+              "vlmail: cannot open " + shop + ": No such file or directory\n");
     fs::create_directory(shop);
+    EXPECT_EQ(complaint({"carriers", "test", "postal"}),
+              "vlmail: the folder " + shop +
+                  " could not be had when it was set: set \"carriers\" once more\n");
+    EXPECT_EQ(output({"settings", "service", "carriers=" + file}), "");
     EXPECT_THAT(output({"carriers", "test", "postal"}),
                 HasSubstr(shop + " can be written into and has room for "));
-    EXPECT_EQ(output({"settings", "service", "carriers=" + file}), "");
     EXPECT_EQ(output({"carriers", "list"}), "channel  type    state    since  waiting  uncertain  note\n"
                                             "postal   folder  working               0          0\n");
     EXPECT_THAT(output({"carriers", "pause", "postal"}), HasSubstr("postal   folder  paused"));
