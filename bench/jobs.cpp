@@ -1,10 +1,10 @@
 // Measures what a question for one job costs among 1,000 to 100,000 jobs, and a look for those that are held
 // and due. Decides whether clients may wait for their jobs at the service, and how many jobs may wait for
 // their time. What counts is the ratio between the sizes, which has to stay below 2.
+#include "programs/database/sqlite_connection.h"
 #include "programs/vlserviced/store/job_store.h"
 #include "programs/vlserviced/store/schema.h"
 
-#include <SQLiteCpp/Transaction.h>
 #include <benchmark/benchmark.h>
 
 #include <string>
@@ -18,7 +18,7 @@ using VlServiced::JobStore;
 /// A database in memory with that many jobs.
 struct Jobs {
     explicit Jobs(long long count, long long firstDue = 0) {
-        SQLite::Transaction transaction(database);
+        Database::Transaction transaction(database);
         for (long long i = 0; i < count; ++i) {
             Job job;
             job.pack = {"/srv/packs", "packs.db", "job " + std::to_string(i)};
@@ -32,7 +32,7 @@ struct Jobs {
         transaction.commit();
     }
 
-    SQLite::Database database{
+    Database::SqliteConnection database{
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     JobStore store{database};
 };

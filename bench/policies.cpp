@@ -91,10 +91,10 @@ private:
     using Work = JobSurroundings::Work;
 
     fs::path folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{*database_};
     VlServiced::SettingsService settings_{store_};
-    VlServiced::JobStore jobs_{database_};
+    VlServiced::JobStore jobs_{*database_};
     JobRunner runner_{jobs_,
                       {[](Work const&) {}, [](Work const& work) { work(); }, [](Work const& work) { work(); },
                        [] { return 1'795'000'000LL; }, [this] { return settings_.service(); }, folder_,

@@ -6,6 +6,7 @@
 #include "programs/channel/client.h"
 #include "programs/channel/server.h"
 #include "programs/channel/stream.h"
+#include "programs/database/sqlite_connection.h"
 #include "programs/protocol/pack_upload.h"
 #include "programs/vlmail/mailings/pack_upload.h"
 #include "programs/vlmail/service/service_client.h"
@@ -201,7 +202,7 @@ private:
 
     static inline std::string const TOKEN = "0123456789abcdef0123456789abcdef";
 
-    SQLite::Database database_{
+    Database::SqliteConnection database_{
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::JobStore jobs_{database_};
     asio::io_context io_;

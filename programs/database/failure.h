@@ -2,6 +2,7 @@
 // How databases fail towards people.
 
 #include "programs/base/error.h"
+#include "programs/database/migration.h"
 
 #include <filesystem>
 #include <string>
@@ -26,7 +27,7 @@ struct DatabaseKind {
     /// SQLite's application id, which stands in the file's header.
     int applicationId;
     /// Script i leads from schema version i to i + 1; the version that a program knows is their number.
-    std::vector<char const*> migrations;
+    std::vector<Migration> migrations;
     /// Run on a new file, in front of all else: what cannot be changed later.
     char const* beginning = "";
 };
@@ -38,6 +39,9 @@ std::string theFile(DatabaseKind const& kind, std::filesystem::path const& file)
 [[noreturn]] void rethrow(SQLite::Exception const& failure, DatabaseKind const& kind,
                           std::filesystem::path const& file);
 
+/// Throws DatabaseError when the version is beyond those that the kind knows; `database` is "the pack
+/// database /srv/packs.db", say.
+void requireKnownVersion(DatabaseKind const& kind, std::string const& database, long long version);
 /// Throws DatabaseError unless the file is new, or of the kind and of a version that is known.
 void requireKind(SQLite::Database& database, DatabaseKind const& kind, std::filesystem::path const& file);
 

@@ -97,8 +97,8 @@ std::vector<SchemaRow> schemaOf(SQLite::Database& database, std::size_t most) {
 std::vector<SchemaRow> schemaOf(DatabaseKind const& kind) {
     constexpr std::size_t ALL = 1000;
     SQLite::Database model(":memory:", SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE);
-    for (char const* script : kind.migrations)
-        model.exec(script);
+    for (Migration const& migration : kind.migrations)
+        model.exec(migration.scriptFor(Backend::Sqlite));
     return schemaOf(model, ALL);
 }
 

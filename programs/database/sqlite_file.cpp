@@ -36,7 +36,7 @@ void migrate(SQLite::Database& database, DatabaseKind const& kind) {
         SQLite::Transaction transaction(database, SQLite::TransactionBehavior::IMMEDIATE);
         // Another process may have been faster.
         if (number(database, "PRAGMA user_version") == static_cast<int>(version)) {
-            database.exec(kind.migrations[version]);
+            database.exec(kind.migrations[version].scriptFor(Backend::Sqlite));
             database.exec("PRAGMA application_id = " + std::to_string(kind.applicationId));
             database.exec("PRAGMA user_version = " + std::to_string(version + 1));
         }
@@ -119,17 +119,21 @@ void rethrow(SQLite::Exception const& failure, DatabaseKind const& kind, fs::pat
     }
 }
 
+void requireKnownVersion(DatabaseKind const& kind, std::string const& database, long long version) {
+    auto const known = static_cast<long long>(kind.migrations.size());
+    if (version > known)
+        throw DatabaseError(database + " was written by a newer version of this program (schema " +
+                            std::to_string(version) + ", known is " + std::to_string(known) +
+                            "): use that version");
+}
+
 void requireKind(SQLite::Database& database, DatabaseKind const& kind, fs::path const& file) {
     int const applicationId = number(database, "PRAGMA application_id");
     int const version = number(database, "PRAGMA user_version");
     bool const isNew = number(database, "SELECT count(*) FROM sqlite_schema") == 0 && version == 0;
     if (applicationId != kind.applicationId && !(isNew && applicationId == 0))
         failOther(kind, file);
-    auto const known = static_cast<int>(kind.migrations.size());
-    if (version > known)
-        throw DatabaseError(theFile(kind, file) + " was written by a newer version of this program (schema " +
-                            std::to_string(version) + ", known is " + std::to_string(known) +
-                            "): use that version");
+    requireKnownVersion(kind, theFile(kind, file), version);
     if (version < 0)
         failDamaged(kind, file, "schema " + std::to_string(version));
 }

@@ -444,13 +444,13 @@ private:
 
     DataFolder data_;
     fs::path outbox_;
-    SQLite::Database database_;
-    SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_;
+    SettingsStore store_{*database_};
     SettingsService settings_{store_};
-    DocumentStore documentStore_{database_};
+    DocumentStore documentStore_{*database_};
     DocumentService documents_{documentStore_, store_, settings_, &now};
-    JobStore jobs_{database_};
-    LetterStore letters_{database_, jobs_};
+    JobStore jobs_{*database_};
+    LetterStore letters_{*database_, jobs_};
     LocalPacks localPacks_;
     std::shared_ptr<PackStore> packStore_;
 

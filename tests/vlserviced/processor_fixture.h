@@ -50,13 +50,13 @@ protected:
     std::filesystem::path upload_ = folder_ / "upload";
     std::vector<std::string> log_;
     Log::Sink formerSink_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{*database_};
     VlServiced::SettingsService settings_{store_};
-    VlServiced::DocumentStore documentStore_{database_};
+    VlServiced::DocumentStore documentStore_{*database_};
     VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; }};
-    VlServiced::JobStore jobs_{database_};
-    VlServiced::LetterStore letters_{database_, jobs_};
+    VlServiced::JobStore jobs_{*database_};
+    VlServiced::LetterStore letters_{*database_, jobs_};
     VlServiced::LetterRunner carriers_{
         letters_, jobs_,
         VlServiced::LetterSurroundings{

@@ -8,8 +8,6 @@
 #include "programs/vlserviced/store/node_id.h"
 #include "vlservice/platform/log.h"
 
-#include <SQLiteCpp/Exception.h>
-
 #include <algorithm>
 #include <set>
 #include <utility>
@@ -74,7 +72,7 @@ Protocol::DocumentUploadAnswer DocumentService::put(DocumentUpload const& piece)
     answer.upload = upload->first;
     try {
         answer.complete = take(upload, piece);
-    } catch (SQLite::Exception const& failure) {
+    } catch (Database::QueryError const& failure) {
         drop(upload);
         refuse(piece, failure.what() + std::string("; make room on the disk of the service"));
     } catch (Base::Error const&) {
@@ -189,7 +187,7 @@ void DocumentService::drop(Uploads::iterator upload) {
     uploads_.erase(upload);
     try {
         documents_.drop(content);
-    } catch (SQLite::Exception const& failure) {
+    } catch (Database::QueryError const& failure) {
         Log::Lock(4).logStreamLine() << "What arrived of a document goes with the next one. "
                                      << Base::oneLine(failure.what());
     }

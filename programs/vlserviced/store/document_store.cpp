@@ -1,108 +1,89 @@
 #include "programs/vlserviced/store/document_store.h"
 
-#include <SQLiteCpp/Statement.h>
-#include <SQLiteCpp/Transaction.h>
-
-#include <cstdint>
-
 namespace VlServiced {
 
 using Protocol::StoredDocument;
 
-DocumentStore::DocumentStore(SQLite::Database& database) : database_(database) {}
+DocumentStore::DocumentStore(Database::Connection& database) : database_(database) {}
 
 std::vector<StoredDocument> DocumentStore::at(std::string const& node) const {
-    SQLite::Statement query(database_,
-                            "SELECT name, bytes, sha256, put_at FROM documents JOIN document_contents "
-                            "ON number = content WHERE node = ? ORDER BY name");
-    query.bindNoCopy(1, node);
+    Database::Rows rows = database_.query("SELECT name, bytes, sha256, put_at FROM documents "
+                                          "JOIN document_contents ON number = content "
+                                          "WHERE node = $1 ORDER BY name",
+                                          node);
     std::vector<StoredDocument> documents;
-    while (query.executeStep()) {
+    while (rows.next()) {
         StoredDocument& document = documents.emplace_back();
         document.node = node;
-        document.name = query.getColumn(0).getString();
-        document.bytes = query.getColumn(1).getInt64();
-        document.sha256 = query.getColumn(2).getString();
-        document.putAt = query.getColumn(3).getInt64();
+        document.name = rows.text(0);
+        document.bytes = rows.number(1);
+        document.sha256 = rows.text(2);
+        document.putAt = rows.number(3);
     }
     return documents;
 }
 
 std::optional<long long> DocumentStore::numberOf(std::string const& sha256) const {
-    SQLite::Statement query(database_, "SELECT number FROM document_contents WHERE sha256 = ?");
-    query.bindNoCopy(1, sha256);
-    return query.executeStep() ? std::optional<long long>(query.getColumn(0).getInt64()) : std::nullopt;
+    Database::Rows rows = database_.query("SELECT number FROM document_contents WHERE sha256 = $1", sha256);
+    return rows.next() ? std::optional(rows.number(0)) : std::nullopt;
 }
 
 std::optional<std::string> DocumentStore::piece(std::string const& sha256, long long offset) const {
     std::optional<long long> const content = numberOf(sha256);
     if (!content)
         return std::nullopt;
-    SQLite::Statement query(database_, "SELECT substr(data, 1 + ?2 - place) FROM document_pieces "
-                                       "WHERE content = ?1 AND place <= ?2 ORDER BY place DESC LIMIT 1");
-    query.bind(1, std::int64_t{*content});
-    query.bind(2, std::int64_t{offset});
-    return query.executeStep() ? query.getColumn(0).getString() : std::string();
+    Database::Rows rows =
+        database_.query("SELECT substr(data, CAST(1 + $2 - place AS INTEGER)) FROM document_pieces "
+                        "WHERE content = $1 AND place <= $2 ORDER BY place DESC LIMIT 1",
+                        *content, offset);
+    return rows.next() ? rows.text(0) : std::string();
 }
 
 long long DocumentStore::begin() {
-    SQLite::Statement(database_, "INSERT INTO document_contents (bytes) VALUES (0)").exec();
-    return database_.getLastInsertRowid();
+    Database::Rows rows =
+        database_.query("INSERT INTO document_contents (bytes) VALUES (0) RETURNING number");
+    rows.next();
+    long long const number = rows.number(0);
+    // Carried out in full when there is nothing left of it.
+    rows.next();
+    return number;
 }
 
 void DocumentStore::add(long long content, std::string_view piece) {
-    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
-    SQLite::Statement insertion(database_,
-                                "INSERT INTO document_pieces (content, place, data) "
-                                "SELECT number, bytes, ?2 FROM document_contents WHERE number = ?1");
-    insertion.bind(1, std::int64_t{content});
-    insertion.bindNoCopy(2, piece.data(), static_cast<int>(piece.size()));
-    insertion.exec();
-    SQLite::Statement growth(database_, "UPDATE document_contents SET bytes = bytes + ? WHERE number = ?");
-    growth.bind(1, static_cast<std::int64_t>(piece.size()));
-    growth.bind(2, std::int64_t{content});
-    growth.exec();
+    Database::Transaction transaction(database_);
+    database_.change("INSERT INTO document_pieces (content, place, data) "
+                     "SELECT number, bytes, $2 FROM document_contents WHERE number = $1",
+                     content, Database::Bytes{piece});
+    database_.change("UPDATE document_contents SET bytes = bytes + $1 WHERE number = $2", piece.size(),
+                     content);
     transaction.commit();
 }
 
 void DocumentStore::finish(long long content, StoredDocument const& document) {
-    SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+    Database::Transaction transaction(database_, Database::Transaction::ALONE);
     std::optional<long long> const known = numberOf(document.sha256);
-    if (known) {
+    if (known)
         drop(content);
-    } else {
-        SQLite::Statement completion(database_, "UPDATE document_contents SET sha256 = ? WHERE number = ?");
-        completion.bind(1, document.sha256);
-        completion.bind(2, std::int64_t{content});
-        completion.exec();
-    }
-    SQLite::Statement change(database_, "INSERT INTO documents (node, name, content, put_at) "
-                                        "VALUES (?, ?, ?, ?) ON CONFLICT DO UPDATE SET "
-                                        "content = excluded.content, put_at = excluded.put_at");
-    change.bind(1, document.node);
-    change.bind(2, document.name);
-    change.bind(3, std::int64_t{known.value_or(content)});
-    change.bind(4, std::int64_t{document.putAt});
-    change.exec();
+    else
+        database_.change("UPDATE document_contents SET sha256 = $1 WHERE number = $2", document.sha256,
+                         content);
+    database_.change("INSERT INTO documents (node, name, content, put_at) VALUES ($1, $2, $3, $4) "
+                     "ON CONFLICT (node, name) DO UPDATE SET content = excluded.content, "
+                     "put_at = excluded.put_at",
+                     document.node, document.name, known.value_or(content), document.putAt);
     transaction.commit();
 }
 
 void DocumentStore::drop(long long content) {
-    SQLite::Statement deletion(database_,
-                               "DELETE FROM document_contents WHERE number = ? AND sha256 IS NULL");
-    deletion.bind(1, std::int64_t{content});
-    deletion.exec();
+    database_.change("DELETE FROM document_contents WHERE number = $1 AND sha256 IS NULL", content);
 }
 
 void DocumentStore::dropUnfinished() {
-    SQLite::Statement(database_, "DELETE FROM document_contents WHERE sha256 IS NULL").exec();
+    database_.change("DELETE FROM document_contents WHERE sha256 IS NULL");
 }
 
 void DocumentStore::remove(std::string const& node, std::string const& name) {
-    SQLite::Statement deletion(database_, "DELETE FROM documents WHERE node = ? AND name = ?");
-    deletion.bind(1, node);
-    deletion.bind(2, name);
-    deletion.exec();
+    database_.change("DELETE FROM documents WHERE node = $1 AND name = $2", node, name);
 }
 
 } // namespace VlServiced

@@ -1,9 +1,8 @@
 #pragma once
 // The documents of nodes, letterheads and attachments, as the database keeps them.
 
+#include "programs/database/connection.h"
 #include "programs/protocol/documents.h"
-
-#include <SQLiteCpp/Database.h>
 
 #include <optional>
 #include <string>
@@ -18,7 +17,7 @@ namespace VlServiced {
 class DocumentStore {
 public:
     /// The database has to outlive the store.
-    explicit DocumentStore(SQLite::Database& database);
+    explicit DocumentStore(Database::Connection& database);
 
     /// Those that lie at a node itself, by their names.
     std::vector<Protocol::StoredDocument> at(std::string const& node) const;
@@ -41,7 +40,7 @@ public:
 private:
     std::optional<long long> numberOf(std::string const& sha256) const;
 
-    SQLite::Database& database_;
+    Database::Connection& database_;
 };
 
 } // namespace VlServiced

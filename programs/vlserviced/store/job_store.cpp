@@ -3,9 +3,9 @@
 #include "vlservice/json/json_form.h"
 #include "vlservice/json/json_text.h"
 
-#include <SQLiteCpp/Statement.h>
-
 #include <algorithm>
+#include <functional>
+#include <iterator>
 #include <sstream>
 #include <utility>
 
@@ -24,55 +24,58 @@ constexpr char const* SELECT_JOBS =
 constexpr JobState UNDER_WAY[] = {JobState::Accepted, JobState::Queued, JobState::Submitting,
                                   JobState::Submitted, JobState::Lodged};
 
-Job jobIn(SQLite::Statement& row) {
+Job jobIn(Database::Rows const& row) {
     Job job;
-    job.pack.packId = row.getColumn(0).getString();
-    job.pack.folder = row.getColumn(1).getString();
-    job.pack.database = row.getColumn(2).getString();
-    job.cfgId = row.getColumn(3).getString();
-    job.title = row.getColumn(4).getString();
-    job.documents = row.getColumn(5).getInt64();
-    job.pages = row.getColumn(6).getInt64();
-    job.state = stateNamed(row.getColumn(7).getString());
-    job.problem = row.getColumn(8).getString();
-    job.toUpload = row.getColumn(9).getInt() != 0;
-    job.uploadFolder = row.getColumn(10).getString();
-    job.acceptedAt = row.getColumn(11).getInt64();
-    job.changedAt = row.getColumn(12).getInt64();
-    job.uploadFolderIdentity = row.getColumn(13).getString();
-    job.due = row.getColumn(14).getInt64();
-    job.toHold = row.getColumn(15).getInt() != 0;
-    job.isTrial = row.getColumn(16).getInt() != 0;
-    job.isDivided = row.getColumn(17).getInt() != 0;
-    if (std::string const state = row.getColumn(18).getString(); !state.empty())
+    job.pack.packId = row.text(0);
+    job.pack.folder = row.text(1);
+    job.pack.database = row.text(2);
+    job.cfgId = row.text(3);
+    job.title = row.text(4);
+    job.documents = row.number(5);
+    job.pages = row.number(6);
+    job.state = stateNamed(row.text(7));
+    job.problem = row.text(8);
+    job.toUpload = row.isTrue(9);
+    job.uploadFolder = row.text(10);
+    job.acceptedAt = row.number(11);
+    job.changedAt = row.number(12);
+    job.uploadFolderIdentity = row.text(13);
+    job.due = row.number(14);
+    job.toHold = row.isTrue(15);
+    job.isTrial = row.isTrue(16);
+    job.isDivided = row.isTrue(17);
+    if (std::string const state = row.text(18); !state.empty())
         job.lettersState = stateNamed(state);
-    job.lettersProblem = row.getColumn(19).getString();
+    job.lettersProblem = row.text(19);
     return job;
 }
 
-std::vector<Job> jobsIn(SQLite::Statement& query) {
+std::vector<Job> jobsIn(Database::Rows rows) {
     std::vector<Job> jobs;
-    while (query.executeStep())
-        jobs.push_back(jobIn(query));
+    while (rows.next())
+        jobs.push_back(jobIn(rows));
     return jobs;
 }
 
 /// What rows have to fulfil, with the texts that go into it.
 class Conditions {
 public:
-    /// An empty text is no restriction.
-    void add(std::string const& before, std::string const& value, std::string const& behind = "") {
+    /// An empty text is no restriction. `condition` says where the text goes.
+    void add(std::string const& value,
+             std::function<std::string(std::string const& placeholder)> const& condition) {
         if (value.empty())
             return;
         values_.push_back(value);
-        text_ += (text_.empty() ? "WHERE " : "AND ") + before + "(?" + std::to_string(values_.size()) + ")" +
-                 behind + ' ';
+        text_ += (text_.empty() ? "WHERE " : "AND ") + condition('$' + std::to_string(values_.size())) + ' ';
+    }
+    /// That a column has that text; one that is not to be looked up by an index stands in an expression.
+    void addEqual(std::string const& column, std::string const& value, bool isLookedUp) {
+        add(value, [&](std::string const& placeholder) {
+            return (isLookedUp ? column : "(" + column + " || '')") + " = " + placeholder;
+        });
     }
     std::string const& text() const { return text_; }
-    void bind(SQLite::Statement& query) const {
-        for (std::size_t i = 0; i < values_.size(); ++i)
-            query.bind(static_cast<int>(i) + 1, values_[i]);
-    }
+    Database::Values values() const { return {values_.begin(), values_.end()}; }
 
 private:
     std::string text_;
@@ -88,37 +91,30 @@ std::string textOf(std::vector<std::string> const& texts) {
 
 } // namespace
 
-JobStore::JobStore(SQLite::Database& database) : database_(database) {}
+JobStore::JobStore(Database::Connection& database) : database_(database) {}
 
 std::optional<Job> JobStore::find(std::string const& packId) const {
-    SQLite::Statement query(database_, std::string(SELECT_JOBS) + "WHERE pack = ?");
-    query.bindNoCopy(1, packId);
-    if (!query.executeStep())
-        return std::nullopt;
-    return jobIn(query);
+    Database::Rows rows = database_.query(std::string(SELECT_JOBS) + "WHERE pack = $1", packId);
+    return rows.next() ? std::optional(jobIn(rows)) : std::nullopt;
 }
 
 std::vector<Job> JobStore::inState(JobState state) const {
-    SQLite::Statement query(database_,
-                            std::string(SELECT_JOBS) + "WHERE state = ? ORDER BY accepted_at, pack");
-    query.bind(1, stateName(state));
-    return jobsIn(query);
+    return jobsIn(database_.query(std::string(SELECT_JOBS) + "WHERE state = $1 ORDER BY accepted_at, pack",
+                                  stateName(state)));
 }
 
 std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) const {
     // Only the conditions that are wanted: one that may hold for every row would keep the indexes out.
     Conditions wanted;
-    // Ids say more than all else: the sign keeps the other conditions from choosing the index.
-    std::string const sign = filter.packIds.empty() ? "" : "+";
-    wanted.add(sign + "db_folder = ", filter.folder);
-    wanted.add(sign + "db_name = ", filter.database);
-    if (!filter.packIds.empty())
-        wanted.add("pack IN (SELECT value FROM json_each", textOf(filter.packIds), ")");
-    SQLite::Statement query(database_, SELECT_JOBS + wanted.text() +
-                                           "ORDER BY accepted_at DESC, pack DESC LIMIT " +
-                                           std::to_string(limit));
-    wanted.bind(query);
-    std::vector<Job> jobs = jobsIn(query);
+    // Ids say more than all else.
+    bool const isLookedUp = filter.packIds.empty();
+    wanted.addEqual("db_folder", filter.folder, isLookedUp);
+    wanted.addEqual("db_name", filter.database, isLookedUp);
+    wanted.add(isLookedUp ? std::string() : textOf(filter.packIds),
+               [&](std::string const& ids) { return "pack IN " + database_.elementsOf(ids); });
+    std::vector<Job> jobs = jobsIn(database_.queryAll(
+        SELECT_JOBS + wanted.text() + "ORDER BY accepted_at DESC, pack DESC LIMIT " + std::to_string(limit),
+        wanted.values()));
     std::reverse(jobs.begin(), jobs.end());
     return jobs;
 }
@@ -128,186 +124,135 @@ std::vector<Job> JobStore::underWay(std::string const& folder, std::string const
     for (JobState const state : UNDER_WAY)
         states.emplace_back(stateName(state));
     Conditions wanted;
-    wanted.add("state IN (SELECT value FROM json_each", textOf(states), ")");
-    // The signs keep these from choosing the index: what rests and has ended is of the same databases.
-    wanted.add("+db_folder = ", folder);
-    wanted.add("+db_name = ", database);
-    SQLite::Statement query(database_, SELECT_JOBS + wanted.text() + "ORDER BY accepted_at, pack");
-    wanted.bind(query);
-    return jobsIn(query);
+    wanted.add(textOf(states),
+               [&](std::string const& named) { return "state IN " + database_.elementsOf(named); });
+    // What rests and has ended is of the same databases.
+    wanted.addEqual("db_folder", folder, false);
+    wanted.addEqual("db_name", database, false);
+    return jobsIn(
+        database_.queryAll(SELECT_JOBS + wanted.text() + "ORDER BY accepted_at, pack", wanted.values()));
 }
 
 // The state stands in the text: a bound one would keep the index out, which holds that state alone.
 std::vector<Job> JobStore::due(long long now, std::size_t limit) const {
-    SQLite::Statement query(database_, std::string(SELECT_JOBS) +
-                                           "INDEXED BY jobs_by_due WHERE state = 'held' AND due <= ? "
-                                           "ORDER BY due, pack LIMIT " +
-                                           std::to_string(limit));
-    query.bind(1, static_cast<std::int64_t>(now));
-    return jobsIn(query);
+    return jobsIn(database_.query(SELECT_JOBS + database_.by("jobs_by_due") +
+                                      "WHERE state = 'held' AND due <= $1 ORDER BY due, pack LIMIT " +
+                                      std::to_string(limit),
+                                  now));
 }
 
 std::optional<long long> JobStore::nextDue() const {
-    SQLite::Statement query(database_, "SELECT due FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND "
-                                       "due IS NOT NULL ORDER BY due LIMIT 1");
-    if (!query.executeStep())
-        return std::nullopt;
-    return query.getColumn(0).getInt64();
+    Database::Rows rows = database_.query("SELECT due FROM jobs " + database_.by("jobs_by_due") +
+                                          "WHERE state = 'held' AND due IS NOT NULL ORDER BY due LIMIT 1");
+    return rows.next() ? std::optional(rows.number(0)) : std::nullopt;
 }
 
 bool JobStore::accept(Job const& job) {
-    SQLite::Statement insertion(
-        database_, "INSERT INTO jobs (pack, db_folder, db_name, cfg_id, title, documents, pages, "
-                   "state, accepted_at, changed_at, to_upload, due, to_hold, trial) "
-                   "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?9, ?10, nullif(?11, 0), ?12, ?13) "
-                   "ON CONFLICT DO NOTHING");
-    insertion.bind(1, job.pack.packId);
-    insertion.bind(2, job.pack.folder);
-    insertion.bind(3, job.pack.database);
-    insertion.bind(4, job.cfgId);
-    insertion.bind(5, job.title);
-    insertion.bind(6, static_cast<std::int64_t>(job.documents));
-    insertion.bind(7, static_cast<std::int64_t>(job.pages));
-    insertion.bind(8, stateName(JobState::Accepted));
-    insertion.bind(9, static_cast<std::int64_t>(job.acceptedAt));
-    insertion.bind(10, job.toUpload ? 1 : 0);
-    insertion.bind(11, static_cast<std::int64_t>(job.due));
-    insertion.bind(12, job.toHold ? 1 : 0);
-    insertion.bind(13, job.isTrial ? 1 : 0);
-    return insertion.exec() == 1;
+    return database_.change("INSERT INTO jobs (pack, db_folder, db_name, cfg_id, title, documents, pages, "
+                            "state, accepted_at, changed_at, to_upload, due, to_hold, trial) "
+                            "VALUES ($1, $2, $3, $4, $5, $6, $7, $8, $9, $9, $10, $11, $12, $13) "
+                            "ON CONFLICT DO NOTHING",
+                            job.pack.packId, job.pack.folder, job.pack.database, job.cfgId, job.title,
+                            job.documents, job.pages, stateName(JobState::Accepted), job.acceptedAt,
+                            job.toUpload, job.due == 0 ? Database::Value(nullptr) : Database::Value(job.due),
+                            job.toHold, job.isTrial) == 1;
 }
 
 bool JobStore::advance(std::string const& packId, JobState from, JobState to, long long now) {
-    SQLite::Statement change(database_, "UPDATE jobs SET state = ?, problem = '', changed_at = ? "
-                                        "WHERE pack = ? AND state = ?");
-    change.bind(1, stateName(to));
-    change.bind(2, static_cast<std::int64_t>(now));
-    change.bind(3, packId);
-    change.bind(4, stateName(from));
-    bool const moved = change.exec() == 1;
-    if (moved)
-        changed(packId);
-    return moved;
+    return told(packId, database_.change("UPDATE jobs SET state = $1, problem = '', changed_at = $2 "
+                                         "WHERE pack = $3 AND state = $4",
+                                         stateName(to), now, packId, stateName(from)));
 }
 
 bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder,
                                std::string const& identity, long long now) {
-    SQLite::Statement change(database_, "UPDATE jobs SET state = ?, problem = '', upload_folder = ?, "
-                                        "upload_identity = ?, changed_at = ? WHERE pack = ? AND state = ?");
-    change.bind(1, stateName(JobState::Submitting));
-    change.bind(2, uploadFolder);
-    change.bind(3, identity);
-    change.bind(4, static_cast<std::int64_t>(now));
-    change.bind(5, packId);
-    change.bind(6, stateName(JobState::Queued));
-    bool const moved = change.exec() == 1;
-    if (moved)
-        changed(packId);
-    return moved;
+    return told(packId, database_.change("UPDATE jobs SET state = $1, problem = '', upload_folder = $2, "
+                                         "upload_identity = $3, changed_at = $4 "
+                                         "WHERE pack = $5 AND state = $6",
+                                         stateName(JobState::Submitting), uploadFolder, identity, now, packId,
+                                         stateName(JobState::Queued)));
 }
 
 bool JobStore::changeAtRest(std::string const& assignments, std::string const& packId, long long now) {
-    SQLite::Statement change(database_, "UPDATE jobs SET problem = '', " + assignments +
-                                            " WHERE pack = ?1 AND letters_state = '' AND "
-                                            "state IN ('accepted', 'held', 'queued')");
-    change.bind(1, packId);
-    change.bind(2, static_cast<std::int64_t>(now));
-    bool const isChanged = change.exec() == 1;
-    if (isChanged)
-        changed(packId);
-    return isChanged;
+    return told(packId, database_.change("UPDATE jobs SET problem = '', " + assignments +
+                                             " WHERE pack = $1 AND letters_state = '' AND "
+                                             "state IN ('accepted', 'held', 'queued')",
+                                         packId, now));
 }
 
 bool JobStore::hold(std::string const& packId, long long now) {
-    return changeAtRest("to_hold = 1, due = NULL, changed_at = iif(state = 'queued', ?2, changed_at), "
-                        "state = iif(state = 'queued', 'held', state)",
+    return changeAtRest("to_hold = 1, due = NULL, "
+                        "changed_at = CASE WHEN state = 'queued' THEN $2 ELSE changed_at END, "
+                        "state = CASE WHEN state = 'queued' THEN 'held' ELSE state END",
                         packId, now);
 }
 
 bool JobStore::release(std::string const& packId, long long now) {
-    return changeAtRest("to_hold = 0, due = NULL, changed_at = iif(state = 'held', ?2, changed_at), "
-                        "state = iif(state = 'held', 'queued', state)",
+    return changeAtRest("to_hold = 0, due = NULL, "
+                        "changed_at = CASE WHEN state = 'held' THEN $2 ELSE changed_at END, "
+                        "state = CASE WHEN state = 'held' THEN 'queued' ELSE state END",
                         packId, now);
 }
 
 bool JobStore::cancel(std::string const& packId, long long now) {
-    return changeAtRest("due = NULL, changed_at = ?2, state = 'cancelled'", packId, now);
+    return changeAtRest("due = NULL, changed_at = $2, state = 'cancelled'", packId, now);
 }
 
 bool JobStore::wantUpload(std::string const& packId) {
-    SQLite::Statement change(database_, "UPDATE jobs SET to_upload = 1 WHERE pack = ? AND state IN "
-                                        "('accepted', 'held', 'queued')");
-    change.bind(1, packId);
-    return change.exec() == 1;
+    return database_.change("UPDATE jobs SET to_upload = 1 WHERE pack = $1 AND state IN "
+                            "('accepted', 'held', 'queued')",
+                            packId) == 1;
 }
 
 void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
-    SQLite::Statement change(database_,
-                             "UPDATE jobs SET state = ?, problem = ?, changed_at = ? WHERE pack = ?");
-    change.bind(1, stateName(JobState::Failed));
-    change.bind(2, reason);
-    change.bind(3, static_cast<std::int64_t>(now));
-    change.bind(4, packId);
-    change.exec();
-    changed(packId);
+    told(packId, database_.change("UPDATE jobs SET state = $1, problem = $2, changed_at = $3 WHERE pack = $4",
+                                  stateName(JobState::Failed), reason, now, packId));
 }
 
 bool JobStore::divide(std::string const& packId, LettersByCarriers byCarriers, long long now) {
-    SQLite::Statement change(database_, "UPDATE jobs SET problem = '', divided = 1, state = ?, "
-                                        "letters_state = ?, changed_at = iif(state = ?1, changed_at, ?) "
-                                        "WHERE pack = ? AND state = ? AND divided = 0");
-    bool const isAll = byCarriers == LettersByCarriers::All;
-    change.bind(1, stateName(isAll ? JobState::Delivering : JobState::Queued));
-    change.bind(2, byCarriers == LettersByCarriers::Some ? stateName(JobState::Delivering) : "");
-    change.bind(3, static_cast<std::int64_t>(now));
-    change.bind(4, packId);
-    change.bind(5, stateName(JobState::Queued));
-    bool const isDivided = change.exec() == 1;
-    if (isDivided)
-        changed(packId);
-    return isDivided;
+    JobState const state = byCarriers == LettersByCarriers::All ? JobState::Delivering : JobState::Queued;
+    return told(packId,
+                database_.change("UPDATE jobs SET problem = '', divided = 1, state = $1, letters_state = $2, "
+                                 "changed_at = CASE WHEN state = $1 THEN changed_at ELSE $3 END "
+                                 "WHERE pack = $4 AND state = $5 AND divided = 0",
+                                 stateName(state),
+                                 byCarriers == LettersByCarriers::Some ? stateName(JobState::Delivering) : "",
+                                 now, packId, stateName(JobState::Queued)));
 }
 
 void JobStore::setLettersState(std::string const& packId, JobState state, std::string const& problem,
                                long long now) {
-    SQLite::Statement change(
-        database_, "UPDATE jobs SET "
-                   "changed_at = iif(letters_state <> '' OR state = ?1, changed_at, ?3), "
-                   "state = iif(letters_state = '', ?1, state), "
-                   "problem = iif(letters_state = '', ?2, problem), "
-                   "letters_problem = iif(letters_state = '', '', ?2), "
-                   "letters_state = iif(letters_state = '', '', ?1) WHERE pack = ?4 AND divided = 1");
-    change.bind(1, stateName(state));
-    change.bind(2, problem);
-    change.bind(3, static_cast<std::int64_t>(now));
-    change.bind(4, packId);
-    change.exec();
-    changed(packId);
+    told(packId, database_.change("UPDATE jobs SET changed_at = CASE WHEN letters_state <> '' OR state = $1 "
+                                  "THEN changed_at ELSE $3 END, "
+                                  "state = CASE WHEN letters_state = '' THEN $1 ELSE state END, "
+                                  "problem = CASE WHEN letters_state = '' THEN $2 ELSE problem END, "
+                                  "letters_problem = CASE WHEN letters_state = '' THEN '' ELSE $2 END, "
+                                  "letters_state = CASE WHEN letters_state = '' THEN '' ELSE $1 END "
+                                  "WHERE pack = $4 AND divided = 1",
+                                  stateName(state), problem, now, packId));
 }
 
 std::vector<std::string> JobStore::delivering() const {
-    SQLite::Statement query(database_, "SELECT pack FROM jobs WHERE state = 'delivering' UNION ALL "
-                                       "SELECT pack FROM jobs WHERE letters_state = 'delivering'");
+    Database::Rows rows = database_.query("SELECT pack FROM jobs WHERE state = 'delivering' UNION ALL "
+                                          "SELECT pack FROM jobs WHERE letters_state = 'delivering'");
     std::vector<std::string> packIds;
-    while (query.executeStep())
-        packIds.push_back(query.getColumn(0).getString());
+    while (rows.next())
+        packIds.push_back(rows.text(0));
     return packIds;
 }
 
 void JobStore::setProblem(std::string const& packId, std::string const& problem) {
-    SQLite::Statement change(database_, "UPDATE jobs SET problem = ? WHERE pack = ?");
-    change.bind(1, problem);
-    change.bind(2, packId);
-    change.exec();
-    changed(packId);
+    told(packId, database_.change("UPDATE jobs SET problem = $1 WHERE pack = $2", problem, packId));
 }
 
 void JobStore::wantUpload(std::string const& folder, std::string const& database) {
-    SQLite::Statement change(database_, "UPDATE jobs SET to_upload = 1 WHERE ?1 IN ('', db_folder) AND "
-                                        "?2 IN ('', db_name) AND state IN ('accepted', 'held', 'queued')");
-    change.bind(1, folder);
-    change.bind(2, database);
-    change.exec();
+    Conditions wanted;
+    wanted.addEqual("db_folder", folder, true);
+    wanted.addEqual("db_name", database, true);
+    database_.changeAll("UPDATE jobs SET to_upload = 1 " + wanted.text() +
+                            (wanted.text().empty() ? "WHERE " : "AND ") +
+                            "state IN ('accepted', 'held', 'queued')",
+                        wanted.values());
 }
 
 // A job is accepted before it ends, so that the index on states bounds the search.
@@ -316,37 +261,34 @@ std::vector<Job> JobStore::endedBefore(long long time, std::size_t limit) const 
     for (JobState const state : Protocol::ALL_JOB_STATES) {
         if (!hasEnded(state) || ended.size() >= limit)
             continue;
-        SQLite::Statement query(database_, std::string(SELECT_JOBS) +
-                                               "WHERE state = ?1 AND accepted_at < ?2 AND changed_at < ?2 "
-                                               "AND letters_state <> 'delivering' "
-                                               "ORDER BY accepted_at, pack LIMIT " +
-                                               std::to_string(limit - ended.size()));
-        query.bind(1, stateName(state));
-        query.bind(2, static_cast<std::int64_t>(time));
-        for (Job& job : jobsIn(query))
-            ended.push_back(std::move(job));
+        std::vector<Job> jobs =
+            jobsIn(database_.query(std::string(SELECT_JOBS) +
+                                       "WHERE state = $1 AND accepted_at < $2 AND changed_at < $2 "
+                                       "AND letters_state <> 'delivering' ORDER BY accepted_at, pack LIMIT " +
+                                       std::to_string(limit - ended.size()),
+                                   stateName(state), time));
+        std::ranges::move(jobs, std::back_inserter(ended));
     }
     return ended;
 }
 
 void JobStore::forget(std::string const& packId) {
-    SQLite::Statement deletion(database_, "DELETE FROM jobs WHERE pack = ?");
-    deletion.bind(1, packId);
-    deletion.exec();
+    database_.change("DELETE FROM jobs WHERE pack = $1", packId);
 }
 
-void JobStore::emptyLog() { database_.exec("PRAGMA wal_checkpoint(TRUNCATE)"); }
+void JobStore::emptyLog() { database_.emptyLog(); }
 
-void JobStore::changed(std::string const& packId) const {
-    if (tell_)
+bool JobStore::told(std::string const& packId, long long changedRows) const {
+    if (changedRows > 0 && tell_)
         tell_(packId);
+    return changedRows > 0;
 }
 
 std::vector<std::pair<JobState, long long>> JobStore::counts() const {
-    SQLite::Statement query(database_, "SELECT state, count(*) FROM jobs GROUP BY state");
+    Database::Rows rows = database_.query("SELECT state, count(*) FROM jobs GROUP BY state");
     std::vector<std::pair<JobState, long long>> counts;
-    while (query.executeStep())
-        counts.emplace_back(stateNamed(query.getColumn(0).getString()), query.getColumn(1).getInt64());
+    while (rows.next())
+        counts.emplace_back(stateNamed(rows.text(0)), rows.number(1));
     return counts;
 }
 

@@ -1,9 +1,8 @@
 #pragma once
 // Jobs as the database keeps them: one for each pack id, whatever happens to the command that brought it.
 
+#include "programs/database/connection.h"
 #include "programs/vlserviced/store/job.h"
-
-#include <SQLiteCpp/Database.h>
 
 #include <functional>
 #include <optional>
@@ -27,7 +26,7 @@ struct JobFilter {
 class JobStore {
 public:
     /// The database has to outlive the store.
-    explicit JobStore(SQLite::Database& database);
+    explicit JobStore(Database::Connection& database);
 
     std::optional<Job> find(std::string const& packId) const;
     /// In the order of their acceptance.
@@ -96,9 +95,10 @@ public:
 private:
     /// Of those of that pack id in a state from which one may go back.
     bool changeAtRest(std::string const& assignments, std::string const& packId, long long now);
-    void changed(std::string const& packId) const;
+    /// Tells of the job when a row has changed, and says whether one has.
+    bool told(std::string const& packId, long long changedRows) const;
 
-    SQLite::Database& database_;
+    Database::Connection& database_;
     std::function<void(std::string const&)> tell_;
 };
 

@@ -4,8 +4,6 @@
 #include "programs/protocol/letter.h"
 #include "programs/vlserviced/store/job_store.h"
 
-#include <SQLiteCpp/Database.h>
-
 #include <map>
 #include <optional>
 #include <string>
@@ -69,7 +67,7 @@ struct CarrierRecord {
 class LetterStore {
 public:
     /// Both have to outlive the store.
-    LetterStore(SQLite::Database& database, JobStore& jobs) : database_(database), jobs_(jobs) {}
+    LetterStore(Database::Connection& database, JobStore& jobs) : database_(database), jobs_(jobs) {}
 
     /// Records the letters of a queued job. False, and no change, when it is not queued or was divided
     /// before.
@@ -115,7 +113,7 @@ public:
     void setCarrier(std::string const& channel, CarrierRecord const& record);
 
 private:
-    SQLite::Database& database_;
+    Database::Connection& database_;
     JobStore& jobs_;
 };
 

@@ -1,5 +1,7 @@
 #include "programs/vlserviced/store/schema.h"
 
+#include "programs/database/sqlite_connection.h"
+
 namespace VlServiced {
 namespace {
 
@@ -90,6 +92,9 @@ CREATE TABLE documents (
     PRIMARY KEY (node, name)
 ) WITHOUT ROWID;
 CREATE INDEX documents_by_content ON documents (content);
+)sql";
+
+constexpr char const* SQLITE_5 = R"sql(
 CREATE TRIGGER document_removed AFTER DELETE ON documents
 WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
     DELETE FROM document_contents WHERE number = old.content;
@@ -98,6 +103,20 @@ CREATE TRIGGER document_replaced AFTER UPDATE OF content ON documents
 WHEN NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) BEGIN
     DELETE FROM document_contents WHERE number = old.content;
 END;
+)sql";
+
+constexpr char const* POSTGRES_5 = R"sql(
+CREATE FUNCTION drop_document_content() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    IF NOT EXISTS (SELECT 1 FROM documents WHERE content = old.content) THEN
+        DELETE FROM document_contents WHERE number = old.content;
+    END IF;
+    RETURN NULL;
+END $$;
+CREATE TRIGGER document_removed AFTER DELETE ON documents
+FOR EACH ROW EXECUTE FUNCTION drop_document_content();
+CREATE TRIGGER document_replaced AFTER UPDATE OF content ON documents
+FOR EACH ROW WHEN (old.content <> new.content) EXECUTE FUNCTION drop_document_content();
 )sql";
 
 /// Letters in the order in which they were divided among the channels. Those of channels without a carrier
@@ -141,15 +160,17 @@ CREATE INDEX jobs_with_letters ON jobs (pack) WHERE letters_state = 'delivering'
 
 Database::DatabaseKind const& serviceDatabase() {
     static Database::DatabaseKind const kind{
-        "service database", APPLICATION_ID, {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, SCHEMA_5, SCHEMA_6}};
+        "service database",
+        APPLICATION_ID,
+        {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, {SCHEMA_5, SQLITE_5, POSTGRES_5}, SCHEMA_6}};
     return kind;
 }
 
-SQLite::Database openServiceDatabase(std::filesystem::path const& file) {
+std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path const& file) {
     SQLite::Database database =
         Database::openDatabase(file, serviceDatabase(), Database::Journal::WriteAhead);
     Database::requireUndamaged(database, serviceDatabase());
-    return database;
+    return std::make_unique<Database::SqliteConnection>(std::move(database));
 }
 
 } // namespace VlServiced

@@ -1,7 +1,10 @@
 #pragma once
 // The service's database file: its kind and the history of its schema.
 
-#include "programs/database/sqlite_file.h"
+#include "programs/database/connection.h"
+
+#include <filesystem>
+#include <memory>
 
 namespace VlServiced {
 
@@ -10,6 +13,6 @@ namespace VlServiced {
 Database::DatabaseKind const& serviceDatabase();
 
 /// Opens, or creates, the service's database and tests it for damage. Throws Database::DatabaseError.
-SQLite::Database openServiceDatabase(std::filesystem::path const& file);
+std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path const& file);
 
 } // namespace VlServiced

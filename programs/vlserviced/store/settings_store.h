@@ -1,9 +1,8 @@
 #pragma once
 // Settings nodes and their own values, as the database keeps them.
 
+#include "programs/database/connection.h"
 #include "vlservice/json/json.h"
-
-#include <SQLiteCpp/Database.h>
 
 #include <string>
 #include <vector>
@@ -30,7 +29,7 @@ struct SettingsNode {
 class SettingsStore {
 public:
     /// The database has to outlive the store.
-    explicit SettingsStore(SQLite::Database& database);
+    explicit SettingsStore(Database::Connection& database);
 
     bool contains(std::string const& id) const;
     /// Every node, the root among them, in the order of the texts.
@@ -71,7 +70,7 @@ private:
     /// How long the JSON texts of a node's parts are.
     long long bytesOf(std::string const& id) const;
 
-    SQLite::Database& database_;
+    Database::Connection& database_;
 };
 
 } // namespace VlServiced

@@ -6,6 +6,7 @@
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/pack_help.h"
 
+#include <SQLiteCpp/Database.h>
 #include <gtest/gtest.h>
 
 #include <fstream>

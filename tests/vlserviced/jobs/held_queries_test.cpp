@@ -33,8 +33,8 @@ protected:
     static constexpr long long LONG = 20'000;
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
     boost::asio::io_context io_;
     HeldQueries held_{io_, jobs_};
     int answers_ = 0;

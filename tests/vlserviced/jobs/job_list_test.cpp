@@ -43,10 +43,10 @@ protected:
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
-    VlServiced::LetterStore letters_{database_, jobs_};
-    VlServiced::SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
+    VlServiced::LetterStore letters_{*database_, jobs_};
+    VlServiced::SettingsStore store_{*database_};
     VlServiced::SettingsService settings_{store_};
 };
 

@@ -7,6 +7,7 @@
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/pack_help.h"
 
+#include <SQLiteCpp/Database.h>
 #include <gtest/gtest.h>
 
 #include <deque>
@@ -108,8 +109,8 @@ protected:
     fs::path packs_ = folder_ / "packs.db";
     fs::path outbox_ = folder_ / "outbox";
     fs::path upload_ = folder_ / "upload";
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
     json::Object settings_;
     std::deque<VlServiced::JobSurroundings::Work> work_;
     /// When it is there, what the readers were given waits in it.
@@ -344,7 +345,7 @@ TEST_F(JobRunnerTest, GoesOnBehindTheAcceptance) {
 TEST_F(JobRunnerTest, GoesOnBehindAContainerThatIsNotOnRecord) {
     acceptStored("p1");
     doWork();
-    database_.exec("UPDATE jobs SET state = 'accepted'");
+    database_->run("UPDATE jobs SET state = 'accepted'");
     startRunner();
     runner_->resume();
     doWork();
@@ -465,7 +466,7 @@ TEST_F(JobRunnerTest, RemovesWhatAnEarlierProcessLeftInTheOutbox) {
     acceptStored("p1");
     acceptStored("p2");
     doWork();
-    database_.exec("UPDATE jobs SET state = 'lodged' WHERE pack = 'p1'");
+    database_->run("UPDATE jobs SET state = 'lodged' WHERE pack = 'p1'");
     std::ofstream(outbox_ / "stranger.mailing") << "x";
     startRunner();
     runner_->resume();

@@ -138,7 +138,7 @@ protected:
         Protocol::JobsQuery query;
         query.ids = {id};
         query.letters = true;
-        VlServiced::SettingsStore store(database_);
+        VlServiced::SettingsStore store(*database_);
         VlServiced::SettingsService const settings(store);
         return listJobs(query, jobs_, letters_, settings, outbox_, now_).jobs.at(0);
     }
@@ -156,9 +156,9 @@ protected:
     fs::path upload_ = folder_ / "upload";
     std::vector<std::string> log_;
     Log::Sink formerSink_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
-    VlServiced::LetterStore letters_{database_, jobs_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
+    VlServiced::LetterStore letters_{*database_, jobs_};
     json::Object settings_;
     long long now_ = 1000;
     OtherSide other_;
@@ -425,13 +425,13 @@ TEST_F(LetterRunnerTest, BringsAJobUpToDateWhoseLastLetterAProcessHadJustRecorde
 
 TEST_F(LetterRunnerTest, KeepsALetterInHandWhoseOutcomeCannotBeRecorded) {
     send("p1", {"postal"});
-    database_.exec(
+    database_->run(
         "CREATE TEMP TRIGGER full BEFORE UPDATE ON letters BEGIN SELECT raise(FAIL, 'disk full'); END");
     doWork();
     letterRunner_->proceed();
     EXPECT_THAT(work_, IsEmpty());
     EXPECT_THAT(log_, testing::Contains(HasSubstr("What became of p1-1 cannot be recorded. ")));
-    database_.exec("DROP TRIGGER full");
+    database_->run("DROP TRIGGER full");
     letterRunner_->proceed();
     EXPECT_EQ(state("p1", 1), "accepted: thanks");
     EXPECT_THAT(other_.taken, ElementsAre("p1-1"));

@@ -1,3 +1,4 @@
+#include "programs/database/sqlite_connection.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
 
 #include "programs/base/error.h"
@@ -114,8 +115,8 @@ protected:
 
     TemporaryFolder folder_;
     fs::path file_ = folder_ / "packs.db";
-    SQLite::Database database_ =
-        Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback);
+    Database::SqliteConnection database_{
+        Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::JobStore jobs_{database_};
     std::shared_ptr<VlServiced::PackStore> store_;
     std::deque<std::function<void()>> work_;

@@ -70,8 +70,8 @@ protected:
     TemporaryFolder folder_;
     fs::path outbox_ = folder_ / "outbox";
     fs::path upload_ = folder_ / "upload";
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
     json::Object settings_;
     long long now_ = 1000 * DAY;
     VlServiced::Retention retention_{

@@ -51,13 +51,13 @@ protected:
             lines.push_back(document.node + ":" + document.name);
         return lines;
     }
-    int pieces() { return database_.execAndGet("SELECT count(*) FROM document_pieces").getInt(); }
+    int pieces() { return static_cast<int>(database_->number("SELECT count(*) FROM document_pieces")); }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore nodes_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore nodes_{*database_};
     VlServiced::SettingsService settings_{nodes_};
-    VlServiced::DocumentStore documents_{database_};
+    VlServiced::DocumentStore documents_{*database_};
     long long now_ = 1000;
     DocumentService service_{documents_, nodes_, settings_, [this] { return now_; }};
 };
@@ -233,8 +233,7 @@ TEST_F(DocumentServiceTest, HasNoRoomForMoreThanSoManyAtANode) {
 
 TEST_F(DocumentServiceTest, TellsOfADiskThatIsFullAndKeepsNothing) {
     put("a=acme", "old.pdf", "old");
-    database_.exec("PRAGMA max_page_count = " +
-                   std::to_string(database_.execAndGet("PRAGMA page_count").getInt() + 8));
+    database_->run("PRAGMA max_page_count = " + std::to_string(database_->number("PRAGMA page_count") + 8));
     EXPECT_EQ(put("a=acme", "x.pdf", std::string(500'000, 'x')),
               "the document \"x.pdf\" was not stored: database or disk is full; make room on the disk of the "
               "service");

@@ -33,8 +33,8 @@ protected:
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{*database_};
     SettingsService service_{store_};
 };
 
@@ -239,8 +239,8 @@ protected:
     static constexpr long long DAY = 86'400;
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore store_{*database_};
     long long now_ = 20'000 * DAY;
     VlServiced::SettingsService settings_{store_, [this] {
                                               return Policy::Moment{now_, [](long long) { return 0LL; }};

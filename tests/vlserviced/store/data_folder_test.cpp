@@ -92,7 +92,7 @@ TEST(DataFolder, TakesNoEmptyDatabaseForANewOne) {
 TEST(DataFolder, HoldsADatabaseForItsOwnerAlone) {
     TemporaryFolder temporary;
     fs::path const file = temporary / "service.db";
-    SQLite::Database const database = VlServiced::openServiceDatabase(file);
+    auto const database = VlServiced::openServiceDatabase(file);
     EXPECT_EQ(fs::status(file).permissions(), fs::perms(0600));
     EXPECT_EQ(fs::status(file.string() + "-wal").permissions(), fs::perms(0600));
 }

@@ -44,13 +44,13 @@ protected:
         return names;
     }
     int count(std::string const& table) {
-        return database_.execAndGet("SELECT count(*) FROM " + table).getInt();
+        return static_cast<int>(database_->number("SELECT count(*) FROM " + table));
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::SettingsStore nodes_{database_};
-    VlServiced::DocumentStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::SettingsStore nodes_{*database_};
+    VlServiced::DocumentStore store_{*database_};
 };
 
 TEST_F(DocumentStoreTest, KeepsADocumentAtANode) {

@@ -1,10 +1,9 @@
 #include "programs/vlserviced/store/job_store.h"
 
+#include "programs/database/sqlite_connection.h"
 #include "programs/vlserviced/store/schema.h"
 #include "tests/support/temporary_folder.h"
 
-#include <SQLiteCpp/Statement.h>
-#include <SQLiteCpp/Transaction.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sqlite3.h>
@@ -41,8 +40,8 @@ protected:
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    JobStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    JobStore store_{*database_};
 };
 
 TEST_F(JobStoreTest, RecordsAJobAsAccepted) {
@@ -253,8 +252,9 @@ TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
 /// How many tens of steps the database takes for a question.
 class StepCounter {
 public:
-    explicit StepCounter(SQLite::Database& database) : database_(database) {
-        sqlite3_progress_handler(database.getHandle(), 10, &StepCounter::count, this);
+    explicit StepCounter(Database::Connection& database)
+        : database_(static_cast<Database::SqliteConnection&>(database).file()) {
+        sqlite3_progress_handler(database_.getHandle(), 10, &StepCounter::count, this);
     }
     ~StepCounter() { sqlite3_progress_handler(database_.getHandle(), 0, nullptr, nullptr); }
     StepCounter(StepCounter const&) = delete;
@@ -279,13 +279,13 @@ TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
         {"/srv/packs", "packs.db", {}},
     };
     auto const addJobs = [this](int from, int to) {
-        SQLite::Transaction transaction(database_);
+        Database::Transaction transaction(*database_);
         for (int i = from; i < to; ++i)
             store_.accept(job("job " + std::to_string(i), i));
         transaction.commit();
     };
     auto const steps = [this](JobFilter const& filter) {
-        StepCounter const counter(database_);
+        StepCounter const counter(*database_);
         store_.matching(filter, 10);
         return counter.steps();
     };
@@ -300,7 +300,7 @@ TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
 
 TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
     auto const addHeld = [this](int from, int to) {
-        SQLite::Transaction transaction(database_);
+        Database::Transaction transaction(*database_);
         for (int i = from; i < to; ++i) {
             Job held = job("job " + std::to_string(i), i);
             held.due = 1000 + i;
@@ -310,7 +310,7 @@ TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
         transaction.commit();
     };
     auto const steps = [this](auto const& question) {
-        StepCounter const counter(database_);
+        StepCounter const counter(*database_);
         question();
         return counter.steps();
     };
@@ -331,13 +331,11 @@ TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
 }
 
 TEST_F(JobStoreTest, OrdersWhatIsDueByItsIndexAlone) {
-    SQLite::Statement plan(
-        database_,
-        "EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due WHERE state = 'held' AND due <= 7 "
-        "ORDER BY due, pack");
+    Database::Rows plan = database_->query("EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due "
+                                           "WHERE state = 'held' AND due <= 7 ORDER BY due, pack");
     std::vector<std::string> steps;
-    while (plan.executeStep())
-        steps.push_back(plan.getColumn(3).getString());
+    while (plan.next())
+        steps.push_back(plan.text(3));
     EXPECT_THAT(steps, ElementsAre("SEARCH jobs USING INDEX jobs_by_due (due<?)"));
 }
 

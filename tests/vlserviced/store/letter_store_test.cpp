@@ -43,9 +43,9 @@ protected:
     }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
-    VlServiced::JobStore jobs_{database_};
-    LetterStore letters_{database_, jobs_};
+    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
+    VlServiced::JobStore jobs_{*database_};
+    LetterStore letters_{*database_, jobs_};
 };
 
 TEST_F(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
@@ -155,18 +155,18 @@ TEST_F(LetterStoreTest, TakesNoJobForEndedWhoseLettersAreStillOnTheirWay) {
 
 TEST_F(LetterStoreTest, LetsLettersGoWithTheirJob) {
     divide("p1", {{1, "postal", true}});
-    database_.exec("DELETE FROM jobs");
+    database_->run("DELETE FROM jobs");
     EXPECT_FALSE(letters_.find({"p1", 1}));
 }
 
 TEST_F(LetterStoreTest, LooksForWaitingLettersByTheIndexThatHoldsThem) {
-    SQLite::Statement query(database_,
-                            "EXPLAIN QUERY PLAN SELECT * FROM letters INDEXED BY letters_to_go WHERE "
-                            "channel = 'x' AND due <= 5 AND state = 'waiting' AND by_carrier = 1 "
-                            "ORDER BY due, id LIMIT 3");
+    Database::Rows rows =
+        database_->query("EXPLAIN QUERY PLAN SELECT * FROM letters INDEXED BY letters_to_go WHERE "
+                         "channel = 'x' AND due <= 5 AND state = 'waiting' AND by_carrier = 1 "
+                         "ORDER BY due, id LIMIT 3");
     std::string plan;
-    while (query.executeStep())
-        plan += query.getColumn(3).getString() + '\n';
+    while (rows.next())
+        plan += rows.text(3) + '\n';
     EXPECT_EQ(plan, "SEARCH letters USING INDEX letters_to_go (channel=? AND due<?)\n");
 }
 

@@ -14,7 +14,9 @@ using VlServiced::SettingsStore;
 
 class SettingsStoreTest : public testing::Test {
 protected:
-    SQLite::Database open() { return VlServiced::openServiceDatabase(folder_ / "service.db"); }
+    std::unique_ptr<Database::Connection> open() {
+        return VlServiced::openServiceDatabase(folder_ / "service.db");
+    }
     std::vector<std::string> chainIds(std::string const& id) {
         std::vector<std::string> ids;
         for (VlServiced::SettingsLevel const& level : store_.chain(id))
@@ -31,8 +33,8 @@ protected:
     json::Value part(std::string const& id, char const* part) { return store_.parts(id).get(part); }
 
     TemporaryFolder folder_;
-    SQLite::Database database_ = open();
-    SettingsStore store_{database_};
+    std::unique_ptr<Database::Connection> database_ = open();
+    SettingsStore store_{*database_};
 };
 
 TEST_F(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(nodeIds(), ElementsAre("")); }
@@ -126,8 +128,8 @@ TEST_F(SettingsStoreTest, KeepsTheServicesOwnSettings) {
 
 TEST_F(SettingsStoreTest, IsThereForTheNextThatOpensTheFile) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "grüße"}});
-    SQLite::Database again = open();
-    EXPECT_EQ(SettingsStore(again).parts("a=acme").get("app"), (json::Object{{"descr", "grüße"}}));
+    auto const again = open();
+    EXPECT_EQ(SettingsStore(*again).parts("a=acme").get("app"), (json::Object{{"descr", "grüße"}}));
 }
 
 TEST_F(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
@@ -160,7 +162,7 @@ TEST_F(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
         "there is no room for more nodes: 20000 are possible, whose ids have 4194304 bytes "
         "together; remove some first";
     // With the root there are 19,999 then.
-    database_.exec("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 19998) "
+    database_->run("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 19998) "
                    "INSERT INTO nodes (id, parent) SELECT 'a=' || i, '' FROM n");
     EXPECT_EQ(failureOf([&] { store_.add("u=bob/a=acme"); }), refusal);
     EXPECT_FALSE(store_.contains("a=acme"));
@@ -172,7 +174,7 @@ TEST_F(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
 }
 
 TEST_F(SettingsStoreTest, KeepsIdsOfABoundedSize) {
-    database_.exec("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 4200) "
+    database_->run("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 4200) "
                    "INSERT INTO nodes (id, parent) SELECT 'a=' || i || printf('%.998c', 'x'), '' FROM n");
     EXPECT_THAT(failureOf([&] { store_.add("a=acme"); }),
                 testing::StartsWith("there is no room for more nodes"));

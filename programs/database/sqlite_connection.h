@@ -1,0 +1,44 @@
+#pragma once
+// A connection to an SQLite file.
+
+#include "programs/database/connection.h"
+#include "programs/database/sqlite_file.h"
+
+#include <SQLiteCpp/Statement.h>
+
+#include <ctime>
+#include <functional>
+#include <map>
+
+namespace Database {
+
+class SqliteConnection : public Connection {
+public:
+    explicit SqliteConnection(SQLite::Database database);
+    ~SqliteConnection() override;
+
+    Backend backend() const override { return Backend::Sqlite; }
+    void run(std::string const& script) override;
+    void emptyLog() override { run("PRAGMA wal_checkpoint(TRUNCATE)"); }
+    SQLite::Database& file() { return database_; }
+
+private:
+    using Statement = std::unique_ptr<SQLite::Statement>;
+    class StatementRows;
+
+    std::unique_ptr<Rows::Cursor> select(std::string const& sql, Values const& values) override;
+    long long execute(std::string const& sql, Values const& values) override;
+    void begin(Isolation isolation) override;
+    void commit() override;
+    void rollback() noexcept override;
+
+    /// A statement with its values, which nobody else has.
+    Statement prepared(std::string const& sql, Values const& values);
+    void giveBack(std::string const& sql, Statement statement) noexcept;
+
+    SQLite::Database database_;
+    /// Those that are not in use, by their texts.
+    std::map<std::string, Statement> idle_;
+};
+
+} // namespace Database
