@@ -2,6 +2,7 @@
 #include "programs/carriers/carrier.h"
 #include "programs/carriers/command_carrier.h"
 #include "programs/carriers/folder_carrier.h"
+#include "programs/carriers/sftp_carrier.h"
 
 namespace Carriers {
 
@@ -9,6 +10,8 @@ std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) 
     switch (settings.type) {
     case Protocol::CarrierType::Folder:
         return std::make_unique<FolderCarrier>(settings.folder, settings.folderIdentity);
+    case Protocol::CarrierType::Sftp:
+        return std::make_unique<SftpCarrier>(settings);
     case Protocol::CarrierType::Command:
         return std::make_unique<CommandCarrier>(settings);
     }

@@ -1,12 +1,16 @@
 #include "programs/protocol/carrier.h"
 
+#include "programs/base/host_port.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/quoting.h"
+#include "programs/base/safe_name.h"
 #include "programs/protocol/query.h"
 #include "programs/protocol/rows.h"
 
 #include <algorithm>
 #include <iterator>
+#include <sstream>
+#include <string_view>
 #include <utility>
 
 namespace Protocol {
@@ -30,6 +34,61 @@ struct UnitForm {
         return node.textOrEmpty() == "letter" || node.textOrEmpty() == "mailing";
     }
     static std::string wanted() { return "\"letter\" or \"mailing\""; }
+};
+
+bool isLetterOrDigit(char c) {
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9');
+}
+
+bool isMadeOf(std::string_view text, std::string_view others) {
+    return std::ranges::all_of(
+        text, [&](char c) { return isLetterOrDigit(c) || others.find(c) != std::string_view::npos; });
+}
+
+bool isHostWithPort(std::string_view text) {
+    return Base::hostPortIn(text) || (text.find(':') == std::string_view::npos && Base::isHost(text));
+}
+
+/// A folder of a user on another machine, without a password.
+struct SftpUrlForm {
+    static constexpr std::string_view SCHEME = "sftp://";
+
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        if (!text.starts_with(SCHEME) || text.size() > CarrierSettings::MAX_PATH_BYTES)
+            return false;
+        std::string_view const rest = std::string_view(text).substr(SCHEME.size());
+        std::size_t const at = rest.find('@');
+        std::size_t const slash = rest.find('/');
+        return at != std::string_view::npos && at > 0 && slash != std::string_view::npos && at < slash &&
+               isMadeOf(rest.substr(0, at), "._-") && isHostWithPort(rest.substr(at + 1, slash - at - 1)) &&
+               isMadeOf(rest.substr(slash), "/._-~") && rest.ends_with('/');
+    }
+    static std::string wanted() {
+        return "sftp://USER@HOST:PORT/FOLDER/, with letters, digits and \"._-~/\" in the folder";
+    }
+};
+
+/// Of 32 bytes in base64.
+struct HostKeyForm {
+    static constexpr std::string_view BEGIN = "SHA256:";
+    static constexpr std::size_t DIGITS = 43;
+
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        return text.starts_with(BEGIN) && text.size() == BEGIN.size() + DIGITS &&
+               isMadeOf(std::string_view(text).substr(BEGIN.size()), "+/");
+    }
+    static std::string wanted() { return "\"SHA256:\" and 43 characters, as ssh-keygen -l prints it"; }
+};
+
+/// A file that only the service may read, or what the system's manager hands over.
+struct SecretForm {
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        return PathForm::fits(node) || (!text.empty() && Base::safeFileName(text) == text);
+    }
+    static std::string wanted() { return "an absolute path, or the name of a credential"; }
 };
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
@@ -80,6 +139,12 @@ struct CarrierSettings::Keys {
         Asked{"folder", &CarrierSettings::folder, PathForm{}},
         Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
     };
+    static constexpr std::tuple SFTP{
+        Asked{"url", &CarrierSettings::url, SftpUrlForm{}},
+        Asked{"host_key", &CarrierSettings::hostKey, HostKeyForm{}},
+        Asked{"identity_file", &CarrierSettings::identityFile, SecretForm{}},
+        Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
+    };
     static constexpr std::tuple COMMAND{
         Asked{"program", &CarrierSettings::program, PathForm{}},
         Asked{"arguments", &CarrierSettings::arguments, TextsForm{100}},
@@ -120,6 +185,7 @@ constexpr TypeRow typeRow(CarrierType type, char const* name, char const* requir
 
 constexpr TypeRow TYPES[] = {
     typeRow<CarrierSettings::Keys::FOLDER>(CarrierType::Folder, "folder", "folder"),
+    typeRow<CarrierSettings::Keys::SFTP>(CarrierType::Sftp, "sftp", "url host_key identity_file"),
     typeRow<CarrierSettings::Keys::COMMAND>(CarrierType::Command, "command", "program"),
 };
 
@@ -142,9 +208,11 @@ void requireKeys(json::Object const& object, TypeRow const& row) {
         if (!row.hasKey(key))
             throw Base::Error("a carrier of the type " + std::string(row.name) + " has no key " +
                               Base::inQuotes(Base::oneLine(key)));
-    if (!object.get(row.required))
-        throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
-                          Base::inQuotes(row.required));
+    std::istringstream required(row.required);
+    for (std::string key; required >> key;)
+        if (!object.get(key))
+            throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
+                              Base::inQuotes(key));
 }
 
 bool isChannel(std::string const& name) {

@@ -14,6 +14,8 @@ namespace Protocol {
 enum class CarrierType {
     /// Files in a folder that a print shop takes them from.
     Folder,
+    /// The same in a folder of another machine.
+    Sftp,
     /// A program that is run for each letter.
     Command,
 };
@@ -51,6 +53,12 @@ struct CarrierSettings {
     std::string folder;
     /// Which of all folders of that name it is, as the service has it on record; no key.
     std::string folderIdentity;
+    /// Where the other side is.
+    std::string url;
+    /// "SHA256:...": the only one that the other side may have.
+    std::string hostKey;
+    /// An absolute path, or the name of a credential.
+    std::string identityFile;
     /// "letter" or "mailing".
     std::string unit = "letter";
 

@@ -2,6 +2,7 @@
 
 #include "programs/base/read_file.h"
 #include "programs/carriers/control_file.h"
+#include "tests/carriers/parcel_help.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/small_disk.h"
 #include "tests/support/temporary_folder.h"
@@ -11,7 +12,6 @@
 #include <gtest/gtest.h>
 
 #include <fstream>
-#include <set>
 
 namespace {
 
@@ -22,34 +22,6 @@ using Carriers::csvField;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::StartsWith;
-
-Carriers::Parcel parcelOf(std::string const& key, std::vector<std::string> const& addresses) {
-    Carriers::Parcel parcel;
-    parcel.key = key;
-    parcel.mailing = "p1";
-    parcel.document = "%PDF of " + key;
-    for (std::string const& address : addresses) {
-        Carriers::OutgoingLetter& letter = parcel.letters.emplace_back();
-        letter.number = static_cast<long long>(parcel.letters.size());
-        letter.key = "p1-" + std::to_string(letter.number);
-        letter.address = address;
-        letter.firstPage = ++parcel.pages;
-        letter.pages = 1;
-        letter.sheets = 1;
-    }
-    return parcel;
-}
-
-/// What can be handed over again is put on record afterwards alone.
-void noRecord() { ADD_FAILURE() << "was put on record before"; }
-
-std::set<std::string> namesIn(fs::path const& folder) {
-    std::set<std::string> names;
-    for (fs::directory_entry const& entry : fs::directory_iterator(folder))
-        names.insert(entry.path().filename().string());
-    names.erase(Base::MarkedFolder::MARK_FILE);
-    return names;
-}
 
 /// Knows the folder as it is.
 Carriers::FolderCarrier carrierOf(fs::path const& folder) {

@@ -1,5 +1,6 @@
 // A service that hands letters over to carriers, ended at any of the calls that make something durable or
 // visible: what the other side has of them is counted.
+#include "tests/carriers/ssh_server.h"
 #include "tests/faults/fault.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/letter_help.h"
@@ -48,15 +49,15 @@ protected:
         return {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.path().string()};
     }
 
+    virtual json::Object shopCarrier() const { return {{"type", "folder"}, {"folder", shop_.string()}}; }
+
     /// Says what is wanted, as a client does that had no answer, and waits for its end. False when the
     /// service was gone before.
     bool sendAll(ServiceProcess const& service) {
         try {
             auto const client = clientOf(service, data_);
-            client->call<Ipc::SetSvcCfg>(json::Object{
-                {"upload_folder", upload_.string()},
-                {"carriers",
-                 json::Object{{"postal", json::Object{{"type", "folder"}, {"folder", shop_.string()}}}}}});
+            client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()},
+                                                      {"carriers", json::Object{{"postal", shopCarrier()}}}});
             for (char const* const id : {"p1", "p2"})
                 client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", id);
             client->call<Ipc::UploadQueued>(folder_.path().string(), "packs.db");
@@ -169,6 +170,48 @@ public:
 
 private:
     void TestBody() override {}
+};
+
+/// A print shop that files are put to over ssh.
+class LettersOverSsh : public CarriedLetters {
+public:
+    LettersOverSsh() {
+        fs::permissions(shop_, fs::perms(0777));
+        server_.emplace(folder_ / "ssh", shop_);
+    }
+
+    /// False when the service got to the end alive.
+    bool killedAt(int piece) {
+        std::string const when = "killed at piece " + std::to_string(piece);
+        bool survived = false;
+        {
+            ServiceProcess service(arguments());
+            server_->relay().onPiece([&](int number) {
+                if (number == piece)
+                    service.signal(SIGKILL);
+                return true;
+            });
+            survived = sendAll(service);
+            server_->relay().onPiece({});
+            service.signal(SIGKILL);
+            service.wait();
+        }
+        takeLetters(when);
+        finish(when);
+        return !survived;
+    }
+
+private:
+    void TestBody() override {}
+
+    json::Object shopCarrier() const override {
+        return {{"type", "sftp"},
+                {"url", server_->url()},
+                {"host_key", server_->hostKey()},
+                {"identity_file", server_->identityFile().string()}};
+    }
+
+    std::optional<SshServer> server_;
 };
 
 /// A program that counts how often it has had each letter.
@@ -288,6 +331,16 @@ TEST_P(ServiceThatIsKilledAmongLetters, HandsEachOverUnderItsKeyAndLosesNone) {
         call += 4;
     // Each letter is three files, which are synced, renamed and put on record.
     EXPECT_GT(call, 100);
+}
+
+TEST_P(ServiceThatIsKilledAmongLetters, PutsEachToAnotherMachineUnderItsKeyAndLosesNone) {
+    if (!SshServer::whyNot().empty())
+        GTEST_SKIP() << SshServer::whyNot();
+    int piece = GetParam();
+    while (LettersOverSsh().killedAt(piece) && !HasFailure())
+        piece += 4;
+    // A greeting, keys, a user, and three files of each letter.
+    EXPECT_GT(piece, 100);
 }
 
 TEST_P(ServiceThatIsKilledAmongLetters, GivesNoneToAProgramTwiceAndTellsOfOneAsUncertainAtMost) {
