@@ -70,10 +70,12 @@ public:
     }
 
     void accept(std::string const& id) {
-        runner_.accept({folder_.string(), "packs.db", id}, [&](std::string const& failure) {
-            if (!failure.empty())
-                std::printf("refused: %s\n", failure.c_str()), std::exit(1);
-        });
+        runner_.accept(
+            {folder_.string(), "packs.db", id}, [](std::string const&) {},
+            [&](std::string const& failure) {
+                if (!failure.empty())
+                    std::printf("refused: %s\n", failure.c_str()), std::exit(1);
+            });
     }
     /// What of it the policies take.
     void decide(Mailing::PackDatabaseReader& pack) {

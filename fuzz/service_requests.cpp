@@ -2,6 +2,7 @@
 // and several requests, each ended by a zero byte, meet the same database. Whatever they say, the settings
 // can be read afterwards.
 
+#include "programs/database/sqlite_connection.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/settings/parts.h"
 #include "programs/vlserviced/store/schema.h"
@@ -18,7 +19,7 @@ namespace {
 
 /// A service in memory whose jobs never get to work.
 struct MemoryService {
-    SQLite::Database database{
+    Database::SqliteConnection database{
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::SettingsStore store{database};
     VlServiced::SettingsService settings{store};
@@ -44,8 +45,12 @@ struct MemoryService {
                                      [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                      [] { return 1LL; }, [](std::string const&) { return std::nullopt; },
                                      [](std::string const&) { return false; }}};
-    std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, documents, jobs, runner, letterRunner, packs, "/missing/outbox", [] { return 1LL; });
+    VlServiced::TokenStore tokenStore{database};
+    VlServiced::TokenService tokens{tokenStore, std::string(32, 't'), [] { return 1LL; }};
+    VlServiced::Access access{[] { return 1LL; }};
+    std::shared_ptr<VlServiced::Processor> processor =
+        std::make_shared<VlServiced::Processor>(settings, documents, tokens, access, jobs, runner,
+                                                letterRunner, packs, "/missing/outbox", [] { return 1LL; });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

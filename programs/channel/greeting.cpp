@@ -1,7 +1,10 @@
 #include "programs/channel/greeting.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/hex.h"
 #include "programs/channel/message_text.h"
+#include "programs/channel/token.h"
 
 #include <utility>
 
@@ -16,10 +19,16 @@ GreetingStep goOn(Kind kind, std::uint32_t sequence, json::Object const& text) {
     return {Verdict::GoesOn, GreetingStep::Reply{kind, sequence, print(text)}, {}};
 }
 
-std::string textUnder(char const* key, Frame const& message, std::uint32_t sequence) {
+json::Object requestIn(Frame const& message, std::uint32_t sequence) {
     if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
         throw Base::Error("The greeting is missing.");
-    return parse(message.text).get(key).toString();
+    return parse(message.text);
+}
+
+/// The same terms between two who share something else.
+Terms sharing(std::string secret, Terms terms) {
+    terms.token = std::move(secret);
+    return terms;
 }
 
 /// Without TLS version 2 is held by the addresses of both ends and by seals.
@@ -64,30 +73,69 @@ GreetingStep ServiceGreeting::take(Frame const& message) {
 }
 
 GreetingStep ServiceGreeting::answerChallenge(Frame const& message) {
-    clientNonce_ = textUnder(NONCE, message, CHALLENGE);
+    json::Object const request = requestIn(message, CHALLENGE);
+    clientNonce_ = request.get(NONCE).toString();
+    lookUpToken(request.get(TOKEN_ID));
+    Terms const terms = keys_ ? sharing(keys_->service, terms_) : terms_;
     GreetingStep step =
         goOn(Kind::Response, CHALLENGE,
-             {{NONCE, nonce_}, {PROOF, makeProof(Side::Service, terms_, clientNonce_, nonce_)}});
+             {{NONCE, nonce_}, {PROOF, makeProof(Side::Service, terms, clientNonce_, nonce_)}});
     state_ = State::Proof;
     return step;
 }
 
+void ServiceGreeting::lookUpToken(json::Value const& id) {
+    if (!id)
+        return;
+    tokenId_ = id.toString();
+    if (tokens_)
+        keys_ = tokens_(tokenId_);
+    if (!keys_)
+        throw Base::Error("Its access token is none of this service, or was revoked.");
+}
+
+std::string ServiceGreeting::provenSecret(std::string const& proof) const {
+    if (!keys_)
+        return isSameProof(proof, makeProof(Side::Client, terms_, clientNonce_, nonce_)) ? terms_.token
+                                                                                         : std::string();
+    std::string key = keyShownBy(proof, sharing(keys_->clientDigest, terms_), clientNonce_, nonce_);
+    return isSameProof(Base::sha256(key), Base::toHex(keys_->clientDigest.data(), keys_->clientDigest.size()))
+               ? key
+               : std::string();
+}
+
 GreetingStep ServiceGreeting::checkProof(Frame const& message) {
-    std::string const expected = makeProof(Side::Client, terms_, clientNonce_, nonce_);
-    if (!isSameProof(textUnder(PROOF, message, PROVING), expected))
+    std::string const secret = provenSecret(requestIn(message, PROVING).get(PROOF).toString());
+    if (secret.empty())
         return refusal("Its access token is not the one of this service.");
     bool const tells = takesData_ == TakesData::Yes && terms_.version > VERSION_1;
     json::Object const welcome = tells ? json::Object{{TAKES_DATA, true}} : json::Object();
     return {Verdict::Welcome,
             GreetingStep::Reply{Kind::Response, PROVING, print(welcome)},
             {},
-            sealsFor(terms_, clientNonce_, nonce_)};
+            sealsFor(sharing(secret, terms_), clientNonce_, nonce_)};
 }
 
 // --- the client
 
+ClientGreeting::ClientGreeting(Terms terms, std::string nonce)
+    : terms_(std::move(terms)), nonce_(std::move(nonce)), tokenId_(tokenIdOf(terms_.token)) {
+    if (tokenId_.empty())
+        return;
+    keys_ = keysOf(terms_.token);
+    clientKey_ = clientKeyOf(terms_.token);
+}
+
 GreetingStep::Reply ClientGreeting::challenge() const {
-    return {Kind::Request, CHALLENGE, print({{NONCE, nonce_}})};
+    json::Object text{{NONCE, nonce_}};
+    if (keys_)
+        text.set(TOKEN_ID, tokenId_);
+    return {Kind::Request, CHALLENGE, print(text)};
+}
+
+std::string ClientGreeting::proof() const {
+    return keys_ ? makeKeyProof(clientKey_, sharing(keys_->clientDigest, terms_), nonce_, serviceNonce_)
+                 : makeProof(Side::Client, terms_, nonce_, serviceNonce_);
 }
 
 GreetingStep ClientGreeting::take(Frame const& message) {
@@ -112,19 +160,19 @@ GreetingStep ClientGreeting::welcomed(Frame const& message) const {
     return {Verdict::Welcome,
             std::nullopt,
             {},
-            sealsFor(terms_, nonce_, serviceNonce_),
+            sealsFor(keys_ ? sharing(clientKey_, terms_) : terms_, nonce_, serviceNonce_),
             takesData && terms_.version > VERSION_1};
 }
 
 GreetingStep ClientGreeting::prove(Frame const& message) {
     json::Object const answer = answerIn(message, CHALLENGE);
     serviceNonce_ = answer.get(NONCE).toString();
-    if (!isSameProof(answer.get(PROOF).toString(), makeProof(Side::Service, terms_, nonce_, serviceNonce_)))
+    Terms const terms = keys_ ? sharing(keys_->service, terms_) : terms_;
+    if (!isSameProof(answer.get(PROOF).toString(), makeProof(Side::Service, terms, nonce_, serviceNonce_)))
         return refusal(isHeldByAddresses(terms_)
                            ? "Whoever answers there does not know our access token, or passes us on."
                            : "Whoever answers there does not know our access token.");
-    GreetingStep step =
-        goOn(Kind::Request, PROVING, {{PROOF, makeProof(Side::Client, terms_, nonce_, serviceNonce_)}});
+    GreetingStep step = goOn(Kind::Request, PROVING, {{PROOF, proof()}});
     state_ = State::Proof;
     return step;
 }

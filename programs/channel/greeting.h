@@ -1,7 +1,7 @@
 #pragma once
 // The greeting, by which both sides prove that they know the access token before anything else is said:
 //
-//     client:  {"nonce"}              request 0
+//     client:  {"nonce"}              request 0      with "token", the id of a token that has one
 //     service: {"nonce", "proof"}     response 0
 //     client:  {"proof"}              request 1
 //     service: {}                     response 1, or an error
@@ -13,8 +13,10 @@
 #include "programs/channel/frame.h"
 #include "programs/channel/proof.h"
 #include "programs/channel/seal.h"
+#include "vlservice/json/json.h"
 
 #include <cstdint>
+#include <functional>
 #include <optional>
 #include <string>
 #include <utility>
@@ -24,6 +26,7 @@ namespace Channel {
 constexpr char const* NONCE = "nonce";
 constexpr char const* PROOF = "proof";
 constexpr char const* TAKES_DATA = "data";
+constexpr char const* TOKEN_ID = "token";
 
 constexpr std::uint32_t CHALLENGE = 0;
 constexpr std::uint32_t PROVING = 1;
@@ -57,25 +60,38 @@ struct GreetingStep {
 
 enum class TakesData { No, Yes };
 
-/// The side that lets in.
+/// What a service keeps of its token of that id; nothing when there is none.
+using TokenLookup = std::function<std::optional<TokenKeys>(std::string const& id)>;
+
+/// The side that lets in: who knows the token of the terms, or one of those that have an id.
 class ServiceGreeting {
 public:
     /// The nonce is new for each connection.
-    ServiceGreeting(Terms terms, std::string nonce, TakesData takesData = TakesData::No)
-        : terms_(std::move(terms)), nonce_(std::move(nonce)), takesData_(takesData) {}
+    ServiceGreeting(Terms terms, std::string nonce, TakesData takesData = TakesData::No,
+                    TokenLookup tokens = {})
+        : terms_(std::move(terms)), nonce_(std::move(nonce)), takesData_(takesData),
+          tokens_(std::move(tokens)) {}
 
     /// Takes the client's next message. After a welcome or a refusal everything is refused.
     GreetingStep take(Frame const& message);
+    /// The id of the token that the client shows; empty for that of the terms.
+    std::string const& tokenId() const { return tokenId_; }
 
 private:
     enum class State { Challenge, Proof, Over };
 
     GreetingStep answerChallenge(Frame const& message);
+    void lookUpToken(json::Value const& id);
     GreetingStep checkProof(Frame const& message);
+    /// What the client's proof shows that it knows; empty when it is wrong.
+    std::string provenSecret(std::string const& proof) const;
 
     Terms terms_;
     std::string nonce_;
     TakesData takesData_;
+    TokenLookup tokens_;
+    std::string tokenId_;
+    std::optional<TokenKeys> keys_;
     std::string clientNonce_;
     State state_ = State::Challenge;
 };
@@ -84,7 +100,7 @@ private:
 class ClientGreeting {
 public:
     /// The nonce is new for each connection.
-    ClientGreeting(Terms terms, std::string nonce) : terms_(std::move(terms)), nonce_(std::move(nonce)) {}
+    ClientGreeting(Terms terms, std::string nonce);
 
     /// What the greeting begins with.
     GreetingStep::Reply challenge() const;
@@ -96,10 +112,15 @@ private:
 
     GreetingStep prove(Frame const& message);
     GreetingStep welcomed(Frame const& message) const;
+    std::string proof() const;
 
     Terms terms_;
     std::string nonce_;
     std::string serviceNonce_;
+    std::string tokenId_;
+    /// Of a token that has an id.
+    std::string clientKey_;
+    std::optional<TokenKeys> keys_;
     State state_ = State::Challenge;
 };
 

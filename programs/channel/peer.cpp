@@ -45,12 +45,12 @@ public:
     State(asio::io_context& io, std::weak_ptr<Peer> peer) : io_(io), peer_(std::move(peer)) {}
     ~State() { end("The service gave no answer."); }
 
-    void end(std::optional<std::string> failure) {
+    void end(std::optional<std::string> failure, Peer::Telling telling = Peer::Telling::Log) {
         if (isEnded_.exchange(true) || peer_.expired())
             return;
-        asio::dispatch(io_, [weak = peer_, failure = std::move(failure)] {
+        asio::dispatch(io_, [weak = peer_, failure = std::move(failure), telling] {
             if (auto const peer = weak.lock())
-                peer->answered(failure);
+                peer->answered(failure, telling);
         });
     }
 
@@ -96,6 +96,7 @@ void DataStored::fail(std::string const& reason) const { state_->end(reason); }
 
 void Answer::operator()() const { state_->end(std::nullopt); }
 void Answer::fail(std::string const& reason) const { state_->end(reason); }
+void Answer::refuse(std::string const& reason) const { state_->end(reason, Peer::Telling::Nobody); }
 
 // --- from connection to greeting
 
@@ -247,7 +248,8 @@ void Peer::onMessage(Frame const& message) {
 void Peer::onGreeting(Frame const& message) {
     if (!greeting_) {
         link_->speak(link_->heardVersion());
-        greeting_.emplace(terms(), makeNonce(), context_->dataHandler() ? TakesData::Yes : TakesData::No);
+        greeting_.emplace(terms(), makeNonce(), context_->dataHandler() ? TakesData::Yes : TakesData::No,
+                          context_->settings().tokens);
     }
     GreetingStep const step = greeting_->take(message);
     switch (step.verdict) {
@@ -255,6 +257,7 @@ void Peer::onGreeting(Frame const& message) {
         return write(step.reply->frame(), [this] { receive(); });
     case GreetingStep::Verdict::Welcome:
         isKnown_ = true;
+        tokenId_ = greeting_->tokenId();
         context_->know(shared_from_this());
         return write(step.reply->frame(), [this, seals = step.seals] { onWelcome(seals); });
     case GreetingStep::Verdict::Refused:
@@ -318,11 +321,11 @@ void Peer::read(std::shared_ptr<Ipc::CmdI> cmd, Message which,
     taken(parse(request_->message.text));
 }
 
-void Peer::answered(std::optional<std::string> const& failure) {
+void Peer::answered(std::optional<std::string> const& failure, Telling telling) {
     if (!request_ || state_ != State::Ready)
         return;
     if (failure)
-        return refuseRequest(*failure);
+        return refuseRequest(*failure, telling);
     try {
         request_->cmd->sendResp();
     } catch (std::exception const& e) {
@@ -354,8 +357,9 @@ void Peer::tellGone(std::function<void()> const& gone) const {
 
 void Peer::submit(std::shared_ptr<Ipc::CmdI> cmd) { cmd->onTransferError("A service sends no requests."); }
 
-void Peer::refuseRequest(std::string const& reason) {
-    log(FAILED, "Request " + std::to_string(request_->message.command) + " failed: " + reason);
+void Peer::refuseRequest(std::string const& reason, Telling telling) {
+    if (telling == Telling::Log)
+        log(FAILED, "Request " + std::to_string(request_->message.command) + " failed: " + reason);
     Frame const to = request_->message;
     request_->isAnswered = true;
     write({to.command, Kind::Error, to.sequence, printError(reason)}, [this] { endRequest(); });

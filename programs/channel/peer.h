@@ -62,8 +62,11 @@ public:
     void makeWay();
     /// Closes, with a line in the log.
     void giveUp(std::string const& reason);
+    std::string const& tokenId() const { return tokenId_; }
+    /// Whether a line of the log tells of a failure.
+    enum class Telling { Log, Nobody };
     /// The handling has ended, with the reason when it failed.
-    void answered(std::optional<std::string> const& failure);
+    void answered(std::optional<std::string> const& failure, Telling telling = Telling::Log);
     /// What became of data that counts that many bytes. Failures of another round than the one at hand are
     /// those of pieces that nobody waits for any more.
     void dataStored(std::uint32_t sequence, std::size_t size, std::uint32_t round,
@@ -131,7 +134,7 @@ private:
     template<typename Step>
     void orGiveUp(Step step);
     void setDeadline(std::chrono::milliseconds time, std::string reason);
-    void refuseRequest(std::string const& reason);
+    void refuseRequest(std::string const& reason, Telling telling = Telling::Log);
     void tellGone(std::function<void()> const& gone) const;
     void endRequest();
     /// Tells the peer and the log what is wrong with it, and closes.
@@ -153,6 +156,7 @@ private:
     std::string dueReason_;
     bool isInsideMessage_ = false;
     std::optional<ServiceGreeting> greeting_;
+    std::string tokenId_;
     Ends ends_;
     std::optional<Request> request_;
     std::size_t reserved_ = 0;

@@ -38,13 +38,45 @@ std::string code(std::string label, Terms const& terms, std::string_view clientN
                                                        terms.clientAddress, terms.serviceAddress}));
 }
 
+/// The proof's bytes for somebody who has the token of the terms.
+std::string proofBytes(Side side, Terms const& terms, std::string_view clientNonce,
+                       std::string_view serviceNonce) {
+    if (terms.version == 1)
+        return hmac(terms.token, joined(nameOf(side), {clientNonce, serviceNonce, terms.fingerprint}));
+    return code(versionLabel(terms, "proof", side), terms, clientNonce, serviceNonce);
+}
+
+/// Of the same length.
+std::string combined(std::string_view a, std::string_view b) {
+    std::string bytes(a);
+    for (std::size_t i = 0; i < bytes.size(); ++i)
+        bytes[i] = static_cast<char>(bytes[i] ^ b[i]);
+    return bytes;
+}
+
 } // namespace
+
+TokenKeys keysOf(std::string_view token) {
+    return {hmac(token, "VLCH token service"), Base::fromHex(Base::sha256(clientKeyOf(token))).value()};
+}
+
+std::string clientKeyOf(std::string_view token) { return hmac(token, "VLCH token client"); }
+
+std::string makeKeyProof(std::string_view clientKey, Terms const& terms, std::string_view clientNonce,
+                         std::string_view serviceNonce) {
+    return hex(combined(clientKey, proofBytes(Side::Client, terms, clientNonce, serviceNonce)));
+}
+
+std::string keyShownBy(std::string_view proof, Terms const& terms, std::string_view clientNonce,
+                       std::string_view serviceNonce) {
+    std::string const bytes = Base::fromHex(proof).value_or("");
+    std::string const mask = proofBytes(Side::Client, terms, clientNonce, serviceNonce);
+    return bytes.size() == mask.size() ? combined(bytes, mask) : std::string();
+}
 
 std::string makeProof(Side side, Terms const& terms, std::string_view clientNonce,
                       std::string_view serviceNonce) {
-    if (terms.version == 1)
-        return hex(hmac(terms.token, joined(nameOf(side), {clientNonce, serviceNonce, terms.fingerprint})));
-    return hex(code(versionLabel(terms, "proof", side), terms, clientNonce, serviceNonce));
+    return hex(proofBytes(side, terms, clientNonce, serviceNonce));
 }
 
 std::string makeSealKey(Side side, Terms const& terms, std::string_view clientNonce,

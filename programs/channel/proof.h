@@ -21,10 +21,31 @@ struct Terms {
     std::string serviceAddress;
 };
 
+/// What a service keeps of a token that it has given out: enough to know who holds the token and to prove
+/// itself to him, and not enough to be let in by it. 32 bytes each.
+struct TokenKeys {
+    /// Which the service's proofs are made with.
+    std::string service;
+    /// SHA-256 of the client's key.
+    std::string clientDigest;
+};
+
+/// Throws Error when the crypto library fails.
+TokenKeys keysOf(std::string_view token);
+/// What a client proves instead that holds such a token: its key, 32 bytes.
+std::string clientKeyOf(std::string_view token);
+
 /// The proof of one side for one greeting, 64 hexadecimal digits. Nothing of one version, side or connection
 /// serves for another. Throws Error when the crypto library fails.
 std::string makeProof(Side side, Terms const& terms, std::string_view clientNonce,
                       std::string_view serviceNonce);
+/// The client's proof by the key of such a token, and the key that a proof shows: who knows the digest of the
+/// key alone, as the service does, learns it by the proof and can make none. The terms have the digest for
+/// their token. An empty key is one that no proof shows. Throws Error.
+std::string makeKeyProof(std::string_view clientKey, Terms const& terms, std::string_view clientNonce,
+                         std::string_view serviceNonce);
+std::string keyShownBy(std::string_view proof, Terms const& terms, std::string_view clientNonce,
+                       std::string_view serviceNonce);
 /// The key under which that side seals its messages, 32 bytes. Throws Error.
 std::string makeSealKey(Side side, Terms const& terms, std::string_view clientNonce,
                         std::string_view serviceNonce);

@@ -281,6 +281,11 @@ std::string const& Server::fingerprint() const { return impl_->fingerprint(); }
 std::size_t Server::connections() const { return impl_->connections(); }
 void Server::stop() { impl_->stop(); }
 
+std::string tokenIdOf(Ipc::CmdProcessorI const& connection) {
+    auto const* const peer = dynamic_cast<Peer const*>(&connection);
+    return peer ? peer->tokenId() : std::string();
+}
+
 Server::Handler acceptAtOnce(std::shared_ptr<Ipc::CmdProcessorI> processor) {
     return [processor = std::move(processor)](std::shared_ptr<Ipc::CmdI> const& cmd, Answer const& answer) {
         cmd->accept(*processor);

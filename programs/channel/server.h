@@ -29,6 +29,8 @@ public:
     void operator()() const;
     /// An error message goes out instead; the client's command is told it as a transfer error.
     void fail(std::string const& reason) const;
+    /// The same without a line in the log, which whoever refuses it sees to.
+    void refuse(std::string const& reason) const;
 
 private:
     std::shared_ptr<State> state_;
@@ -94,6 +96,10 @@ private:
     class Impl;
     std::shared_ptr<Impl> impl_;
 };
+
+/// The id of the token by which a connection was let in, given as the processor of its commands; empty for
+/// the service's own, and for what is no connection.
+std::string tokenIdOf(Ipc::CmdProcessorI const& connection);
 
 /// The handler for processors that are done when accept returns. The processor is what the commands expect.
 Server::Handler acceptAtOnce(std::shared_ptr<Ipc::CmdProcessorI> processor);

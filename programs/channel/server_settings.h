@@ -1,6 +1,7 @@
 #pragma once
 // What a service's side of the connection is told.
 
+#include "programs/channel/greeting.h"
 #include "programs/channel/tls.h"
 
 #include <chrono>
@@ -18,6 +19,8 @@ struct ServerSettings {
     /// Listens at that address and port already, and is the server's from now on; below 0 when there is none.
     int socket = -1;
     std::string token;
+    /// Its tokens that have an id; asked with each greeting of one.
+    TokenLookup tokens = {};
     Tls tls = Tls::Auto;
     /// PEM files that TLS wants. The key's must be private.
     std::string certificateFile;

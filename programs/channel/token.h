@@ -15,6 +15,12 @@ std::string readToken(std::string const& file);
 /// The same; where there is no file yet, one with a new random token is made.
 std::string readOrCreateToken(std::string const& file);
 
+/// A fresh token of the form ID.SECRET, 16 and 64 hexadecimal digits. The id says which of its tokens a
+/// service is shown; the secret never travels.
+std::string makeNamedToken();
+/// The id of a token of that form; empty for any other.
+std::string tokenIdOf(std::string const& token);
+
 /// Fresh random bits for one greeting, as hexadecimal digits.
 std::string makeNonce();
 

@@ -17,11 +17,22 @@ constexpr std::size_t MAX_WAITING = 16;
 } // namespace
 
 DiscoveryAnswer::DiscoveryAnswer(boost::asio::io_context& io, std::string const& host, std::uint16_t port,
-                                 std::string const& token)
-    : service_{host, port, token}, v6_(io, false, service_), v4_(io, true, service_), changes_(io, [this] {
+                                 std::string const& token, Channel::TokenLookup tokens)
+    : service_{host, port, token, std::move(tokens)}, v6_(io, false, service_), v4_(io, true, service_),
+      changes_(io, [this] {
           v6_.listen();
           v4_.listen();
       }) {}
+
+/// Nobody is told that there is no such token: such a question has no answer with a proof.
+json::Object DiscoveryAnswer::Service::answer(json::Object const& question) const {
+    std::string const id = Channel::tokenIdIn(question);
+    if (id.empty())
+        return Channel::makeAnswer(host, port, token, Channel::nonceIn(question));
+    std::optional<Channel::TokenKeys> const keys = tokens ? tokens(id) : std::nullopt;
+    return keys ? Channel::makeAnswer(host, port, keys->service, Channel::nonceIn(question))
+                : Channel::makeAnswer(host, port, token, std::nullopt);
+}
 
 DiscoveryAnswer::Group::Group(boost::asio::io_context& io, bool ipv4, Service const& service)
     : io_(io), ipv4_(ipv4), service_(service), pause_(io) {
@@ -38,25 +49,26 @@ void DiscoveryAnswer::Group::onDatagram(json::Object const& datagram) {
     if (!Ipc::DiscoveryBase::isReq(datagram))
         return;
     std::optional<std::string> const nonce = Channel::nonceIn(datagram);
+    auto const isSame = [&](json::Object const& waiting) { return Channel::nonceIn(waiting) == nonce; };
     if (!nonce)
         askedAgain_ = true;
-    else if (std::find(nonces_.begin(), nonces_.end(), *nonce) == nonces_.end())
-        nonces_.push_back(*nonce);
-    if (nonces_.size() > MAX_WAITING)
-        nonces_.pop_front();
+    else if (std::find_if(questions_.begin(), questions_.end(), isSame) == questions_.end())
+        questions_.push_back(datagram);
+    if (questions_.size() > MAX_WAITING)
+        questions_.pop_front();
     if (!pausing_)
         answer();
 }
 
 void DiscoveryAnswer::Group::answer() {
-    std::optional<std::string> nonce;
-    if (!nonces_.empty()) {
-        nonce = std::move(nonces_.front());
-        nonces_.pop_front();
+    json::Object question;
+    if (!questions_.empty()) {
+        question = std::move(questions_.front());
+        questions_.pop_front();
     }
     askedAgain_ = false;
     pause();
-    base_->send(Channel::makeAnswer(service_.host, service_.port, service_.token, nonce));
+    base_->send(service_.answer(question));
 }
 
 void DiscoveryAnswer::Group::pause() {
@@ -66,7 +78,7 @@ void DiscoveryAnswer::Group::pause() {
         if (ec || alive.expired())
             return;
         pausing_ = false;
-        if (askedAgain_ || !nonces_.empty())
+        if (askedAgain_ || !questions_.empty())
             answer();
     });
 }

@@ -61,19 +61,33 @@ std::string channelToTest(json::Object const& question) {
     }
 }
 
+/// Of nodes above those that the grant covers only the ids are told, and nothing of those beside them.
+Protocol::TreeNode coveredOf(Protocol::TreeNode tree, Policy::Grant const& by) {
+    if (by.covers(tree.id))
+        return tree;
+    Protocol::TreeNode shown;
+    shown.id = tree.id;
+    for (Protocol::TreeNode& child : tree.children)
+        if (by.covers(child.id) || Policy::Grant{{}, {}, child.id}.covers(by.node))
+            shown.children.push_back(coveredOf(std::move(child), by));
+    return shown;
+}
+
 } // namespace
 
-Processor::Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-                     LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
-                     std::function<long long()> now)
-    : settings_(settings), documents_(documents), jobs_(jobs), runner_(runner), letters_(letters),
-      packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)) {}
+Processor::Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens,
+                     Access& access, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
+                     PackReception& packs, std::filesystem::path outbox, std::function<long long()> now)
+    : settings_(settings), documents_(documents), tokens_(tokens), access_(access), jobs_(jobs),
+      runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)) {}
 
-void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
+void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                          std::function<void(std::string const& failure)> done) {
+    by_ = by;
     done_ = std::move(done);
     std::string failed;
     try {
+        access_.require(*cmd, by_);
         cmd->accept(*this);
     } catch (std::exception const& failure) {
         failed = failure.what();
@@ -83,7 +97,7 @@ void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
 }
 
 void Processor::submit(std::shared_ptr<Ipc::CmdI> cmd) {
-    carryOut(cmd, [](std::string const&) {});
+    carryOut(cmd, Policy::Grant::ofService(), [](std::string const&) {});
 }
 
 void Processor::visit(Ipc::CSConfigSrvChange& cmd) {
@@ -118,34 +132,78 @@ void Processor::beginPack(Ipc::CSConfigIdsList& cmd) {
 }
 
 /// The command has one payload for many questions.
-json::Object Processor::answer(json::Object const& question) {
+std::vector<Processor::Question> const& Processor::answerers() {
     using namespace Protocol;
-    std::string const kind = kindOf(question);
-    if (kind == SettingsQuery::KIND)
-        return settings_.effective(SettingsQuery(question)).serialize();
-    if (kind == JobsQuery::KIND)
-        return listed(JobsQuery(question)).serialize();
-    if (kind == JobsChange::KIND)
-        return changeJobs(JobsChange(question));
-    if (kind == DocumentsQuery::KIND)
-        return documents_.list(DocumentsQuery(question)).serialize();
-    if (kind == DocumentPieceQuery::KIND)
-        return documents_.piece(DocumentPieceQuery(question)).serialize();
-    if (kind == DocumentUpload::KIND)
-        return documents_.put(DocumentUpload(question)).serialize();
-    if (kind == DocumentRemoval::KIND)
-        return documents_.remove(DocumentRemoval(question)).serialize();
-    if (kind == LetterChange::KIND)
-        return changeLetter(LetterChange(question));
-    if (kind == CarriersQuery::KIND)
-        return letters_.list().serialize();
-    if (kind == CarrierChange::KIND)
-        return changeCarrier(CarrierChange(question));
-    throw Base::Error("there is no query \"" + kind + "\"; there are " + SettingsQuery::KIND + ", " +
-                      JobsQuery::KIND + ", " + JobsChange::KIND + ", " + DocumentsQuery::KIND + ", " +
-                      DocumentPieceQuery::KIND + ", " + DocumentUpload::KIND + ", " + DocumentRemoval::KIND +
-                      ", " + LetterChange::KIND + ", " + CarriersQuery::KIND + ", " + CarrierChange::KIND +
-                      ", " + BeginPack::KIND);
+    static std::vector<Question> const all{
+        {SettingsQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.settings_.effective(SettingsQuery(question)).serialize();
+         }},
+        {JobsQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.listed(JobsQuery(question)).serialize();
+         }},
+        {JobsChange::KIND,
+         [](Processor& self, json::Object const& question) { return self.changeJobs(JobsChange(question)); }},
+        {DocumentsQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.documents_.list(DocumentsQuery(question)).serialize();
+         }},
+        {DocumentPieceQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             DocumentPieceQuery const query(question);
+             self.documents_.requireTold(query.sha256, self.by_);
+             return self.documents_.piece(query).serialize();
+         }},
+        {DocumentUpload::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.documents_.put(DocumentUpload(question)).serialize();
+         }},
+        {DocumentRemoval::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.documents_.remove(DocumentRemoval(question)).serialize();
+         }},
+        {LetterChange::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.changeLetter(LetterChange(question));
+         }},
+        {CarriersQuery::KIND,
+         [](Processor& self, json::Object const&) { return self.letters_.list().serialize(); }},
+        {CarrierChange::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.changeCarrier(CarrierChange(question));
+         }},
+        {TokenAddition::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.tokens_.add(TokenAddition(question), self.by_).serialize();
+         }},
+        {TokensQuery::KIND,
+         [](Processor& self, json::Object const&) { return self.tokens_.list(self.by_).serialize(); }},
+        {TokenRevocation::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.tokens_.revoke(TokenRevocation(question), self.by_).serialize();
+         }},
+        {BeginPack::KIND, nullptr},
+    };
+    return all;
+}
+
+std::vector<std::string> Processor::questions() {
+    std::vector<std::string> kinds;
+    for (Question const& question : answerers())
+        kinds.emplace_back(question.kind);
+    return kinds;
+}
+
+json::Object Processor::answer(json::Object const& question) {
+    std::string const kind = Protocol::kindOf(question);
+    std::string all;
+    for (Question const& known : answerers()) {
+        if (known.answer && kind == known.kind)
+            return known.answer(*this, question);
+        all += (all.empty() ? "" : ", ") + std::string(known.kind);
+    }
+    throw Base::Error("there is no query \"" + kind + "\"; there are " + all);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
@@ -153,6 +211,7 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
     Protocol::JobsQuery changed;
     for (std::string const& id : change.ids) {
         try {
+            requireJob(id);
             runner_.change(change.action, id);
             changed.ids.push_back(id);
         } catch (Base::Error const& refused) {
@@ -165,10 +224,18 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
 }
 
 Protocol::JobsAnswer Processor::listed(Protocol::JobsQuery const& query) const {
-    return listJobs(query, jobs_, letters_.store(), settings_, outbox_, now_());
+    return listJobs(query, jobs_, letters_.store(), settings_, outbox_, now_(), by_);
+}
+
+/// Of jobs of other nodes the holder is told what he is told of those that there are not.
+void Processor::requireJob(std::string const& packId) const {
+    std::optional<Job> const job = jobs_.find(packId);
+    if (!job || !by_.covers(job->cfgId))
+        throw Base::Error("there is no mailing " + Base::oneLine(packId));
 }
 
 json::Object Processor::changeLetter(Protocol::LetterChange const& change) {
+    requireJob(change.id);
     letters_.decide(change);
     Protocol::JobsQuery changed;
     changed.ids = {change.id};
@@ -221,14 +288,17 @@ json::Object Processor::serviceOverview() const {
 void Processor::visit(Ipc::ProcessPack& cmd) {
     PackLocation pack{cmd.dbHostPort(), cmd.dbName(), cmd.packId()};
     auto done = std::exchange(done_, {});
+    JobRunner::RequireNode const mayBeOf = [this, by = by_](std::string const& node) {
+        access_.require(Policy::Role::Send, node, by);
+    };
     if (!pack.isWithService())
-        return runner_.accept(pack, std::move(done));
+        return runner_.accept(pack, mayBeOf, std::move(done));
     pack.database = Protocol::PACKS_OF_CONNECTION;
     // Of a job that is on record the pages may be gone.
     if (jobs_.find(pack.packId))
-        return runner_.accept(pack, std::move(done));
-    packs_.complete(pack.packId, [this, pack, done = std::move(done)](std::string const& failure) {
-        failure.empty() ? runner_.accept(pack, done) : done(failure);
+        return runner_.accept(pack, mayBeOf, std::move(done));
+    packs_.complete(pack.packId, [this, pack, mayBeOf, done = std::move(done)](std::string const& failure) {
+        failure.empty() ? runner_.accept(pack, mayBeOf, done) : done(failure);
     });
 }
 
@@ -244,15 +314,16 @@ void Processor::visit(Ipc::UpdateCfg& cmd) {
 
 void Processor::visit(Ipc::UpdateStatus& cmd) { runner_.updateStatus(cmd.dbHost(), cmd.dbName()); }
 
-void Processor::visit(Ipc::UploadQueued& cmd) { runner_.upload(cmd.dbHost(), cmd.dbName()); }
+void Processor::visit(Ipc::UploadQueued& cmd) { runner_.upload(cmd.dbHost(), cmd.dbName(), by_); }
 
 void Processor::visit(Ipc::CfgIdsTree& cmd) {
-    cmd.setResp(answerOrError(cmd, [&] { return settings_.tree().serialize(); }));
+    cmd.setResp(answerOrError(cmd, [&] { return coveredOf(settings_.tree(), by_).serialize(); }));
 }
 
 void Processor::visit(Ipc::CfgIdsForUser& cmd) {
     for (auto const& [id, description, disabled] : settings_.usableNodes(cmd.inclUser()))
-        cmd.addToResp({id, description, disabled});
+        if (by_.covers(id))
+            cmd.addToResp({id, description, disabled});
 }
 
 void Processor::visit(Ipc::RemoveCfgNode& cmd) {

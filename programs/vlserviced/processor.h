@@ -1,16 +1,20 @@
 #pragma once
 // Carries out the commands that clients send.
 
+#include "programs/vlserviced/access.h"
 #include "programs/vlserviced/jobs/job_runner.h"
 #include "programs/vlserviced/jobs/letter_runner.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
 #include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
+#include "programs/vlserviced/settings/token_service.h"
 #include "vlservice/ipc/cmd_processor_vlsvc.h"
 #include "vlservice/ipc/set_part_base.h"
 
 #include <filesystem>
 #include <functional>
+#include <string>
+#include <vector>
 
 namespace VlServiced {
 
@@ -20,14 +24,18 @@ namespace VlServiced {
 class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI {
 public:
     /// All have to outlive the processor.
-    Processor(SettingsService& settings, DocumentService& documents, JobStore& jobs, JobRunner& runner,
-              LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
-              std::function<long long()> now);
+    Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens, Access& access,
+              JobStore& jobs, JobRunner& runner, LetterRunner& letters, PackReception& packs,
+              std::filesystem::path outbox, std::function<long long()> now);
 
-    /// Carries a command out. `done` is called once, on this thread, possibly later; with the reason, one
-    /// line, when the command failed and its response has no room for that.
-    void carryOut(std::shared_ptr<Ipc::CmdI> const& cmd,
+    /// The kinds of questions that it answers.
+    static std::vector<std::string> questions();
+
+    /// Carries a command out for the holder of a grant. `done` is called once, on this thread, possibly
+    /// later; with the reason, one line, when the command failed and its response has no room for that.
+    void carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                   std::function<void(std::string const& failure)> done);
+    /// For the service itself.
     void submit(std::shared_ptr<Ipc::CmdI> cmd) override;
 
     void visit(Ipc::CSConfigSrvChange& cmd) override;
@@ -46,23 +54,36 @@ public:
     void visit(Ipc::SetPartBase& cmd) override;
 
 private:
+    using Answerer = json::Object (*)(Processor&, json::Object const& question);
+    struct Question {
+        char const* kind;
+        /// Null for those whose answer comes later.
+        Answerer answer;
+    };
+    static std::vector<Question> const& answerers();
+
     json::Object answer(json::Object const& question);
     void beginPack(Ipc::CSConfigIdsList& cmd);
     json::Object changeJobs(Protocol::JobsChange const& change);
     json::Object changeLetter(Protocol::LetterChange const& change);
     json::Object changeCarrier(Protocol::CarrierChange const& change);
     Protocol::JobsAnswer listed(Protocol::JobsQuery const& query) const;
+    void requireJob(std::string const& packId) const;
     void testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd);
     json::Object serviceOverview() const;
 
     SettingsService& settings_;
     DocumentService& documents_;
+    TokenService& tokens_;
+    Access& access_;
     JobStore& jobs_;
     JobRunner& runner_;
     LetterRunner& letters_;
     PackReception& packs_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
+    /// Of the command at hand.
+    Policy::Grant by_;
     std::function<void(std::string const& failure)> done_;
 };
 

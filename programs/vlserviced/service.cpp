@@ -57,7 +57,16 @@ constexpr std::chrono::hours SWEEP_TIME{24};
 constexpr std::chrono::hours ENDED_SWEEP_TIME{1};
 constexpr std::size_t MAX_PATH_BYTES = 1000;
 
+constexpr char const* REVOKED = "this access token was revoked: ask for another one (\"vlmail token add\")";
+
 long long now() { return std::time(nullptr); }
+
+/// Goes on whoever sets the clock.
+long long steadySeconds() {
+    return std::chrono::duration_cast<std::chrono::seconds>(
+               std::chrono::steady_clock::now().time_since_epoch())
+        .count();
+}
 
 fs::path preparedOutbox(Options const& options, DataFolder const& data) {
     fs::path const outbox = fs::absolute(options.outbox.empty() ? data.outbox() : options.outbox);
@@ -104,21 +113,17 @@ std::string announcedHost(Options const& options) {
     return asio::ip::make_address(options.listen).is_unspecified() ? asio::ip::host_name() : options.listen;
 }
 
-/// The first start makes one, where none is named.
-std::string tokenFor(Options const& options, DataFolder const& data) {
-    return options.token.empty() ? Channel::readOrCreateToken(data.token().string())
-                                 : Channel::readToken(options.token);
-}
+/// The service's own token. The first start makes one, where none is named.
+struct OwnToken {
+    std::string text;
+    bool isNew = false;
+};
 
-Channel::ServerSettings serverSettings(Options const& options, DataFolder const& data) {
-    Channel::ServerSettings settings;
-    settings.address = options.listen;
-    settings.port = options.port;
-    settings.socket = options.socket;
-    settings.token = tokenFor(options, data);
-    settings.certificateFile = options.certificate;
-    settings.keyFile = options.key;
-    return settings;
+OwnToken ownToken(Options const& options, DataFolder const& data) {
+    if (!options.token.empty())
+        return {Channel::readToken(options.token)};
+    bool const isNew = !fs::exists(data.token());
+    return {Channel::readOrCreateToken(data.token().string()), isNew};
 }
 
 } // namespace
@@ -161,17 +166,17 @@ public:
     explicit Impl(Options const& options)
         : data_(options.data), outbox_(preparedOutbox(options, data_)),
           database_(openServiceDatabase(data_.database())), localPacks_(options.localPacks),
-          packStore_(openSqlitePackStore(data_.packs())),
+          packStore_(openSqlitePackStore(data_.packs())), ownToken_(ownToken(options, data_)),
           server_(
-              std::in_place, io_, serverSettings(options, data_), &Ipc::makeEmptyCmd,
+              std::in_place, io_, serverSettings(options), &Ipc::makeEmptyCmd,
               [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
                   handle(cmd, answer);
               },
               [this](Channel::ReceivedData data, Channel::DataStored const& stored) {
-                  packs_.take(data.connection, std::move(data.text), [stored](std::string const& failure) {
-                      failure.empty() ? stored() : stored.fail(failure);
-                  });
+                  take(std::move(data), stored);
               }) {
+        if (ownToken_.isNew)
+            tokens_.enrol();
         jobs_.onChange([this](std::string const& packId) {
             held_.onChange(packId);
             packs_.onJobChanged(packId);
@@ -181,7 +186,7 @@ public:
         removeUnfinished(outbox_ / JobRunner::REST_FOLDER);
         recogniseFolders();
         if (options.answersDiscovery)
-            discovery_.emplace(io_, announcedHost(options), server_->port(), tokenFor(options, data_));
+            discovery_.emplace(io_, announcedHost(options), server_->port(), ownToken_.text, tokenLookup());
     }
 
     ~Impl() {
@@ -218,6 +223,22 @@ public:
     }
 
 private:
+    Channel::TokenLookup tokenLookup() const {
+        return [this](std::string const& id) { return tokens_.keysOf(id); };
+    }
+
+    Channel::ServerSettings serverSettings(Options const& options) const {
+        Channel::ServerSettings settings;
+        settings.address = options.listen;
+        settings.port = options.port;
+        settings.socket = options.socket;
+        settings.token = ownToken_.text;
+        settings.tokens = tokenLookup();
+        settings.certificateFile = options.certificate;
+        settings.keyFile = options.key;
+        return settings;
+    }
+
     void endThreads() {
         for (asio::thread_pool* const threads : {&worker_, &reader_, &storeThread_}) {
             threads->stop();
@@ -263,10 +284,33 @@ private:
 
     /// What asks to wait for jobs is answered when they have moved; all else at once.
     void handle(std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
-        held_.hold(waitedFor(*cmd), [this, cmd, answer] {
-            processor_->carryOut(cmd, [cmd, answer](std::string const& failure) {
-                failure.empty() ? answer() : answer.fail(failure);
-            });
+        held_.hold(waitedFor(*cmd), [this, cmd, answer] { carryOut(cmd, answer); });
+    }
+
+    /// What a token may do is asked anew for each command: it may have been revoked meanwhile.
+    std::optional<Policy::Grant> grantOf(Ipc::CmdProcessorI const& connection) const {
+        return tokens_.grantOf(Channel::tokenIdOf(connection));
+    }
+
+    void carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
+        std::optional<Policy::Grant> const by = grantOf(*cmd->processor());
+        if (!by) {
+            access_.refused().note(REVOKED);
+            return answer.refuse(REVOKED);
+        }
+        processor_->carryOut(cmd, *by, [this, answer](std::string const& failure) {
+            if (failure.empty())
+                answer();
+            else
+                access_.refused().isLast(failure) ? answer.refuse(failure) : answer.fail(failure);
+        });
+    }
+
+    void take(Channel::ReceivedData data, Channel::DataStored const& stored) {
+        if (!grantOf(*data.connection))
+            return stored.fail(REVOKED);
+        packs_.take(data.connection, std::move(data.text), [stored](std::string const& failure) {
+            failure.empty() ? stored() : stored.fail(failure);
         });
     }
 
@@ -327,6 +371,7 @@ private:
         runner_.resume();
         letterRunner_.proceed();
         documents_.dropStalled();
+        access_.refused().tellWhatWasLeftOut();
         auto const time = std::chrono::steady_clock::now();
         if (time - lastStatusUpdate_ >= statusUpdateTime()) {
             lastStatusUpdate_ = time;
@@ -453,6 +498,10 @@ private:
     LetterStore letters_{*database_, jobs_};
     LocalPacks localPacks_;
     std::shared_ptr<PackStore> packStore_;
+    OwnToken ownToken_;
+    TokenStore tokenStore_{*database_};
+    TokenService tokens_{tokenStore_, ownToken_.text, &now};
+    Access access_{&steadySeconds};
 
     asio::io_context io_{1};
     asio::thread_pool worker_{1};
@@ -466,8 +515,8 @@ private:
     JobRunner runner_{jobs_, surroundings()};
     Retention retention_{jobs_, outbox_, [this] { return settings_.service(); }, &now};
     PackReception packs_{packStore_, jobs_, receptionSurroundings()};
-    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(settings_, documents_, jobs_, runner_,
-                                                                        letterRunner_, packs_, outbox_, &now);
+    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(
+        settings_, documents_, tokens_, access_, jobs_, runner_, letterRunner_, packs_, outbox_, &now);
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};

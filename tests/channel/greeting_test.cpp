@@ -1,7 +1,9 @@
 // The greeting of both sides, message by message, without a connection.
 
+#include "programs/base/hex.h"
 #include "programs/channel/greeting.h"
 #include "programs/channel/message_text.h"
+#include "programs/channel/token.h"
 #include "tests/channel/known_texts.h"
 
 #include <gmock/gmock.h>
@@ -121,6 +123,108 @@ TEST(Greetings, EndAtTheClientWhenTheVersionsDiffer) {
                   "Whoever answers there does not know our access token.");
 }
 
+std::string const NAMED = "0123456789abcdef." + std::string(64, 'a');
+
+Terms withToken(std::string const& token, Terms terms) {
+    terms.token = token;
+    return terms;
+}
+
+/// Knows NAMED by its keys alone.
+std::optional<TokenKeys> knownToken(std::string const& id) {
+    return id == "0123456789abcdef" ? std::optional(keysOf(NAMED)) : std::nullopt;
+}
+
+Outcome greetByName(std::string const& token, Terms const& terms, TokenLookup const& known = &knownToken) {
+    ClientGreeting client = makeClient(withToken(token, terms));
+    ServiceGreeting service(terms, SERVICE_NONCE, TakesData::No, known);
+    Outcome outcome{};
+    outcome.service = service.take(client.challenge().frame());
+    while (outcome.service.reply) {
+        outcome.client = client.take(outcome.service.reply->frame());
+        if (!outcome.client.reply)
+            break;
+        outcome.service = service.take(outcome.client.reply->frame());
+    }
+    return outcome;
+}
+
+TEST(GreetingsByATokenWithAnId, WelcomeWhoHasTheToken) {
+    for (std::uint16_t const version : {VERSION_1, VERSION})
+        for (Terms const& terms : {plainTerms(version), tlsTerms(version)}) {
+            Outcome const outcome = greetByName(NAMED, terms);
+            EXPECT_EQ(outcome.client.verdict, Verdict::Welcome);
+            EXPECT_EQ(outcome.service.verdict, Verdict::Welcome);
+            EXPECT_EQ(outcome.client.seals.has_value(), outcome.service.seals.has_value());
+        }
+    Outcome const sealed = greetByName(NAMED, plainTerms());
+    EXPECT_EQ(sealed.client.seals->client, sealed.service.seals->client);
+    EXPECT_EQ(sealed.client.seals->service, sealed.service.seals->service);
+    EXPECT_NE(sealed.client.seals->client, greet(plainTerms(), plainTerms()).client.seals->client);
+}
+
+TEST(GreetingsByATokenWithAnId, TellTheServiceWhichItIs) {
+    ServiceGreeting service(plainTerms(), SERVICE_NONCE, TakesData::No, &knownToken);
+    EXPECT_EQ(service.tokenId(), "");
+    service.take(makeClient(withToken(NAMED, plainTerms())).challenge().frame());
+    EXPECT_EQ(service.tokenId(), "0123456789abcdef");
+}
+
+TEST(GreetingsByATokenWithAnId, EndWhereTheServiceHasNoSuchToken) {
+    std::string const unknown = "f123456789abcdef." + std::string(64, 'a');
+    std::string const reason = "Its access token is none of this service, or was revoked.";
+    EXPECT_EQ(greetByName(unknown, plainTerms()).service.reason, reason);
+    EXPECT_EQ(greetByName(NAMED, plainTerms(), {}).service.reason, reason);
+}
+
+TEST(GreetingsByATokenWithAnId, EndAtTheClientWhenTheSecretDiffers) {
+    std::string other = NAMED;
+    other.back() = 'b';
+    Outcome const outcome = greetByName(other, plainTerms());
+    EXPECT_EQ(outcome.client.reason, NO_KNOWLEDGE);
+    EXPECT_EQ(outcome.service.verdict, Verdict::GoesOn);
+}
+
+/// As somebody would who has got hold of what the service keeps of the token.
+TEST(GreetingsByATokenWithAnId, LetNobodyInByWhatTheServiceKeeps) {
+    TokenKeys const kept = keysOf(NAMED);
+    auto const hexOf = [](std::string const& bytes) { return Base::toHex(bytes.data(), bytes.size()); };
+    Terms const byDigest = withToken(kept.clientDigest, plainTerms());
+    for (std::string const& proof :
+         {makeProof(Side::Client, byDigest, CLIENT_NONCE, SERVICE_NONCE),
+          makeKeyProof(kept.clientDigest, byDigest, CLIENT_NONCE, SERVICE_NONCE),
+          makeKeyProof(kept.service, byDigest, CLIENT_NONCE, SERVICE_NONCE),
+          makeProof(Side::Client, withToken(kept.service, plainTerms()), CLIENT_NONCE, SERVICE_NONCE),
+          makeProof(Side::Client, plainTerms(), CLIENT_NONCE, SERVICE_NONCE), hexOf(kept.clientDigest),
+          std::string(), std::string(64, '0'), std::string(62, '0'), std::string(64, 'x')}) {
+        ServiceGreeting service(plainTerms(), SERVICE_NONCE, TakesData::No, &knownToken);
+        service.take(makeClient(withToken(NAMED, plainTerms())).challenge().frame());
+        json::Object const text{{PROOF, proof}};
+        std::string const said = print(text);
+        EXPECT_EQ(service.take({GREETING, Kind::Request, PROVING, said}).reason,
+                  "Its access token is not the one of this service.")
+            << proof;
+    }
+}
+
+TEST(GreetingsByATokenWithAnId, ShowTheKeyToWhoKnowsItsDigestAlone) {
+    Terms const byDigest = withToken(keysOf(NAMED).clientDigest, plainTerms());
+    std::string const proof = makeKeyProof(clientKeyOf(NAMED), byDigest, CLIENT_NONCE, SERVICE_NONCE);
+    EXPECT_EQ(keyShownBy(proof, byDigest, CLIENT_NONCE, SERVICE_NONCE), clientKeyOf(NAMED));
+    EXPECT_NE(keyShownBy(proof, plainTerms(), CLIENT_NONCE, SERVICE_NONCE), clientKeyOf(NAMED));
+    EXPECT_NE(keyShownBy(proof, byDigest, SERVICE_NONCE, CLIENT_NONCE), clientKeyOf(NAMED));
+    EXPECT_EQ(keyShownBy("0g", byDigest, CLIENT_NONCE, SERVICE_NONCE), "");
+}
+
+TEST(TokenIds, AreThoseOfTokensOfThatForm) {
+    EXPECT_EQ(tokenIdOf(NAMED), "0123456789abcdef");
+    for (std::string const& token :
+         {std::string(), TOKEN, std::string(81, 'a'), "0123456789ABCDEF." + std::string(64, 'a'),
+          "0123456789abcdef." + std::string(63, 'a'), "0123456789abcdef-" + std::string(64, 'a')})
+        EXPECT_EQ(tokenIdOf(token), "") << token;
+    EXPECT_NE(tokenIdOf(makeNamedToken()), tokenIdOf(makeNamedToken()));
+}
+
 /// A message and what becomes of it.
 struct Case {
     char const* name;
@@ -158,6 +262,8 @@ INSTANTIATE_TEST_SUITE_P(Messages, BadChallenges,
                                 Case{"OtherSequence", 0, Kind::Request, 1, R"({"nonce":"n"})", NO_GREETING},
                                 Case{"NoNonce", 0, Kind::Request, 0, "{}", NO_TEXT},
                                 Case{"NumberAsNonce", 0, Kind::Request, 0, R"({"nonce":1})",
+                                     "JSON error: Wrong type: integer. Expected type: string"},
+                                Case{"NumberAsToken", 0, Kind::Request, 0, R"({"nonce":"n","token":1})",
                                      "JSON error: Wrong type: integer. Expected type: string"},
                                 Case{"NoObject", 0, Kind::Request, 0, "[]",
                                      "JSON error: Wrong type: array. Expected type: object"}),

@@ -152,7 +152,7 @@ TEST_F(PrivateFiles, HoldNoTokenThatIsShortOrNoWord) {
 
 TEST_F(PrivateFiles, GetANewTokenWhenThereIsNone) {
     std::string const token = readOrCreateToken(file);
-    EXPECT_THAT(token, MatchesRegex("[0-9a-f]{64}"));
+    EXPECT_THAT(token, MatchesRegex("[0-9a-f]{16}\\.[0-9a-f]{64}"));
     EXPECT_EQ(mode(), 0600u);
     EXPECT_EQ(readOrCreateToken(file), token);
     EXPECT_EQ(readToken(file), token);
@@ -184,6 +184,19 @@ TEST(Proofs, AreTheDescribedOnes) {
                   "\nQ = " + makeProof(Side::Client, first, client, service) + '\n');
     EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proof discovery"),
               makeDiscoveryProof(TOKEN, client, "10.0.0.1", 4711) + '\n');
+}
+
+TEST(ProofsByATokenWithAnId, AreTheDescribedOnes) {
+    std::string const client(64, '0');
+    std::string const service(64, 'f');
+    std::string const token = "0123456789abcdef." + std::string(64, 'a');
+    Terms byService = plainTerms(2);
+    byService.token = keysOf(token).service;
+    Terms byDigest = plainTerms(2);
+    byDigest.token = keysOf(token).clientDigest;
+    EXPECT_EQ(VLServiceTest::documentBlock(VLSERVICE_DOCS "/formats-channel.md", "proofs token"),
+              "P  = " + makeProof(Side::Service, byService, client, service) +
+                  "\nQ  = " + makeKeyProof(clientKeyOf(token), byDigest, client, service) + '\n');
 }
 
 /// The same terms but for one of them, each time another one.

@@ -17,8 +17,8 @@ using Arguments = std::vector<std::string>;
 
 /// Ids, times and room differ from run to run, and with them the widths of columns.
 std::string lasting(std::string const& text) {
-    static std::regex const time(
-        "[0-9]{4}/[0-9]{2}/[0-9]{2} [0-9:]{8}|stored[0-9]+|room for [^\n]*|\"(accepted|changed)\":[0-9]+");
+    static std::regex const time("[0-9]{4}/[0-9]{2}/[0-9]{2} [0-9:]{8}|stored[0-9]+|room for "
+                                 "[^\n]*|[0-9a-f]{16}\\.[0-9a-f]{64}|\"(accepted|changed)\":[0-9]+");
     static std::regex const blanks(" +");
     return std::regex_replace(std::regex_replace(withoutIds(text), time, "TIME"), blanks, " ");
 }
@@ -85,11 +85,19 @@ Arguments const RESET{"settings", "reset", "a=acme", "po", "code"};
 Arguments const PUT{"documents", "put", "head", "letter.txt", "--node", "a=acme"};
 Arguments const REMOVE{"documents", "remove", "head", "--node", "a=acme"};
 Arguments const CARRIERS{"carriers", "list"};
+Arguments const ADD_TOKEN{"token", "add", "office", "--role", "send", "--node", "a=acme"};
+Arguments const REVOKE_TOKEN{"token", "revoke", "office"};
+Arguments const LIST_TOKENS{"token", "list"};
 Arguments const LIST{"documents", "list", "--node", "a=acme"};
 
 std::string withNode(ServiceAtHand const& service) {
     service.vlmail(SET);
     service.vlmail(REMOVE);
+    return "";
+}
+
+std::string withoutToken(ServiceAtHand const& service) {
+    service.vlmail(REVOKE_TOKEN);
     return "";
 }
 
@@ -194,6 +202,9 @@ std::vector<Question> const& questions() {
          &stranded,
          {"status", "--stranded", "--node", "a=acme"}},
         {"resume", {"resume", "{}", "--node", "a=acme"}, &stranded, {"status", "{}"}},
+        {"token_add", ADD_TOKEN, &withoutToken, LIST_TOKENS},
+        {"token_list", LIST_TOKENS},
+        {"token_revoke", REVOKE_TOKEN, after(ADD_TOKEN), LIST_TOKENS},
         {"upload", {"upload"}, &waiting, {"status", "{}", "--json"}},
     };
     return all;

@@ -1,4 +1,5 @@
 // The client's subcommands against a service: the command line in, text and exit status out.
+#include "programs/channel/token.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/settings.h"
@@ -78,6 +79,100 @@ protected:
     ServiceProcess service_{
         {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.path().string()}};
 };
+
+/// The token in what token add prints, as a file.
+class GivenTokens : public ClientCommands {
+protected:
+    void add(std::string const& name, std::string const& role, std::string const& node) {
+        std::string const answer = output({"token", "add", name, "--role", role, "--node", node, "--json"});
+        keep(name, parse(answer).get("token").toString());
+    }
+    void keep(std::string const& name, std::string const& token) {
+        write(name.c_str(), token + '\n');
+        fs::permissions(folder_ / name.c_str(), fs::perms(0600));
+    }
+    Result as(std::string const& name, std::vector<std::string> arguments) {
+        for (std::string const& more :
+             {std::string("--service"), "127.0.0.1:" + std::to_string(service_.port()),
+              std::string("--token"), (folder_ / name.c_str()).string()})
+            arguments.push_back(more);
+        return run(arguments);
+    }
+    std::unique_ptr<Channel::Client> connected(std::string const& name) {
+        Channel::ClientSettings settings;
+        settings.host = "127.0.0.1";
+        settings.port = service_.port();
+        settings.token = Channel::readToken((folder_ / name.c_str()).string());
+        return std::make_unique<Channel::Client>(std::move(settings));
+    }
+};
+
+TEST_F(GivenTokens, AreShownOnceAndListed) {
+    std::string const shown = output({"token", "add", "office", "--role", "send", "--node", "bob/acme"});
+    EXPECT_THAT(shown, testing::ContainsRegex(
+                           "The token office has the role send at u=bob/a=acme\\. It is shown this once:\n\n"
+                           "  [0-9a-f]{16}\\.[0-9a-f]{64}\n\nWho is to have it keeps it in a file of mode "
+                           "0600: ~/.config/vlmail/token, or one named with --token\\.\n"));
+    std::string const list = output({"token", "list"});
+    EXPECT_THAT(list, testing::ContainsRegex("\nadmin +admin +the root "));
+    EXPECT_THAT(list, testing::ContainsRegex("\noffice +send +u=bob/a=acme +[0-9/]+ [0-9:]+ +admin\n"));
+    EXPECT_EQ(complaint({"token", "add", "office", "--role", "boss", "--node", "/"}),
+              "vlmail: there is no role \"boss\"; there are read, send, settings and admin\n");
+    EXPECT_EQ(output({"token", "revoke", "office"}),
+              "The token office, which had the role send at u=bob/a=acme, is revoked.\n");
+}
+
+TEST_F(GivenTokens, AllowWhatTheirRoleSaysAtTheirNodes) {
+    add("reader", "read", "a=acme");
+    add("boss", "admin", "a=acme");
+    EXPECT_EQ(as("reader", {"settings", "show", "a=acme", "po"}).status, VlMail::FINE);
+    EXPECT_EQ(
+        as("reader", {"settings", "set", "a=acme", "po", "code=R"}).err,
+        "vlmail: The service refuses: this needs the role settings at a=acme, and the token reader has the "
+        "role read at a=acme: ask for a token that may (\"vlmail token add\")\n");
+    EXPECT_EQ(as("boss", {"settings", "set", "a=acme", "po", "code=R"}).status, VlMail::FINE);
+    EXPECT_THAT(as("boss", {"settings", "suspend", "jobs"}).err,
+                HasSubstr("this needs the role admin at the root"));
+    EXPECT_THAT(as("boss", {"token", "add", "x", "--role", "read", "--node", "a=other"}).err,
+                HasSubstr("this needs the role admin at a=other"));
+}
+
+TEST_F(GivenTokens, ThatAreRevokedCountNoMoreForConnectionsThatStand) {
+    add("office", "read", "a=acme");
+    auto const standing = connected("office");
+    json::Object const question = parse(R"({"query":"jobs"})");
+    standing->call<Ipc::CSConfigIdsList>(question);
+    output({"token", "revoke", "office"});
+    EXPECT_THAT(failureOf([&] { standing->call<Ipc::CSConfigIdsList>(question); }),
+                HasSubstr("this access token was revoked: ask for another one (\"vlmail token add\")"));
+    EXPECT_THAT(failureOf([&] { connected("office"); }),
+                HasSubstr("Its access token is none of this service, or was revoked."));
+}
+
+TEST_F(GivenTokens, OfTheFirstStartCanBeReplaced) {
+    fs::copy_file(data_ / "token", folder_ / "first");
+    EXPECT_THAT(complaint({"token", "revoke", "admin"}),
+                HasSubstr("is the last one with the role admin at the "
+                          "root: give out another one first"));
+    add("boss", "admin", "/");
+    EXPECT_EQ(as("boss", {"token", "revoke", "admin"}).status, VlMail::FINE);
+    EXPECT_THAT(as("first", {"status"}).err, HasSubstr("was revoked"));
+    EXPECT_EQ(as("boss", {"status"}).status, VlMail::FINE);
+}
+
+/// As files of former versions hold them.
+class TokensWithoutAnId : public GivenTokens {};
+
+TEST_F(TokensWithoutAnId, GoOnAsThoseOfAnAdministrator) {
+    std::string const plain(64, 'a');
+    keep("plain", plain);
+    ServiceProcess const other(
+        {"--data", (folder_ / "other").string(), "--no-discovery", "--token", (folder_ / "plain").string()});
+    Result const listed = run({"token", "list", "--service", "127.0.0.1:" + std::to_string(other.port()),
+                               "--token", (folder_ / "plain").string()});
+    EXPECT_EQ(listed.out, "token  role   node      since                   given out by\n"
+                          "admin  admin  the root  the service's own file\n");
+}
 
 TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     std::string const shop = (folder_ / "shop").string();

@@ -33,7 +33,7 @@ protected:
         try {
             static_cast<Ipc::JsonCmdBase&>(*cmd).deserializeReq(parse(request));
             std::string told = "never told";
-            processor_->carryOut(cmd, [&](std::string const& failure) { told = failure; });
+            processor_->carryOut(cmd, by_, [&](std::string const& failure) { told = failure; });
             return told.empty() ? print(static_cast<Ipc::JsonCmdBase&>(*cmd).serializeResp())
                                 : "failed: " + told;
         } catch (std::exception const& failure) {
@@ -45,6 +45,8 @@ protected:
                             packId + "\"}");
     }
 
+    /// Whoever sends.
+    Policy::Grant by_ = Policy::Grant::ofService();
     TemporaryFolder folder_;
     std::filesystem::path outbox_ = folder_ / "outbox";
     std::filesystem::path upload_ = folder_ / "upload";
@@ -83,6 +85,10 @@ protected:
                                          [](std::string const&) { return std::nullopt; },
                                          [](std::string const&) { return false; },
                                      }};
-    std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, jobs_, runner_, carriers_, packs_, outbox_, [] { return 1000LL; });
+    VlServiced::TokenStore tokenStore_{*database_};
+    VlServiced::TokenService tokens_{tokenStore_, std::string(32, 't'), [] { return 1000LL; }};
+    VlServiced::Access access_{[] { return 1000LL; }};
+    std::shared_ptr<VlServiced::Processor> processor_ =
+        std::make_shared<VlServiced::Processor>(settings_, documents_, tokens_, access_, jobs_, runner_,
+                                                carriers_, packs_, outbox_, [] { return 1000LL; });
 };

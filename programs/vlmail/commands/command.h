@@ -35,6 +35,7 @@ void addSettingsCommand(Base::Command const& app, Task& task);
 /// resume and discard.
 void addStrandedCommands(Base::Command const& app, Task& task);
 void addStatusCommand(Base::Command const& app, Task& task);
+void addTokenCommand(Base::Command const& app, Task& task);
 void addUploadCommand(Base::Command const& app, Task& task);
 
 /// The line of a run that ends because memory does; it is written as it stands, without taking any.

@@ -33,6 +33,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addSettingsCommand(command, task);
     addStatusCommand(command, task);
     addStrandedCommands(command, task);
+    addTokenCommand(command, task);
     addUploadCommand(command, task);
     addHelpCommand(command, task);
 }

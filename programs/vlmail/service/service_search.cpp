@@ -26,7 +26,7 @@ public:
 private:
     void ask(Ipc::DiscoveryBase& base) {
         base.recvAll([this](json::Object const& datagram) { onDatagram(datagram); });
-        base.send(Channel::signedQuestion(nonce_));
+        base.send(Channel::signedQuestion(nonce_, token_));
     }
 
     void onDatagram(json::Object const& datagram) {

@@ -166,12 +166,14 @@ void tellAs(JobState state, Protocol::JobReport& report) {
 
 Protocol::JobsAnswer listJobs(Protocol::JobsQuery const& query, JobStore const& jobs,
                               LetterStore const& letters, SettingsService const& settings,
-                              std::filesystem::path const& outbox, long long now) {
+                              std::filesystem::path const& outbox, long long now, Policy::Grant const& to) {
     Alarms alarms(settings, now);
     LetterList letterList(letters);
     Protocol::JobsAnswer answer;
     auto const limit = static_cast<std::size_t>(std::min(query.limit, Protocol::JobsQuery::MAX_JOBS));
-    for (Job const& job : jobs.matching({query.folder, query.database, query.ids}, limit)) {
+    for (Job const& job : jobs.matching({query.folder, query.database, query.ids, to.node}, limit)) {
+        if (!to.covers(job.cfgId))
+            continue;
         Protocol::JobReport& report = answer.jobs.emplace_back(reportOf(job));
         report.alarm = alarms.of(job);
         report.container = containerOf(job, outbox);

@@ -148,7 +148,8 @@ void JobRunner::releaseDue() {
     }
 }
 
-void JobRunner::accept(PackLocation const& pack, std::function<void(std::string const& failure)> done) {
+void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
+                       std::function<void(std::string const& failure)> done) {
     auto const finish = [done = std::move(done)](std::function<void()> const& step) {
         Outcome const outcome = outcomeOf(step);
         done(outcome.why);
@@ -157,28 +158,31 @@ void JobRunner::accept(PackLocation const& pack, std::function<void(std::string 
     std::optional<Job> known;
     Outcome const checked = outcomeOf([&] {
         location = checkedLocation(pack);
-        if ((known = jobs_.find(location.packId)))
+        if ((known = jobs_.find(location.packId))) {
+            mayBeOf(known->cfgId);
             requireSamePack(*known, location);
+        }
     });
     if (checked.kind != Outcome::Kind::Done)
         return finish([&] { throw Base::Error(checked.why); });
     if (known)
         return finish([&] { proceed(*known); });
-    surroundings_.onReader(
-        [this, location, finish, open = surroundings_.openPack, onOwnThread = surroundings_.onOwnThread] {
-            auto const summary = std::make_shared<PackSummary>();
-            Outcome const read = outcomeOf([&] { *summary = summaryOf(*open(location)); });
-            onOwnThread([this, location, finish, summary, read] {
-                finish([&] {
-                    if (read.kind != Outcome::Kind::Done)
-                        throw Base::Error(read.why);
-                    admit(location, *summary);
-                });
+    surroundings_.onReader([this, location, mayBeOf, finish, open = surroundings_.openPack,
+                            onOwnThread = surroundings_.onOwnThread] {
+        auto const summary = std::make_shared<PackSummary>();
+        Outcome const read = outcomeOf([&] { *summary = summaryOf(*open(location)); });
+        onOwnThread([this, location, mayBeOf, finish, summary, read] {
+            finish([&] {
+                if (read.kind != Outcome::Kind::Done)
+                    throw Base::Error(read.why);
+                admit(location, *summary, mayBeOf);
             });
         });
+    });
 }
 
-void JobRunner::admit(PackLocation const& pack, PackSummary const& summary) {
+void JobRunner::admit(PackLocation const& pack, PackSummary const& summary, RequireNode const& mayBeOf) {
+    mayBeOf(summary.cfgId);
     // Somebody else may have sent it meanwhile.
     std::optional<Job> job = jobs_.find(pack.packId);
     if (job) {
@@ -386,10 +390,20 @@ void JobRunner::requireUploadFolder() const {
             "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
 }
 
-void JobRunner::upload(std::string const& folder, std::string const& database) {
+void JobRunner::upload(std::string const& folder, std::string const& database, Policy::Grant const& by) {
     requireUploadFolder();
-    jobs_.wantUpload(folder.empty() ? folder : folderText(folder), database);
+    wantUpload(folder.empty() ? folder : folderText(folder), database, by);
     resume();
+}
+
+void JobRunner::wantUpload(std::string const& folder, std::string const& database, Policy::Grant const& by) {
+    if (by.node.empty())
+        return jobs_.wantUpload(folder, database);
+    for (JobState const state : {JobState::Accepted, JobState::Held, JobState::Queued})
+        for (Job const& job : jobs_.inState(state))
+            if (by.covers(job.cfgId) && (folder.empty() || job.pack.folder == folder) &&
+                (database.empty() || job.pack.database == database))
+                jobs_.wantUpload(job.pack.packId);
 }
 
 void JobRunner::updateStatus(std::string const& folder, std::string const& database) {

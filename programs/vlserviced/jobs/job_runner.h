@@ -5,6 +5,7 @@
 #include "programs/base/local_offset.h"
 #include "programs/mailing/pack_source.h"
 #include "programs/policy/limits.h"
+#include "programs/policy/rights.h"
 #include "programs/vlserviced/jobs/admission.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/job_store.h"
@@ -74,12 +75,16 @@ public:
     /// Takes up what is held and due by now, a few jobs at a time.
     void releaseDue();
     /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
-    /// nothing. The pages are fetched later. `done` is called on the own thread, with the reason as one line
-    /// when the pack cannot be taken, which is empty otherwise.
-    void accept(PackLocation const& pack, std::function<void(std::string const& failure)> done);
-    /// Has the containers of these jobs handed on, those that are not there yet as soon as they are.
-    /// Throws Error when there is no upload folder.
-    void upload(std::string const& folder, std::string const& database);
+    /// nothing. The pages are fetched later. `mayBeOf` is asked whether the node of the pack is one that it
+    /// may be sent for, and throws Error when it is not. `done` is called on the own thread, with the reason
+    /// as one line when the pack cannot be taken, which is empty otherwise.
+    using RequireNode = std::function<void(std::string const& cfgId)>;
+    void accept(PackLocation const& pack, RequireNode const& mayBeOf,
+                std::function<void(std::string const& failure)> done);
+    /// Has the containers of these jobs handed on, of those that the grant covers, and those that are not
+    /// there yet as soon as they are. Throws Error when there is no upload folder.
+    void upload(std::string const& folder, std::string const& database,
+                Policy::Grant const& by = Policy::Grant::ofService());
     /// Brings the states of these jobs up to date with the upload folder, and tries again what failed before.
     void updateStatus(std::string const& folder, std::string const& database);
     /// Told that the letters of a job that go by carriers were all taken on.
@@ -107,7 +112,8 @@ private:
     void refresh(Job const& job);
     void discard(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
-    void admit(PackLocation const& pack, PackSummary const& summary);
+    void admit(PackLocation const& pack, PackSummary const& summary, RequireNode const& mayBeOf);
+    void wantUpload(std::string const& folder, std::string const& database, Policy::Grant const& by);
     void requireUploadFolder() const;
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
     /// The container that goes to the upload folder.

@@ -33,6 +33,11 @@ std::string bytesIn(DocumentUpload const& piece) {
     return std::move(*bytes);
 }
 
+[[noreturn]] void refuseMissing(std::string const& sha256) {
+    throw Base::Error("the service has no document of the digest " + sha256 +
+                      " any more: it was replaced or removed");
+}
+
 } // namespace
 
 DocumentService::DocumentService(DocumentStore& documents, SettingsStore const& nodes,
@@ -54,11 +59,19 @@ Protocol::DocumentsAnswer DocumentService::list(Protocol::DocumentsQuery const& 
     }
 }
 
+void DocumentService::requireTold(std::string const& sha256, Policy::Grant const& to) const {
+    // What lies above the grant's node counts at it, too.
+    std::vector<std::string> const nodes = documents_.nodesOf(sha256);
+    if (std::ranges::none_of(nodes, [&](std::string const& node) {
+            return to.covers(node) || Policy::Grant{{}, {}, node}.covers(to.node);
+        }))
+        refuseMissing(sha256);
+}
+
 Protocol::DocumentPiece DocumentService::piece(Protocol::DocumentPieceQuery const& query) const {
     std::optional<std::string> const bytes = documents_.piece(query.sha256, query.offset);
     if (!bytes)
-        throw Base::Error("the service has no document of the digest " + query.sha256 +
-                          " any more: it was replaced or removed");
+        refuseMissing(query.sha256);
     Protocol::DocumentPiece piece;
     piece.data = Base::toBase64(*bytes);
     return piece;

@@ -2,6 +2,7 @@
 // What the service does with the documents of nodes: letterheads and attachments that pack presets name.
 
 #include "programs/base/digest.h"
+#include "programs/policy/rights.h"
 #include "programs/protocol/documents.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "programs/vlserviced/store/document_store.h"
@@ -27,6 +28,8 @@ public:
 
     Protocol::DocumentsAnswer list(Protocol::DocumentsQuery const& query) const;
     Protocol::DocumentPiece piece(Protocol::DocumentPieceQuery const& query) const;
+    /// Throws Error unless documents of that digest count at a node that the grant covers.
+    void requireTold(std::string const& sha256, Policy::Grant const& to) const;
     Protocol::DocumentUploadAnswer put(Protocol::DocumentUpload const& piece);
     Protocol::StoredDocument remove(Protocol::DocumentRemoval const& removal);
     /// Forgets what has stood still for too long.

@@ -28,6 +28,16 @@ std::optional<long long> DocumentStore::numberOf(std::string const& sha256) cons
     return rows.next() ? std::optional(rows.number(0)) : std::nullopt;
 }
 
+std::vector<std::string> DocumentStore::nodesOf(std::string const& sha256) const {
+    Database::Rows rows = database_.query("SELECT DISTINCT node FROM documents JOIN document_contents "
+                                          "ON number = content WHERE sha256 = $1",
+                                          sha256);
+    std::vector<std::string> nodes;
+    while (rows.next())
+        nodes.push_back(rows.text(0));
+    return nodes;
+}
+
 std::optional<std::string> DocumentStore::piece(std::string const& sha256, long long offset) const {
     std::optional<long long> const content = numberOf(sha256);
     if (!content)

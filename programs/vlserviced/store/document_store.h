@@ -21,6 +21,8 @@ public:
 
     /// Those that lie at a node itself, by their names.
     std::vector<Protocol::StoredDocument> at(std::string const& node) const;
+    /// The nodes that documents of that content lie at.
+    std::vector<std::string> nodesOf(std::string const& sha256) const;
     /// The bytes of a content from `offset` to the end of the piece that it lies in; empty at the end,
     /// nothing when no document has such a content.
     std::optional<std::string> piece(std::string const& sha256, long long offset) const;

@@ -89,6 +89,16 @@ std::string textOf(std::vector<std::string> const& texts) {
     return std::move(text).str();
 }
 
+/// For the id of a node, and of those below it, with a slash in front; empty for the root.
+std::string patternOfEnd(std::string const& node) {
+    if (node.empty())
+        return {};
+    std::string pattern = "%/";
+    for (char const c : node)
+        pattern += std::string(c == '%' || c == '_' || c == '!' ? "!" : "") + c;
+    return pattern;
+}
+
 } // namespace
 
 JobStore::JobStore(Database::Connection& database) : database_(database) {}
@@ -112,6 +122,9 @@ std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) 
     wanted.addEqual("db_name", filter.database, isLookedUp);
     wanted.add(isLookedUp ? std::string() : textOf(filter.packIds),
                [&](std::string const& ids) { return "pack IN " + database_.elementsOf(ids); });
+    // One database makes no difference between small and capital letters here: who asks looks once more.
+    wanted.add(patternOfEnd(filter.node),
+               [](std::string const& pattern) { return "'/' || cfg_id LIKE " + pattern + " ESCAPE '!'"; });
     std::vector<Job> jobs = jobsIn(database_.queryAll(
         SELECT_JOBS + wanted.text() + "ORDER BY accepted_at DESC, pack DESC LIMIT " + std::to_string(limit),
         wanted.values()));

@@ -20,6 +20,8 @@ struct JobFilter {
     std::string folder;
     std::string database;
     std::vector<std::string> packIds;
+    /// Those of this node and of all below it.
+    std::string node = {};
 };
 
 /// Every change is one transaction and on the disk when the operation returns.

@@ -156,13 +156,30 @@ ALTER TABLE jobs ADD COLUMN letters_problem TEXT NOT NULL DEFAULT '';
 CREATE INDEX jobs_with_letters ON jobs (pack) WHERE letters_state = 'delivering';
 )sql";
 
+/// Of a token the database has what checks it. One that was revoked stays, so that its holder is told; its
+/// name is free.
+constexpr char const* SCHEMA_7 = R"sql(
+CREATE TABLE tokens (
+    id            TEXT NOT NULL PRIMARY KEY,
+    name          TEXT NOT NULL,
+    role          TEXT NOT NULL,
+    node          TEXT NOT NULL,
+    service_key   TEXT NOT NULL,
+    client_digest TEXT NOT NULL,
+    added_at      INTEGER NOT NULL,
+    added_by      TEXT NOT NULL,
+    revoked_at    INTEGER NOT NULL
+) WITHOUT ROWID;
+CREATE UNIQUE INDEX tokens_by_name ON tokens (name) WHERE revoked_at = 0;
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
     static Database::DatabaseKind const kind{
         "service database",
         APPLICATION_ID,
-        {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, {SCHEMA_5, SQLITE_5, POSTGRES_5}, SCHEMA_6}};
+        {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, {SCHEMA_5, SQLITE_5, POSTGRES_5}, SCHEMA_6, SCHEMA_7}};
     return kind;
 }
 

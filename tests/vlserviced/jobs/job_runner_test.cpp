@@ -85,9 +85,9 @@ protected:
     std::string acceptFailure(std::string const& folder, std::string const& database,
                               std::string const& packId) {
         std::string told = "never told";
-        runner_->accept({folder, database, packId}, [&](std::string const& failure) {
-            told = failure.empty() ? "nothing was thrown" : failure;
-        });
+        runner_->accept(
+            {folder, database, packId}, [](std::string const&) {},
+            [&](std::string const& failure) { told = failure.empty() ? "nothing was thrown" : failure; });
         return told;
     }
     void stageOnRecord() {
@@ -489,8 +489,9 @@ TEST_F(JobRunnerTest, TakesAPackOnceThatIsSentTwiceBeforeItIsRead) {
     readersWork_.emplace();
     std::vector<std::string> told;
     for (int i = 0; i < 2; ++i)
-        runner_->accept({folder_.path().string(), "packs.db", "p1"},
-                        [&](std::string const& failure) { told.push_back(failure); });
+        runner_->accept(
+            {folder_.path().string(), "packs.db", "p1"}, [](std::string const&) {},
+            [&](std::string const& failure) { told.push_back(failure); });
     for (auto const& work : *readersWork_)
         work();
     EXPECT_EQ(told, (std::vector<std::string>{"", ""}));

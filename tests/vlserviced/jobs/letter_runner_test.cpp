@@ -115,8 +115,9 @@ protected:
     void send(std::string const& id, std::vector<std::string> const& channels,
               std::string const& preset = "\"process_mode\": 2, ") {
         storeLetters(folder_ / "packs.db", id, channels, preset);
-        runner_->accept({folder_.path().string(), "packs.db", id},
-                        [](std::string const& failure) { EXPECT_EQ(failure, ""); });
+        runner_->accept(
+            {folder_.path().string(), "packs.db", id}, [](std::string const&) {},
+            [](std::string const& failure) { EXPECT_EQ(failure, ""); });
     }
     /// The next piece of work that carriers have been given.
     void doOne() {
@@ -140,7 +141,8 @@ protected:
         query.letters = true;
         VlServiced::SettingsStore store(*database_);
         VlServiced::SettingsService const settings(store);
-        return listJobs(query, jobs_, letters_, settings, outbox_, now_).jobs.at(0);
+        return listJobs(query, jobs_, letters_, settings, outbox_, now_, Policy::Grant::ofService())
+            .jobs.at(0);
     }
     /// The job's state and problem.
     std::string job(std::string const& id) {
@@ -535,7 +537,8 @@ TEST_F(LetterRunnerTest, TestsACarrierWithoutSendingAnything) {
 
 TEST_F(LetterRunnerTest, LeavesAnOlderMailingAsItIsWhosePagesAreNotThoseThatArePrinted) {
     storePack(folder_ / "packs.db", "p1", "a=acme", "\"process_mode\": 2, ");
-    runner_->accept({folder_.path().string(), "packs.db", "p1"}, [](std::string const&) {});
+    runner_->accept(
+        {folder_.path().string(), "packs.db", "p1"}, [](std::string const&) {}, [](std::string const&) {});
     EXPECT_EQ(job("p1"), "submitted");
     EXPECT_THAT(report("p1").letters, IsEmpty());
 }
