@@ -6,8 +6,11 @@
 #include "vlservice/platform/log.h"
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <exception>
+#include <memory_resource>
+#include <string>
 #include <tuple>
 #include <type_traits>
 
@@ -43,9 +46,9 @@ struct ExtractField::Keys {
     };
 };
 
-/// The group's bytes, and where the whole match stands in the text.
+/// The group, which lies in the text, and where the whole match stands in it.
 struct ExtractField::Found {
-    std::string value;
+    std::string_view value;
     std::size_t offset;
     std::size_t length;
 };
@@ -64,11 +67,7 @@ std::shared_ptr<ExtractedField> ExtractField::extractField(std::string& text, Me
                                                            OnFailure const& onFailure) const {
     try {
         if (auto found = find(text)) {
-            if (!measure)
-                text.erase(found->offset, found->length);
-            else if (isTooWide(measure(text, found->offset, found->length)))
-                return sharedDefault();
-            return makeValue(std::move(found->value));
+            return measure ? measured(text, *found, measure) : cutOut(text, *found);
         }
     } catch (std::exception const& error) {
         Log::Lock(3).logStreamLine() << "Extract field failed with " << error.what() << '\n';
@@ -122,18 +121,35 @@ bool ExtractField::operator==(ExtractField const& other) const {
 std::optional<ExtractField::Found> ExtractField::find(std::string const& text) const {
     if (strRegex_.empty())
         return std::nullopt;
-    auto const found = compiledRegex_.get(strRegex_).search(text, REGEX_VALUE_GROUP_MARK);
+    auto const found = compiledRegex_.get(strRegex_, REGEX_VALUE_GROUP_MARK).search(text);
     if (!found || !found->group)
         return std::nullopt;
     auto const offset = static_cast<std::size_t>(found->whole.data() - text.data());
-    return Found{std::string(*found->group), offset, found->whole.size()};
+    return Found{*found->group, offset, found->whole.size()};
 }
 
-std::shared_ptr<ExtractedField> ExtractField::makeValue(std::string text) const {
+std::shared_ptr<ExtractedField> ExtractField::cutOut(std::string& text, Found const& found) const {
+    auto value = makeValue(found.value);
+    text.erase(found.offset, found.length);
+    return value;
+}
+
+std::shared_ptr<ExtractedField> ExtractField::measured(std::string& text, Found const& found,
+                                                       Measure const& measure) const {
+    // The measure may change the text.
+    std::string const value(found.value);
+    return isTooWide(measure(text, found.offset, found.length)) ? sharedDefault() : makeValue(value);
+}
+
+std::shared_ptr<ExtractedField> ExtractField::makeValue(std::string_view found) const {
+    // Most values are short: what is changed in them is changed on the stack.
+    std::array<char, 256> room;
+    std::pmr::monotonic_buffer_resource memory(room.data(), room.size());
+    std::pmr::string text(found, &memory);
     if (make1Line_)
         std::erase(text, '\n');
     std::replace(text.begin(), text.end(), '\t', ' ');
-    return std::make_shared<ExtractedField>(name_, text, priority_, sendToServer_, ignoreOnGroup_,
+    return std::make_shared<ExtractedField>(name_, text.c_str(), priority_, sendToServer_, ignoreOnGroup_,
                                             ExtractedField::ValueType::NotValidated);
 }
 

@@ -169,7 +169,10 @@ private:
 
     std::optional<Found> find(std::string const& text) const;
     bool isTooWide(unsigned long long width) const { return width_ != 0 && width_ < width; }
-    std::shared_ptr<ExtractedField> makeValue(std::string text) const;
+    std::shared_ptr<ExtractedField> cutOut(std::string& text, Found const& found) const;
+    std::shared_ptr<ExtractedField> measured(std::string& text, Found const& found,
+                                             Measure const& measure) const;
+    std::shared_ptr<ExtractedField> makeValue(std::string_view found) const;
     /// The validator's own object; null when it has none.
     std::shared_ptr<ExtractedField> const& sharedDefault() const;
 

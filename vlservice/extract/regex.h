@@ -37,14 +37,15 @@ public:
         std::optional<std::string_view> group;
     };
 
-    /// Throws boost::regex_error for a bad pattern and std::out_of_range for one that is not UTF-8.
-    explicit FieldRegex(std::string_view pattern);
+    /// What search() gives beside the match is the group of that name. Throws boost::regex_error for a bad
+    /// pattern and std::out_of_range for one that is not UTF-8.
+    explicit FieldRegex(std::string_view pattern, std::string_view group = {});
     FieldRegex(FieldRegex const&) = delete;
     FieldRegex& operator=(FieldRegex const&) = delete;
     ~FieldRegex();
 
-    /// The first place where the pattern fits, with the group of that name.
-    std::optional<Found> search(std::string_view text, std::string_view group) const;
+    /// The first place where the pattern fits.
+    std::optional<Found> search(std::string_view text) const;
     /// The pattern over the whole text, with all groups.
     std::optional<RegexGroups> match(std::string_view text) const;
 

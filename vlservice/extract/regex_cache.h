@@ -20,11 +20,12 @@ public:
     RegexCache(RegexCache const&) noexcept {}
     RegexCache& operator=(RegexCache const&) noexcept { return *this; }
 
-    /// The compiled pattern; `pattern` counts only while the cache is empty. A pattern that does not compile
-    /// throws and leaves it empty.
-    Regex const& get(std::string const& pattern) const {
+    /// The compiled pattern; `pattern` and what else the expression is made from count only while the cache
+    /// is empty. A pattern that does not compile throws and leaves it empty.
+    template<typename... Rest>
+    Regex const& get(std::string const& pattern, Rest const&... rest) const {
         if (!compiled_)
-            compiled_ = std::make_shared<Regex const>(pattern);
+            compiled_ = std::make_shared<Regex const>(pattern, rest...);
         return *compiled_;
     }
 
