@@ -3,9 +3,11 @@
 // less), and what the second core brings (1.8 times the throughput or more). Then the first page of each by
 // itself, from its bytes to the fields that are found, against poppler's words without their fonts (the aim
 // is 1.5 times; a quarter of poppler's time goes into naming the fonts, which sizes and blanks are told by):
-// many documents are one call, so that what a process needs to begin is paid once. At last the time a page of
-// a document takes with 1,000 pages and with more: "growth" stays near 1.
+// many documents are one call, so that what a process needs to begin is paid once. Likewise "vlmail letter"
+// over all of them as one process against "pdftotext -bbox-layout" over the first page of each (1.5 times).
+// At last the time a page of a document takes with 1,000 pages and with more: "growth" stays near 1.
 #include "programs/reader/letters.h"
+#include "bench/process_time.h"
 #include "programs/base/read_file.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/letters/batch.h"
@@ -145,6 +147,30 @@ void firstPages(benchmark::State& state) {
     state.counters["ratio"] = fields.all() / words.all();
 }
 
+/// It takes one file at a time.
+double secondsByPdftotext() {
+    double all = 0;
+    for (std::string const& file : batch())
+        all += Bench::secondsOf({"/usr/bin/pdftotext", "-l", "1", "-bbox-layout", file, "/dev/null"});
+    return all;
+}
+
+double secondsByVlmail() {
+    std::vector<std::string> command{VLSERVICE_VLMAIL, "letter", "--jobs", "1"};
+    command.insert(command.end(), batch().begin(), batch().end());
+    return Bench::secondsOf(command);
+}
+
+void againstPdftotext(benchmark::State& state) {
+    double pdftotext = 1e9;
+    double vlmail = 1e9;
+    for (auto _ : state) {
+        pdftotext = std::min(pdftotext, secondsByPdftotext());
+        vlmail = std::min(vlmail, secondsByVlmail());
+    }
+    state.counters["ratio"] = vlmail / pdftotext;
+}
+
 /// Letters of two pages each.
 std::string textOfPages(long long pages) {
     std::string text;
@@ -191,6 +217,7 @@ BENCHMARK(popplerAlone)
     ->UseRealTime();
 BENCHMARK(readLetters)->Arg(1)->Arg(2)->Unit(benchmark::kMillisecond)->MeasureProcessCPUTime()->UseRealTime();
 BENCHMARK(firstPages)->Unit(benchmark::kMillisecond);
+BENCHMARK(againstPdftotext)->Unit(benchmark::kMillisecond)->Iterations(5);
 BENCHMARK(manyPages)->RangeMultiplier(10)->Range(1'000, 100'000)->Unit(benchmark::kMillisecond);
 
 } // namespace

@@ -4,50 +4,21 @@
 // as far as it is started; reading a page of a PDF comes on top in "pdf". Shortest times of the processors,
 // so that what else the machine does falls out.
 #include "bench/example_letters.h"
+#include "bench/process_time.h"
 
 #include <benchmark/benchmark.h>
 
-#include <fcntl.h>
-#include <spawn.h>
-#include <sys/resource.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
 namespace {
 
 namespace fs = std::filesystem;
-
-double seconds(timeval const& time) {
-    return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec) / 1e6;
-}
-
-/// Of the processors, with all children of the program.
-double secondsOf(std::vector<std::string> const& command) {
-    std::vector<char*> arguments;
-    for (std::string const& argument : command)
-        arguments.push_back(const_cast<char*>(argument.c_str()));
-    arguments.push_back(nullptr);
-    posix_spawn_file_actions_t actions;
-    ::posix_spawn_file_actions_init(&actions);
-    ::posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
-    pid_t child = 0;
-    bool const isStarted =
-        ::posix_spawn(&child, arguments.front(), &actions, nullptr, arguments.data(), environ) == 0;
-    ::posix_spawn_file_actions_destroy(&actions);
-    int status = 0;
-    rusage used{};
-    if (!isStarted || ::wait4(child, &status, 0, &used) != child || !WIFEXITED(status) ||
-        WEXITSTATUS(status) == 1 || WEXITSTATUS(status) > 2)
-        throw std::runtime_error("cannot run " + command.front());
-    return seconds(used.ru_utime) + seconds(used.ru_stime);
-}
 
 /// A letter of one typed page, which is gone again at the end.
 class TypedLetter {
@@ -75,7 +46,7 @@ void start(benchmark::State& state) {
     std::vector<double> shortest(commands.size(), 1e9);
     for (auto _ : state)
         for (std::size_t i = 0; i < commands.size(); ++i)
-            shortest[i] = std::min(shortest[i], secondsOf(commands[i]));
+            shortest[i] = std::min(shortest[i], Bench::secondsOf(commands[i]));
     state.counters["nothing_ms"] = shortest[0] * 1e3;
     state.counters["version"] = shortest[1] / shortest[0];
     state.counters["letter"] = shortest[2] / shortest[0];

@@ -98,7 +98,8 @@ std::string bashCompletion(CommandInfo const& program) {
     });
     return script +
            "    esac\n    COMPREPLY=($(compgen -W \"$words\" -- \"$current\"))\n"
-           "    [[ $current == -* ]] || mapfile -t -O ${#COMPREPLY[@]} COMPREPLY < <(compgen -f -- \"$current\")\n}\n"
+           "    [[ $current == -* ]] || mapfile -t -O ${#COMPREPLY[@]} COMPREPLY < <(compgen -f -- "
+           "\"$current\")\n}\n"
            "complete -o filenames -F _" +
            program.name + ' ' + program.name + '\n';
 }

@@ -15,7 +15,6 @@ using Kind = Piece::Kind;
 /// Deeper groups are not looked into.
 constexpr int MAX_DEPTH = 40;
 
-
 class OutlineParser {
 public:
     explicit OutlineParser(std::string_view text) : text_(text) {}

@@ -141,8 +141,7 @@ TEST_F(FilesTest, ThatAreSecretMayBeOpenedToAGroupByTheAdministratorAlone) {
     {
         VLServiceTest::WithoutRights const guard;
         EXPECT_EQ(failureOf([&] { Base::readPrivateFile(name); }),
-                  "The file \"" + name +
-                      "\" is open to others (mode 0460); make it private with chmod 600.");
+                  "The file \"" + name + "\" is open to others (mode 0460); make it private with chmod 600.");
     }
     ASSERT_EQ(::setegid(before), 0);
 }

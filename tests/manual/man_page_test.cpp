@@ -56,8 +56,8 @@ TEST(ManPages, AreSetWithoutAWarning) {
         if (entry.path().parent_path().filename() != "man")
             continue;
         ++pages;
-        std::string const command =
-            "test -z \"$(groff -k -man -Tutf8 -ww -z '" + entry.path().string() + "' 2>&1 | tee /dev/stderr)\"";
+        std::string const command = "test -z \"$(groff -k -man -Tutf8 -ww -z '" + entry.path().string() +
+                                    "' 2>&1 | tee /dev/stderr)\"";
         EXPECT_EQ(std::system(command.c_str()), 0) << entry.path();
     }
     EXPECT_GT(pages, 30);

@@ -66,7 +66,8 @@ TEST(Help, ListsCommandsAndTopics) {
 TEST(Help, ExplainsACommandByItsOptionsAndItsPage) {
     Ran const ran = runVlMail({"help", "settings", "show"});
     EXPECT_EQ(ran.status, VlMail::FINE);
-    EXPECT_THAT(ran.out, StartsWith("Shows what counts at a node\nUsage: vlmail settings show [OPTIONS] NODE"));
+    EXPECT_THAT(ran.out,
+                StartsWith("Shows what counts at a node\nUsage: vlmail settings show [OPTIONS] NODE"));
     EXPECT_THAT(ran.out, HasSubstr("  origins\n        for every key the node that its value comes from"));
 }
 

@@ -272,18 +272,53 @@ json::Object addressZone() {
     return zoneOf("Address", {{"left", 2000}, {"top", 4500}, {"right", 11500}, {"bottom", 9000}}, fields);
 }
 
-json::Object extractPresetFor(std::string const& name, Items const& items, Way way) {
+bool isOnLastPage(Item const& item, Way way) {
+    return way == Way::TwoPages && item.name == std::string("total");
+}
+
+json::Object plainPresetFor(std::string const& name, Items const& items, Way way) {
     json::Array zones;
     zones.append(addressZone());
     json::Array fields;
     for (Item const& item : items)
-        if (way != Way::TwoPages || item.name != std::string("total"))
+        if (!isOnLastPage(item, way))
             fields.append(fieldOf(item, way));
     zones.append(zoneOf("Text", wholePage(), fields));
     if (way == Way::TwoPages) {
         json::Array last;
         last.append(fieldOf(items.back(), way));
         zones.append(zoneOf("Total", wholePage(), last));
+    }
+    return {{"match", escaped(name)}, {"name", name}, {"pack_preset", name}, {"zones", zones}};
+}
+
+/// Around the value, and nothing else but its label where both are one line.
+json::Object placeOfValue(Item const& item, int i, Way way) {
+    Place const place = isOnLastPage(item, way) ? Place{25, 60, 150, 60} : placeOf(i, way);
+    auto const hundredths = [](double millimetres) { return static_cast<int>(millimetres * 100); };
+    double const width = way == Way::Lines || way == Way::TwoPages ? 100 : 42;
+    return {{"left", hundredths(place.valueX - 1)},
+            {"top", hundredths(place.valueY - 4)},
+            {"right", hundredths(place.valueX + width)},
+            {"bottom", hundredths(place.valueY + 1)}};
+}
+
+json::Object measuredFieldOf(Item const& item, Way way) {
+    json::Object field = fieldOf(item, way);
+    bool const hasLabel = (way == Way::Lines || way == Way::TwoPages) && !isOnLastPage(item, way);
+    if (!hasLabel)
+        field.set("value_extract", "^(?<VAL>.+)$");
+    return field;
+}
+
+json::Object measuredPresetFor(std::string const& name, Items const& items, Way way) {
+    json::Array zones;
+    zones.append(addressZone());
+    for (std::size_t i = 0; i < items.size(); ++i) {
+        json::Array fields;
+        fields.append(measuredFieldOf(items[i], way));
+        zones.append(zoneOf(isOnLastPage(items[i], way) ? "Total" : items[i].name,
+                            placeOfValue(items[i], static_cast<int>(i), way), fields));
     }
     return {{"match", escaped(name)}, {"name", name}, {"pack_preset", name}, {"zones", zones}};
 }
@@ -315,7 +350,8 @@ Letter letterOf(Country const& country, std::size_t way, std::size_t number) {
     bool const isSwiss = std::string_view(amount).find('\'') != std::string_view::npos;
     return {name,
             pdfOf(country, items, WAYS[way]),
-            extractPresetFor(name, items, WAYS[way]),
+            plainPresetFor(name, items, WAYS[way]),
+            measuredPresetFor(name, items, WAYS[way]),
             packPresetFor(name, country, WAYS[way], isSwiss),
             {{"number", items[0].value},
              {"date", dateInSeconds()},

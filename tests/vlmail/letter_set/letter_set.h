@@ -1,6 +1,7 @@
 #pragma once
-// A set of varied letters, each with a preset as a person writes it who looks at the page for the first time,
-// and with what it should find: six languages, and in each of them seven ways to set a letter.
+// A set of varied letters, each with two presets and with what they should find: one as a person writes it
+// who looks at the page for the first time, one as somebody does who measures where each value stands. Six
+// languages, and in each of them seven ways to set a letter.
 
 #include "vlservice/json/json.h"
 
@@ -14,7 +15,8 @@ struct Letter {
     /// Of its file.
     std::string name;
     std::string pdf;
-    json::Object extractPreset;
+    json::Object plainPreset;
+    json::Object measuredPreset;
     json::Object packPreset;
     /// By the names of fields; dates as seconds.
     std::map<std::string, json::Value> expected;

@@ -322,8 +322,8 @@ TEST(ReportPage, KnowsTheDarkPaperAndTheKeyboard) {
 TEST(FaultsOnPaper, AreDrawnOnEachOfTheirSheetsAndToldInATable) {
     Report::Letter letter = letterWith({});
     letter.sheets.push_back({2, 20000, 30000, "png"});
-    letter.faults.push_back({"clear-zone", true, "pages 1-2", "it stands there", "move it 5 mm up", {0, 1},
-                             {0, 0, 5000, 3000}});
+    letter.faults.push_back(
+        {"clear-zone", true, "pages 1-2", "it stands there", "move it 5 mm up", {0, 1}, {0, 0, 5000, 3000}});
     letter.faults.push_back({"embedded-file-lost", false, "document", "it is lost", "send it", {}, {}});
     std::string const html = section(documentWith({letter}), 1);
     EXPECT_THAT(html, HasSubstr("<a class=\"fault\" id=\"d1l1p1\" href=\"#d1l1p1r\" style=\"left:0%;top:"));
