@@ -88,6 +88,9 @@ public:
     }
 
     std::uint16_t port() const { return port_; }
+    std::optional<long long> certificateEnds() const {
+        return tls_ ? std::optional(certificateEnd(*tls_)) : std::nullopt;
+    }
     std::size_t connections() const { return peers_.size(); }
 
     void accept() {
@@ -278,6 +281,7 @@ Server::~Server() { impl_->closeAll(); }
 
 std::uint16_t Server::port() const { return impl_->port(); }
 std::string const& Server::fingerprint() const { return impl_->fingerprint(); }
+std::optional<long long> Server::certificateEnds() const { return impl_->certificateEnds(); }
 std::size_t Server::connections() const { return impl_->connections(); }
 void Server::stop() { impl_->stop(); }
 

@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace boost::asio {
@@ -86,6 +87,8 @@ public:
     std::uint16_t port() const;
     /// Of the certificate; empty without TLS.
     std::string const& fingerprint() const;
+    /// When the certificate ends, in seconds since the epoch; nothing without TLS.
+    std::optional<long long> certificateEnds() const;
     std::size_t connections() const;
 
     /// Lets nobody in any more and closes each connection when the command that it is handling has been

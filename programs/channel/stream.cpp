@@ -17,6 +17,7 @@
 
 #include <array>
 #include <cerrno>
+#include <ctime>
 #include <sstream>
 
 namespace Channel {
@@ -148,6 +149,14 @@ std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateF
 
 std::string fingerprintOf(ssl::context& context) {
     return fingerprintOf(SSL_CTX_get0_certificate(context.native_handle()));
+}
+
+long long certificateEnd(ssl::context& context) {
+    X509 const* const certificate = SSL_CTX_get0_certificate(context.native_handle());
+    std::tm end{};
+    if (!certificate || ASN1_TIME_to_tm(X509_get0_notAfter(certificate), &end) != 1)
+        throw Base::Error("The end of the certificate cannot be read.");
+    return ::timegm(&end);
 }
 
 std::unique_ptr<ssl::context> makeClientContext() {

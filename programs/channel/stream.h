@@ -47,6 +47,8 @@ std::unique_ptr<boost::asio::ssl::context> makeServiceContext(std::string const&
                                                               std::string const& keyFile);
 /// The fingerprint of the certificate that a context shows. Throws Error.
 std::string fingerprintOf(boost::asio::ssl::context& context);
+/// When that certificate ends, in seconds since the epoch. Throws Error.
+long long certificateEnd(boost::asio::ssl::context& context);
 /// The context of a client. It accepts any certificate: whose it is, is told by the fingerprint.
 std::unique_ptr<boost::asio::ssl::context> makeClientContext();
 

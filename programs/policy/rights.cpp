@@ -3,6 +3,7 @@
 #include "programs/base/plain_text.h"
 #include "programs/protocol/carrier.h"
 #include "programs/protocol/documents.h"
+#include "programs/protocol/health.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/letter.h"
 #include "programs/protocol/pack_upload.h"
@@ -73,6 +74,7 @@ constexpr QuestionRight OF_QUESTIONS[] = {
     {Protocol::BeginPack::KIND, {Role::Send, Place::Node}},
     {Protocol::CarriersQuery::KIND, {Role::Admin, Place::Root}},
     {Protocol::CarrierChange::KIND, {Role::Admin, Place::Root}},
+    {Protocol::HealthQuery::KIND, {Role::Admin, Place::Root}},
     {Protocol::TokenAddition::KIND, {Role::Admin, Place::Node}},
     {Protocol::TokensQuery::KIND, {Role::Admin, Place::Anywhere}},
     {Protocol::TokenRevocation::KIND, {Role::Admin, Place::Anywhere}},

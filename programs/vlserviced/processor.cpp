@@ -77,9 +77,11 @@ Protocol::TreeNode coveredOf(Protocol::TreeNode tree, Policy::Grant const& by) {
 
 Processor::Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens,
                      Access& access, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
-                     PackReception& packs, std::filesystem::path outbox, std::function<long long()> now)
+                     PackReception& packs, std::filesystem::path outbox, std::function<long long()> now,
+                     std::function<Protocol::HealthAnswer()> health)
     : settings_(settings), documents_(documents), tokens_(tokens), access_(access), jobs_(jobs),
-      runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)) {}
+      runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)),
+      health_(std::move(health)) {}
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                          std::function<void(std::string const& failure)> done) {
@@ -183,6 +185,7 @@ std::vector<Processor::Question> const& Processor::answerers() {
          [](Processor& self, json::Object const& question) {
              return self.tokens_.revoke(TokenRevocation(question), self.by_).serialize();
          }},
+        {HealthQuery::KIND, [](Processor& self, json::Object const&) { return self.health_().serialize(); }},
         {BeginPack::KIND, nullptr},
     };
     return all;

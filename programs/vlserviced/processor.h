@@ -1,6 +1,7 @@
 #pragma once
 // Carries out the commands that clients send.
 
+#include "programs/protocol/health.h"
 #include "programs/vlserviced/access.h"
 #include "programs/vlserviced/jobs/job_runner.h"
 #include "programs/vlserviced/jobs/letter_runner.h"
@@ -26,7 +27,8 @@ public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens, Access& access,
               JobStore& jobs, JobRunner& runner, LetterRunner& letters, PackReception& packs,
-              std::filesystem::path outbox, std::function<long long()> now);
+              std::filesystem::path outbox, std::function<long long()> now,
+              std::function<Protocol::HealthAnswer()> health);
 
     /// The kinds of questions that it answers.
     static std::vector<std::string> questions();
@@ -82,6 +84,7 @@ private:
     PackReception& packs_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
+    std::function<Protocol::HealthAnswer()> health_;
     /// Of the command at hand.
     Policy::Grant by_;
     std::function<void(std::string const& failure)> done_;

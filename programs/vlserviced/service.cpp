@@ -8,6 +8,7 @@
 #include "programs/channel/token.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/discovery_answer.h"
+#include "programs/vlserviced/health.h"
 #include "programs/vlserviced/jobs/held_queries.h"
 #include "programs/vlserviced/jobs/local_packs.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
@@ -487,6 +488,17 @@ private:
                 [this](std::string const& node) { return settings_.service().isDisabled(node); }};
     }
 
+    HealthSources healthSources() {
+        return {[this] { Database::Transaction(*database_, Database::Transaction::ALONE); },
+                data_.database(),
+                outbox_,
+                [this] { return settings_.service(); },
+                [this] { return letterRunner_.list(); },
+                server_->certificateEnds(),
+                discovery_.has_value(),
+                &now};
+    }
+
     DataFolder data_;
     fs::path outbox_;
     std::unique_ptr<Database::Connection> database_;
@@ -515,8 +527,9 @@ private:
     JobRunner runner_{jobs_, surroundings()};
     Retention retention_{jobs_, outbox_, [this] { return settings_.service(); }, &now};
     PackReception packs_{packStore_, jobs_, receptionSurroundings()};
-    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(
-        settings_, documents_, tokens_, access_, jobs_, runner_, letterRunner_, packs_, outbox_, &now);
+    std::shared_ptr<Processor> processor_ =
+        std::make_shared<Processor>(settings_, documents_, tokens_, access_, jobs_, runner_, letterRunner_,
+                                    packs_, outbox_, &now, [this] { return healthOf(healthSources()); });
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};

@@ -1,5 +1,8 @@
 #include "tests/faults/one_job.h"
 
+#include "programs/mailing/pack_database.h"
+#include "programs/protocol/job.h"
+#include "programs/vlmail/mailings/pack_upload.h"
 #include "tests/faults/fork_server.h"
 #include "tests/faults/process.h"
 #include "tests/vlserviced/json_help.h"
@@ -7,9 +10,7 @@
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/get_svc_cfg.h"
-#include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/set_svc_cfg.h"
-#include "vlservice/ipc/upload_queued.h"
 
 #include <chrono>
 #include <csignal>
@@ -48,6 +49,10 @@ void awaitStandstill(Channel::Client& client, std::chrono::seconds limit) {
         if (json::Object const job = jobIn(client);
             job.get("state").textOrEmpty() == "submitted" || !job.get("problem").textOrEmpty().empty())
             return;
+}
+
+void handOn(Channel::Client& client) {
+    client.call<Ipc::CSConfigIdsList>(Protocol::JobsChange(Protocol::JobAction::Upload, {PACK}).serialize());
 }
 
 /// Begins the service without linking it again.
@@ -102,7 +107,6 @@ void OneJob::prepare() {
     fs::remove_all(folder_);
     fs::create_directories(upload_);
     fs::create_directories(taken_);
-    fs::copy_file(packDatabase(), folder_ / DATABASE);
     acknowledged_.clear();
     findings_.clear();
 }
@@ -126,14 +130,21 @@ void OneJob::send(ServiceProcess const& service) {
         auto const client = clientOf(service, data_);
         client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
         acknowledged_.insert("the upload folder");
-        client->call<Ipc::ProcessPack>(folder_.string(), DATABASE, PACK);
+        bring(service);
         acknowledged_.insert(PACK);
-        client->call<Ipc::UploadQueued>(folder_.string(), DATABASE);
+        handOn(*client);
         // What failed is tried again later; the next start has to bring it to its end.
         awaitStandstill(*client, std::chrono::seconds(2));
     } catch (std::exception const&) {
         // It was killed, or has told its failure: nothing is acknowledged then.
     }
+}
+
+/// Its pages, over a connection of their own.
+void OneJob::bring(ServiceProcess const& service) {
+    VlMail::ServiceLine line([&] { return clientOf(service, data_); }, {.time = {}, .pause = {}});
+    Mailing::PackDatabaseReader pack(packDatabase(), PACK);
+    VlMail::uploadPack(line, pack);
 }
 
 void OneJob::requireAcknowledged(Channel::Client& client) {
@@ -168,8 +179,8 @@ void OneJob::finish() {
         auto const client = clientOf(service, data_);
         requireAcknowledged(*client);
         client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
-        client->call<Ipc::ProcessPack>(folder_.string(), DATABASE, PACK);
-        client->call<Ipc::UploadQueued>(folder_.string(), DATABASE);
+        bring(service);
+        handOn(*client);
         if (!isSubmitted(*client, std::chrono::seconds(30)))
             find("the mailing is \"" + stateOfJob(*client) + "\" for good");
     } catch (std::exception const& failure) {

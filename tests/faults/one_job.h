@@ -1,6 +1,6 @@
 #pragma once
-// A service that brings one mailing on its way while one of its calls fails. Whatever it acknowledged has to
-// be there after the next start, and the mailing arrives once.
+// A service that gets one mailing over the connection and brings it on its way while one of its calls fails.
+// Whatever it acknowledged has to be there after the next start, and the mailing arrives once.
 
 #include "tests/faults/fault.h"
 #include "tests/support/temporary_folder.h"
@@ -29,13 +29,12 @@ private:
     void prepare();
     void runWith(Fault const& fault);
     void send(ServiceProcess const& service);
+    void bring(ServiceProcess const& service);
     void requireAcknowledged(Channel::Client& client);
     void takeMailings();
     void finish();
     void find(std::string const& what) { findings_.push_back(what); }
-    std::vector<std::string> arguments() const {
-        return {"--data", data_.string(), "--no-discovery", "--local-packs", folder_.string()};
-    }
+    std::vector<std::string> arguments() const { return {"--data", data_.string(), "--no-discovery"}; }
 
     TemporaryFolder root_;
     std::filesystem::path folder_ = root_ / "work";

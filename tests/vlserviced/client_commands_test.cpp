@@ -199,8 +199,63 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     EXPECT_THAT(output({"carriers", "resume", "postal", "--json"}), HasSubstr(R"("state":"working")"));
     EXPECT_EQ(complaint({"carriers", "pause", "fax"}),
               "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are\n");
-    EXPECT_THAT(complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
-                HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, command"));
+    EXPECT_THAT(
+        complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
+        HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, command"));
+}
+
+TEST_F(ClientCommands, TheDoctorFindsAllWell) {
+    output({"settings", "service", "upload_folder=" + (folder_ / "upload").string()});
+    std::string const table = output({"doctor"});
+    EXPECT_THAT(table, HasSubstr("check          state  what there is\n"
+                                 "service        well   is named: 127.0.0.1:"));
+    EXPECT_THAT(table, HasSubstr("\nconnection     well   is let in\n"
+                                 "clock          well   the service's agrees with this one\n"
+                                 "database       well   " +
+                                 (data_ / "service.db").string() + " takes changes\n"));
+    EXPECT_EQ(table.find("remedy"), std::string::npos) << table;
+    EXPECT_THAT(output({"doctor", "--json"}),
+                HasSubstr(R"({"name":"connection","state":"well","says":"is let in","remedy":""})"));
+}
+
+TEST_F(ClientCommands, TheDoctorSaysWhatHelps) {
+    fs::create_directory(folder_ / "shop");
+    output({"settings", "service",
+            R"(carriers={"postal":{"type":"folder","folder":")" + (folder_ / "shop").string() + "\"}}"});
+    EXPECT_THAT(output({"doctor"}), HasSubstr("\ncarrier postal, tried  well   "));
+    output({"carriers", "pause", "postal"});
+    Result const paused = vlmail({"doctor"});
+    EXPECT_EQ(paused.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(paused.out,
+                HasSubstr("\nremedy for carrier postal: \"vlmail carriers resume postal\" lets it go on\n"));
+    output({"carriers", "resume", "postal"});
+    fs::remove_all(folder_ / "shop");
+    Result const gone = vlmail({"doctor"});
+    EXPECT_EQ(gone.status, VlMail::FAILED);
+    EXPECT_THAT(gone.out, HasSubstr("\ncarrier postal, tried  bad    there is no folder " +
+                                    (folder_ / "shop").string() + ": No such file or directory\n"));
+    EXPECT_THAT(
+        gone.out,
+        HasSubstr("\nremedy for carrier postal, tried: \"vlmail settings service\" shows how it is set\n"));
+}
+
+TEST_F(GivenTokens, LetTheDoctorDoubtWhatTheyMayNotAsk) {
+    add("reader", "read", "a=acme");
+    Result const reader = as("reader", {"doctor"});
+    EXPECT_EQ(reader.status, VlMail::INCOMPLETE) << reader.out;
+    EXPECT_THAT(reader.out, HasSubstr("\nconnection  well      is let in\nhealth      doubtful  "));
+}
+
+TEST_F(ClientCommands, TheDoctorEndsWhereNothingFurtherCanBeHad) {
+    Result const stranger = run({"doctor", "--service", "127.0.0.1:" + std::to_string(service_.port()),
+                                 "--token", write("wrong", std::string(64, 'x'))});
+    EXPECT_EQ(stranger.status, VlMail::FAILED);
+    EXPECT_THAT(stranger.out, HasSubstr("\nconnection  bad    "));
+    EXPECT_THAT(
+        stranger.out,
+        HasSubstr("\nremedy for connection: see that the service runs there, and that the token is one "
+                  "of its own (--token FILE)\n"));
+    EXPECT_EQ(stranger.out.find("clock"), std::string::npos);
 }
 
 TEST_F(ClientCommands, LettersAreShownWhereTheyAre) {

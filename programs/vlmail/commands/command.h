@@ -17,6 +17,7 @@ using Task = std::function<int(Terminal const&)>;
 void addCarriersCommand(Base::Command const& app, Task& task);
 void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);
+void addDoctorCommand(Base::Command const& app, Task& task);
 void addDocumentsCommand(Base::Command const& app, Task& task);
 /// Goes behind all others: it tells of them.
 void addHelpCommand(Base::Command const& app, Task& task);

@@ -20,6 +20,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addCarriersCommand(command, task);
     addCheckCommand(command, task);
     addDiscoverCommand(command, task);
+    addDoctorCommand(command, task);
     addDocumentsCommand(command, task);
     addJobChangeCommands(command, task);
     addLetterChangeCommands(command, task);

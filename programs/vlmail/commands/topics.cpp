@@ -15,6 +15,7 @@ constexpr Manual::Topic TOPICS[] = {
     {"carriers test", "carriers.md", "How carriers are doing"},
     {"check", "check.md", ""},
     {"discover", CLIENT, "Looking for the service"},
+    {"doctor", CLIENT, "Whether all is well"},
     {"documents get", CLIENT, "Documents of nodes"},
     {"documents list", CLIENT, "Documents of nodes"},
     {"documents put", CLIENT, "Documents of nodes"},
