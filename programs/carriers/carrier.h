@@ -40,6 +40,10 @@ struct Parcel {
     /// Of all letters; a PDF.
     std::string document;
     long long pages = 0;
+    /// Where they go as files of their own: names and PDFs.
+    std::vector<std::pair<std::string, std::string>> attachments;
+    /// Where answers of recipients go; may be empty.
+    std::string replyTo;
 };
 
 /// How handing over has ended.

@@ -3,6 +3,7 @@
 #include "programs/carriers/command_carrier.h"
 #include "programs/carriers/folder_carrier.h"
 #include "programs/carriers/sftp_carrier.h"
+#include "programs/carriers/smtp_carrier.h"
 
 namespace Carriers {
 
@@ -14,6 +15,8 @@ std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) 
         return std::make_unique<SftpCarrier>(settings);
     case Protocol::CarrierType::Command:
         return std::make_unique<CommandCarrier>(settings);
+    case Protocol::CarrierType::Smtp:
+        return std::make_unique<SmtpCarrier>(settings);
     }
     throw Base::Error("there is no such carrier");
 }

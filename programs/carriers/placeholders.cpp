@@ -15,11 +15,23 @@ bool isName(std::string_view text) {
     });
 }
 
+std::string phoneNumberIn(std::string_view address) {
+    std::string number;
+    for (char const c : address)
+        if ((c >= '0' && c <= '9') || (c == '+' && number.empty()))
+            number += c;
+    if (number.empty() || number == "+")
+        throw Base::Error("the letter's address is no telephone number, which its carrier needs");
+    return number;
+}
+
 std::string valueOf(std::string_view name, OutgoingLetter const& letter, std::string const& mailing) {
     if (name == "key")
         return letter.key;
     if (name == "id")
         return mailing;
+    if (name == "phone_number")
+        return phoneNumberIn(letter.address);
     auto const found = std::ranges::find(letter.fields, name, &std::pair<std::string, std::string>::first);
     if (found == letter.fields.end())
         throw Base::Error("the letter has no field \"" + std::string(name) + "\", which its carrier needs");

@@ -7,9 +7,10 @@
 
 namespace Carriers {
 
-/// The text with {NAME} replaced by the letter's field of that name, {key} by its key and {id} by the
-/// mailing's id. What is filled in is not looked at again; its control characters become blanks. Braces
-/// around anything but letters, digits and "_" stay. Throws Error when the letter has no such field.
+/// The text with {NAME} replaced by the letter's field of that name, {key} by its key, {id} by the
+/// mailing's id and {phone_number} by the digits of its address, with "+" in front where it begins so. What
+/// is filled in is not looked at again; its control characters become blanks. Braces around anything but
+/// letters, digits and "_" stay. Throws Error when the letter has no such field.
 std::string filledIn(std::string const& text, OutgoingLetter const& letter, std::string const& mailing);
 
 } // namespace Carriers

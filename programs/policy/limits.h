@@ -79,7 +79,4 @@ bool goesWithPriority(Cfg::PackPreset const& mailing, Rules const& rules);
 /// whether it goes with priority where that is not the preset's affair.
 json::Object decidedMembers(Rules const& rules);
 
-/// Whether a text has the form NAME@HOST of one e-mail address.
-bool isEmailAddress(std::string_view text);
-
 } // namespace Policy

@@ -1,5 +1,6 @@
 #include "programs/protocol/carrier.h"
 
+#include "programs/base/email_address.h"
 #include "programs/base/host_port.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/quoting.h"
@@ -82,6 +83,33 @@ struct HostKeyForm {
     static std::string wanted() { return "\"SHA256:\" and 43 characters, as ssh-keygen -l prints it"; }
 };
 
+/// The host and port of a server.
+struct SmtpUrlForm {
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        std::size_t const end = text.find("://");
+        std::string const scheme = text.substr(0, end);
+        return end != text.npos && (scheme == "smtp" || scheme == "smtps") &&
+               isHostWithPort(std::string_view(text).substr(end + 3));
+    }
+    static std::string wanted() { return "smtp://HOST:PORT or smtps://HOST:PORT"; }
+};
+
+struct AddressForm {
+    static bool fits(json::Value const& node) { return Base::isEmailAddress(node.textOrEmpty()); }
+    static std::string wanted() { return "one plain address NAME@HOST"; }
+};
+
+/// One line.
+struct LineForm {
+    static constexpr std::size_t MAX_BYTES = 500;
+
+    static bool fits(json::Value const& node) {
+        return node.isString() && Base::isPlainText(node.textOrEmpty(), MAX_BYTES);
+    }
+    static std::string wanted() { return "a line of at most " + std::to_string(MAX_BYTES) + " bytes"; }
+};
+
 /// A file that only the service may read, or what the system's manager hands over.
 struct SecretForm {
     static bool fits(json::Value const& node) {
@@ -153,6 +181,18 @@ struct CarrierSettings::Keys {
         Asked{"user", &CarrierSettings::user, TextForm{}},
         Asked{"text", &CarrierSettings::text, TextForm{}},
     };
+    static constexpr std::tuple SMTP{
+        Asked{"url", &CarrierSettings::url, SmtpUrlForm{}},
+        Asked{"starttls", &CarrierSettings::startsTls, FlagForm{}, true},
+        Asked{"ca_file", &CarrierSettings::caFile, PathForm{}},
+        Asked{"user", &CarrierSettings::user, LineForm{}},
+        Asked{"password_file", &CarrierSettings::passwordFile, SecretForm{}},
+        Asked{"from", &CarrierSettings::from, AddressForm{}},
+        Asked{"from_name", &CarrierSettings::fromName, LineForm{}},
+        Asked{"to", &CarrierSettings::to, LineForm{}},
+        Asked{"subject", &CarrierSettings::subject, LineForm{}},
+        Asked{"text", &CarrierSettings::text, TextForm{}},
+    };
 };
 
 namespace {
@@ -187,6 +227,7 @@ constexpr TypeRow TYPES[] = {
     typeRow<CarrierSettings::Keys::FOLDER>(CarrierType::Folder, "folder", "folder"),
     typeRow<CarrierSettings::Keys::SFTP>(CarrierType::Sftp, "sftp", "url host_key identity_file"),
     typeRow<CarrierSettings::Keys::COMMAND>(CarrierType::Command, "command", "program"),
+    typeRow<CarrierSettings::Keys::SMTP>(CarrierType::Smtp, "smtp", "url from subject"),
 };
 
 std::string typeNames() {
@@ -213,6 +254,9 @@ void requireKeys(json::Object const& object, TypeRow const& row) {
         if (!object.get(key))
             throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
                               Base::inQuotes(key));
+    if (row.type == CarrierType::Smtp && !object.get("user") != !object.get("password_file"))
+        throw Base::Error("a carrier of the type smtp has either both of \"user\" and \"password_file\" or "
+                          "none");
 }
 
 bool isChannel(std::string const& name) {

@@ -18,6 +18,8 @@ enum class CarrierType {
     Sftp,
     /// A program that is run for each letter.
     Command,
+    /// E-mails, given to a server.
+    Smtp,
 };
 
 /// The name that settings have for it.
@@ -70,16 +72,33 @@ struct CarrierSettings {
     long long timeLimit = 60;
     /// In bytes.
     long long outputLimit = 65'536;
-    /// That the program runs as; empty for the service's.
+    /// That the program runs as, empty for the service's; or that a server knows.
     std::string user;
-    /// What the program reads in place of the document, with placeholders.
+    /// What the program reads in place of the document, or what an e-mail says; with placeholders.
     std::string text;
+
+    /// "smtp://HOST:PORT"; all that begins so has to change over to TLS, unless `startsTls` is false.
+    std::string url;
+    bool startsTls = true;
+    /// Of certificates that a server's may be signed with; empty for the system's.
+    std::string caFile;
+    /// An absolute path, or the name of a credential; together with `user`.
+    std::string passwordFile;
+    /// A plain address, and whose it is.
+    std::string from;
+    std::string fromName;
+    /// With placeholders; empty for the letter's address.
+    std::string to;
+    /// With placeholders.
+    std::string subject;
 
     CarrierSettings() = default;
     /// Throws Error on a type that there is not, an unknown key, one that is missing, and a bad value.
     explicit CarrierSettings(json::Object const& object);
 
     CarrierUnit unitOfFiles() const { return unit == "mailing" ? CarrierUnit::Mailing : CarrierUnit::Letter; }
+    /// Whether recipients get files rather than paper.
+    bool sendsFiles() const { return type == CarrierType::Smtp; }
     /// When letters may be handed over; nothing when that is all day.
     std::optional<DayWindow> window() const;
 

@@ -1,5 +1,7 @@
 #include "programs/policy/limits.h"
 
+#include "programs/base/email_address.h"
+
 #include "tests/support/time_zone.h"
 #include "tests/vlserviced/json_help.h"
 
@@ -134,7 +136,7 @@ TEST(PriorityDelivery, IsThePresetsUnlessTheSettingsSayNeverOrAlways) {
 TEST(EmailAddresses, AreTakenByTheirForm) {
     for (char const* good :
          {"ada@example.com", "a.b+c@mail.example.co.uk", "o'neil@x-y.example", "zoë@müller.example", "1@2.3"})
-        EXPECT_TRUE(Policy::isEmailAddress(good)) << good;
+        EXPECT_TRUE(Base::isEmailAddress(good)) << good;
     for (std::string const& bad : {std::string(),
                                    std::string("ada"),
                                    std::string("@example.com"),
@@ -159,7 +161,7 @@ TEST(EmailAddresses, AreTakenByTheirForm) {
                                    "a@" + std::string(64, 'b') + ".com",
                                    "a@b." + std::string(62, 'c') + '.' + std::string(62, 'c') + '.' +
                                        std::string(62, 'c') + '.' + std::string(62, 'c') + ".de"})
-        EXPECT_FALSE(Policy::isEmailAddress(bad)) << bad;
+        EXPECT_FALSE(Base::isEmailAddress(bad)) << bad;
 }
 
 TEST(SourcedSettings, NameTheNodeThatAValueComesFrom) {

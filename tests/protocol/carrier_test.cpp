@@ -42,6 +42,19 @@ TEST(CarrierSettings, AreReadAsTheyAreSaid) {
     EXPECT_EQ(fax.window()->end, 6 * 60);
 }
 
+TEST(CarrierSettings, OfAServerOfEMailAskForTls) {
+    Carriers const carriers = carriersIn(parse(
+        R"({"email": {"type": "smtp", "url": "smtp://[::1]:2525", "from": "a@b.example", "subject": "Invoice {number}"},
+            "fax": {"type": "smtp", "url": "smtps://mail.example", "starttls": false, "from": "a@b.example", "subject": "",
+                    "to": "{phone_number}@fax.example", "user": "u", "password_file": "mail-password", "text": "a\nb"}})"));
+    EXPECT_TRUE(carriers.at("email").startsTls);
+    EXPECT_EQ(carriers.at("email").url, "smtp://[::1]:2525");
+    EXPECT_EQ(carriers.at("email").subject, "Invoice {number}");
+    EXPECT_FALSE(carriers.at("fax").startsTls);
+    EXPECT_EQ(carriers.at("fax").passwordFile, "mail-password");
+    EXPECT_EQ(carriers.at("fax").text, "a\nb");
+}
+
 TEST(CarrierSettings, RefuseWhatTheyDoNotKnow) {
     struct {
         char const* settings;
@@ -53,9 +66,9 @@ TEST(CarrierSettings, RefuseWhatTheyDoNotKnow) {
          R"("carriers" has "a/b", which is no name of an address such as postal, email, fax or sms)"},
         {R"({"postal": 7})", "the carrier of postal has to be an object"},
         {R"({"postal": {}})",
-         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command)"},
+         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command, smtp)"},
         {R"({"postal": {"type": "pigeon"}})",
-         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command)"},
+         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command, smtp)"},
         {R"({"postal": {"type": "folder"}})",
          R"(the carrier of postal: a carrier of the type folder needs the key "folder")"},
         {R"({"postal": {"type": "folder", "folder": "shop"}})",
@@ -74,6 +87,22 @@ TEST(CarrierSettings, RefuseWhatTheyDoNotKnow) {
          R"(the carrier of postal: "give_up_hours" of a carrier has to be an integer from 1 to 8760)"},
         {R"({"postal": {"type": "folder", "folder": "/f", "per_minute": 0}})",
          R"(the carrier of postal: "per_minute" of a carrier has to be an integer from 1 to 100000)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://mail.example:25", "from": "a@b.example"}})",
+         R"(the carrier of email: a carrier of the type smtp needs the key "subject")"},
+        {R"({"email": {"type": "smtp", "url": "http://mail.example", "from": "a@b.example", "subject": ""}})",
+         R"(the carrier of email: "url" of a carrier has to be smtp://HOST:PORT or smtps://HOST:PORT)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://u:p@mail.example", "from": "a@b.example", "subject": ""}})",
+         R"(the carrier of email: "url" of a carrier has to be smtp://HOST:PORT or smtps://HOST:PORT)"},
+        {R"({"email": {"type": "smtp", "url": "smtps://mail.example", "from": "Ada <a@b.example>", "subject": ""}})",
+         R"(the carrier of email: "from" of a carrier has to be one plain address NAME@HOST)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": "a\nb"}})",
+         R"(the carrier of email: "subject" of a carrier has to be a line of at most 500 bytes)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": "", "user": "u"}})",
+         R"(the carrier of email: a carrier of the type smtp has either both of "user" and "password_file" or none)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": "", "user": "u", "password_file": "../x"}})",
+         R"(the carrier of email: "password_file" of a carrier has to be an absolute path, or the name of a credential)"},
+        {R"({"email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": "", "password": "x"}})",
+         R"(the carrier of email: a carrier of the type smtp has no key "password")"},
     };
     for (auto const& [settings, message] : cases)
         EXPECT_EQ(refusal(settings), message) << settings;

@@ -1,4 +1,5 @@
 // Pack presets: whether each is found, used, and read as it is meant.
+#include "programs/base/email_address.h"
 #include "programs/base/local_offset.h"
 #include "programs/policy/limits.h"
 #include "programs/vlmail/presets/checks.h"
@@ -173,7 +174,7 @@ void checkDelays(PresetsDocument const& document, Findings& findings) {
 void checkEmails(PresetsDocument const& document, Findings& findings) {
     for (ListedPackPreset const& pack : document.packPresets()) {
         std::string const email = pack.json.get("customer_email").textOrEmpty();
-        if (!email.empty() && !Policy::isEmailAddress(email))
+        if (!email.empty() && !Base::isEmailAddress(email))
             findings.add(EmailMalformed, pack.place / "customer_email", {inQuotes(email)});
         if (pack.json.get("confirmation_email").isTrue())
             findings.add(ConfirmationNotSent, pack.place / "confirmation_email");

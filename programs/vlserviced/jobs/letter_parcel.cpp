@@ -1,6 +1,7 @@
 #include "programs/vlserviced/jobs/letter_parcel.h"
 
 #include "programs/base/error.h"
+#include "programs/base/safe_name.h"
 #include "programs/mailing/page_blob.h"
 #include "programs/production/joined_pages.h"
 #include "programs/vlserviced/jobs/outbox_mailing.h"
@@ -10,6 +11,8 @@
 
 namespace VlServiced {
 namespace {
+
+using Role = Mailing::DocumentPages::Role;
 
 /// What one document may hold.
 constexpr std::size_t MAX_PARCEL_BYTES = std::size_t{512} << 20;
@@ -49,10 +52,12 @@ Carriers::OutgoingLetter described(StoredLetter const& stored, Mailing::MailedLe
 /// Builds a parcel letter by letter.
 class ParcelMaker {
 public:
-    ParcelMaker(OutboxMailing& mailing, std::string const& key) : mailing_(mailing) {
+    ParcelMaker(OutboxMailing& mailing, std::string const& key, LetterSource::Attachments attachments)
+        : mailing_(mailing), isApart_(attachments == LetterSource::Attachments::Apart) {
         parcel_.key = key;
         parcel_.mailing = mailing.id();
         parcel_.isDuplex = mailing.letters().mailing().packPreset.duplex();
+        parcel_.replyTo = mailing.letters().mailing().packPreset.userEmailOverride();
     }
 
     /// Throws Error when the letter cannot go out; the others are as they were then.
@@ -85,31 +90,48 @@ public:
 private:
     void addPages(Mailing::MailedLetter const& letter) {
         for (Mailing::DocumentPages const& document : letter.documents)
-            for (int const page : document.pages)
-                addPage(mailing_.entryOf(document.document, page));
+            if (!isApart_ || document.role == Role::Letter)
+                for (int const page : document.pages)
+                    addPage(mailing_.entryOf(document.document, page));
+            else if (document.role == Role::Attachment)
+                addFile(document);
+    }
+
+    void addFile(Mailing::DocumentPages const& document) {
+        Production::JoinedPages pages;
+        for (int const page : document.pages)
+            add(pages, mailing_.entryOf(document.document, page));
+        std::string const name = Base::safeFileName(document.document);
+        parcel_.attachments.emplace_back(name.ends_with(".pdf") ? name : name + ".pdf", pages.bytes());
     }
 
     void addPage(unsigned long long entry) {
         auto const [place, isNew] = places_.try_emplace(entry, pages_.size());
         if (!isNew)
             return pages_.addAgain(place->second);
+        add(pages_, entry);
+    }
+
+    void add(Production::JoinedPages& pages, unsigned long long entry) {
         SharedMemBuffer const pdf = Mailing::expanded(mailing_.blob(entry));
         if ((bytes_ += pdf.size()) > MAX_PARCEL_BYTES)
             throw Base::Error("there are more than 512 MiB of pages for one file; hand letters over one by "
                               "one, with \"unit\" letter");
         try {
-            pages_.add(Mailing::viewOf(pdf));
+            pages.add(Mailing::viewOf(pdf));
         } catch (Base::Error const& wrong) {
             throw Base::Error("a page " + std::string(wrong.what()));
         }
     }
 
     void shrink(std::size_t size) {
+        parcel_.attachments.clear();
         pages_.shrink(size);
         std::erase_if(places_, [size](auto const& place) { return place.second >= size; });
     }
 
     OutboxMailing& mailing_;
+    bool isApart_;
     Carriers::Parcel parcel_;
     Production::JoinedPages pages_;
     std::size_t bytes_ = 0;
@@ -130,9 +152,10 @@ OutboxMailing& LetterSource::opened() {
     return *mailing_;
 }
 
-MadeParcel LetterSource::parcelOf(std::vector<StoredLetter> const& letters, std::string const& key) {
+MadeParcel LetterSource::parcelOf(std::vector<StoredLetter> const& letters, std::string const& key,
+                                  Attachments attachments) {
     std::lock_guard<std::mutex> const lock(mutex_);
-    ParcelMaker maker(opened(), key);
+    ParcelMaker maker(opened(), key, attachments);
     MadeParcel made;
     for (StoredLetter const& letter : letters) {
         try {

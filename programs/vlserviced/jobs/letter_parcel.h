@@ -38,9 +38,18 @@ public:
 
     std::string const& packId() const { return packId_; }
 
+    /// Where a letter's attachments go.
+    enum class Attachments {
+        /// Among its pages, as they are printed.
+        Printed,
+        /// As files of their own; sides that only a print has are left out.
+        Apart,
+    };
+
     /// These letters, which are of this mailing, as one parcel of that key: their pages one letter after
     /// another, each on a sheet of its own. Throws std::exception when the container cannot be read.
-    MadeParcel parcelOf(std::vector<StoredLetter> const& letters, std::string const& key);
+    MadeParcel parcelOf(std::vector<StoredLetter> const& letters, std::string const& key,
+                        Attachments attachments = Attachments::Printed);
 
 private:
     OutboxMailing& opened();

@@ -191,7 +191,10 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
 void LetterRunner::carryOut(HandOver& handOver, Carriers::PutOnRecord const& mayHaveThem) {
     handOver.isCarriersFault = false;
     try {
-        MadeParcel const made = handOver.source->parcelOf(handOver.letters, handOver.key);
+        MadeParcel const made =
+            handOver.source->parcelOf(handOver.letters, handOver.key,
+                                      handOver.settings.sendsFiles() ? LetterSource::Attachments::Apart
+                                                                     : LetterSource::Attachments::Printed);
         handOver.setBad(made.bad);
         handOver.isCarriersFault = true;
         if (!made.parcel.letters.empty())
