@@ -5,11 +5,11 @@
 #include "programs/base/hex.h"
 #include "programs/base/private_file.h"
 #include "programs/base/quoting.h"
+#include "programs/base/secret_file.h"
 #include "programs/carriers/placeholders.h"
 
 #include <algorithm>
 #include <charconv>
-#include <cstdlib>
 #include <utility>
 
 namespace Carriers {
@@ -17,18 +17,8 @@ namespace {
 
 constexpr std::size_t MAX_PASSWORD_BYTES = 1000;
 
-/// Those of a system's manager lie in a folder and are named without one.
-std::string passwordFile(std::string const& name) {
-    if (name.starts_with('/'))
-        return name;
-    char const* const folder = std::getenv("CREDENTIALS_DIRECTORY");
-    if (!folder)
-        throw Base::Error("the service has been handed no credentials, and so no " + Base::inQuotes(name));
-    return std::string(folder) + '/' + name;
-}
-
 std::string passwordIn(std::string const& file) {
-    std::string password = Base::readPrivateFile(passwordFile(file), MAX_PASSWORD_BYTES);
+    std::string password = Base::readPrivateFile(Base::secretFile(file), MAX_PASSWORD_BYTES);
     password.erase(std::min(password.find_first_of("\r\n"), password.size()));
     return password;
 }

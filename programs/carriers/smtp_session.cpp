@@ -8,7 +8,6 @@
 #include <algorithm>
 #include <array>
 #include <charconv>
-#include <cstring>
 #include <exception>
 #include <mutex>
 #include <new>
@@ -239,7 +238,7 @@ private:
         if (at_ >= heldBack && !mayHave_ && !putOnRecord())
             return CURL_READFUNC_ABORT;
         std::size_t const size = std::min(room, (mayHave_ ? message.size() : heldBack) - at_);
-        std::memcpy(into, message.data() + at_, size);
+        message.copy(into, size, at_);
         at_ += size;
         return size;
     }

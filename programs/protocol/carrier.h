@@ -77,8 +77,7 @@ struct CarrierSettings {
     /// What the program reads in place of the document, or what an e-mail says; with placeholders.
     std::string text;
 
-    /// "smtp://HOST:PORT"; all that begins so has to change over to TLS, unless `startsTls` is false.
-    std::string url;
+    /// Whether a server of smtp:// has to change over to TLS.
     bool startsTls = true;
     /// Of certificates that a server's may be signed with; empty for the system's.
     std::string caFile;

@@ -12,7 +12,6 @@ using Carriers::MailMessage;
 using Carriers::MailReport;
 using testing::EndsWith;
 using testing::HasSubstr;
-using testing::Not;
 using testing::StartsWith;
 
 MailMessage billOf(std::string const& subject) {

@@ -19,7 +19,6 @@ namespace fs = std::filesystem;
 
 using Carriers::Outcome;
 using testing::AllOf;
-using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;

@@ -7,7 +7,7 @@ Prints its port, then a line for each message that it has. What it does stands i
   login     [user, password]: that has to be given
   size      the limit that is told
   replies   {"RCPT": "550 5.1.1 no"}: what is answered to a command; "." is the end of a message
-  behind    {"." : "cut"}: the connection ends behind the command, without an answer, or "leave": behind it
+  behind    {"." : "cut"}: the connection ends behind the command, without an answer, or "leave": behind it, or "hang once": the first is not answered
   connections  how many it takes; others are ended at once
   cut       [direction, line]: ends the connection at that line "from" the client or "to" it, from 1, once
 """
@@ -45,6 +45,8 @@ class Handler:
         answer = wanted.get("replies", {}).get(".", "250 2.0.0 taken")
         if answer.startswith("2"):
             keep(envelope)
+        if wanted.get("behind", {}).get(".") == "hang once" and taken == 1:
+            await asyncio.Event().wait()
         if wanted.get("behind", {}).get(".") == "cut":
             server.transport.abort()
         return answer

@@ -1,5 +1,6 @@
 // A service that hands letters over to carriers, ended at any of the calls that make something durable or
 // visible: what the other side has of them is counted.
+#include "tests/carriers/smtp_server.h"
 #include "tests/carriers/ssh_server.h"
 #include "tests/faults/fault.h"
 #include "tests/support/temporary_folder.h"
@@ -13,9 +14,11 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <chrono>
 #include <csignal>
 #include <fstream>
+#include <initializer_list>
 #include <set>
 #include <sstream>
 
@@ -214,12 +217,11 @@ private:
     std::optional<SshServer> server_;
 };
 
-/// A program that counts how often it has had each letter.
-class CommandedLetters : public CarriedLetters {
+/// Letters that another side counts, which never has one twice.
+class CountedLetters : public CarriedLetters {
 public:
-    CommandedLetters() {
-        setProgram("echo $1 >>had");
-        storeLetters(folder_ / "sms.db", "s1", {"sms", "sms", "sms", "sms"});
+    explicit CountedLetters(std::string channel) : channel_(std::move(channel)) {
+        storeLetters(folder_ / "counted.db", "s1", {channel_, channel_, channel_, channel_});
     }
 
     /// False when the service got to the end alive.
@@ -239,6 +241,62 @@ public:
         requireOnce(told(*clientOf(service, data_)), when);
         return !survived;
     }
+
+protected:
+    /// The settings of the channel's carrier.
+    virtual json::Object carrier() const = 0;
+    /// How often the other side has had each, by its key.
+    virtual std::map<std::string, int> times() const = 0;
+
+    void begin(Channel::Client& client) const {
+        client.call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{channel_.c_str(), carrier()}}}});
+        client.call<Ipc::ProcessPack>(folder_.path().string(), "counted.db", "s1");
+        client.call<Ipc::UploadQueued>(folder_.path().string(), "counted.db");
+    }
+    bool send(ServiceProcess const& service) const {
+        try {
+            auto const client = clientOf(service, data_);
+            begin(*client);
+            auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+            while (isUnderWay(told(*client)) && std::chrono::steady_clock::now() < end) {
+            }
+            return !isUnderWay(told(*client));
+        } catch (std::exception const&) {
+            return false;
+        }
+    }
+    static bool isUnderWay(std::string const& states) {
+        return std::ranges::any_of(
+            std::initializer_list<char const*>{"accepted:", "queued:", " waiting", "handed over"},
+            [&](char const* state) { return states.find(state) != states.npos; });
+    }
+
+    void requireOnce(std::string const& states, std::string const& when) const {
+        std::map<std::string, int> const had = times();
+        std::istringstream words(states);
+        std::string state;
+        words >> state >> state;
+        int uncertain = 0;
+        for (int letter = 1; words >> state; ++letter) {
+            auto const found = had.find("s1-" + std::to_string(letter));
+            int const known = found == had.end() ? 0 : found->second;
+            uncertain += state == "uncertain" ? 1 : 0;
+            EXPECT_TRUE(known == 1 || (known == 0 && state == "uncertain"))
+                << letter << ' ' << state << ' ' << known << ' ' << when;
+        }
+        EXPECT_LE(uncertain, 1) << when;
+    }
+
+private:
+    void TestBody() override {}
+
+    std::string channel_;
+};
+
+/// By a program.
+class CommandedLetters : public CountedLetters {
+public:
+    CommandedLetters() : CountedLetters("sms") { setProgram("echo $1 >>had"); }
 
     /// Ends the service while the program has the first letter.
     void endWithALetterOnItsWay() {
@@ -260,60 +318,64 @@ public:
     }
 
 private:
-    void TestBody() override {}
-
-    void setProgram(std::string const& script) {
+    json::Object carrier() const override {
+        return {{"type", "command"},
+                {"program", program_.string()},
+                {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
+    }
+    std::map<std::string, int> times() const override {
+        std::map<std::string, int> times;
+        std::istringstream had(textOf(folder_ / "had"));
+        for (std::string key; had >> key;)
+            ++times[key];
+        return times;
+    }
+    void setProgram(std::string const& script) const {
         std::ofstream(program_) << "#!/bin/sh\ncd '" + folder_.path().string() + "'\n" + script + '\n';
         fs::permissions(program_, fs::perms::owner_all);
     }
 
-    void begin(Channel::Client& client) {
-        json::Object const carrier{{"type", "command"},
-                                   {"program", program_.string()},
-                                   {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
-        client.call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{"sms", carrier}}}});
-        client.call<Ipc::ProcessPack>(folder_.path().string(), "sms.db", "s1");
-        client.call<Ipc::UploadQueued>(folder_.path().string(), "sms.db");
-    }
-
-    bool send(ServiceProcess const& service) {
-        try {
-            auto const client = clientOf(service, data_);
-            begin(*client);
-            auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
-            auto const isUnderWay = [&](std::string const& states) {
-                return states.find("accepted:") != std::string::npos ||
-                       states.find("queued:") != std::string::npos ||
-                       states.find(" waiting") != std::string::npos ||
-                       states.find("handed over") != std::string::npos;
-            };
-            while (isUnderWay(told(*client)) && std::chrono::steady_clock::now() < end) {
-            }
-            return !isUnderWay(told(*client));
-        } catch (std::exception const&) {
-            return false;
-        }
-    }
-
-    void requireOnce(std::string const& states, std::string const& when) {
-        std::istringstream had(textOf(folder_ / "had"));
-        std::map<std::string, int> times;
-        for (std::string key; had >> key;)
-            ++times[key];
-        std::istringstream words(states);
-        std::string state;
-        words >> state >> state;
-        int uncertain = 0;
-        for (int letter = 1; words >> state; ++letter) {
-            int const known = times["s1-" + std::to_string(letter)];
-            uncertain += state == "uncertain" ? 1 : 0;
-            EXPECT_TRUE(known == 1 || (known == 0 && state == "uncertain"))
-                << letter << ' ' << state << ' ' << known << ' ' << when;
-        }
-        EXPECT_LE(uncertain, 1) << when;
-    }
-
     fs::path program_ = folder_ / "program";
+};
+
+/// By a server of e-mail.
+class MailedLetters : public CountedLetters {
+public:
+    explicit MailedLetters(std::string const& server = "{}")
+        : CountedLetters("email"), server_(folder_ / "mails", parse(server)) {}
+
+    std::string missing() const { return server_.missing(); }
+
+    /// The server takes the first letter and says nothing.
+    void killWhileTheServerHasALetter() {
+        ServiceProcess service(arguments());
+        auto const client = clientOf(service, data_);
+        begin(*client);
+        server_.awaitMessage();
+        service.signal(SIGKILL);
+        service.wait();
+    }
+    void goOn() {
+        ServiceProcess const service(arguments());
+        EXPECT_TRUE(send(service));
+        // As clients are told that do not ask for the state "delivering".
+        EXPECT_EQ(told(*clientOf(service, data_)), "s1 submitted: uncertain accepted accepted accepted\n");
+        EXPECT_EQ(server_.messages().size(), 4U);
+    }
+
+private:
+    json::Object carrier() const override {
+        return {{"type", "smtp"},     {"url", server_.url()},      {"from", "bills@acme.example"},
+                {"subject", "{key}"}, {"to", "{key}@example.com"}, {"starttls", false}};
+    }
+    std::map<std::string, int> times() const override {
+        std::map<std::string, int> times;
+        for (std::string const& message : server_.messages())
+            ++times[message.substr(message.find('\n') + 1, 4)];
+        return times;
+    }
+
+    VLServiceTest::SmtpServer server_;
 };
 
 TEST(ServiceThatIsEndedAmongLetters, FinishesThoseThatAreOnTheirWayAndPutsThemOnRecord) {
@@ -322,10 +384,18 @@ TEST(ServiceThatIsEndedAmongLetters, FinishesThoseThatAreOnTheirWayAndPutsThemOn
     letters.goOn();
 }
 
-/// Every fourth call, from the parameter on.
-class ServiceThatIsKilledAmongLetters : public testing::TestWithParam<int> {};
+TEST(ServiceThatIsKilledAmongLetters, TellsOneAsUncertainThatAServerOfEMailHasTakenAndNotAnswered) {
+    MailedLetters letters(R"({"behind":{".":"hang once"}})");
+    if (!letters.missing().empty())
+        GTEST_SKIP() << letters.missing();
+    letters.killWhileTheServerHasALetter();
+    letters.goOn();
+}
 
-TEST_P(ServiceThatIsKilledAmongLetters, HandsEachOverUnderItsKeyAndLosesNone) {
+/// Every fourth call, from the parameter on.
+class ServiceThatIsKilledAtEachCall : public testing::TestWithParam<int> {};
+
+TEST_P(ServiceThatIsKilledAtEachCall, HandsEachOverUnderItsKeyAndLosesNone) {
     int call = GetParam();
     while (OneKillAmongLetters().killedAt(call) && !HasFailure())
         call += 4;
@@ -333,7 +403,7 @@ TEST_P(ServiceThatIsKilledAmongLetters, HandsEachOverUnderItsKeyAndLosesNone) {
     EXPECT_GT(call, 100);
 }
 
-TEST_P(ServiceThatIsKilledAmongLetters, PutsEachToAnotherMachineUnderItsKeyAndLosesNone) {
+TEST_P(ServiceThatIsKilledAtEachCall, PutsEachToAnotherMachineUnderItsKeyAndLosesNone) {
     if (!SshServer::whyNot().empty())
         GTEST_SKIP() << SshServer::whyNot();
     int piece = GetParam();
@@ -343,13 +413,24 @@ TEST_P(ServiceThatIsKilledAmongLetters, PutsEachToAnotherMachineUnderItsKeyAndLo
     EXPECT_GT(piece, 100);
 }
 
-TEST_P(ServiceThatIsKilledAmongLetters, GivesNoneToAProgramTwiceAndTellsOfOneAsUncertainAtMost) {
+TEST_P(ServiceThatIsKilledAtEachCall, GivesNoneToAProgramTwiceAndTellsOfOneAsUncertainAtMost) {
     int call = GetParam();
     while (CommandedLetters().killedAt(call) && !HasFailure())
         call += 4;
     EXPECT_GT(call, 40);
 }
 
-INSTANTIATE_TEST_SUITE_P(AtEveryCall, ServiceThatIsKilledAmongLetters, testing::Range(1, 5));
+TEST_P(ServiceThatIsKilledAtEachCall, MailsNoneTwiceAndTellsOfOneAsUncertainAtMost) {
+    int call = GetParam();
+    for (bool isKilled = true; isKilled && !HasFailure(); call += 4) {
+        MailedLetters letters;
+        if (!letters.missing().empty())
+            GTEST_SKIP() << letters.missing();
+        isKilled = letters.killedAt(call);
+    }
+    EXPECT_GT(call, 40);
+}
+
+INSTANTIATE_TEST_SUITE_P(AmongLetters, ServiceThatIsKilledAtEachCall, testing::Range(1, 5));
 
 } // namespace

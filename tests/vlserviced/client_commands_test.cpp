@@ -201,7 +201,8 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
               "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are\n");
     EXPECT_THAT(
         complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
-        HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, command, smtp"));
+        HasSubstr(
+            "the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, command, smtp"));
 }
 
 TEST_F(ClientCommands, TheDoctorFindsAllWell) {

@@ -127,6 +127,33 @@ TEST_F(Dividing, BeginsEachLetterOnASheetOfItsOwn) {
     }
 }
 
+TEST_F(Dividing, MakesFilesOfAttachmentsThatGoApart) {
+    using Role = Mailing::DocumentPages::Role;
+    Mailing::Metadata mailing = lettersOf("p1", {"email"}, R"("customer_email": "service@acme.example", )");
+    std::vector<Mailing::DocumentPages>& documents = mailing.letters.front().documents;
+    documents.push_back({"blank", {1}, Role::Blank});
+    documents.push_back({"../terms of trade", {1, 2}, Role::Attachment});
+    documents.push_back({"prices.pdf", {1}, Role::Attachment});
+    Mailing::ContainerWriter writer(container_, "p1");
+    saveLetters(writer, mailing);
+    for (auto const& [document, page] : {std::pair{"blank", "1"}, std::pair{"../terms of trade", "1"},
+                                         std::pair{"../terms of trade", "2"}, std::pair{"prices.pdf", "1"}})
+        writer.savePage(document, page, zipped(pdfOfLetter(7)));
+    writer.finish(mailing.toBlob(), "");
+    LetterSource source(folder_.path(), "p1");
+    MadeParcel const apart = source.parcelOf({stored(1, "email")}, "p1-1", LetterSource::Attachments::Apart);
+    EXPECT_THAT(apart.bad, IsEmpty());
+    EXPECT_EQ(apart.parcel.pages, 1);
+    EXPECT_EQ(apart.parcel.replyTo, "service@acme.example");
+    ASSERT_EQ(apart.parcel.attachments.size(), 2U);
+    EXPECT_EQ(apart.parcel.attachments[0].first, "_._terms of trade.pdf");
+    EXPECT_EQ(apart.parcel.attachments[1].first, "prices.pdf");
+    EXPECT_THAT(apart.parcel.attachments[1].second, testing::StartsWith("%PDF-"));
+    MadeParcel const printed = source.parcelOf({stored(1, "email")}, "p1-1");
+    EXPECT_EQ(printed.parcel.pages, 5);
+    EXPECT_THAT(printed.parcel.attachments, IsEmpty());
+}
+
 TEST_F(Dividing, LeavesOutLettersThatCanNeverGoOut) {
     Mailing::Metadata mailing = lettersOf("p1", {"postal", "postal", "postal", "postal"});
     mailing.letters[1].documents.front().pages = {1, 7};
