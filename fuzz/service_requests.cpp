@@ -22,7 +22,8 @@ struct MemoryService {
     Database::SqliteConnection database{
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::SettingsStore store{database};
-    VlServiced::SettingsService settings{store};
+    VlServiced::History history{database, [] { return 1LL; }};
+    VlServiced::SettingsService settings{store, &VlServiced::SettingsService::localClock, history};
     VlServiced::DocumentStore documentStore{database};
     VlServiced::DocumentService documents{documentStore, store, settings, [] { return 1LL; }};
     VlServiced::JobStore jobs{database};
@@ -46,11 +47,11 @@ struct MemoryService {
                                      [] { return 1LL; }, [](std::string const&) { return std::nullopt; },
                                      [](std::string const&) { return false; }}};
     VlServiced::TokenStore tokenStore{database};
-    VlServiced::TokenService tokens{tokenStore, std::string(32, 't'), [] { return 1LL; }};
+    VlServiced::TokenService tokens{tokenStore, std::string(32, 't'), [] { return 1LL; }, history};
     VlServiced::Access access{[] { return 1LL; }};
-    std::shared_ptr<VlServiced::Processor> processor =
-        std::make_shared<VlServiced::Processor>(settings, documents, tokens, access, jobs, runner,
-                                                letterRunner, packs, "/missing/outbox", [] { return 1LL; });
+    std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
+        settings, documents, tokens, access, history, jobs, runner, letterRunner, packs, "/missing/outbox",
+        [] { return 1LL; }, [] { return Protocol::HealthAnswer(); });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

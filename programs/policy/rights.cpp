@@ -4,6 +4,7 @@
 #include "programs/protocol/carrier.h"
 #include "programs/protocol/documents.h"
 #include "programs/protocol/health.h"
+#include "programs/protocol/history.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/letter.h"
 #include "programs/protocol/pack_upload.h"
@@ -78,6 +79,8 @@ constexpr QuestionRight OF_QUESTIONS[] = {
     {Protocol::TokenAddition::KIND, {Role::Admin, Place::Node}},
     {Protocol::TokensQuery::KIND, {Role::Admin, Place::Anywhere}},
     {Protocol::TokenRevocation::KIND, {Role::Admin, Place::Anywhere}},
+    {Protocol::HistoryQuery::KIND, {Role::Admin, Place::Anywhere}},
+    {Protocol::SettingsImpactQuery::KIND, {Role::Settings, Place::Node}},
 };
 
 std::string placeInWords(std::string const& node) { return node.empty() ? "the root" : Base::oneLine(node); }

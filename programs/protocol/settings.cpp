@@ -1,11 +1,18 @@
 #include "programs/protocol/settings.h"
 
+#include "programs/base/error.h"
 #include "programs/protocol/query.h"
 #include "programs/protocol/rows.h"
 
 #include <utility>
 
 namespace Protocol {
+namespace {
+
+constexpr char const* OWN = "own";
+
+} // namespace
+
 struct SettingsQuery::Keys {
     static constexpr std::tuple TABLE{
         Asked{"parts", &SettingsQuery::parts, TextsForm{MAX_PARTS}},
@@ -26,6 +33,25 @@ struct SettingsAnswer::Keys {
         Always{"known", &SettingsAnswer::known},
         Always{"chain", &SettingsAnswer::chain},
         Always{"parts", &SettingsAnswer::parts},
+    };
+};
+
+struct SettingsImpactQuery::Keys {
+    static constexpr std::tuple TABLE{
+        Asked{"part", &SettingsImpactQuery::part, TextForm{}},
+    };
+};
+
+struct ImpactedNode::Keys {
+    static constexpr std::tuple TABLE{
+        Always{NODE_ID, &ImpactedNode::id},
+        Always{"keys", &ImpactedNode::keys},
+    };
+};
+
+struct SettingsImpactAnswer::Keys {
+    static constexpr std::tuple TABLE{
+        Always{"nodes", &SettingsImpactAnswer::nodes},
     };
 };
 
@@ -66,5 +92,34 @@ PartSettings SettingsAnswer::part(std::string const& name) const {
 
 TreeNode::TreeNode(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
 json::Object TreeNode::serialize() const { return writeRecord(*this); }
+
+SettingsImpactQuery::SettingsImpactQuery(std::string nodeId, std::string partName, json::Object values)
+    : id(std::move(nodeId)), part(std::move(partName)), own(std::move(values)) {}
+
+SettingsImpactQuery::SettingsImpactQuery(json::Object const& object) : id(nodeIn(object, IN_WORDS)) {
+    json::readKeys(Keys::TABLE, object, *this);
+    json::Value const values = object.get(OWN);
+    if (!values.isObject())
+        throw Base::Error(std::string("\"own\" of ") + IN_WORDS + " has to be an object");
+    own = values.toObject();
+}
+
+json::Object SettingsImpactQuery::serialize() const {
+    json::Object object = question(KIND);
+    object.set(NODE_ID, id);
+    json::writeKeys(Keys::TABLE, *this, object);
+    object.set(OWN, own);
+    return object;
+}
+
+ImpactedNode::ImpactedNode(std::string nodeId, std::vector<std::string> changedKeys)
+    : id(std::move(nodeId)), keys(std::move(changedKeys)) {}
+ImpactedNode::ImpactedNode(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
+json::Object ImpactedNode::serialize() const { return writeRecord(*this); }
+
+SettingsImpactAnswer::SettingsImpactAnswer(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+}
+json::Object SettingsImpactAnswer::serialize() const { return writeRecord(*this); }
 
 } // namespace Protocol

@@ -66,6 +66,48 @@ struct SettingsAnswer {
     struct Keys;
 };
 
+/// Asks what would count otherwise, if the own values of a part of a node were replaced.
+struct SettingsImpactQuery {
+    static constexpr char const* KIND = "settings_impact";
+    static constexpr char const* IN_WORDS = "a query for what settings would change";
+
+    std::string id;
+    std::string part;
+    /// In the form that a set command takes.
+    json::Object own;
+
+    SettingsImpactQuery() = default;
+    SettingsImpactQuery(std::string nodeId, std::string partName, json::Object values);
+    /// Throws Error when there is no id, or on a wrong type.
+    explicit SettingsImpactQuery(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// A node at which some settings of the part would have another value.
+struct ImpactedNode {
+    std::string id;
+    std::vector<std::string> keys;
+
+    ImpactedNode() = default;
+    ImpactedNode(std::string nodeId, std::vector<std::string> changedKeys);
+    explicit ImpactedNode(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+struct SettingsImpactAnswer {
+    std::vector<ImpactedNode> nodes;
+
+    SettingsImpactAnswer() = default;
+    explicit SettingsImpactAnswer(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
 /// A node of the tree of all nodes.
 struct TreeNode {
     std::string id;

@@ -76,16 +76,17 @@ Protocol::TreeNode coveredOf(Protocol::TreeNode tree, Policy::Grant const& by) {
 } // namespace
 
 Processor::Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens,
-                     Access& access, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
-                     PackReception& packs, std::filesystem::path outbox, std::function<long long()> now,
-                     std::function<Protocol::HealthAnswer()> health)
-    : settings_(settings), documents_(documents), tokens_(tokens), access_(access), jobs_(jobs),
-      runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)), now_(std::move(now)),
-      health_(std::move(health)) {}
+                     Access& access, History& history, JobStore& jobs, JobRunner& runner,
+                     LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
+                     std::function<long long()> now, std::function<Protocol::HealthAnswer()> health)
+    : settings_(settings), documents_(documents), tokens_(tokens), access_(access), history_(history),
+      jobs_(jobs), runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)),
+      now_(std::move(now)), health_(std::move(health)) {}
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                          std::function<void(std::string const& failure)> done) {
     by_ = by;
+    History::Person const acting(history_, by_.name);
     done_ = std::move(done);
     std::string failed;
     try {
@@ -186,6 +187,14 @@ std::vector<Processor::Question> const& Processor::answerers() {
              return self.tokens_.revoke(TokenRevocation(question), self.by_).serialize();
          }},
         {HealthQuery::KIND, [](Processor& self, json::Object const&) { return self.health_().serialize(); }},
+        {HistoryQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.historyOf(HistoryQuery(question)).serialize();
+         }},
+        {SettingsImpactQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.settings_.impact(SettingsImpactQuery(question)).serialize();
+         }},
         {BeginPack::KIND, nullptr},
     };
     return all;
@@ -228,6 +237,14 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
 
 Protocol::JobsAnswer Processor::listed(Protocol::JobsQuery const& query) const {
     return listJobs(query, jobs_, letters_.store(), settings_, outbox_, now_(), by_);
+}
+
+Protocol::HistoryAnswer Processor::historyOf(Protocol::HistoryQuery const& query) {
+    if (query.id)
+        access_.require(Policy::Role::Admin, *query.id, by_);
+    Protocol::HistoryAnswer answer;
+    answer.entries = history_.of(query.id.value_or(by_.node), query.limit);
+    return answer;
 }
 
 /// Of jobs of other nodes the holder is told what he is told of those that there are not.
@@ -300,7 +317,9 @@ void Processor::visit(Ipc::ProcessPack& cmd) {
     // Of a job that is on record the pages may be gone.
     if (jobs_.find(pack.packId))
         return runner_.accept(pack, mayBeOf, std::move(done));
-    packs_.complete(pack.packId, [this, pack, mayBeOf, done = std::move(done)](std::string const& failure) {
+    packs_.complete(pack.packId, [this, pack, mayBeOf, done = std::move(done),
+                                  who = by_.name](std::string const& failure) {
+        History::Person const acting(history_, who);
         failure.empty() ? runner_.accept(pack, mayBeOf, done) : done(failure);
     });
 }

@@ -26,8 +26,8 @@ class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI 
 public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens, Access& access,
-              JobStore& jobs, JobRunner& runner, LetterRunner& letters, PackReception& packs,
-              std::filesystem::path outbox, std::function<long long()> now,
+              History& history, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
+              PackReception& packs, std::filesystem::path outbox, std::function<long long()> now,
               std::function<Protocol::HealthAnswer()> health);
 
     /// The kinds of questions that it answers.
@@ -70,6 +70,7 @@ private:
     json::Object changeLetter(Protocol::LetterChange const& change);
     json::Object changeCarrier(Protocol::CarrierChange const& change);
     Protocol::JobsAnswer listed(Protocol::JobsQuery const& query) const;
+    Protocol::HistoryAnswer historyOf(Protocol::HistoryQuery const& query);
     void requireJob(std::string const& packId) const;
     void testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd);
     json::Object serviceOverview() const;
@@ -78,6 +79,7 @@ private:
     DocumentService& documents_;
     TokenService& tokens_;
     Access& access_;
+    History& history_;
     JobStore& jobs_;
     JobRunner& runner_;
     LetterRunner& letters_;

@@ -388,6 +388,7 @@ private:
 
     void sweepEnded() {
         packs_.sweep();
+        history_.removeOld();
         removeEndedJobs();
     }
 
@@ -460,7 +461,8 @@ private:
                 &letterRunner_,
                 [this](PackLocation const& pack) {
                     return pack.isWithService() ? packStore_->open(pack.packId) : localPacks_.open(pack);
-                }};
+                },
+                history_};
     }
 
     LetterSurroundings letterSurroundings() {
@@ -478,7 +480,8 @@ private:
                 &Carriers::makeCarrier,
                 [this](std::string const& packId) { runner_.onLettersTaken(packId); },
                 [this] { awaitLetters(); },
-                [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); }};
+                [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); },
+                history_};
     }
 
     ReceptionSurroundings receptionSurroundings() {
@@ -503,16 +506,17 @@ private:
     fs::path outbox_;
     std::unique_ptr<Database::Connection> database_;
     SettingsStore store_{*database_};
-    SettingsService settings_{store_};
+    History history_{*database_, &now};
+    SettingsService settings_{store_, &SettingsService::localClock, history_};
     DocumentStore documentStore_{*database_};
-    DocumentService documents_{documentStore_, store_, settings_, &now};
+    DocumentService documents_{documentStore_, store_, settings_, &now, history_};
     JobStore jobs_{*database_};
     LetterStore letters_{*database_, jobs_};
     LocalPacks localPacks_;
     std::shared_ptr<PackStore> packStore_;
     OwnToken ownToken_;
     TokenStore tokenStore_{*database_};
-    TokenService tokens_{tokenStore_, ownToken_.text, &now};
+    TokenService tokens_{tokenStore_, ownToken_.text, &now, history_};
     Access access_{&steadySeconds};
 
     asio::io_context io_{1};
@@ -527,9 +531,9 @@ private:
     JobRunner runner_{jobs_, surroundings()};
     Retention retention_{jobs_, outbox_, [this] { return settings_.service(); }, &now};
     PackReception packs_{packStore_, jobs_, receptionSurroundings()};
-    std::shared_ptr<Processor> processor_ =
-        std::make_shared<Processor>(settings_, documents_, tokens_, access_, jobs_, runner_, letterRunner_,
-                                    packs_, outbox_, &now, [this] { return healthOf(healthSources()); });
+    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(
+        settings_, documents_, tokens_, access_, history_, jobs_, runner_, letterRunner_, packs_, outbox_,
+        &now, [this] { return healthOf(healthSources()); });
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};

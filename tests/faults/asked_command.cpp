@@ -167,6 +167,7 @@ std::vector<Question> const& questions() {
         {"documents_list", LIST},
         {"documents_put", PUT, &withNode, LIST},
         {"documents_remove", REMOVE, &withDocument, LIST},
+        {"history", {"history", "--node", "a=nobody"}},
         {"hold", {"hold", "{}"}, &mailed, {"status", "{}"}},
         {"release", {"release", "{}"}, mailedAnd("hold"), {"status", "{}"}},
         {"cancel", {"cancel", "{}"}, &mailed, {"status", "{}"}},
@@ -175,6 +176,12 @@ std::vector<Question> const& questions() {
          [](ServiceAtHand const& service) {
              std::ofstream(service.folder() / "t.json") << R"({"currency":"EUR","letter":85,"sheet":10})";
              return after({"settings", "service", "tariff=t.json"})(service);
+         }},
+        {"settings_impact",
+         {"settings", "impact", "a=acme", "po", "own.json"},
+         [](ServiceAtHand const& service) {
+             std::ofstream(service.folder() / "own.json") << R"({"code":"R-7."})";
+             return std::string();
          }},
         {"settings_ids", {"settings", "ids"}},
         {"settings_remove",

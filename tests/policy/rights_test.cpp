@@ -47,6 +47,9 @@ std::map<std::string, Row> const OF_QUESTIONS{
     {"add_token", {"admin", "node"}},
     {"tokens", {"admin", "any"}},
     {"revoke_token", {"admin", "any"}},
+    {"health", {"admin", "root"}},
+    {"history", {"admin", "any"}},
+    {"settings_impact", {"settings", "node"}},
 };
 
 std::map<int, Row> const OF_COMMANDS{

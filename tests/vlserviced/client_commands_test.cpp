@@ -174,6 +174,34 @@ TEST_F(TokensWithoutAnId, GoOnAsThoseOfAnAdministrator) {
                           "admin  admin  the root  the service's own file\n");
 }
 
+TEST_F(GivenTokens, AreNamedInTheHistory) {
+    EXPECT_THAT(output({"history"}), "nobody has changed anything there\n");
+    add("boss", "admin", "a=acme");
+    as("boss", {"settings", "set", "a=acme", "po", "code=R"});
+    std::string const told = as("boss", {"history"}).out;
+    EXPECT_THAT(told, testing::ContainsRegex("^when +who +node +what +was +is\n"));
+    EXPECT_THAT(told, testing::ContainsRegex("admin +a=acme +token boss +admin\n"));
+    EXPECT_THAT(told, testing::ContainsRegex("boss +a=acme +settings po +\\{\"code\":\"R\"\\}\n"));
+    EXPECT_THAT(output({"history", "--node", "a=other"}), "nobody has changed anything there\n");
+    EXPECT_THAT(output({"history", "--limit", "1", "--json"}),
+                testing::AllOf(HasSubstr("\"who\":\"boss\""), testing::Not(HasSubstr("\"who\":\"admin\""))));
+}
+
+TEST_F(ClientCommands, SettingsImpactTellsWhatAFileWouldChange) {
+    output({"settings", "set", "u=bob/a=acme", "po", "expiry=7"});
+    std::string const file = write("po.json", R"({"code":"R","expiry":5})");
+    EXPECT_EQ(output({"settings", "impact", "a=acme", "po", file}),
+              "node          would have other values of\n"
+              "a=acme        code\n"
+              "a=acme        expiry\n"
+              "u=bob/a=acme  code\n");
+    EXPECT_EQ(output({"settings", "impact", "a=acme", "po", write("none.json", "{}")}),
+              "nothing would have another value\n");
+    EXPECT_EQ(output({"settings", "impact", "a=acme", "po", file, "--json"}),
+              R"({"nodes":[{"id":"a=acme","keys":["code","expiry"]},{"id":"u=bob/a=acme","keys":["code"]}]})"
+              "\n");
+}
+
 TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     std::string const shop = (folder_ / "shop").string();
     std::string const file =

@@ -54,9 +54,11 @@ protected:
     Log::Sink formerSink_;
     std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::SettingsStore store_{*database_};
-    VlServiced::SettingsService settings_{store_};
+    VlServiced::History history_{*database_, [] { return 1000LL; }};
+    VlServiced::SettingsService settings_{store_, &VlServiced::SettingsService::localClock, history_};
     VlServiced::DocumentStore documentStore_{*database_};
-    VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; }};
+    VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; },
+                                           history_};
     VlServiced::JobStore jobs_{*database_};
     VlServiced::LetterStore letters_{*database_, jobs_};
     VlServiced::LetterRunner carriers_{
@@ -69,14 +71,19 @@ protected:
             [this] { return settings_.service(); },
             outbox_,
         }};
-    VlServiced::JobRunner runner_{jobs_, VlServiced::JobSurroundings{
-                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                                             [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                                             [] { return 1000LL; },
-                                             [this] { return settings_.service(); },
-                                             outbox_,
-                                         }};
+    VlServiced::JobSurroundings jobSurroundings() {
+        VlServiced::JobSurroundings all{
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [] { return 1000LL; },
+            [this] { return settings_.service(); },
+            outbox_,
+        };
+        all.recorder = history_;
+        return all;
+    }
+    VlServiced::JobRunner runner_{jobs_, jobSurroundings()};
     VlServiced::PackReception packs_{VlServiced::openSqlitePackStore(folder_ / "packs-of-service.db"), jobs_,
                                      VlServiced::ReceptionSurroundings{
                                          [](VlServiced::JobSurroundings::Work const& work) { work(); },
@@ -86,9 +93,9 @@ protected:
                                          [](std::string const&) { return false; },
                                      }};
     VlServiced::TokenStore tokenStore_{*database_};
-    VlServiced::TokenService tokens_{tokenStore_, std::string(32, 't'), [] { return 1000LL; }};
+    VlServiced::TokenService tokens_{tokenStore_, std::string(32, 't'), [] { return 1000LL; }, history_};
     VlServiced::Access access_{[] { return 1000LL; }};
     std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, tokens_, access_, jobs_, runner_, carriers_, packs_, outbox_,
+        settings_, documents_, tokens_, access_, history_, jobs_, runner_, carriers_, packs_, outbox_,
         [] { return 1000LL; }, [] { return Protocol::HealthAnswer(); });
 };

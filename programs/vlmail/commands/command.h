@@ -23,6 +23,7 @@ void addDocumentsCommand(Base::Command const& app, Task& task);
 void addHelpCommand(Base::Command const& app, Task& task);
 /// hold, release and cancel.
 void addJobChangeCommands(Base::Command const& app, Task& task);
+void addHistoryCommand(Base::Command const& app, Task& task);
 void addLetterCommand(Base::Command const& app, Task& task);
 /// settle and resend.
 void addLetterChangeCommands(Base::Command const& app, Task& task);

@@ -22,6 +22,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addDiscoverCommand(command, task);
     addDoctorCommand(command, task);
     addDocumentsCommand(command, task);
+    addHistoryCommand(command, task);
     addJobChangeCommands(command, task);
     addLetterChangeCommands(command, task);
     addLetterCommand(command, task);

@@ -3,9 +3,11 @@
 
 #include "programs/base/error.h"
 #include "programs/vlmail/commands/service_options.h"
+#include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/ipc/remove_cfg_node.h"
 #include "vlservice/ipc/set_part_tmpl.h"
 #include "vlservice/ipc/update_cfg.h"
+#include "vlservice/json/json_text.h"
 
 #include <memory>
 #include <ostream>
@@ -20,6 +22,7 @@ struct Options {
     std::string part;
     /// For set a file or assignments, for reset keys.
     std::vector<std::string> what;
+    bool json = false;
 };
 
 template<typename Cmd, typename Part>
@@ -128,6 +131,27 @@ int reset(Options const& options, Terminal const& terminal) {
     return FINE;
 }
 
+/// What setting the file would change.
+int impact(Options const& options, Terminal const& terminal) {
+    json::Object const own = readDocument(options.what.front());
+    auto const service = connectToService(options.service, terminal.err);
+    json::Object const answer =
+        ask(*service, Protocol::SettingsImpactQuery(nodeIdIn(options.node), options.part, own));
+    if (options.json) {
+        terminal.out << answer << '\n';
+        return FINE;
+    }
+    TextTable table({{"node"}, {"would have other values of"}});
+    for (Protocol::ImpactedNode const& node : Protocol::SettingsImpactAnswer(answer).nodes)
+        for (std::string const& key : node.keys)
+            table.addRow({nodeInWords(node.id), key});
+    if (table.empty())
+        terminal.out << "nothing would have another value\n";
+    else
+        table.print(terminal.out);
+    return FINE;
+}
+
 int remove(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal.err);
     requireNoError(service->call<Ipc::RemoveCfgNode>(Cfg::Id(nodeIdIn(options.node), false))->resp());
@@ -167,6 +191,14 @@ void addSettingsChangeCommands(Base::Command const& settings, Task& task) {
         settings, task, "reset", "Lets a node inherit again what it has of its own", &reset, options);
     resetting.addOption("PART", options->part, std::string(part) + " [all]");
     resetting.addOption("KEY", options->what, "Settings of the part [all]");
+    Base::Command const asking =
+        addCommand(settings, task, "impact",
+                   "Tells what would count otherwise at which nodes if \"settings set\" took the file",
+                   &impact, options);
+    asking.addOption("PART", options->part, part).required();
+    asking.addOption("FILE", options->what, "A JSON file with all values of the part; - is standard input")
+        .required();
+    asking.addFlag("--json", options->json, "The service's answer as one JSON object");
     addCommand(settings, task, "remove", "Removes a node that has none below it", &remove, options);
 }
 

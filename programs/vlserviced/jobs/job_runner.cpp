@@ -106,6 +106,13 @@ bool record(JobStore& jobs, JobAction action, std::string const& packId, long lo
     return jobs.cancel(packId, now);
 }
 
+std::string nameInHistory(Job const& job) { return "mailing " + job.pack.packId; }
+
+std::string inHistory(Job const& job) {
+    return std::string(stateName(job.state)) + (job.toHold ? ", to be held" : "") +
+           (job.toUpload ? ", to be handed on" : "");
+}
+
 /// Whether a job that is past a change is as the change wants it.
 bool isSoAlready(Job const& job, JobAction action) {
     if (action == JobAction::Upload)
@@ -168,14 +175,14 @@ void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
     if (known)
         return finish([&] { proceed(*known); });
     surroundings_.onReader([this, location, mayBeOf, finish, open = surroundings_.openPack,
-                            onOwnThread = surroundings_.onOwnThread] {
+                            onOwnThread = surroundings_.onOwnThread, who = surroundings_.recorder.who()] {
         auto const summary = std::make_shared<PackSummary>();
         Outcome const read = outcomeOf([&] { *summary = summaryOf(*open(location)); });
-        onOwnThread([this, location, mayBeOf, finish, summary, read] {
+        onOwnThread([this, location, mayBeOf, finish, summary, read, who] {
             finish([&] {
                 if (read.kind != Outcome::Kind::Done)
                     throw Base::Error(read.why);
-                admit(location, *summary, mayBeOf);
+                surroundings_.recorder.as(who, [&] { admit(location, *summary, mayBeOf); });
             });
         });
     });
@@ -194,7 +201,10 @@ void JobRunner::admit(PackLocation const& pack, PackSummary const& summary, Requ
             pack.packId, summary, surroundings_.rules(summary.cfgId), moment,
             [&](std::string const& name) { return surroundings_.presetSource(summary.cfgId, name); });
         job = jobFor(pack, summary, moment);
-        jobs_.accept(*job);
+        jobs_.together([&] {
+            if (jobs_.accept(*job))
+                surroundings_.recorder.note(job->cfgId, nameInHistory(*job), "", inHistory(*job));
+        });
         surroundings_.usedPreset(summary.cfgId, summary.packPreset.name());
     }
     proceed(*job);
@@ -322,13 +332,23 @@ void JobRunner::discard(Job const& job) {
         clearOutbox(job);
 }
 
+bool JobRunner::recordChange(JobAction action, Job const& job) {
+    bool isChanged = false;
+    jobs_.together([&] {
+        isChanged = record(jobs_, action, job.pack.packId, surroundings_.now());
+        surroundings_.recorder.note(job.cfgId, nameInHistory(job), inHistory(job),
+                                    inHistory(jobs_.find(job.pack.packId).value()));
+    });
+    return isChanged;
+}
+
 void JobRunner::change(JobAction action, std::string const& packId) {
     std::optional<Job> const job = jobs_.find(packId);
     if (!job)
         throw Base::Error("there is no mailing " + Base::oneLine(packId));
     if (action == JobAction::Upload)
         requireUploadFolder();
-    if (!record(jobs_, action, packId, surroundings_.now()) && !isSoAlready(*job, action))
+    if (!recordChange(action, *job) && !isSoAlready(*job, action))
         throw Base::Error("it is too late to " + std::string(actionName(action)) + " mailing " + packId +
                           ": " + whoHas(*job));
     Job const changed = jobs_.find(packId).value();
@@ -392,7 +412,10 @@ void JobRunner::requireUploadFolder() const {
 
 void JobRunner::upload(std::string const& folder, std::string const& database, Policy::Grant const& by) {
     requireUploadFolder();
-    wantUpload(folder.empty() ? folder : folderText(folder), database, by);
+    surroundings_.recorder.together([&] {
+        wantUpload(folder.empty() ? folder : folderText(folder), database, by);
+        surroundings_.recorder.note(by.node, "mailings that wait", "", "to be handed on");
+    });
     resume();
 }
 

@@ -8,6 +8,7 @@
 #include "programs/policy/rights.h"
 #include "programs/vlserviced/jobs/admission.h"
 #include "programs/vlserviced/settings/service_settings.h"
+#include "programs/vlserviced/store/history.h"
 #include "programs/vlserviced/store/job_store.h"
 
 #include <filesystem>
@@ -56,6 +57,8 @@ struct JobSurroundings {
     /// Takes the letters of channels that have carriers; null where there are none.
     LetterRunner* letters = nullptr;
     OpenPack openPack = &openPackDatabase;
+    /// Where is noted what people do.
+    Recorder recorder = {};
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -114,6 +117,7 @@ private:
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary, RequireNode const& mayBeOf);
     void wantUpload(std::string const& folder, std::string const& database, Policy::Grant const& by);
+    bool recordChange(Protocol::JobAction action, Job const& job);
     void requireUploadFolder() const;
     void requireNotDisabled(std::string const& packId, std::string const& cfgId) const;
     /// The container that goes to the upload folder.

@@ -360,20 +360,44 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
     bool const isResent = change.action == Protocol::LetterAction::Resend;
     if (isResent && !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
         throw Base::Error("the pages of " + name + " are gone: mail it anew");
-    bool const isDecided =
-        isResent ? letters_.decide(id, {LetterState::Uncertain, LetterState::Failed, LetterState::Returned},
-                                   LetterState::Waiting, "a person has it sent again", surroundings_.now())
-                 : letters_.decide(id, {LetterState::Uncertain},
-                                   change.action == Protocol::LetterAction::SettleDelivered
-                                       ? LetterState::Delivered
-                                       : LetterState::Failed,
-                                   "a person says so", surroundings_.now());
-    if (!isDecided)
+    if (!recordDecision(change, *letter))
         throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) + ": " +
                           (isResent ? "only one that is uncertain, failed or returned is sent again"
                                     : "only one that is uncertain can be settled"));
     unsettled_.insert(id.packId);
     proceed();
+}
+
+bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter) {
+    using Protocol::LetterAction;
+    bool const isResent = change.action == LetterAction::Resend;
+    LetterState const delivered =
+        change.action == LetterAction::SettleDelivered ? LetterState::Delivered : LetterState::Failed;
+    LetterState const to = isResent ? LetterState::Waiting : delivered;
+    bool isDecided = false;
+    surroundings_.recorder.together([&] {
+        isDecided =
+            isResent ? letters_.decide(letter.id,
+                                       {LetterState::Uncertain, LetterState::Failed, LetterState::Returned},
+                                       to, "a person has it sent again", surroundings_.now())
+                     : letters_.decide(letter.id, {LetterState::Uncertain}, to, "a person says so",
+                                       surroundings_.now());
+        std::optional<Job> const job = jobs_.find(letter.id.packId);
+        if (isDecided && job)
+            surroundings_.recorder.note(
+                job->cfgId, "letter " + std::to_string(letter.id.number) + " of mailing " + letter.id.packId,
+                Protocol::letterStateName(letter.state), Protocol::letterStateName(to));
+    });
+    return isDecided;
+}
+
+void LetterRunner::recordCarrier(std::string const& channel, CarrierRecord const& record) {
+    auto const inHistory = [](CarrierRecord const& one) { return one.isPaused ? "paused" : "not paused"; };
+    surroundings_.recorder.together([&] {
+        surroundings_.recorder.note({}, "carrier " + channel, inHistory(letters_.carrier(channel)),
+                                    inHistory(record));
+        letters_.setCarrier(channel, record);
+    });
 }
 
 Protocol::CarriersAnswer LetterRunner::list() const {
@@ -405,7 +429,7 @@ void LetterRunner::pause(std::string const& channel) {
     CarrierRecord record = letters_.carrier(channel);
     if (!std::exchange(record.isPaused, true))
         record.since = surroundings_.now();
-    letters_.setCarrier(channel, record);
+    recordCarrier(channel, record);
 }
 
 void LetterRunner::resume(std::string const& channel) {
@@ -413,7 +437,7 @@ void LetterRunner::resume(std::string const& channel) {
     CarrierRecord record = letters_.carrier(channel);
     if (record.isPaused || isFailing(record))
         record = {false, 0, {}, surroundings_.now(), 0};
-    letters_.setCarrier(channel, record);
+    recordCarrier(channel, record);
     proceed();
 }
 

@@ -6,6 +6,7 @@
 #include "programs/vlserviced/jobs/carrier_pace.h"
 #include "programs/vlserviced/jobs/letter_parcel.h"
 #include "programs/vlserviced/settings/service_settings.h"
+#include "programs/vlserviced/store/history.h"
 
 #include <filesystem>
 #include <functional>
@@ -45,6 +46,8 @@ struct LetterSurroundings {
     /// Runs work on the runner's own thread and returns when it is done, with what it throws; called from the
     /// threads of carriers.
     std::function<void(Work const&)> doneOnOwnThread = [](Work const& work) { work(); };
+    /// Where is noted what people decide.
+    Recorder recorder = {};
 };
 
 /// Used by one thread; the work it hands to carriers touches nothing of it.
@@ -127,6 +130,8 @@ private:
     void settleJobs();
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;
+    bool recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter);
+    void recordCarrier(std::string const& channel, CarrierRecord const& record);
     std::string problemOf(std::string const& packId, LetterCounts const& counts) const;
     std::shared_ptr<LetterSource> sourceOf(std::string const& packId);
     Protocol::CarrierSettings settingsOf(std::string const& channel) const;

@@ -38,11 +38,18 @@ std::string bytesIn(DocumentUpload const& piece) {
                       " any more: it was replaced or removed");
 }
 
+/// Empty where there is none of that name.
+std::string digestOf(std::vector<StoredDocument> const& there, std::string const& name) {
+    auto const found = std::ranges::find(there, name, &StoredDocument::name);
+    return found == there.end() ? std::string() : found->sha256;
+}
+
 } // namespace
 
 DocumentService::DocumentService(DocumentStore& documents, SettingsStore const& nodes,
-                                 SettingsService const& settings, std::function<long long()> now)
-    : documents_(documents), nodes_(nodes), settings_(settings), now_(std::move(now)) {
+                                 SettingsService const& settings, std::function<long long()> now,
+                                 Recorder recorder)
+    : documents_(documents), nodes_(nodes), settings_(settings), now_(std::move(now)), recorder_(recorder) {
     documents_.dropUnfinished();
 }
 
@@ -135,7 +142,11 @@ void DocumentService::finish(long long content, DocumentUpload const& piece) {
     document.node = piece.id;
     document.sha256 = piece.sha256;
     document.putAt = now_();
-    documents_.finish(content, document);
+    recorder_.together([&] {
+        recorder_.note(piece.id, "document " + piece.name, digestOf(documents_.at(piece.id), piece.name),
+                       piece.sha256);
+        documents_.finish(content, document);
+    });
 }
 
 void DocumentService::requirePlace(DocumentUpload const& piece) const {
@@ -172,7 +183,10 @@ StoredDocument DocumentService::remove(Protocol::DocumentRemoval const& removal)
         throw Base::Error(shownNode(removal.id) + " has no document " +
                           Base::inQuotes(Base::plainLine(removal.document)) +
                           " of its own; \"vlmail documents list\" shows which lies where");
-    documents_.remove(removal.id, document->name);
+    recorder_.together([&] {
+        documents_.remove(removal.id, document->name);
+        recorder_.note(removal.id, "document " + document->name, document->sha256, "");
+    });
     return *document;
 }
 

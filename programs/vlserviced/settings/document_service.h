@@ -24,7 +24,7 @@ public:
 
     /// All have to outlive the service. Forgets what an earlier process did not finish.
     DocumentService(DocumentStore& documents, SettingsStore const& nodes, SettingsService const& settings,
-                    std::function<long long()> now);
+                    std::function<long long()> now, Recorder recorder = {});
 
     Protocol::DocumentsAnswer list(Protocol::DocumentsQuery const& query) const;
     Protocol::DocumentPiece piece(Protocol::DocumentPieceQuery const& query) const;
@@ -58,6 +58,7 @@ private:
     SettingsStore const& nodes_;
     SettingsService const& settings_;
     std::function<long long()> now_;
+    Recorder recorder_;
     /// By the number of the content.
     Uploads uploads_;
 };

@@ -11,6 +11,7 @@
 #include "vlservice/cfg/id.h"
 #include "vlservice/presets/presets.h"
 
+#include <algorithm>
 #include <ctime>
 #include <unordered_set>
 #include <utility>
@@ -35,6 +36,12 @@ Protocol::TreeNode branch(SettingsNode const& node, Children const& children,
 
 bool isNodeOf(std::string const& user, std::string const& id) {
     return id.substr(0, id.find(Cfg::Id::CFG_ID_DELIM)) == Cfg::Id::USER_PREFIX + user;
+}
+
+/// Empty where the node has none.
+json::Object ownValues(SettingsStore const& store, std::string const& id, std::string const& part) {
+    json::Value const own = store.parts(id).get(part);
+    return own ? own.toObject() : json::Object();
 }
 
 /// The empty text for no folder.
@@ -71,8 +78,8 @@ std::map<std::string, std::string> carrierFolders(Protocol::Carriers const& carr
 
 } // namespace
 
-SettingsService::SettingsService(SettingsStore& store, Clock clock)
-    : store_(store), clock_(std::move(clock)) {}
+SettingsService::SettingsService(SettingsStore& store, Clock clock, Recorder recorder)
+    : store_(store), clock_(std::move(clock)), recorder_(recorder) {}
 
 Policy::Moment SettingsService::localClock() { return {std::time(nullptr), &Base::localOffset}; }
 
@@ -127,7 +134,18 @@ void SettingsService::setPart(std::string const& id, std::string const& part, js
     if (own && part == Cfg::Presets::PART_NAME)
         requireAllowedPresets(own.toObject(), store_.chain(id), clock_());
     rules_.clear();
-    store_.setPart(id, part, own);
+    recorder_.together([&] {
+        json::Object const was = ownValues(store_, id, part);
+        bool const wasKnown = store_.contains(id);
+        store_.setPart(id, part, own);
+        noteNode(id, wasKnown);
+        recorder_.note(id, "settings " + part, was, own ? own.toObject() : json::Object());
+    });
+}
+
+void SettingsService::noteNode(std::string const& id, bool wasKnown) const {
+    if (!wasKnown)
+        recorder_.note(id, "node", "", "added");
 }
 
 void SettingsService::update(std::string const& id, bool reset) {
@@ -137,10 +155,15 @@ void SettingsService::update(std::string const& id, bool reset) {
     if (reset && id.empty())
         throw Base::Error("the root cannot be reset as a whole: set its parts to nothing one by one");
     rules_.clear();
-    if (reset)
-        store_.clear(id);
-    else
-        store_.add(id);
+    recorder_.together([&] {
+        bool const wasKnown = store_.contains(id);
+        json::Object const was = store_.parts(id);
+        reset ? store_.clear(id) : store_.add(id);
+        noteNode(id, wasKnown);
+        for (auto const& [part, values] : was)
+            if (reset)
+                recorder_.note(id, "settings " + std::string(part), values.toObject(), json::Object());
+    });
     resolve(store_.chain(id), partNames());
 }
 
@@ -148,7 +171,95 @@ void SettingsService::remove(std::string const& id) {
     requireChangeable();
     checkNodeId(id);
     rules_.clear();
-    store_.remove(id);
+    recorder_.together([&] {
+        json::Object const was = store_.parts(id);
+        store_.remove(id);
+        for (auto const& [part, values] : was)
+            recorder_.note(id, "settings " + std::string(part), values.toObject(), json::Object());
+        recorder_.note(id, "node", "there", "");
+    });
+}
+
+namespace {
+
+/// Of the keys of a part those whose values differ.
+std::vector<std::string> differingKeys(std::vector<SettingsLevel> const& was,
+                                       std::vector<SettingsLevel> const& is, std::string const& part) {
+    auto const valuesOf = [&](std::vector<SettingsLevel> const& chain) {
+        return Protocol::PartSettings(resolve(chain, {part}).get(part).toObject()).values;
+    };
+    json::Object const before = valuesOf(was);
+    json::Object const after = valuesOf(is);
+    std::vector<std::string> keys;
+    for (auto const& [key, value] : after)
+        if (!(before.get(key) == value))
+            keys.emplace_back(key);
+    return keys;
+}
+
+/// Asks what would change below a node. Nodes without values of their own have what those above them have.
+class Impact {
+public:
+    Impact(SettingsStore const& store, std::string const& part, json::Value own, std::string const& id)
+        : store_(store), part_(part), own_(std::move(own)), id_(id) {}
+
+    std::vector<std::string> const& at(std::string const& node, bool hasOwn) {
+        auto const known = byNode_.find(node);
+        if (known != byNode_.end())
+            return known->second;
+        bool const isLikeItsParent = node != id_ && !hasOwn;
+        return byNode_.emplace(node, isLikeItsParent ? at(parentNodeId(node)) : found(node)).first->second;
+    }
+
+private:
+    std::vector<std::string> at(std::string const& node) {
+        return at(node, static_cast<bool>(store_.parts(node).get(part_)));
+    }
+
+    std::vector<std::string> found(std::string const& node) const {
+        std::vector<SettingsLevel> const was = store_.chain(node);
+        std::vector<SettingsLevel> is = was;
+        for (SettingsLevel& level : is)
+            if (level.id == id_) {
+                json::Object parts;
+                for (auto const& [name, values] : level.parts)
+                    if (name != part_)
+                        parts.set(name, values);
+                if (own_)
+                    parts.set(part_, own_);
+                level.parts = parts;
+            }
+        return differingKeys(was, is, part_);
+    }
+
+    SettingsStore const& store_;
+    std::string part_;
+    json::Value own_;
+    std::string id_;
+    std::map<std::string, std::vector<std::string>> byNode_;
+};
+
+} // namespace
+
+Protocol::SettingsImpactAnswer SettingsService::impact(Protocol::SettingsImpactQuery const& query) const {
+    checkNodeId(query.id);
+    json::Value const own = ownForm(query.part, query.own);
+    if (own && query.part == Cfg::Presets::PART_NAME)
+        requireAllowedPresets(own.toObject(), store_.chain(query.id), clock_());
+    Impact impact(store_, query.part, own, query.id);
+    Policy::Grant const reached{{}, {}, query.id};
+    std::vector<SettingsNode> nodes = store_.nodes();
+    if (!store_.contains(query.id))
+        nodes.push_back({query.id, {}, {}});
+    Protocol::SettingsImpactAnswer answer;
+    for (SettingsNode const& node : nodes) {
+        if (!reached.covers(node.id))
+            continue;
+        bool const hasOwn = std::find(node.parts.begin(), node.parts.end(), query.part) != node.parts.end();
+        if (std::vector<std::string> const& keys = impact.at(node.id, hasOwn); !keys.empty())
+            answer.nodes.emplace_back(node.id, keys);
+    }
+    return answer;
 }
 
 Policy::Rules SettingsService::rules(std::string const& id) const {
@@ -194,7 +305,14 @@ void SettingsService::changeService(json::Object const& changes) {
         changed = changed.withFolderIdentity(identityOf(changed.uploadFolder()));
     if (changes.get(Protocol::ServiceSettings::CARRIERS))
         changed = changed.withCarrierFolders(carrierFolders(changed.carriers(), service().carriers()));
-    store_.setServiceSettings(changed.stored());
+    changeStored("service settings", changed);
+}
+
+void SettingsService::changeStored(char const* what, ServiceSettings const& changed) {
+    recorder_.together([&] {
+        recorder_.note({}, what, service().told(), changed.told());
+        store_.setServiceSettings(changed.stored());
+    });
 }
 
 void SettingsService::recogniseUploadFolder() {
@@ -211,7 +329,7 @@ void SettingsService::recogniseCarrierFolders() {
         store_.setServiceSettings(known.stored());
 }
 
-void SettingsService::suspend(int bits) { store_.setServiceSettings(service().withSuspended(bits).stored()); }
+void SettingsService::suspend(int bits) { changeStored("what is held back", service().withSuspended(bits)); }
 
 bool SettingsService::holdsChangesBack() const { return service().isSuspended(Suspended::SettingsChanges); }
 

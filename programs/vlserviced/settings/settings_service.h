@@ -4,6 +4,7 @@
 #include "programs/policy/limits.h"
 #include "programs/protocol/settings.h"
 #include "programs/vlserviced/settings/service_settings.h"
+#include "programs/vlserviced/store/history.h"
 #include "programs/vlserviced/store/settings_store.h"
 
 #include <functional>
@@ -20,7 +21,7 @@ public:
     using Clock = std::function<Policy::Moment()>;
 
     /// The store has to outlive the service.
-    explicit SettingsService(SettingsStore& store, Clock clock = &localClock);
+    explicit SettingsService(SettingsStore& store, Clock clock = &localClock, Recorder recorder = {});
 
     /// The root, with all below it.
     Protocol::TreeNode tree() const;
@@ -48,6 +49,8 @@ public:
     /// leaves the node without own values. Of the part "presets" those are refused that a node above has
     /// locked, and delays that never end.
     void setPart(std::string const& id, std::string const& part, json::Value const& sent);
+    /// What would count otherwise if a part's own values were replaced so, at the node and all below it.
+    Protocol::SettingsImpactAnswer impact(Protocol::SettingsImpactQuery const& query) const;
     /// Adds the node, when it is new, and tests that all its settings can be read. With `reset`, its own
     /// values are erased first; those of the root cannot be.
     void update(std::string const& id, bool reset);
@@ -74,12 +77,16 @@ public:
     /// Works while changes are held back: it is what lifts that.
     void suspend(int bits);
 
-private:
     static Policy::Moment localClock();
+
+private:
+    void noteNode(std::string const& id, bool wasKnown) const;
+    void changeStored(char const* what, ServiceSettings const& changed);
     bool holdsChangesBack() const;
 
     SettingsStore& store_;
     Clock clock_;
+    Recorder recorder_;
     mutable std::map<std::string, Policy::Rules> rules_;
 };
 

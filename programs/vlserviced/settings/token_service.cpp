@@ -13,6 +13,7 @@ namespace {
 
 using Policy::Grant;
 using Protocol::Role;
+using Protocol::roleName;
 using Protocol::TokenReport;
 
 constexpr std::size_t MAX_NAME_BYTES = 64;
@@ -41,9 +42,10 @@ TokenReport reportOf(StoredToken const& token) {
 
 } // namespace
 
-TokenService::TokenService(TokenStore& tokens, std::string ownToken, std::function<long long()> now)
+TokenService::TokenService(TokenStore& tokens, std::string ownToken, std::function<long long()> now,
+                           Recorder recorder)
     : tokens_(tokens), ownToken_(std::move(ownToken)), ownId_(Channel::tokenIdOf(ownToken_)),
-      now_(std::move(now)) {}
+      now_(std::move(now)), recorder_(recorder) {}
 
 void TokenService::enrol() {
     if (!ownId_.empty())
@@ -75,10 +77,14 @@ Protocol::TokenAdditionAnswer TokenService::add(Protocol::TokenAddition const& a
     Protocol::TokenAdditionAnswer answer;
     answer.token = Channel::makeNamedToken();
     Grant const grant{addition.name, addition.role, addition.id};
-    if (!tokens_.add(
-            {Channel::tokenIdOf(answer.token), grant, Channel::keysOf(answer.token), now_(), holder.name, 0}))
-        throw Base::Error("there is a token " + addition.name +
-                          " already: choose another name, or revoke that one first");
+    StoredToken const token{
+        Channel::tokenIdOf(answer.token), grant, Channel::keysOf(answer.token), now_(), holder.name, 0};
+    recorder_.together([&] {
+        if (!tokens_.add(token))
+            throw Base::Error("there is a token " + addition.name +
+                              " already: choose another name, or revoke that one first");
+        recorder_.note(addition.id, "token " + addition.name, "", roleName(addition.role));
+    });
     return answer;
 }
 
@@ -104,7 +110,10 @@ TokenReport TokenService::revoke(Protocol::TokenRevocation const& revocation, Gr
         throw Base::Error("there is no token " + Base::oneLine(revocation.name) +
                           ": \"vlmail token list\" shows those that there are");
     requireAnotherAdmin(*token);
-    tokens_.revoke(revocation.name, now_());
+    recorder_.together([&] {
+        tokens_.revoke(revocation.name, now_());
+        recorder_.note(token->grant.node, "token " + revocation.name, roleName(token->grant.role), "");
+    });
     return reportOf(*token);
 }
 

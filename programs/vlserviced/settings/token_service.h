@@ -3,6 +3,7 @@
 
 #include "programs/channel/greeting.h"
 #include "programs/protocol/token.h"
+#include "programs/vlserviced/store/history.h"
 #include "programs/vlserviced/store/token_store.h"
 
 #include <functional>
@@ -18,7 +19,8 @@ public:
     static constexpr char const* ADMIN = "admin";
 
     /// All have to outlive the service. `ownToken` is that of the file.
-    TokenService(TokenStore& tokens, std::string ownToken, std::function<long long()> now);
+    TokenService(TokenStore& tokens, std::string ownToken, std::function<long long()> now,
+                 Recorder recorder = {});
 
     /// Puts the token of the file among those that were given out, as the first start does.
     void enrol();
@@ -45,6 +47,7 @@ private:
     std::string ownToken_;
     std::string ownId_;
     std::function<long long()> now_;
+    Recorder recorder_;
 };
 
 } // namespace VlServiced

@@ -291,10 +291,27 @@ void JobStore::forget(std::string const& packId) {
 
 void JobStore::emptyLog() { database_.emptyLog(); }
 
-bool JobStore::told(std::string const& packId, long long changedRows) const {
-    if (changedRows > 0 && tell_)
+bool JobStore::told(std::string const& packId, long long changedRows) {
+    if (changedRows > 0 && untold_)
+        untold_->push_back(packId);
+    else if (changedRows > 0 && tell_)
         tell_(packId);
     return changedRows > 0;
+}
+
+void JobStore::together(std::function<void()> const& steps) {
+    untold_.emplace();
+    try {
+        Database::Transaction transaction(database_);
+        steps();
+        transaction.commit();
+    } catch (...) {
+        untold_.reset();
+        throw;
+    }
+    std::vector<std::string> const changed = *std::exchange(untold_, std::nullopt);
+    for (std::string const& packId : changed)
+        told(packId, 1);
 }
 
 std::vector<std::pair<JobState, long long>> JobStore::counts() const {

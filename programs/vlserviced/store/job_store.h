@@ -91,6 +91,8 @@ public:
     /// Writes what the log holds into the database, and empties it: nothing of what was removed stays in it.
     void emptyLog();
 
+    /// Carries steps out as a whole or not at all; of the changes in them is told when they are on record.
+    void together(std::function<void()> const& steps);
     /// Has a function called after each change of a job's state or problem, with the pack id.
     void onChange(std::function<void(std::string const&)> tell) { tell_ = std::move(tell); }
 
@@ -98,10 +100,12 @@ private:
     /// Of those of that pack id in a state from which one may go back.
     bool changeAtRest(std::string const& assignments, std::string const& packId, long long now);
     /// Tells of the job when a row has changed, and says whether one has.
-    bool told(std::string const& packId, long long changedRows) const;
+    bool told(std::string const& packId, long long changedRows);
 
     Database::Connection& database_;
     std::function<void(std::string const&)> tell_;
+    /// While steps are carried out together: of what is to be told behind them.
+    std::optional<std::vector<std::string>> untold_;
 };
 
 } // namespace VlServiced

@@ -173,13 +173,33 @@ CREATE TABLE tokens (
 CREATE UNIQUE INDEX tokens_by_name ON tokens (name) WHERE revoked_at = 0;
 )sql";
 
+/// What people have changed, in the order in which they did.
+constexpr char const* SCHEMA_8 = R"sql(
+CREATE TABLE history (
+    number INTEGER NOT NULL PRIMARY KEY,
+    at     INTEGER NOT NULL,
+    who    TEXT NOT NULL,
+    node   TEXT NOT NULL,
+    what   TEXT NOT NULL,
+    was    TEXT NOT NULL,
+    is_now TEXT NOT NULL
+);
+CREATE INDEX history_by_time ON history (at);
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
-    static Database::DatabaseKind const kind{
-        "service database",
-        APPLICATION_ID,
-        {SCHEMA_1, SCHEMA_2, SCHEMA_3, SCHEMA_4, {SCHEMA_5, SQLITE_5, POSTGRES_5}, SCHEMA_6, SCHEMA_7}};
+    static Database::DatabaseKind const kind{"service database",
+                                             APPLICATION_ID,
+                                             {SCHEMA_1,
+                                              SCHEMA_2,
+                                              SCHEMA_3,
+                                              SCHEMA_4,
+                                              {SCHEMA_5, SQLITE_5, POSTGRES_5},
+                                              SCHEMA_6,
+                                              SCHEMA_7,
+                                              SCHEMA_8}};
     return kind;
 }
 
