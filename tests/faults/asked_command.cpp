@@ -67,12 +67,17 @@ std::string inAFile(ServiceAtHand const& service) {
     return made.stem().string();
 }
 
-/// The service has it and does not hand it on yet.
-std::string waiting(ServiceAtHand const& service) {
-    service.vlmail({"settings", "suspend", "nothing"});
+std::string withUploadFolder(ServiceAtHand const& service) {
     fs::path const upload = service.packDatabase().parent_path() / "upload";
     fs::create_directory(upload);
     service.vlmail({"settings", "service", "upload_folder=" + upload.string()});
+    return "";
+}
+
+/// The service has it and does not hand it on yet.
+std::string waiting(ServiceAtHand const& service) {
+    service.vlmail({"settings", "suspend", "nothing"});
+    withUploadFolder(service);
     std::string const id = stranded(service);
     service.vlmail({"resume", id, "--node", "a=acme"});
     service.vlmail({"settings", "suspend", "jobs"});
@@ -163,6 +168,7 @@ std::vector<Question> const& questions() {
         {"carriers_resume", {"carriers", "resume", "postal"}, &withPausedCarrier, CARRIERS},
         {"carriers_test", {"carriers", "test", "postal"}, &withCarrier},
         {"discover", {"discover"}},
+        {"doctor", {"doctor"}, &withUploadFolder},
         {"documents_get", {"documents", "get", "head", "head.txt", "--node", "a=acme"}, &withDocument, LIST},
         {"documents_list", LIST},
         {"documents_put", PUT, &withNode, LIST},
