@@ -17,8 +17,9 @@ using Arguments = std::vector<std::string>;
 
 /// Ids, times and room differ from run to run, and with them the widths of columns.
 std::string lasting(std::string const& text) {
-    static std::regex const time("[0-9]{4}/[0-9]{2}/[0-9]{2} [0-9:]{8}|stored[0-9]+|room for "
-                                 "[^\n]*|[0-9a-f]{16}\\.[0-9a-f]{64}|\"(accepted|changed)\":[0-9]+");
+    static std::regex const time(
+        "[0-9]{4}/[0-9]{2}/[0-9]{2} [0-9:]{8}|stored[0-9]+|room for "
+        "[^\n]*|[0-9]+ MiB left|[0-9a-f]{16}\\.[0-9a-f]{64}|\"(accepted|changed)\":[0-9]+");
     static std::regex const blanks(" +");
     return std::regex_replace(std::regex_replace(withoutIds(text), time, "TIME"), blanks, " ");
 }
