@@ -10,7 +10,6 @@
 #include <map>
 
 using namespace testing;
-using Policy::Grant;
 using Policy::Role;
 
 namespace {

@@ -87,6 +87,34 @@ TEST_F(HistoryTest, TellsOfMailingsAndOfNothingInThem) {
                          "bob u=bob/a=acme mailing p1: queued -> cancelled\n");
 }
 
+TEST_F(HistoryTest, TellsOfMailingsThatAreHandedOnTogether) {
+    settings_.changeService(parse(R"({"upload_folder":")" + upload_.string() + "\"}"));
+    EXPECT_EQ(send(20, R"({"db_host":"","db_name":""})"), "{}");
+    EXPECT_EQ(entries(), "ada  mailings that wait:  -> to be handed on\n");
+}
+
+TEST_F(HistoryTest, TellsOfLettersThatAreSettled) {
+    VlServiced::Job job;
+    job.pack = {folder_.path().string(), "packs.db", "p1"};
+    job.cfgId = "a=acme";
+    jobs_.accept(job);
+    jobs_.advance("p1", VlServiced::JobState::Accepted, VlServiced::JobState::Queued, 1000);
+    ASSERT_TRUE(letters_.divide("p1", {{1, "postal", true}}, 1000));
+    letters_.finish({{"p1", 1}}, VlServiced::LetterState::Uncertain, "lost", 1000);
+    ask(R"({"query":"change_letter","id":"p1","letter":1,"action":"delivered"})");
+    ask(R"({"query":"change_letter","id":"p1","letter":1,"action":"failed"})");
+    EXPECT_EQ(entries(), "ada a=acme letter 1 of mailing p1: uncertain -> delivered\n");
+}
+
+TEST_F(HistoryTest, TellsOfCarriersThatArePaused) {
+    send(27, R"({"carriers":{"postal":{"type":"folder","folder":")" + upload_.string() + "\"}}}");
+    by_.name = "bob";
+    for (char const* const action : {"pause", "pause", "resume"})
+        ask(std::string(R"({"query":"change_carrier","action":")") + action + R"(","channel":"postal"})");
+    EXPECT_THAT(entries(), EndsWith("bob  carrier postal: not paused -> paused\n"
+                                    "bob  carrier postal: paused -> not paused\n"));
+}
+
 TEST_F(HistoryTest, IsToldToAdministratorsOfTheNodeAlone) {
     send(15, R"({"cfg_id":"u=bob/a=acme","part":{"code":"R"}})");
     send(15, R"({"cfg_id":"a=other","part":{"code":"R"}})");

@@ -61,16 +61,19 @@ protected:
                                            history_};
     VlServiced::JobStore jobs_{*database_};
     VlServiced::LetterStore letters_{*database_, jobs_};
-    VlServiced::LetterRunner carriers_{
-        letters_, jobs_,
-        VlServiced::LetterSurroundings{
+    VlServiced::LetterSurroundings letterSurroundings() {
+        VlServiced::LetterSurroundings all{
             [](std::string const&, std::size_t, VlServiced::LetterSurroundings::Work const& work) { work(); },
             [](VlServiced::LetterSurroundings::Work const& work) { work(); },
             [](VlServiced::LetterSurroundings::Work const& work) { work(); },
             [] { return 1000LL; },
             [this] { return settings_.service(); },
             outbox_,
-        }};
+        };
+        all.recorder = history_;
+        return all;
+    }
+    VlServiced::LetterRunner carriers_{letters_, jobs_, letterSurroundings()};
     VlServiced::JobSurroundings jobSurroundings() {
         VlServiced::JobSurroundings all{
             [](VlServiced::JobSurroundings::Work const& work) { work(); },
