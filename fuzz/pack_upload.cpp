@@ -3,6 +3,7 @@
 // and what is complete is what was said of it.
 
 #include "programs/base/error.h"
+#include "programs/database/sqlite_connection.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
 #include "programs/vlserviced/store/schema.h"
 #include "vlservice/platform/log.h"
@@ -22,7 +23,7 @@ struct Client : Ipc::CmdProcessorI {
 
 /// A reception in memory.
 struct MemoryReception {
-    SQLite::Database database{
+    Database::SqliteConnection database{
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::JobStore jobs{database};
     std::shared_ptr<VlServiced::PackStore> store = VlServiced::openSqlitePackStore(":memory:");
