@@ -4,7 +4,9 @@
 #include "programs/protocol/carrier.h"
 
 #include <functional>
+#include <map>
 #include <memory>
+#include <set>
 #include <string>
 #include <utility>
 #include <vector>
@@ -28,6 +30,17 @@ struct OutgoingLetter {
     long long colouredPages = 0;
 };
 
+/// How letters are to be printed.
+struct Printing {
+    enum class Colour { AsItIs, Grey, Coloured };
+
+    Colour colour = Colour::AsItIs;
+    /// Of a sheet, in 1/100 mm; 0 where nothing is said.
+    int width = 0;
+    int height = 0;
+    int copies = 1;
+};
+
 /// What is handed over at once: a letter, or those of a mailing that go by the channel.
 struct Parcel {
     /// The same at every attempt; a safe file name.
@@ -35,6 +48,7 @@ struct Parcel {
     /// The mailing's id.
     std::string mailing;
     bool isDuplex = false;
+    Printing printing;
     /// At least one, in their order.
     std::vector<OutgoingLetter> letters;
     /// Of all letters; a PDF.
@@ -64,6 +78,21 @@ struct Outcome {
     std::string says;
 };
 
+/// What the other side says, when it is asked, of what it was given.
+struct Progress {
+    enum class Kind {
+        UnderWay,
+        Delivered,
+        Failed,
+        /// It came to nothing before anything was done with it: nobody has it.
+        Lost,
+    };
+
+    Kind kind = Kind::UnderWay;
+    /// One line.
+    std::string says;
+};
+
 /// Puts on record, until the disk has it, that the other side may have a parcel from here on. Throws
 /// std::exception when that cannot be done: the parcel stays here then.
 using PutOnRecord = std::function<void()>;
@@ -77,6 +106,8 @@ public:
     /// before the step from which on the other side may act; not by a carrier under whose keys anything can
     /// be handed over again, where it replaces what is there.
     virtual Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) = 0;
+    /// Of those keys that the other side can tell something of. Throws std::exception with one line.
+    virtual std::map<std::string, Progress> ask(std::set<std::string> const& /*keys*/) { return {}; }
     /// Tries the other side without sending anything, and says in one line what it offers. Throws
     /// std::exception with one line.
     virtual std::string test() = 0;

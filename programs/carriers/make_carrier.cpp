@@ -2,6 +2,7 @@
 #include "programs/carriers/carrier.h"
 #include "programs/carriers/command_carrier.h"
 #include "programs/carriers/folder_carrier.h"
+#include "programs/carriers/printer_carrier.h"
 #include "programs/carriers/sftp_carrier.h"
 #include "programs/carriers/smtp_carrier.h"
 
@@ -13,6 +14,8 @@ std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) 
         return std::make_unique<FolderCarrier>(settings.folder, settings.folderIdentity);
     case Protocol::CarrierType::Sftp:
         return std::make_unique<SftpCarrier>(settings);
+    case Protocol::CarrierType::Printer:
+        return std::make_unique<PrinterCarrier>(settings.uri);
     case Protocol::CarrierType::Command:
         return std::make_unique<CommandCarrier>(settings);
     case Protocol::CarrierType::Smtp:

@@ -2,6 +2,7 @@
 
 #include "programs/base/millimetres.h"
 #include "programs/base/quoting.h"
+#include "programs/mailing/print_wishes.h"
 #include "programs/patterns/pattern.h"
 
 #include <algorithm>
@@ -16,17 +17,20 @@ using Base::inQuotes;
 using Faults = std::vector<Reader::RulesFault>;
 using Path = std::vector<std::string>;
 
-constexpr char const* SHEET = "sheet";
+using Mailing::PrintWishes;
+
+constexpr char const* SHEET = PrintWishes::SHEET;
 constexpr char const* WINDOW = "window";
 constexpr char const* CLEAR_ZONES = "clear_zones";
 constexpr char const* TOLERANCE = "tolerance";
 constexpr char const* ADDRESS_LINES = "address_lines";
 constexpr char const* POSTCODE = "postcode";
 constexpr char const* REPAIR = "repair";
-constexpr std::array KEYS{SHEET, WINDOW, CLEAR_ZONES, TOLERANCE, ADDRESS_LINES, POSTCODE, REPAIR};
+constexpr char const* COPIES = PrintWishes::COPIES;
+constexpr std::array KEYS{SHEET, WINDOW, CLEAR_ZONES, TOLERANCE, ADDRESS_LINES, POSTCODE, REPAIR, COPIES};
 
-constexpr char const* WIDTH = "width";
-constexpr char const* HEIGHT = "height";
+constexpr char const* WIDTH = PrintWishes::WIDTH;
+constexpr char const* HEIGHT = PrintWishes::HEIGHT;
 constexpr std::array SHEET_KEYS{WIDTH, HEIGHT};
 
 constexpr char const* PAGES = "pages";
@@ -69,6 +73,9 @@ public:
         readLines(rules, object.get(ADDRESS_LINES));
         readPostcode(rules, object.get(POSTCODE));
         readRepair(rules, object.get(REPAIR));
+        // A printer is told; here nothing depends on it.
+        if (json::Value const copies = object.get(COPIES))
+            number(copies, {COPIES}, 1, PrintWishes::MAX_COPIES);
         return rules;
     }
 

@@ -1,6 +1,7 @@
 #pragma once
 // What a carrier wants of letters: the object "production" of a pack preset. docs/check.md has its keys.
 
+#include "programs/mailing/print_wishes.h"
 #include "programs/production/letter_parts.h"
 #include "programs/reader/geometry.h"
 #include "programs/reader/reading_rules.h"
@@ -25,7 +26,7 @@ struct ClearZone {
 };
 
 struct ProductionRules {
-    static constexpr char const* KEY = "production";
+    static constexpr char const* KEY = Mailing::PrintWishes::PRODUCTION;
     /// No sheet is longer, and no length on one.
     static constexpr int MAX_LENGTH = 200000;
     static constexpr int MAX_TOLERANCE = 2000;

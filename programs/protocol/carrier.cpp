@@ -70,6 +70,24 @@ struct SftpUrlForm {
     }
 };
 
+/// A printer, or a queue of a print server.
+struct PrinterUriForm {
+    static constexpr std::string_view SCHEME = "ipp://";
+
+    static bool fits(json::Value const& node) {
+        std::string const text = node.textOrEmpty();
+        if (!text.starts_with(SCHEME) || text.size() > CarrierSettings::MAX_PATH_BYTES)
+            return false;
+        std::string_view const rest = std::string_view(text).substr(SCHEME.size());
+        std::size_t const slash = rest.find('/');
+        return slash != std::string_view::npos && isHostWithPort(rest.substr(0, slash)) &&
+               isMadeOf(rest.substr(slash), "/._-");
+    }
+    static std::string wanted() {
+        return "ipp://HOST:PORT/PATH, with letters, digits and \"._-/\" in the path";
+    }
+};
+
 /// Of 32 bytes in base64.
 struct HostKeyForm {
     static constexpr std::string_view BEGIN = "SHA256:";
@@ -173,6 +191,10 @@ struct CarrierSettings::Keys {
         Asked{"identity_file", &CarrierSettings::identityFile, SecretForm{}},
         Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
     };
+    static constexpr std::tuple PRINTER{
+        Asked{"uri", &CarrierSettings::uri, PrinterUriForm{}},
+        Asked{"unit", &CarrierSettings::unit, UnitForm{}, "letter"},
+    };
     static constexpr std::tuple COMMAND{
         Asked{"program", &CarrierSettings::program, PathForm{}},
         Asked{"arguments", &CarrierSettings::arguments, TextsForm{100}},
@@ -226,6 +248,7 @@ constexpr TypeRow typeRow(CarrierType type, char const* name, char const* requir
 constexpr TypeRow TYPES[] = {
     typeRow<CarrierSettings::Keys::FOLDER>(CarrierType::Folder, "folder", "folder"),
     typeRow<CarrierSettings::Keys::SFTP>(CarrierType::Sftp, "sftp", "url host_key identity_file"),
+    typeRow<CarrierSettings::Keys::PRINTER>(CarrierType::Printer, "printer", "uri"),
     typeRow<CarrierSettings::Keys::COMMAND>(CarrierType::Command, "command", "program"),
     typeRow<CarrierSettings::Keys::SMTP>(CarrierType::Smtp, "smtp", "url from subject"),
 };
@@ -320,6 +343,9 @@ CarrierSettings::CarrierSettings(json::Object const& object) {
     requireKeys(object, row);
     type = row.type;
     row.read(object, *this);
+    if (keepsOrder() && atOnce > 1)
+        throw Base::Error("a carrier of the type " + std::string(row.name) +
+                          " has letters one after another, and so no \"at_once\" above 1");
 }
 
 std::optional<DayWindow> CarrierSettings::window() const { return windowIn(hours); }

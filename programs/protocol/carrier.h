@@ -16,6 +16,8 @@ enum class CarrierType {
     Folder,
     /// The same in a folder of another machine.
     Sftp,
+    /// Jobs of a printer.
+    Printer,
     /// A program that is run for each letter.
     Command,
     /// E-mails, given to a server.
@@ -57,6 +59,8 @@ struct CarrierSettings {
     std::string folderIdentity;
     /// Where the other side is.
     std::string url;
+    /// Of a printer.
+    std::string uri;
     /// "SHA256:...": the only one that the other side may have.
     std::string hostKey;
     /// An absolute path, or the name of a credential.
@@ -98,6 +102,10 @@ struct CarrierSettings {
     CarrierUnit unitOfFiles() const { return unit == "mailing" ? CarrierUnit::Mailing : CarrierUnit::Letter; }
     /// Whether recipients get files rather than paper.
     bool sendsFiles() const { return type == CarrierType::Smtp; }
+    /// Whether the other side can be asked what became of letters.
+    bool canBeAsked() const { return type == CarrierType::Printer; }
+    /// Whether a letter waits for those before it in its mailing.
+    bool keepsOrder() const { return type == CarrierType::Printer; }
     /// When letters may be handed over; nothing when that is all day.
     std::optional<DayWindow> window() const;
 

@@ -26,7 +26,6 @@ using testing::AnyOf;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::MatchesRegex;
 using testing::StartsWith;
 
 class SftpCarrierTest : public testing::Test {

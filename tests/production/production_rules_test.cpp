@@ -72,7 +72,7 @@ TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
         {json::Value("a"), R"("production" is no object; write an object such as {"window": {...}})"},
         {R"({"windows": 1})"_json,
          R"("production/windows" "windows" is no key here; write one of "sheet", "window", "clear_zones", )"
-         R"("tolerance", "address_lines", "postcode", "repair")"},
+         R"("tolerance", "address_lines", "postcode", "repair", "copies")"},
         {R"({"sheet": {"width": 21000}})"_json, "\"production/sheet/height\" is missing; " + integer},
         {R"({"sheet": {"width": 0, "height": 99999999999}})"_json,
          "\"production/sheet/width\" is no integer from 1 to 200000; " + integer +
@@ -107,6 +107,7 @@ TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
          "\"max\""},
         {R"({"postcode": ""})"_json,
          R"("production/postcode" is no pattern; write a pattern such as "\\b\\d{5}\\b")"},
+        {R"({"copies": 100})"_json, "\"production/copies\" is no integer from 1 to 99; " + integer},
         {R"({"repair": "cover-page"})"_json, R"("production/repair" is no list; write ["cover-page"])"},
         {R"({"repair": ["paint"]})"_json,
          R"("production/repair/0" is no repair that is known; write "cover-page")"},

@@ -66,9 +66,9 @@ TEST(CarrierSettings, RefuseWhatTheyDoNotKnow) {
          R"("carriers" has "a/b", which is no name of an address such as postal, email, fax or sms)"},
         {R"({"postal": 7})", "the carrier of postal has to be an object"},
         {R"({"postal": {}})",
-         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command, smtp)"},
+         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, printer, command, smtp)"},
         {R"({"postal": {"type": "pigeon"}})",
-         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command, smtp)"},
+         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, printer, command, smtp)"},
         {R"({"postal": {"type": "folder"}})",
          R"(the carrier of postal: a carrier of the type folder needs the key "folder")"},
         {R"({"postal": {"type": "folder", "folder": "shop"}})",
@@ -130,6 +130,25 @@ TEST(CarrierSettings, TakeAFolderOfAUserOnAnotherMachine) {
                   "the carrier of postal: \"url\" of a carrier has to be sftp://USER@HOST:PORT/FOLDER/, with "
                   "letters, digits and \"._-~/\" in the folder")
             << url;
+}
+
+TEST(CarrierSettings, TakeAPrinterWithoutEncryption) {
+    auto const printer = [](std::string const& uri, std::string const& more = "") {
+        return refusal(R"({"postal": {"type": "printer", "uri": ")" + uri + '"' + more + "}}");
+    };
+    for (char const* const uri : {"ipp://printer.example/ipp/print", "ipp://192.0.2.1:8631/printers/a-b_c.d",
+                                  "ipp://[2001:db8::1]:631/"})
+        EXPECT_EQ(printer(uri), "nothing was thrown") << uri;
+    for (char const* const uri :
+         {"", "ipps://printer/ipp/print", "http://printer/", "ipp://printer", "ipp://user@printer/",
+          "ipp://printer:0/", "ipp://printer/a b", "ipp:///ipp"})
+        EXPECT_EQ(printer(uri),
+                  "the carrier of postal: \"uri\" of a carrier has to be ipp://HOST:PORT/PATH, with "
+                  "letters, digits and \"._-/\" in the path")
+            << uri;
+    EXPECT_EQ(printer("ipp://printer/", R"(, "at_once": 2)"),
+              "the carrier of postal: a carrier of the type printer has letters one after another, and so no "
+              "\"at_once\" above 1");
 }
 
 TEST(CarrierSettings, PinTheKeyOfAnotherMachine) {

@@ -1,5 +1,6 @@
 // A service that hands letters over to carriers, ended at any of the calls that make something durable or
 // visible: what the other side has of them is counted.
+#include "tests/carriers/ipp_printer.h"
 #include "tests/carriers/smtp_server.h"
 #include "tests/carriers/ssh_server.h"
 #include "tests/faults/fault.h"
@@ -378,6 +379,62 @@ private:
     VLServiceTest::SmtpServer server_;
 };
 
+/// By a printer.
+class PrintedLetters : public CountedLetters {
+public:
+    PrintedLetters() : CountedLetters("postal") {}
+
+    /// False when the service got to the end alive.
+    bool killedAtPiece(int piece) {
+        std::string const when = "killed at piece " + std::to_string(piece);
+        bool survived = false;
+        {
+            ServiceProcess service(arguments());
+            printer_.relay().onPiece([&](int number) {
+                if (number == piece)
+                    service.signal(SIGKILL);
+                return true;
+            });
+            survived = send(service);
+            printer_.relay().onPiece({});
+            service.signal(SIGKILL);
+            service.wait();
+        }
+        ServiceProcess const service(arguments());
+        EXPECT_TRUE(send(service)) << when;
+        std::string const states = told(*clientOf(service, data_));
+        awaitPrints(states);
+        requireOnce(states, when);
+        return !survived;
+    }
+
+private:
+    json::Object carrier() const override {
+        return {{"type", "printer"}, {"uri", printer_.uri()}, {"retry_seconds", 1}};
+    }
+    std::map<std::string, int> times() const override {
+        std::map<std::string, int> times;
+        std::istringstream had(printer_.had());
+        for (std::string word; had >> word;)
+            ++times[word];
+        return times;
+    }
+
+    /// What the printer has taken it prints soon.
+    void awaitPrints(std::string const& states) const {
+        std::istringstream words(states);
+        std::string state;
+        words >> state >> state;
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+        for (int letter = 1; words >> state; ++letter)
+            while (state == "accepted" && !times().contains("s1-" + std::to_string(letter)) &&
+                   std::chrono::steady_clock::now() < end) {
+            }
+    }
+
+    IppPrinter printer_{folder_ / "printer", ""};
+};
+
 TEST(ServiceThatIsEndedAmongLetters, FinishesThoseThatAreOnTheirWayAndPutsThemOnRecord) {
     CommandedLetters letters;
     letters.endWithALetterOnItsWay();
@@ -429,6 +486,15 @@ TEST_P(ServiceThatIsKilledAtEachCall, MailsNoneTwiceAndTellsOfOneAsUncertainAtMo
         isKilled = letters.killedAt(call);
     }
     EXPECT_GT(call, 40);
+}
+
+TEST_P(ServiceThatIsKilledAtEachCall, PrintsNoneTwiceAndTellsOfOneAsUncertainAtMost) {
+    if (!IppPrinter::whyNot().empty())
+        GTEST_SKIP() << IppPrinter::whyNot();
+    int piece = GetParam();
+    while (PrintedLetters().killedAtPiece(piece) && !HasFailure())
+        piece += 4;
+    EXPECT_GT(piece, 40);
 }
 
 INSTANTIATE_TEST_SUITE_P(AmongLetters, ServiceThatIsKilledAtEachCall, testing::Range(1, 5));

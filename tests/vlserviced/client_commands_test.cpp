@@ -230,7 +230,7 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     EXPECT_THAT(
         complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
         HasSubstr(
-            "the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, command, smtp"));
+            "the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, printer, command, smtp"));
 }
 
 TEST_F(ClientCommands, TheDoctorFindsAllWell) {

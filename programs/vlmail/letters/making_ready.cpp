@@ -5,6 +5,7 @@
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
 #include "programs/mailing/page_blob.h"
+#include "programs/mailing/print_wishes.h"
 #include "programs/vlmail/letters/batch.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/letters/preset_index.h"
@@ -24,9 +25,6 @@ namespace fs = std::filesystem;
 using Production::Part;
 using Production::PreparedDocument;
 using Production::PreparedPage;
-
-/// As pack presets say it.
-constexpr PackColorModel GREY{1};
 
 std::string pack(PreparedDocument const& document) {
     WorkerMessage message;
@@ -275,7 +273,7 @@ Production::Maker& MakingReady::makerFor(Cfg::PackPreset const& preset) {
 }
 
 bool MakingReady::countsColours(Cfg::PackPreset const& preset) const {
-    return colours_ == Colours::Counted && preset.colorModel() != GREY;
+    return colours_ == Colours::Counted && preset.colorModel() != Mailing::GREY;
 }
 
 std::vector<MadeAttachment> const& MakingReady::attachmentsOf(std::string const& packPreset) const {

@@ -1,5 +1,6 @@
 #include "programs/vlmail/mailings/price.h"
 
+#include "programs/mailing/print_wishes.h"
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/ipc/price_est.h"
 
@@ -9,9 +10,6 @@
 
 namespace VlMail {
 namespace {
-
-/// As pack presets say it. Where pages were not counted, all of them are in colour then.
-constexpr PackColorModel COLOUR{2};
 
 /// Printed pages, sheets and coloured pages of a letter.
 using Counts = std::tuple<long long, long long, long long>;
@@ -27,7 +25,7 @@ long long printedPages(Mailing::MailedLetter const& letter) {
 /// An older service knows letters in colour throughout and no others.
 void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::Metadata const& mailing) {
     batch.colour =
-        mailing.madeReady ? colouredPages == batch.pages : mailing.packPreset.colorModel() == COLOUR;
+        mailing.madeReady ? colouredPages == batch.pages : mailing.packPreset.colorModel() == Mailing::COLOURED;
     if (!batch.colour)
         batch.colouredPages = colouredPages;
 }

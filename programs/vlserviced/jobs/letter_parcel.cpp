@@ -3,6 +3,7 @@
 #include "programs/base/error.h"
 #include "programs/base/safe_name.h"
 #include "programs/mailing/page_blob.h"
+#include "programs/mailing/print_wishes.h"
 #include "programs/production/joined_pages.h"
 #include "programs/vlserviced/jobs/outbox_mailing.h"
 
@@ -49,6 +50,19 @@ Carriers::OutgoingLetter described(StoredLetter const& stored, Mailing::MailedLe
     return outgoing;
 }
 
+Carriers::Printing printingOf(Cfg::PackPreset const& preset) {
+    Mailing::PrintWishes const wishes = Mailing::PrintWishes::of(preset);
+    Carriers::Printing printing;
+    printing.width = wishes.width;
+    printing.height = wishes.height;
+    printing.copies = wishes.copies;
+    if (preset.colorModel() == Mailing::GREY)
+        printing.colour = Carriers::Printing::Colour::Grey;
+    else if (preset.colorModel() == Mailing::COLOURED)
+        printing.colour = Carriers::Printing::Colour::Coloured;
+    return printing;
+}
+
 /// Builds a parcel letter by letter.
 class ParcelMaker {
 public:
@@ -58,6 +72,7 @@ public:
         parcel_.mailing = mailing.id();
         parcel_.isDuplex = mailing.letters().mailing().packPreset.duplex();
         parcel_.replyTo = mailing.letters().mailing().packPreset.userEmailOverride();
+        parcel_.printing = printingOf(mailing.letters().mailing().packPreset);
     }
 
     /// Throws Error when the letter cannot go out; the others are as they were then.

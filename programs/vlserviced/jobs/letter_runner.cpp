@@ -18,6 +18,7 @@ using Protocol::JobState;
 /// So many failures in a row, and a carrier is tried now and then alone.
 constexpr long long MANY_FAILURES = 10;
 constexpr long long SECONDS_BETWEEN_TRIES = 15 * 60;
+constexpr long long SECONDS_BETWEEN_QUESTIONS = 15;
 /// Containers that are kept open.
 constexpr std::size_t MAX_SOURCES = 4;
 
@@ -39,6 +40,14 @@ LetterState stateBehind(Outcome::Kind kind) {
         break;
     }
     return LetterState::Uncertain;
+}
+
+/// Of a letter that the other side has accepted.
+LetterState stateBehind(Carriers::Progress::Kind kind) {
+    using Kind = Carriers::Progress::Kind;
+    if (kind == Kind::UnderWay)
+        return LetterState::Accepted;
+    return kind == Kind::Delivered ? LetterState::Delivered : LetterState::Failed;
 }
 
 /// "working", "paused", "failing".
@@ -79,6 +88,7 @@ void LetterRunner::resume() {
     letters_.doubt("the service was ended while it was handed over", surroundings_.now());
     for (std::string const& packId : jobs_.delivering())
         unsettled_.insert(packId);
+    recallAskable();
     proceed();
 }
 
@@ -94,8 +104,10 @@ void LetterRunner::proceedAll() {
     ServiceSettings const settings = surroundings_.settings();
     if (settings.isSuspended(Suspended::Jobs))
         return;
-    for (auto const& [name, carrier] : settings.carriers())
+    for (auto const& [name, carrier] : settings.carriers()) {
+        ask(name, channelOf(name, carrier));
         proceed(name, channelOf(name, carrier));
+    }
 }
 
 void LetterRunner::proceed(std::string const& name, Channel& channel) {
@@ -124,6 +136,8 @@ std::optional<long long> LetterRunner::nextTime() {
         return next;
     for (auto const& [name, settings] : service.carriers()) {
         Channel& channel = channelOf(name, settings);
+        if (!channel.askable.empty() && !channel.isAsked)
+            next = std::min(next.value_or(EVER), channel.askAt);
         // Whoever comes back from its work goes on with the next.
         if (letters_.carrier(name).isPaused || channel.busy >= static_cast<std::size_t>(settings.atOnce))
             continue;
@@ -165,10 +179,9 @@ LetterRunner::CarrierPtr LetterRunner::idleOrNew(Channel& channel) const {
 
 void LetterRunner::start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters) {
     auto const handOver = std::make_shared<HandOver>();
-    bool const isOne = channel.settings.unitOfFiles() == CarrierUnit::Letter;
     handOver->channel = name;
     handOver->settings = channel.settings;
-    handOver->key = isOne ? letters.front().id.key() : letters.front().id.packId + '-' + name;
+    handOver->key = keyOf(letters.front(), name, channel.settings);
     handOver->source = sourceOf(letters.front().id.packId);
     handOver->letters = std::move(letters);
     handOver->carrier = idleOrNew(channel);
@@ -246,6 +259,12 @@ void LetterRunner::recordOutcome(HandOver const& handOver) {
     if (outcome.kind == Outcome::Kind::Failed)
         return postpone(handOver);
     letters_.finish(handOver.ids(), stateBehind(outcome.kind), outcome.says, surroundings_.now());
+    if (!handOver.settings.canBeAsked() || outcome.kind == Outcome::Kind::Refused)
+        return;
+    Channel& channel = channels_.at(handOver.channel);
+    if (channel.askable.empty())
+        channel.askAt = surroundings_.now();
+    channel.askable[handOver.key] = handOver.ids();
 }
 
 void LetterRunner::postpone(HandOver const& handOver) {
@@ -261,6 +280,86 @@ void LetterRunner::postpone(HandOver const& handOver) {
             letters_.postpone({letter.id}, says, now + pauseBehind(letter.attempts + 1, handOver.settings),
                               now);
     }
+    StoredLetter const& first = handOver.letters.front();
+    if (handOver.settings.keepsOrder())
+        letters_.holdBack(first.id.packId, handOver.channel,
+                          now + pauseBehind(first.attempts + 1, handOver.settings));
+}
+
+std::string LetterRunner::keyOf(StoredLetter const& letter, std::string const& channel,
+                                Protocol::CarrierSettings const& settings) {
+    return settings.unitOfFiles() == CarrierUnit::Letter ? letter.id.key() : letter.id.packId + '-' + channel;
+}
+
+/// What is on record of an earlier process; a printer forgets jobs sooner than that.
+void LetterRunner::recallAskable() {
+    for (auto const& [name, settings] : surroundings_.settings().carriers()) {
+        if (!settings.canBeAsked())
+            continue;
+        long long const since = surroundings_.now() - settings.giveUpHours * 3600;
+        for (StoredLetter const& letter : letters_.withOtherSide(name, since))
+            channelOf(name, settings).askable[keyOf(letter, name, settings)].push_back(letter.id);
+    }
+}
+
+void LetterRunner::ask(std::string const& name, Channel& channel) {
+    if (channel.askable.empty() || channel.isAsked || channel.askAt > surroundings_.now())
+        return;
+    channel.isAsked = true;
+    std::set<std::string> keys;
+    for (auto const& [key, letters] : channel.askable)
+        keys.insert(key);
+    CarrierPtr const carrier = surroundings_.makeCarrier(channel.settings);
+    surroundings_.onCarrier(name, static_cast<std::size_t>(channel.settings.atOnce),
+                            [this, name, keys, carrier, onOwnThread = surroundings_.onOwnThread] {
+                                std::map<std::string, Carriers::Progress> progress;
+                                try {
+                                    progress = carrier->ask(keys);
+                                } catch (Base::Error const&) {
+                                    // It is asked again; what hands letters over says what fails.
+                                    progress.clear();
+                                }
+                                onOwnThread([this, name, progress] { onAsked(name, progress); });
+                            });
+}
+
+void LetterRunner::onAsked(std::string const& name,
+                           std::map<std::string, Carriers::Progress> const& progress) {
+    Channel& channel = channels_.at(name);
+    channel.isAsked = false;
+    channel.askAt = surroundings_.now() + SECONDS_BETWEEN_QUESTIONS;
+    for (auto const& [key, told] : progress)
+        if (auto const found = channel.askable.find(key); found != channel.askable.end()) {
+            std::erase_if(found->second, [&](LetterId const& id) { return !note(channel, id, told); });
+            if (found->second.empty())
+                channel.askable.erase(found);
+        }
+    proceed();
+}
+
+bool LetterRunner::note(Channel const& channel, LetterId const& id, Carriers::Progress const& progress) {
+    std::optional<StoredLetter> const letter = letters_.find(id);
+    bool const isUncertain = letter && letter->state == LetterState::Uncertain;
+    if (!isUncertain && (!letter || letter->state != LetterState::Accepted))
+        return false;
+    std::string const says = Base::oneLine(progress.says);
+    bool const isLost = progress.kind == Carriers::Progress::Kind::Lost;
+    if (isUncertain && isLost)
+        letters_.postpone({id}, says,
+                          surroundings_.now() + pauseBehind(letter->attempts + 1, channel.settings),
+                          surroundings_.now());
+    else if (isUncertain)
+        // Of what may not have arrived whole, only a person knows what was printed.
+        noteState(*letter, LetterState::Uncertain, Base::oneLine("it may not have arrived whole: " + says));
+    else
+        noteState(*letter, stateBehind(progress.kind), says);
+    unsettled_.insert(id.packId);
+    return progress.kind == Carriers::Progress::Kind::UnderWay;
+}
+
+void LetterRunner::noteState(StoredLetter const& letter, LetterState state, std::string const& says) {
+    if (state != letter.state || says != letter.says)
+        letters_.finish({letter.id}, state, says, surroundings_.now());
 }
 
 void LetterRunner::noteCarrier(HandOver const& handOver) {

@@ -89,6 +89,10 @@ private:
         std::size_t busy = 0;
         std::set<LetterId> inHand;
         MinuteRate rate;
+        /// What the other side has, or may have, by the keys that it went under, and can be asked about.
+        std::map<std::string, std::vector<LetterId>> askable;
+        long long askAt = 0;
+        bool isAsked = false;
     };
 
     /// Letters that are handed over together, and what became of them.
@@ -127,6 +131,14 @@ private:
     void recordOutcome(HandOver const& handOver);
     void postpone(HandOver const& handOver);
     void noteCarrier(HandOver const& handOver);
+    static std::string keyOf(StoredLetter const& letter, std::string const& channel,
+                             Protocol::CarrierSettings const& settings);
+    void recallAskable();
+    void ask(std::string const& name, Channel& channel);
+    void onAsked(std::string const& name, std::map<std::string, Carriers::Progress> const& progress);
+    /// False when no more is to be asked of the letter.
+    bool note(Channel const& channel, LetterId const& id, Carriers::Progress const& progress);
+    void noteState(StoredLetter const& letter, LetterState state, std::string const& says);
     void settleJobs();
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;

@@ -160,6 +160,20 @@ void LetterStore::postpone(std::vector<LetterId> const& letters, std::string con
     transaction.commit();
 }
 
+void LetterStore::holdBack(std::string const& packId, std::string const& channel, long long due) {
+    database_.change("UPDATE letters SET due = $1 WHERE pack = $2 AND channel = $3 AND due < $1 AND " +
+                         std::string(TO_GO),
+                     due, packId, channel);
+}
+
+std::vector<StoredLetter> LetterStore::withOtherSide(std::string const& channel, long long since) const {
+    return lettersIn(database_.query(
+        std::string(SELECT_LETTERS) +
+            "WHERE channel = $1 AND by_carrier = 1 AND state IN ('accepted', 'uncertain') AND "
+            "changed_at >= $2 ORDER BY id",
+        channel, since));
+}
+
 bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
                          std::string const& says, long long now) {
     std::string states;

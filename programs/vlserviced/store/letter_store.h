@@ -87,6 +87,9 @@ public:
     std::vector<std::string> channelsToGo() const;
     long long waiting(std::string const& channel) const;
     long long uncertain(std::string const& channel) const;
+    /// Those that the other side of a channel has, or may have, and that changed since. Costs what all
+    /// letters cost: for the start.
+    std::vector<StoredLetter> withOtherSide(std::string const& channel, long long since) const;
     LetterCounts counts(std::string const& packId) const;
     /// Whether any letter of a job waits, or is being handed over.
     bool isUnderWay(std::string const& packId) const;
@@ -101,6 +104,8 @@ public:
     /// Notes an attempt that failed, and when the next one is due.
     void postpone(std::vector<LetterId> const& letters, std::string const& says, long long due,
                   long long now);
+    /// Lets none of a job that waits for a channel go before that time.
+    void holdBack(std::string const& packId, std::string const& channel, long long due);
     /// Moves a letter that goes by a carrier to another state; false, and no change, unless it is in one of
     /// `from`. One that waits again is due at once and its attempts count anew.
     bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,

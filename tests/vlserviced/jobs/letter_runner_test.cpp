@@ -35,6 +35,7 @@ struct OtherSide {
     /// The key under which something is on its way when the process ends.
     std::string last;
     std::map<std::string, Outcome> answers;
+    std::map<std::string, Carriers::Progress> progress;
     /// What all are told that have no answer of their own.
     std::optional<Outcome> answer;
 };
@@ -54,6 +55,13 @@ public:
         if (auto const own = other_.answers.find(parcel.key); own != other_.answers.end())
             return own->second;
         return other_.answer.value_or(Outcome{Outcome::Kind::Accepted, "thanks"});
+    }
+    std::map<std::string, Carriers::Progress> ask(std::set<std::string> const& keys) override {
+        std::map<std::string, Carriers::Progress> told;
+        for (auto const& [key, progress] : other_.progress)
+            if (keys.contains(key))
+                told[key] = progress;
+        return told;
     }
     std::string test() override { return "a fake"; }
 
@@ -502,6 +510,77 @@ TEST_F(LetterRunnerTest, TriesALetterAgainThatNobodyHasAlthoughItWasOnRecordAsHa
     EXPECT_EQ(state("p1", 1), "waiting: no connection");
     restart();
     EXPECT_EQ(state("p1", 1), "waiting: no connection");
+}
+
+constexpr char const* PRINTER = R"("postal": {"type": "printer", "uri": "ipp://printer:631/ipp/print"})";
+
+TEST_F(LetterRunnerTest, KeepsTheOrderOfAMailingForPrinters) {
+    setCarriers(PRINTER);
+    other_.answers["p1-2"] = {Outcome::Kind::Failed, "busy"};
+    send("p1", {"postal", "postal", "postal"});
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+    EXPECT_EQ(state("p1", 3), "waiting");
+    now_ += 29;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+    other_.answers.clear();
+    now_ += 1;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2", "p1-2", "p1-3"));
+}
+
+TEST_F(LetterRunnerTest, AsksPrintersWhatBecameOfLetters) {
+    using Kind = Carriers::Progress::Kind;
+    setCarriers(PRINTER);
+    other_.progress["p1-1"] = {Kind::Delivered, "printed"};
+    other_.progress["p1-2"] = {Kind::UnderWay, "out of paper"};
+    send("p1", {"postal", "postal", "postal"});
+    doWork();
+    now_ += 15;
+    EXPECT_EQ(letterRunner_->nextTime(), now_);
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 1), "delivered: printed");
+    EXPECT_EQ(state("p1", 2), "accepted: out of paper");
+    EXPECT_EQ(state("p1", 3), "accepted: thanks") << "nothing is known of it";
+    EXPECT_EQ(job("p1"), "lodged");
+    restart();
+    other_.progress["p1-2"] = {Kind::Delivered, "printed"};
+    other_.progress["p1-3"] = {Kind::Failed, "aborted"};
+    now_ += 15;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 2), "delivered: printed");
+    EXPECT_EQ(state("p1", 3), "failed: aborted");
+    EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 3: aborted");
+    EXPECT_EQ(letterRunner_->nextTime(), std::nullopt);
+}
+
+TEST_F(LetterRunnerTest, LeavesALetterUncertainThatAPrinterHasBegunAndSendsOneAgainThatItHasNot) {
+    using Kind = Carriers::Progress::Kind;
+    setCarriers(PRINTER);
+    other_.answer = Outcome{Outcome::Kind::Uncertain, "cut"};
+    other_.progress["p1-1"] = {Kind::Delivered, "job 1 is printed"};
+    other_.progress["p1-2"] = {Kind::Lost, "job 2 was aborted"};
+    send("p1", {"postal", "postal"});
+    doWork();
+    now_ += 15;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 1), "uncertain: it may not have arrived whole: job 1 is printed");
+    EXPECT_EQ(state("p1", 2), "waiting: job 2 was aborted") << "nobody has it";
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+    other_.answer.reset();
+    other_.progress.clear();
+    now_ += 30;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2", "p1-2"));
+    EXPECT_EQ(state("p1", 2), "accepted: thanks");
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleDelivered, "p1", 1), "nothing was thrown");
 }
 
 TEST_F(LetterRunnerTest, LetsAPersonSettleALetterThatIsUncertain) {

@@ -55,7 +55,7 @@ TEST(ServiceSettings, RefuseChangesThatMeanNothing) {
         {R"({"tariff":{}})", R"("currency" of the tariff has to be three capital letters)"},
         {R"({"carriers":[]})", R"("carriers" has to be an object with the names of channels)"},
         {R"({"carriers":{"postal":{}}})",
-         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, command, smtp)"},
+         R"(the carrier of postal: "type" of a carrier has to be one of folder, sftp, printer, command, smtp)"},
         {R"({"disabled":"a=acme"})", R"("disabled" has to be an array of node ids)"},
         {R"({"disabled":[7]})",
          R"("disabled" has to be an array of node ids, and the root cannot be disabled)"},
