@@ -1,11 +1,13 @@
 #include "programs/carriers/mime_message.h"
 
+#include "programs/base/base64.h"
 #include "programs/base/error.h"
 
 #include <gmime/gmime.h>
 
 #include <algorithm>
 #include <array>
+#include <cstring>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -32,7 +34,7 @@ void beginOnce() {
 }
 
 Held<GMimeStream> streamOf(std::string_view bytes) {
-    return held(g_mime_stream_mem_new_with_buffer(bytes.data(), bytes.size()));
+    return held(g_mime_stream_mem_new_with_buffer(bytes.empty() ? "" : bytes.data(), bytes.size()));
 }
 
 std::string bytesOf(GMimeStream* stream) {
@@ -57,18 +59,78 @@ Held<GMimePart> textPart(std::string const& text) {
     return part;
 }
 
+/// Without its content, which is large: withContents() puts it in.
 Held<GMimePart> filePart(MailAttachment const& attachment) {
-    auto part = partOf("application", "pdf", attachment.bytes, GMIME_CONTENT_ENCODING_BASE64);
+    auto part = partOf("application", "pdf", {}, GMIME_CONTENT_ENCODING_BASE64);
     g_mime_object_set_disposition(GMIME_OBJECT(part.get()), GMIME_DISPOSITION_ATTACHMENT);
     g_mime_part_set_filename(part.get(), attachment.name.c_str());
     return part;
 }
 
+/// No line of the parts begins so: base64 has "=" at the end alone, and quoted-printable none that "_" stands
+/// behind.
+constexpr char const* BOUNDARY = "=_part";
+constexpr std::string_view END_OF_PART = "\r\n--=_part";
+
+/// Of twelve bits.
+using Pair = std::array<char, 2>;
+constexpr std::array<Pair, 4096> PAIRS = [] {
+    constexpr std::string_view DIGITS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::array<Pair, 4096> pairs{};
+    for (std::size_t i = 0; i < pairs.size(); ++i)
+        pairs[i] = {DIGITS[i / 64], DIGITS[i % 64]};
+    return pairs;
+}();
+
+/// Of all three bytes.
+char* writeGroup(char* into, unsigned char const* bytes) {
+    unsigned const bits = bytes[0] << 16U | bytes[1] << 8U | bytes[2];
+    std::memcpy(into, PAIRS[bits >> 12U].data(), 2);
+    std::memcpy(into + 2, PAIRS[bits & 0xFFFU].data(), 2);
+    return into + 4;
+}
+
+/// Base64 in lines of 76 characters, each with its end.
+void appendLines(std::string& text, std::string_view bytes) {
+    constexpr std::size_t IN_A_LINE = 57;
+    std::size_t const whole = bytes.size() / IN_A_LINE;
+    std::size_t const begin = text.size();
+    text.resize(begin + whole * 78);
+    char* into = text.data() + begin;
+    auto const* from = reinterpret_cast<unsigned char const*>(bytes.data());
+    for (std::size_t line = 0; line < whole; ++line) {
+        for (std::size_t at = 0; at < IN_A_LINE; at += 3, from += 3)
+            into = writeGroup(into, from);
+        into = std::copy_n("\r\n", 2, into);
+    }
+    if (std::string_view const rest = bytes.substr(whole * IN_A_LINE); !rest.empty())
+        text += Base::toBase64(rest) + "\r\n";
+}
+
+/// The message with the files' contents in their places, in front of the ends of the last parts.
+std::string withContents(std::string const& frame, std::vector<MailAttachment> const& files) {
+    std::vector<std::size_t> ends(files.size(), frame.size());
+    std::size_t before = frame.rfind(END_OF_PART);
+    std::size_t size = frame.size();
+    for (std::size_t i = files.size(); i-- > 0; before = frame.rfind(END_OF_PART, before - 1)) {
+        ends[i] = before;
+        size += files[i].bytes.size() / 57 * 78 + 80;
+    }
+    std::string text;
+    text.reserve(size);
+    std::size_t at = 0;
+    for (std::size_t i = 0; i < files.size(); ++i) {
+        text.append(frame, at, ends[i] - at);
+        appendLines(text, files[i].bytes);
+        at = ends[i];
+    }
+    return text.append(frame, at);
+}
+
 /// The text in front and the files behind it.
 Held<GMimeMultipart> bodyOf(MailMessage const& message) {
     auto body = held(g_mime_multipart_new_with_subtype("mixed"));
-    // No line of the parts begins so: base64 has no "=", and quoted-printable none that "_" stands behind.
-    g_mime_multipart_set_boundary(body.get(), "=_part");
+    g_mime_multipart_set_boundary(body.get(), BOUNDARY);
     if (!message.text.empty())
         g_mime_multipart_add(body.get(), GMIME_OBJECT(textPart(message.text).get()));
     for (MailAttachment const& attachment : message.attachments)
@@ -210,7 +272,7 @@ std::string inMime(MailMessage const& message) {
     auto const out = held(g_mime_stream_mem_new());
     g_mime_object_write_to_stream(GMIME_OBJECT(mime.get()), options, out.get());
     g_mime_format_options_free(options);
-    return bytesOf(out.get());
+    return withContents(bytesOf(out.get()), message.attachments);
 }
 
 MailReport mailReportIn(std::string_view message) {

@@ -234,10 +234,10 @@ private:
         std::string const& message = mail_->message;
         if (at_ == 0 && (isTooLarge_ = message.size() > sizeLimitIn(extensions_).value_or(message.size())))
             return CURL_READFUNC_ABORT;
-        std::size_t const heldBack = message.size() - std::min<std::size_t>(message.size(), 2);
-        if (at_ >= heldBack && !mayHave_ && !putOnRecord())
+        std::size_t const size = std::min(room, message.size() - at_);
+        // With the last of it.
+        if (at_ + size == message.size() && !mayHave_ && !putOnRecord())
             return CURL_READFUNC_ABORT;
-        std::size_t const size = std::min(room, (mayHave_ ? message.size() : heldBack) - at_);
         message.copy(into, size, at_);
         at_ += size;
         return size;

@@ -2,6 +2,7 @@
 
 #include "programs/base/plain_text.h"
 #include "programs/protocol/carrier.h"
+#include "programs/protocol/delivery_report.h"
 #include "programs/protocol/documents.h"
 #include "programs/protocol/health.h"
 #include "programs/protocol/history.h"
@@ -72,6 +73,7 @@ constexpr QuestionRight OF_QUESTIONS[] = {
     {Protocol::JobsQuery::KIND, {Role::Read, Place::Anywhere}},
     {Protocol::JobsChange::KIND, {Role::Send, Place::Anywhere}},
     {Protocol::LetterChange::KIND, {Role::Send, Place::Anywhere}},
+    {Protocol::DeliveryReport::KIND, {Role::Send, Place::Anywhere}},
     {Protocol::BeginPack::KIND, {Role::Send, Place::Node}},
     {Protocol::CarriersQuery::KIND, {Role::Admin, Place::Root}},
     {Protocol::CarrierChange::KIND, {Role::Admin, Place::Root}},

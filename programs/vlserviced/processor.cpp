@@ -2,6 +2,8 @@
 
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
+#include "programs/carriers/mime_message.h"
+#include "programs/carriers/smtp_carrier.h"
 #include "programs/protocol/failure.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/jobs/job_list.h"
@@ -170,6 +172,10 @@ std::vector<Processor::Question> const& Processor::answerers() {
          [](Processor& self, json::Object const& question) {
              return self.changeLetter(LetterChange(question));
          }},
+        {DeliveryReport::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.noteReport(DeliveryReport(question)).serialize();
+         }},
         {CarriersQuery::KIND,
          [](Processor& self, json::Object const&) { return self.letters_.list().serialize(); }},
         {CarrierChange::KIND,
@@ -261,6 +267,24 @@ json::Object Processor::changeLetter(Protocol::LetterChange const& change) {
     changed.ids = {change.id};
     changed.letters = true;
     return listed(changed).serialize();
+}
+
+Protocol::DeliveryReportAnswer Processor::noteReport(Protocol::DeliveryReport const& report) {
+    Carriers::MailReport const mail = Carriers::mailReportIn(report.message);
+    auto const id = LetterId::ofKey(Carriers::keyOfMessageId(mail.messageId));
+    if (!id)
+        throw Base::Error("the report is about a message that is no letter of this service");
+    requireJob(id->packId);
+    StoredLetter const letter = letters_.note(*id, mail.kind, mail.says);
+    Protocol::DeliveryReportAnswer answer;
+    answer.id = letter.id.packId;
+    answer.letter.number = letter.id.number;
+    answer.letter.key = letter.id.key();
+    answer.letter.channel = letter.channel;
+    answer.letter.state = letter.state;
+    answer.letter.says = letter.says;
+    answer.letter.changed = letter.changedAt;
+    return answer;
 }
 
 json::Object Processor::changeCarrier(Protocol::CarrierChange const& change) {

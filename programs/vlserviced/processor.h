@@ -1,6 +1,7 @@
 #pragma once
 // Carries out the commands that clients send.
 
+#include "programs/protocol/delivery_report.h"
 #include "programs/protocol/health.h"
 #include "programs/vlserviced/access.h"
 #include "programs/vlserviced/jobs/job_runner.h"
@@ -68,6 +69,7 @@ private:
     void beginPack(Ipc::CSConfigIdsList& cmd);
     json::Object changeJobs(Protocol::JobsChange const& change);
     json::Object changeLetter(Protocol::LetterChange const& change);
+    Protocol::DeliveryReportAnswer noteReport(Protocol::DeliveryReport const& report);
     json::Object changeCarrier(Protocol::CarrierChange const& change);
     Protocol::JobsAnswer listed(Protocol::JobsQuery const& query) const;
     Protocol::HistoryAnswer historyOf(Protocol::HistoryQuery const& query);

@@ -150,6 +150,8 @@ TEST(MailReports, AreNotReadIntoOtherMessages) {
          {std::string(), std::string("Subject: hi\r\n\r\nhello"), std::string("\0\xFF\n:", 4)})
         EXPECT_EQ(failureOf([&] { Carriers::mailReportIn(other); }),
                   "the message is no report of a server of e-mail (multipart/report)");
+    EXPECT_EQ(failureOf([] { Carriers::mailReportIn({}); }),
+              "the message is no report of a server of e-mail (multipart/report)");
     std::string text = report("Action: failed\r\n", "\r\nno original");
     EXPECT_EQ(failureOf([&] { Carriers::mailReportIn(text); }),
               "the report does not tell which message it is about (Message-ID)");

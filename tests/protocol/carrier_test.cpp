@@ -1,4 +1,6 @@
 #include "programs/protocol/carrier.h"
+
+#include "programs/protocol/delivery_report.h"
 #include "programs/protocol/letter.h"
 
 #include "tests/support/failure_of.h"
@@ -210,6 +212,19 @@ TEST(LetterChangeReading, RefusesWhatNamesNoLetter) {
               "a change of a letter needs the \"id\" of its mailing and its number, \"letter\"");
     EXPECT_EQ(refused(R"({"action": "resend", "id": "p1", "letter": 0})"),
               "\"letter\" of a change of a letter has to be an integer above 0");
+}
+
+TEST(DeliveryReports, TravelAsTextsThatJsonCanHold) {
+    Protocol::DeliveryReport const report(std::string_view("a\0b\xFF", 4));
+    EXPECT_EQ(report.message, "a b\xEF\xBF\xBD");
+    EXPECT_EQ(Protocol::DeliveryReport(report.serialize()).message, report.message);
+    std::string const many(Protocol::DeliveryReport::MAX_BYTES + 9, '\xFF');
+    EXPECT_LE(Protocol::DeliveryReport(std::string_view(many)).message.size(),
+              Protocol::DeliveryReport::MAX_BYTES);
+    EXPECT_EQ(failureOf([&] {
+                  Protocol::DeliveryReport(json::Object{{"message", std::string(many.size(), 'a')}});
+              }),
+              "\"message\" of a delivery report has to be a text of at most 1048576 bytes");
 }
 
 } // namespace

@@ -6,6 +6,7 @@
 #include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/multicast_probe.h"
 #include "programs/vlmail/service/service_client.h"
+#include "tests/carriers/smtp_server.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlserviced/json_help.h"
@@ -311,6 +312,42 @@ TEST_F(ClientCommands, LettersAreShownWhereTheyAre) {
     EXPECT_EQ(complaint({"resend", "p1", "one"}),
               "vlmail: \"one\" is no number of a letter: vlmail status MAILING shows them\n");
     EXPECT_EQ(complaint({"resend", "p1", "3"}), "vlmail: there is no letter 3 of mailing p1\n");
+}
+
+TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {
+    VLServiceTest::SmtpServer const server(folder_ / "mails", {});
+    if (!server.missing().empty())
+        GTEST_SKIP() << server.missing();
+    output({"settings", "service",
+            R"(carriers={"email":{"type":"smtp","starttls":false,"url":")" + server.url() +
+                R"(","from":"bills@acme.example","to":"{key}@example.com","subject":"Letter"}})"});
+    EXPECT_EQ(output({"carriers", "test", "email"}),
+              server.url() + " offers SIZE 1073741824, 8BITMIME, HELP\n");
+    storeLetters(folder_ / "packs.db", "p1", {"email"});
+    output({"resume", "p1", "--database", (folder_ / "packs.db").string(), "--upload"});
+    server.awaitMessage();
+    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+    while (output({"status", "p1"}).find("accepted") == std::string::npos &&
+           std::chrono::steady_clock::now() < end) {
+    }
+    fs::path const mailbox = folder_ / "mailbox";
+    fs::create_directories(mailbox / "new");
+    EXPECT_EQ(complaint({"bounce", "--maildir", mailbox.string()}),
+              "vlmail: " + mailbox.string() + " is no mailbox (Maildir) with the folders new and cur\n");
+    fs::create_directories(mailbox / "cur");
+    std::ofstream(mailbox / "new" / "1.a") << "Subject: hello\n\nyou\n";
+    std::ofstream(mailbox / "new" / "2.b")
+        << "Content-Type: multipart/report; boundary=X\n\n--X\n\nSorry.\n--X\n"
+           "Content-Type: message/delivery-status\n\nReporting-MTA: dns; mail.example\n\n"
+           "Action: failed\nDiagnostic-Code: smtp; 550 no such user\n\n--X\n"
+           "Content-Type: text/rfc822-headers\n\nMessage-ID: <p1-1@acme.example>\n\n--X--\n";
+    Result const taken = vlmail({"bounce", "--maildir", mailbox.string()});
+    EXPECT_EQ(taken.status, VlMail::INCOMPLETE);
+    EXPECT_EQ(taken.out, "p1-1, returned: 550 no such user\n");
+    EXPECT_EQ(taken.err, "vlmail: 1.a: the message is no report of a server of e-mail (multipart/report)\n");
+    EXPECT_TRUE(fs::exists(mailbox / "new" / "1.a"));
+    EXPECT_TRUE(fs::exists(mailbox / "cur" / "2.b:2,S"));
+    EXPECT_THAT(vlmail({"status", "p1"}).out, HasSubstr("returned"));
 }
 
 TEST_F(ClientCommands, SettingsAreSetAndShownWithTheirOrigin) {

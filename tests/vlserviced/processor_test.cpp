@@ -85,11 +85,11 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
     EXPECT_EQ(
         send(29, R"({"query":"x"})"),
         R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
     EXPECT_EQ(
         send(29, "{}"),
         R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {

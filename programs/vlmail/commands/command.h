@@ -14,6 +14,7 @@ using Task = std::function<int(Terminal const&)>;
 
 // Each adds its subcommand to `app` and, when the command line names it, leaves its task in `task`.
 // One source file a subcommand.
+void addBounceCommand(Base::Command const& app, Task& task);
 void addCarriersCommand(Base::Command const& app, Task& task);
 void addCheckCommand(Base::Command const& app, Task& task);
 void addDiscoverCommand(Base::Command const& app, Task& task);

@@ -17,6 +17,7 @@ namespace {
 
 void addCommands(Base::Command const& command, Task& task) {
     command.requireCommand();
+    addBounceCommand(command, task);
     addCarriersCommand(command, task);
     addCheckCommand(command, task);
     addDiscoverCommand(command, task);

@@ -9,6 +9,7 @@ constexpr char const* PRESETS_TOOLS = "presets-tools.md";
 
 constexpr Manual::Topic TOPICS[] = {
     {"cancel", CLIENT, "Holding, releasing and cancelling"},
+    {"bounce", "carriers.md", "Delivery reports"},
     {"carriers list", "carriers.md", "How carriers are doing"},
     {"carriers pause", "carriers.md", "How carriers are doing"},
     {"carriers resume", "carriers.md", "How carriers are doing"},

@@ -50,6 +50,18 @@ LetterState stateBehind(Carriers::Progress::Kind kind) {
     return kind == Kind::Delivered ? LetterState::Delivered : LetterState::Failed;
 }
 
+LetterState stateBehind(Carriers::MailReport::Kind kind) {
+    switch (kind) {
+    case Carriers::MailReport::Kind::Delivered:
+        return LetterState::Delivered;
+    case Carriers::MailReport::Kind::Returned:
+        return LetterState::Returned;
+    case Carriers::MailReport::Kind::UnderWay:
+        break;
+    }
+    return LetterState::Accepted;
+}
+
 /// "working", "paused", "failing".
 char const* stateOf(CarrierRecord const& record) {
     if (record.isPaused)
@@ -467,6 +479,14 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
     proceed();
 }
 
+void LetterRunner::noteInHistory(StoredLetter const& letter, LetterState to) {
+    std::optional<Job> const job = jobs_.find(letter.id.packId);
+    if (job)
+        surroundings_.recorder.note(
+            job->cfgId, "letter " + std::to_string(letter.id.number) + " of mailing " + letter.id.packId,
+            Protocol::letterStateName(letter.state), Protocol::letterStateName(to));
+}
+
 bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter) {
     using Protocol::LetterAction;
     bool const isResent = change.action == LetterAction::Resend;
@@ -481,11 +501,8 @@ bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLe
                                        to, "a person has it sent again", surroundings_.now())
                      : letters_.decide(letter.id, {LetterState::Uncertain}, to, "a person says so",
                                        surroundings_.now());
-        std::optional<Job> const job = jobs_.find(letter.id.packId);
-        if (isDecided && job)
-            surroundings_.recorder.note(
-                job->cfgId, "letter " + std::to_string(letter.id.number) + " of mailing " + letter.id.packId,
-                Protocol::letterStateName(letter.state), Protocol::letterStateName(to));
+        if (isDecided)
+            noteInHistory(letter, to);
     });
     return isDecided;
 }
@@ -497,6 +514,35 @@ void LetterRunner::recordCarrier(std::string const& channel, CarrierRecord const
                                     inHistory(record));
         letters_.setCarrier(channel, record);
     });
+}
+
+StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind kind,
+                                std::string const& says) {
+    using Kind = Carriers::MailReport::Kind;
+    std::string const name =
+        "letter " + std::to_string(id.number) + " of mailing " + Base::oneLine(id.packId);
+    std::optional<StoredLetter> const letter = letters_.find(id);
+    if (!letter)
+        throw Base::Error("there is no " + name);
+    if (settingsOf(letter->channel).type != Protocol::CarrierType::Smtp)
+        throw Base::Error(name + " does not go by e-mail");
+    std::vector<LetterState> from{LetterState::Accepted, LetterState::Uncertain};
+    if (kind != Kind::UnderWay)
+        from.push_back(LetterState::Delivered);
+    if (kind == Kind::Returned)
+        from.push_back(LetterState::Returned);
+    bool isNoted = false;
+    surroundings_.recorder.together([&] {
+        isNoted = letters_.decide(id, from, stateBehind(kind), Base::oneLine(says), surroundings_.now());
+        if (isNoted)
+            noteInHistory(*letter, stateBehind(kind));
+    });
+    if (!isNoted)
+        throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) +
+                          ", which the report does not go with");
+    unsettled_.insert(id.packId);
+    proceed();
+    return letters_.find(id).value();
 }
 
 Protocol::CarriersAnswer LetterRunner::list() const {

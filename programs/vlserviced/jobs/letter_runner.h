@@ -3,6 +3,7 @@
 
 #include "programs/base/local_offset.h"
 #include "programs/carriers/carrier.h"
+#include "programs/carriers/mime_message.h"
 #include "programs/vlserviced/jobs/carrier_pace.h"
 #include "programs/vlserviced/jobs/letter_parcel.h"
 #include "programs/vlserviced/settings/service_settings.h"
@@ -70,6 +71,9 @@ public:
 
     /// Throws Error when the letter is not one that this can be decided of.
     void decide(Protocol::LetterChange const& change);
+    /// Notes what a server of e-mail reports of a letter, and gives the letter as it is then. Throws Error
+    /// when it is not one that went by e-mail.
+    StoredLetter note(LetterId const& id, Carriers::MailReport::Kind kind, std::string const& says);
     Protocol::CarriersAnswer list() const;
     void pause(std::string const& channel);
     void resume(std::string const& channel);
@@ -142,6 +146,7 @@ private:
     void settleJobs();
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;
+    void noteInHistory(StoredLetter const& letter, LetterState to);
     bool recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter);
     void recordCarrier(std::string const& channel, CarrierRecord const& record);
     std::string problemOf(std::string const& packId, LetterCounts const& counts) const;

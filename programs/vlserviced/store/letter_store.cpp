@@ -1,5 +1,8 @@
 #include "programs/vlserviced/store/letter_store.h"
 
+#include <charconv>
+#include <system_error>
+
 namespace VlServiced {
 namespace {
 
@@ -47,6 +50,17 @@ LettersByCarriers shareOf(std::vector<DividedLetter> const& letters) {
 }
 
 } // namespace
+
+std::optional<LetterId> LetterId::ofKey(std::string_view key) {
+    std::size_t const dash = key.rfind('-');
+    if (dash == key.npos)
+        return std::nullopt;
+    LetterId letter{std::string(key.substr(0, dash))};
+    auto const [end, failure] =
+        std::from_chars(key.data() + dash + 1, key.data() + key.size(), letter.number);
+    bool const isKey = failure == std::errc() && end == key.data() + key.size() && letter.number > 0;
+    return isKey ? std::optional(letter) : std::nullopt;
+}
 
 bool LetterStore::divide(std::string const& packId, std::vector<DividedLetter> const& letters,
                          long long now) {

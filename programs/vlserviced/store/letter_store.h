@@ -7,6 +7,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace VlServiced {
@@ -22,6 +23,8 @@ struct LetterId {
     auto operator<=>(LetterId const&) const = default;
     /// Under which it is handed over: a safe file name, which no other letter and no mailing has.
     std::string key() const { return packId + '-' + std::to_string(number); }
+    /// The other way; nothing when it is no key.
+    static std::optional<LetterId> ofKey(std::string_view key);
 };
 
 /// A letter of a mailing that is divided.

@@ -596,6 +596,34 @@ TEST_F(LetterRunnerTest, LetsAPersonSettleALetterThatIsUncertain) {
     EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 9), "there is no letter 9 of mailing p1");
 }
 
+TEST_F(LetterRunnerTest, NotesWhatServersReportOfLettersThatWentByEMail) {
+    using Kind = Carriers::MailReport::Kind;
+    setCarriers(
+        R"("email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": ""},
+                   "postal": {"type": "folder", "folder": "/shop"})");
+    other_.isRepeatable = false;
+    other_.answers["p1-2"] = Outcome{Outcome::Kind::Uncertain, "cut"};
+    other_.answers["p1-3"] = Outcome{Outcome::Kind::Refused, "no"};
+    send("p1", {"email", "email", "email", "postal"});
+    doWork();
+    EXPECT_EQ(letterRunner_->note({"p1", 1}, Kind::UnderWay, "delayed").says, "delayed");
+    EXPECT_EQ(state("p1", 1), "accepted: delayed");
+    letterRunner_->note({"p1", 1}, Kind::Delivered, "");
+    EXPECT_EQ(state("p1", 1), "delivered");
+    letterRunner_->note({"p1", 1}, Kind::Returned, "550 \x1B no");
+    EXPECT_EQ(state("p1", 1), "returned: 550 \\u001b no");
+    EXPECT_EQ(letterRunner_->note({"p1", 2}, Kind::Delivered, "").state, LetterState::Delivered);
+    EXPECT_EQ(job("p1"),
+              "failed: 1 letter failed, letter 3: no; 1 letter returned, letter 1: 550 \\u001b no");
+    auto const refused = [&](long long number) {
+        return failureOf([&] { letterRunner_->note({"p1", number}, Kind::Delivered, ""); });
+    };
+    EXPECT_EQ(refused(1), "letter 1 of mailing p1 is returned, which the report does not go with");
+    EXPECT_EQ(refused(3), "letter 3 of mailing p1 is failed, which the report does not go with");
+    EXPECT_EQ(refused(4), "letter 4 of mailing p1 does not go by e-mail");
+    EXPECT_EQ(refused(5), "there is no letter 5 of mailing p1");
+}
+
 TEST_F(LetterRunnerTest, TellsOfLettersWhoseCarrierIsGone) {
     send("p1", {"postal", "postal"});
     setCarriers("");

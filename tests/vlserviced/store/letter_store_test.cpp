@@ -175,4 +175,12 @@ TEST(LetterKeys, AreNoneOfAnotherLetterOrOfAMailing) {
     EXPECT_NE((LetterId{"p1-3", 1}.key()), (LetterId{"p1", 31}.key()));
 }
 
+TEST(LetterIds, AreFoundByTheirKeys) {
+    using VlServiced::LetterId;
+    EXPECT_EQ(LetterId::ofKey("7d3f-44-12"), (LetterId{"7d3f-44", 12}));
+    EXPECT_EQ(LetterId::ofKey(LetterId{"p", 1}.key()), (LetterId{"p", 1}));
+    for (char const* const none : {"", "p1", "p1-", "p1-x", "p1-0", "p1-1x", "p1-99999999999999999999"})
+        EXPECT_EQ(LetterId::ofKey(none), std::nullopt) << none;
+}
+
 } // namespace
