@@ -8,7 +8,7 @@ namespace Protocol {
 struct BeginPack::Keys {
     static constexpr std::tuple TABLE{
         Asked{"id", &BeginPack::id, TextForm{}},
-        Asked{"cfg_id", &BeginPack::cfgId, TextForm{}},
+        Asked{CFG_ID, &BeginPack::cfgId, TextForm{}},
         Asked{"title", &BeginPack::title, TextForm{}},
         Asked{"pages", &BeginPack::pages, IntegerForm{1, MAX_PAGES}},
         Asked{"bytes", &BeginPack::bytes, IntegerForm{1, MAX_BYTES}},

@@ -15,6 +15,8 @@ inline constexpr char const* PACKS_OF_CONNECTION = "packs";
 struct BeginPack {
     static constexpr char const* KIND = "begin_pack";
     static constexpr char const* IN_WORDS = "the beginning of a pack";
+    /// The key of its node: "id" is that of the pack.
+    static constexpr char const* CFG_ID = "cfg_id";
     /// Of a pack, metadata included.
     static constexpr long long MAX_BYTES = 8LL << 30;
     static constexpr long long MAX_PAGES = 10'000'000;

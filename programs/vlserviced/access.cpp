@@ -1,6 +1,7 @@
 #include "programs/vlserviced/access.h"
 
 #include "programs/base/error.h"
+#include "programs/protocol/pack_upload.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/store/node_id.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
@@ -23,6 +24,11 @@ json::Object const* questionOf(Ipc::CmdI const& cmd) {
     return list ? &list->reqParams() : nullptr;
 }
 
+char const* nodeKeyOf(json::Object const& question) {
+    using Protocol::BeginPack;
+    return Protocol::kindOf(question) == BeginPack::KIND ? BeginPack::CFG_ID : Protocol::NODE_ID;
+}
+
 /// The text for a question that names no node; what is wrong with it is told when it is answered.
 std::string nodeOf(Ipc::CmdI const& cmd) {
     if (auto const* const set = dynamic_cast<Ipc::SetPartBase const*>(&cmd))
@@ -32,7 +38,7 @@ std::string nodeOf(Ipc::CmdI const& cmd) {
     if (auto const* const update = dynamic_cast<Ipc::UpdateCfg const*>(&cmd))
         return update->cfgId().str();
     json::Object const* const question = questionOf(cmd);
-    return question ? question->get(Protocol::NODE_ID).textOrEmpty() : std::string();
+    return question ? question->get(nodeKeyOf(*question)).textOrEmpty() : std::string();
 }
 
 /// There is an answer to a question that nobody knows, and it is the same for all.

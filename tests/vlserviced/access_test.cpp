@@ -58,6 +58,11 @@ std::string requestFor(int command, std::string const& node) {
     return R"({"db_host":"","db_conn":"","db_name":"","id":"","cfg_id":)" + id + '}';
 }
 
+std::string questionFor(std::string const& kind, std::string const& node) {
+    std::string const id = kind == "begin_pack" ? R"(","id":"p1","cfg_id":")" : R"(","id":")";
+    return R"({"query":")" + kind + id + node + "\"}";
+}
+
 TEST_F(AccessTest, IsAskedForEachCommandAndEachRoleAtEachPlace) {
     std::vector<std::string> const nodes{"", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme", "a=other"};
     auto const isRefused = [](std::string const& answer) {
@@ -79,7 +84,7 @@ TEST_F(AccessTest, IsAskedForEachCommandAndEachRoleAtEachPlace) {
                     EXPECT_EQ(isRefused(send(command, requestFor(command, node))), isShort(command, node))
                         << command << ' ' << Protocol::roleName(role) << " at " << at << " for " << node;
                 for (std::string const& question : Policy::knownQuestions())
-                    EXPECT_EQ(isRefused(ask("{\"query\":\"" + question + "\",\"id\":\"" + node + "\"}")),
+                    EXPECT_EQ(isRefused(ask(questionFor(question, node))),
                               !Policy::refusalOf(by_, *Policy::rightFor(question), node).empty())
                         << question << ' ' << Protocol::roleName(role) << " at " << at << " for " << node;
             }

@@ -1,6 +1,8 @@
 // The client's subcommands against a service: the command line in, text and exit status out.
+#include "programs/channel/data_message.h"
 #include "programs/channel/token.h"
 #include "programs/mailing/metadata.h"
+#include "programs/protocol/pack_upload.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
@@ -150,6 +152,29 @@ TEST_F(GivenTokens, ThatAreRevokedCountNoMoreForConnectionsThatStand) {
                 HasSubstr("Its access token is none of this service, or was revoked."));
 }
 
+TEST_F(GivenTokens, ThatAreRevokedSendNoDataOnConnectionsThatStand) {
+    add("office", "send", "a=acme");
+    auto const standing = connected("office");
+    SharedMemBuffer const page = zipped("a page");
+    std::string const blob(reinterpret_cast<char const*>(page.data()), page.size());
+    Protocol::BeginPack pack;
+    pack.id = "p1";
+    pack.cfgId = "a=acme";
+    pack.title = "Bills";
+    pack.pages = 2;
+    pack.bytes = 3 * static_cast<long long>(blob.size());
+    pack.sha256 = std::string(64, '0');
+    VlMail::ask(*standing, pack);
+    auto const send = [&](std::uint32_t position) {
+        std::optional<std::string> next =
+            Channel::printData({"p1", position, "bill.pdf", "1", blob.size(), 0, blob});
+        standing->sendData([&] { return std::exchange(next, std::nullopt); });
+    };
+    send(0);
+    output({"token", "revoke", "office"});
+    EXPECT_THAT(failureOf([&] { send(1); }), HasSubstr("this access token was revoked"));
+}
+
 TEST_F(GivenTokens, OfTheFirstStartCanBeReplaced) {
     fs::copy_file(data_ / "token", folder_ / "first");
     EXPECT_THAT(complaint({"token", "revoke", "admin"}),
@@ -228,10 +253,9 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     EXPECT_THAT(output({"carriers", "resume", "postal", "--json"}), HasSubstr(R"("state":"working")"));
     EXPECT_EQ(complaint({"carriers", "pause", "fax"}),
               "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are\n");
-    EXPECT_THAT(
-        complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
-        HasSubstr(
-            "the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, printer, command, smtp"));
+    EXPECT_THAT(complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
+                HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, "
+                          "printer, command, smtp"));
 }
 
 TEST_F(ClientCommands, TheDoctorFindsAllWell) {
@@ -639,7 +663,7 @@ TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {
 }
 
 /// Mails to the service what the settings of a node say.
-class MailingsOfANode : public ClientCommands {
+class MailingsOfANode : public GivenTokens {
 protected:
     MailingsOfANode() {
         output({"settings", "service", "upload_folder=" + upload_.string()});
@@ -681,6 +705,23 @@ protected:
     fs::path upload_ = folder_ / "upload";
     std::string letter_;
 };
+
+TEST_F(MailingsOfANode, AreSentByTokensThatMaySendForIt) {
+    add("office", "send", "u=bob/a=acme");
+    add("reader", "read", "a=acme");
+    add("other", "send", "a=other");
+    auto const send = [&](std::string const& name) {
+        return as(name, {"mail", "--send", "--node", "u=bob/a=acme", letter_});
+    };
+    Result const sent = send("office");
+    EXPECT_EQ(sent.status, VlMail::FINE) << sent.err;
+    EXPECT_THAT(send("reader").err,
+                HasSubstr("this needs the role send at u=bob/a=acme, and the token reader"));
+    EXPECT_THAT(send("other").err,
+                HasSubstr("this needs the role read at u=bob/a=acme, and the token other"));
+    EXPECT_THAT(as("office", {"status"}).out, HasSubstr("Bills"));
+    EXPECT_THAT(as("other", {"status"}).out, testing::Not(HasSubstr("Bills")));
+}
 
 TEST_F(MailingsOfANode, GoOutByThemselvesWhenTheyAreToGoAtOnce) {
     setPackPreset(R"("process_mode": 3)");
