@@ -59,7 +59,7 @@ Held<GMimePart> textPart(std::string const& text) {
     return part;
 }
 
-/// Without its content, which is large: withContents() puts it in.
+/// Without its content, which is large: MimeText puts it in.
 Held<GMimePart> filePart(MailAttachment const& attachment) {
     auto part = partOf("application", "pdf", {}, GMIME_CONTENT_ENCODING_BASE64);
     g_mime_object_set_disposition(GMIME_OBJECT(part.get()), GMIME_DISPOSITION_ATTACHMENT);
@@ -90,41 +90,31 @@ char* writeGroup(char* into, unsigned char const* bytes) {
     return into + 4;
 }
 
-/// Base64 in lines of 76 characters, each with its end.
-void appendLines(std::string& text, std::string_view bytes) {
-    constexpr std::size_t IN_A_LINE = 57;
-    std::size_t const whole = bytes.size() / IN_A_LINE;
-    std::size_t const begin = text.size();
-    text.resize(begin + whole * 78);
-    char* into = text.data() + begin;
-    auto const* from = reinterpret_cast<unsigned char const*>(bytes.data());
-    for (std::size_t line = 0; line < whole; ++line) {
-        for (std::size_t at = 0; at < IN_A_LINE; at += 3, from += 3)
-            into = writeGroup(into, from);
-        into = std::copy_n("\r\n", 2, into);
-    }
-    if (std::string_view const rest = bytes.substr(whole * IN_A_LINE); !rest.empty())
-        text += Base::toBase64(rest) + "\r\n";
+/// In a line of base64, which has 76 characters and its end.
+constexpr std::size_t BYTES_IN_A_LINE = 57;
+
+char* writeLine(char* into, std::string_view bytes) {
+    auto const* const from = reinterpret_cast<unsigned char const*>(bytes.data());
+    for (std::size_t at = 0; at < BYTES_IN_A_LINE; at += 3)
+        into = writeGroup(into, from + at);
+    return std::copy_n("\r\n", 2, into);
 }
 
-/// The message with the files' contents in their places, in front of the ends of the last parts.
-std::string withContents(std::string const& frame, std::vector<MailAttachment> const& files) {
-    std::vector<std::size_t> ends(files.size(), frame.size());
-    std::size_t before = frame.rfind(END_OF_PART);
-    std::size_t size = frame.size();
-    for (std::size_t i = files.size(); i-- > 0; before = frame.rfind(END_OF_PART, before - 1)) {
-        ends[i] = before;
-        size += files[i].bytes.size() / 57 * 78 + 80;
-    }
-    std::string text;
-    text.reserve(size);
-    std::size_t at = 0;
-    for (std::size_t i = 0; i < files.size(); ++i) {
-        text.append(frame, at, ends[i] - at);
-        appendLines(text, files[i].bytes);
-        at = ends[i];
-    }
-    return text.append(frame, at);
+std::size_t encodedSize(std::size_t bytes) {
+    std::size_t const rest = bytes % BYTES_IN_A_LINE;
+    return bytes / BYTES_IN_A_LINE * MimeText::MIN_ROOM + (rest == 0 ? 0 : (rest + 2) / 3 * 4 + 2);
+}
+
+/// Whole lines for which there is room, or else the last one; gives how many bytes of the file are in them.
+std::size_t encode(char*& into, std::size_t room, std::string_view bytes) {
+    std::size_t const lines = std::min(bytes.size() / BYTES_IN_A_LINE, room / MimeText::MIN_ROOM);
+    for (std::size_t line = 0; line < lines; ++line)
+        into = writeLine(into, bytes.substr(line * BYTES_IN_A_LINE));
+    if (lines > 0 || room < MimeText::MIN_ROOM)
+        return lines * BYTES_IN_A_LINE;
+    std::string const last = Base::toBase64(bytes) + "\r\n";
+    into = std::copy(last.begin(), last.end(), into);
+    return bytes.size();
 }
 
 /// The text in front and the files behind it.
@@ -260,9 +250,8 @@ std::string wordsOf(std::string const& status) {
     return std::string(trimmed(kind == words.npos ? words : std::string_view(words).substr(kind + 1)));
 }
 
-} // namespace
-
-std::string inMime(MailMessage const& message) {
+/// All but the contents of files.
+std::string frameOf(MailMessage const& message) {
     beginOnce();
     auto const mime = held(g_mime_message_new(TRUE));
     setHeaders(mime.get(), message);
@@ -272,7 +261,52 @@ std::string inMime(MailMessage const& message) {
     auto const out = held(g_mime_stream_mem_new());
     g_mime_object_write_to_stream(GMIME_OBJECT(mime.get()), options, out.get());
     g_mime_format_options_free(options);
-    return withContents(bytesOf(out.get()), message.attachments);
+    return bytesOf(out.get());
+}
+
+} // namespace
+
+MimeText::MimeText(MailMessage const& message) : frame_(frameOf(message)) {
+    // Each file stands in front of the end of its part, which are the last ones.
+    std::string_view rest = frame_;
+    std::vector<std::string_view> behind;
+    for (std::size_t i = message.attachments.size(); i-- > 0;) {
+        std::size_t const end = rest.rfind(END_OF_PART);
+        behind.push_back(rest.substr(end));
+        rest = rest.substr(0, end);
+    }
+    pieces_.push_back({rest});
+    for (MailAttachment const& file : message.attachments) {
+        pieces_.push_back({file.bytes, true});
+        pieces_.push_back({behind.back()});
+        behind.pop_back();
+    }
+    for (Piece const& piece : pieces_)
+        size_ += piece.isFile ? encodedSize(piece.bytes.size()) : piece.bytes.size();
+}
+
+std::size_t MimeText::read(char* into, std::size_t room) {
+    char* end = into;
+    for (; piece_ < pieces_.size(); ++piece_, at_ = 0) {
+        auto const& [bytes, isFile] = pieces_[piece_];
+        while (at_ < bytes.size()) {
+            std::size_t const left = room - static_cast<std::size_t>(end - into);
+            std::size_t const taken =
+                isFile ? encode(end, left, bytes.substr(at_)) : bytes.copy(end, left, at_);
+            if (taken == 0)
+                return static_cast<std::size_t>(end - into);
+            end += isFile ? 0 : taken;
+            at_ += taken;
+        }
+    }
+    return static_cast<std::size_t>(end - into);
+}
+
+std::string inMime(MailMessage const& message) {
+    MimeText mime(message);
+    std::string text(mime.size() + MimeText::MIN_ROOM, '\0');
+    text.resize(mime.read(text.data(), text.size()));
+    return text;
 }
 
 MailReport mailReportIn(std::string_view message) {

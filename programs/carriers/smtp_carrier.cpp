@@ -100,7 +100,9 @@ Outcome SmtpCarrier::handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt
     } catch (Base::Error const& bad) {
         return {Outcome::Kind::Refused, bad.what()};
     }
-    return session_.send(server(), {message.from, message.to, inMime(message)}, mayHaveIt);
+    MimeText text(message);
+    auto const read = [&text](char* into, std::size_t room) { return text.read(into, room); };
+    return session_.send(server(), {message.from, message.to, text.size(), read}, mayHaveIt);
 }
 
 std::string SmtpCarrier::test() {

@@ -137,7 +137,7 @@ public:
         set(CURLOPT_MAIL_FROM, mail.from.c_str());
         set(CURLOPT_MAIL_RCPT, recipients_);
         set(CURLOPT_UPLOAD, 1L);
-        set(CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(mail.message.size()));
+        set(CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(mail.size));
         set(CURLOPT_READFUNCTION, &Transfer::onRead);
         set(CURLOPT_READDATA, this);
         perform();
@@ -231,15 +231,16 @@ private:
         return static_cast<Transfer*>(self)->read(into, one * size);
     }
     std::size_t read(char* into, std::size_t room) {
-        std::string const& message = mail_->message;
-        if (at_ == 0 && (isTooLarge_ = message.size() > sizeLimitIn(extensions_).value_or(message.size())))
+        if (at_ == 0 && (isTooLarge_ = mail_->size > sizeLimitIn(extensions_).value_or(mail_->size)))
             return CURL_READFUNC_ABORT;
-        std::size_t const size = std::min(room, message.size() - at_);
-        // With the last of it.
-        if (at_ + size == message.size() && !mayHave_ && !putOnRecord())
-            return CURL_READFUNC_ABORT;
-        message.copy(into, size, at_);
+        std::size_t const size = mail_->read(into, room);
         at_ += size;
+        // Whose end would be the message's.
+        if (size == 0 && at_ < mail_->size)
+            return CURL_READFUNC_ABORT;
+        // With the last of it.
+        if (at_ == mail_->size && !mayHave_ && !putOnRecord())
+            return CURL_READFUNC_ABORT;
         return size;
     }
     bool putOnRecord() {
@@ -254,7 +255,7 @@ private:
 
     Outcome outcome() const {
         if (isTooLarge_)
-            return {Outcome::Kind::Refused, "the message has " + std::to_string(mail_->message.size()) +
+            return {Outcome::Kind::Refused, "the message has " + std::to_string(mail_->size) +
                                                 " bytes, and " + server_.url + " takes " +
                                                 std::to_string(sizeLimitIn(extensions_).value_or(0))};
         if (mayHave_)

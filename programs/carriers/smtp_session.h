@@ -3,6 +3,8 @@
 
 #include "programs/carriers/carrier.h"
 
+#include <cstddef>
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -23,8 +25,10 @@ struct Mail {
     /// Plain addresses of the envelope.
     std::string from;
     std::string to;
-    /// With lines that end in carriage return and line feed.
-    std::string message;
+    /// Of the message, whose lines end in carriage return and line feed.
+    std::size_t size = 0;
+    /// Its next bytes; asked again behind the last, it gives 0.
+    std::function<std::size_t(char* into, std::size_t room)> read;
 };
 
 /// Stays connected from one mail to the next. Used by one thread at a time.

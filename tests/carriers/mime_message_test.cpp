@@ -1,5 +1,6 @@
 #include "programs/carriers/mime_message.h"
 
+#include "programs/base/base64.h"
 #include "programs/base/error.h"
 #include "tests/support/failure_of.h"
 
@@ -68,7 +69,8 @@ TEST(MimeMessages, HaveShortLinesThatEndAsTheyMust) {
     MailMessage message = billOf("Fällig: " + std::string(200, 'x') + " " + std::string(80, '\xC3') + '\xBC');
     message.subject = "F\xC3\xA4llig " + std::string(100, 'x') + ' ' + std::string(100, 'y');
     message.text = std::string(5000, 'z') + "\n.\nFrom me\n=_part\n--=_part--\n";
-    message.attachments.front().bytes = std::string("\0\r\n.\r\n\xFF", 7) + std::string(10'000, 'a');
+    std::string const file = std::string("\0\r\n.\r\n\xFF", 7) + std::string(10'000, 'a');
+    message.attachments.front().bytes = file;
     std::string const mime = Carriers::inMime(message);
     std::size_t longest = 0;
     for (std::size_t at = 0; at < mime.size();) {
@@ -82,6 +84,32 @@ TEST(MimeMessages, HaveShortLinesThatEndAsTheyMust) {
     EXPECT_THAT(mime, EndsWith("\r\n--=_part--\r\n"));
     EXPECT_THAT(mime, HasSubstr("=3D_part"));
     EXPECT_EQ(mime.find("\r\n--=_part--\r\n"), mime.size() - 14);
+}
+
+TEST(MimeMessages, AreReadInAnyPiecesAndHoldTheirFiles) {
+    MailMessage message = billOf("a");
+    for (std::size_t const size : {0U, 1U, 2U, 3U, 56U, 57U, 58U, 113U, 114U, 1000U}) {
+        std::string file;
+        for (std::size_t i = 0; i < size; ++i)
+            file += static_cast<char>(i * 37);
+        message.attachments = {{"a.pdf", file}, {"b.pdf", file}};
+        std::string const whole = undated(Carriers::inMime(message));
+        std::string encoded = "\r\n\r\n";
+        for (std::size_t at = 0; at < size; at += 57)
+            encoded += Base::toBase64(file.substr(at, 57)) + "\r\n";
+        std::size_t const first = whole.find(encoded + "\r\n--=_part\r\n");
+        EXPECT_NE(first, whole.npos) << size;
+        EXPECT_NE(whole.find(encoded + "\r\n--=_part--", first + 1), whole.npos) << size;
+        for (std::size_t room = Carriers::MimeText::MIN_ROOM; room < 300; room += 7) {
+            Carriers::MimeText text(message);
+            std::string buffer(room, ' ');
+            std::string read;
+            while (std::size_t const taken = text.read(buffer.data(), room))
+                read.append(buffer, 0, taken);
+            EXPECT_EQ(read.size(), text.size());
+            EXPECT_EQ(undated(read), whole) << size << ' ' << room;
+        }
+    }
 }
 
 std::string report(std::string const& status, std::string const& third) {
