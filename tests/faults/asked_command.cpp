@@ -209,7 +209,7 @@ std::vector<Question> const& questions() {
         {"settings_tree", {"settings", "tree"}},
         {"resend", {"resend", "{}", "1"}, &mailed, {"status", "{}"}, Expected::Refused},
         {"send", {"send", FILE_AT_HAND}, &inAFile, {"status", "{}"}},
-        {"bounce", {"bounce", "--maildir", "."}, {"status"}, Expected::Refused},
+        {"bounce", {"bounce", "--maildir", "."}, {}, {}, Expected::Refused},
         {"settle", {"settle", "{}", "1", "failed"}, &mailed, {"status", "{}"}, Expected::Refused},
         {"status", {"status"}},
         {"discard",
