@@ -41,6 +41,7 @@ std::map<std::string, Row> const OF_QUESTIONS{
     {"jobs", {"read", "any"}},
     {"change_jobs", {"send", "any"}},
     {"change_letter", {"send", "any"}},
+    {"delivery_report", {"send", "any"}},
     {"begin_pack", {"send", "node"}},
     {"carriers", {"admin", "root"}},
     {"change_carrier", {"admin", "root"}},
