@@ -24,6 +24,8 @@ Transaction::Transaction(Connection& connection, Isolation isolation)
         connection_.begin(isolation);
     else
         connection_.run("SAVEPOINT " + name());
+    if (depth_ > 0 && isolation == ALONE)
+        connection_.beAlone();
     ++connection_.depth_;
 }
 

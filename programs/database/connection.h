@@ -5,6 +5,7 @@
 
 #include <concepts>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -48,6 +49,10 @@ public:
     Value(std::string_view text) : value_(text) {}
     Value(char const* text) : value_(std::string_view(text)) {}
     Value(Bytes bytes) : value_(bytes) {}
+    Value(std::optional<long long> number) {
+        if (number)
+            value_ = *number;
+    }
 
     std::variant<std::monostate, long long, std::string_view, Bytes> const& get() const { return value_; }
 
@@ -118,7 +123,8 @@ public:
     /// Has nothing of what was deleted stay in a log beside the database.
     virtual void emptyLog() {}
 
-    // What databases spell in different ways.
+    // What databases spell in different ways. A schema may make clock_ms() known on a server: milliseconds
+    // since the epoch by its clock. SQLite's connections know it.
 
     /// The elements of a JSON array of texts, for IN.
     std::string elementsOf(std::string const& placeholder) const;
@@ -149,6 +155,8 @@ protected:
     virtual void commit() = 0;
     /// Throws nothing.
     virtual void rollback() noexcept = 0;
+    /// Has the transaction that is open be one that is alone from here on.
+    virtual void beAlone() {}
 
 private:
     int depth_ = 0;

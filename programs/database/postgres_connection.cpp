@@ -255,10 +255,17 @@ void PostgresConnection::begin(Isolation isolation) {
                     session_->connection);
         else
             session_->transaction = std::make_unique<pqxx::work>(session_->connection);
-        if (isolation == Isolation::Alone)
-            session_->transaction->exec(ALONE_LOCK);
     });
+    try {
+        if (isolation == Isolation::Alone)
+            beAlone();
+    } catch (...) {
+        rollback();
+        throw;
+    }
 }
+
+void PostgresConnection::beAlone() { run(ALONE_LOCK); }
 
 void PostgresConnection::commit() {
     orQueryError([&] { session_->transaction->commit(); });

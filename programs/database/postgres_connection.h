@@ -33,6 +33,7 @@ private:
     void begin(Isolation isolation) override;
     void commit() override;
     void rollback() noexcept override;
+    void beAlone() override;
 
     PostgresSession& session();
     template<typename Operation>

@@ -3,6 +3,7 @@
 #include <SQLiteCpp/Exception.h>
 #include <sqlite3.h>
 
+#include <chrono>
 #include <cstdint>
 #include <utility>
 
@@ -46,6 +47,16 @@ struct Binding {
     }
 };
 
+long long systemClock() {
+    using namespace std::chrono;
+    return duration_cast<milliseconds>(system_clock::now().time_since_epoch()).count();
+}
+
+void tellTime(sqlite3_context* call, int, sqlite3_value**) {
+    auto const& clock = *static_cast<std::function<long long()>*>(sqlite3_user_data(call));
+    sqlite3_result_int64(call, clock());
+}
+
 } // namespace
 
 class SqliteConnection::StatementRows : public Rows::Cursor {
@@ -71,7 +82,11 @@ private:
     Statement statement_;
 };
 
-SqliteConnection::SqliteConnection(SQLite::Database database) : database_(std::move(database)) {}
+SqliteConnection::SqliteConnection(SQLite::Database database)
+    : database_(std::move(database)), clock_(std::make_unique<std::function<long long()>>(&systemClock)) {
+    sqlite3_create_function_v2(database_.getHandle(), "clock_ms", 0, SQLITE_UTF8, clock_.get(), &tellTime,
+                               nullptr, nullptr, nullptr);
+}
 SqliteConnection::~SqliteConnection() = default;
 
 void SqliteConnection::run(std::string const& script) {

@@ -6,7 +6,6 @@
 
 #include <SQLiteCpp/Statement.h>
 
-#include <ctime>
 #include <functional>
 #include <map>
 
@@ -21,6 +20,8 @@ public:
     void run(std::string const& script) override;
     void emptyLog() override { run("PRAGMA wal_checkpoint(TRUNCATE)"); }
     SQLite::Database& file() { return database_; }
+    /// What clock_ms() says, in milliseconds.
+    void setClock(std::function<long long()> clock) { *clock_ = std::move(clock); }
 
 private:
     using Statement = std::unique_ptr<SQLite::Statement>;
@@ -37,6 +38,7 @@ private:
     void giveBack(std::string const& sql, Statement statement) noexcept;
 
     SQLite::Database database_;
+    std::unique_ptr<std::function<long long()>> clock_;
     /// Those that are not in use, by their texts.
     std::map<std::string, Statement> idle_;
 };

@@ -20,6 +20,15 @@ void addOptions(Base::Command const& command, Options& options) {
                    "Folder with everything that the service keeps; made when it is not there")
         .required()
         .valueName("FOLDER");
+    command
+        .addOption("--database", options.database,
+                   "Database that several services share, postgresql://HOST/NAME [a file in the data folder]")
+        .valueName("URL");
+    command
+        .addOption("--lease", options.lease,
+                   "Seconds after which other services take up what one works on that stands still")
+        .showDefault()
+        .valueName("SECONDS");
     command.addOption("--outbox", options.outbox, "Folder for finished mailings [outbox in the data folder]")
         .valueName("FOLDER");
     command.addOption("--token", options.token, "File with the access token [token in the data folder]")
@@ -59,7 +68,12 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
     addOptions(line.command(), options);
     line.addConfigFile();
     try {
-        return line.read(argc, argv, out) ? std::variant<Options, int>(options) : 0;
+        if (!line.read(argc, argv, out))
+            return 0;
+        if (options.lease < 2 || options.lease > 600)
+            throw Base::UsageError("--lease takes 2 to 600 seconds, and got " +
+                                   std::to_string(options.lease));
+        return options;
     } catch (Base::UsageError const& wrong) {
         err << "vlserviced: " << wrong.what() << "; --help explains\n";
         return 1;

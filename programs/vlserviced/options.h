@@ -13,6 +13,10 @@ namespace VlServiced {
 
 struct Options {
     std::filesystem::path data;
+    /// Of a PostgreSQL database that several services may share; empty for the data folder's own file.
+    std::string database;
+    /// How many seconds a service that stands still keeps what it works on from the others.
+    std::uint16_t lease = 60;
     /// Empty for the data folder's own.
     std::filesystem::path outbox;
     /// File with the access token; empty for the data folder's own.

@@ -13,6 +13,7 @@
 #include "programs/vlserviced/jobs/local_packs.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
 #include "programs/vlserviced/jobs/retention.h"
+#include "programs/vlserviced/neighbours.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/schema.h"
@@ -32,6 +33,7 @@
 #include <boost/asio/thread_pool.hpp>
 
 #include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <csignal>
 #include <ctime>
@@ -40,7 +42,9 @@
 #include <map>
 #include <new>
 #include <optional>
+#include <random>
 #include <thread>
+#include <unistd.h>
 #include <utility>
 #include <vector>
 
@@ -60,7 +64,32 @@ constexpr std::size_t MAX_PATH_BYTES = 1000;
 
 constexpr char const* REVOKED = "this access token was revoked: ask for another one (\"vlmail token add\")";
 
-long long now() { return std::time(nullptr); }
+/// How often what other services tell is looked up, whether it was heard or not.
+constexpr std::chrono::seconds POLL_TIME{15};
+
+/// What the database's clock is ahead of this machine's, in seconds.
+std::atomic<long long> databaseAhead{0};
+
+long long now() { return std::time(nullptr) + databaseAhead; }
+
+/// Another one for each process.
+Holder newHolder(Options const& options) {
+    std::random_device random;
+    return options.database.empty() ? Holder{"this service", options.lease}
+                                    : Holder{asio::ip::host_name() + '-' + std::to_string(::getpid()) + '-' +
+                                                 std::to_string(random()),
+                                             options.lease};
+}
+
+SharedDatabase openDatabase(Options const& options, DataFolder const& data) {
+    return options.database.empty() ? SharedDatabase{openServiceDatabase(data.database()), true}
+                                    : openSharedDatabase(options.database);
+}
+
+std::shared_ptr<PackStore> openPackStore(Options const& options, DataFolder const& data) {
+    return options.database.empty() ? openSqlitePackStore(data.packs())
+                                    : openSharedPackStore(options.database);
+}
 
 /// Goes on whoever sets the clock.
 long long steadySeconds() {
@@ -114,16 +143,21 @@ std::string announcedHost(Options const& options) {
     return asio::ip::make_address(options.listen).is_unspecified() ? asio::ip::host_name() : options.listen;
 }
 
-/// The service's own token. The first start makes one, where none is named.
+/// The service's own token. The first start makes one, where none is named; of services that share a
+/// database, the first of all.
 struct OwnToken {
     std::string text;
     bool isNew = false;
 };
 
-OwnToken ownToken(Options const& options, DataFolder const& data) {
+OwnToken ownToken(Options const& options, DataFolder const& data, bool mayMakeIt) {
     if (!options.token.empty())
         return {Channel::readToken(options.token)};
     bool const isNew = !fs::exists(data.token());
+    if (isNew && !mayMakeIt)
+        throw Base::Error(
+            "the token of this database lies with the service that has made it: copy that file to " +
+            data.token().string() + " or name it by --token");
     return {Channel::readOrCreateToken(data.token().string()), isNew};
 }
 
@@ -165,9 +199,9 @@ private:
 class Service::Impl {
 public:
     explicit Impl(Options const& options)
-        : data_(options.data), outbox_(preparedOutbox(options, data_)),
-          database_(openServiceDatabase(data_.database())), localPacks_(options.localPacks),
-          packStore_(openSqlitePackStore(data_.packs())), ownToken_(ownToken(options, data_)),
+        : data_(options.data), outbox_(preparedOutbox(options, data_)), opened_(openDatabase(options, data_)),
+          jobs_(*opened_.connection, newHolder(options)), localPacks_(options.localPacks),
+          packStore_(openPackStore(options, data_)), ownToken_(ownToken(options, data_, opened_.isNew)),
           server_(
               std::in_place, io_, serverSettings(options), &Ipc::makeEmptyCmd,
               [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
@@ -188,6 +222,8 @@ public:
         recogniseFolders();
         if (options.answersDiscovery)
             discovery_.emplace(io_, announcedHost(options), server_->port(), ownToken_.text, tokenLookup());
+        if (!options.database.empty())
+            neighbours_.emplace(io_, options.database, heard());
     }
 
     ~Impl() {
@@ -203,6 +239,11 @@ public:
                 stop();
         });
         asio::post(io_, [this] {
+            awaitHold();
+            awaitPoll();
+            if (neighbours_)
+                neighbours_->listen();
+            readClock();
             awaitDue();
             runner_.resume();
             letterRunner_.resume();
@@ -323,8 +364,51 @@ private:
         upkeep_.cancel();
         due_.cancel();
         lettersDue_.cancel();
+        hold_.cancel();
+        poll_.cancel();
+        if (neighbours_)
+            neighbours_->stop();
         isStopping_ = true;
         signals_.cancel();
+    }
+
+    Neighbours::Heard heard() {
+        return {[this](std::string const& packId) { held_.onChange(packId); }, [this] { runner_.takeUp(); },
+                [this] { letterRunner_.proceed(); }, [this] { settings_.forgetRead(); }};
+    }
+
+    void readClock() const {
+        databaseAhead = opened_.connection->number("SELECT clock_ms()") / 1000 -
+                        static_cast<long long>(std::time(nullptr));
+    }
+
+    /// A few times in the time after which others take up what this service works on.
+    void awaitHold() {
+        hold_.expires_after(std::chrono::milliseconds(jobs_.holder().seconds * 1000 / 4));
+        hold_.async_wait([this](boost::system::error_code const& ec) {
+            if (ec)
+                return;
+            awaitHold();
+            runner_.keepHold();
+            letterRunner_.keepHold();
+        });
+    }
+
+    /// What other services have changed, in case that it was not heard.
+    void awaitPoll() {
+        poll_.expires_after(POLL_TIME);
+        poll_.async_wait([this](boost::system::error_code const& ec) {
+            if (ec || !neighbours_)
+                return;
+            awaitPoll();
+            settings_.forgetRead();
+            neighbours_->listen();
+            readClock();
+            runner_.takeUp();
+            letterRunner_.proceed();
+            held_.lookAgain();
+            awaitDue();
+        });
     }
 
     /// Looks at the clock again now and then, since somebody may set it.
@@ -369,7 +453,11 @@ private:
     }
 
     void keepUp() {
-        runner_.resume();
+        // Where services share a database each job has its time.
+        if (neighbours_)
+            runner_.takeUp();
+        else
+            runner_.resume();
         letterRunner_.proceed();
         documents_.dropStalled();
         access_.refused().tellWhatWasLeftOut();
@@ -389,6 +477,7 @@ private:
     void sweepEnded() {
         packs_.sweep();
         history_.removeOld();
+        runner_.sweep();
         removeEndedJobs();
     }
 
@@ -481,7 +570,8 @@ private:
                 [this](std::string const& packId) { runner_.onLettersTaken(packId); },
                 [this] { awaitLetters(); },
                 [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); },
-                history_};
+                history_,
+                [this](std::string const& packId) { return runner_.makingContainer(packId); }};
     }
 
     ReceptionSurroundings receptionSurroundings() {
@@ -492,7 +582,7 @@ private:
     }
 
     HealthSources healthSources() {
-        return {[this] { Database::Transaction(*database_, Database::Transaction::ALONE); },
+        return {[this] { Database::Transaction(*opened_.connection, Database::Transaction::ALONE); },
                 data_.database(),
                 outbox_,
                 [this] { return settings_.service(); },
@@ -504,18 +594,18 @@ private:
 
     DataFolder data_;
     fs::path outbox_;
-    std::unique_ptr<Database::Connection> database_;
-    SettingsStore store_{*database_};
-    History history_{*database_, &now};
+    SharedDatabase opened_;
+    SettingsStore store_{*opened_.connection};
+    History history_{*opened_.connection, &now};
     SettingsService settings_{store_, &SettingsService::localClock, history_};
-    DocumentStore documentStore_{*database_};
+    DocumentStore documentStore_{*opened_.connection};
     DocumentService documents_{documentStore_, store_, settings_, &now, history_};
-    JobStore jobs_{*database_};
-    LetterStore letters_{*database_, jobs_};
+    JobStore jobs_;
+    LetterStore letters_{*opened_.connection, jobs_};
     LocalPacks localPacks_;
     std::shared_ptr<PackStore> packStore_;
     OwnToken ownToken_;
-    TokenStore tokenStore_{*database_};
+    TokenStore tokenStore_{*opened_.connection};
     TokenService tokens_{tokenStore_, ownToken_.text, &now, history_};
     Access access_{&steadySeconds};
 
@@ -542,6 +632,10 @@ private:
     asio::steady_timer due_{io_};
     /// For the next letter that waits for the clock.
     asio::steady_timer lettersDue_{io_};
+    asio::steady_timer hold_{io_};
+    asio::steady_timer poll_{io_};
+    /// Where services share a database.
+    std::optional<Neighbours> neighbours_;
     bool isStopping_ = false;
     std::chrono::steady_clock::time_point lastStatusUpdate_ = std::chrono::steady_clock::now();
     std::chrono::steady_clock::time_point lastSweep_ = std::chrono::steady_clock::now();

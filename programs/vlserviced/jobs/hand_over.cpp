@@ -6,7 +6,11 @@
 #include "vlservice/platform/log.h"
 
 #include <fcntl.h>
+#include <optional>
+#include <regex>
 #include <sys/stat.h>
+#include <system_error>
+#include <utility>
 #include <vector>
 
 namespace VlServiced {
@@ -18,6 +22,20 @@ namespace fs = std::filesystem;
 constexpr std::size_t MAX_REPORT_BYTES = 64 << 10;
 constexpr std::size_t COPY_BYTES = 1 << 20;
 
+std::string stagedName(std::string const& name, long long fence) {
+    return Base::temporaryOf(fence == 0 ? name : name + '.' + std::to_string(fence));
+}
+
+/// The container's name and the fence of a file's name; nothing when it is none that was staged under a
+/// fence.
+std::optional<std::pair<std::string, long long>> stagedIn(std::string const& file) {
+    static std::regex const FORM(R"(\.(.+\.mailing)\.(\d{1,18})\.part)");
+    std::smatch found;
+    if (!std::regex_match(file, found, FORM))
+        return std::nullopt;
+    return std::pair(found[1].str(), std::stoll(found[2].str()));
+}
+
 std::string reportOf(std::string const& name) { return name + ".status"; }
 
 mode_t modeOf(Base::FileDescriptor const& file) {
@@ -28,9 +46,9 @@ mode_t modeOf(Base::FileDescriptor const& file) {
 
 } // namespace
 
-void stage(fs::path const& container, UploadFolder const& folder) {
+void stage(fs::path const& container, UploadFolder const& folder, long long fence) {
     Base::FileDescriptor source(container, O_RDONLY);
-    Base::FileDescriptor target = folder.newFile(Base::temporaryOf(container.filename().string()), 0600);
+    Base::FileDescriptor target = folder.newFile(stagedName(container.filename().string(), fence), 0600);
     std::vector<char> buffer(COPY_BYTES);
     while (std::size_t const size = source.read(buffer.data(), buffer.size()))
         target.writeAll({buffer.data(), size});
@@ -46,16 +64,35 @@ void discardHandedOver(std::string const& name, UploadFolder const& folder) {
     folder.sync();
 }
 
-void unstage(std::string const& name, UploadFolder const& folder) {
-    folder.removeIfThere(Base::temporaryOf(name));
+void unstage(std::string const& name, UploadFolder const& folder, long long fence) {
+    folder.removeIfThere(stagedName(name, fence));
 }
 
-void publish(std::string const& name, UploadFolder const& folder) {
-    std::string const temporary = Base::temporaryOf(name);
+void publish(std::string const& name, UploadFolder const& folder, long long fence) {
+    std::string const temporary = stagedName(name, fence);
     if (!folder.has(temporary))
         return;
-    folder.rename(temporary, name);
+    try {
+        folder.rename(temporary, name);
+    } catch (std::system_error const& failure) {
+        // Another service was faster.
+        if (failure.code() != std::errc::no_such_file_or_directory)
+            throw;
+    }
     folder.sync();
+}
+
+void sweepStaged(UploadFolder const& folder,
+                 std::function<bool(std::string const& name, long long fence)> const& isOfUse) {
+    // By the folder that is held open, whatever is mounted there meanwhile.
+    fs::path const opened = "/proc/self/fd/" + std::to_string(folder.descriptor());
+    std::vector<std::pair<std::string, long long>> left;
+    for (fs::directory_entry const& entry : fs::directory_iterator(opened))
+        if (auto const found = stagedIn(entry.path().filename().string());
+            found && !isOfUse(found->first, found->second))
+            left.push_back(*found);
+    for (auto const& [name, fence] : left)
+        unstage(name, folder, fence);
 }
 
 bool liesIn(UploadFolder const& folder, std::string const& name) { return folder.has(name); }

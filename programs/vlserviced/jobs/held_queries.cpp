@@ -40,6 +40,14 @@ void HeldQueries::onChange(std::string const& packId) {
         finish(held);
 }
 
+void HeldQueries::lookAgain() {
+    std::set<std::string> packIds;
+    for (auto const& [packId, held] : byPack_)
+        packIds.insert(packId);
+    for (std::string const& packId : packIds)
+        onChange(packId);
+}
+
 void HeldQueries::releaseAll() {
     while (!held_.empty())
         finish(held_.begin());

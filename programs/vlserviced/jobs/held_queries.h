@@ -32,6 +32,8 @@ public:
     /// otherwise when none does any more, when the time is up, or with releaseAll().
     void hold(Protocol::JobsQuery const& query, Release release);
     void onChange(std::string const& packId);
+    /// The same of every job that somebody waits for.
+    void lookAgain();
     void releaseAll();
 
 private:

@@ -22,6 +22,11 @@ namespace fs = std::filesystem;
 
 using Protocol::JobAction;
 
+/// That are held at once.
+constexpr std::size_t AT_ONCE = 16;
+/// How long something in the way of a job is left to itself.
+constexpr long long RETRY_SECONDS = 60;
+
 /// One spelling for a folder, so that jobs are found again by it.
 std::string folderText(std::string const& folder) {
     std::string const normal = fs::path(folder).lexically_normal().string();
@@ -136,23 +141,61 @@ std::unique_ptr<Mailing::PackSource> openPackDatabase(PackLocation const& pack) 
 }
 
 JobRunner::JobRunner(JobStore& jobs, JobSurroundings surroundings)
-    : jobs_(jobs), surroundings_(std::move(surroundings)) {}
+    : jobs_(jobs), surroundings_(std::move(surroundings)) {
+    jobs_.freeOwn();
+}
 
 void JobRunner::resume() {
     sweepOutbox();
-    for (JobState const state : {JobState::Submitting, JobState::Queued, JobState::Accepted})
-        for (Job const& job : jobs_.inState(state))
-            proceed(job);
-    releaseDue();
+    jobs_.hurry();
+    takeUp();
+}
+
+void JobRunner::takeUp() {
+    // What is taken up may come to its end at once, and ask for more.
+    if (isTakingUp_)
+        return;
+    isTakingUp_ = true;
+    try {
+        releaseDue();
+        while (held_.size() < AT_ONCE && !surroundings_.settings().isSuspended(Suspended::Jobs)) {
+            std::vector<Job> const jobs = jobs_.claim(AT_ONCE - held_.size());
+            for (Job const& job : jobs)
+                held_.emplace(job.pack.packId, job.fence);
+            // What this service stood still with for too long comes to its end first.
+            for (Job const& job : jobs)
+                if (!busy_.contains(job.pack.packId))
+                    goOn(job);
+            if (jobs.empty())
+                break;
+        }
+    } catch (...) {
+        isTakingUp_ = false;
+        // What nobody works on is free again when its time is over.
+        std::erase_if(held_, [this](auto const& each) { return !busy_.contains(each.first); });
+        throw;
+    }
+    isTakingUp_ = false;
+}
+
+void JobRunner::keepHold() {
+    std::vector<std::string> packIds;
+    for (auto const& [packId, fence] : held_)
+        packIds.push_back(packId);
+    jobs_.keep(packIds);
+}
+
+JobKey JobRunner::held(std::string const& packId) const {
+    auto const found = held_.find(packId);
+    return found == held_.end() ? JobKey(packId) : JobKey(packId, found->second);
 }
 
 void JobRunner::releaseDue() {
     // Each is a transaction of its own, and others wait meanwhile.
-    constexpr std::size_t AT_ONCE = 100;
-    for (Job const& job : jobs_.due(surroundings_.now(), AT_ONCE)) {
-        jobs_.advance(job.pack.packId, JobState::Held, JobState::Queued, surroundings_.now());
-        proceed(jobs_.find(job.pack.packId).value());
-    }
+    constexpr std::size_t RELEASED_AT_ONCE = 100;
+    for (Job const& job : jobs_.due(surroundings_.now(), RELEASED_AT_ONCE))
+        if (jobs_.advance(job.pack.packId, JobState::Held, JobState::Queued, surroundings_.now()))
+            proceed(jobs_.find(job.pack.packId).value());
 }
 
 void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
@@ -216,24 +259,65 @@ void JobRunner::requireNotDisabled(std::string const& packId, std::string const&
 }
 
 void JobRunner::proceed(Job const& job) {
-    if (busy_.contains(job.pack.packId) || surroundings_.settings().isSuspended(Suspended::Jobs))
+    std::string const& packId = job.pack.packId;
+    if (busy_.contains(packId) || !isToWorkOn(job) || surroundings_.settings().isSuspended(Suspended::Jobs))
         return;
+    if (held_.contains(packId))
+        return goOn(job);
+    if (held_.size() >= AT_ONCE)
+        return;
+    if (std::optional<Job> const claimed = jobs_.claim(packId)) {
+        held_.emplace(packId, claimed->fence);
+        goOn(*claimed);
+    }
+}
+
+void JobRunner::goOn(Job const& job) {
     if (job.state == JobState::Accepted)
         startPacking(job);
     else if (job.state == JobState::Queued && job.toUpload)
         startHandingOver(job);
     else if (job.state == JobState::Submitting)
         finishSubmitting(job);
+    if (!busy_.contains(job.pack.packId))
+        letGo(job.pack.packId);
 }
 
-void JobRunner::startPacking(Job const& job) {
-    inBackground(
-        job.pack.packId,
+/// One that could go on has something in its way, and is tried again later.
+void JobRunner::letGo(std::string const& packId) {
+    auto const held = held_.find(packId);
+    if (held == held_.end())
+        return;
+    JobKey const key(packId, held->second);
+    held_.erase(held);
+    std::optional<Job> const job = jobs_.find(packId);
+    if (job && !hasEnded(job->state) && job->state != JobState::Submitted)
+        jobs_.letGo(key, isToWorkOn(*job) ? RETRY_SECONDS : 0);
+}
+
+std::function<void()> JobRunner::packing(Job const& job) const {
+    return
         [pack = job.pack, open = surroundings_.openPack, target = surroundings_.outbox / job.containerName(),
          decided = Policy::decidedMembers(surroundings_.rules(job.cfgId))] {
             writeContainer(*open(pack), target, decided);
-        },
-        [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
+        };
+}
+
+std::function<void()> JobRunner::makingContainer(std::string const& packId) const {
+    std::optional<Job> const job = jobs_.find(packId);
+    return job ? makingContainer(*job) : [] {};
+}
+
+std::function<void()> JobRunner::makingContainer(Job const& job) const {
+    return [container = surroundings_.outbox / job.containerName(), pack = packing(job)] {
+        if (!fs::exists(container))
+            pack();
+    };
+}
+
+void JobRunner::startPacking(Job const& job) {
+    inBackground(job.pack.packId, packing(job),
+                 [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
 }
 
 void JobRunner::onPacked(std::string const& packId, Outcome const& outcome) {
@@ -242,13 +326,13 @@ void JobRunner::onPacked(std::string const& packId, Outcome const& outcome) {
         return discard(job);
     if (outcome.kind == Outcome::Kind::GiveUp) {
         Log::Lock(3).logStreamLine() << "Pack " << packId << " is given up: " << outcome.why;
-        jobs_.fail(packId, outcome.why, surroundings_.now());
+        jobs_.fail(held(packId), outcome.why, surroundings_.now());
     } else if (outcome.kind == Outcome::Kind::TryLater) {
         noteProblem(packId, outcome.why);
     } else {
         long long const now = surroundings_.now();
-        jobs_.advance(packId, JobState::Accepted, stateBehindPacking(job, now), now);
-        proceed(jobs_.find(packId).value());
+        if (jobs_.advance(held(packId), JobState::Accepted, stateBehindPacking(job, now), now))
+            proceed(jobs_.find(packId).value());
     }
 }
 
@@ -262,16 +346,17 @@ void JobRunner::startDividing(Job const& job) {
     auto const letters = std::make_shared<std::vector<DividedLetter>>();
     inBackground(
         job.pack.packId,
-        [letters, container = surroundings_.outbox / job.containerName(),
+        [letters, make = makingContainer(job), container = surroundings_.outbox / job.containerName(),
          rest = surroundings_.outbox / REST_FOLDER / job.containerName(),
          carriers = surroundings_.settings().carriers()] {
+            make();
             *letters = divide(container, rest,
                               [&](std::string const& channel) { return carriers.contains(channel); });
         },
         [this, packId = job.pack.packId, letters](Outcome const& outcome) {
             if (outcome.kind != Outcome::Kind::Done)
                 return noteProblem(packId, outcome.why);
-            surroundings_.letters->record(packId, *letters);
+            surroundings_.letters->record(held(packId), *letters);
             proceed(jobs_.find(packId).value());
         });
 }
@@ -286,6 +371,39 @@ fs::path JobRunner::containerToStage(Job const& job) const {
            job.containerName();
 }
 
+std::function<void()> JobRunner::makingRest(Job const& job) const {
+    auto const make = makingContainer(job);
+    if (!job.lettersState)
+        return make;
+    std::set<std::string> channels = surroundings_.letters->store().channelsByCarrier(job.pack.packId);
+    return [make, channels, container = surroundings_.outbox / job.containerName(),
+            rest = containerToStage(job)] {
+        if (fs::exists(rest))
+            return;
+        make();
+        divide(container, rest, [&](std::string const& channel) { return channels.contains(channel); });
+    };
+}
+
+void JobRunner::sweep() {
+    ServiceSettings const settings = surroundings_.settings();
+    Outcome const swept = outcomeOf([&] {
+        if (!settings.uploadFolder().empty())
+            sweepStaged(
+                UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()),
+                [this](std::string const& name, long long fence) { return isStagedOfUse(name, fence); });
+    });
+    if (swept.kind != Outcome::Kind::Done)
+        Log::Lock(4).logStreamLine() << "The upload folder cannot be looked through: " << swept.why;
+    discardLeft();
+}
+
+/// What nobody may publish is staged under a fence that is past and not on record.
+bool JobRunner::isStagedOfUse(std::string const& name, long long fence) const {
+    std::optional<Job> const job = jobs_.find(fs::path(name).stem().string());
+    return !job || fence >= job->fence || (job->state == JobState::Submitting && fence == job->submitFence);
+}
+
 void JobRunner::startStaging(Job const& job) {
     std::string const folder = surroundings_.settings().uploadFolder();
     // The job list tells that there is none.
@@ -294,9 +412,11 @@ void JobRunner::startStaging(Job const& job) {
     auto const identity = std::make_shared<std::string>(surroundings_.settings().uploadFolderIdentity());
     inBackground(
         job.pack.packId,
-        [container = containerToStage(job), folder, identity] {
+        [container = containerToStage(job), make = makingRest(job), folder, identity,
+         fence = held(job.pack.packId).fence.value_or(0)] {
             UploadFolder const target(folder, *identity);
-            stage(container, target);
+            make();
+            stage(container, target, fence);
             *identity = target.identity().text();
         },
         [this, packId = job.pack.packId, folder, identity](Outcome const& outcome) {
@@ -307,12 +427,12 @@ void JobRunner::startStaging(Job const& job) {
 void JobRunner::onStaged(std::string const& packId, std::string const& folder, std::string const& identity,
                          Outcome const& outcome) {
     bool const isStaged = outcome.kind == Outcome::Kind::Done;
-    if (isStaged && jobs_.beginSubmitting(packId, folder, identity, surroundings_.now()))
+    if (isStaged && jobs_.beginSubmitting(held(packId), folder, identity, surroundings_.now()))
         return finishSubmitting(jobs_.find(packId).value());
     Job const job = jobs_.find(packId).value();
-    if (job.state == JobState::Queued)
+    if (job.state == JobState::Queued && !isStaged)
         return noteProblem(packId, outcome.why);
-    // A person was faster.
+    // A person was faster, or another service.
     discard(job);
 }
 
@@ -323,7 +443,8 @@ void JobRunner::discard(Job const& job) {
         ServiceSettings const settings = surroundings_.settings();
         if (!settings.uploadFolder().empty())
             unstage(job.containerName(),
-                    UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()));
+                    UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()),
+                    held(job.pack.packId).fence.value_or(job.fence));
     });
     if (unstaged.kind != Outcome::Kind::Done)
         Log::Lock(4).logStreamLine() << "Pack " << job.pack.packId << " may lie in the upload folder under a "
@@ -360,13 +481,15 @@ void JobRunner::change(JobAction action, std::string const& packId) {
 }
 
 void JobRunner::finishSubmitting(Job const& job) {
-    Outcome const outcome = outcomeOf(
-        [&] { publish(job.containerName(), UploadFolder(job.uploadFolder, job.uploadFolderIdentity)); });
+    Outcome const outcome = outcomeOf([&] {
+        publish(job.containerName(), UploadFolder(job.uploadFolder, job.uploadFolderIdentity),
+                job.submitFence);
+    });
     if (outcome.kind != Outcome::Kind::Done)
         return noteProblem(job.pack.packId, outcome.why);
     // While the job is on record as Submitting, so that a container that stays behind is seen to again.
     removeFromOutbox(containerToStage(job));
-    jobs_.advance(job.pack.packId, JobState::Submitting, JobState::Submitted, surroundings_.now());
+    jobs_.advance(held(job.pack.packId), JobState::Submitting, JobState::Submitted, surroundings_.now());
     if (job.lettersState)
         onLettersTaken(job.pack.packId);
 }
@@ -391,14 +514,19 @@ void JobRunner::removeFromOutbox(fs::path const& container) {
             << failure.message();
 }
 
+/// What an earlier process left there, or another service has handed over.
+void JobRunner::discardLeft() {
+    std::error_code unreadable;
+    for (fs::directory_entry const& entry : fs::directory_iterator(surroundings_.outbox, unreadable))
+        if (std::optional<Job> const job = jobs_.find(entry.path().stem().string());
+            job && hasLeftOutbox(*job) && entry.path().filename() == job->containerName())
+            discard(*job);
+}
+
 /// What could not be removed is tried again; the first time, with all that an earlier process left.
 void JobRunner::sweepOutbox() {
-    std::error_code unreadable;
     if (!std::exchange(isSwept_, true))
-        for (fs::directory_entry const& entry : fs::directory_iterator(surroundings_.outbox, unreadable))
-            if (std::optional<Job> const job = jobs_.find(entry.path().stem().string());
-                job && hasLeftOutbox(*job) && entry.path().filename() == job->containerName())
-                discard(*job);
+        discardLeft();
     for (fs::path const& container : std::set<fs::path>(leftInOutbox_))
         removeFromOutbox(container);
 }
@@ -464,7 +592,7 @@ void JobRunner::noteProblem(std::string const& packId, std::string const& proble
     if (jobs_.find(packId).value().problem == problem)
         return;
     Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot go on: " << problem;
-    jobs_.setProblem(packId, problem);
+    jobs_.setProblem(held(packId), problem);
 }
 
 void JobRunner::inBackground(std::string const& packId, std::function<void()> work,
@@ -474,8 +602,12 @@ void JobRunner::inBackground(std::string const& packId, std::function<void()> wo
         busy_.erase(packId);
         try {
             then(outcome);
+            if (!busy_.contains(packId))
+                letGo(packId);
+            takeUp();
         } catch (std::exception const& failure) {
-            // The record did not change, so the step is made again with the next resume().
+            // The record did not change, so the step is made again by whoever takes it up next.
+            held_.erase(packId);
             Log::Lock(3).logStreamLine() << "Pack " << packId << " cannot be recorded. " << failure.what();
         }
     };

@@ -13,6 +13,7 @@
 
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <memory>
 #include <set>
 #include <string>
@@ -75,6 +76,12 @@ public:
 
     /// Takes up every job that can go on: at the start, and when jobs are no longer held back.
     void resume();
+    /// Takes up those whose time has come and that nobody works on, a few at a time.
+    void takeUp();
+    /// Holds on what is being worked on; to be called a few times in the time of the store's holder.
+    void keepHold();
+    /// Removes what nobody publishes any more from the upload folder, and from the outbox what has left it.
+    void sweep();
     /// Takes up what is held and due by now, a few jobs at a time.
     void releaseDue();
     /// Puts a pack on record as a job, once for each pack id: a further call for the same pack changes
@@ -90,6 +97,9 @@ public:
                 Policy::Grant const& by = Policy::Grant::ofService());
     /// Brings the states of these jobs up to date with the upload folder, and tries again what failed before.
     void updateStatus(std::string const& folder, std::string const& database);
+    /// Work that makes the container of a job where it is not in this outbox: another machine may have made
+    /// it.
+    std::function<void()> makingContainer(std::string const& packId) const;
     /// Told that the letters of a job that go by carriers were all taken on.
     void onLettersTaken(std::string const& packId);
     /// Holds a job, lets it go on, has it handed on, or calls it back. What is so already stays so. Throws
@@ -104,6 +114,16 @@ private:
     };
 
     void proceed(Job const& job);
+    /// Of a job that is held.
+    void goOn(Job const& job);
+    void letGo(std::string const& packId);
+    JobKey held(std::string const& packId) const;
+    std::function<void()> packing(Job const& job) const;
+    /// The same where it is not in this outbox: another machine may have made it.
+    std::function<void()> makingContainer(Job const& job) const;
+    /// The same for the container that goes to the upload folder.
+    std::function<void()> makingRest(Job const& job) const;
+    bool isStagedOfUse(std::string const& name, long long fence) const;
     void startPacking(Job const& job);
     void startHandingOver(Job const& job);
     void startDividing(Job const& job);
@@ -124,6 +144,7 @@ private:
     std::filesystem::path containerToStage(Job const& job) const;
     void clearOutbox(Job const& job);
     void removeFromOutbox(std::filesystem::path const& container);
+    void discardLeft();
     void sweepOutbox();
     /// Runs `work` on the worker and hands its outcome to `then` on the own thread.
     void inBackground(std::string const& packId, std::function<void()> work,
@@ -134,6 +155,9 @@ private:
     JobSurroundings surroundings_;
     /// Pack ids that the worker is busy with, or will be.
     std::set<std::string> busy_;
+    /// The fences of jobs that are held.
+    std::map<std::string, long long> held_;
+    bool isTakingUp_ = false;
     /// Containers that were handed on and are still in the outbox.
     std::set<std::filesystem::path> leftInOutbox_;
     bool isSwept_ = false;

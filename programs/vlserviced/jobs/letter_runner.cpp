@@ -22,6 +22,8 @@ constexpr long long SECONDS_BETWEEN_QUESTIONS = 15;
 /// Containers that are kept open.
 constexpr std::size_t MAX_SOURCES = 4;
 
+constexpr char const* ENDED_MEANWHILE = "the service was ended while it was handed over";
+
 bool isFailing(CarrierRecord const& record) { return record.failures >= MANY_FAILURES; }
 
 std::string lettersInWords(long long count) {
@@ -97,11 +99,33 @@ LetterRunner::Channel& LetterRunner::channelOf(std::string const& name,
 }
 
 void LetterRunner::resume() {
-    letters_.doubt("the service was ended while it was handed over", surroundings_.now());
+    if (!letters_.isShared())
+        letters_.doubt(ENDED_MEANWHILE, surroundings_.now());
     for (std::string const& packId : jobs_.delivering())
         unsettled_.insert(packId);
     recallAskable();
     proceed();
+}
+
+/// One service has a channel at a time, so that its pace is that of one.
+bool LetterRunner::hold(std::string const& name) {
+    if (held_.contains(name))
+        return true;
+    if (!letters_.holdChannel(name, ENDED_MEANWHILE, surroundings_.now()))
+        return false;
+    held_.insert(name);
+    for (std::string const& packId : jobs_.delivering())
+        unsettled_.insert(packId);
+    return true;
+}
+
+void LetterRunner::keepHold() {
+    for (std::string const& name : std::exchange(held_, {})) {
+        auto const channel = channels_.find(name);
+        bool const isInUse = channel != channels_.end() && channel->second.busy > 0;
+        if (isInUse || firstToGo(name, channels_[name], std::numeric_limits<long long>::max()))
+            hold(name);
+    }
 }
 
 void LetterRunner::proceed() {
@@ -127,7 +151,7 @@ void LetterRunner::proceed(std::string const& name, Channel& channel) {
     std::size_t const most = isFailing(record) ? 1 : static_cast<std::size_t>(channel.settings.atOnce);
     while (!record.isPaused && channel.busy < most && freeAt(name, channel) <= surroundings_.now()) {
         std::vector<StoredLetter> letters = next(name, channel);
-        if (letters.empty())
+        if (letters.empty() || !hold(name))
             return;
         start(name, channel, std::move(letters));
     }
@@ -195,6 +219,7 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     handOver->settings = channel.settings;
     handOver->key = keyOf(letters.front(), name, channel.settings);
     handOver->source = sourceOf(letters.front().id.packId);
+    handOver->makeContainer = surroundings_.container(letters.front().id.packId);
     handOver->letters = std::move(letters);
     handOver->carrier = idleOrNew(channel);
     for (StoredLetter const& letter : handOver->letters)
@@ -203,27 +228,34 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     channel.rate.add(surroundings_.now());
     surroundings_.onCarrier(
         name, static_cast<std::size_t>(channel.settings.atOnce),
-        [this, handOver, onOwnThread = surroundings_.onOwnThread,
+        [this, handOver, isShared = letters_.isShared(), onOwnThread = surroundings_.onOwnThread,
          doneOnOwnThread = surroundings_.doneOnOwnThread] {
             // Whoever finds them so on record cannot know whether the other side has them.
-            carryOut(*handOver, [&] {
+            carryOut(*handOver, isShared, [&] {
                 doneOnOwnThread([&] { letters_.beginHandingOver(handOver->ids(), surroundings_.now()); });
             });
             onOwnThread([this, handOver] { onDone(handOver); });
         });
 }
 
-void LetterRunner::carryOut(HandOver& handOver, Carriers::PutOnRecord const& mayHaveThem) {
+/// Where other services may hand over the same letters, whatever the carrier does comes behind the record.
+void LetterRunner::carryOut(HandOver& handOver, bool isShared, Carriers::PutOnRecord const& mayHaveThem) {
     handOver.isCarriersFault = false;
     try {
+        handOver.are = isShared ? LettersAre::Waiting : LettersAre::Anywhere;
+        handOver.makeContainer();
         MadeParcel const made =
             handOver.source->parcelOf(handOver.letters, handOver.key,
                                       handOver.settings.sendsFiles() ? LetterSource::Attachments::Apart
                                                                      : LetterSource::Attachments::Printed);
         handOver.setBad(made.bad);
+        if (isShared) {
+            mayHaveThem();
+            handOver.are = LettersAre::HandedOver;
+        }
         handOver.isCarriersFault = true;
         if (!made.parcel.letters.empty())
-            handOver.outcome = handOver.carrier->handOver(made.parcel, mayHaveThem);
+            handOver.outcome = handOver.carrier->handOver(made.parcel, isShared ? [] {} : mayHaveThem);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const& failure) {
@@ -263,14 +295,16 @@ void LetterRunner::settle(std::shared_ptr<HandOver> const& handOver) {
 
 void LetterRunner::recordOutcome(HandOver const& handOver) {
     for (BadLetter const& bad : handOver.bad)
-        letters_.finish({bad.id}, LetterState::Failed, Base::oneLine(bad.why), surroundings_.now());
+        letters_.finish({bad.id}, LetterState::Failed, Base::oneLine(bad.why), surroundings_.now(),
+                        letters_.isShared() ? LettersAre::Waiting : LettersAre::Anywhere);
     if (handOver.letters.empty())
         return;
     noteCarrier(handOver);
     Outcome const& outcome = handOver.outcome;
     if (outcome.kind == Outcome::Kind::Failed)
         return postpone(handOver);
-    letters_.finish(handOver.ids(), stateBehind(outcome.kind), outcome.says, surroundings_.now());
+    letters_.finish(handOver.ids(), stateBehind(outcome.kind), outcome.says, surroundings_.now(),
+                    handOver.are);
     if (!handOver.settings.canBeAsked() || outcome.kind == Outcome::Kind::Refused)
         return;
     Channel& channel = channels_.at(handOver.channel);
@@ -287,10 +321,10 @@ void LetterRunner::postpone(HandOver const& handOver) {
             letters_.finish({letter.id}, LetterState::Failed,
                             Base::oneLine("given up after " + std::to_string(handOver.settings.giveUpHours) +
                                           " hours: " + says),
-                            now);
+                            now, handOver.are);
         else
             letters_.postpone({letter.id}, says, now + pauseBehind(letter.attempts + 1, handOver.settings),
-                              now);
+                              now, handOver.are);
     }
     StoredLetter const& first = handOver.letters.front();
     if (handOver.settings.keepsOrder())
@@ -395,8 +429,8 @@ void LetterRunner::noteCarrier(HandOver const& handOver) {
     letters_.setCarrier(handOver.channel, record);
 }
 
-void LetterRunner::record(std::string const& packId, std::vector<DividedLetter> const& letters) {
-    letters_.divide(packId, letters, surroundings_.now());
+void LetterRunner::record(JobKey const& job, std::vector<DividedLetter> const& letters) {
+    letters_.divide(job, letters, surroundings_.now());
     proceed();
 }
 

@@ -49,6 +49,9 @@ struct LetterSurroundings {
     std::function<void(Work const&)> doneOnOwnThread = [](Work const& work) { work(); };
     /// Where is noted what people decide.
     Recorder recorder = {};
+    /// Work, away from the own thread, that has a mailing's container in the outbox: another machine may have
+    /// made it.
+    std::function<Work(std::string const& packId)> container = [](std::string const&) { return [] {}; };
 };
 
 /// Used by one thread; the work it hands to carriers touches nothing of it.
@@ -63,11 +66,13 @@ public:
     void resume();
     /// Hands over what may be handed over by now.
     void proceed();
+    /// Holds the channels on that it has; to be called a few times in the time of the jobs' holder.
+    void keepHold();
     /// When something could be handed over that cannot by now; nothing when nothing waits for the clock.
     std::optional<long long> nextTime();
 
     /// Puts the letters of a queued job on record.
-    void record(std::string const& packId, std::vector<DividedLetter> const& letters);
+    void record(JobKey const& job, std::vector<DividedLetter> const& letters);
 
     /// Throws Error when the letter is not one that this can be decided of.
     void decide(Protocol::LetterChange const& change);
@@ -105,10 +110,13 @@ private:
         std::vector<StoredLetter> letters;
         Protocol::CarrierSettings settings;
         CarrierPtr carrier;
+        LetterSurroundings::Work makeContainer;
         std::shared_ptr<LetterSource> source;
         std::string key;
         std::vector<BadLetter> bad;
         Carriers::Outcome outcome;
+        /// Where its letters are, as far as others may change that.
+        LettersAre are = LettersAre::Anywhere;
         /// Whether it was the carrier that failed, where the outcome says so.
         bool isCarriersFault = true;
 
@@ -117,6 +125,7 @@ private:
         void setBad(std::vector<BadLetter> const& found);
     };
 
+    bool hold(std::string const& name);
     Channel& channelOf(std::string const& name, Protocol::CarrierSettings const& settings);
     void proceedAll();
     void proceed(std::string const& name, Channel& channel);
@@ -127,7 +136,7 @@ private:
                                           long long by) const;
     std::vector<StoredLetter> next(std::string const& name, Channel const& channel) const;
     void start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters);
-    static void carryOut(HandOver& handOver, Carriers::PutOnRecord const& mayHaveThem);
+    static void carryOut(HandOver& handOver, bool isShared, Carriers::PutOnRecord const& mayHaveThem);
     CarrierPtr idleOrNew(Channel& channel) const;
     void onDone(std::shared_ptr<HandOver> const& handOver);
     /// What cannot be put on record is kept and tried again.
@@ -157,6 +166,8 @@ private:
     JobStore& jobs_;
     LetterSurroundings surroundings_;
     std::map<std::string, Channel> channels_;
+    /// Those that this service has.
+    std::set<std::string> held_;
     /// Of mailings that letters were taken from last, the latest first.
     std::list<std::shared_ptr<LetterSource>> sources_;
     /// Jobs whose state may have to follow from their letters'.

@@ -199,7 +199,7 @@ private:
     void drop(std::string const& packId) {
         incoming_.erase(packId);
         dropped_.insert(packId);
-        std::string const failure = failureOf([&] { store_->eraseSome(packId); });
+        std::string const failure = failureOf([&] { store_->refuse(packId); });
         if (!failure.empty())
             Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot be erased yet. " << failure;
     }
@@ -307,7 +307,7 @@ void PackReception::complete(std::string const& packId,
 
 void PackReception::onJobChanged(std::string const& packId) {
     std::optional<Job> const job = jobs_.find(packId);
-    if (job && job->pack.isWithService() && isDoneWithPages(job->state))
+    if (job && job->pack.isWithService() && isDoneWithPages(*job))
         erase(packId);
 }
 
@@ -348,7 +348,7 @@ void PackReception::sweep() {
 
 bool PackReception::isOfUse(KeptPack const& pack) const {
     if (std::optional<Job> const job = jobs_.find(pack.head.info.id))
-        return !isDoneWithPages(job->state);
+        return !isDoneWithPages(*job);
     return pack.touchedAt > surroundings_.now() - UNFINISHED_SECONDS;
 }
 

@@ -296,40 +296,63 @@ void SettingsService::removeUnusedPresets() {
             store_.setPart(node, part, left);
 }
 
-ServiceSettings SettingsService::service() const { return ServiceSettings(store_.serviceSettings()); }
+ServiceSettings SettingsService::service() const {
+    if (!service_)
+        service_.emplace(store_.serviceSettings());
+    return *service_;
+}
+
+void SettingsService::forgetRead() const {
+    rules_.clear();
+    service_.reset();
+}
+
+void SettingsService::changeStored(char const* what,
+                                   std::function<ServiceSettings(ServiceSettings const&)> const& change) {
+    service_.reset();
+    recorder_.together([&] {
+        store_.changeServiceSettings([&](json::Object const& stored) {
+            ServiceSettings const former(stored);
+            ServiceSettings const changed = change(former);
+            if (what)
+                recorder_.note({}, what, former.told(), changed.told());
+            return changed.stored();
+        });
+    });
+}
 
 void SettingsService::changeService(json::Object const& changes) {
     requireChangeable();
-    ServiceSettings changed = service().withChanges(changes);
-    if (changes.get(Protocol::ServiceSettings::UPLOAD_FOLDER))
-        changed = changed.withFolderIdentity(identityOf(changed.uploadFolder()));
-    if (changes.get(Protocol::ServiceSettings::CARRIERS))
-        changed = changed.withCarrierFolders(carrierFolders(changed.carriers(), service().carriers()));
-    changeStored("service settings", changed);
-}
-
-void SettingsService::changeStored(char const* what, ServiceSettings const& changed) {
-    recorder_.together([&] {
-        recorder_.note({}, what, service().told(), changed.told());
-        store_.setServiceSettings(changed.stored());
+    changeStored("service settings", [&](ServiceSettings const& former) {
+        ServiceSettings changed = former.withChanges(changes);
+        if (changes.get(Protocol::ServiceSettings::UPLOAD_FOLDER))
+            changed = changed.withFolderIdentity(identityOf(changed.uploadFolder()));
+        if (changes.get(Protocol::ServiceSettings::CARRIERS))
+            changed = changed.withCarrierFolders(carrierFolders(changed.carriers(), former.carriers()));
+        return changed;
     });
 }
 
 void SettingsService::recogniseUploadFolder() {
     ServiceSettings const settings = service();
     if (!settings.uploadFolder().empty() && settings.uploadFolderIdentity().empty())
-        store_.setServiceSettings(settings.withFolderIdentity(identityOf(settings.uploadFolder())).stored());
+        changeStored(nullptr, [](ServiceSettings const& former) {
+            return former.withFolderIdentity(identityOf(former.uploadFolder()));
+        });
 }
 
 void SettingsService::recogniseCarrierFolders() {
-    ServiceSettings const settings = service();
-    Protocol::Carriers const carriers = settings.carriers();
-    ServiceSettings const known = settings.withCarrierFolders(carrierFolders(carriers, carriers));
-    if (known.carriers() != carriers)
-        store_.setServiceSettings(known.stored());
+    Protocol::Carriers const carriers = service().carriers();
+    if (service().withCarrierFolders(carrierFolders(carriers, carriers)).carriers() != carriers)
+        changeStored(nullptr, [](ServiceSettings const& former) {
+            return former.withCarrierFolders(carrierFolders(former.carriers(), former.carriers()));
+        });
 }
 
-void SettingsService::suspend(int bits) { changeStored("what is held back", service().withSuspended(bits)); }
+void SettingsService::suspend(int bits) {
+    changeStored("what is held back",
+                 [bits](ServiceSettings const& former) { return former.withSuspended(bits); });
+}
 
 bool SettingsService::holdsChangesBack() const { return service().isSuspended(Suspended::SettingsChanges); }
 

@@ -9,6 +9,7 @@
 
 #include <functional>
 #include <map>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -65,7 +66,10 @@ public:
     /// Throws Error while changes are held back.
     void requireChangeable() const;
 
+    /// As they were when they were read last; somebody has to tell when others change them.
     ServiceSettings service() const;
+    /// Has all settings read anew: another service may have changed them.
+    void forgetRead() const;
     /// The folders of uploads and carriers get marks, and their identities go on record with them. A
     /// carrier's folder that was set before stays the one that it was.
     void changeService(json::Object const& changes);
@@ -81,13 +85,16 @@ public:
 
 private:
     void noteNode(std::string const& id, bool wasKnown) const;
-    void changeStored(char const* what, ServiceSettings const& changed);
     bool holdsChangesBack() const;
+    /// Changes the service's settings as they are on record, whoever else changes them. `what` is for the
+    /// record of what people change; null where nobody has.
+    void changeStored(char const* what, std::function<ServiceSettings(ServiceSettings const&)> const& change);
 
     SettingsStore& store_;
     Clock clock_;
     Recorder recorder_;
     mutable std::map<std::string, Policy::Rules> rules_;
+    mutable std::optional<ServiceSettings> service_;
 };
 
 } // namespace VlServiced

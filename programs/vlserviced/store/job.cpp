@@ -2,7 +2,15 @@
 
 namespace VlServiced {
 
-bool isDoneWithPages(JobState state) { return hasEnded(state) || state == JobState::Submitted; }
+bool isDoneWithPages(Job const& job) {
+    bool const isDelivering = job.lettersState == JobState::Delivering;
+    return !isDelivering && (hasEnded(job.state) || job.state == JobState::Submitted);
+}
+
+bool isToWorkOn(Job const& job) {
+    return job.state == JobState::Accepted || job.state == JobState::Submitting ||
+           (job.state == JobState::Queued && job.toUpload);
+}
 
 bool hasEnded(JobState state) {
     switch (state) {

@@ -46,6 +46,10 @@ struct Job {
     std::string uploadFolder;
     /// Which of all folders of that name it is, as FolderIdentity tells it.
     std::string uploadFolderIdentity;
+    /// Grows each time that somebody takes hold of it.
+    long long fence = 0;
+    /// The fence under which its container was staged that is handed over.
+    long long submitFence = 0;
     /// Whether its letters were divided among the channels.
     bool isDivided = false;
     /// Where some of its letters go by carriers and others in a container: how far the former are.
@@ -59,10 +63,12 @@ struct Job {
     std::string containerName() const { return pack.packId + ".mailing"; }
 };
 
-/// Whether the pages of a job in that state are of no use any more: its container was handed over, or never
-/// will be.
-bool isDoneWithPages(JobState state);
+/// Whether the pages of a job are of no use any more: its container and its letters were handed over, or
+/// never will be.
+bool isDoneWithPages(Job const& job);
 /// Whether nothing more will happen to a job in that state.
 bool hasEnded(JobState state);
+/// Whether the service itself goes on with it when somebody takes hold of it.
+bool isToWorkOn(Job const& job);
 
 } // namespace VlServiced

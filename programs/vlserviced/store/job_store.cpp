@@ -15,10 +15,14 @@ namespace {
 using Protocol::stateName;
 using Protocol::stateNamed;
 
-constexpr char const* SELECT_JOBS =
-    "SELECT pack, db_folder, db_name, cfg_id, title, documents, pages, state, "
-    "problem, to_upload, upload_folder, accepted_at, changed_at, upload_identity, due, to_hold, trial, "
-    "divided, letters_state, letters_problem FROM jobs ";
+constexpr char const* JOB_COLUMNS =
+    "pack, db_folder, db_name, cfg_id, title, documents, pages, state, problem, to_upload, upload_folder, "
+    "accepted_at, changed_at, upload_identity, due, to_hold, trial, divided, letters_state, letters_problem, "
+    "fence, submit_fence ";
+std::string const SELECT_JOBS = std::string("SELECT ") + JOB_COLUMNS + "FROM jobs ";
+/// As isToWorkOn() has it, and the index that holds those alone.
+constexpr char const* TO_WORK_ON =
+    "(state IN ('accepted', 'submitting') OR (state = 'queued' AND to_upload = 1)) ";
 
 /// The states of which there are few: the others are where jobs rest, or end.
 constexpr JobState UNDER_WAY[] = {JobState::Accepted, JobState::Queued, JobState::Submitting,
@@ -47,6 +51,8 @@ Job jobIn(Database::Rows const& row) {
     if (std::string const state = row.text(18); !state.empty())
         job.lettersState = stateNamed(state);
     job.lettersProblem = row.text(19);
+    job.fence = row.number(20);
+    job.submitFence = row.number(21);
     return job;
 }
 
@@ -101,16 +107,17 @@ std::string patternOfEnd(std::string const& node) {
 
 } // namespace
 
-JobStore::JobStore(Database::Connection& database) : database_(database) {}
+JobStore::JobStore(Database::Connection& database, Holder holder)
+    : database_(database), holder_(std::move(holder)) {}
 
 std::optional<Job> JobStore::find(std::string const& packId) const {
-    Database::Rows rows = database_.query(std::string(SELECT_JOBS) + "WHERE pack = $1", packId);
+    Database::Rows rows = database_.query(SELECT_JOBS + "WHERE pack = $1", packId);
     return rows.next() ? std::optional(jobIn(rows)) : std::nullopt;
 }
 
 std::vector<Job> JobStore::inState(JobState state) const {
-    return jobsIn(database_.query(std::string(SELECT_JOBS) + "WHERE state = $1 ORDER BY accepted_at, pack",
-                                  stateName(state)));
+    return jobsIn(
+        database_.query(SELECT_JOBS + "WHERE state = $1 ORDER BY accepted_at, pack", stateName(state)));
 }
 
 std::vector<Job> JobStore::matching(JobFilter const& filter, std::size_t limit) const {
@@ -162,28 +169,76 @@ std::optional<long long> JobStore::nextDue() const {
 
 bool JobStore::accept(Job const& job) {
     return database_.change("INSERT INTO jobs (pack, db_folder, db_name, cfg_id, title, documents, pages, "
-                            "state, accepted_at, changed_at, to_upload, due, to_hold, trial) "
-                            "VALUES ($1, $2, $3, $4, $5, $6, $7, $8, $9, $9, $10, $11, $12, $13) "
+                            "state, accepted_at, changed_at, to_upload, due, to_hold, trial, try_at) "
+                            "VALUES ($1, $2, $3, $4, $5, $6, $7, $8, $9, $9, $10, $11, $12, $13, clock_ms()) "
                             "ON CONFLICT DO NOTHING",
                             job.pack.packId, job.pack.folder, job.pack.database, job.cfgId, job.title,
                             job.documents, job.pages, stateName(JobState::Accepted), job.acceptedAt,
-                            job.toUpload, job.due == 0 ? Database::Value(nullptr) : Database::Value(job.due),
-                            job.toHold, job.isTrial) == 1;
+                            job.toUpload, job.due == 0 ? std::nullopt : std::optional(job.due), job.toHold,
+                            job.isTrial) == 1;
 }
 
-bool JobStore::advance(std::string const& packId, JobState from, JobState to, long long now) {
-    return told(packId, database_.change("UPDATE jobs SET state = $1, problem = '', changed_at = $2 "
-                                         "WHERE pack = $3 AND state = $4",
-                                         stateName(to), now, packId, stateName(from)));
+std::vector<Job> JobStore::claim(std::size_t most) {
+    std::vector<Job> jobs = jobsIn(
+        database_.query("UPDATE jobs SET holder = $1, fence = fence + 1, try_at = clock_ms() + $2 "
+                        "WHERE pack IN (SELECT pack FROM jobs " +
+                            database_.by("jobs_to_claim") + "WHERE " + TO_WORK_ON +
+                            "AND try_at <= clock_ms() ORDER BY try_at, pack LIMIT " + std::to_string(most) +
+                            database_.skipLocked() + ") RETURNING " + JOB_COLUMNS,
+                        holder_.name, holder_.seconds * 1000));
+    std::ranges::sort(jobs, {}, [](Job const& job) { return std::pair(job.acceptedAt, job.pack.packId); });
+    return jobs;
 }
 
-bool JobStore::beginSubmitting(std::string const& packId, std::string const& uploadFolder,
+std::optional<Job> JobStore::claim(std::string const& packId) {
+    std::vector<Job> jobs =
+        jobsIn(database_.query(std::string("UPDATE jobs SET holder = $1, fence = fence + 1, "
+                                           "try_at = clock_ms() + $2 WHERE pack = $3 AND "
+                                           "(holder = '' OR try_at <= clock_ms()) AND ") +
+                                   TO_WORK_ON + "RETURNING " + JOB_COLUMNS,
+                               holder_.name, holder_.seconds * 1000, packId));
+    return jobs.empty() ? std::nullopt : std::optional(std::move(jobs.front()));
+}
+
+void JobStore::keep(std::vector<std::string> const& packIds) {
+    if (!packIds.empty())
+        database_.change("UPDATE jobs SET try_at = clock_ms() + $1 WHERE holder = $2 AND pack IN " +
+                             database_.elementsOf("$3"),
+                         holder_.seconds * 1000, holder_.name, textOf(packIds));
+}
+
+void JobStore::letGo(JobKey const& job, long long seconds) {
+    database_.change("UPDATE jobs SET holder = '', try_at = clock_ms() + $1 WHERE pack = $2 AND "
+                     "holder = $3 AND fence = coalesce(CAST($4 AS BIGINT), fence)",
+                     seconds * 1000, job.packId, holder_.name, job.fence);
+}
+
+void JobStore::hurry() {
+    database_.change(
+        std::string("UPDATE jobs SET try_at = 0 WHERE holder = '' AND try_at > clock_ms() AND ") +
+        TO_WORK_ON);
+}
+
+void JobStore::freeOwn() {
+    if (!isShared())
+        database_.change("UPDATE jobs SET holder = '', try_at = 0 WHERE holder = $1", holder_.name);
+}
+
+bool JobStore::advance(JobKey const& job, JobState from, JobState to, long long now) {
+    return told(job.packId,
+                database_.change("UPDATE jobs SET state = $1, problem = '', changed_at = $2 WHERE pack = $3 "
+                                 "AND state = $4 AND fence = coalesce(CAST($5 AS BIGINT), fence)",
+                                 stateName(to), now, job.packId, stateName(from), job.fence));
+}
+
+bool JobStore::beginSubmitting(JobKey const& job, std::string const& uploadFolder,
                                std::string const& identity, long long now) {
-    return told(packId, database_.change("UPDATE jobs SET state = $1, problem = '', upload_folder = $2, "
-                                         "upload_identity = $3, changed_at = $4 "
-                                         "WHERE pack = $5 AND state = $6",
-                                         stateName(JobState::Submitting), uploadFolder, identity, now, packId,
-                                         stateName(JobState::Queued)));
+    return told(job.packId,
+                database_.change("UPDATE jobs SET state = $1, problem = '', upload_folder = $2, "
+                                 "upload_identity = $3, changed_at = $4, submit_fence = fence WHERE "
+                                 "pack = $5 AND state = $6 AND fence = coalesce(CAST($7 AS BIGINT), fence)",
+                                 stateName(JobState::Submitting), uploadFolder, identity, now, job.packId,
+                                 stateName(JobState::Queued), job.fence));
 }
 
 bool JobStore::changeAtRest(std::string const& assignments, std::string const& packId, long long now) {
@@ -217,20 +272,22 @@ bool JobStore::wantUpload(std::string const& packId) {
                             packId) == 1;
 }
 
-void JobStore::fail(std::string const& packId, std::string const& reason, long long now) {
-    told(packId, database_.change("UPDATE jobs SET state = $1, problem = $2, changed_at = $3 WHERE pack = $4",
-                                  stateName(JobState::Failed), reason, now, packId));
+void JobStore::fail(JobKey const& job, std::string const& reason, long long now) {
+    told(job.packId, database_.change("UPDATE jobs SET state = $1, problem = $2, changed_at = $3 "
+                                      "WHERE pack = $4 AND fence = coalesce(CAST($5 AS BIGINT), fence)",
+                                      stateName(JobState::Failed), reason, now, job.packId, job.fence));
 }
 
-bool JobStore::divide(std::string const& packId, LettersByCarriers byCarriers, long long now) {
+bool JobStore::divide(JobKey const& job, LettersByCarriers byCarriers, long long now) {
     JobState const state = byCarriers == LettersByCarriers::All ? JobState::Delivering : JobState::Queued;
-    return told(packId,
+    return told(job.packId,
                 database_.change("UPDATE jobs SET problem = '', divided = 1, state = $1, letters_state = $2, "
                                  "changed_at = CASE WHEN state = $1 THEN changed_at ELSE $3 END "
-                                 "WHERE pack = $4 AND state = $5 AND divided = 0",
+                                 "WHERE pack = $4 AND state = $5 AND divided = 0 AND "
+                                 "fence = coalesce(CAST($6 AS BIGINT), fence)",
                                  stateName(state),
                                  byCarriers == LettersByCarriers::Some ? stateName(JobState::Delivering) : "",
-                                 now, packId, stateName(JobState::Queued)));
+                                 now, job.packId, stateName(JobState::Queued), job.fence));
 }
 
 void JobStore::setLettersState(std::string const& packId, JobState state, std::string const& problem,
@@ -254,8 +311,10 @@ std::vector<std::string> JobStore::delivering() const {
     return packIds;
 }
 
-void JobStore::setProblem(std::string const& packId, std::string const& problem) {
-    told(packId, database_.change("UPDATE jobs SET problem = $1 WHERE pack = $2", problem, packId));
+void JobStore::setProblem(JobKey const& job, std::string const& problem) {
+    told(job.packId, database_.change("UPDATE jobs SET problem = $1 WHERE pack = $2 AND "
+                                      "fence = coalesce(CAST($3 AS BIGINT), fence)",
+                                      problem, job.packId, job.fence));
 }
 
 void JobStore::wantUpload(std::string const& folder, std::string const& database) {
@@ -275,7 +334,7 @@ std::vector<Job> JobStore::endedBefore(long long time, std::size_t limit) const 
         if (!hasEnded(state) || ended.size() >= limit)
             continue;
         std::vector<Job> jobs =
-            jobsIn(database_.query(std::string(SELECT_JOBS) +
+            jobsIn(database_.query(SELECT_JOBS +
                                        "WHERE state = $1 AND accepted_at < $2 AND changed_at < $2 "
                                        "AND letters_state <> 'delivering' ORDER BY accepted_at, pack LIMIT " +
                                        std::to_string(limit - ended.size()),

@@ -24,11 +24,28 @@ struct JobFilter {
     std::string node = {};
 };
 
-/// Every change is one transaction and on the disk when the operation returns.
+/// A job that is to be changed; with a fence, only while nobody has taken hold of it since.
+struct JobKey {
+    JobKey(std::string id, std::optional<long long> itsFence = {}) : packId(std::move(id)), fence(itsFence) {}
+    JobKey(char const* id) : packId(id) {}
+
+    std::string packId;
+    std::optional<long long> fence;
+};
+
+/// Under which name a store takes hold of jobs and channels, and for how long.
+struct Holder {
+    /// Another one for each process that shares a database.
+    std::string name = "this service";
+    long long seconds = 60;
+};
+
+/// Every change is one transaction and on the disk when the operation returns. Several processes may share
+/// the database; whoever works on a job takes hold of it for a time, by the database's clock.
 class JobStore {
 public:
     /// The database has to outlive the store.
-    explicit JobStore(Database::Connection& database);
+    explicit JobStore(Database::Connection& database, Holder holder = {});
 
     std::optional<Job> find(std::string const& packId) const;
     /// In the order of their acceptance.
@@ -51,13 +68,29 @@ public:
 
     /// Records a new job as accepted. False when there is one of that pack id already: it stays as it is.
     bool accept(Job const& job);
+    /// Takes hold of jobs that are to be worked on and that nobody holds, in the order of their time, at most
+    /// so many.
+    std::vector<Job> claim(std::size_t most);
+    /// The same of one job, whenever it was to be tried again.
+    std::optional<Job> claim(std::string const& packId);
+    /// Holds those on that are held still.
+    void keep(std::vector<std::string> const& packIds);
+    /// Lets go of a job, which nobody tries before so many seconds are over.
+    void letGo(JobKey const& job, long long seconds);
+    /// Has all that nobody holds tried at once.
+    void hurry();
+    /// What an earlier process of the same name was holding is free. Nothing where several may be at work.
+    void freeOwn();
+    Holder const& holder() const { return holder_; }
+    bool isShared() const { return !database_.isSqlite(); }
+
     /// Moves a job on and clears its problem. The container's way is irreversible, so `from` has to be the
     /// job's state; false, and no change, when it is not.
-    bool advance(std::string const& packId, JobState from, JobState to, long long now);
+    bool advance(JobKey const& job, JobState from, JobState to, long long now);
     /// Moves a queued job on to Submitting, into that very folder; false, and no change, when it is not
-    /// queued.
-    bool beginSubmitting(std::string const& packId, std::string const& uploadFolder,
-                         std::string const& identity, long long now);
+    /// queued. Its container is staged under the job's fence.
+    bool beginSubmitting(JobKey const& job, std::string const& uploadFolder, std::string const& identity,
+                         long long now);
     /// Has a job held until it is released, also one that is not queued yet. False, and no change, once it is
     /// on its way.
     bool hold(std::string const& packId, long long now);
@@ -67,7 +100,7 @@ public:
     bool cancel(std::string const& packId, long long now);
     /// Notes that a queued job's letters were divided: `byCarriers` of them go by carriers, the others in the
     /// container. False, and no change, when the job is not queued or was divided before.
-    bool divide(std::string const& packId, LettersByCarriers byCarriers, long long now);
+    bool divide(JobKey const& job, LettersByCarriers byCarriers, long long now);
     /// Notes how far the letters of a divided job are that go by carriers; the job's state is theirs when
     /// none is in the container.
     void setLettersState(std::string const& packId, JobState state, std::string const& problem,
@@ -77,9 +110,9 @@ public:
     /// Has a job handed on that is not yet; false, and no change, once it is on its way.
     bool wantUpload(std::string const& packId);
     /// Gives a job up for the reason told.
-    void fail(std::string const& packId, std::string const& reason, long long now);
+    void fail(JobKey const& job, std::string const& reason, long long now);
     /// Notes what keeps a job where it is.
-    void setProblem(std::string const& packId, std::string const& problem);
+    void setProblem(JobKey const& job, std::string const& problem);
     /// Marks the jobs of a pack database that are not handed on yet as to be handed on; empty texts are no
     /// restriction.
     void wantUpload(std::string const& folder, std::string const& database);
@@ -103,6 +136,7 @@ private:
     bool told(std::string const& packId, long long changedRows);
 
     Database::Connection& database_;
+    Holder holder_;
     std::function<void(std::string const&)> tell_;
     /// While steps are carried out together: of what is to be told behind them.
     std::optional<std::vector<std::string>> untold_;

@@ -1,5 +1,7 @@
 #include "programs/vlserviced/store/letter_store.h"
 
+#include "programs/base/error.h"
+
 #include <charconv>
 #include <system_error>
 
@@ -40,6 +42,18 @@ std::optional<StoredLetter> firstLetterIn(Database::Rows rows) {
     return rows.next() ? std::optional(letterIn(rows)) : std::nullopt;
 }
 
+std::string conditionOf(LettersAre are) {
+    switch (are) {
+    case LettersAre::Waiting:
+        return " AND state = 'waiting'";
+    case LettersAre::HandedOver:
+        return " AND state IN ('handed over', 'uncertain')";
+    case LettersAre::Anywhere:
+        break;
+    }
+    return "";
+}
+
 LettersByCarriers shareOf(std::vector<DividedLetter> const& letters) {
     std::size_t byCarrier = 0;
     for (DividedLetter const& letter : letters)
@@ -62,15 +76,14 @@ std::optional<LetterId> LetterId::ofKey(std::string_view key) {
     return isKey ? std::optional(letter) : std::nullopt;
 }
 
-bool LetterStore::divide(std::string const& packId, std::vector<DividedLetter> const& letters,
-                         long long now) {
+bool LetterStore::divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now) {
     Database::Transaction transaction(database_);
-    if (!jobs_.divide(packId, shareOf(letters), now))
+    if (!jobs_.divide(job, shareOf(letters), now))
         return false;
     for (DividedLetter const& letter : letters)
         database_.change("INSERT INTO letters (pack, number, channel, by_carrier, state, changed_at) "
                          "VALUES ($1, $2, $3, $4, $5, $6)",
-                         packId, letter.number, letter.channel, letter.byCarrier,
+                         job.packId, letter.number, letter.channel, letter.byCarrier,
                          letterStateName(LetterState::Waiting), now);
     transaction.commit();
     return true;
@@ -127,6 +140,15 @@ long long LetterStore::uncertain(std::string const& channel) const {
                             channel);
 }
 
+std::set<std::string> LetterStore::channelsByCarrier(std::string const& packId) const {
+    Database::Rows rows =
+        database_.query("SELECT DISTINCT channel FROM letters WHERE pack = $1 AND by_carrier = 1", packId);
+    std::set<std::string> channels;
+    while (rows.next())
+        channels.insert(rows.text(0));
+    return channels;
+}
+
 LetterCounts LetterStore::counts(std::string const& packId) const {
     Database::Rows rows = database_.query("SELECT state, count(*) FROM letters WHERE pack = $1 AND "
                                           "by_carrier = 1 GROUP BY state",
@@ -149,27 +171,58 @@ std::optional<StoredLetter> LetterStore::firstIn(std::string const& packId, Lett
 }
 
 void LetterStore::beginHandingOver(std::vector<LetterId> const& letters, long long now) {
-    finish(letters, LetterState::HandedOver, {}, now);
+    Database::Transaction transaction(database_);
+    for (LetterId const& letter : letters)
+        if (database_.change("UPDATE letters SET state = 'handed over', says = '', changed_at = $1 "
+                             "WHERE pack = $2 AND number = $3 AND state = 'waiting'",
+                             now, letter.packId, letter.number) == 0)
+            throw Base::Error("another service may have handed over letter " + letter.key());
+    transaction.commit();
+}
+
+bool LetterStore::holdChannel(std::string const& channel, std::string const& says, long long now) {
+    if (!isShared())
+        return true;
+    Database::Transaction transaction(database_);
+    Database::Rows former =
+        database_.query("SELECT holder FROM carriers WHERE channel = $1 FOR UPDATE", channel);
+    bool const isMine = former.next() && former.text(0) == jobs_.holder().name;
+    if (database_.change(
+            "INSERT INTO carriers (channel, paused, failures, says, since, try_at, holder, fence, "
+            "held_until) "
+            "VALUES ($1, 0, 0, '', 0, 0, $2, 1, clock_ms() + $3) ON CONFLICT (channel) DO UPDATE SET "
+            "fence = carriers.fence + 1, holder = excluded.holder, held_until = excluded.held_until "
+            "WHERE carriers.holder = excluded.holder OR carriers.held_until <= clock_ms()",
+            channel, jobs_.holder().name, jobs_.holder().seconds * 1000) == 0)
+        return false;
+    if (!isMine)
+        database_.change("UPDATE letters SET state = 'uncertain', says = $1, changed_at = $2 WHERE "
+                         "channel = $3 AND state = 'handed over' AND by_carrier = 1",
+                         says, now, channel);
+    transaction.commit();
+    return true;
 }
 
 void LetterStore::finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
-                         long long now) {
+                         long long now, LettersAre are) {
     Database::Transaction transaction(database_);
     for (LetterId const& letter : letters)
         database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3 "
-                         "WHERE pack = $4 AND number = $5",
+                         "WHERE pack = $4 AND number = $5" +
+                             conditionOf(are),
                          letterStateName(state), says, now, letter.packId, letter.number);
     transaction.commit();
 }
 
 void LetterStore::postpone(std::vector<LetterId> const& letters, std::string const& says, long long due,
-                           long long now) {
+                           long long now, LettersAre are) {
     Database::Transaction transaction(database_);
     for (LetterId const& letter : letters)
         database_.change(
             "UPDATE letters SET state = 'waiting', says = $1, due = $2, attempts = attempts + 1, "
             "first_try = CASE WHEN first_try = 0 THEN $3 ELSE first_try END, changed_at = $3 "
-            "WHERE pack = $4 AND number = $5",
+            "WHERE pack = $4 AND number = $5" +
+                conditionOf(are),
             says, due, now, letter.packId, letter.number);
     transaction.commit();
 }

@@ -6,6 +6,7 @@
 
 #include <map>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -66,6 +67,14 @@ struct CarrierRecord {
     long long tryAt = 0;
 };
 
+/// Where letters are that something became of.
+enum class LettersAre {
+    Anywhere,
+    Waiting,
+    /// The other side may have them.
+    HandedOver,
+};
+
 /// Every change is one transaction and on the disk when the operation returns.
 class LetterStore {
 public:
@@ -74,7 +83,7 @@ public:
 
     /// Records the letters of a queued job. False, and no change, when it is not queued or was divided
     /// before.
-    bool divide(std::string const& packId, std::vector<DividedLetter> const& letters, long long now);
+    bool divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now);
 
     std::optional<StoredLetter> find(LetterId const& letter) const;
     /// Of a job, in their order, at most `limit`.
@@ -93,20 +102,29 @@ public:
     /// Those that the other side of a channel has, or may have, and that changed since. Costs what all
     /// letters cost: for the start.
     std::vector<StoredLetter> withOtherSide(std::string const& channel, long long since) const;
+    /// The channels by whose carriers letters of a job go.
+    std::set<std::string> channelsByCarrier(std::string const& packId) const;
     LetterCounts counts(std::string const& packId) const;
     /// Whether any letter of a job waits, or is being handed over.
     bool isUnderWay(std::string const& packId) const;
     /// The first of a job in that state.
     std::optional<StoredLetter> firstIn(std::string const& packId, LetterState state) const;
 
-    /// Notes that from here on the other side may have them.
+    /// Notes that from here on the other side may have them. Throws Error, and has changed nothing, where
+    /// another service may have handed one over.
     void beginHandingOver(std::vector<LetterId> const& letters, long long now);
-    /// Notes what became of them.
+    /// Takes hold of a channel, or holds it on; false while another service has it. Letters that a former
+    /// holder may have handed over are uncertain from then on, which `says` tells why.
+    bool holdChannel(std::string const& channel, std::string const& says, long long now);
+    /// Whether several services may hand letters over.
+    bool isShared() const { return jobs_.isShared(); }
+
+    /// Notes what became of them, of those alone that are so still.
     void finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
-                long long now);
+                long long now, LettersAre are = LettersAre::Anywhere);
     /// Notes an attempt that failed, and when the next one is due.
-    void postpone(std::vector<LetterId> const& letters, std::string const& says, long long due,
-                  long long now);
+    void postpone(std::vector<LetterId> const& letters, std::string const& says, long long due, long long now,
+                  LettersAre are = LettersAre::Anywhere);
     /// Lets none of a job that waits for a channel go before that time.
     void holdBack(std::string const& packId, std::string const& channel, long long due);
     /// Moves a letter that goes by a carrier to another state; false, and no change, unless it is in one of

@@ -2,6 +2,7 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/database/postgres_connection.h"
 #include "programs/database/sqlite_connection.h"
 #include "programs/mailing/page_blob.h"
 
@@ -59,6 +60,9 @@ CREATE TABLE pieces (
 );
 )sql";
 
+/// Compressed pages are compressed no further.
+constexpr char const* POSTGRES_1 = "ALTER TABLE pieces ALTER COLUMN data SET STORAGE EXTERNAL;";
+
 constexpr std::pair<State, char const*> STATES[] = {
     {State::Open, "open"}, {State::Complete, "complete"}, {State::Erased, "erased"}};
 
@@ -75,6 +79,7 @@ State stateNamed(std::string const& name) {
 constexpr int SOME_ROWS = 64;
 /// Of the file, given back to the disk in one go.
 constexpr char const* SOME_PAGES = "1024";
+constexpr std::size_t MAX_PIECE_BYTES = 8 << 20;
 constexpr int BUSY_TIMEOUT_MS = 60'000;
 
 std::string inWords(Database::QueryError const& failure) {
@@ -277,19 +282,26 @@ public:
         orError([&] {
             Database::Transaction transaction(*database_);
             long long const number = numberOf(*database_, packId);
-            for (PagePiece const& piece : pieces) {
-                database_->change("INSERT INTO pieces (pack, position, number, data) VALUES ($1, $2, $3, $4)",
-                                  number, piece.position, piece.number, Database::Bytes{piece.bytes});
-                if (piece.completes)
-                    insertPage(number, piece.position, *piece.completes);
-            }
-            touch(number, "state", now);
+            for (std::size_t at = 0; at < pieces.size();)
+                at = insertPieces(number, pieces, at);
+            database_->change("UPDATE packs SET touched_at = $1 WHERE number = $2", now, number);
             transaction.commit();
         });
     }
 
     void complete(std::string const& packId, long long now) override {
-        orError([&] { touch(numberOf(*database_, packId), "'complete'", now); });
+        orError([&] {
+            if (database_->change("UPDATE packs SET state = 'complete', touched_at = $1 WHERE id = $2 AND "
+                                  "state = 'open'",
+                                  now, packId) == 0)
+                throw Base::Error("the service has no open pack " + packId + ": send it again");
+        });
+    }
+
+    void refuse(std::string const& packId) override {
+        orError([&] {
+            database_->change("UPDATE packs SET state = 'erased' WHERE id = $1 AND state = 'open'", packId);
+        });
     }
 
     bool eraseSome(std::string const& packId) override {
@@ -318,15 +330,33 @@ public:
     }
 
 private:
+    /// Those of one page that come together are a piece, of 8 MiB at the most where others share the server;
+    /// gives the place behind them.
+    std::size_t insertPieces(long long pack, std::vector<PagePiece> const& pieces, std::size_t first) {
+        PagePiece last = pieces[first];
+        std::size_t end = first + 1;
+        std::string joined;
+        std::size_t const most = database_->isSqlite() ? 0 : MAX_PIECE_BYTES;
+        for (; end < pieces.size() && pieces[end].position == last.position &&
+               std::max(joined.size(), last.bytes.size()) + pieces[end].bytes.size() <= most;
+             ++end) {
+            if (joined.empty())
+                joined = last.bytes;
+            joined += pieces[end].bytes;
+            last.completes = pieces[end].completes;
+        }
+        database_->change("INSERT INTO pieces (pack, position, number, data) VALUES ($1, $2, $3, $4)", pack,
+                          last.position, last.number,
+                          Database::Bytes{joined.empty() ? last.bytes : std::string_view(joined)});
+        if (last.completes)
+            insertPage(pack, last.position, *last.completes);
+        return end;
+    }
+
     void insertPage(long long pack, long long position, KeptPage const& page) {
         database_->change("INSERT INTO pages (pack, position, document, page, size, sha256) "
                           "VALUES ($1, $2, $3, $4, $5, $6)",
                           pack, position, page.document, page.page, page.size, page.sha256);
-    }
-
-    void touch(long long number, std::string const& state, long long now) {
-        database_->change("UPDATE packs SET state = " + state + ", touched_at = $1 WHERE number = $2", now,
-                          number);
     }
 
     bool eraseRows(long long number, int rows) {
@@ -362,8 +392,14 @@ private:
 PackStore::~PackStore() = default;
 
 Database::DatabaseKind const& packStoreDatabase() {
-    static Database::DatabaseKind const kind{"pack store", APPLICATION_ID, {SCHEMA_1}, BEGINNING};
+    static Database::DatabaseKind const kind{
+        "pack store", APPLICATION_ID, {{SCHEMA_1, "", POSTGRES_1}}, BEGINNING};
     return kind;
+}
+
+std::unique_ptr<PackStore> openSharedPackStore(std::string const& address) {
+    auto const connect = [address] { return std::make_unique<Database::PostgresConnection>(address); };
+    return std::make_unique<DatabasePackStore>(connect(), connect, nullptr);
 }
 
 std::unique_ptr<PackStore> openSqlitePackStore(fs::path const& file) {

@@ -80,6 +80,8 @@ public:
     virtual void store(std::string const& packId, std::vector<PagePiece> const& pieces, long long now) = 0;
     virtual void complete(std::string const& packId, long long now) = 0;
 
+    /// Takes a pack for erased that is not complete; nothing happens to another.
+    virtual void refuse(std::string const& packId) = 0;
     /// Takes the pack for erased, and erases some MiB of it; false when nothing of it is left but id and
     /// digest.
     virtual bool eraseSome(std::string const& packId) = 0;
@@ -89,6 +91,9 @@ public:
     /// A pack that is complete. May be called from any thread.
     virtual std::unique_ptr<Mailing::PackSource> open(std::string const& packId) const = 0;
 };
+
+/// In a database of several services, whose schema is there.
+std::unique_ptr<PackStore> openSharedPackStore(std::string const& address);
 
 /// In an SQLite file of its own, which is made when it is not there.
 std::unique_ptr<PackStore> openSqlitePackStore(std::filesystem::path const& file);

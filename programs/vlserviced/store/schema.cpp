@@ -1,6 +1,8 @@
 #include "programs/vlserviced/store/schema.h"
 
+#include "programs/database/postgres_connection.h"
 #include "programs/database/sqlite_connection.h"
+#include "programs/vlserviced/store/pack_store.h"
 
 namespace VlServiced {
 namespace {
@@ -187,6 +189,61 @@ CREATE TABLE history (
 CREATE INDEX history_by_time ON history (at);
 )sql";
 
+/// Who works on a job holds it until `try_at`, in milliseconds by the database's clock; when nobody does, it
+/// says when somebody may try. The fence grows each time that somebody takes hold. `submit_fence` is the one
+/// under which its container was staged.
+constexpr char const* SCHEMA_9 = R"sql(
+ALTER TABLE jobs ADD COLUMN holder TEXT NOT NULL DEFAULT '';
+ALTER TABLE jobs ADD COLUMN fence INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE jobs ADD COLUMN try_at INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE jobs ADD COLUMN submit_fence INTEGER NOT NULL DEFAULT 0;
+CREATE INDEX jobs_to_claim ON jobs (try_at, pack)
+WHERE (state IN ('accepted', 'submitting') OR (state = 'queued' AND to_upload = 1));
+
+ALTER TABLE carriers ADD COLUMN holder TEXT NOT NULL DEFAULT '';
+ALTER TABLE carriers ADD COLUMN fence INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE carriers ADD COLUMN held_until INTEGER NOT NULL DEFAULT 0;
+)sql";
+
+/// What changes is told to all services in the transaction that changes it.
+constexpr char const* POSTGRES_9 = R"sql(
+CREATE FUNCTION clock_ms() RETURNS BIGINT LANGUAGE sql STABLE AS
+    'SELECT CAST(floor(extract(epoch FROM clock_timestamp()) * 1000) AS BIGINT)';
+
+CREATE FUNCTION tell_of_job() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    PERFORM pg_notify('vlserviced_jobs', new.pack);
+    IF new.holder = '' AND
+       (new.state IN ('accepted', 'submitting') OR (new.state = 'queued' AND new.to_upload = 1)) THEN
+        PERFORM pg_notify('vlserviced_work', '');
+    END IF;
+    RETURN NULL;
+END $$;
+CREATE TRIGGER job_added AFTER INSERT ON jobs FOR EACH ROW EXECUTE FUNCTION tell_of_job();
+CREATE TRIGGER job_changed AFTER UPDATE OF state, problem, to_upload, letters_state ON jobs
+FOR EACH ROW EXECUTE FUNCTION tell_of_job();
+
+CREATE FUNCTION tell_of_letters() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    PERFORM pg_notify('vlserviced_letters', '');
+    RETURN NULL;
+END $$;
+CREATE TRIGGER letters_added AFTER INSERT ON letters
+FOR EACH STATEMENT EXECUTE FUNCTION tell_of_letters();
+
+CREATE FUNCTION tell_of_settings() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    PERFORM pg_notify('vlserviced_settings', '');
+    RETURN NULL;
+END $$;
+CREATE TRIGGER nodes_changed AFTER INSERT OR DELETE ON nodes
+FOR EACH STATEMENT EXECUTE FUNCTION tell_of_settings();
+CREATE TRIGGER parts_changed AFTER INSERT OR UPDATE OR DELETE ON parts
+FOR EACH STATEMENT EXECUTE FUNCTION tell_of_settings();
+CREATE TRIGGER service_settings_changed AFTER INSERT OR UPDATE ON service_settings
+FOR EACH STATEMENT EXECUTE FUNCTION tell_of_settings();
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -199,7 +256,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               {SCHEMA_5, SQLITE_5, POSTGRES_5},
                                               SCHEMA_6,
                                               SCHEMA_7,
-                                              SCHEMA_8}};
+                                              SCHEMA_8,
+                                              {SCHEMA_9, "", POSTGRES_9}}};
     return kind;
 }
 
@@ -208,6 +266,14 @@ std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path 
         Database::openDatabase(file, serviceDatabase(), Database::Journal::WriteAhead);
     Database::requireUndamaged(database, serviceDatabase());
     return std::make_unique<Database::SqliteConnection>(std::move(database));
+}
+
+SharedDatabase openSharedDatabase(std::string const& address) {
+    Database::requirePostgresAddress(address);
+    SharedDatabase shared{std::make_unique<Database::PostgresConnection>(address)};
+    shared.isNew = Database::migratePostgres(*shared.connection, serviceDatabase(), address);
+    Database::migratePostgres(*shared.connection, packStoreDatabase(), address);
+    return shared;
 }
 
 } // namespace VlServiced

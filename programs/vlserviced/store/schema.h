@@ -15,4 +15,13 @@ Database::DatabaseKind const& serviceDatabase();
 /// Opens, or creates, the service's database and tests it for damage. Throws Database::DatabaseError.
 std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path const& file);
 
+struct SharedDatabase {
+    std::unique_ptr<Database::Connection> connection;
+    /// Whether its schema was made by this very call.
+    bool isNew = false;
+};
+
+/// The database of several services, with the schemas of all that they keep. Throws Database::DatabaseError.
+SharedDatabase openSharedDatabase(std::string const& address);
+
 } // namespace VlServiced

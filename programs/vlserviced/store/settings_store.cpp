@@ -155,6 +155,12 @@ json::Object SettingsStore::serviceSettings() const {
     return rows.next() ? objectIn(rows.bytes(0)) : json::Object();
 }
 
+void SettingsStore::changeServiceSettings(std::function<json::Object(json::Object const&)> const& change) {
+    Database::Transaction transaction(database_, Database::Transaction::ALONE);
+    setServiceSettings(change(serviceSettings()));
+    transaction.commit();
+}
+
 void SettingsStore::setServiceSettings(json::Object const& settings) {
     database_.change("INSERT INTO service_settings (one, json) VALUES (1, $1) "
                      "ON CONFLICT (one) DO UPDATE SET json = excluded.json",

@@ -4,6 +4,7 @@
 #include "programs/database/connection.h"
 #include "vlservice/json/json.h"
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -56,6 +57,8 @@ public:
     /// The service's own settings: one object, empty at first.
     json::Object serviceSettings() const;
     void setServiceSettings(json::Object const& settings);
+    /// Replaces them by what `change` makes of them, while nobody else does.
+    void changeServiceSettings(std::function<json::Object(json::Object const&)> const& change);
 
     /// Of the JSON of one part of one node, and of all that a chain holds: an answer has to carry it.
     static constexpr std::size_t MAX_PART_BYTES = 4 << 20;

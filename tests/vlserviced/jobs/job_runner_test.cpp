@@ -75,7 +75,10 @@ protected:
         runner_->resume();
         doWork();
     }
-    bool isStaged() const { return fs::exists(upload_ / ".p1.mailing.part"); }
+    long long fence() const { return jobs_.find("p1")->fence; }
+    bool isStaged() const {
+        return fs::exists(upload_ / (".p1.mailing." + std::to_string(fence()) + ".part"));
+    }
     bool isInOutbox() const { return fs::exists(outbox_ / "p1.mailing"); }
     bool isHandedOver() const { return fs::exists(upload_ / "p1.mailing"); }
     std::string state(std::string const& packId) {
@@ -92,7 +95,7 @@ protected:
     }
     void stageOnRecord() {
         UploadFolder const upload(upload_, {});
-        VlServiced::stage(outbox_ / "p1.mailing", upload);
+        VlServiced::stage(outbox_ / "p1.mailing", upload, fence());
         jobs_.beginSubmitting("p1", upload_.string(), upload.identity().text(), now_);
     }
     /// Less the folder's mark.
@@ -379,7 +382,7 @@ TEST_F(JobRunnerTest, DoesNotSubmitAgainWhatWasPublishedAndTakenAlready) {
     acceptStored("p1");
     doWork();
     stageOnRecord();
-    VlServiced::publish("p1.mailing", UploadFolder(upload_, {}));
+    VlServiced::publish("p1.mailing", UploadFolder(upload_, {}), fence());
     fs::remove(upload_ / "p1.mailing");
     startRunner();
     runner_->resume();
@@ -778,7 +781,7 @@ TEST_F(JobRunnerTest, GoesOnBehindTheHandingOverWhereItWas) {
 TEST_F(JobRunnerTest, RemovesBehindARestartWhatIsLeftOfACancelledMailing) {
     acceptStored("p1");
     doWork();
-    VlServiced::stage(outbox_ / "p1.mailing", UploadFolder(upload_, {}));
+    VlServiced::stage(outbox_ / "p1.mailing", UploadFolder(upload_, {}), fence());
     jobs_.cancel("p1", now_);
     restart();
     EXPECT_FALSE(isStaged());

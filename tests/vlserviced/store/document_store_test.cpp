@@ -1,11 +1,9 @@
 #include "programs/vlserviced/store/document_store.h"
 
 #include "programs/base/digest.h"
-#include "programs/vlserviced/store/schema.h"
 #include "programs/vlserviced/store/settings_store.h"
-#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/store_database.h"
 
-#include <SQLiteCpp/Statement.h>
 #include <gmock/gmock.h>
 
 namespace {
@@ -14,7 +12,7 @@ using Protocol::StoredDocument;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-class DocumentStoreTest : public testing::Test {
+class DocumentStoreTest : public VLServiceTest::OnEachDatabase {
 protected:
     DocumentStoreTest() {
         nodes_.add("u=bob/a=acme");
@@ -47,13 +45,11 @@ protected:
         return static_cast<int>(database_->number("SELECT count(*) FROM " + table));
     }
 
-    TemporaryFolder folder_;
-    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::SettingsStore nodes_{*database_};
     VlServiced::DocumentStore store_{*database_};
 };
 
-TEST_F(DocumentStoreTest, KeepsADocumentAtANode) {
+TEST_P(DocumentStoreTest, KeepsADocumentAtANode) {
     std::string const digest = put("a=acme", "blue.pdf", {"first", "second"});
     EXPECT_THAT(namesAt("u=bob/a=acme"), IsEmpty());
     ASSERT_THAT(namesAt("a=acme"), ElementsAre("blue.pdf"));
@@ -64,7 +60,7 @@ TEST_F(DocumentStoreTest, KeepsADocumentAtANode) {
     EXPECT_EQ(document.putAt, 1000);
 }
 
-TEST_F(DocumentStoreTest, GivesPiecesFromAnyPlace) {
+TEST_P(DocumentStoreTest, GivesPiecesFromAnyPlace) {
     std::string const digest = put("", "x", {"first", "second"});
     EXPECT_EQ(store_.piece(digest, 0), "first");
     EXPECT_EQ(store_.piece(digest, 3), "st");
@@ -74,14 +70,14 @@ TEST_F(DocumentStoreTest, GivesPiecesFromAnyPlace) {
     EXPECT_EQ(store_.piece(std::string(64, '0'), 0), std::nullopt);
 }
 
-TEST_F(DocumentStoreTest, GivesBytesOfAllKinds) {
+TEST_P(DocumentStoreTest, GivesBytesOfAllKinds) {
     std::string bytes(3000, '\0');
     for (std::size_t i = 0; i < bytes.size(); ++i)
         bytes[i] = static_cast<char>(i * 31);
     EXPECT_EQ(store_.piece(put("", "x", {bytes}), 0), bytes);
 }
 
-TEST_F(DocumentStoreTest, ReplacesADocumentOfThatNameAndForgetsItsContent) {
+TEST_P(DocumentStoreTest, ReplacesADocumentOfThatNameAndForgetsItsContent) {
     std::string const first = put("a=acme", "blue.pdf", {"first"});
     std::string const second = put("a=acme", "blue.pdf", {"second"});
     EXPECT_THAT(namesAt("a=acme"), ElementsAre("blue.pdf"));
@@ -93,7 +89,7 @@ TEST_F(DocumentStoreTest, ReplacesADocumentOfThatNameAndForgetsItsContent) {
     EXPECT_EQ(count("document_pieces"), 1);
 }
 
-TEST_F(DocumentStoreTest, KeepsAContentOnceAndAsLongAsADocumentHasIt) {
+TEST_P(DocumentStoreTest, KeepsAContentOnceAndAsLongAsADocumentHasIt) {
     std::string const digest = put("a=acme", "a", {"same"});
     EXPECT_EQ(put("a=other", "b", {"same"}), digest);
     EXPECT_EQ(count("document_contents"), 1);
@@ -104,7 +100,7 @@ TEST_F(DocumentStoreTest, KeepsAContentOnceAndAsLongAsADocumentHasIt) {
     EXPECT_EQ(count("document_pieces"), 0);
 }
 
-TEST_F(DocumentStoreTest, ForgetsDocumentsWithTheirNode) {
+TEST_P(DocumentStoreTest, ForgetsDocumentsWithTheirNode) {
     std::string const kept = put("a=acme", "a", {"kept"});
     std::string const gone = put("u=bob/a=acme", "b", {"gone"});
     nodes_.remove("u=bob/a=acme");
@@ -113,7 +109,7 @@ TEST_F(DocumentStoreTest, ForgetsDocumentsWithTheirNode) {
     EXPECT_EQ(count("document_pieces"), 1);
 }
 
-TEST_F(DocumentStoreTest, ShowsNobodyWhatIsNotFinished) {
+TEST_P(DocumentStoreTest, ShowsNobodyWhatIsNotFinished) {
     std::string const digest = put("", "x", {"whole"});
     store_.add(store_.begin(), "whol");
     long long const other = store_.begin();
@@ -126,5 +122,7 @@ TEST_F(DocumentStoreTest, ShowsNobodyWhatIsNotFinished) {
     EXPECT_EQ(count("document_pieces"), 1);
     EXPECT_EQ(store_.piece(digest, 0), "whole");
 }
+
+VLSERVICE_ON_EACH_DATABASE(DocumentStoreTest);
 
 } // namespace

@@ -1,8 +1,6 @@
 #include "programs/vlserviced/store/job_store.h"
 
-#include "programs/database/sqlite_connection.h"
-#include "programs/vlserviced/store/schema.h"
-#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/store_database.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -17,10 +15,11 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using VlServiced::Job;
 using VlServiced::JobFilter;
+using VlServiced::JobKey;
 using VlServiced::JobState;
 using VlServiced::JobStore;
 
-class JobStoreTest : public testing::Test {
+class JobStoreTest : public VLServiceTest::OnEachDatabase {
 protected:
     static Job job(std::string const& packId, long long acceptedAt = 100) {
         Job job;
@@ -39,12 +38,10 @@ protected:
         return all;
     }
 
-    TemporaryFolder folder_;
-    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     JobStore store_{*database_};
 };
 
-TEST_F(JobStoreTest, RecordsAJobAsAccepted) {
+TEST_P(JobStoreTest, RecordsAJobAsAccepted) {
     EXPECT_TRUE(store_.accept(job("p1")));
     Job const found = store_.find("p1").value();
     EXPECT_EQ(found.pack, job("p1").pack);
@@ -60,7 +57,7 @@ TEST_F(JobStoreTest, RecordsAJobAsAccepted) {
     EXPECT_FALSE(store_.find("p2"));
 }
 
-TEST_F(JobStoreTest, RecordsAPackIdOnce) {
+TEST_P(JobStoreTest, RecordsAPackIdOnce) {
     EXPECT_TRUE(store_.accept(job("p1")));
     store_.advance("p1", JobState::Accepted, JobState::Queued, 150);
     EXPECT_FALSE(store_.accept(job("p1", 200)));
@@ -68,7 +65,7 @@ TEST_F(JobStoreTest, RecordsAPackIdOnce) {
     EXPECT_EQ(store_.find("p1")->state, JobState::Queued);
 }
 
-TEST_F(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
+TEST_P(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
     store_.accept(job("p1"));
     EXPECT_FALSE(store_.advance("p1", JobState::Queued, JobState::Submitting, 150));
     EXPECT_EQ(store_.find("p1")->changedAt, 100);
@@ -81,7 +78,7 @@ TEST_F(JobStoreTest, MovesAJobOnFromTheStateThatItIsInAlone) {
     EXPECT_FALSE(store_.advance("p2", JobState::Accepted, JobState::Queued, 150));
 }
 
-TEST_F(JobStoreTest, RecordsWhereAContainerGoesBeforeItGoesThere) {
+TEST_P(JobStoreTest, RecordsWhereAContainerGoesBeforeItGoesThere) {
     store_.accept(job("p1"));
     EXPECT_FALSE(store_.beginSubmitting("p1", "/srv/upload", "2 7 mark", 140));
     store_.advance("p1", JobState::Accepted, JobState::Queued, 150);
@@ -93,7 +90,7 @@ TEST_F(JobStoreTest, RecordsWhereAContainerGoesBeforeItGoesThere) {
     EXPECT_EQ(store_.find("p1")->changedAt, 160);
 }
 
-TEST_F(JobStoreTest, CountsTheJobsOfEachState) {
+TEST_P(JobStoreTest, CountsTheJobsOfEachState) {
     for (auto const* id : {"a", "b", "c"})
         store_.accept(job(id));
     store_.fail("b", "", 5);
@@ -101,7 +98,7 @@ TEST_F(JobStoreTest, CountsTheJobsOfEachState) {
                                                                testing::Pair(JobState::Failed, 1)));
 }
 
-TEST_F(JobStoreTest, GivesAJobUpWithTheReason) {
+TEST_P(JobStoreTest, GivesAJobUpWithTheReason) {
     store_.accept(job("p1"));
     store_.fail("p1", "page 2 is missing", 150);
     EXPECT_EQ(store_.find("p1")->state, JobState::Failed);
@@ -109,7 +106,7 @@ TEST_F(JobStoreTest, GivesAJobUpWithTheReason) {
     EXPECT_EQ(store_.find("p1")->changedAt, 150);
 }
 
-TEST_F(JobStoreTest, ListsAStateInTheOrderOfAcceptance) {
+TEST_P(JobStoreTest, ListsAStateInTheOrderOfAcceptance) {
     store_.accept(job("b", 2));
     store_.accept(job("a", 3));
     store_.accept(job("c", 1));
@@ -119,7 +116,7 @@ TEST_F(JobStoreTest, ListsAStateInTheOrderOfAcceptance) {
     EXPECT_THAT(ids(store_.inState(JobState::Failed)), IsEmpty());
 }
 
-TEST_F(JobStoreTest, FindsTheJobsOfAPackDatabase) {
+TEST_P(JobStoreTest, FindsTheJobsOfAPackDatabase) {
     store_.accept(job("p1", 1));
     store_.accept(job("p2", 2));
     Job other = job("p3", 3);
@@ -133,7 +130,7 @@ TEST_F(JobStoreTest, FindsTheJobsOfAPackDatabase) {
     EXPECT_THAT(ids(store_.matching({"", "", {"p1", "p9"}}, 1)), ElementsAre("p1"));
 }
 
-TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
+TEST_P(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
     for (auto const* id : {"accepted", "queued", "submitted", "held"})
         store_.accept(job(id));
     store_.advance("held", JobState::Accepted, JobState::Held, 2);
@@ -149,7 +146,7 @@ TEST_F(JobStoreTest, MarksForUploadWhatIsNotHandedOnYet) {
     EXPECT_FALSE(store_.find("submitted")->toUpload);
 }
 
-TEST_F(JobStoreTest, RecordsTheCourseOfAJob) {
+TEST_P(JobStoreTest, RecordsTheCourseOfAJob) {
     Job wanted = job("p1");
     wanted.toUpload = wanted.toHold = wanted.isTrial = true;
     wanted.due = 900;
@@ -163,7 +160,7 @@ TEST_F(JobStoreTest, RecordsTheCourseOfAJob) {
     EXPECT_EQ(plain.due, 0);
 }
 
-TEST_F(JobStoreTest, HoldsReleasesAndCallsBackWhatIsNotOnItsWay) {
+TEST_P(JobStoreTest, HoldsReleasesAndCallsBackWhatIsNotOnItsWay) {
     struct {
         JobState from;
         JobState held;
@@ -204,7 +201,7 @@ TEST_F(JobStoreTest, HoldsReleasesAndCallsBackWhatIsNotOnItsWay) {
     }
 }
 
-TEST_F(JobStoreTest, FindsWhatIsHeldAndDueInTheOrderOfItsTime) {
+TEST_P(JobStoreTest, FindsWhatIsHeldAndDueInTheOrderOfItsTime) {
     for (auto const& [id, due] :
          {std::pair{"c", 300LL}, {"a", 500LL}, {"b", 100LL}, {"never", 0LL}, {"queued", 50LL}}) {
         Job held = job(id);
@@ -222,7 +219,7 @@ TEST_F(JobStoreTest, FindsWhatIsHeldAndDueInTheOrderOfItsTime) {
     EXPECT_EQ(store_.nextDue(), std::nullopt);
 }
 
-TEST_F(JobStoreTest, ListsWhatGoesOnByItselfOfAPackDatabase) {
+TEST_P(JobStoreTest, ListsWhatGoesOnByItselfOfAPackDatabase) {
     for (auto const* id : {"a", "b", "c", "held", "cancelled", "tried"})
         store_.accept(job(id));
     store_.advance("held", JobState::Accepted, JobState::Held, 6);
@@ -235,7 +232,7 @@ TEST_F(JobStoreTest, ListsWhatGoesOnByItselfOfAPackDatabase) {
     EXPECT_THAT(ids(store_.underWay("/srv/other", "")), IsEmpty());
 }
 
-TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
+TEST_P(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
     std::vector<std::string> told;
     store_.onChange([&](std::string const& packId) { told.push_back(packId); });
     store_.accept(job("p1"));
@@ -247,6 +244,83 @@ TEST_F(JobStoreTest, TellsOfEachChangeOfAStateOrProblem) {
     store_.setProblem("p1", "full");
     store_.fail("p1", "gone", 4);
     EXPECT_THAT(told, ElementsAre("p1", "p1", "p1", "p1"));
+}
+
+/// A store that is taken hold of under another name.
+class OtherStore {
+public:
+    explicit OtherStore(std::unique_ptr<Database::Connection> database, std::string name = "other")
+        : database_(std::move(database)), store_(*database_, {std::move(name), 60}) {}
+    JobStore* operator->() { return &store_; }
+
+private:
+    std::unique_ptr<Database::Connection> database_;
+    JobStore store_;
+};
+
+TEST_P(JobStoreTest, GivesEachJobIntoOnePairOfHandsInTheOrderOfTime) {
+    for (char const* const id : {"p1", "p2", "p3"})
+        store_.accept(job(id));
+    database_->run("UPDATE jobs SET try_at = CASE pack WHEN 'p2' THEN 1 WHEN 'p1' THEN 2 ELSE 3 END");
+    EXPECT_THAT(ids(store_.claim(1)), ElementsAre("p2"));
+    OtherStore other(open());
+    EXPECT_THAT(ids(other->claim(16)), ElementsAre("p1", "p3"));
+    EXPECT_THAT(store_.claim(16), IsEmpty());
+    EXPECT_FALSE(store_.claim("p1"));
+    EXPECT_FALSE(other->claim("p2"));
+}
+
+TEST_P(JobStoreTest, GivesNoJobIntoHandsThatIsAtRest) {
+    for (char const* const id : {"held", "queued", "wanted", "submitted"})
+        store_.accept(job(id));
+    store_.advance("held", JobState::Accepted, JobState::Held, 1);
+    for (char const* const id : {"queued", "wanted", "submitted"})
+        store_.advance(id, JobState::Accepted, JobState::Queued, 1);
+    store_.wantUpload("wanted");
+    store_.beginSubmitting("submitted", "/srv/upload", "", 1);
+    store_.advance("submitted", JobState::Submitting, JobState::Submitted, 1);
+    EXPECT_THAT(ids(store_.claim(16)), ElementsAre("wanted"));
+    EXPECT_FALSE(store_.claim("queued"));
+    EXPECT_FALSE(store_.claim("none"));
+}
+
+TEST_P(JobStoreTest, HasNothingChangedByWhoStoodStillForTooLong) {
+    store_.accept(job("p1"));
+    JobKey const former("p1", store_.claim(1).front().fence);
+    database_->run("UPDATE jobs SET try_at = 0");
+    OtherStore other(open());
+    JobKey const latter("p1", other->claim(1).front().fence);
+    EXPECT_GT(latter.fence, former.fence);
+    EXPECT_FALSE(store_.advance(former, JobState::Accepted, JobState::Queued, 2));
+    store_.fail(former, "too late", 2);
+    store_.setProblem(former, "too late");
+    store_.keep({"p1"});
+    store_.letGo(former, 0);
+    EXPECT_EQ(store_.find("p1")->state, JobState::Accepted);
+    EXPECT_EQ(store_.find("p1")->problem, "");
+    EXPECT_FALSE(store_.claim("p1")) << "the other one has it still";
+    EXPECT_TRUE(other->advance(latter, JobState::Accepted, JobState::Queued, 2));
+    EXPECT_FALSE(store_.beginSubmitting(former, "/srv/upload", "", 3));
+    EXPECT_FALSE(store_.divide(former, VlServiced::LettersByCarriers::All, 3));
+    EXPECT_TRUE(other->beginSubmitting(latter, "/srv/upload", "", 3));
+    EXPECT_EQ(store_.find("p1")->submitFence, latter.fence);
+    EXPECT_FALSE(store_.advance(former, JobState::Submitting, JobState::Submitted, 4));
+}
+
+TEST_P(JobStoreTest, HoldsAJobOnAndLetsGoOfIt) {
+    store_.accept(job("p1"));
+    JobKey const mine("p1", store_.claim(1).front().fence);
+    database_->run("UPDATE jobs SET try_at = 0");
+    store_.keep({"p1", "none"});
+    OtherStore other(open());
+    EXPECT_THAT(other->claim(16), IsEmpty());
+    store_.letGo(mine, 60);
+    EXPECT_THAT(other->claim(16), IsEmpty()) << "something is in its way";
+    store_.hurry();
+    EXPECT_THAT(ids(other->claim(16)), ElementsAre("p1"));
+    EXPECT_FALSE(store_.claim("p1"));
+    other->letGo("p1", 60);
+    EXPECT_TRUE(store_.claim("p1")) << "whoever asks for it need not wait";
 }
 
 /// How many tens of steps the database takes for a question.
@@ -271,7 +345,10 @@ private:
     int steps_ = 0;
 };
 
-TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
+/// As SQLite counts them.
+class JobStoreCosts : public JobStoreTest {};
+
+TEST_P(JobStoreCosts, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
     JobFilter const filters[] = {
         {"", "", {"job 7", "job 8"}},
         {"/srv/packs", "packs.db", {"job 7"}},
@@ -298,7 +375,7 @@ TEST_F(JobStoreTest, AnswersAQuestionAtTheSameCostHoweverManyJobsThereAre) {
         EXPECT_NEAR(steps(filters[i]), few[i], 2) << i;
 }
 
-TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
+TEST_P(JobStoreCosts, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
     auto const addHeld = [this](int from, int to) {
         Database::Transaction transaction(*database_);
         for (int i = from; i < to; ++i) {
@@ -330,7 +407,7 @@ TEST_F(JobStoreTest, LooksForWhatIsDueAtTheSameCostHoweverManyJobsAreHeld) {
         EXPECT_NEAR(steps(questions[i]), few[i], 2) << i;
 }
 
-TEST_F(JobStoreTest, OrdersWhatIsDueByItsIndexAlone) {
+TEST_P(JobStoreCosts, OrdersWhatIsDueByItsIndexAlone) {
     Database::Rows plan = database_->query("EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_by_due "
                                            "WHERE state = 'held' AND due <= 7 ORDER BY due, pack");
     std::vector<std::string> steps;
@@ -338,5 +415,20 @@ TEST_F(JobStoreTest, OrdersWhatIsDueByItsIndexAlone) {
         steps.push_back(plan.text(3));
     EXPECT_THAT(steps, ElementsAre("SEARCH jobs USING INDEX jobs_by_due (due<?)"));
 }
+
+TEST_P(JobStoreCosts, LooksForWhatIsToBeWorkedOnByTheIndexThatHoldsThat) {
+    Database::Rows plan = database_->query(
+        "EXPLAIN QUERY PLAN SELECT pack FROM jobs INDEXED BY jobs_to_claim WHERE (state IN ('accepted', "
+        "'submitting') OR (state = 'queued' AND to_upload = 1)) AND try_at <= 5 ORDER BY try_at, pack LIMIT "
+        "3");
+    std::vector<std::string> steps;
+    while (plan.next())
+        steps.push_back(plan.text(3));
+    EXPECT_THAT(steps, ElementsAre("SEARCH jobs USING INDEX jobs_to_claim (try_at<?)"));
+}
+
+VLSERVICE_ON_EACH_DATABASE(JobStoreTest);
+INSTANTIATE_TEST_SUITE_P(On, JobStoreCosts, testing::Values(Database::Backend::Sqlite),
+                         VLServiceTest::OnEachDatabase::nameOf);
 
 } // namespace

@@ -1,9 +1,8 @@
 #include "programs/vlserviced/store/letter_store.h"
 
-#include "programs/vlserviced/store/schema.h"
-#include "tests/support/temporary_folder.h"
+#include "tests/support/failure_of.h"
+#include "tests/vlserviced/store_database.h"
 
-#include <SQLiteCpp/Statement.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -20,7 +19,7 @@ using VlServiced::LetterState;
 using VlServiced::LetterStore;
 using VlServiced::StoredLetter;
 
-class LetterStoreTest : public testing::Test {
+class LetterStoreTest : public VLServiceTest::OnEachDatabase {
 protected:
     void queue(std::string const& packId) {
         Job job;
@@ -42,13 +41,11 @@ protected:
         return letters_.find({packId, number})->state;
     }
 
-    TemporaryFolder folder_;
-    std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::JobStore jobs_{*database_};
     LetterStore letters_{*database_, jobs_};
 };
 
-TEST_F(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
+TEST_P(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
     divide("p1", {{1, "postal", true}, {2, "email", true}});
     EXPECT_EQ(jobs_.find("p1")->state, JobState::Delivering);
     EXPECT_TRUE(jobs_.find("p1")->isDivided);
@@ -63,7 +60,7 @@ TEST_F(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
     EXPECT_EQ(letters_.countOfJob("p1"), 2);
 }
 
-TEST_F(LetterStoreTest, LeavesAJobOnItsWayWhoseLettersAreNotAllCarried) {
+TEST_P(LetterStoreTest, LeavesAJobOnItsWayWhoseLettersAreNotAllCarried) {
     divide("p1", {{1, "postal", true}, {2, "email", false}});
     EXPECT_EQ(jobs_.find("p1")->state, JobState::Queued);
     EXPECT_EQ(jobs_.find("p1")->lettersState, JobState::Delivering);
@@ -73,14 +70,14 @@ TEST_F(LetterStoreTest, LeavesAJobOnItsWayWhoseLettersAreNotAllCarried) {
     EXPECT_TRUE(jobs_.find("p2")->isDivided);
 }
 
-TEST_F(LetterStoreTest, DividesNothingThatIsNotQueued) {
+TEST_P(LetterStoreTest, DividesNothingThatIsNotQueued) {
     queue("p1");
     jobs_.hold("p1", 2);
     EXPECT_FALSE(letters_.divide("p1", {{1, "postal", true}}, 5));
     EXPECT_THAT(letters_.ofJob("p1", 100), IsEmpty());
 }
 
-TEST_F(LetterStoreTest, GivesLettersInTheOrderOfTheirTimeAndOfTheirDivision) {
+TEST_P(LetterStoreTest, GivesLettersInTheOrderOfTheirTimeAndOfTheirDivision) {
     divide("p2", {{1, "postal", true}, {2, "email", true}, {3, "postal", true}});
     divide("p1", {{1, "postal", true}, {2, "postal", false}});
     EXPECT_THAT(toGo("postal", 10), ElementsAre("p2-1", "p2-3", "p1-1"));
@@ -97,7 +94,7 @@ TEST_F(LetterStoreTest, GivesLettersInTheOrderOfTheirTimeAndOfTheirDivision) {
     EXPECT_EQ(letters_.waiting("postal"), 3);
 }
 
-TEST_F(LetterStoreTest, GivesTheLettersOfAJobTogether) {
+TEST_P(LetterStoreTest, GivesTheLettersOfAJobTogether) {
     divide("p1", {{3, "postal", true}, {1, "postal", true}, {2, "email", true}, {4, "postal", true}});
     letters_.finish({{"p1", 4}}, LetterState::Accepted, "", 9);
     std::vector<long long> numbers;
@@ -106,7 +103,7 @@ TEST_F(LetterStoreTest, GivesTheLettersOfAJobTogether) {
     EXPECT_THAT(numbers, ElementsAre(1, 3));
 }
 
-TEST_F(LetterStoreTest, CountsWhatBecameOfAJobsLetters) {
+TEST_P(LetterStoreTest, CountsWhatBecameOfAJobsLetters) {
     divide("p1", {{1, "postal", true}, {2, "postal", true}, {3, "postal", true}, {4, "email", false}});
     EXPECT_TRUE(letters_.isUnderWay("p1"));
     letters_.finish({{"p1", 1}, {"p1", 2}}, LetterState::Failed, "no such street", 9);
@@ -118,7 +115,7 @@ TEST_F(LetterStoreTest, CountsWhatBecameOfAJobsLetters) {
     EXPECT_FALSE(letters_.firstIn("p1", LetterState::Returned));
 }
 
-TEST_F(LetterStoreTest, LetsAPersonDecideOfCertainStatesAlone) {
+TEST_P(LetterStoreTest, LetsAPersonDecideOfCertainStatesAlone) {
     divide("p1", {{1, "postal", true}, {2, "email", false}});
     letters_.postpone({{"p1", 1}}, "busy", 50, 10);
     EXPECT_FALSE(letters_.decide({"p1", 1}, {LetterState::Failed}, LetterState::Waiting, "again", 11));
@@ -133,7 +130,7 @@ TEST_F(LetterStoreTest, LetsAPersonDecideOfCertainStatesAlone) {
     EXPECT_THAT(toGo("postal", 0), ElementsAre("p1-1"));
 }
 
-TEST_F(LetterStoreTest, KeepsHowCarriersAreDoing) {
+TEST_P(LetterStoreTest, KeepsHowCarriersAreDoing) {
     EXPECT_FALSE(letters_.carrier("fax").isPaused);
     EXPECT_EQ(letters_.carrier("fax").failures, 0);
     letters_.setCarrier("fax", {true, 11, "no line", 70, 80});
@@ -145,7 +142,7 @@ TEST_F(LetterStoreTest, KeepsHowCarriersAreDoing) {
     EXPECT_EQ(record.tryAt, 80);
 }
 
-TEST_F(LetterStoreTest, TakesNoJobForEndedWhoseLettersAreStillOnTheirWay) {
+TEST_P(LetterStoreTest, TakesNoJobForEndedWhoseLettersAreStillOnTheirWay) {
     divide("p1", {{1, "postal", true}, {2, "email", false}});
     jobs_.advance("p1", JobState::Queued, JobState::Lodged, 10);
     EXPECT_THAT(jobs_.endedBefore(1000, 10), IsEmpty());
@@ -153,13 +150,16 @@ TEST_F(LetterStoreTest, TakesNoJobForEndedWhoseLettersAreStillOnTheirWay) {
     EXPECT_EQ(jobs_.endedBefore(1000, 10).size(), 1U);
 }
 
-TEST_F(LetterStoreTest, LetsLettersGoWithTheirJob) {
+TEST_P(LetterStoreTest, LetsLettersGoWithTheirJob) {
     divide("p1", {{1, "postal", true}});
     database_->run("DELETE FROM jobs");
     EXPECT_FALSE(letters_.find({"p1", 1}));
 }
 
-TEST_F(LetterStoreTest, LooksForWaitingLettersByTheIndexThatHoldsThem) {
+/// As SQLite has it.
+class LetterStorePlans : public LetterStoreTest {};
+
+TEST_P(LetterStorePlans, LookForWaitingLettersByTheIndexThatHoldsThem) {
     Database::Rows rows =
         database_->query("EXPLAIN QUERY PLAN SELECT * FROM letters INDEXED BY letters_to_go WHERE "
                          "channel = 'x' AND due <= 5 AND state = 'waiting' AND by_carrier = 1 "
@@ -168,6 +168,35 @@ TEST_F(LetterStoreTest, LooksForWaitingLettersByTheIndexThatHoldsThem) {
     while (rows.next())
         plan += rows.text(3) + '\n';
     EXPECT_EQ(plan, "SEARCH letters USING INDEX letters_to_go (channel=? AND due<?)\n");
+}
+
+TEST_P(LetterStoreTest, HasALetterHandedOverOnce) {
+    divide("p1", {{1, "fax", true}, {2, "fax", true}});
+    letters_.beginHandingOver({{"p1", 2}}, 6);
+    EXPECT_EQ(failureOf([&] {
+                  letters_.beginHandingOver({{"p1", 1}, {"p1", 2}}, 7);
+              }),
+              "another service may have handed over letter p1-2");
+    EXPECT_EQ(state("p1", 1), LetterState::Waiting);
+    EXPECT_EQ(state("p1", 2), LetterState::HandedOver);
+}
+
+TEST_P(LetterStoreTest, GivesAChannelIntoOnePairOfHandsWhereServicesShareIt) {
+    divide("p1", {{1, "fax", true}, {2, "fax", true}, {3, "sms", true}});
+    std::unique_ptr<Database::Connection> const connection = open();
+    VlServiced::JobStore jobs(*connection, {"other", 60});
+    LetterStore other(*connection, jobs);
+    EXPECT_TRUE(letters_.holdChannel("fax", "ended", 6));
+    EXPECT_TRUE(letters_.holdChannel("fax", "ended", 6));
+    EXPECT_EQ(other.holdChannel("fax", "ended", 6), !isPostgres());
+    EXPECT_TRUE(other.holdChannel("sms", "ended", 6));
+    letters_.beginHandingOver({{"p1", 1}}, 7);
+    database_->run("UPDATE carriers SET held_until = 0");
+    EXPECT_TRUE(other.holdChannel("fax", "ended", 8));
+    EXPECT_EQ(state("p1", 1), isPostgres() ? LetterState::Uncertain : LetterState::HandedOver);
+    EXPECT_EQ(state("p1", 2), LetterState::Waiting);
+    letters_.finish({{"p1", 1}}, LetterState::Accepted, "late, and true", 9);
+    EXPECT_EQ(state("p1", 1), LetterState::Accepted);
 }
 
 TEST(LetterKeys, AreNoneOfAnotherLetterOrOfAMailing) {
@@ -182,5 +211,8 @@ TEST(LetterIds, AreFoundByTheirKeys) {
     for (char const* const none : {"", "p1", "p1-", "p1-x", "p1-0", "p1-1x", "p1-99999999999999999999"})
         EXPECT_EQ(LetterId::ofKey(none), std::nullopt) << none;
 }
+VLSERVICE_ON_EACH_DATABASE(LetterStoreTest);
+INSTANTIATE_TEST_SUITE_P(On, LetterStorePlans, testing::Values(Database::Backend::Sqlite),
+                         VLServiceTest::OnEachDatabase::nameOf);
 
 } // namespace

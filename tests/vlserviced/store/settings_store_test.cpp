@@ -1,8 +1,7 @@
 #include "programs/vlserviced/store/settings_store.h"
 
-#include "programs/vlserviced/store/schema.h"
 #include "tests/support/failure_of.h"
-#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/store_database.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -12,11 +11,8 @@ namespace {
 using testing::ElementsAre;
 using VlServiced::SettingsStore;
 
-class SettingsStoreTest : public testing::Test {
+class SettingsStoreTest : public VLServiceTest::OnEachDatabase {
 protected:
-    std::unique_ptr<Database::Connection> open() {
-        return VlServiced::openServiceDatabase(folder_ / "service.db");
-    }
     std::vector<std::string> chainIds(std::string const& id) {
         std::vector<std::string> ids;
         for (VlServiced::SettingsLevel const& level : store_.chain(id))
@@ -32,14 +28,12 @@ protected:
     }
     json::Value part(std::string const& id, char const* part) { return store_.parts(id).get(part); }
 
-    TemporaryFolder folder_;
-    std::unique_ptr<Database::Connection> database_ = open();
     SettingsStore store_{*database_};
 };
 
-TEST_F(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(nodeIds(), ElementsAre("")); }
+TEST_P(SettingsStoreTest, HoldsTheRootAtFirst) { EXPECT_THAT(nodeIds(), ElementsAre("")); }
 
-TEST_F(SettingsStoreTest, AddsANodeWithAllAboveIt) {
+TEST_P(SettingsStoreTest, AddsANodeWithAllAboveIt) {
     store_.add("u=bob/ou=sales/a=acme");
     EXPECT_THAT(nodeIds(), ElementsAre("", "a=acme", "ou=sales/a=acme", "u=bob/ou=sales/a=acme"));
     store_.add("u=bob/ou=sales/a=acme");
@@ -49,7 +43,7 @@ TEST_F(SettingsStoreTest, AddsANodeWithAllAboveIt) {
     EXPECT_FALSE(store_.contains("a=other"));
 }
 
-TEST_F(SettingsStoreTest, KeepsAPartOfANode) {
+TEST_P(SettingsStoreTest, KeepsAPartOfANode) {
     json::Object const first{{"descr", "first"}};
     json::Object const second{{"descr", "second"}};
     store_.setPart("a=acme", "app", first);
@@ -63,7 +57,7 @@ TEST_F(SettingsStoreTest, KeepsAPartOfANode) {
     EXPECT_FALSE(part("a=other", "app"));
 }
 
-TEST_F(SettingsStoreTest, ListsNodesWithDescriptionAndParts) {
+TEST_P(SettingsStoreTest, ListsNodesWithDescriptionAndParts) {
     store_.setPart("a=acme", "po", json::Object{{"code", "7"}});
     store_.setPart("a=acme", "app", json::Object{{"descr", "Acme Ltd"}});
     store_.add("u=bob/a=acme");
@@ -76,14 +70,14 @@ TEST_F(SettingsStoreTest, ListsNodesWithDescriptionAndParts) {
     EXPECT_THAT(nodes[2].parts, ElementsAre());
 }
 
-TEST_F(SettingsStoreTest, ClearsANodeAndKeepsIt) {
+TEST_P(SettingsStoreTest, ClearsANodeAndKeepsIt) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
     store_.clear("a=acme");
     EXPECT_FALSE(part("a=acme", "app"));
     EXPECT_TRUE(store_.contains("a=acme"));
 }
 
-TEST_F(SettingsStoreTest, GivesTheLevelsFromTheNodeToTheRoot) {
+TEST_P(SettingsStoreTest, GivesTheLevelsFromTheNodeToTheRoot) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
     EXPECT_THAT(chainIds("u=bob/ou=sales/a=acme"),
                 ElementsAre("u=bob/ou=sales/a=acme", "ou=sales/a=acme", "a=acme", ""));
@@ -91,12 +85,12 @@ TEST_F(SettingsStoreTest, GivesTheLevelsFromTheNodeToTheRoot) {
     EXPECT_TRUE(store_.chain("u=bob/a=acme")[0].parts.empty());
 }
 
-TEST_F(SettingsStoreTest, HasTheRootOnceInTheChainOfAnIdThatEndsInASlash) {
+TEST_P(SettingsStoreTest, HasTheRootOnceInTheChainOfAnIdThatEndsInASlash) {
     EXPECT_THAT(chainIds("u=bob/"), ElementsAre("u=bob/", ""));
     EXPECT_THAT(chainIds(""), ElementsAre(""));
 }
 
-TEST_F(SettingsStoreTest, RemovesANodeWithItsParts) {
+TEST_P(SettingsStoreTest, RemovesANodeWithItsParts) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "x"}});
     store_.remove("a=acme");
     EXPECT_FALSE(store_.contains("a=acme"));
@@ -104,7 +98,7 @@ TEST_F(SettingsStoreTest, RemovesANodeWithItsParts) {
     EXPECT_FALSE(part("a=acme", "app"));
 }
 
-TEST_F(SettingsStoreTest, RefusesToRemoveWhatOthersStandOn) {
+TEST_P(SettingsStoreTest, RefusesToRemoveWhatOthersStandOn) {
     store_.add("u=bob/ou=sales/a=acme");
     store_.add("u=eve/ou=sales/a=acme");
     EXPECT_EQ(failureOf([&] { store_.remove("a=acme"); }),
@@ -117,7 +111,7 @@ TEST_F(SettingsStoreTest, RefusesToRemoveWhatOthersStandOn) {
     EXPECT_EQ(failureOf([&] { store_.remove("u=bob/ou=sales/a=acme"); }), "nothing was thrown");
 }
 
-TEST_F(SettingsStoreTest, KeepsTheServicesOwnSettings) {
+TEST_P(SettingsStoreTest, KeepsTheServicesOwnSettings) {
     EXPECT_EQ(store_.serviceSettings(), json::Object());
     json::Object const settings{{"upload_folder", "/srv/upload"}};
     store_.setServiceSettings(settings);
@@ -126,19 +120,19 @@ TEST_F(SettingsStoreTest, KeepsTheServicesOwnSettings) {
     EXPECT_EQ(store_.serviceSettings(), json::Object());
 }
 
-TEST_F(SettingsStoreTest, IsThereForTheNextThatOpensTheFile) {
+TEST_P(SettingsStoreTest, IsThereForTheNextThatOpensTheFile) {
     store_.setPart("a=acme", "app", json::Object{{"descr", "grüße"}});
     auto const again = open();
     EXPECT_EQ(SettingsStore(*again).parts("a=acme").get("app"), (json::Object{{"descr", "grüße"}}));
 }
 
-TEST_F(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
+TEST_P(SettingsStoreTest, ChangesNothingWhenTheTextCannotBeKept) {
     std::string const noUtf8 = "\xFF";
     EXPECT_THROW(store_.setPart("a=acme", "app", json::Object{{"descr", noUtf8}}), json::Exc);
     EXPECT_THAT(nodeIds(), ElementsAre(""));
 }
 
-TEST_F(SettingsStoreTest, KeepsPartsOfABoundedSize) {
+TEST_P(SettingsStoreTest, KeepsPartsOfABoundedSize) {
     json::Object const part{{"descr", std::string(5 << 20, 'x')}};
     EXPECT_EQ(failureOf([&] { store_.setPart("a=acme", "app", part); }),
               "the settings \"app\" of node a=acme are too large: they have 5242892 bytes, and 4194304 are "
@@ -146,7 +140,7 @@ TEST_F(SettingsStoreTest, KeepsPartsOfABoundedSize) {
     EXPECT_FALSE(store_.contains("a=acme"));
 }
 
-TEST_F(SettingsStoreTest, ReadsChainsOfABoundedSize) {
+TEST_P(SettingsStoreTest, ReadsChainsOfABoundedSize) {
     json::Object const part{{"descr", std::string(3 << 20, 'x')}};
     for (char const* node : {"", "a=acme", "u=bob/a=acme"})
         store_.setPart(node, "app", part);
@@ -157,7 +151,7 @@ TEST_F(SettingsStoreTest, ReadsChainsOfABoundedSize) {
         "its nodes hold less");
 }
 
-TEST_F(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
+TEST_P(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
     std::string const refusal =
         "there is no room for more nodes: 20000 are possible, whose ids have 4194304 bytes "
         "together; remove some first";
@@ -173,11 +167,14 @@ TEST_F(SettingsStoreTest, KeepsABoundedNumberOfNodes) {
     store_.add("a=other");
 }
 
-TEST_F(SettingsStoreTest, KeepsIdsOfABoundedSize) {
+TEST_P(SettingsStoreTest, KeepsIdsOfABoundedSize) {
     database_->run("WITH RECURSIVE n(i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 4200) "
-                   "INSERT INTO nodes (id, parent) SELECT 'a=' || i || printf('%.998c', 'x'), '' FROM n");
+                   "INSERT INTO nodes (id, parent) SELECT 'a=' || i || '" +
+                   std::string(998, 'x') + "', '' FROM n");
     EXPECT_THAT(failureOf([&] { store_.add("a=acme"); }),
                 testing::StartsWith("there is no room for more nodes"));
 }
+
+VLSERVICE_ON_EACH_DATABASE(SettingsStoreTest);
 
 } // namespace

@@ -1,0 +1,237 @@
+// Several services on one PostgreSQL database, whatever becomes of them.
+#include "programs/base/error.h"
+#include "programs/database/postgres_connection.h"
+#include "programs/vlmail/mailings/pack_delivery.h"
+#include "programs/vlmail/service/service_client.h"
+#include "tests/support/postgres_server.h"
+#include "tests/support/temporary_folder.h"
+#include "tests/vlserviced/pack_help.h"
+#include "tests/vlserviced/service_process.h"
+#include "vlservice/ipc/get_svc_cfg.h"
+#include "vlservice/ipc/set_svc_cfg.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <csignal>
+#include <mutex>
+#include <poll.h>
+#include <sys/inotify.h>
+#include <thread>
+#include <unistd.h>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using testing::HasSubstr;
+
+/// What comes into a folder is counted, and taken away as a carrier does.
+class TakingCarrier {
+public:
+    explicit TakingCarrier(fs::path folder)
+        : folder_(std::move(folder)), watch_(::inotify_init1(IN_CLOEXEC)) {
+        ::inotify_add_watch(watch_, folder_.c_str(), IN_MOVED_TO);
+        thread_ = std::thread([this] { take(); });
+    }
+    ~TakingCarrier() {
+        isEnding_ = true;
+        thread_.join();
+        ::close(watch_);
+    }
+    TakingCarrier(TakingCarrier const&) = delete;
+    TakingCarrier& operator=(TakingCarrier const&) = delete;
+
+    std::map<std::string, int> taken() {
+        std::scoped_lock const lock(mutex_);
+        return taken_;
+    }
+
+private:
+    void take() {
+        while (!isEnding_) {
+            takeAll();
+            struct pollfd at {
+                watch_, POLLIN, 0
+            };
+            char buffer[4096];
+            if (::poll(&at, 1, 100) > 0)
+                (void)!::read(watch_, buffer, sizeof buffer);
+        }
+    }
+    void takeAll() {
+        std::vector<fs::path> found;
+        for (fs::directory_entry const& entry : fs::directory_iterator(folder_))
+            if (!entry.path().filename().string().starts_with('.'))
+                found.push_back(entry.path());
+        std::scoped_lock const lock(mutex_);
+        for (fs::path const& container : found) {
+            ++taken_[container.stem().string()];
+            fs::remove(container);
+        }
+    }
+
+    fs::path folder_;
+    int watch_;
+    std::atomic<bool> isEnding_{false};
+    std::mutex mutex_;
+    std::map<std::string, int> taken_;
+    std::thread thread_;
+};
+
+class SharedDatabaseTest : public testing::Test {
+protected:
+    SharedDatabaseTest() { fs::create_directory(upload_); }
+    void SetUp() override {
+        if (!server_.whyNot().empty())
+            GTEST_SKIP() << server_.whyNot();
+    }
+
+    fs::path data(std::size_t number) const { return folder_.path() / std::to_string(number); }
+    /// Starts the one of that number, anew when it was there.
+    void start(std::size_t number) {
+        std::vector<std::string> arguments{
+            "--data", data(number).string(), "--database", database_.address(), "--lease",
+            "2",      "--no-discovery"};
+        if (number > 0)
+            arguments.insert(arguments.end(), {"--token", (data(0) / "token").string()});
+        std::scoped_lock const lock(mutex_);
+        services_[number].reset();
+        services_[number] = std::make_unique<ServiceProcess>(arguments);
+    }
+    void signal(std::size_t number, int what) {
+        std::scoped_lock const lock(mutex_);
+        services_[number]->signal(what);
+    }
+    std::unique_ptr<Channel::Client> client(std::size_t number) {
+        Channel::ClientSettings settings;
+        std::scoped_lock const lock(mutex_);
+        return clientOf(*services_.at(number), data(0));
+    }
+    void setUploadFolder() {
+        client(0)->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
+    }
+    VlMail::ServiceLine lineTo(std::size_t number) {
+        return VlMail::ServiceLine([this, number] { return client(number); },
+                                   {std::chrono::seconds(60), std::chrono::milliseconds(1)});
+    }
+    /// One that goes to the next service each time that it was lost.
+    VlMail::ServiceLine lineToAny() {
+        return VlMail::ServiceLine([this] { return client(next_++ % services_.size()); },
+                                   {std::chrono::seconds(60), std::chrono::milliseconds(20)});
+    }
+    /// A pack of its own database, until a service has answered that it has it.
+    void send(std::string const& id) {
+        fs::path const packs = folder_.path() / (id + ".db");
+        storePack(packs, id);
+        while (!Mailing::finishedPacks(packs).empty())
+            try {
+                auto toService = lineToAny();
+                VlMail::deliverPack(toService, packs, id, true);
+                return;
+            } catch (std::exception const& failure) {
+                // What was answered with a failure may be on its way; the same id says that it is the same.
+                ASSERT_THAT(failure.what(), testing::Not(HasSubstr("another pack")));
+            }
+    }
+    /// On the database's clock.
+    static void pass(Database::Connection& database, std::string const& seconds) {
+        database.run("SELECT pg_sleep(" + seconds + ")");
+    }
+
+    TemporaryFolder folder_;
+    fs::path upload_ = folder_ / "upload";
+    VLServiceTest::PostgresServer server_;
+    VLServiceTest::PostgresDatabase database_{server_.folder()};
+    std::mutex mutex_;
+    std::map<std::size_t, std::unique_ptr<ServiceProcess>> services_;
+    std::atomic<std::size_t> next_{0};
+};
+
+TEST_F(SharedDatabaseTest, HasTheTokenWithTheServiceThatMadeIt) {
+    start(0);
+    ASSERT_NE(services_[0]->port(), 0);
+    EXPECT_TRUE(fs::exists(data(0) / "token"));
+    ServiceProcess second({"--data", data(1).string(), "--database", database_.address(), "--no-discovery"});
+    EXPECT_EQ(second.wait(), 1);
+    EXPECT_EQ(
+        second.errors(),
+        "vlserviced: the token of this database lies with the service that has made it: copy that file to " +
+            (data(1) / "token").string() + " or name it by --token\n");
+    EXPECT_FALSE(fs::exists(data(1) / "token"));
+}
+
+TEST_F(SharedDatabaseTest, MakesAContainerAnewWhoseMachineIsGone) {
+    start(0);
+    start(1);
+    setUploadFolder();
+    storePack(folder_ / "p1.db", "p1");
+    auto toFirst = lineTo(0);
+    EXPECT_EQ(VlMail::deliverPack(toFirst, folder_ / "p1.db", "p1", false).state, Protocol::JobState::Queued);
+    signal(0, SIGKILL);
+    fs::path const made = data(0) / "outbox" / "p1.mailing";
+    std::string const content = contentOf(fs::exists(made) ? made : data(1) / "outbox" / "p1.mailing");
+    fs::remove_all(data(0) / "outbox");
+    fs::remove_all(data(1) / "outbox" / "p1.mailing");
+    auto toSecond = lineTo(1);
+    storePack(folder_ / "again.db", "p1");
+    VlMail::deliverPack(toSecond, folder_ / "again.db", "p1", true);
+    Database::PostgresConnection database(database_.address());
+    for (int i = 0; i < 100 && !fs::exists(upload_ / "p1.mailing"); ++i)
+        pass(database, "0.1");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), content);
+}
+
+TEST_F(SharedDatabaseTest, TellsTheOthersOfSettingsThatHaveChanged) {
+    start(0);
+    start(1);
+    auto const overview = [this] { return print(client(1)->call<Ipc::GetSvcCfg>()->resp()); };
+    EXPECT_THAT(overview(), testing::Not(HasSubstr(upload_.string())));
+    setUploadFolder();
+    Database::PostgresConnection database(database_.address());
+    for (int i = 0; i < 50 && overview().find(upload_.string()) == std::string::npos; ++i)
+        pass(database, "0.1");
+    EXPECT_THAT(overview(), HasSubstr(upload_.string()));
+}
+
+TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStill) {
+    constexpr int CLIENTS = 3;
+    constexpr int PACKS = 6;
+    for (std::size_t i : {0, 1, 2})
+        start(i);
+    setUploadFolder();
+    TakingCarrier carrier(upload_);
+    std::vector<std::thread> clients;
+    std::atomic<int> sent{0};
+    for (int c = 0; c < CLIENTS; ++c)
+        clients.emplace_back([this, c, &sent] {
+            for (int i = 0; i < PACKS; ++i, ++sent)
+                send("p" + std::to_string(c) + "-" + std::to_string(i));
+        });
+    auto database = std::make_unique<Database::PostgresConnection>(database_.address());
+    for (std::size_t round = 0; round < 2 || (round < 4 && sent < CLIENTS * PACKS); ++round) {
+        // Longer than the lease, in the middle of whatever it does.
+        signal(round % 3, SIGSTOP);
+        pass(*database, "2.5");
+        signal(round % 3, SIGCONT);
+        signal((round + 1) % 3, SIGKILL);
+        start((round + 1) % 3);
+        if (round % 2 == 1) {
+            database.reset();
+            server_.crash();
+            server_.startAgain();
+            database = std::make_unique<Database::PostgresConnection>(database_.address());
+        }
+    }
+    for (std::thread& client : clients)
+        client.join();
+    for (int i = 0; i < 600 && carrier.taken().size() < CLIENTS * PACKS; ++i)
+        pass(*database, "0.1");
+    std::map<std::string, int> const taken = carrier.taken();
+    EXPECT_EQ(taken.size(), static_cast<std::size_t>(CLIENTS * PACKS)) << "none is lost";
+    for (auto const& [id, times] : taken)
+        EXPECT_EQ(times, 1) << id;
+}
+
+} // namespace
