@@ -46,8 +46,8 @@ std::string noteOn(Cfg::PackPreset const& packPreset) {
     if (!packPreset.confirmReceipt())
         return {};
     return "pack preset " + Base::inQuotes(packPreset.name()) +
-           " wants an e-mail when its mailing is handed over, which nobody sends: there is no carrier for "
-           "e-mails";
+           " wants an e-mail when its mailing is handed over, which nobody sends: carriers take "
+           "letters alone";
 }
 
 } // namespace VlMail

@@ -105,7 +105,7 @@ constexpr FindingWords WORDS[] = {
      "{0} is no e-mail address, and no mailing goes out by this preset",
      "write one address, such as name@example.com"},
     {ConfirmationNotSent, "confirmation-not-sent", Warning,
-     "nobody gets an e-mail when the mailing is handed over: there is no carrier for e-mails",
+     "nobody gets an e-mail when the mailing is handed over: carriers take letters alone",
      "remove it, and look with \"vlmail status\""},
 
     {PatternBroken, "broken-pattern", Error,

@@ -507,7 +507,7 @@ TEST_F(VlMailTest, SaysThatNobodySendsAnEmailOnceAMailingIsHandedOver) {
     EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json")}), VlMail::FINE);
     std::string const note =
         "pack preset \"Invoices\" wants an e-mail when its mailing is handed over, which nobody "
-        "sends: there is no carrier for e-mails";
+        "sends: carriers take letters alone";
     EXPECT_THAT(out_, HasSubstr("note: " + note + "\n"));
     EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json"), "--json"}), VlMail::FINE);
     json::Array const notes = json::strToObject(out_.data(), out_.size()).get("notes").toArray();
