@@ -376,7 +376,8 @@ void LetterRunner::onAsked(std::string const& name,
     channel.askAt = surroundings_.now() + SECONDS_BETWEEN_QUESTIONS;
     for (auto const& [key, told] : progress)
         if (auto const found = channel.askable.find(key); found != channel.askable.end()) {
-            std::erase_if(found->second, [&](LetterId const& id) { return !note(channel, id, told); });
+            std::erase_if(found->second,
+                          [&, &said = told](LetterId const& id) { return !note(channel, id, said); });
             if (found->second.empty())
                 channel.askable.erase(found);
         }
