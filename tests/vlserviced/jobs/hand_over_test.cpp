@@ -61,6 +61,38 @@ TEST_F(HandOver, PublishesOnceHoweverOftenItIsCalled) {
     EXPECT_EQ(filesInUpload(), 0) << "what the carrier has taken came back";
 }
 
+TEST_F(HandOver, PublishesWhatWasStagedUnderTheFenceOnRecordAndNothingElse) {
+    VlServiced::stage(container_, upload(), 3);
+    write(container_, "of the service that went on");
+    VlServiced::stage(container_, upload(), 4);
+    VlServiced::publish("p1.mailing", upload(), 4);
+    EXPECT_EQ(read(upload_ / "p1.mailing"), "of the service that went on");
+    fs::remove(upload_ / "p1.mailing");
+    VlServiced::publish("p1.mailing", upload(), 4);
+    EXPECT_FALSE(VlServiced::liesIn(upload(), "p1.mailing"));
+    EXPECT_EQ(read(upload_ / ".p1.mailing.3.part"), "bytes");
+    VlServiced::unstage("p1.mailing", upload(), 3);
+    EXPECT_EQ(filesInUpload(), 0);
+}
+
+TEST_F(HandOver, SweepsWhatWasStagedUnderFencesThatAreOfNoUse) {
+    for (long long const fence : {1, 2, 3})
+        VlServiced::stage(container_, upload(), fence);
+    char const* const others[] = {".p1.mailing.part", ".p1.mailing.x.part", ".p1.mailing.1.parts",
+                                  "p1.mailing.1.part"};
+    for (char const* const other : others)
+        write(upload_ / other, "of somebody else");
+    VlServiced::sweepStaged(upload(), [](std::string const& name, long long fence) {
+        EXPECT_EQ(name, "p1.mailing");
+        return fence == 2;
+    });
+    EXPECT_FALSE(fs::exists(upload_ / ".p1.mailing.1.part"));
+    EXPECT_TRUE(fs::exists(upload_ / ".p1.mailing.2.part"));
+    EXPECT_FALSE(fs::exists(upload_ / ".p1.mailing.3.part"));
+    for (char const* const other : others)
+        EXPECT_TRUE(fs::exists(upload_ / other)) << other;
+}
+
 TEST_F(HandOver, StagesAgainOverWhatACrashLeft) {
     write(upload_ / ".p1.mailing.part", "half of a longer container");
     VlServiced::stage(container_, upload());

@@ -378,6 +378,22 @@ TEST_F(JobRunnerTest, GoesOnBehindAStagedContainer) {
     EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
 }
 
+TEST_F(JobRunnerTest, SweepsFromTheUploadFolderWhatNobodyPublishesAnyMore) {
+    acceptStored("p1");
+    doWork();
+    stageOnRecord();
+    UploadFolder const upload(upload_, {});
+    database_->run("UPDATE jobs SET fence = fence + 5, submit_fence = submit_fence + 5");
+    VlServiced::stage(outbox_ / "p1.mailing", upload, fence());
+    VlServiced::stage(outbox_ / "p1.mailing", upload, fence() - 1);
+    VlServiced::stage(outbox_ / "p1.mailing", upload, fence() + 1);
+    runner_->sweep();
+    EXPECT_TRUE(isStaged()) << "it is on record";
+    EXPECT_FALSE(fs::exists(upload_ / (".p1.mailing." + std::to_string(fence() - 1) + ".part")));
+    EXPECT_TRUE(fs::exists(upload_ / (".p1.mailing." + std::to_string(fence() + 1) + ".part")))
+        << "somebody is about to put it on record";
+}
+
 TEST_F(JobRunnerTest, DoesNotSubmitAgainWhatWasPublishedAndTakenAlready) {
     acceptStored("p1");
     doWork();
