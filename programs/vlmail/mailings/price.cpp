@@ -24,8 +24,8 @@ long long printedPages(Mailing::MailedLetter const& letter) {
 
 /// An older service knows letters in colour throughout and no others.
 void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::Metadata const& mailing) {
-    batch.colour =
-        mailing.madeReady ? colouredPages == batch.pages : mailing.packPreset.colorModel() == Mailing::COLOURED;
+    batch.colour = mailing.madeReady ? colouredPages == batch.pages
+                                     : mailing.packPreset.colorModel() == Mailing::COLOURED;
     if (!batch.colour)
         batch.colouredPages = colouredPages;
 }

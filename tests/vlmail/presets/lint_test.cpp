@@ -40,6 +40,11 @@ std::vector<std::string> findingsIn(std::string const& json) {
 /// A preset with a good zone and these keys.
 std::string preset(std::string const& keys) { return "{" + keys + R"(, "zones": [)" + zoneWith("") + "]}"; }
 
+constexpr char const* UNUSABLE_RULES =
+    R"_({"name": "P", "production": {"window": {"left": 9000, "top": 0, "right": 100, "bottom": 100}, "clear_zones": [{"left": 0, "top": 0, "right": 999999, "bottom": 1}], "postcode": "(a+)+b", "tolerence": 5, "address_lines": {"min": "3"}}})_";
+constexpr char const* USABLE_RULES =
+    R"_({"name": "P", "production": {"window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000}, "postcode": "\\b\\d{5}\\b", "repair": ["cover-page"]}})_";
+
 std::vector<Case> const CASES{
     {"NothingAtAll", R"_({})_", {}},
     {"NothingInAGoodField", partWithField(R"_({"name": "ref", "value_extract": "^Ref: (?<VAL>.*)$"})_"), {}},
@@ -608,47 +613,42 @@ std::vector<Case> const CASES{
       "pack "
       "preset can be read | write 1, 2 and so on, \"last\" or \"any\" [reading-refused]"}},
     {"CarriersRulesThatCannotBeUsed",
-         partOf(
-             presetWith(zoneWith("")), R"_({"name": "P", "production": {"window": {"left": 9000, "top": 0, "right": 100, "bottom": 100}, "clear_zones": [{"left": 0, "top": 0, "right": 999999, "bottom": 1}], "postcode": "(a+)+b", "tolerence": 5, "address_lines": {"min": "3"}}})_"),
-         {"error /pack_presets/0/production/address_lines/min: is no integer from 1 to 100: no letter that "
-          "is "
-          "sent by this pack preset can go out | write one; lengths are in 1/100 mm [production-refused]",
-          "error /pack_presets/0/production/clear_zones/0/right: is no integer from -200000 to 200000: no "
-          "letter "
-          "that is sent by this pack preset can go out | write one; lengths are in 1/100 mm "
-          "[production-refused]",
-          "error /pack_presets/0/production/postcode: the pattern runs away on a text such as "
-          "\"aaaaaaaaaaaaaaaaaaaaaaaa...\": a letter with such an address cannot go out | repeat nothing "
-          "that is "
-          "repeated inside, and let neighbouring repetitions take different characters [runaway-pattern]",
-          "error /pack_presets/0/production/tolerence: \"tolerence\" is no key here: no letter that is sent "
-          "by "
-          "this pack preset can go out | write one of \"sheet\", \"window\", \"clear_zones\", \"tolerance\", "
-          "\"address_lines\", \"postcode\", \"repair\", \"copies\" [production-refused]",
-          "error /pack_presets/0/production/window: has no area: it goes from 90 to 1 mm across and from 0 "
-          "to 1 mm "
-          "down: no letter that is sent by this pack preset can go out | write \"left\" less than \"right\", "
-          "and "
-          "\"top\" less than \"bottom\" [production-refused]"}},
-        {"NothingInACarriersRules",
-         partOf(
-             presetWith(zoneWith("")),
-             R"_({"name": "P", "production": {"window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000}, "postcode": "\\b\\d{5}\\b", "repair": ["cover-page"]}})_"),
-         {}},
-        {"AMisspeltProduction",
-         partOf(presetWith(zoneWith("")), R"_({"name": "P", "producton": {}})_"),
-         {"error /pack_presets/0/producton: \"producton\" is no known key and changes nothing | write "
-          "\"production\" [misspelt-key]"}},
-        {"APrintAreaWithoutArea",
-         R"_({"app": {"print_area": {"left": 500, "top": 0, "right": 100, "bottom": 100}}})_",
-         {"error /app/print_area: the print area has no area (from 5 to 1 mm across and from 0 to 1 mm "
-          "down): no "
-          "letter can go out | \"left\" must be less than \"right\", and \"top\" less than \"bottom\" "
-          "[print-area-empty]"}},
-        {"NothingInAPrintAreaThatIsInheritedOrNotSaid",
-         R"_({"app": {"print_area": {"inh": true, "v": {"left": 0, "top": 0, "right": 100, "bottom": 100}}}})_",
-         {}},
-        {"NothingInAPlaceThatAnAnchorTells",
+     partOf(presetWith(zoneWith("")), UNUSABLE_RULES),
+     {"error /pack_presets/0/production/address_lines/min: is no integer from 1 to 100: no letter that "
+      "is "
+      "sent by this pack preset can go out | write one; lengths are in 1/100 mm [production-refused]",
+      "error /pack_presets/0/production/clear_zones/0/right: is no integer from -200000 to 200000: no "
+      "letter "
+      "that is sent by this pack preset can go out | write one; lengths are in 1/100 mm "
+      "[production-refused]",
+      "error /pack_presets/0/production/postcode: the pattern runs away on a text such as "
+      "\"aaaaaaaaaaaaaaaaaaaaaaaa...\": a letter with such an address cannot go out | repeat nothing "
+      "that is "
+      "repeated inside, and let neighbouring repetitions take different characters [runaway-pattern]",
+      "error /pack_presets/0/production/tolerence: \"tolerence\" is no key here: no letter that is sent "
+      "by "
+      "this pack preset can go out | write one of \"sheet\", \"window\", \"clear_zones\", \"tolerance\", "
+      "\"address_lines\", \"postcode\", \"repair\", \"copies\" [production-refused]",
+      "error /pack_presets/0/production/window: has no area: it goes from 90 to 1 mm across and from 0 "
+      "to 1 mm "
+      "down: no letter that is sent by this pack preset can go out | write \"left\" less than \"right\", "
+      "and "
+      "\"top\" less than \"bottom\" [production-refused]"}},
+    {"NothingInACarriersRules", partOf(presetWith(zoneWith("")), USABLE_RULES), {}},
+    {"AMisspeltProduction",
+     partOf(presetWith(zoneWith("")), R"_({"name": "P", "producton": {}})_"),
+     {"error /pack_presets/0/producton: \"producton\" is no known key and changes nothing | write "
+      "\"production\" [misspelt-key]"}},
+    {"APrintAreaWithoutArea",
+     R"_({"app": {"print_area": {"left": 500, "top": 0, "right": 100, "bottom": 100}}})_",
+     {"error /app/print_area: the print area has no area (from 5 to 1 mm across and from 0 to 1 mm "
+      "down): no "
+      "letter can go out | \"left\" must be less than \"right\", and \"top\" less than \"bottom\" "
+      "[print-area-empty]"}},
+    {"NothingInAPrintAreaThatIsInheritedOrNotSaid",
+     R"_({"app": {"print_area": {"inh": true, "v": {"left": 0, "top": 0, "right": 100, "bottom": 100}}}})_",
+     {}},
+    {"NothingInAPlaceThatAnAnchorTells",
      partOf(
          R"_({"match": "a.*", "pack_preset": "P", "zones": [
              {"name": "Above", "location": {"left": -1000, "top": -2000, "right": 1000, "bottom": -500},
