@@ -35,11 +35,11 @@ HealthCheck looked(std::string const& name, std::string const& remedy, Look look
 }
 
 HealthCheck databaseCheck(HealthSources const& sources) {
-    std::string const file = sources.database.string();
-    return looked("database", "give its folder room and rights; the service goes on by itself", [&] {
-        sources.tryDatabase();
-        return HealthCheck::well("database", file + " takes changes");
-    });
+    return looked("database", "see that it has room, rights and a server; the service goes on by itself",
+                  [&] {
+                      sources.tryDatabase();
+                      return HealthCheck::well("database", sources.database + " takes changes");
+                  });
 }
 
 std::string inMiB(std::uintmax_t bytes) { return std::to_string(bytes >> 20) + " MiB"; }
@@ -122,7 +122,7 @@ Protocol::HealthAnswer healthOf(HealthSources const& sources) {
     answer.now = sources.now();
     ServiceSettings const settings = sources.settings();
     answer.checks = {databaseCheck(sources),
-                     roomIn("data disk", sources.database.parent_path()),
+                     roomIn("data disk", sources.data),
                      roomIn("outbox disk", sources.outbox),
                      uploadFolderCheck(sources, settings),
                      suspensionCheck(settings),

@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <functional>
 #include <optional>
+#include <string>
 #include <vector>
 
 namespace VlServiced {
@@ -15,7 +16,9 @@ namespace VlServiced {
 struct HealthSources {
     /// Begins a change and takes it back. Throws std::exception when none can be made.
     std::function<void()> tryDatabase;
-    std::filesystem::path database;
+    /// As people know it.
+    std::string database;
+    std::filesystem::path data;
     std::filesystem::path outbox;
     std::function<ServiceSettings()> settings;
     std::function<Protocol::CarriersAnswer()> carriers;

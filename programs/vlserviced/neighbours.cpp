@@ -31,6 +31,8 @@ void Neighbours::listen() {
     // A descriptor of its own, since both ends close theirs.
     readable_ = boost::asio::posix::stream_descriptor(io_, ::dup(listener_->descriptor()));
     await();
+    for (char const* const channel : {SETTINGS, WORK, LETTERS})
+        tell(channel, {});
 }
 
 void Neighbours::await() {

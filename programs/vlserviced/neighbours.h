@@ -34,7 +34,7 @@ public:
     Neighbours& operator=(Neighbours const&) = delete;
 
     /// Listens from here on, where it does not yet or the connection went; to be called now and then. What
-    /// was told meanwhile is lost. Throws Database::QueryError.
+    /// was told meanwhile is lost: all but single jobs is taken for changed. Throws Database::QueryError.
     void listen();
     void stop();
 

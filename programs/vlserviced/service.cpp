@@ -6,6 +6,7 @@
 #include "programs/base/plain_text.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
+#include "programs/database/postgres_connection.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/discovery_answer.h"
 #include "programs/vlserviced/health.h"
@@ -199,9 +200,12 @@ private:
 class Service::Impl {
 public:
     explicit Impl(Options const& options)
-        : data_(options.data), outbox_(preparedOutbox(options, data_)), opened_(openDatabase(options, data_)),
-          jobs_(*opened_.connection, newHolder(options)), localPacks_(options.localPacks),
-          packStore_(openPackStore(options, data_)), ownToken_(ownToken(options, data_, opened_.isNew)),
+        : data_(options.data), outbox_(preparedOutbox(options, data_)),
+          databaseInWords_(options.database.empty() ? data_.database().string()
+                                                    : Database::shownPostgresAddress(options.database)),
+          opened_(openDatabase(options, data_)), jobs_(*opened_.connection, newHolder(options)),
+          localPacks_(options.localPacks), packStore_(openPackStore(options, data_)),
+          ownToken_(ownToken(options, data_, opened_.isNew)),
           server_(
               std::in_place, io_, serverSettings(options), &Ipc::makeEmptyCmd,
               [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
@@ -583,7 +587,8 @@ private:
 
     HealthSources healthSources() {
         return {[this] { Database::Transaction(*opened_.connection, Database::Transaction::ALONE); },
-                data_.database(),
+                databaseInWords_,
+                data_.path(),
                 outbox_,
                 [this] { return settings_.service(); },
                 [this] { return letterRunner_.list(); },
@@ -594,6 +599,7 @@ private:
 
     DataFolder data_;
     fs::path outbox_;
+    std::string databaseInWords_;
     SharedDatabase opened_;
     SettingsStore store_{*opened_.connection};
     History history_{*opened_.connection, &now};

@@ -43,7 +43,8 @@ protected:
     json::Object settings_;
     Protocol::CarriersAnswer carriers_;
     VlServiced::HealthSources sources_{[] {},
-                                       folder_ / "service.db",
+                                       (folder_ / "service.db").string(),
+                                       folder_.path(),
                                        folder_.path(),
                                        [this] { return VlServiced::ServiceSettings(settings_); },
                                        [this] { return carriers_; },
@@ -64,8 +65,9 @@ TEST_F(HealthTest, TellsTheTimeAndThatAllIsWell) {
 TEST_F(HealthTest, TellsWhyTheDatabaseTakesNoChanges) {
     EXPECT_EQ(told("database"), "well: " + (folder_ / "service.db").string() + " takes changes");
     sources_.tryDatabase = [] { throw std::runtime_error("disk I/O error"); };
-    EXPECT_EQ(told("database"),
-              "bad: disk I/O error | give its folder room and rights; the service goes on by itself");
+    EXPECT_EQ(
+        told("database"),
+        "bad: disk I/O error | see that it has room, rights and a server; the service goes on by itself");
 }
 
 TEST_F(HealthTest, TellsHowMuchRoomIsLeftAndThatAFolderIsGone) {
