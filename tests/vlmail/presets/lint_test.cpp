@@ -321,8 +321,7 @@ std::vector<Case> const CASES{
      partOf(preset(R"_("match": ".*", "pack_preset": "P")_"),
             R"_({"name": "P", "confirmation_email": true})_"),
      {"warning /pack_presets/0/confirmation_email: nobody gets an e-mail when the mailing is handed over: "
-      "there is no "
-      "carrier for e-mails | remove it, and look with \"vlmail status\" [confirmation-not-sent]"}},
+      "carriers take letters alone | remove it, and look with \"vlmail status\" [confirmation-not-sent]"}},
     {"ALetterheadWithoutFlags",
      partOf(
          preset(R"_("match": "a.*", "pack_preset": "P")_"),
