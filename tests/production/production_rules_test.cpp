@@ -10,7 +10,6 @@ using namespace VLServiceTest;
 using Production::ProductionRules;
 using Reader::Box;
 using Reader::RulesFault;
-using testing::ElementsAre;
 using testing::IsEmpty;
 
 struct Read {
