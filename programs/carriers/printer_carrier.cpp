@@ -97,6 +97,10 @@ Progress progressOf(PrinterJob const& job, std::string const& hindrance) {
     return {Kind::UnderWay, nameOf(job) + " waits at the printer" + hindrance};
 }
 
+Outcome uncertain(int job, std::string const& failure) {
+    return {Outcome::Kind::Uncertain, "job " + std::to_string(job) + " may be printed: " + failure};
+}
+
 std::string list(std::vector<std::string> const& words) {
     std::string text;
     for (std::string const& word : words)
@@ -142,6 +146,9 @@ Outcome PrinterCarrier::given(int job, Parcel const& parcel, std::string const& 
     try {
         session_.send(job, parcel.document);
         return {Outcome::Kind::Accepted, "job " + std::to_string(job) + " of " + uri_ + more};
+    } catch (PrinterSilence const& silence) {
+        // It may print what it has while it says that the job was cancelled.
+        return uncertain(job, silence.what());
     } catch (PrinterRefusal const& refusal) {
         failure = refusal.what();
         isRefused = true;
@@ -149,7 +156,7 @@ Outcome PrinterCarrier::given(int job, Parcel const& parcel, std::string const& 
         failure = broken.what();
     }
     if (!isTakenBack(job))
-        return {Outcome::Kind::Uncertain, "job " + std::to_string(job) + " may be printed: " + failure};
+        return uncertain(job, failure);
     return {isRefused ? Outcome::Kind::Refused : Outcome::Kind::Failed, failure};
 }
 

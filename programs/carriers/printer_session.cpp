@@ -205,6 +205,7 @@ public:
                                                ippLength(request.get()) + pdf.size());
         if (status == HTTP_STATUS_CONTINUE)
             status = cupsWriteRequestData(connection_.get(), pdf.data(), pdf.size());
+        bool const isWhole = status == HTTP_STATUS_CONTINUE;
         Message const told(status == HTTP_STATUS_CONTINUE || status == HTTP_STATUS_OK
                                ? cupsGetResponse(connection_.get(), path_.c_str())
                                : nullptr,
@@ -215,6 +216,8 @@ public:
         connection_.reset();
         if (told && isRefusal(ippGetStatusCode(told.get())))
             throw PrinterRefusal(words);
+        if (isWhole && !told)
+            throw PrinterSilence(words);
         throw Base::Error(words);
     }
 

@@ -1,6 +1,8 @@
 #pragma once
 // What a printer is asked and told, by the Internet Printing Protocol.
 
+#include "programs/base/error.h"
+
 #include <functional>
 #include <memory>
 #include <stdexcept>
@@ -47,6 +49,12 @@ struct PrinterJob {
 class PrinterRefusal : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
+};
+
+/// The printer was given all of a document and has not said what it makes of it.
+class PrinterSilence : public Base::Error {
+public:
+    using Error::Error;
 };
 
 /// facts() comes first: it connects. Each operation throws Error with one line where the printer cannot be
