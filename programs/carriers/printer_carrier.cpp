@@ -178,8 +178,15 @@ std::map<std::string, Progress> PrinterCarrier::ask(std::set<std::string> const&
     // The latest of a name counts.
     for (PrinterJob const& job : session_.jobs())
         if (keys.contains(job.name))
-            progress[job.name] = progressOf(job, reasons.empty() ? reasons : ": " + reasons);
+            progress[job.name] = toldOf(job, reasons.empty() ? reasons : ": " + reasons);
     return progress;
+}
+
+/// A job whose document never came holds up every other job of a small printer, for good.
+Progress PrinterCarrier::toldOf(PrinterJob const& job, std::string const& hindrance) {
+    if (!job.lacksDocument || job.state != PrinterJob::State::Waiting || job.wasBegun || !isTakenBack(job.id))
+        return progressOf(job, hindrance);
+    return {Progress::Kind::Lost, nameOf(job) + " never got its document, and is cancelled"};
 }
 
 std::string PrinterCarrier::test() {

@@ -20,6 +20,7 @@ private:
     void cancelLeft(std::string const& key);
     Outcome given(int job, Parcel const& parcel, std::string const& more);
     bool isTakenBack(int job);
+    Progress toldOf(PrinterJob const& job, std::string const& hindrance);
 
     std::string uri_;
     PrinterSession session_;

@@ -77,6 +77,8 @@ void note(ipp_attribute_t* attribute, PrinterJob& job) {
     else if (name == "time-at-processing")
         // Nothing of a number until then.
         job.wasBegun = job.wasBegun || ippGetValueTag(attribute) == IPP_TAG_INTEGER;
+    else if (name == "job-state-reasons")
+        job.lacksDocument = ippContainsString(attribute, "job-data-insufficient") != 0;
 }
 
 /// In the order of the message.
@@ -151,14 +153,15 @@ public:
 
     std::vector<PrinterJob> jobs() {
         std::vector<PrinterJob> all;
-        for (char const* const which : {"completed", "not-completed"}) {
+        // One that ends meanwhile is told of twice rather than not at all.
+        for (char const* const which : {"not-completed", "completed"}) {
             Message request = newRequest(IPP_OP_GET_JOBS);
             ippAddString(request.get(), IPP_TAG_OPERATION, IPP_TAG_KEYWORD, "which-jobs", nullptr, which);
             wantJob(request.get());
             for (PrinterJob& job : jobsIn(answerTo(std::move(request)).get()))
                 all.push_back(std::move(job));
         }
-        std::ranges::sort(all, {}, &PrinterJob::id);
+        std::ranges::stable_sort(all, {}, &PrinterJob::id);
         return all;
     }
 
@@ -246,7 +249,7 @@ private:
                       static_cast<int>(attributes.size()), nullptr, attributes.data());
     }
     static void wantJob(ipp_t* request) {
-        want(request, {"job-id", "job-name", "job-state", "time-at-processing"});
+        want(request, {"job-id", "job-name", "job-state", "job-state-reasons", "time-at-processing"});
     }
 
     Message answerTo(Message request) {

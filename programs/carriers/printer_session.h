@@ -41,6 +41,8 @@ struct PrinterJob {
     State state = State::Waiting;
     /// Whether the printer has ever begun with it.
     bool wasBegun = false;
+    /// Whether it was made and nothing of a document has come, and none is coming.
+    bool lacksDocument = false;
 
     bool isOver() const { return state == State::Cancelled || state == State::Aborted; }
 };

@@ -91,7 +91,7 @@ pid_t IppPrinter::start(std::vector<std::string> const& arguments, int readyOn, 
 
 IppPrinter::IppPrinter(fs::path const& folder, std::string const& script,
                        std::vector<std::string> const& offers)
-    : folder_(folder), port_(freePort()) {
+    : folder_(folder) {
     fs::create_directories(folder_ / "spool");
     fs::path const program = folder_ / "print";
     std::ofstream(program) << "#!/bin/sh\ncd '" << folder_.string()
@@ -104,17 +104,30 @@ IppPrinter::IppPrinter(fs::path const& folder, std::string const& script,
     bus_ = start({BUS, "--session", "--nofork", "--nopidfile", "--print-address", "--address=" + address}, 1,
                  "unix:");
     ::setenv("DBUS_SYSTEM_BUS_ADDRESS", address.c_str(), 1);
-    std::vector<std::string> arguments{PRINTER, "-v",
-                                       "-d",    (folder_ / "spool").string(),
-                                       "-c",    program.string(),
-                                       "-f",    "application/pdf",
-                                       "-p",    std::to_string(port_),
-                                       "-n",    "localhost",
-                                       "-r",    "off"};
-    arguments.insert(arguments.end(), offers.begin(), offers.end());
-    arguments.emplace_back("Test");
-    printer_ = start(arguments, 2, "printer-uuid");
+    startPrinter(program, offers);
     relay_.emplace([port = port_] { return VLServiceTest::connectedTo(port); });
+}
+
+/// Somebody else may take its port in front of it.
+void IppPrinter::startPrinter(fs::path const& program, std::vector<std::string> const& offers) {
+    for (int attempt = 1; printer_ <= 0; ++attempt) {
+        port_ = freePort();
+        std::vector<std::string> arguments{PRINTER, "-v",
+                                           "-d",    (folder_ / "spool").string(),
+                                           "-c",    program.string(),
+                                           "-f",    "application/pdf",
+                                           "-p",    std::to_string(port_),
+                                           "-n",    "localhost",
+                                           "-r",    "off"};
+        arguments.insert(arguments.end(), offers.begin(), offers.end());
+        arguments.emplace_back("Test");
+        try {
+            printer_ = start(arguments, 2, "printer-uuid");
+        } catch (std::runtime_error const&) {
+            if (attempt == 5)
+                throw;
+        }
+    }
 }
 
 IppPrinter::~IppPrinter() {

@@ -29,6 +29,7 @@ public:
 
 private:
     pid_t start(std::vector<std::string> const& arguments, int readyOn, char const* readyWord) const;
+    void startPrinter(std::filesystem::path const& program, std::vector<std::string> const& offers);
 
     std::filesystem::path folder_;
     std::uint16_t port_ = 0;

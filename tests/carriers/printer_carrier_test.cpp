@@ -140,6 +140,22 @@ TEST_F(PrinterCarrierTest, TellsOfTheLatestJobOfAKey) {
     awaitWords("p1-1", "job 2 is printed");
 }
 
+TEST_F(PrinterCarrierTest, TakesBackAJobThatNeverGotItsDocumentSoThatThePrinterIsFreeForOthers) {
+    start("");
+    {
+        Carriers::PrinterSession session(printer_->uri());
+        session.facts();
+        session.create("p1-1", {});
+    }
+    EXPECT_EQ(tried(parcelOf("p1-2", {"Bob"})).kind, Outcome::Kind::Failed) << "this one takes one at a time";
+    Progress const told = carrier_->ask({"p1-1"}).at("p1-1");
+    EXPECT_EQ(told.kind, Progress::Kind::Lost);
+    EXPECT_EQ(told.says, "job 1 never got its document, and is cancelled");
+    EXPECT_EQ(handOver(parcelOf("p1-2", {"Bob"})).kind, Outcome::Kind::Accepted);
+    EXPECT_EQ(endOf("p1-2"), "job 2 is printed");
+    EXPECT_EQ(timesPrinted("p1-1"), 0);
+}
+
 TEST_F(PrinterCarrierTest, SaysWhatThePrinterOffers) {
     start("");
     EXPECT_THAT(carrier_->test(), StartsWith("Test takes jobs; it offers one-sided, two-sided-long-edge, "
