@@ -1,5 +1,6 @@
 #include "programs/manual/markdown.h"
 
+#include <algorithm>
 #include <sstream>
 #include <string_view>
 
@@ -56,6 +57,12 @@ bool isItem(std::string const& line) {
            (digits != 0 && digits != std::string::npos && line.substr(digits, 2) == ". ");
 }
 
+/// A line that is for those who keep the page.
+bool isRemark(std::string const& line) {
+    std::string const text = trimmed(line);
+    return text.starts_with("<!--") && text.ends_with("-->");
+}
+
 bool isRule(std::string const& line) { return line.find_first_not_of("|-: ") == std::string::npos; }
 
 class Blocks {
@@ -69,16 +76,22 @@ public:
 
 private:
     void takeLine(std::string const& line) {
-        if (line.starts_with(FENCE)) {
-            isCode_ = !isCode_;
-            if (isCode_)
-                blocks_.push_back({Kind::Code});
-            goesOn_ = false;
-        } else if (isCode_) {
-            blocks_.back().text += line + '\n';
-        } else {
+        if (trimmed(line).starts_with(FENCE))
+            takeFence(line.find(FENCE));
+        else if (isCode_)
+            blocks_.back().text +=
+                line.substr(std::min({codeIndent_, line.find_first_not_of(' '), line.size()})) + '\n';
+        else if (!isRemark(line))
             takeText(withoutAddresses(line));
-        }
+    }
+
+    /// A fence of an item stands as far in as the item's text, and so do the lines in it.
+    void takeFence(std::size_t indent) {
+        isCode_ = !isCode_;
+        codeIndent_ = indent;
+        if (isCode_)
+            blocks_.push_back({Kind::Code});
+        goesOn_ = false;
     }
 
     void takeText(std::string const& line) {
@@ -119,6 +132,7 @@ private:
 
     std::vector<Block> blocks_;
     bool isCode_ = false;
+    std::size_t codeIndent_ = 0;
     bool inTable_ = false;
     /// Whether the next line belongs to the last block.
     bool goesOn_ = false;

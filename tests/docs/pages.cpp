@@ -12,6 +12,7 @@ namespace fs = std::filesystem;
 
 namespace {
 
+std::regex const FENCE(" *```.*");
 std::regex const HEADING("#+ +(.*)");
 std::regex const CODE("`[^`]*`");
 std::regex const LINK(R"(\]\(([^)]+)\))");
@@ -66,7 +67,7 @@ Page::Page(fs::path const& file) {
         throw std::runtime_error("cannot read " + file.string());
     bool isExample = false;
     for (std::string line; std::getline(in, line);) {
-        bool const isFence = line.starts_with("```");
+        bool const isFence = std::regex_match(line, FENCE);
         isExample ^= isFence;
         if (!isExample && !isFence)
             readLine(line);

@@ -92,7 +92,8 @@ protected:
 TEST_F(MadePages, AreFoundBrokenWhereTheyLinkToWhatIsNotThere) {
     write("README.md", "[a](docs/a.md) [b](docs/b.md)\n[c](docs/a.md#what-it-s)[d](docs/a.md#what-its)\n");
     write("docs/a.md", "## What it's\n[up](../README.md) [here](#what-its) [there](#above)\n"
-                       "[far](https://example.org/none.md) `[code](none)`\n```\n[example](none.md)\n```\n");
+                       "[far](https://example.org/none.md) `[code](none)`\n```\n[example](none.md)\n```\n"
+                       "1. x\n  \n   ```console\n   [example](none.md)\n   ```\n");
     EXPECT_THAT(brokenLinks(folder_.path()),
                 ElementsAre("README.md: docs/b.md", "README.md: docs/a.md#what-it-s", "docs/a.md: #above"));
 }

@@ -35,6 +35,17 @@ TEST(Markdown, LeavesCodeAsItStands) {
                 ElementsAre("paragraph: Run:", "code: # vlmail [a](b)\n\n| x |\n", "paragraph: Done."));
 }
 
+TEST(Markdown, LeavesCodeOfAnItemAsItStandsThere) {
+    EXPECT_THAT(inWords("1. Run:\n\n   ```console\n   $ ls\n\n     a\n b\n   ```\n   Done.\n"),
+                ElementsAre("item: Run:", "code: $ ls\n\n  a\nb\n", "paragraph: Done."));
+}
+
+TEST(Markdown, LeavesRemarksOut) {
+    EXPECT_THAT(
+        inWords("One\n<!-- not run: it takes root -->\n```\n<!-- x -->\n```\n  <!-- y -->\ntwo <!-- z\n"),
+        ElementsAre("paragraph: One", "code: <!-- x -->\n", "paragraph: two <!-- z"));
+}
+
 TEST(Markdown, TakesTablesRowByRow) {
     EXPECT_THAT(inWords("| Key | Holds |\n|---|---|\n| `a\\|b` | text | |\n\n| Key of it | Holds "
                         "|\n|---|---|\n| c | d |\n"),

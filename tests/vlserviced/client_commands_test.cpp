@@ -424,6 +424,17 @@ TEST_F(ClientCommands, AFileReplacesAPart) {
     EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"B"})"));
 }
 
+TEST_F(ClientCommands, AFileWithSettingsOfANodeGivesThePartThatIsNamed) {
+    std::string const file = write("node.json", R"({"po":{"code":"C"},"app":{"descr":"x"}})");
+    output({"settings", "set", "a=acme", "po", file});
+    EXPECT_EQ(output({"settings", "impact", "a=acme", "po", file}), "nothing would have another value\n");
+    std::string const own = output({"settings", "show", "a=acme", "po", "app", "--json"});
+    EXPECT_THAT(own, HasSubstr(R"("po":{"own":{"code":"C"})"));
+    EXPECT_THAT(own, HasSubstr(R"("app":{"own":{})"));
+    EXPECT_EQ(output({"settings", "impact", "a=acme", "po", write("other.json", R"({"po":{"code":"D"}})")}),
+              "node    would have other values of\na=acme  code\n");
+}
+
 TEST_F(ClientCommands, AResetLetsTheNodeInheritAgain) {
     output({"settings", "set", "a=acme", "po", "code=A", "expiry=5"});
     output({"settings", "set", "a=acme", "app", "descr=x"});

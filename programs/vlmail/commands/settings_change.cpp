@@ -85,13 +85,20 @@ json::Object assigned(PartSettings settings, std::string const& part,
     return settings.own;
 }
 
+/// From a file that holds the part, or settings of a node with the part under its name.
+json::Object readPart(std::string const& file, std::string const& part) {
+    json::Object const document = readDocument(file);
+    json::Value const named = document.get(part);
+    return named.isObject() ? named.toObject() : document;
+}
+
 int set(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal.err);
     std::string const node = nodeIdIn(options.node);
     bool const isFile = options.what.size() == 1 && options.what.front().find('=') == std::string::npos;
     PartSettings const settings = fetchPart(*service, node, options.part);
-    json::Object const own =
-        isFile ? readDocument(options.what.front()) : assigned(settings, options.part, options.what);
+    json::Object const own = isFile ? readPart(options.what.front(), options.part)
+                                    : assigned(settings, options.part, options.what);
     for (auto const& [key, value] : own)
         requireKey(options.part, key, settings.values);
     setPart(*service, node, options.part, own);
@@ -133,7 +140,7 @@ int reset(Options const& options, Terminal const& terminal) {
 
 /// What setting the file would change.
 int impact(Options const& options, Terminal const& terminal) {
-    json::Object const own = readDocument(options.what.front());
+    json::Object const own = readPart(options.what.front(), options.part);
     auto const service = connectToService(options.service, terminal.err);
     json::Object const answer =
         ask(*service, Protocol::SettingsImpactQuery(nodeIdIn(options.node), options.part, own));
@@ -185,7 +192,7 @@ void addSettingsChangeCommands(Base::Command const& settings, Task& task) {
         .addOption(
             "WHAT", options->what,
             "KEY=VALUE for each value to change, or a JSON file (- is standard input) that replaces all "
-            "values of the part that the node has")
+            "values of the part that the node has: the part, or settings of a node with the part among them")
         .required();
     Base::Command const resetting = addCommand(
         settings, task, "reset", "Lets a node inherit again what it has of its own", &reset, options);
@@ -196,7 +203,7 @@ void addSettingsChangeCommands(Base::Command const& settings, Task& task) {
                    "Tells what would count otherwise at which nodes if \"settings set\" took the file",
                    &impact, options);
     asking.addOption("PART", options->part, part).required();
-    asking.addOption("FILE", options->what, "A JSON file with all values of the part; - is standard input")
+    asking.addOption("FILE", options->what, "A JSON file as \"settings set\" takes; - is standard input")
         .required();
     asking.addFlag("--json", options->json, "The service's answer as one JSON object");
     addCommand(settings, task, "remove", "Removes a node that has none below it", &remove, options);
