@@ -5,11 +5,11 @@
 #include "vlservice/json/json_record.h"
 #include "vlservice/platform/log.h"
 
+#include <boost/container/small_vector.hpp>
+
 #include <algorithm>
-#include <array>
 #include <cstddef>
 #include <exception>
-#include <memory_resource>
 #include <string>
 #include <tuple>
 #include <type_traits>
@@ -143,13 +143,12 @@ std::shared_ptr<ExtractedField> ExtractField::measured(std::string& text, Found 
 
 std::shared_ptr<ExtractedField> ExtractField::makeValue(std::string_view found) const {
     // Most values are short: what is changed in them is changed on the stack.
-    std::array<char, 256> room;
-    std::pmr::monotonic_buffer_resource memory(room.data(), room.size());
-    std::pmr::string text(found, &memory);
+    boost::container::small_vector<char, 256> text(found.begin(), found.end());
     if (make1Line_)
-        std::erase(text, '\n');
+        text.erase(std::remove(text.begin(), text.end(), '\n'), text.end());
     std::replace(text.begin(), text.end(), '\t', ' ');
-    return std::make_shared<ExtractedField>(name_, text.c_str(), priority_, sendToServer_, ignoreOnGroup_,
+    text.push_back('\0');
+    return std::make_shared<ExtractedField>(name_, text.data(), priority_, sendToServer_, ignoreOnGroup_,
                                             ExtractedField::ValueType::NotValidated);
 }
 
