@@ -6,8 +6,9 @@
 
 A block ```console holds commands, each behind "$ ", its further lines behind "> ", and below it all that it prints. PROGRAMS
 are the folders of the built programs, as in PATH. SETUP is a program that makes ready what the page takes for granted: it
-gets the folder, prints NAME=VALUE for variables of the shell, and lasts until its input ends. With UPDATE_GOLDEN=1 in the
-environment what is printed is written into the page instead; read what that changes before you keep it.
+prints NAME=VALUE for variables of the shell, then an empty line, and lasts until its input ends; without that line the page
+is skipped. With UPDATE_GOLDEN=1 in the environment what is printed is written into the page instead; read what that changes
+before you keep it.
 
 A comment right above a block tells more:
   <!-- file: NAME -->          the block, of whatever kind, is written into that file
@@ -18,8 +19,9 @@ A comment right above a block tells more:
 
 What varies (VARYING below) is shown as it was once, and is held against what is printed by its form. Ids and addresses keep who
 they are: where a command names one that was printed before, it gets the one that this run printed. Pages call the folder
-/home/ada, and the installed examples stand for those of the sources.
+/home/ada, the installed examples stand for those of the sources, and what runs as another account is its client of PostgreSQL.
 """
+import contextlib
 import os
 import re
 import select
@@ -32,6 +34,7 @@ import time
 from collections import namedtuple
 
 PATIENCE = 120
+SKIPPED = 77
 
 # Name, form, and whether one that comes again is the same one.
 VARYING = [
@@ -47,7 +50,7 @@ FORMS = re.compile("|".join("(%s)" % form for _, form, _ in VARYING))
 # In commands: what a page says, what is run.
 HOME = "/home/ada"
 INSTALLED = "/usr/share/doc/vlservice-doc"
-AS_POSTGRES = "runuser -u postgres -- "
+AS_ACCOUNT = re.compile(r"\brunuser -u (\w+) -- ")
 
 REMARK = re.compile(r"<!-- (.*) -->$")
 FENCE = re.compile(r"^( *)```(.*)$")
@@ -164,7 +167,7 @@ class Shell:
         self.own = tempfile.mkdtemp(prefix="vlservice.")
         self.outputs = []
         shutil.copytree(os.path.join(sources, "examples"), os.path.join(self.folder, "examples"))
-        environment = {"HOME": self.folder, "PATH": programs + ":" + os.environ["PATH"], "LC_ALL": "C.UTF-8", "TZ": "UTC"}
+        environment = {"HOME": self.folder, "PATH": programs + ":/usr/sbin:/usr/bin:/sbin:/bin", "LC_ALL": "C.UTF-8", "TZ": "UTC"}
         status, self.ends = os.pipe()
         self.statuses = os.fdopen(status, "rb", 0)
         self.process = subprocess.Popen(
@@ -241,7 +244,7 @@ class Walk:
         return lines
 
     def command(self, lines):
-        text = "\n".join(lines).replace(AS_POSTGRES, "").replace(INSTALLED + "/", self.sources + "/")
+        text = AS_ACCOUNT.sub(r"env PGUSER=\1 ", "\n".join(lines)).replace(INSTALLED + "/", self.sources + "/")
         return self.varying.in_command(text.replace(HOME, self.shell.folder))
 
     def printed(self, text, shown):
@@ -279,14 +282,20 @@ def read(page):
         return file.read()
 
 
-def set_up(program, folder):
-    """The process that makes things ready, and the variables that it tells."""
-    process = subprocess.Popen([program, folder], stdin=subprocess.PIPE, stdout=subprocess.PIPE, text=True)
-    variables = {}
-    while line := process.stdout.readline().strip():
-        name, _, value = line.partition("=")
-        variables[name] = value
-    return process, variables
+@contextlib.contextmanager
+def made_ready(program):
+    """The variables that the program tells, None when it cannot make ready what is wanted."""
+    if not program:
+        yield {}
+        return
+    process = subprocess.Popen([program], stdin=subprocess.PIPE, stdout=subprocess.PIPE, text=True)
+    lines = []
+    while (line := process.stdout.readline()).strip():
+        lines.append(line.strip())
+    try:
+        yield dict(line.split("=", 1) for line in lines) if line else None
+    finally:
+        process.communicate()
 
 
 def walk(sources, programs, page, variables):
@@ -309,14 +318,11 @@ def is_updating():
 
 
 def run(sources, programs, page, setup=None):
-    process, variables = None, {}
-    if setup:
-        process, variables = set_up(setup, tempfile.gettempdir())
-    try:
+    with made_ready(setup) as variables:
+        if variables is None:
+            print("%s cannot make ready what %s takes for granted" % (setup, page))
+            return SKIPPED
         faults, right = walk(sources, programs, page, variables)
-    finally:
-        if process:
-            process.communicate()
     if is_updating():
         with open(page, "w", encoding="utf-8") as file:
             file.write(right)
