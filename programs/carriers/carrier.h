@@ -60,6 +60,18 @@ struct Parcel {
     std::string replyTo;
 };
 
+/// An e-mail of text alone that tells of a mailing, or of one of its letters.
+struct Notice {
+    /// The same at every attempt.
+    std::string key;
+    std::string to;
+    /// Where answers go; may be empty.
+    std::string replyTo;
+    /// A line.
+    std::string subject;
+    std::string text;
+};
+
 /// How handing over has ended.
 struct Outcome {
     enum class Kind {
@@ -106,6 +118,10 @@ public:
     /// before the step from which on the other side may act; not by a carrier under whose keys anything can
     /// be handed over again, where it replaces what is there.
     virtual Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) = 0;
+    /// The same with a notice, which carriers of e-mail send alone.
+    virtual Outcome send(Notice const& /*notice*/, PutOnRecord const& /*mayHaveIt*/) {
+        return {Outcome::Kind::Refused, "its carrier sends no e-mails"};
+    }
     /// Of those keys that the other side can tell something of. Throws std::exception with one line.
     virtual std::map<std::string, Progress> ask(std::set<std::string> const& /*keys*/) { return {}; }
     /// Tries the other side without sending anything, and says in one line what it offers. Throws

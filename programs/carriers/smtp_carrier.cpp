@@ -75,18 +75,32 @@ SmtpServer SmtpCarrier::server() const {
     return server;
 }
 
-MailMessage SmtpCarrier::messageFor(Parcel const& parcel) const {
-    OutgoingLetter const& letter = parcel.letters.front();
+MailMessage SmtpCarrier::messageUnder(std::string const& key, std::string const& to,
+                                      std::string const& replyTo) const {
     MailMessage message;
     message.from = settings_.from;
     message.fromName = settings_.fromName;
-    message.to =
-        plainAddress(settings_.to.empty() ? letter.address : filledIn(settings_.to, letter, parcel.mailing));
-    if (!parcel.replyTo.empty())
-        message.replyTo = plainAddress(parcel.replyTo);
+    message.to = plainAddress(to);
+    if (!replyTo.empty())
+        message.replyTo = plainAddress(replyTo);
+    message.messageId = messageIdFor(key, hostOf(message.from));
+    return message;
+}
+
+MailMessage SmtpCarrier::messageFor(Notice const& notice) const {
+    MailMessage message = messageUnder(notice.key, notice.to, notice.replyTo);
+    message.subject = notice.subject;
+    message.text = notice.text;
+    return message;
+}
+
+MailMessage SmtpCarrier::messageFor(Parcel const& parcel) const {
+    OutgoingLetter const& letter = parcel.letters.front();
+    MailMessage message = messageUnder(
+        parcel.key, settings_.to.empty() ? letter.address : filledIn(settings_.to, letter, parcel.mailing),
+        parcel.replyTo);
     message.subject = filledIn(settings_.subject, letter, parcel.mailing);
     message.text = filledIn(settings_.text, letter, parcel.mailing);
-    message.messageId = messageIdFor(parcel.key, hostOf(message.from));
     message.attachments.push_back({parcel.key + ".pdf", parcel.document});
     for (auto const& [name, bytes] : parcel.attachments)
         message.attachments.push_back({name, bytes});
@@ -100,6 +114,20 @@ Outcome SmtpCarrier::handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt
     } catch (Base::Error const& bad) {
         return {Outcome::Kind::Refused, bad.what()};
     }
+    return send(message, mayHaveIt);
+}
+
+Outcome SmtpCarrier::send(Notice const& notice, PutOnRecord const& mayHaveIt) {
+    MailMessage message;
+    try {
+        message = messageFor(notice);
+    } catch (Base::Error const& bad) {
+        return {Outcome::Kind::Refused, bad.what()};
+    }
+    return send(message, mayHaveIt);
+}
+
+Outcome SmtpCarrier::send(MailMessage const& message, PutOnRecord const& mayHaveIt) {
     MimeText text(message);
     auto const read = [&text](char* into, std::size_t room) { return text.read(into, room); };
     return session_.send(server(), {message.from, message.to, text.size(), read}, mayHaveIt);

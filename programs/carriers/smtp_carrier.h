@@ -19,11 +19,16 @@ public:
     explicit SmtpCarrier(Protocol::CarrierSettings settings);
 
     Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
+    Outcome send(Notice const& notice, PutOnRecord const& mayHaveIt) override;
     std::string test() override;
 
 private:
+    /// With what all messages from here have, and to that address. Throws Error when it is none.
+    MailMessage messageUnder(std::string const& key, std::string const& to, std::string const& replyTo) const;
     /// Throws Error when the letter can never be sent.
     MailMessage messageFor(Parcel const& parcel) const;
+    MailMessage messageFor(Notice const& notice) const;
+    Outcome send(MailMessage const& message, PutOnRecord const& mayHaveIt);
     /// Throws Error when the password cannot be read.
     SmtpServer server() const;
 

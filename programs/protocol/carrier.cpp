@@ -350,6 +350,11 @@ CarrierSettings::CarrierSettings(json::Object const& object) {
 
 std::optional<DayWindow> CarrierSettings::window() const { return windowIn(hours); }
 
+bool sendsNotices(Carriers const& carriers) {
+    auto const found = carriers.find(NOTICE_CHANNEL);
+    return found != carriers.end() && found->second.type == CarrierType::Smtp;
+}
+
 Carriers carriersIn(json::Object const& object) {
     Carriers carriers;
     for (auto const& [channel, value] : object)

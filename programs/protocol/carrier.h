@@ -117,6 +117,11 @@ struct CarrierSettings {
 /// By the channel's name.
 using Carriers = std::map<std::string, CarrierSettings>;
 
+/// The channel by whose carrier people are told of mailings, when it sends e-mails.
+inline constexpr char const* NOTICE_CHANNEL = "email";
+/// Whether there is such a carrier.
+bool sendsNotices(Carriers const& carriers);
+
 /// The value of the service's setting "carriers". Throws Error, which names the channel.
 Carriers carriersIn(json::Object const& object);
 

@@ -90,6 +90,8 @@ struct JobReport::Keys {
         json::Key{"container", &JobReport::container},
         json::Key{"letters", &JobReport::letters},
         json::Key{"letters_left_out", &JobReport::lettersLeftOut},
+        json::Key{"notices", &JobReport::notices},
+        json::Key{"notices_left_out", &JobReport::noticesLeftOut},
     };
 };
 

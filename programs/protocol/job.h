@@ -114,6 +114,9 @@ struct JobReport {
     std::vector<LetterReport> letters;
     /// How many of its letters are not told of since there are too many.
     long long lettersLeftOut = 0;
+    /// Where letters were asked for, in their order.
+    std::vector<NoticeReport> notices;
+    long long noticesLeftOut = 0;
 
     JobReport() = default;
     /// Throws Error on a state that is not known.

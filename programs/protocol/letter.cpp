@@ -13,7 +13,7 @@ constexpr std::pair<LetterState, char const*> STATES[] = {
     {LetterState::Waiting, "waiting"},     {LetterState::HandedOver, "handed over"},
     {LetterState::Accepted, "accepted"},   {LetterState::Delivered, "delivered"},
     {LetterState::Returned, "returned"},   {LetterState::Failed, "failed"},
-    {LetterState::Uncertain, "uncertain"},
+    {LetterState::Uncertain, "uncertain"}, {LetterState::Held, "held"},
 };
 static_assert(std::size(STATES) == ALL_LETTER_STATES.size());
 
@@ -29,12 +29,10 @@ class StateKey {
 public:
     constexpr explicit StateKey(char const* name) : name_(name) {}
 
-    void read(json::Object const& from, LetterReport& into) const {
+    void read(json::Object const& from, auto& into) const {
         into.state = letterStateNamed(from.get(name_).textOrEmpty());
     }
-    void write(LetterReport const& from, json::Object& into) const {
-        into.set(name_, letterStateName(from.state));
-    }
+    void write(auto const& from, json::Object& into) const { into.set(name_, letterStateName(from.state)); }
 
 private:
     char const* name_;
@@ -50,11 +48,20 @@ struct LetterReport::Keys {
     };
 };
 
+struct NoticeReport::Keys {
+    static constexpr std::tuple TABLE{
+        Always{"number", &NoticeReport::number},    Always{"key", &NoticeReport::key},
+        json::Key{"letter", &NoticeReport::letter}, StateKey{"state"},
+        Always{"says", &NoticeReport::says},        Always{"changed", &NoticeReport::changed},
+    };
+};
+
 struct LetterChange::Keys {
     /// "action" is not among them.
     static constexpr std::tuple TABLE{
         Asked{"id", &LetterChange::id, TextForm{}},
-        Asked{"letter", &LetterChange::number, IntegerForm{.lowest = 1}},
+        Asked{"letter", &LetterChange::letter, IntegerForm{.lowest = 1}},
+        Asked{"notice", &LetterChange::notice, IntegerForm{.lowest = 1}},
     };
 };
 
@@ -73,8 +80,11 @@ LetterState letterStateNamed(std::string const& name) {
 LetterReport::LetterReport(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
 json::Object LetterReport::serialize() const { return writeRecord(*this); }
 
-LetterChange::LetterChange(LetterAction wanted, std::string packId, long long letter)
-    : action(wanted), id(std::move(packId)), number(letter) {}
+NoticeReport::NoticeReport(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
+json::Object NoticeReport::serialize() const { return writeRecord(*this); }
+
+LetterChange::LetterChange(LetterAction wanted, std::string packId, long long ofLetter, long long ofNotice)
+    : action(wanted), id(std::move(packId)), letter(ofLetter), notice(ofNotice) {}
 
 LetterChange::LetterChange(json::Object const& object) {
     json::readKeys(Keys::TABLE, object, *this);
@@ -84,8 +94,10 @@ LetterChange::LetterChange(json::Object const& object) {
         throw Base::Error("\"action\" of a change of a letter has to be \"delivered\", \"failed\" or "
                           "\"resend\"");
     action = found->first;
-    if (id.empty() || number == 0)
-        throw Base::Error("a change of a letter needs the \"id\" of its mailing and its number, \"letter\"");
+    if (id.empty() || (letter == 0) == (notice == 0))
+        throw Base::Error(
+            "a change of a letter needs the \"id\" of its mailing and its number, \"letter\", or "
+            "that of a notice, \"notice\"");
 }
 
 json::Object LetterChange::serialize() const {

@@ -26,11 +26,13 @@ enum class LetterState {
     Failed,
     /// The other side may have it or not; a person has to find out.
     Uncertain,
+    /// A notice alone: what it tells of has not happened yet.
+    Held,
 };
 
 inline constexpr std::array ALL_LETTER_STATES{
-    LetterState::Waiting,  LetterState::HandedOver, LetterState::Accepted, LetterState::Delivered,
-    LetterState::Returned, LetterState::Failed,     LetterState::Uncertain};
+    LetterState::Waiting,  LetterState::HandedOver, LetterState::Accepted,  LetterState::Delivered,
+    LetterState::Returned, LetterState::Failed,     LetterState::Uncertain, LetterState::Held};
 
 /// The name under which a state is kept and told: "handed over".
 char const* letterStateName(LetterState state);
@@ -59,6 +61,29 @@ struct LetterReport {
     struct Keys;
 };
 
+/// An e-mail that tells of a mailing, or of one of its letters.
+struct NoticeReport {
+    /// From 1, among the notices of the mailing.
+    long long number = 0;
+    /// The same at every attempt.
+    std::string key;
+    /// The letter that it tells of; 0 where that is the mailing.
+    long long letter = 0;
+    LetterState state = LetterState::Held;
+    /// As of a letter.
+    std::string says;
+    /// Seconds since the epoch.
+    long long changed = 0;
+
+    NoticeReport() = default;
+    /// Throws Error on a state that is not known.
+    explicit NoticeReport(json::Object const& object);
+    json::Object serialize() const;
+    bool operator==(NoticeReport const&) const = default;
+
+    struct Keys;
+};
+
 /// What a person decides of a letter.
 enum class LetterAction {
     /// An uncertain one has arrived.
@@ -69,7 +94,7 @@ enum class LetterAction {
     Resend,
 };
 
-/// Asks for a change of one letter.
+/// Asks for a change of one letter, or of one notice.
 struct LetterChange {
     static constexpr char const* KIND = "change_letter";
     static constexpr char const* IN_WORDS = "a change of a letter";
@@ -77,10 +102,12 @@ struct LetterChange {
     LetterAction action = LetterAction::Resend;
     /// The pack id.
     std::string id;
-    long long number = 0;
+    /// One of both is 0.
+    long long letter = 0;
+    long long notice = 0;
 
     LetterChange() = default;
-    LetterChange(LetterAction wanted, std::string packId, long long letter);
+    LetterChange(LetterAction wanted, std::string packId, long long ofLetter, long long ofNotice = 0);
     /// Throws Error on an action that there is not, and on a wrong type.
     explicit LetterChange(json::Object const& object);
     /// With "query", as the questions have it.

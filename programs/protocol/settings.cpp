@@ -1,6 +1,7 @@
 #include "programs/protocol/settings.h"
 
 #include "programs/base/error.h"
+#include "programs/protocol/carrier.h"
 #include "programs/protocol/query.h"
 #include "programs/protocol/rows.h"
 
@@ -10,12 +11,14 @@ namespace Protocol {
 namespace {
 
 constexpr char const* OWN = "own";
+constexpr char const* CARRIERS = "carriers";
 
 } // namespace
 
 struct SettingsQuery::Keys {
     static constexpr std::tuple TABLE{
         Asked{"parts", &SettingsQuery::parts, TextsForm{MAX_PARTS}},
+        Asked{CARRIERS, &SettingsQuery::carriers, FlagForm{}},
     };
 };
 
@@ -82,8 +85,24 @@ json::Object SettingsQuery::serialize() const {
 PartSettings::PartSettings(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
 json::Object PartSettings::serialize() const { return writeRecord(*this); }
 
-SettingsAnswer::SettingsAnswer(json::Object const& object) { json::readKeys(Keys::TABLE, object, *this); }
-json::Object SettingsAnswer::serialize() const { return writeRecord(*this); }
+SettingsAnswer::SettingsAnswer(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+    if (json::Value const told = object.get(CARRIERS); told.isObject())
+        carriers = told;
+}
+
+json::Object SettingsAnswer::serialize() const {
+    json::Object object = writeRecord(*this);
+    if (carriers)
+        object.set(CARRIERS, carriers);
+    return object;
+}
+
+std::optional<bool> SettingsAnswer::sendsNotices() const {
+    if (!carriers)
+        return std::nullopt;
+    return carriers.toObject().get(NOTICE_CHANNEL).textOrEmpty() == carrierTypeName(CarrierType::Smtp);
+}
 
 PartSettings SettingsAnswer::part(std::string const& name) const {
     json::Value const found = parts.get(name);

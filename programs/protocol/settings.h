@@ -4,6 +4,7 @@
 #include "vlservice/json/json.h"
 
 #include <cstddef>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -19,6 +20,8 @@ struct SettingsQuery {
     std::string id;
     /// Names of settings parts; none are all.
     std::vector<std::string> parts;
+    /// Whether the channels are to be told that letters leave the service by.
+    bool carriers = false;
 
     SettingsQuery() = default;
     SettingsQuery(std::string nodeId, std::vector<std::string> wantedParts);
@@ -55,6 +58,8 @@ struct SettingsAnswer {
     std::vector<std::string> chain;
     /// The form of PartSettings by the part's name, in the order of the question.
     json::Object parts;
+    /// Where that was asked: the types of carriers by their channels. Older services tell of none.
+    json::Value carriers;
 
     SettingsAnswer() = default;
     explicit SettingsAnswer(json::Object const& object);
@@ -62,6 +67,8 @@ struct SettingsAnswer {
 
     /// A part's settings; empty ones when the answer has none of that name.
     PartSettings part(std::string const& name) const;
+    /// Whether the service sends notices; nothing where it did not say so.
+    std::optional<bool> sendsNotices() const;
 
     struct Keys;
 };

@@ -278,7 +278,7 @@ Protocol::DeliveryReportAnswer Processor::noteReport(Protocol::DeliveryReport co
     StoredLetter const letter = letters_.note(*id, mail.kind, mail.says);
     Protocol::DeliveryReportAnswer answer;
     answer.id = letter.id.packId;
-    answer.letter.number = letter.id.number;
+    answer.letter.number = letter.id.isNotice() ? -letter.id.number : letter.id.number;
     answer.letter.key = letter.id.key();
     answer.letter.channel = letter.channel;
     answer.letter.state = letter.state;

@@ -130,6 +130,33 @@ TEST_F(SmtpCarrierTest, SendsAttachmentsAsFilesAndSaysWhereAnswersGo) {
                       HasSubstr("\r\nReply-To: service@acme.example\r\n")));
 }
 
+TEST_F(SmtpCarrierTest, SendsNoticesAsTextsAlone) {
+    REQUIRE_SERVER(begin());
+    Carriers::SmtpCarrier carrier(settings_);
+    int recorded = 0;
+    auto const send = [&](char const* to) {
+        return carrier.send(Carriers::Notice{"p1-n1", to, "office@acme.example",
+                                             "Handed over: \"Rechnungen M\u00e4rz\"",
+                                             "The mailing was handed over.\n\npostal: 2 letters accepted\n"},
+                            [&] { ++recorded; });
+    };
+    EXPECT_EQ(send("ada@example.com").kind, Outcome::Kind::Accepted);
+    EXPECT_EQ(recorded, 1);
+    ASSERT_THAT(server_->messages(), SizeIs(1));
+    std::string const message = server_->messages().front();
+    EXPECT_THAT(message, StartsWith("bills@acme.example\nada@example.com\n"));
+    for (char const* const line :
+         {"Message-Id: <p1-n1@acme.example>\r\n", "Reply-To: office@acme.example\r\n",
+          "Auto-Submitted: auto-generated\r\n", "Content-Type: text/plain; charset=utf-8\r\n",
+          "postal: 2 letters accepted\r\n"})
+        EXPECT_THAT(message, HasSubstr(line));
+    EXPECT_THAT(message, Not(HasSubstr("attachment")));
+    Outcome const refused = send("+49 341 1");
+    EXPECT_EQ(refused.kind, Outcome::Kind::Refused);
+    EXPECT_EQ(refused.says, "\"+49 341 1\" is not one plain e-mail address");
+    EXPECT_EQ(recorded, 1);
+}
+
 TEST_F(SmtpCarrierTest, KeepsTheConnection) {
     REQUIRE_SERVER(begin(R"({"connections":1})"));
     for (int i = 0; i < 3; ++i)

@@ -208,8 +208,12 @@ TEST(LetterChangeReading, RefusesWhatNamesNoLetter) {
     };
     EXPECT_EQ(refused(R"({"action": "burn", "id": "p1", "letter": 1})"),
               "\"action\" of a change of a letter has to be \"delivered\", \"failed\" or \"resend\"");
-    EXPECT_EQ(refused(R"({"action": "resend", "id": "p1"})"),
-              "a change of a letter needs the \"id\" of its mailing and its number, \"letter\"");
+    for (char const* const unclear :
+         {R"({"action": "resend", "id": "p1"})", R"({"action": "resend", "letter": 1})",
+          R"({"action": "resend", "id": "p1", "letter": 1, "notice": 1})"})
+        EXPECT_EQ(refused(unclear), "a change of a letter needs the \"id\" of its mailing and its number, "
+                                    "\"letter\", or that of a notice, \"notice\"")
+            << unclear;
     EXPECT_EQ(refused(R"({"action": "resend", "id": "p1", "letter": 0})"),
               "\"letter\" of a change of a letter has to be an integer above 0");
 }

@@ -43,6 +43,17 @@ TEST(SettingsAnswerReading, GivesEachPartByItsName) {
     EXPECT_EQ(print(answer.serialize()), text);
 }
 
+TEST(SettingsAnswerReading, TellsWhetherNoticesAreSentWhereTheServiceSaysSo) {
+    auto const sends = [](char const* answer) { return SettingsAnswer(parse(answer)).sendsNotices(); };
+    EXPECT_EQ(sends("{}"), std::nullopt);
+    EXPECT_EQ(sends(R"({"carriers":7})"), std::nullopt);
+    EXPECT_EQ(sends(R"({"carriers":{}})"), false);
+    EXPECT_EQ(sends(R"({"carriers":{"email":"folder","fax":"smtp"}})"), false);
+    EXPECT_EQ(sends(R"({"carriers":{"email":"smtp"}})"), true);
+    SettingsAnswer const answer(parse(R"({"carriers":{"email":"smtp"}})"));
+    EXPECT_EQ(SettingsAnswer(answer.serialize()).sendsNotices(), true);
+}
+
 TEST(TreeNodeReading, FollowsTheTreeDown) {
     std::string const text =
         R"({"id":"","descr":"","parts":[],"children":[{"id":"a=acme","descr":"Acme","disabled":true,)"

@@ -1,4 +1,5 @@
 // The client's subcommands against a service: the command line in, text and exit status out.
+#include "programs/base/read_file.h"
 #include "programs/channel/data_message.h"
 #include "programs/channel/token.h"
 #include "programs/mailing/metadata.h"
@@ -21,9 +22,11 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <cstdlib>
 #include <ctime>
 #include <fstream>
 #include <sstream>
+#include <sys/wait.h>
 #include <thread>
 
 namespace {
@@ -75,6 +78,23 @@ protected:
     std::string write(char const* name, std::string const& text) {
         std::ofstream(folder_ / name) << text;
         return (folder_ / name).string();
+    }
+
+    void awaitAccepted(std::string const& id) {
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+        while (output({"status", id}).find("accepted") == std::string::npos &&
+               std::chrono::steady_clock::now() < end) {
+        }
+    }
+    /// What a server of e-mail says of a letter.
+    static std::string reportOn(std::string const& key, std::string const& action) {
+        return "Content-Type: multipart/report; boundary=X\n\n--X\n\nSorry.\n--X\n"
+               "Content-Type: message/delivery-status\n\nReporting-MTA: dns; mail.example\n\n"
+               "Action: " +
+               action +
+               "\nDiagnostic-Code: smtp; 550 no such user\n\n--X\n"
+               "Content-Type: text/rfc822-headers\n\nMessage-ID: <" +
+               key + "@acme.example>\n\n--X--\n";
     }
 
     TemporaryFolder folder_;
@@ -349,22 +369,14 @@ TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {
               server.url() + " offers SIZE 1073741824, 8BITMIME, HELP\n");
     storeLetters(folder_ / "packs.db", "p1", {"email"});
     output({"resume", "p1", "--database", (folder_ / "packs.db").string(), "--upload"});
-    server.awaitMessage();
-    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
-    while (output({"status", "p1"}).find("accepted") == std::string::npos &&
-           std::chrono::steady_clock::now() < end) {
-    }
+    awaitAccepted("p1");
     fs::path const mailbox = folder_ / "mailbox";
     fs::create_directories(mailbox / "new");
     EXPECT_EQ(complaint({"bounce", "--maildir", mailbox.string()}),
               "vlmail: " + mailbox.string() + " is no mailbox (Maildir) with the folders new and cur\n");
     fs::create_directories(mailbox / "cur");
     std::ofstream(mailbox / "new" / "1.a") << "Subject: hello\n\nyou\n";
-    std::ofstream(mailbox / "new" / "2.b")
-        << "Content-Type: multipart/report; boundary=X\n\n--X\n\nSorry.\n--X\n"
-           "Content-Type: message/delivery-status\n\nReporting-MTA: dns; mail.example\n\n"
-           "Action: failed\nDiagnostic-Code: smtp; 550 no such user\n\n--X\n"
-           "Content-Type: text/rfc822-headers\n\nMessage-ID: <p1-1@acme.example>\n\n--X--\n";
+    std::ofstream(mailbox / "new" / "2.b") << reportOn("p1-1", "failed");
     Result const taken = vlmail({"bounce", "--maildir", mailbox.string()});
     EXPECT_EQ(taken.status, VlMail::INCOMPLETE);
     EXPECT_EQ(taken.out, "p1-1, returned: 550 no such user\n");
@@ -372,6 +384,37 @@ TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {
     EXPECT_TRUE(fs::exists(mailbox / "new" / "1.a"));
     EXPECT_TRUE(fs::exists(mailbox / "cur" / "2.b:2,S"));
     EXPECT_THAT(vlmail({"status", "p1"}).out, HasSubstr("returned"));
+}
+
+/// As a mail server's aliases have it.
+TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAPipe) {
+    VLServiceTest::SmtpServer const server(folder_ / "mails", {});
+    if (!server.missing().empty())
+        GTEST_SKIP() << server.missing();
+    output({"settings", "service",
+            R"(carriers={"email":{"type":"smtp","starttls":false,"url":")" + server.url() +
+                R"(","from":"bills@acme.example","to":"{key}@example.com","subject":"Letter"}})"});
+    storeLetters(folder_ / "packs.db", "p1", {"email"});
+    output({"resume", "p1", "--database", (folder_ / "packs.db").string(), "--upload"});
+    awaitAccepted("p1");
+    auto const bounce = [&](std::string const& message, std::string const& more = "") {
+        write("message", message);
+        std::string const command =
+            "cat '" + (folder_ / "message").string() +
+            "' | '" VLMAIL_PROGRAM "' bounce --service 127.0.0.1:" + std::to_string(service_.port()) +
+            " --token '" + (data_ / "token").string() + "' " + more + " >'" + (folder_ / "told").string() +
+            "' 2>&1";
+        int const status = std::system(command.c_str());
+        return std::to_string(WEXITSTATUS(status)) + ' ' + Base::readFile(folder_ / "told");
+    };
+    EXPECT_EQ(bounce("Subject: hello\n\nyou\n"),
+              "1 vlmail: the message is no report of a server of e-mail (multipart/report)\n");
+    EXPECT_EQ(bounce(""), "1 vlmail: the message is no report of a server of e-mail (multipart/report)\n");
+    EXPECT_EQ(bounce(reportOn("p2-1", "failed")), "1 vlmail: there is no mailing p2\n");
+    EXPECT_EQ(bounce(reportOn("p1-1", "delivered")), "0 p1-1, delivered: 550 no such user\n");
+    EXPECT_THAT(
+        bounce(reportOn("p1-1", "failed"), "--json"),
+        HasSubstr(R"(0 {"id":"p1","letter":{"number":1,"key":"p1-1","channel":"email","state":"returned",)"));
 }
 
 TEST_F(ClientCommands, SettingsAreSetAndShownWithTheirOrigin) {
@@ -739,6 +782,36 @@ TEST_F(MailingsOfANode, GoOutByThemselvesWhenTheyAreToGoAtOnce) {
     std::string const id = mail();
     awaitState(id, "submitted");
     EXPECT_TRUE(isHandedOver(id));
+}
+
+TEST_F(MailingsOfANode, TellTheirSenderOnceTheyAreHandedOver) {
+    setPackPreset(
+        R"("process_mode": 3, "confirmation_email": true, "customer_email": "office@acme.example")");
+    EXPECT_THAT(
+        output({"mail", "--send", "--node", "u=bob/a=acme", letter_}),
+        HasSubstr("note: pack preset \"Bills\" wants an e-mail when its mailing is handed over, which "
+                  "nobody sends: the service has no carrier \"email\" of the type smtp\n"));
+    VLServiceTest::SmtpServer const server(folder_ / "mails", {});
+    if (!server.missing().empty())
+        GTEST_SKIP() << server.missing();
+    output({"settings", "service",
+            R"(carriers={"email":{"type":"smtp","starttls":false,"url":")" + server.url() +
+                R"(","from":"bills@acme.example","subject":"Letter"}})"});
+    std::string const id = mail();
+    server.awaitMessage();
+    ASSERT_EQ(server.messages().size(), 1U);
+    EXPECT_THAT(server.messages().front(), HasSubstr("\noffice@acme.example\n"));
+    EXPECT_THAT(server.messages().front(), HasSubstr("handed on in the mailing's container"));
+    std::string shown;
+    while (shown.find("accepted") == std::string::npos)
+        shown = output({"status", id});
+    EXPECT_THAT(shown, testing::ContainsRegex("\nmailing +notice  of           state     since +note\n" + id +
+                                              "  n1      the mailing  accepted  "));
+    EXPECT_EQ(complaint({"resend", id, "n1"}),
+              "vlmail: notice 1 of mailing " + id +
+                  " is accepted: only one that is uncertain, failed or returned is sent again\n");
+    EXPECT_EQ(complaint({"resend", id, "n"}),
+              "vlmail: \"n\" is no number of a letter: vlmail status MAILING shows them\n");
 }
 
 TEST_F(MailingsOfANode, AreHeldThroughAnUploadAndAKilledServiceUntilTheyAreReleased) {

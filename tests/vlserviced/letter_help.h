@@ -11,6 +11,13 @@
 #include <string>
 #include <vector>
 
+/// A field of a letter, which is an address unless its priority is 0.
+inline void addField(Mailing::MailedLetter& letter, char const* name, json::Value value, int priority) {
+    letter.fields.emplace(priority, Cfg::ExtractedField(name, std::move(value), priority, true,
+                                                        IgnoreOnGroup::MustMatch,
+                                                        Cfg::ExtractedField::ValueType::Plain));
+}
+
 /// A letter of one page for each of the channels, whose text tells its number; the empty channel is none.
 inline Mailing::Metadata lettersOf(std::string const& id, std::vector<std::string> const& channels,
                                    std::string const& preset = "") {
@@ -23,9 +30,7 @@ inline Mailing::Metadata lettersOf(std::string const& id, std::vector<std::strin
         letter.documents.push_back({"letter " + std::to_string(i + 1) + ".pdf", {1}});
         letter.sheets = 1;
         if (!channels[i].empty())
-            letter.fields.emplace(1, Cfg::ExtractedField(channels[i], "to " + std::to_string(i + 1), 1, true,
-                                                         IgnoreOnGroup::MustMatch,
-                                                         Cfg::ExtractedField::ValueType::Plain));
+            addField(letter, channels[i].c_str(), "to " + std::to_string(i + 1), 1);
     }
     return mailing;
 }
@@ -40,12 +45,15 @@ inline void saveLetters(PageSaverI& pages, Mailing::Metadata const& mailing) {
         pages.savePage(mailing.letters[i].documents.at(0).document, "1", zipped(pdfOfLetter(i + 1)));
 }
 
-inline void storeLetters(std::filesystem::path const& file, std::string const& id,
-                         std::vector<std::string> const& channels, std::string const& preset = "") {
-    Mailing::Metadata const mailing = lettersOf(id, channels, preset);
-    Mailing::PackDatabaseWriter writer(file, {id, "a=acme", "Title of " + id});
+inline void storeMailing(std::filesystem::path const& file, Mailing::Metadata const& mailing) {
+    Mailing::PackDatabaseWriter writer(file, {mailing.id, "a=acme", "Title of " + mailing.id});
     saveLetters(writer, mailing);
     writer.finish(mailing.toBlob());
+}
+
+inline void storeLetters(std::filesystem::path const& file, std::string const& id,
+                         std::vector<std::string> const& channels, std::string const& preset = "") {
+    storeMailing(file, lettersOf(id, channels, preset));
 }
 
 /// The container of such a mailing.

@@ -17,7 +17,9 @@ namespace {
 NodeSettings settingsFromService(Channel::Client& service, std::string const& nodeId) {
     std::vector<std::string> parts = Policy::Rules::parts();
     parts.push_back(Cfg::Presets::PART_NAME);
-    return NodeSettings::resolved(fetchSettings(service, nodeId, parts),
+    Protocol::SettingsQuery query(nodeId, std::move(parts));
+    query.carriers = true;
+    return NodeSettings::resolved(Protocol::SettingsAnswer(ask(service, query)),
                                   "the service, at " + nodeInWords(nodeId));
 }
 

@@ -22,26 +22,39 @@ struct Options {
     bool json = false;
 };
 
-long long numberIn(std::string const& text) {
+/// "3" is a letter, "n1" a notice.
+Protocol::LetterChange changeOf(Options const& options, LetterAction action) {
+    std::string const& text = options.letter;
+    bool const isNotice = text.starts_with('n');
     long long number = 0;
-    auto const [end, failure] = std::from_chars(text.data(), text.data() + text.size(), number);
+    auto const [end, failure] =
+        std::from_chars(text.data() + (isNotice ? 1 : 0), text.data() + text.size(), number);
     if (failure != std::errc() || end != text.data() + text.size() || number < 1)
         throw Base::Error("\"" + text + "\" is no number of a letter: vlmail status MAILING shows them");
-    return number;
+    return isNotice ? Protocol::LetterChange(action, options.mailing, 0, number)
+                    : Protocol::LetterChange(action, options.mailing, number);
+}
+
+/// The one of that number among letters, or among notices.
+template<typename Report>
+void print(std::ostream& out, std::vector<Report> const& all, long long number) {
+    for (Report const& one : all)
+        if (one.number == number)
+            out << one.key << ", " << Protocol::letterStateName(one.state) << '\n';
 }
 
 int change(Options const& options, LetterAction action, Terminal const& terminal) {
-    long long const number = numberIn(options.letter);
+    Protocol::LetterChange const wanted = changeOf(options, action);
     auto const service = connectToService(options.service, terminal.err);
-    json::Object const answer = ask(*service, Protocol::LetterChange(action, options.mailing, number));
+    json::Object const answer = ask(*service, wanted);
     if (options.json) {
         terminal.out << answer << '\n';
         return FINE;
     }
-    for (Protocol::JobReport const& job : Protocol::JobsAnswer(answer).jobs)
-        for (Protocol::LetterReport const& letter : job.letters)
-            if (letter.number == number)
-                terminal.out << letter.key << ", " << Protocol::letterStateName(letter.state) << '\n';
+    for (Protocol::JobReport const& job : Protocol::JobsAnswer(answer).jobs) {
+        print(terminal.out, job.letters, wanted.letter);
+        print(terminal.out, job.notices, wanted.notice);
+    }
     return FINE;
 }
 
@@ -62,7 +75,9 @@ Base::Command addCommand(Base::Command const& app, Task& task, char const* name,
                          std::shared_ptr<Options> const& options) {
     Base::Command const command = app.addCommand(name, description);
     command.addOption("MAILING", options->mailing, "The id of a mailing").required();
-    command.addOption("LETTER", options->letter, "The number of the letter, as vlmail status MAILING has it")
+    command
+        .addOption("LETTER", options->letter,
+                   "The number of the letter, or of the notice, as vlmail status MAILING has it")
         .required();
     command.addFlag("--json", options->json, "The service's answer as one JSON object");
     addServiceOptions(command, options->service);

@@ -78,7 +78,7 @@ MakingReady makingFor(Options const& options, BatchSources& sources, Cfg::Preset
 
 /// By the clock and the place of this machine.
 MailingPolicies policiesOf(NodeSettings const& settings) {
-    return {settings.sourced(), {std::time(nullptr), &Base::localOffset}};
+    return {settings.sourced(), {std::time(nullptr), &Base::localOffset}, settings.sendsNotices()};
 }
 
 int mailDocuments(Options const& options, Terminal const& terminal) {

@@ -64,6 +64,24 @@ void printLetters(std::ostream& out, std::vector<Protocol::JobReport> const& job
             out << job.lettersLeftOut << " more letters of mailing " << job.id << " are not shown\n";
 }
 
+/// E-mails that tell of mailings, or of their letters.
+void printNotices(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
+    TextTable table({{"mailing"}, {"notice"}, {"of"}, {"state"}, {"since"}, {"note"}});
+    for (Protocol::JobReport const& job : jobs)
+        for (Protocol::NoticeReport const& notice : job.notices)
+            table.addRow({job.id, 'n' + std::to_string(notice.number),
+                          notice.letter == 0 ? "the mailing" : "letter " + std::to_string(notice.letter),
+                          Protocol::letterStateName(notice.state), LocalTime::toText(notice.changed),
+                          notice.says});
+    if (table.empty())
+        return;
+    out << '\n';
+    table.print(out);
+    for (Protocol::JobReport const& job : jobs)
+        if (job.noticesLeftOut > 0)
+            out << job.noticesLeftOut << " more notices of mailing " << job.id << " are not shown\n";
+}
+
 bool anyFailed(std::vector<Protocol::JobReport> const& jobs) {
     return std::ranges::any_of(
         jobs, [](Protocol::JobReport const& job) { return job.state == Protocol::JobState::Failed; });
@@ -114,6 +132,7 @@ int showStatus(Options const& options, Terminal const& terminal) {
     else {
         print(terminal.out, jobs);
         printLetters(terminal.out, jobs);
+        printNotices(terminal.out, jobs);
     }
     return anyFailed(jobs) ? INCOMPLETE : FINE;
 }

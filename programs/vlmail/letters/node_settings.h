@@ -10,6 +10,7 @@
 
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace VlMail {
@@ -46,6 +47,10 @@ public:
     std::filesystem::path const& file() const { return file_; }
     /// The service's answer that they are; the empty handle for others.
     json::Value const& answer() const { return answer_; }
+    /// Whether the service sends notices whose answer they are; nothing for others.
+    std::optional<bool> sendsNotices() const {
+        return answer_ ? Protocol::SettingsAnswer(answer_.toObject()).sendsNotices() : std::nullopt;
+    }
     /// Where they come from, as messages say it.
     std::string const& place() const { return place_; }
     /// Of the file as it was read; empty for the defaults. Computed at each call: few want it, and the first

@@ -116,12 +116,14 @@ OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
     builder.useDocuments(making_.attachmentsOf(packPreset), making_.usedDocumentsOf(preset));
     builder.setPurchaseOrder(policies_.purchaseOrder());
     builder.limitGroups([this](long long sheets) { return policies_.allows(sheets); });
-    if (std::string note = noteOn(preset); !note.empty())
+    if (std::string note = policies_.noteOn(preset); !note.empty())
         notes_.push_back(std::move(note));
     return *mailing;
 }
 
 void Dispatch::finish() {
+    if (std::string note = policies_.noteOnNotifications(); !notifications_.empty() && !note.empty())
+        notes_.push_back(std::move(note));
     for (auto const& [packPreset, mailing] : mailings_) {
         try {
             mailing->finish();

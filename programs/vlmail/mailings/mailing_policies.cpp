@@ -8,6 +8,8 @@
 namespace VlMail {
 namespace {
 
+constexpr char const* NOBODY_SENDS = "nobody sends: the service has no carrier \"email\" of the type smtp";
+
 Policy::Rules rulesOf(Policy::SourcedSettings const& settings) {
     try {
         return Policy::Rules(settings);
@@ -18,8 +20,10 @@ Policy::Rules rulesOf(Policy::SourcedSettings const& settings) {
 
 } // namespace
 
-MailingPolicies::MailingPolicies(Policy::SourcedSettings settings, Policy::Moment moment)
-    : settings_(std::move(settings)), moment_(std::move(moment)), rules_(rulesOf(settings_)) {}
+MailingPolicies::MailingPolicies(Policy::SourcedSettings settings, Policy::Moment moment,
+                                 std::optional<bool> sendsNotices)
+    : settings_(std::move(settings)), moment_(std::move(moment)), rules_(rulesOf(settings_)),
+      sendsNotices_(sendsNotices) {}
 
 std::string MailingPolicies::whyNot(long long sheets, Cfg::PackPreset const& packPreset) {
     std::string why = refusalOf(packPreset);
@@ -42,12 +46,22 @@ std::string const& MailingPolicies::refusalOf(Cfg::PackPreset const& packPreset)
     return refusals_.emplace(packPreset.name(), std::move(line)).first->second;
 }
 
-std::string noteOn(Cfg::PackPreset const& packPreset) {
+std::string MailingPolicies::noteOn(Cfg::PackPreset const& packPreset) const {
     if (!packPreset.confirmReceipt())
         return {};
-    return "pack preset " + Base::inQuotes(packPreset.name()) +
-           " wants an e-mail when its mailing is handed over, which nobody sends: carriers take "
-           "letters alone";
+    std::string const wanted = "pack preset " + Base::inQuotes(packPreset.name()) +
+                               " wants an e-mail when its mailing is handed over, which ";
+    if (packPreset.userEmailOverride().empty())
+        return wanted + "nobody gets: it has no \"customer_email\"";
+    if (sendsNotices_)
+        return *sendsNotices_ ? "" : wanted + NOBODY_SENDS;
+    return wanted + "a service sends that has a carrier of e-mail";
+}
+
+std::string MailingPolicies::noteOnNotifications() const {
+    return sendsNotices_.value_or(true)
+               ? ""
+               : std::string("who is to be notified gets an e-mail, which ") + NOBODY_SENDS;
 }
 
 } // namespace VlMail

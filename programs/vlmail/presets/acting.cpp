@@ -111,7 +111,7 @@ constexpr ActingRow PACK_PRESET[] = {
     {"process_mode_client", Nobody},
     {"profile", ClientAndService},
     {"priority_delivery", ClientAndService},
-    {"confirmation_email", Client},
+    {"confirmation_email", ClientAndService},
     {"customer_email", ClientAndService},
     {"lock_pack_ui", Service},
     {"last_used", Service},

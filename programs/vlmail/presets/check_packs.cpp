@@ -176,7 +176,7 @@ void checkEmails(PresetsDocument const& document, Findings& findings) {
         std::string const email = pack.json.get("customer_email").textOrEmpty();
         if (!email.empty() && !Base::isEmailAddress(email))
             findings.add(EmailMalformed, pack.place / "customer_email", {inQuotes(email)});
-        if (pack.json.get("confirmation_email").isTrue())
+        if (email.empty() && pack.json.get("confirmation_email").isTrue())
             findings.add(ConfirmationNotSent, pack.place / "confirmation_email");
     }
 }

@@ -105,8 +105,8 @@ constexpr FindingWords WORDS[] = {
      "{0} is no e-mail address, and no mailing goes out by this preset",
      "write one address, such as name@example.com"},
     {ConfirmationNotSent, "confirmation-not-sent", Warning,
-     "nobody gets an e-mail when the mailing is handed over: carriers take letters alone",
-     "remove it, and look with \"vlmail status\""},
+     "nobody gets an e-mail when the mailing is handed over: the pack preset does not say who is to get it",
+     "write the sender's address as \"customer_email\", or remove it"},
 
     {PatternBroken, "broken-pattern", Error,
      "the pattern is broken at character {0} ({1}): {2}",

@@ -2,6 +2,7 @@
 
 #include "programs/mailing/container_writer.h"
 #include "programs/mailing/entries_digest.h"
+#include "programs/vlserviced/jobs/notices.h"
 #include "programs/vlserviced/jobs/outbox_mailing.h"
 
 #include <algorithm>
@@ -42,24 +43,30 @@ void write(Rest const& rest, OutboxMailing& mailing, std::filesystem::path const
 
 } // namespace
 
-std::vector<DividedLetter> divide(std::filesystem::path const& container, std::filesystem::path const& rest,
-                                  HasCarrier const& hasCarrier) {
+Division divide(std::filesystem::path const& container, std::filesystem::path const& rest,
+                HasCarrier const& hasCarrier, Notifying notifying) {
     OutboxMailing mailing(container);
-    std::vector<DividedLetter> letters;
-    if (!mailing.letters().mailing().madeReady)
-        return letters;
+    Mailing::Metadata const& whole = mailing.letters().mailing();
+    Division division;
+    if (notifying == Notifying::Yes)
+        addConfirmation(whole, division.notices);
+    if (!whole.madeReady)
+        return division;
     Rest others;
     for (std::size_t i = 0; i < mailing.letters().size(); ++i) {
         Mailing::MailedLetter const letter = mailing.letters().letter(i);
+        auto const number = static_cast<long long>(i) + 1;
         std::string const channel = channelOf(letter);
         bool const byCarrier = hasCarrier(channel);
-        letters.push_back({static_cast<long long>(i) + 1, channel, byCarrier});
+        division.letters.push_back({number, channel, byCarrier});
         if (!byCarrier)
             others.add(i, mailing.entriesOf(letter));
+        if (notifying == Notifying::Yes)
+            addNotifications(whole, number, letter, division.notices);
     }
-    if (!others.letters.empty() && others.letters.size() < letters.size())
+    if (!others.letters.empty() && others.letters.size() < division.letters.size())
         write(others, mailing, rest);
-    return letters;
+    return division;
 }
 
 } // namespace VlServiced

@@ -117,7 +117,18 @@ Protocol::LetterReport reportOf(StoredLetter const& letter, Job const& job) {
     return report;
 }
 
-/// Tells of letters until there are too many for one answer.
+Protocol::NoticeReport reportOf(StoredLetter const& notice) {
+    Protocol::NoticeReport report;
+    report.number = -notice.id.number;
+    report.key = notice.id.key();
+    report.letter = notice.notice.letter;
+    report.state = notice.state;
+    report.says = notice.says;
+    report.changed = notice.changedAt;
+    return report;
+}
+
+/// Tells of letters, and of notices, until there are too many for one answer.
 class LetterList {
 public:
     explicit LetterList(LetterStore const& letters) : letters_(letters) {}
@@ -125,16 +136,29 @@ public:
     void tell(Job const& job, Protocol::JobReport& report) {
         if (!job.isDivided)
             return;
+        tellOfLetters(job, report);
+        tellOfNotices(job, report);
+    }
+
+private:
+    void tellOfLetters(Job const& job, Protocol::JobReport& report) {
         for (StoredLetter const& letter : letters_.ofJob(job.pack.packId, left_))
             report.letters.push_back(reportOf(letter, job));
         left_ -= report.letters.size();
         report.lettersLeftOut =
             letters_.countOfJob(job.pack.packId) - static_cast<long long>(report.letters.size());
     }
+    void tellOfNotices(Job const& job, Protocol::JobReport& report) {
+        for (StoredLetter const& notice : letters_.noticesOf(job.pack.packId, noticesLeft_))
+            report.notices.push_back(reportOf(notice));
+        noticesLeft_ -= report.notices.size();
+        report.noticesLeftOut =
+            letters_.countOfNotices(job.pack.packId) - static_cast<long long>(report.notices.size());
+    }
 
-private:
     LetterStore const& letters_;
     std::size_t left_ = Protocol::JobsQuery::MAX_LETTERS;
+    std::size_t noticesLeft_ = Protocol::JobsQuery::MAX_LETTERS;
 };
 
 Protocol::JobReport reportOf(Job const& job) {

@@ -343,20 +343,21 @@ void JobRunner::startHandingOver(Job const& job) {
 }
 
 void JobRunner::startDividing(Job const& job) {
-    auto const letters = std::make_shared<std::vector<DividedLetter>>();
+    auto const division = std::make_shared<Division>();
     inBackground(
         job.pack.packId,
-        [letters, make = makingContainer(job), container = surroundings_.outbox / job.containerName(),
+        [division, make = makingContainer(job), container = surroundings_.outbox / job.containerName(),
          rest = surroundings_.outbox / REST_FOLDER / job.containerName(),
          carriers = surroundings_.settings().carriers()] {
             make();
-            *letters = divide(container, rest,
-                              [&](std::string const& channel) { return carriers.contains(channel); });
+            *division = divide(
+                container, rest, [&](std::string const& channel) { return carriers.contains(channel); },
+                Protocol::sendsNotices(carriers) ? Notifying::Yes : Notifying::No);
         },
-        [this, packId = job.pack.packId, letters](Outcome const& outcome) {
+        [this, packId = job.pack.packId, division](Outcome const& outcome) {
             if (outcome.kind != Outcome::Kind::Done)
                 return noteProblem(packId, outcome.why);
-            surroundings_.letters->record(held(packId), *letters);
+            surroundings_.letters->record(held(packId), *division);
             proceed(jobs_.find(packId).value());
         });
 }
@@ -489,9 +490,16 @@ void JobRunner::finishSubmitting(Job const& job) {
         return noteProblem(job.pack.packId, outcome.why);
     // While the job is on record as Submitting, so that a container that stays behind is seen to again.
     removeFromOutbox(containerToStage(job));
-    jobs_.advance(held(job.pack.packId), JobState::Submitting, JobState::Submitted, surroundings_.now());
+    jobs_.together([&] {
+        bool const isNoted = jobs_.advance(held(job.pack.packId), JobState::Submitting, JobState::Submitted,
+                                           surroundings_.now());
+        if (isNoted && surroundings_.letters)
+            surroundings_.letters->noteContainerHandedOn(job.pack.packId);
+    });
     if (job.lettersState)
         onLettersTaken(job.pack.packId);
+    if (surroundings_.letters && job.isDivided)
+        surroundings_.letters->proceed();
 }
 
 /// The mailing's container goes last, so that a later start finds what is left to do.

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
+#include "programs/vlserviced/jobs/notices.h"
 #include "vlservice/platform/log.h"
 
 #include <algorithm>
@@ -28,6 +29,11 @@ bool isFailing(CarrierRecord const& record) { return record.failures >= MANY_FAI
 
 std::string lettersInWords(long long count) {
     return std::to_string(count) + (count == 1 ? " letter" : " letters");
+}
+
+std::string nameOf(LetterId const& id) {
+    return (id.isNotice() ? "notice " + std::to_string(-id.number) : "letter " + std::to_string(id.number)) +
+           " of mailing " + Base::oneLine(id.packId);
 }
 
 LetterState stateBehind(Outcome::Kind kind) {
@@ -84,6 +90,19 @@ void LetterRunner::HandOver::setBad(std::vector<BadLetter> const& found) {
     bad = found;
     for (BadLetter const& one : bad)
         std::erase_if(letters, [&](StoredLetter const& letter) { return letter.id == one.id; });
+}
+
+LetterRunner::HandOver::Give LetterRunner::HandOver::prepared() {
+    if (notice)
+        return [this](Carriers::PutOnRecord const& mayHaveIt) { return carrier->send(*notice, mayHaveIt); };
+    makeContainer();
+    auto const made = std::make_shared<MadeParcel>(source->parcelOf(
+        letters, key,
+        settings.sendsFiles() ? LetterSource::Attachments::Apart : LetterSource::Attachments::Printed));
+    setBad(made->bad);
+    return [this, made](Carriers::PutOnRecord const& mayHaveThem) {
+        return made->parcel.letters.empty() ? Outcome() : carrier->handOver(made->parcel, mayHaveThem);
+    };
 }
 
 LetterRunner::LetterRunner(LetterStore& letters, JobStore& jobs, LetterSurroundings surroundings)
@@ -198,7 +217,7 @@ std::vector<StoredLetter> LetterRunner::next(std::string const& name, Channel co
     std::optional<StoredLetter> const first = firstToGo(name, channel, now);
     if (!first)
         return {};
-    if (channel.settings.unitOfFiles() == CarrierUnit::Letter)
+    if (channel.settings.unitOfFiles() == CarrierUnit::Letter || first->id.isNotice())
         return {*first};
     std::vector<StoredLetter> together = letters_.toGoTogether(first->id.packId, name, now);
     std::erase_if(together, [&](StoredLetter const& one) { return channel.inHand.contains(one.id); });
@@ -218,8 +237,12 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     handOver->channel = name;
     handOver->settings = channel.settings;
     handOver->key = keyOf(letters.front(), name, channel.settings);
-    handOver->source = sourceOf(letters.front().id.packId);
-    handOver->makeContainer = surroundings_.container(letters.front().id.packId);
+    handOver->packId = letters.front().id.packId;
+    handOver->notice = noticeIn(letters.front());
+    if (!handOver->notice) {
+        handOver->source = sourceOf(handOver->packId);
+        handOver->makeContainer = surroundings_.container(handOver->packId);
+    }
     handOver->letters = std::move(letters);
     handOver->carrier = idleOrNew(channel);
     for (StoredLetter const& letter : handOver->letters)
@@ -238,24 +261,24 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
         });
 }
 
+std::optional<Carriers::Notice> LetterRunner::noticeIn(StoredLetter const& letter) const {
+    if (!letter.id.isNotice())
+        return std::nullopt;
+    return written(letter, jobs_.find(letter.id.packId).value(), letters_);
+}
+
 /// Where other services may hand over the same letters, whatever the carrier does comes behind the record.
 void LetterRunner::carryOut(HandOver& handOver, bool isShared, Carriers::PutOnRecord const& mayHaveThem) {
     handOver.isCarriersFault = false;
     try {
         handOver.are = isShared ? LettersAre::Waiting : LettersAre::Anywhere;
-        handOver.makeContainer();
-        MadeParcel const made =
-            handOver.source->parcelOf(handOver.letters, handOver.key,
-                                      handOver.settings.sendsFiles() ? LetterSource::Attachments::Apart
-                                                                     : LetterSource::Attachments::Printed);
-        handOver.setBad(made.bad);
+        HandOver::Give const give = handOver.prepared();
         if (isShared) {
             mayHaveThem();
             handOver.are = LettersAre::HandedOver;
         }
         handOver.isCarriersFault = true;
-        if (!made.parcel.letters.empty())
-            handOver.outcome = handOver.carrier->handOver(made.parcel, isShared ? [] {} : mayHaveThem);
+        handOver.outcome = give(isShared ? [] {} : mayHaveThem);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const& failure) {
@@ -290,7 +313,9 @@ void LetterRunner::settle(std::shared_ptr<HandOver> const& handOver) {
         channel.inHand.erase(id);
     for (BadLetter const& bad : handOver->bad)
         channel.inHand.erase(bad.id);
-    unsettled_.insert(handOver->source->packId());
+    // What becomes of a notice changes nothing of its mailing.
+    if (!handOver->notice)
+        unsettled_.insert(handOver->packId);
 }
 
 void LetterRunner::recordOutcome(HandOver const& handOver) {
@@ -334,7 +359,9 @@ void LetterRunner::postpone(HandOver const& handOver) {
 
 std::string LetterRunner::keyOf(StoredLetter const& letter, std::string const& channel,
                                 Protocol::CarrierSettings const& settings) {
-    return settings.unitOfFiles() == CarrierUnit::Letter ? letter.id.key() : letter.id.packId + '-' + channel;
+    return settings.unitOfFiles() == CarrierUnit::Letter || letter.id.isNotice()
+               ? letter.id.key()
+               : letter.id.packId + '-' + channel;
 }
 
 /// What is on record of an earlier process; a printer forgets jobs sooner than that.
@@ -430,9 +457,15 @@ void LetterRunner::noteCarrier(HandOver const& handOver) {
     letters_.setCarrier(handOver.channel, record);
 }
 
-void LetterRunner::record(JobKey const& job, std::vector<DividedLetter> const& letters) {
-    letters_.divide(job, letters, surroundings_.now());
+void LetterRunner::record(JobKey const& job, Division const& division) {
+    letters_.divide(job, division.letters, surroundings_.now(), division.notices);
     proceed();
+}
+
+void LetterRunner::noteContainerHandedOn(std::string const& packId) {
+    letters_.releaseNoticesOfContainer(packId, surroundings_.now());
+    if (isHandedOver(packId))
+        letters_.releaseNoticeOfJob(packId, surroundings_.now());
 }
 
 void LetterRunner::settleJobs() {
@@ -455,7 +488,11 @@ void LetterRunner::settleJob(std::string const& packId) {
         state = JobState::Delivered;
     if (isUnderWay && isDelivering(packId))
         return;
-    jobs_.setLettersState(packId, state, problemOf(packId, counts), surroundings_.now());
+    jobs_.together([&] {
+        jobs_.setLettersState(packId, state, problemOf(packId, counts), surroundings_.now());
+        if (isHandedOver(packId))
+            letters_.releaseNoticeOfJob(packId, surroundings_.now());
+    });
     if (state == JobState::Lodged || state == JobState::Delivered) {
         sources_.remove_if([&](auto const& source) { return source->packId() == packId; });
         surroundings_.taken(packId);
@@ -465,6 +502,15 @@ void LetterRunner::settleJob(std::string const& packId) {
 bool LetterRunner::isDelivering(std::string const& packId) const {
     std::optional<Job> const job = jobs_.find(packId);
     return job && job->lettersState.value_or(job->state) == JobState::Delivering;
+}
+
+/// No letter is on its way to its carrier, nor the container to its folder. Letters that are uncertain were
+/// handed over, as far as the service can tell.
+bool LetterRunner::isHandedOver(std::string const& packId) const {
+    std::optional<Job> const job = jobs_.find(packId);
+    bool const isContainerOnItsWay =
+        !job || job->state == JobState::Queued || job->state == JobState::Submitting;
+    return !isContainerOnItsWay && !letters_.isUnderWay(packId);
 }
 
 std::string LetterRunner::problemOf(std::string const& packId, LetterCounts const& counts) const {
@@ -495,31 +541,31 @@ std::shared_ptr<LetterSource> LetterRunner::sourceOf(std::string const& packId) 
 }
 
 void LetterRunner::decide(Protocol::LetterChange const& change) {
-    LetterId const id{change.id, change.number};
-    std::string const name =
-        "letter " + std::to_string(id.number) + " of mailing " + Base::oneLine(id.packId);
+    LetterId const id{change.id, change.notice > 0 ? -change.notice : change.letter};
+    std::string const name = nameOf(id);
     std::optional<StoredLetter> const letter = letters_.find(id);
     if (!letter)
         throw Base::Error("there is no " + name);
     if (!letter->byCarrier)
         throw Base::Error(name + " goes in the mailing's container");
     bool const isResent = change.action == Protocol::LetterAction::Resend;
-    if (isResent && !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
+    if (isResent && !id.isNotice() &&
+        !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
         throw Base::Error("the pages of " + name + " are gone: mail it anew");
     if (!recordDecision(change, *letter))
         throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) + ": " +
                           (isResent ? "only one that is uncertain, failed or returned is sent again"
                                     : "only one that is uncertain can be settled"));
-    unsettled_.insert(id.packId);
+    if (!id.isNotice())
+        unsettled_.insert(id.packId);
     proceed();
 }
 
 void LetterRunner::noteInHistory(StoredLetter const& letter, LetterState to) {
     std::optional<Job> const job = jobs_.find(letter.id.packId);
     if (job)
-        surroundings_.recorder.note(
-            job->cfgId, "letter " + std::to_string(letter.id.number) + " of mailing " + letter.id.packId,
-            Protocol::letterStateName(letter.state), Protocol::letterStateName(to));
+        surroundings_.recorder.note(job->cfgId, nameOf(letter.id), Protocol::letterStateName(letter.state),
+                                    Protocol::letterStateName(to));
 }
 
 bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter) {
@@ -554,8 +600,7 @@ void LetterRunner::recordCarrier(std::string const& channel, CarrierRecord const
 StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind kind,
                                 std::string const& says) {
     using Kind = Carriers::MailReport::Kind;
-    std::string const name =
-        "letter " + std::to_string(id.number) + " of mailing " + Base::oneLine(id.packId);
+    std::string const name = nameOf(id);
     std::optional<StoredLetter> const letter = letters_.find(id);
     if (!letter)
         throw Base::Error("there is no " + name);
@@ -575,7 +620,8 @@ StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind k
     if (!isNoted)
         throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) +
                           ", which the report does not go with");
-    unsettled_.insert(id.packId);
+    if (!id.isNotice())
+        unsettled_.insert(id.packId);
     proceed();
     return letters_.find(id).value();
 }

@@ -5,6 +5,7 @@
 #include "programs/carriers/carrier.h"
 #include "programs/carriers/mime_message.h"
 #include "programs/vlserviced/jobs/carrier_pace.h"
+#include "programs/vlserviced/jobs/division.h"
 #include "programs/vlserviced/jobs/letter_parcel.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/history.h"
@@ -71,8 +72,10 @@ public:
     /// When something could be handed over that cannot by now; nothing when nothing waits for the clock.
     std::optional<long long> nextTime();
 
-    /// Puts the letters of a queued job on record.
-    void record(JobKey const& job, std::vector<DividedLetter> const& letters);
+    /// Puts the letters of a queued job on record, and its notices.
+    void record(JobKey const& job, Division const& division);
+    /// Lets go what waited for that: to be called in the transaction that puts it on record.
+    void noteContainerHandedOn(std::string const& packId);
 
     /// Throws Error when the letter is not one that this can be decided of.
     void decide(Protocol::LetterChange const& change);
@@ -104,10 +107,13 @@ private:
         bool isAsked = false;
     };
 
-    /// Letters that are handed over together, and what became of them.
+    /// Letters that are handed over together, or a notice, and what became of them.
     struct HandOver {
         std::string channel;
+        std::string packId;
         std::vector<StoredLetter> letters;
+        /// Where it is one.
+        std::optional<Carriers::Notice> notice;
         Protocol::CarrierSettings settings;
         CarrierPtr carrier;
         LetterSurroundings::Work makeContainer;
@@ -123,6 +129,9 @@ private:
         std::vector<LetterId> ids() const;
         /// Takes them from the letters.
         void setBad(std::vector<BadLetter> const& found);
+        /// What is to be handed over; throws std::exception where it cannot be made.
+        using Give = std::function<Carriers::Outcome(Carriers::PutOnRecord const&)>;
+        Give prepared();
     };
 
     bool hold(std::string const& name);
@@ -136,6 +145,7 @@ private:
                                           long long by) const;
     std::vector<StoredLetter> next(std::string const& name, Channel const& channel) const;
     void start(std::string const& name, Channel& channel, std::vector<StoredLetter> letters);
+    std::optional<Carriers::Notice> noticeIn(StoredLetter const& letter) const;
     static void carryOut(HandOver& handOver, bool isShared, Carriers::PutOnRecord const& mayHaveThem);
     CarrierPtr idleOrNew(Channel& channel) const;
     void onDone(std::shared_ptr<HandOver> const& handOver);
@@ -155,6 +165,7 @@ private:
     void settleJobs();
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;
+    bool isHandedOver(std::string const& packId) const;
     void noteInHistory(StoredLetter const& letter, LetterState to);
     bool recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter);
     void recordCarrier(std::string const& channel, CarrierRecord const& record);

@@ -21,6 +21,13 @@ namespace {
 
 using Children = std::map<std::string, std::vector<SettingsNode const*>>;
 
+json::Object carrierTypes(Protocol::Carriers const& carriers) {
+    json::Object types;
+    for (auto const& [channel, carrier] : carriers)
+        types.set(channel, Protocol::carrierTypeName(carrier.type));
+    return types;
+}
+
 Protocol::TreeNode branch(SettingsNode const& node, Children const& children,
                           ServiceSettings const& service) {
     Protocol::TreeNode branching;
@@ -120,6 +127,8 @@ Protocol::SettingsAnswer SettingsService::effective(Protocol::SettingsQuery cons
     for (SettingsLevel const& level : chain)
         answer.chain.push_back(level.id);
     answer.parts = resolve(chain, query.parts.empty() ? partNames() : query.parts);
+    if (query.carriers)
+        answer.carriers = carrierTypes(service().carriers());
     return answer;
 }
 

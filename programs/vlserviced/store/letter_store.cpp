@@ -1,6 +1,7 @@
 #include "programs/vlserviced/store/letter_store.h"
 
 #include "programs/base/error.h"
+#include "programs/protocol/carrier.h"
 
 #include <charconv>
 #include <system_error>
@@ -13,7 +14,7 @@ using Protocol::letterStateNamed;
 
 constexpr char const* SELECT_LETTERS =
     "SELECT pack, number, channel, by_carrier, state, says, changed_at, attempts, first_try, "
-    "due FROM letters ";
+    "due, notice_of, recipient, reply_to, reference FROM letters ";
 /// As the index has it that holds those alone.
 constexpr char const* TO_GO = "state = 'waiting' AND by_carrier = 1 ";
 
@@ -28,6 +29,7 @@ StoredLetter letterIn(Database::Rows const& row) {
     letter.attempts = row.number(7);
     letter.firstTry = row.number(8);
     letter.due = row.number(9);
+    letter.notice = {row.number(10), row.text(11), row.text(12), row.text(13)};
     return letter;
 }
 
@@ -54,6 +56,9 @@ std::string conditionOf(LettersAre are) {
     return "";
 }
 
+/// Whether notices of a letter in that state go out.
+bool isTaken(LetterState state) { return state == LetterState::Accepted || state == LetterState::Delivered; }
+
 LettersByCarriers shareOf(std::vector<DividedLetter> const& letters) {
     std::size_t byCarrier = 0;
     for (DividedLetter const& letter : letters)
@@ -70,13 +75,17 @@ std::optional<LetterId> LetterId::ofKey(std::string_view key) {
     if (dash == key.npos)
         return std::nullopt;
     LetterId letter{std::string(key.substr(0, dash))};
+    bool const isNotice = key.substr(dash + 1).starts_with('n');
     auto const [end, failure] =
-        std::from_chars(key.data() + dash + 1, key.data() + key.size(), letter.number);
-    bool const isKey = failure == std::errc() && end == key.data() + key.size() && letter.number > 0;
-    return isKey ? std::optional(letter) : std::nullopt;
+        std::from_chars(key.data() + dash + (isNotice ? 2 : 1), key.data() + key.size(), letter.number);
+    if (failure != std::errc() || end != key.data() + key.size() || letter.number <= 0)
+        return std::nullopt;
+    letter.number = isNotice ? -letter.number : letter.number;
+    return letter;
 }
 
-bool LetterStore::divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now) {
+bool LetterStore::divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now,
+                         std::vector<Notice> const& notices) {
     Database::Transaction transaction(database_);
     if (!jobs_.divide(job, shareOf(letters), now))
         return false;
@@ -85,8 +94,19 @@ bool LetterStore::divide(JobKey const& job, std::vector<DividedLetter> const& le
                          "VALUES ($1, $2, $3, $4, $5, $6)",
                          job.packId, letter.number, letter.channel, letter.byCarrier,
                          letterStateName(LetterState::Waiting), now);
+    addNotices(job.packId, notices, now);
     transaction.commit();
     return true;
+}
+
+void LetterStore::addNotices(std::string const& packId, std::vector<Notice> const& notices, long long now) {
+    long long number = 0;
+    for (Notice const& notice : notices)
+        database_.change("INSERT INTO letters (pack, number, channel, by_carrier, state, changed_at, "
+                         "notice_of, recipient, reply_to, reference) "
+                         "VALUES ($1, $2, $3, 1, 'held', $4, $5, $6, $7, $8)",
+                         packId, --number, Protocol::NOTICE_CHANNEL, now, notice.letter, notice.recipient,
+                         notice.replyTo, notice.reference);
 }
 
 std::optional<StoredLetter> LetterStore::find(LetterId const& letter) const {
@@ -95,13 +115,36 @@ std::optional<StoredLetter> LetterStore::find(LetterId const& letter) const {
 }
 
 std::vector<StoredLetter> LetterStore::ofJob(std::string const& packId, std::size_t limit) const {
-    return lettersIn(database_.query(std::string(SELECT_LETTERS) + "WHERE pack = $1 ORDER BY number LIMIT " +
+    return lettersIn(database_.query(std::string(SELECT_LETTERS) +
+                                         "WHERE pack = $1 AND number > 0 ORDER BY number LIMIT " +
                                          std::to_string(limit),
                                      packId));
 }
 
 long long LetterStore::countOfJob(std::string const& packId) const {
-    return database_.number("SELECT count(*) FROM letters WHERE pack = $1", packId);
+    return database_.number("SELECT count(*) FROM letters WHERE pack = $1 AND number > 0", packId);
+}
+
+std::vector<StoredLetter> LetterStore::noticesOf(std::string const& packId, std::size_t limit) const {
+    return lettersIn(database_.query(std::string(SELECT_LETTERS) +
+                                         "WHERE pack = $1 AND number < 0 ORDER BY number DESC LIMIT " +
+                                         std::to_string(limit),
+                                     packId));
+}
+
+long long LetterStore::countOfNotices(std::string const& packId) const {
+    return database_.number("SELECT count(*) FROM letters WHERE pack = $1 AND number < 0", packId);
+}
+
+std::vector<LetterShare> LetterStore::sharesOf(std::string const& packId) const {
+    Database::Rows rows = database_.query("SELECT channel, by_carrier, state, count(*) FROM letters WHERE "
+                                          "pack = $1 AND number > 0 GROUP BY channel, by_carrier, state "
+                                          "ORDER BY channel, by_carrier, state",
+                                          packId);
+    std::vector<LetterShare> shares;
+    while (rows.next())
+        shares.push_back({rows.text(0), rows.isTrue(1), letterStateNamed(rows.text(2)), rows.number(3)});
+    return shares;
 }
 
 std::vector<StoredLetter> LetterStore::toGo(std::string const& channel, long long now,
@@ -114,10 +157,10 @@ std::vector<StoredLetter> LetterStore::toGo(std::string const& channel, long lon
 
 std::vector<StoredLetter> LetterStore::toGoTogether(std::string const& packId, std::string const& channel,
                                                     long long now) const {
-    return lettersIn(database_.query(SELECT_LETTERS + database_.by("letters_by_state") +
-                                         "WHERE pack = $1 AND channel = $2 AND due <= $3 AND " + TO_GO +
-                                         "ORDER BY number",
-                                     packId, channel, now));
+    return lettersIn(database_.query(
+        SELECT_LETTERS + database_.by("letters_by_state") +
+            "WHERE pack = $1 AND channel = $2 AND due <= $3 AND number > 0 AND " + TO_GO + "ORDER BY number",
+        packId, channel, now));
 }
 
 std::vector<std::string> LetterStore::channelsToGo() const {
@@ -142,7 +185,9 @@ long long LetterStore::uncertain(std::string const& channel) const {
 
 std::set<std::string> LetterStore::channelsByCarrier(std::string const& packId) const {
     Database::Rows rows =
-        database_.query("SELECT DISTINCT channel FROM letters WHERE pack = $1 AND by_carrier = 1", packId);
+        database_.query("SELECT DISTINCT channel FROM letters WHERE pack = $1 AND number > 0 AND "
+                        "by_carrier = 1",
+                        packId);
     std::set<std::string> channels;
     while (rows.next())
         channels.insert(rows.text(0));
@@ -151,7 +196,7 @@ std::set<std::string> LetterStore::channelsByCarrier(std::string const& packId) 
 
 LetterCounts LetterStore::counts(std::string const& packId) const {
     Database::Rows rows = database_.query("SELECT state, count(*) FROM letters WHERE pack = $1 AND "
-                                          "by_carrier = 1 GROUP BY state",
+                                          "number > 0 AND by_carrier = 1 GROUP BY state",
                                           packId);
     LetterCounts counts;
     while (rows.next())
@@ -165,8 +210,8 @@ bool LetterStore::isUnderWay(std::string const& packId) const {
 
 std::optional<StoredLetter> LetterStore::firstIn(std::string const& packId, LetterState state) const {
     return firstLetterIn(database_.query(SELECT_LETTERS + database_.by("letters_by_state") +
-                                             "WHERE pack = $1 AND state = $2 AND by_carrier = 1 "
-                                             "ORDER BY number LIMIT 1",
+                                             "WHERE pack = $1 AND state = $2 AND by_carrier = 1 AND "
+                                             "number > 0 ORDER BY number LIMIT 1",
                                          packId, letterStateName(state)));
 }
 
@@ -207,11 +252,30 @@ void LetterStore::finish(std::vector<LetterId> const& letters, LetterState state
                          long long now, LettersAre are) {
     Database::Transaction transaction(database_);
     for (LetterId const& letter : letters)
-        database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3 "
-                         "WHERE pack = $4 AND number = $5" +
-                             conditionOf(are),
-                         letterStateName(state), says, now, letter.packId, letter.number);
+        if (database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3 "
+                             "WHERE pack = $4 AND number = $5" +
+                                 conditionOf(are),
+                             letterStateName(state), says, now, letter.packId, letter.number) == 1 &&
+            isTaken(state))
+            releaseNoticesOf(letter, now);
     transaction.commit();
+}
+
+void LetterStore::releaseNoticesOf(LetterId const& letter, long long now) {
+    database_.change("UPDATE letters SET state = 'waiting', changed_at = $1 WHERE pack = $2 AND "
+                     "notice_of = $3 AND state = 'held'",
+                     now, letter.packId, letter.number);
+}
+
+void LetterStore::releaseNoticeOfJob(std::string const& packId, long long now) {
+    releaseNoticesOf({packId, 0}, now);
+}
+
+void LetterStore::releaseNoticesOfContainer(std::string const& packId, long long now) {
+    database_.change("UPDATE letters SET state = 'waiting', changed_at = $1 WHERE pack = $2 AND "
+                     "notice_of > 0 AND state = 'held' AND notice_of NOT IN (SELECT number FROM letters "
+                     "WHERE pack = $2 AND number > 0 AND by_carrier = 1)",
+                     now, packId);
 }
 
 void LetterStore::postpone(std::vector<LetterId> const& letters, std::string const& says, long long due,
@@ -246,11 +310,17 @@ bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const&
     std::string states;
     for (LetterState const state : from)
         states += (states.empty() ? "'" : ", '") + std::string(letterStateName(state)) + '\'';
-    return database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3, due = 0, "
-                            "attempts = 0, first_try = 0 WHERE pack = $4 AND number = $5 AND "
-                            "by_carrier = 1 AND state IN (" +
-                                states + ')',
-                            letterStateName(to), says, now, letter.packId, letter.number) == 1;
+    Database::Transaction transaction(database_);
+    bool const isDecided =
+        database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3, due = 0, "
+                         "attempts = 0, first_try = 0 WHERE pack = $4 AND number = $5 AND "
+                         "by_carrier = 1 AND state IN (" +
+                             states + ')',
+                         letterStateName(to), says, now, letter.packId, letter.number) == 1;
+    if (isDecided && isTaken(to))
+        releaseNoticesOf(letter, now);
+    transaction.commit();
+    return isDecided;
 }
 
 void LetterStore::doubt(std::string const& says, long long now) {

@@ -15,15 +15,19 @@ namespace VlServiced {
 
 using Protocol::LetterState;
 
-/// Which letter of which mailing.
+/// Which letter of which mailing, or which notice: those are numbered from -1 down.
 struct LetterId {
     std::string packId;
     /// From 1, its place in the mailing.
     long long number = 0;
 
     auto operator<=>(LetterId const&) const = default;
-    /// Under which it is handed over: a safe file name, which no other letter and no mailing has.
-    std::string key() const { return packId + '-' + std::to_string(number); }
+    bool isNotice() const { return number < 0; }
+    /// Under which it is handed over: a safe file name, "PACK-3" or "PACK-n1", which no other letter and no
+    /// mailing has.
+    std::string key() const {
+        return packId + (isNotice() ? "-n" : "-") + std::to_string(isNotice() ? -number : number);
+    }
     /// The other way; nothing when it is no key.
     static std::optional<LetterId> ofKey(std::string_view key);
 };
@@ -36,6 +40,19 @@ struct DividedLetter {
     bool byCarrier = false;
 };
 
+/// Who is told that something was handed over.
+struct Notice {
+    /// That is handed over; 0 for the whole mailing.
+    long long letter = 0;
+    /// An e-mail address, or what should be one.
+    std::string recipient;
+    /// The same; may be empty.
+    std::string replyTo = {};
+    /// By which the recipient knows the letter; may be empty.
+    std::string reference = {};
+};
+
+/// A letter, or a notice on its way.
 struct StoredLetter {
     LetterId id;
     std::string channel;
@@ -50,6 +67,16 @@ struct StoredLetter {
     long long firstTry = 0;
     /// When it may be tried next.
     long long due = 0;
+    /// Where it is one.
+    Notice notice = {};
+};
+
+/// How many letters of a job by channel, by whether they go by carriers, and by state.
+struct LetterShare {
+    std::string channel;
+    bool byCarrier = false;
+    LetterState state = LetterState::Waiting;
+    long long count = 0;
 };
 
 /// How many letters of a job that go by carriers are in each state.
@@ -81,14 +108,19 @@ public:
     /// Both have to outlive the store.
     LetterStore(Database::Connection& database, JobStore& jobs) : database_(database), jobs_(jobs) {}
 
-    /// Records the letters of a queued job. False, and no change, when it is not queued or was divided
-    /// before.
-    bool divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now);
+    /// Records the letters of a queued job, and its notices, which are held. False, and no change, when it is
+    /// not queued or was divided before.
+    bool divide(JobKey const& job, std::vector<DividedLetter> const& letters, long long now,
+                std::vector<Notice> const& notices = {});
 
     std::optional<StoredLetter> find(LetterId const& letter) const;
     /// Of a job, in their order, at most `limit`.
     std::vector<StoredLetter> ofJob(std::string const& packId, std::size_t limit) const;
     long long countOfJob(std::string const& packId) const;
+    /// The same of its notices.
+    std::vector<StoredLetter> noticesOf(std::string const& packId, std::size_t limit) const;
+    long long countOfNotices(std::string const& packId) const;
+    std::vector<LetterShare> sharesOf(std::string const& packId) const;
     /// Of those that wait for a channel's carrier and are due by then, the first few in the order of their
     /// time and of their division. Costs what the answer is large.
     std::vector<StoredLetter> toGo(std::string const& channel, long long now, std::size_t limit) const;
@@ -132,6 +164,11 @@ public:
     bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
                 std::string const& says, long long now);
 
+    /// Lets notices go that are held: that of a whole job, or those of its letters that are in its container.
+    /// Those of a letter that goes by a carrier go when that has taken it.
+    void releaseNoticeOfJob(std::string const& packId, long long now);
+    void releaseNoticesOfContainer(std::string const& packId, long long now);
+
     /// Those that were being handed over when a process ended become uncertain.
     void doubt(std::string const& says, long long now);
 
@@ -139,6 +176,9 @@ public:
     void setCarrier(std::string const& channel, CarrierRecord const& record);
 
 private:
+    void addNotices(std::string const& packId, std::vector<Notice> const& notices, long long now);
+    void releaseNoticesOf(LetterId const& letter, long long now);
+
     Database::Connection& database_;
     JobStore& jobs_;
 };

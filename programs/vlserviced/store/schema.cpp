@@ -244,6 +244,22 @@ CREATE TRIGGER service_settings_changed AFTER INSERT OR UPDATE ON service_settin
 FOR EACH STATEMENT EXECUTE FUNCTION tell_of_settings();
 )sql";
 
+/// E-mails that tell of a mailing or of one of its letters go on their way as letters do, under numbers below
+/// 0: `notice_of` is the letter, or 0. Until that is handed over they are held.
+constexpr char const* SCHEMA_10 = R"sql(
+ALTER TABLE letters ADD COLUMN notice_of INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE letters ADD COLUMN recipient TEXT NOT NULL DEFAULT '';
+ALTER TABLE letters ADD COLUMN reply_to TEXT NOT NULL DEFAULT '';
+ALTER TABLE letters ADD COLUMN reference TEXT NOT NULL DEFAULT '';
+CREATE INDEX notices_held ON letters (pack, notice_of) WHERE state = 'held';
+)sql";
+
+/// Another service may have their carrier.
+constexpr char const* POSTGRES_10 = R"sql(
+CREATE TRIGGER notice_released AFTER UPDATE OF state ON letters
+FOR EACH ROW WHEN (old.state = 'held' AND new.state = 'waiting') EXECUTE FUNCTION tell_of_letters();
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -257,7 +273,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               SCHEMA_6,
                                               SCHEMA_7,
                                               SCHEMA_8,
-                                              {SCHEMA_9, "", POSTGRES_9}}};
+                                              {SCHEMA_9, "", POSTGRES_9},
+                                              {SCHEMA_10, "", POSTGRES_10}}};
     return kind;
 }
 

@@ -501,13 +501,17 @@ TEST_F(VlMailTest, WritesThePurchaseOrderAndThePriorityThatTheSettingsDecide) {
     EXPECT_FALSE(metadata.packPreset.priorityDelivery());
 }
 
-TEST_F(VlMailTest, SaysThatNobodySendsAnEmailOnceAMailingIsHandedOver) {
+TEST_F(VlMailTest, SaysWhoSendsAnEmailOnceAMailingIsHandedOver) {
     write("invoice 1.txt", "No 1\nTo: Ada\n");
+    write("node.json",
+          settingsWith(R"("app": {})", R"(, "confirmation_email": true, "customer_email": "a@b.example")"));
+    EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json")}), VlMail::FINE);
+    std::string const wanted =
+        "pack preset \"Invoices\" wants an e-mail when its mailing is handed over, which ";
+    EXPECT_THAT(out_, HasSubstr("note: " + wanted + "a service sends that has a carrier of e-mail\n"));
     write("node.json", settingsWith(R"("app": {})", R"(, "confirmation_email": true)"));
     EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json")}), VlMail::FINE);
-    std::string const note =
-        "pack preset \"Invoices\" wants an e-mail when its mailing is handed over, which nobody "
-        "sends: carriers take letters alone";
+    std::string const note = wanted + "nobody gets: it has no \"customer_email\"";
     EXPECT_THAT(out_, HasSubstr("note: " + note + "\n"));
     EXPECT_EQ(vlmail("plan", {"invoice 1.txt"}, {"-o", path("plan.json"), "--json"}), VlMail::FINE);
     json::Array const notes = json::strToObject(out_.data(), out_.size()).get("notes").toArray();

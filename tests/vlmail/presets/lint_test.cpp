@@ -317,11 +317,16 @@ std::vector<Case> const CASES{
      {"error /pack_presets/0/customer_email: \"ada@\" is no e-mail address, and no mailing goes out by this "
       "preset | "
       "write one address, such as name@example.com [email-malformed]"}},
-    {"AConfirmationThatNobodySends",
+    {"AConfirmationToNobody",
      partOf(preset(R"_("match": ".*", "pack_preset": "P")_"),
             R"_({"name": "P", "confirmation_email": true})_"),
      {"warning /pack_presets/0/confirmation_email: nobody gets an e-mail when the mailing is handed over: "
-      "carriers take letters alone | remove it, and look with \"vlmail status\" [confirmation-not-sent]"}},
+      "the pack preset does not say who is to get it | write the sender's address as \"customer_email\", or "
+      "remove it [confirmation-not-sent]"}},
+    {"NothingInAConfirmationToSomebody",
+     partOf(preset(R"_("match": ".*", "pack_preset": "P")_"),
+            R"_({"name": "P", "confirmation_email": true, "customer_email": "ada@example.com"})_"),
+     {}},
     {"ALetterheadWithoutFlags",
      partOf(
          preset(R"_("match": "a.*", "pack_preset": "P")_"),

@@ -25,10 +25,13 @@ using VlServiced::StoredLetter;
 
 class Dividing : public testing::Test {
 protected:
+    VlServiced::Division divided(VlServiced::Notifying notifying) {
+        return VlServiced::divide(
+            container_, rest_, [](std::string const& channel) { return channel == "postal"; }, notifying);
+    }
     std::vector<std::string> divided() {
         std::vector<std::string> letters;
-        for (DividedLetter const& letter : VlServiced::divide(
-                 container_, rest_, [](std::string const& channel) { return channel == "postal"; }))
+        for (DividedLetter const& letter : divided(VlServiced::Notifying::No).letters)
             letters.push_back(std::to_string(letter.number) + ' ' + letter.channel +
                               (letter.byCarrier ? " carried" : ""));
         return letters;

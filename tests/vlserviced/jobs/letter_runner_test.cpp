@@ -31,6 +31,7 @@ using VlServiced::LetterState;
 /// What the other side does, by the key that it is given something under.
 struct OtherSide {
     std::vector<std::string> taken;
+    std::vector<Carriers::Notice> notices;
     bool isRepeatable = true;
     /// The key under which something is on its way when the process ends.
     std::string last;
@@ -47,14 +48,12 @@ public:
     explicit FakeCarrier(OtherSide& other) : other_(other) {}
 
     Outcome handOver(Parcel const& parcel, Carriers::PutOnRecord const& mayHaveIt) override {
-        if (!other_.isRepeatable)
-            mayHaveIt();
-        if (parcel.key == other_.last)
-            throw EndOfProcess();
-        other_.taken.push_back(parcel.key);
-        if (auto const own = other_.answers.find(parcel.key); own != other_.answers.end())
-            return own->second;
-        return other_.answer.value_or(Outcome{Outcome::Kind::Accepted, "thanks"});
+        return take(parcel.key, mayHaveIt);
+    }
+    Outcome send(Carriers::Notice const& notice, Carriers::PutOnRecord const& mayHaveIt) override {
+        Outcome const outcome = take(notice.key, mayHaveIt);
+        other_.notices.push_back(notice);
+        return outcome;
     }
     std::map<std::string, Carriers::Progress> ask(std::set<std::string> const& keys) override {
         std::map<std::string, Carriers::Progress> told;
@@ -66,6 +65,17 @@ public:
     std::string test() override { return "a fake"; }
 
 private:
+    Outcome take(std::string const& key, Carriers::PutOnRecord const& mayHaveIt) {
+        if (!other_.isRepeatable)
+            mayHaveIt();
+        if (key == other_.last)
+            throw EndOfProcess();
+        other_.taken.push_back(key);
+        if (auto const own = other_.answers.find(key); own != other_.answers.end())
+            return own->second;
+        return other_.answer.value_or(Outcome{Outcome::Kind::Accepted, "thanks"});
+    }
+
     OtherSide& other_;
 };
 
@@ -122,9 +132,12 @@ protected:
     /// Has a mailing accepted that is handed over at once.
     void send(std::string const& id, std::vector<std::string> const& channels,
               std::string const& preset = "\"process_mode\": 2, ") {
-        storeLetters(folder_ / "packs.db", id, channels, preset);
+        send(lettersOf(id, channels, preset));
+    }
+    void send(Mailing::Metadata const& mailing) {
+        storeMailing(folder_ / "packs.db", mailing);
         runner_->accept(
-            {folder_.path().string(), "packs.db", id}, [](std::string const&) {},
+            {folder_.path().string(), "packs.db", mailing.id}, [](std::string const&) {},
             [](std::string const& failure) { EXPECT_EQ(failure, ""); });
     }
     /// The next piece of work that carriers have been given.
@@ -655,6 +668,199 @@ TEST_F(LetterRunnerTest, LetsAMailingWaitWhoseContainerIsDamaged) {
     fs::resize_file(outbox_ / "p1.mailing", 40);
     runner_->upload("", "");
     EXPECT_EQ(job("p1"), "queued: the container " + (outbox_ / "p1.mailing").string() + " cannot be read");
+}
+
+constexpr char const* CONFIRMED =
+    "\"process_mode\": 2, \"confirmation_email\": true, \"customer_email\": \"office@acme.example\", ";
+
+/// With a carrier of e-mail, which sends notices.
+class Notices : public LetterRunnerTest {
+protected:
+    Notices() { setCarriers(std::string(MAIL) + R"(, "postal": {"type": "folder", "folder": "/shop"})"); }
+
+    /// Letters of which the first two have somebody to be notified, the second two of them.
+    static Mailing::Metadata notifying(std::vector<std::string> const& channels) {
+        Mailing::Metadata mailing =
+            lettersOf("p1", channels, R"("process_mode": 2, "customer_email": "office@acme.example", )");
+        addField(mailing.letters.at(0), "reference", "R-17", 0);
+        addField(mailing.letters.at(0), "notify", "ada@example.org", -1);
+        addField(mailing.letters.at(1), "notify",
+                 parse(R"({"all":["ben@example.org","eve@example.org","ben@example.org",7]})").get("all"),
+                 -2);
+        return mailing;
+    }
+    std::vector<std::string> notices(std::string const& id) {
+        std::vector<std::string> told;
+        for (Protocol::NoticeReport const& notice : report(id).notices)
+            told.push_back(notice.key + " of " + std::to_string(notice.letter) + ' ' +
+                           Protocol::letterStateName(notice.state) +
+                           (notice.says.empty() ? "" : ": " + notice.says));
+        return told;
+    }
+    std::string noticeDecision(Protocol::LetterAction action, long long number) {
+        return failureOf([&] { letterRunner_->decide({action, "p1", 0, number}); });
+    }
+
+    static constexpr char const* MAIL =
+        R"("email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": ""})";
+};
+
+TEST_F(Notices, TellTheSenderOnceAllLettersAreHandedOver) {
+    other_.answers["p1-2"] = {Outcome::Kind::Refused, "no such street"};
+    send("p1", {"postal", "postal", "email", "postal"}, CONFIRMED);
+    doOne();
+    doOne();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 held"));
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 accepted: thanks"));
+    ASSERT_EQ(other_.notices.size(), 1U);
+    Carriers::Notice const& notice = other_.notices.front();
+    EXPECT_EQ(notice.key, "p1-n1");
+    EXPECT_EQ(notice.to, "office@acme.example");
+    EXPECT_EQ(notice.subject, "Handed over: \"Title of p1\" (p1)");
+    EXPECT_EQ(notice.text, "The mailing \"Title of p1\" (p1) was handed over.\n\n"
+                           "email: 1 letter accepted\n"
+                           "postal: 2 letters accepted\n"
+                           "postal: 1 letter failed\n\n"
+                           "\"vlmail status p1\" tells of each letter.\n");
+    letterRunner_->proceed();
+    restart();
+    EXPECT_THAT(work_, IsEmpty()) << "it is told once";
+}
+
+TEST_F(Notices, WaitForTheContainerOfTheOtherLetters) {
+    fs::remove(upload_);
+    send("p1", {"postal", "fax"}, CONFIRMED);
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 held"));
+    fs::create_directory(upload_);
+    runner_->resume();
+    doWork();
+    EXPECT_EQ(job("p1"), "submitted");
+    ASSERT_EQ(other_.notices.size(), 1U);
+    EXPECT_THAT(other_.notices.front().text,
+                HasSubstr("fax: 1 letter handed on in the mailing's container\npostal: 1 letter accepted\n"));
+}
+
+TEST_F(Notices, TellOfAMailingThatGoesInAContainerAlone) {
+    send("p1", {"fax", "fax"}, CONFIRMED);
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-n1"));
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 accepted: thanks"));
+    EXPECT_EQ(job("p1"), "submitted");
+}
+
+TEST_F(Notices, TellOfAnOlderMailingByItsPages) {
+    storePack(folder_ / "packs.db", "p1", "a=acme", CONFIRMED);
+    runner_->accept(
+        {folder_.path().string(), "packs.db", "p1"}, [](std::string const&) {}, [](std::string const&) {});
+    doWork();
+    ASSERT_EQ(other_.notices.size(), 1U);
+    EXPECT_THAT(other_.notices.front().text, HasSubstr("3 pages handed on in the mailing's container\n"));
+}
+
+TEST_F(Notices, AreNoneWhereNobodySendsThemOrNobodyWantsThem) {
+    send("p1", {"postal"}, "\"process_mode\": 2, \"confirmation_email\": true, ");
+    send("p2", {"postal"}, "\"process_mode\": 2, \"customer_email\": \"office@acme.example\", ");
+    setCarriers(R"("email": {"type": "folder", "folder": "/mails"})");
+    send("p3", {"email"}, CONFIRMED);
+    doWork();
+    for (char const* const id : {"p1", "p2", "p3"})
+        EXPECT_THAT(notices(id), IsEmpty()) << id;
+}
+
+TEST_F(Notices, TellWhomALetterNamesOnceItIsHandedOverAndNothingOutOfIt) {
+    send(notifying({"postal", "fax", "postal"}));
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 1 held", "p1-n2 of 2 waiting", "p1-n3 of 2 waiting"));
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 1 accepted: thanks", "p1-n2 of 2 accepted: thanks",
+                                           "p1-n3 of 2 accepted: thanks"));
+    std::map<std::string, Carriers::Notice> told;
+    for (Carriers::Notice const& notice : other_.notices)
+        EXPECT_TRUE(told.emplace(notice.to, notice).second) << notice.to;
+    EXPECT_EQ(told.at("ada@example.org").subject, "A letter was handed over: R-17");
+    EXPECT_EQ(told.at("ada@example.org").text,
+              "Letter 1 of the mailing p1 was handed over by postal.\n\nReference: R-17\n");
+    EXPECT_EQ(told.at("ada@example.org").replyTo, "office@acme.example");
+    EXPECT_EQ(told.at("ben@example.org").subject, "A letter was handed over");
+    EXPECT_EQ(told.at("eve@example.org").text,
+              "Letter 2 of the mailing p1 was handed over in a container.\n");
+}
+
+TEST_F(Notices, StayHeldOfALetterThatFailedUntilItGoesAfterAll) {
+    other_.answers["p1-1"] = {Outcome::Kind::Refused, "no"};
+    send(notifying({"postal", "postal"}));
+    doWork();
+    EXPECT_EQ(notices("p1").front(), "p1-n1 of 1 held");
+    other_.answers.clear();
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 1), "nothing was thrown");
+    doWork();
+    EXPECT_EQ(notices("p1").front(), "p1-n1 of 1 accepted: thanks");
+}
+
+TEST_F(Notices, GoOnceAPersonSaysThatTheLetterHasArrived) {
+    other_.answers["p1-1"] = {Outcome::Kind::Uncertain, "cut"};
+    send(notifying({"postal", "postal"}));
+    doWork();
+    EXPECT_EQ(notices("p1").front(), "p1-n1 of 1 held");
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleDelivered, "p1", 1), "nothing was thrown");
+    doWork();
+    EXPECT_EQ(notices("p1").front(), "p1-n1 of 1 accepted: thanks");
+}
+
+TEST_F(Notices, FailNoMailing) {
+    other_.answers["p1-n1"] = {Outcome::Kind::Refused, "550 nobody of that name"};
+    send("p1", {"postal"}, CONFIRMED);
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 failed: 550 nobody of that name"));
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_FALSE(fs::exists(outbox_ / "p1.mailing"));
+}
+
+TEST_F(Notices, AreTriedAgainByThePausesAndTheHoursOfTheirCarrier) {
+    other_.answers["p1-n1"] = {Outcome::Kind::Failed, "451 busy"};
+    send("p1", {"postal"}, CONFIRMED);
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 waiting: 451 busy"));
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_EQ(letters_.carrier("email").failures, 1);
+    EXPECT_EQ(letterRunner_->nextTime(), now_ + 30);
+    EXPECT_EQ(letterRunner_->list().carriers.at(0).waiting, 1);
+    other_.answers.clear();
+    letterRunner_->pause("email");
+    now_ += 30;
+    letterRunner_->proceed();
+    EXPECT_THAT(work_, IsEmpty());
+    letterRunner_->resume("email");
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 accepted: thanks"));
+}
+
+TEST_F(Notices, AreNeverSentAgainByThemselvesThatSomebodyMayHave) {
+    other_.isRepeatable = false;
+    send("p1", {"postal"}, CONFIRMED);
+    other_.last = "p1-n1";
+    EXPECT_THROW(doWork(), EndOfProcess);
+    other_.last.clear();
+    restart();
+    EXPECT_THAT(work_, IsEmpty());
+    EXPECT_THAT(notices("p1"),
+                ElementsAre("p1-n1 of 0 uncertain: the service was ended while it was handed over"));
+    EXPECT_EQ(job("p1"), "lodged");
+    EXPECT_EQ(noticeDecision(Protocol::LetterAction::Resend, 2), "there is no notice 2 of mailing p1");
+    EXPECT_EQ(noticeDecision(Protocol::LetterAction::Resend, 1), "nothing was thrown");
+    doWork();
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 accepted: thanks"));
+    EXPECT_EQ(noticeDecision(Protocol::LetterAction::SettleFailed, 1),
+              "notice 1 of mailing p1 is accepted: only one that is uncertain can be settled");
+}
+
+TEST_F(Notices, AreFoundByReportsOfServersToo) {
+    send("p1", {"postal"}, CONFIRMED);
+    doWork();
+    letterRunner_->note({"p1", -1}, Carriers::MailReport::Kind::Returned, "550 mailbox is full");
+    EXPECT_THAT(notices("p1"), ElementsAre("p1-n1 of 0 returned: 550 mailbox is full"));
+    EXPECT_EQ(job("p1"), "lodged");
 }
 
 } // namespace

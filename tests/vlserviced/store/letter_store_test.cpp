@@ -60,6 +60,51 @@ TEST_P(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
     EXPECT_EQ(letters_.countOfJob("p1"), 2);
 }
 
+TEST_P(LetterStoreTest, HoldsNoticesUntilWhatTheyTellOfIsHandedOver) {
+    queue("p1");
+    EXPECT_TRUE(letters_.divide("p1", {{1, "postal", true}, {2, "email", true}, {3, "fax", false}}, 5,
+                                {{0, "office@acme.example"},
+                                 {1, "ada@example.org", "office@acme.example", "R-17"},
+                                 {3, "ben@example.org"}}));
+    auto const states = [&] {
+        std::string told;
+        for (StoredLetter const& notice : letters_.noticesOf("p1", 100))
+            told += std::string(Protocol::letterStateName(notice.state)) + ' ';
+        return told;
+    };
+    EXPECT_EQ(letters_.countOfJob("p1"), 3);
+    EXPECT_EQ(letters_.countOfNotices("p1"), 3);
+    EXPECT_EQ(letters_.noticesOf("p1", 2).size(), 2U);
+    EXPECT_EQ(letters_.ofJob("p1", 100).size(), 3U);
+    EXPECT_THAT(toGo("email", 5), ElementsAre("p1-2"));
+    EXPECT_EQ(letters_.find({"p1", -2})->notice.letter, 1);
+    EXPECT_EQ(letters_.find({"p1", -2})->notice.recipient, "ada@example.org");
+    EXPECT_EQ(letters_.find({"p1", -2})->notice.replyTo, "office@acme.example");
+    EXPECT_EQ(letters_.find({"p1", -2})->notice.reference, "R-17");
+    letters_.finish({{"p1", 1}, {"p1", 2}}, LetterState::Failed, "no", 6);
+    letters_.releaseNoticesOfContainer("p1", 6);
+    EXPECT_EQ(states(), "held held waiting ");
+    EXPECT_TRUE(letters_.decide({"p1", 1}, {LetterState::Failed}, LetterState::Delivered, "", 7));
+    letters_.releaseNoticeOfJob("p1", 7);
+    EXPECT_EQ(states(), "waiting waiting waiting ");
+    EXPECT_THAT(toGo("email", 7), ElementsAre("p1-n1", "p1-n2", "p1-n3"));
+    EXPECT_FALSE(letters_.isUnderWay("p1")) << "notices keep no mailing on its way";
+    letters_.finish({{"p1", -1}}, LetterState::Accepted, "", 8);
+    EXPECT_EQ(states(), "accepted waiting waiting ");
+    EXPECT_THAT(letters_.counts("p1"),
+                ElementsAre(Pair(LetterState::Delivered, 1), Pair(LetterState::Failed, 1)));
+}
+
+TEST_P(LetterStoreTest, ReleasesNoNoticeForALetterThatAnotherServiceHasDecided) {
+    queue("p1");
+    letters_.divide("p1", {{1, "postal", true}}, 5, {{1, "ada@example.org"}});
+    letters_.beginHandingOver({{"p1", 1}}, 5);
+    letters_.finish({{"p1", 1}}, LetterState::Accepted, "", 6, VlServiced::LettersAre::Waiting);
+    EXPECT_EQ(state("p1", -1), LetterState::Held);
+    letters_.finish({{"p1", 1}}, LetterState::Accepted, "", 6, VlServiced::LettersAre::HandedOver);
+    EXPECT_EQ(state("p1", -1), LetterState::Waiting);
+}
+
 TEST_P(LetterStoreTest, LeavesAJobOnItsWayWhoseLettersAreNotAllCarried) {
     divide("p1", {{1, "postal", true}, {2, "email", false}});
     EXPECT_EQ(jobs_.find("p1")->state, JobState::Queued);
@@ -208,7 +253,10 @@ TEST(LetterIds, AreFoundByTheirKeys) {
     using VlServiced::LetterId;
     EXPECT_EQ(LetterId::ofKey("7d3f-44-12"), (LetterId{"7d3f-44", 12}));
     EXPECT_EQ(LetterId::ofKey(LetterId{"p", 1}.key()), (LetterId{"p", 1}));
-    for (char const* const none : {"", "p1", "p1-", "p1-x", "p1-0", "p1-1x", "p1-99999999999999999999"})
+    EXPECT_EQ((LetterId{"p-n1", -3}.key()), "p-n1-n3");
+    EXPECT_EQ(LetterId::ofKey("p-n1-n3"), (LetterId{"p-n1", -3}));
+    for (char const* const none :
+         {"", "p1", "p1-", "p1-x", "p1-0", "p1-1x", "p1-n", "p1-n0", "p1-n1x", "p1-99999999999999999999"})
         EXPECT_EQ(LetterId::ofKey(none), std::nullopt) << none;
 }
 VLSERVICE_ON_EACH_DATABASE(LetterStoreTest);
