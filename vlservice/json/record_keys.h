@@ -38,7 +38,7 @@ enum class KeyUse {
     Dropped,  ///< the key is another program's: it is read by nobody and not kept
 };
 
-/// Where the form of an inherited value may stand, {"inh": true, "v": <plain value>}.
+/// Where the form of an inherited value may stand, `{"inh": true, "v": VALUE}`.
 enum class Inheritance {
     None,
     Whole,      ///< around the value
