@@ -1,8 +1,13 @@
 // Measures letters that go out as e-mails against libcurl alone, which sends the same messages, made before,
-// to the same server over one connection. Decides whether messages may be made anew for each letter, and
-// whether the carrier's look at each line of the server costs anything. To reach: `of_peer` 0.8.
+// to the same server over one connection: to a mail server that people run, with TLS, and to one that does
+// nothing at all with what it takes, so that all that the carrier does shows. Decides whether messages may be
+// made anew for each letter, and whether the carrier's look at each line of the server costs anything. To
+// reach at the mail server: `of_peer` 0.8.
 #include "programs/carriers/mime_message.h"
 #include "programs/carriers/smtp_carrier.h"
+#include "tests/carriers/postfix_server.h"
+#include "tests/channel/test_certificate.h"
+#include "tests/support/temporary_folder.h"
 
 #include <benchmark/benchmark.h>
 #include <curl/curl.h>
@@ -91,11 +96,13 @@ Carriers::Parcel letterOf(std::size_t bytes) {
     return parcel;
 }
 
-Protocol::CarrierSettings settingsFor(Server const& server) {
+/// With TLS where there is a certificate.
+Protocol::CarrierSettings settingsFor(std::string const& url, std::string const& certificateFile = {}) {
     Protocol::CarrierSettings settings;
     settings.type = Protocol::CarrierType::Smtp;
-    settings.url = server.url();
-    settings.startsTls = false;
+    settings.url = url;
+    settings.caFile = certificateFile;
+    settings.startsTls = !certificateFile.empty();
     settings.from = "bills@acme.example";
     settings.subject = "Invoice of {name}";
     settings.text = "Dear {name},\n\nhere it is.\n";
@@ -105,9 +112,13 @@ Protocol::CarrierSettings settingsFor(Server const& server) {
 /// libcurl and a message, and nothing else.
 class Peer {
 public:
-    Peer(Server const& server, std::string message) : message_(std::move(message)) {
+    Peer(Protocol::CarrierSettings const& settings, std::string message) : message_(std::move(message)) {
         recipients_ = curl_slist_append(nullptr, "ada@example.com");
-        curl_easy_setopt(handle_, CURLOPT_URL, server.url().c_str());
+        curl_easy_setopt(handle_, CURLOPT_URL, settings.url.c_str());
+        if (settings.startsTls) {
+            curl_easy_setopt(handle_, CURLOPT_USE_SSL, static_cast<long>(CURLUSESSL_ALL));
+            curl_easy_setopt(handle_, CURLOPT_CAINFO, settings.caFile.c_str());
+        }
         curl_easy_setopt(handle_, CURLOPT_MAIL_FROM, "bills@acme.example");
         curl_easy_setopt(handle_, CURLOPT_MAIL_RCPT, recipients_);
         curl_easy_setopt(handle_, CURLOPT_UPLOAD, 1L);
@@ -153,13 +164,12 @@ std::string messageOf(Carriers::Parcel const& parcel) {
     return Carriers::inMime(message);
 }
 
-/// `state.range(0)` is the letter's size in KiB.
-void email(benchmark::State& state) {
-    Server const server;
+/// `state.range(0)` is the letter's size in KiB. Each has a server of its own where they are two.
+void compare(benchmark::State& state, Protocol::CarrierSettings const& settings,
+             Protocol::CarrierSettings const& settingsOfPeer) {
     Carriers::Parcel const parcel = letterOf(static_cast<std::size_t>(state.range(0)) << 10);
-    Server const other;
-    Carriers::SmtpCarrier carrier(settingsFor(server));
-    Peer peer(other, messageOf(parcel));
+    Carriers::SmtpCarrier carrier(settings);
+    Peer peer(settingsOfPeer, messageOf(parcel));
     Clock::duration ours{};
     Clock::duration theirs{};
     for (auto _ : state) {
@@ -173,7 +183,25 @@ void email(benchmark::State& state) {
     }
     state.counters["of_peer"] = std::chrono::duration<double>(theirs) / std::chrono::duration<double>(ours);
 }
-BENCHMARK(email)->Arg(20)->Arg(100)->Arg(1000)->Unit(benchmark::kMillisecond);
+
+void toAMailServer(benchmark::State& state) {
+    if (!PostfixServer::whyNot().empty())
+        return state.SkipWithError(PostfixServer::whyNot().c_str());
+    TemporaryFolder const folder;
+    std::filesystem::permissions(folder.path(), std::filesystem::perms(0755));
+    auto const files = ChannelTest::makeCertificate(folder.path().string(), "127.0.0.1");
+    PostfixServer const server(folder / "server", files.certificateFile, files.keyFile);
+    auto const settings = settingsFor(server.url(), files.certificateFile);
+    compare(state, settings, settings);
+}
+BENCHMARK(toAMailServer)->Arg(20)->Arg(100)->Arg(1000)->Iterations(300)->Unit(benchmark::kMillisecond);
+
+void toNobody(benchmark::State& state) {
+    Server const server;
+    Server const other;
+    compare(state, settingsFor(server.url()), settingsFor(other.url()));
+}
+BENCHMARK(toNobody)->Arg(20)->Arg(100)->Arg(1000)->Unit(benchmark::kMillisecond);
 
 } // namespace
 

@@ -1,9 +1,9 @@
 #include "tests/carriers/ipp_printer.h"
 
+#include "tests/support/free_port.h"
+
 #include <fcntl.h>
-#include <netinet/in.h>
 #include <sys/prctl.h>
-#include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -21,18 +21,6 @@ namespace fs = std::filesystem;
 
 constexpr char const* PRINTER = "/usr/sbin/ippeveprinter";
 constexpr char const* BUS = "/usr/bin/dbus-daemon";
-
-/// One that nobody had a moment ago.
-std::uint16_t freePort() {
-    int const socket = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    socklen_t size = sizeof address;
-    auto* const plain = reinterpret_cast<sockaddr*>(&address);
-    bool const isBound = ::bind(socket, plain, size) == 0 && ::getsockname(socket, plain, &size) == 0;
-    ::close(socket);
-    return isBound ? ntohs(address.sin_port) : 0;
-}
 
 void end(pid_t process) {
     if (process <= 0)
@@ -111,7 +99,7 @@ IppPrinter::IppPrinter(fs::path const& folder, std::string const& script,
 /// Somebody else may take its port in front of it.
 void IppPrinter::startPrinter(fs::path const& program, std::vector<std::string> const& offers) {
     for (int attempt = 1; printer_ <= 0; ++attempt) {
-        port_ = freePort();
+        port_ = VLServiceTest::freePort();
         std::vector<std::string> arguments{PRINTER, "-v",
                                            "-d",    (folder_ / "spool").string(),
                                            "-c",    program.string(),

@@ -269,9 +269,4 @@ Channel::ClientSettings FakeService::clientSettings() const {
 
 std::string FakeService::name() const { return "127.0.0.1:" + std::to_string(port_); }
 
-std::uint16_t freePort() {
-    asio::io_context io;
-    return asio::ip::tcp::acceptor(io, {asio::ip::address_v4::loopback(), 0}).local_endpoint().port();
-}
-
 } // namespace ChannelTest

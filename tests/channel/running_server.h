@@ -7,6 +7,7 @@
 #include "programs/channel/server.h"
 #include "tests/channel/known_texts.h"
 #include "tests/ipc/recording_processor.h"
+#include "tests/support/free_port.h"
 #include "vlservice/ipc/make_empty_cmd.h"
 #include "vlservice/ipc/price_est.h"
 #include "vlservice/ipc/remove_cfg_node.h"
@@ -171,8 +172,7 @@ private:
     std::uint16_t port_;
 };
 
-/// A port that nobody listens on, as far as one can know.
-std::uint16_t freePort();
+using VLServiceTest::freePort;
 
 constexpr int PRICE = Ipc::PriceEst::CMD_ID;
 
