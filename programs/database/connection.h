@@ -3,7 +3,9 @@
 
 #include "programs/database/failure.h"
 
+#include <chrono>
 #include <concepts>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -102,9 +104,9 @@ public:
 
     template<typename... Each>
     Rows query(std::string const& sql, Each const&... values) {
-        return Rows(select(sql, {Value(values)...}));
+        return queryAll(sql, {Value(values)...});
     }
-    Rows queryAll(std::string const& sql, Values const& values) { return Rows(select(sql, values)); }
+    Rows queryAll(std::string const& sql, Values const& values);
     /// The first column of the first row; 0 when there is none.
     template<typename... Each>
     long long number(std::string const& sql, Each const&... values) {
@@ -114,11 +116,16 @@ public:
     /// How many rows it has changed.
     template<typename... Each>
     long long change(std::string const& sql, Each const&... values) {
-        return execute(sql, {Value(values)...});
+        return changeAll(sql, {Value(values)...});
     }
-    long long changeAll(std::string const& sql, Values const& values) { return execute(sql, values); }
+    long long changeAll(std::string const& sql, Values const& values);
     /// Statements without placeholders, one after another.
     virtual void run(std::string const& script) = 0;
+
+    /// Has told how long each "query", with all its rows, each "change" and each "commit" made its caller
+    /// wait.
+    using Took = std::function<void(char const* operation, std::chrono::duration<double>)>;
+    void onTook(Took took) { took_ = std::move(took); }
 
     /// Has nothing of what was deleted stay in a log beside the database.
     virtual void emptyLog() {}
@@ -159,6 +166,9 @@ protected:
     virtual void beAlone() {}
 
 private:
+    class TimedCursor;
+
+    Took took_;
     int depth_ = 0;
 };
 

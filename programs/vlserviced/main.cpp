@@ -25,6 +25,8 @@ void serve(VlServiced::Options options) {
     std::cout << "listening on " << Base::hostPortText(options.listen, service.port()) << '\n';
     if (!service.fingerprint().empty())
         std::cout << "certificate " << service.fingerprint() << '\n';
+    if (!service.metricsPlace().empty())
+        std::cout << "metrics on " << service.metricsPlace() << '\n';
     std::cout << std::flush;
     service.run();
 }

@@ -53,6 +53,11 @@ void addOptions(Base::Command const& command, Options& options) {
         .valueName("HOST");
     command.addOffFlag("--no-discovery", options.answersDiscovery,
                        "Do not answer clients that look for a service");
+    command
+        .addOption(
+            "--metrics", options.metrics,
+            "Where to answer whoever watches the service: a loopback address with a port, or unix:PATH")
+        .valueName("ADDRESS:PORT");
     command.addFlag("--verbose", options.verbose, "Log every datagram of discovery");
 }
 
@@ -61,6 +66,7 @@ void addOptions(Base::Command const& command, Options& options) {
 std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::ostream& out,
                                         std::ostream& err, std::string const& commit) {
     Options options;
+    options.commit = commit;
     Base::CommandLine line(DESCRIPTION, PROGRAM);
     line.addVersion([&commit] {
         return Base::versionText(PROGRAM, commit, {{"SQLite", Mailing::databaseVersion()}});

@@ -31,9 +31,13 @@ struct Options {
     /// the host's name.
     std::string announce;
     bool answersDiscovery = true;
+    /// Where metrics are asked for, "ADDRESS:PORT" or "unix:PATH"; empty for nowhere.
+    std::string metrics;
     /// Listens already, at `listen` and `port`; below 0 when there is none.
     int socket = -1;
     bool verbose = false;
+    /// What the program was built from, as --version tells it.
+    std::string commit;
 };
 
 /// The options, or the exit status of a run that ends here: help or the version was wanted, or the command

@@ -28,27 +28,6 @@
 namespace VlServiced {
 namespace {
 
-/// The line for "err": empty when the operation succeeds.
-template<typename Operation>
-std::string errorOf(Ipc::CmdI const& cmd, Operation operation) {
-    try {
-        operation();
-        return {};
-    } catch (std::exception const& failure) {
-        std::string line = Base::oneLine(failure.what());
-        Log::Lock(4).logStreamLine() << "Command " << cmd.name() << " was refused: " << line;
-        return line;
-    }
-}
-
-/// The answer, or an object with the one key "err".
-template<typename Operation>
-json::Object answerOrError(Ipc::CmdI const& cmd, Operation operation) {
-    json::Object answer;
-    std::string const error = errorOf(cmd, [&] { answer = operation(); });
-    return error.empty() ? answer : Protocol::failureAnswer(error);
-}
-
 /// Empty for all other questions.
 std::string channelToTest(json::Object const& question) {
     using Protocol::CarrierChange;
@@ -85,6 +64,33 @@ Processor::Processor(SettingsService& settings, DocumentService& documents, Toke
       jobs_(jobs), runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)),
       now_(std::move(now)), health_(std::move(health)) {}
 
+/// The line for "err": empty when the operation succeeds.
+template<typename Operation>
+std::string Processor::errorOf(Ipc::CmdI const& cmd, Operation operation) {
+    try {
+        operation();
+        return {};
+    } catch (std::exception const& failure) {
+        std::string line = Base::oneLine(failure.what());
+        Log::Lock(4).logStreamLine() << "Command " << cmd.name() << " was refused: " << line;
+        noteRefusal(line);
+        return line;
+    }
+}
+
+/// The answer, or an object with the one key "err".
+template<typename Operation>
+json::Object Processor::answerOrError(Ipc::CmdI const& cmd, Operation operation) {
+    json::Object answer;
+    std::string const error = errorOf(cmd, [&] { answer = operation(); });
+    return error.empty() ? answer : Protocol::failureAnswer(error);
+}
+
+void Processor::noteRefusal(std::string const& line) {
+    if (measures_)
+        measures_->noteRefusal(access_.refused().isLast(line) ? Refusal::Rights : Refusal::Request);
+}
+
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                          std::function<void(std::string const& failure)> done) {
     by_ = by;
@@ -96,6 +102,7 @@ void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant co
         cmd->accept(*this);
     } catch (std::exception const& failure) {
         failed = failure.what();
+        noteRefusal(failed);
     }
     if (auto const unfinished = std::exchange(done_, {}))
         unfinished(failed);
@@ -127,8 +134,8 @@ void Processor::beginPack(Ipc::CSConfigIdsList& cmd) {
         return cmd.setResp(Protocol::failureAnswer(malformed));
     auto const answered = std::static_pointer_cast<Ipc::CSConfigIdsList>(cmd.shared_from_this());
     packs_.begin(pack, cmd.processor(),
-                 [answered, done = std::exchange(done_, {})](Protocol::BeginPackAnswer const& answer,
-                                                             std::string const& failure) {
+                 [this, answered, done = std::exchange(done_, {})](Protocol::BeginPackAnswer const& answer,
+                                                                   std::string const& failure) {
                      answered->setResp(answerOrError(*answered, [&] {
                          return failure.empty() ? answer.serialize() : throw Base::Error(failure);
                      }));

@@ -7,6 +7,7 @@
 #include "programs/vlserviced/jobs/job_runner.h"
 #include "programs/vlserviced/jobs/letter_runner.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
+#include "programs/vlserviced/metrics/measures.h"
 #include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "programs/vlserviced/settings/token_service.h"
@@ -30,6 +31,9 @@ public:
               History& history, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
               PackReception& packs, std::filesystem::path outbox, std::function<long long()> now,
               std::function<Protocol::HealthAnswer()> health);
+
+    /// Notes refusals from here on; the measures have to outlive the processor.
+    void countIn(Measures& measures) { measures_ = &measures; }
 
     /// The kinds of questions that it answers.
     static std::vector<std::string> questions();
@@ -65,6 +69,11 @@ private:
     };
     static std::vector<Question> const& answerers();
 
+    template<typename Operation>
+    std::string errorOf(Ipc::CmdI const& cmd, Operation operation);
+    template<typename Operation>
+    json::Object answerOrError(Ipc::CmdI const& cmd, Operation operation);
+    void noteRefusal(std::string const& line);
     json::Object answer(json::Object const& question);
     void beginPack(Ipc::CSConfigIdsList& cmd);
     json::Object changeJobs(Protocol::JobsChange const& change);
@@ -89,6 +98,7 @@ private:
     std::filesystem::path outbox_;
     std::function<long long()> now_;
     std::function<Protocol::HealthAnswer()> health_;
+    Measures* measures_ = nullptr;
     /// Of the command at hand.
     Policy::Grant by_;
     std::function<void(std::string const& failure)> done_;

@@ -4,6 +4,7 @@
 #include "programs/base/local_offset.h"
 #include "programs/base/out_of_memory.h"
 #include "programs/base/plain_text.h"
+#include "programs/base/version.h"
 #include "programs/channel/server.h"
 #include "programs/channel/token.h"
 #include "programs/database/postgres_connection.h"
@@ -14,6 +15,8 @@
 #include "programs/vlserviced/jobs/local_packs.h"
 #include "programs/vlserviced/jobs/pack_reception.h"
 #include "programs/vlserviced/jobs/retention.h"
+#include "programs/vlserviced/metrics/metrics_door.h"
+#include "programs/vlserviced/metrics/metrics_page.h"
 #include "programs/vlserviced/neighbours.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
@@ -138,6 +141,16 @@ Protocol::JobsQuery waitedFor(Ipc::CmdI const& cmd) {
     }
 }
 
+/// Of all that clients may ask, a name that is one of a few.
+std::string measuredName(Ipc::CmdI const& cmd) {
+    auto const* const list = dynamic_cast<Ipc::CSConfigIdsList const*>(&cmd);
+    if (!list)
+        return cmd.name();
+    static std::vector<std::string> const known = Processor::questions();
+    std::string const kind = Protocol::kindOf(list->reqParams());
+    return std::ranges::find(known, kind) == known.end() ? "unknown question" : kind;
+}
+
 std::string announcedHost(Options const& options) {
     if (!options.announce.empty())
         return options.announce;
@@ -228,6 +241,8 @@ public:
             discovery_.emplace(io_, announcedHost(options), server_->port(), ownToken_.text, tokenLookup());
         if (!options.database.empty())
             neighbours_.emplace(io_, options.database, heard());
+        if (!options.metrics.empty())
+            measure(options);
     }
 
     ~Impl() {
@@ -236,6 +251,7 @@ public:
     }
 
     Channel::Server const& server() const { return *server_; }
+    std::string metricsPlace() const { return metrics_ ? metrics_->place() : std::string(); }
 
     void run() {
         signals_.async_wait([this](boost::system::error_code const& ec, int) {
@@ -258,7 +274,10 @@ public:
         });
         manager_.onReady("listening on port " + std::to_string(server_->port()));
         awaitUpkeep();
+        if (metrics_)
+            metrics_->open([this] { return page_->text(); });
         runHandlers();
+        metrics_.reset();
         // What the worker has finished by now goes on record; the rest is taken up at the next start.
         endThreads();
         endCarriers();
@@ -283,6 +302,63 @@ private:
         settings.certificateFile = options.certificate;
         settings.keyFile = options.key;
         return settings;
+    }
+
+    void measure(Options const& options) {
+        metrics_ = std::make_unique<MetricsDoor>(options.metrics);
+        opened_.connection->onTook([this](char const* operation, Measures::Duration took) {
+            measures_.noteDatabase(operation, took);
+        });
+        processor_->countIn(measures_);
+        page_.emplace(measures_, pageSources(options));
+    }
+
+    PageSources pageSources(Options const& options) {
+        return {[options, file = data_.database()] {
+                    return options.database.empty()
+                               ? openToLook(file)
+                               : std::make_unique<Database::PostgresConnection>(options.database);
+                },
+                [this] { return moment(); },
+                {{"data", data_.path()}, {"outbox", outbox_}},
+                &now,
+                Base::projectVersion(),
+                options.commit};
+    }
+
+    /// Called by another thread, which does not wait for a service that hangs.
+    std::optional<Moment> moment() {
+        constexpr std::chrono::seconds PATIENCE{2};
+        auto const told = std::make_shared<std::promise<Moment>>();
+        std::future<Moment> answer = told->get_future();
+        asio::post(io_, [this, told] { told->set_value(momentNow()); });
+        if (answer.wait_for(PATIENCE) != std::future_status::ready)
+            return std::nullopt;
+        return answer.get();
+    }
+
+    Moment momentNow() {
+        Moment moment;
+        moment.connections = server_->connections();
+        moment.queues = {{"jobs in hand", runner_.inHand()},
+                         {"letters in hand", letterRunner_.inHand()},
+                         {"pieces to store", packs_.waiting()},
+                         {"questions held", held_.size()}};
+        moment.channels = channels();
+        moment.certificateEnds = server_->certificateEnds();
+        return moment;
+    }
+
+    /// That have carriers; none while the database does not tell.
+    std::vector<std::string> channels() {
+        std::vector<std::string> channels;
+        try {
+            for (auto const& [channel, carrier] : settings_.service().carriers())
+                channels.push_back(channel);
+        } catch (Database::QueryError const&) {
+            return {};
+        }
+        return channels;
     }
 
     void endThreads() {
@@ -342,14 +418,19 @@ private:
         std::optional<Policy::Grant> const by = grantOf(*cmd->processor());
         if (!by) {
             access_.refused().note(REVOKED);
+            measures_.noteRefusal(Refusal::Token);
             return answer.refuse(REVOKED);
         }
-        processor_->carryOut(cmd, *by, [this, answer](std::string const& failure) {
-            if (failure.empty())
-                answer();
-            else
-                access_.refused().isLast(failure) ? answer.refuse(failure) : answer.fail(failure);
-        });
+        processor_->carryOut(cmd, *by,
+                             [this, answer, name = measuredName(*cmd),
+                              begin = std::chrono::steady_clock::now()](std::string const& failure) {
+                                 measures_.noteCommand(name, std::chrono::steady_clock::now() - begin);
+                                 if (failure.empty())
+                                     answer();
+                                 else
+                                     access_.refused().isLast(failure) ? answer.refuse(failure)
+                                                                       : answer.fail(failure);
+                             });
     }
 
     void take(Channel::ReceivedData data, Channel::DataStored const& stored) {
@@ -555,7 +636,8 @@ private:
                 [this](PackLocation const& pack) {
                     return pack.isWithService() ? packStore_->open(pack.packId) : localPacks_.open(pack);
                 },
-                history_};
+                history_,
+                took_};
     }
 
     LetterSurroundings letterSurroundings() {
@@ -575,11 +657,20 @@ private:
                 [this] { awaitLetters(); },
                 [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); },
                 history_,
-                [this](std::string const& packId) { return runner_.makingContainer(packId); }};
+                [this](std::string const& packId) { return runner_.makingContainer(packId); },
+                took_,
+                [this](std::string const& channel, LetterState state, std::size_t letters) {
+                    measures_.noteLetters(channel, state, letters);
+                }};
     }
 
     ReceptionSurroundings receptionSurroundings() {
-        return {[this](ReceptionSurroundings::Work work) { runOn(storeThread_, std::move(work)); },
+        return {[this](ReceptionSurroundings::Work work) {
+                    runOn(storeThread_, [this, work = std::move(work)] {
+                        StepTime const time(took_, Step::Storing);
+                        work();
+                    });
+                },
                 [this](ReceptionSurroundings::Work work) { asio::post(io_, std::move(work)); }, &now,
                 [this](std::string const& node) { return settings_.service().quotaOf(node); },
                 [this](std::string const& node) { return settings_.service().isDisabled(node); }};
@@ -597,6 +688,8 @@ private:
                 &now};
     }
 
+    Measures measures_;
+    StepTook took_ = [this](Step step, Measures::Duration took) { measures_.noteStep(step, took); };
     DataFolder data_;
     fs::path outbox_;
     std::string databaseInWords_;
@@ -648,12 +741,16 @@ private:
     std::chrono::steady_clock::time_point lastEndedSweep_ = std::chrono::steady_clock::now();
     std::optional<Channel::Server> server_;
     std::optional<DiscoveryAnswer> discovery_;
+    /// Where somebody may watch the service.
+    std::optional<MetricsPage> page_;
+    std::unique_ptr<MetricsDoor> metrics_;
 };
 
 Service::Service(Options const& options) : impl_(std::make_unique<Impl>(options)) {}
 Service::~Service() = default;
 
 std::uint16_t Service::port() const { return impl_->server().port(); }
+std::string Service::metricsPlace() const { return impl_->metricsPlace(); }
 std::string const& Service::fingerprint() const { return impl_->server().fingerprint(); }
 void Service::run() { impl_->run(); }
 void Service::stop() { impl_->stopFromAnywhere(); }

@@ -22,6 +22,8 @@ public:
     std::uint16_t port() const;
     /// Of the certificate; empty without TLS.
     std::string const& fingerprint() const;
+    /// Where metrics are asked for; empty for nowhere.
+    std::string metricsPlace() const;
 
     /// Serves until stop() or one of the signals SIGTERM and SIGINT; then answers the commands at hand,
     /// finishes the container at hand and returns.

@@ -42,6 +42,7 @@ programs/vlmail
 programs/vlserviced/store
 programs/vlserviced/settings
 programs/vlserviced/jobs
+programs/vlserviced/metrics
 programs/vlserviced
 )";
 

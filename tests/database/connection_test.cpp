@@ -70,6 +70,24 @@ protected:
     std::unique_ptr<Database::Connection> connection_;
 };
 
+TEST_P(ConnectionTest, TellsHowLongEachOperationTookWhetherItSucceedsOrNot) {
+    std::vector<std::string> told;
+    connection_->onTook([&](char const* operation, std::chrono::duration<double> took) {
+        EXPECT_GT(took.count(), 0);
+        told.emplace_back(operation);
+    });
+    Transaction transaction(*connection_);
+    add("one");
+    {
+        Transaction inner(*connection_);
+        inner.commit();
+    }
+    EXPECT_THAT(names(), ElementsAre("one"));
+    transaction.commit();
+    EXPECT_THROW(add("one"), QueryError);
+    EXPECT_THAT(told, ElementsAre("change", "query", "commit", "change"));
+}
+
 TEST_P(ConnectionTest, GivesBackWhatItWasGiven) {
     std::string const bytes("\0\xFF\0x", 4);
     EXPECT_EQ(connection_->change("INSERT INTO things (name, data, id) VALUES ($1, $3, $2)", "grüße \\ '",

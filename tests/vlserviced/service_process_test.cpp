@@ -15,6 +15,11 @@
 #include "vlservice/ipc/upload_queued.h"
 
 #include <SQLiteCpp/Database.h>
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/local/stream_protocol.hpp>
+#include <boost/asio/read.hpp>
+#include <boost/asio/write.hpp>
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -143,6 +148,69 @@ TEST_F(ServiceProcessTest, FailsWithOneLineThatSaysWhatIsWrong) {
     std::string const text = startFailure(arguments({"--listen", "nowhere"}));
     EXPECT_TRUE(text.starts_with("vlserviced: ")) << text;
     EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1) << text;
+}
+
+/// The page of metrics behind a socket.
+std::string metricsAt(fs::path const& file) {
+    boost::asio::io_context io;
+    boost::asio::local::stream_protocol::socket socket(io);
+    socket.connect(file.string());
+    boost::asio::write(socket, boost::asio::buffer(std::string("GET /metrics HTTP/1.1\r\n\r\n")));
+    std::string page;
+    boost::system::error_code end;
+    boost::asio::read(socket, boost::asio::dynamic_buffer(page), end);
+    return page;
+}
+
+TEST_F(ServiceProcessTest, TellsWhoeverWatchesItWhatItDoes) {
+    using testing::HasSubstr;
+    fs::path const socket = folder_ / "metrics";
+    ServiceProcess service(arguments({"--metrics", "unix:" + socket.string()}));
+    auto const client = clientOf(service, data_);
+    client->call<Ipc::GetSvcCfg>();
+    client->call<Ipc::CSConfigIdsList>(parse(R"({"query":"settings","id":"a=acme"})"));
+    client->call<Ipc::CSConfigIdsList>(parse(R"({"query":"who is jane"})"));
+    std::string const page = metricsAt(socket);
+    EXPECT_THAT(page, HasSubstr("vlserviced_command_seconds_count{command=\"settings\"} 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_command_seconds_count{command=\"unknown question\"} 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_commands_refused_total{reason=\"request\"} 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_connections 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_responsive 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_database_up 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_database_seconds_count{operation=\"query\"} "));
+    EXPECT_THAT(page, HasSubstr("vlserviced_jobs{state=\"accepted\"} 0\n"));
+    EXPECT_THAT(page, testing::Not(HasSubstr("jane")));
+    service.signal(SIGTERM);
+    EXPECT_EQ(service.wait(), 0);
+    EXPECT_FALSE(fs::exists(socket));
+}
+
+TEST_F(ServiceProcessTest, TellsOfRefusalsByTheirReason) {
+    using testing::HasSubstr;
+    fs::path const socket = folder_ / "metrics";
+    ServiceProcess const service(arguments({"--metrics", "unix:" + socket.string()}));
+    auto const owner = clientOf(service, data_);
+    json::Object const token = owner
+                                   ->call<Ipc::CSConfigIdsList>(parse(
+                                       R"({"query":"add_token","name":"desk","role":"read","id":"a=acme"})"))
+                                   ->resp();
+    Channel::ClientSettings settings;
+    settings.host = "127.0.0.1";
+    settings.port = service.port();
+    settings.token = token.get("token").textOrEmpty();
+    Channel::Client desk(std::move(settings));
+    failureOf([&] { desk.call<Ipc::CSConfigIdsList>(parse(R"({"query":"carriers"})")); });
+    owner->call<Ipc::CSConfigIdsList>(parse(R"({"query":"revoke_token","name":"desk"})"));
+    failureOf([&] { desk.call<Ipc::GetSvcCfg>(); });
+    std::string const page = metricsAt(socket);
+    EXPECT_THAT(page, HasSubstr("vlserviced_commands_refused_total{reason=\"rights\"} 1\n"));
+    EXPECT_THAT(page, HasSubstr("vlserviced_commands_refused_total{reason=\"token\"} 1\n"));
+}
+
+TEST_F(ServiceProcessTest, RefusesToTellOthersThanThisMachine) {
+    EXPECT_EQ(startFailure(arguments({"--metrics", "0.0.0.0:9117"})),
+              "vlserviced: --metrics takes a loopback address with a port, such as 127.0.0.1:9117, or "
+              "unix:PATH, and got \"0.0.0.0:9117\"\n");
 }
 
 TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {

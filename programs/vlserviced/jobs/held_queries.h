@@ -7,6 +7,7 @@
 
 #include <boost/asio/steady_timer.hpp>
 
+#include <cstddef>
 #include <functional>
 #include <list>
 #include <set>
@@ -35,6 +36,8 @@ public:
     /// The same of every job that somebody waits for.
     void lookAgain();
     void releaseAll();
+    /// How many wait.
+    std::size_t size() const { return held_.size(); }
 
 private:
     struct Held {

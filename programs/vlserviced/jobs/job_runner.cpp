@@ -218,9 +218,13 @@ void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
     if (known)
         return finish([&] { proceed(*known); });
     surroundings_.onReader([this, location, mayBeOf, finish, open = surroundings_.openPack,
-                            onOwnThread = surroundings_.onOwnThread, who = surroundings_.recorder.who()] {
+                            onOwnThread = surroundings_.onOwnThread, who = surroundings_.recorder.who(),
+                            took = surroundings_.took] {
         auto const summary = std::make_shared<PackSummary>();
-        Outcome const read = outcomeOf([&] { *summary = summaryOf(*open(location)); });
+        Outcome const read = outcomeOf([&] {
+            StepTime const time(took, Step::Admission);
+            *summary = summaryOf(*open(location));
+        });
         onOwnThread([this, location, mayBeOf, finish, summary, read, who] {
             finish([&] {
                 if (read.kind != Outcome::Kind::Done)
@@ -316,7 +320,7 @@ std::function<void()> JobRunner::makingContainer(Job const& job) const {
 }
 
 void JobRunner::startPacking(Job const& job) {
-    inBackground(job.pack.packId, packing(job),
+    inBackground(job.pack.packId, Step::Packing, packing(job),
                  [this, packId = job.pack.packId](Outcome const& outcome) { onPacked(packId, outcome); });
 }
 
@@ -345,7 +349,7 @@ void JobRunner::startHandingOver(Job const& job) {
 void JobRunner::startDividing(Job const& job) {
     auto const division = std::make_shared<Division>();
     inBackground(
-        job.pack.packId,
+        job.pack.packId, Step::Division,
         [division, make = makingContainer(job), container = surroundings_.outbox / job.containerName(),
          rest = surroundings_.outbox / REST_FOLDER / job.containerName(),
          carriers = surroundings_.settings().carriers()] {
@@ -412,7 +416,7 @@ void JobRunner::startStaging(Job const& job) {
         return;
     auto const identity = std::make_shared<std::string>(surroundings_.settings().uploadFolderIdentity());
     inBackground(
-        job.pack.packId,
+        job.pack.packId, Step::Staging,
         [container = containerToStage(job), make = makingRest(job), folder, identity,
          fence = held(job.pack.packId).fence.value_or(0)] {
             UploadFolder const target(folder, *identity);
@@ -483,6 +487,7 @@ void JobRunner::change(JobAction action, std::string const& packId) {
 
 void JobRunner::finishSubmitting(Job const& job) {
     Outcome const outcome = outcomeOf([&] {
+        StepTime const time(surroundings_.took, Step::Publishing);
         publish(job.containerName(), UploadFolder(job.uploadFolder, job.uploadFolderIdentity),
                 job.submitFence);
     });
@@ -603,7 +608,7 @@ void JobRunner::noteProblem(std::string const& packId, std::string const& proble
     jobs_.setProblem(held(packId), problem);
 }
 
-void JobRunner::inBackground(std::string const& packId, std::function<void()> work,
+void JobRunner::inBackground(std::string const& packId, Step step, std::function<void()> work,
                              std::function<void(Outcome)> then) {
     busy_.insert(packId);
     auto const finish = [this, packId, then = std::move(then)](Outcome const& outcome) {
@@ -620,13 +625,21 @@ void JobRunner::inBackground(std::string const& packId, std::function<void()> wo
         }
     };
     try {
-        surroundings_.onWorker([work = std::move(work), finish, onOwnThread = surroundings_.onOwnThread] {
-            onOwnThread([finish, outcome = outcomeOf(work)] { finish(outcome); });
-        });
+        surroundings_.onWorker(
+            [work = timed(step, std::move(work)), finish, onOwnThread = surroundings_.onOwnThread] {
+                onOwnThread([finish, outcome = outcomeOf(work)] { finish(outcome); });
+            });
     } catch (...) {
         busy_.erase(packId);
         throw;
     }
+}
+
+std::function<void()> JobRunner::timed(Step step, std::function<void()> work) const {
+    return [step, work = std::move(work), took = surroundings_.took] {
+        StepTime const time(took, step);
+        work();
+    };
 }
 
 JobRunner::Outcome JobRunner::outcomeOf(std::function<void()> const& work) {

@@ -7,6 +7,7 @@
 #include "programs/policy/limits.h"
 #include "programs/policy/rights.h"
 #include "programs/vlserviced/jobs/admission.h"
+#include "programs/vlserviced/jobs/step.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/history.h"
 #include "programs/vlserviced/store/job_store.h"
@@ -60,6 +61,7 @@ struct JobSurroundings {
     OpenPack openPack = &openPackDatabase;
     /// Where is noted what people do.
     Recorder recorder = {};
+    StepTook took = [](Step, std::chrono::duration<double>) {};
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -78,6 +80,8 @@ public:
     void resume();
     /// Takes up those whose time has come and that nobody works on, a few at a time.
     void takeUp();
+    /// How many jobs the worker is busy with, or will be.
+    std::size_t inHand() const { return busy_.size(); }
     /// Holds on what is being worked on; to be called a few times in the time of the store's holder.
     void keepHold();
     /// Removes what nobody publishes any more from the upload folder, and from the outbox what has left it.
@@ -147,8 +151,10 @@ private:
     void discardLeft();
     void sweepOutbox();
     /// Runs `work` on the worker and hands its outcome to `then` on the own thread.
-    void inBackground(std::string const& packId, std::function<void()> work,
+    void inBackground(std::string const& packId, Step step, std::function<void()> work,
                       std::function<void(Outcome)> then);
+    /// The same work, of which is told how long it takes.
+    std::function<void()> timed(Step step, std::function<void()> work) const;
     static Outcome outcomeOf(std::function<void()> const& work);
 
     JobStore& jobs_;

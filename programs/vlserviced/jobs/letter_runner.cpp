@@ -126,6 +126,13 @@ void LetterRunner::resume() {
     proceed();
 }
 
+std::size_t LetterRunner::inHand() const {
+    std::size_t letters = 0;
+    for (auto const& [name, channel] : channels_)
+        letters += channel.inHand.size();
+    return letters;
+}
+
 /// One service has a channel at a time, so that its pace is that of one.
 bool LetterRunner::hold(std::string const& name) {
     if (held_.contains(name))
@@ -252,11 +259,14 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     surroundings_.onCarrier(
         name, static_cast<std::size_t>(channel.settings.atOnce),
         [this, handOver, isShared = letters_.isShared(), onOwnThread = surroundings_.onOwnThread,
-         doneOnOwnThread = surroundings_.doneOnOwnThread] {
+         doneOnOwnThread = surroundings_.doneOnOwnThread, took = surroundings_.took] {
             // Whoever finds them so on record cannot know whether the other side has them.
-            carryOut(*handOver, isShared, [&] {
-                doneOnOwnThread([&] { letters_.beginHandingOver(handOver->ids(), surroundings_.now()); });
-            });
+            {
+                StepTime const time(took, Step::HandingOver);
+                carryOut(*handOver, isShared, [&] {
+                    doneOnOwnThread([&] { letters_.beginHandingOver(handOver->ids(), surroundings_.now()); });
+                });
+            }
             onOwnThread([this, handOver] { onDone(handOver); });
         });
 }
@@ -320,16 +330,15 @@ void LetterRunner::settle(std::shared_ptr<HandOver> const& handOver) {
 
 void LetterRunner::recordOutcome(HandOver const& handOver) {
     for (BadLetter const& bad : handOver.bad)
-        letters_.finish({bad.id}, LetterState::Failed, Base::oneLine(bad.why), surroundings_.now(),
-                        letters_.isShared() ? LettersAre::Waiting : LettersAre::Anywhere);
+        finish(handOver.channel, {bad.id}, LetterState::Failed, Base::oneLine(bad.why),
+               letters_.isShared() ? LettersAre::Waiting : LettersAre::Anywhere);
     if (handOver.letters.empty())
         return;
     noteCarrier(handOver);
     Outcome const& outcome = handOver.outcome;
     if (outcome.kind == Outcome::Kind::Failed)
         return postpone(handOver);
-    letters_.finish(handOver.ids(), stateBehind(outcome.kind), outcome.says, surroundings_.now(),
-                    handOver.are);
+    finish(handOver.channel, handOver.ids(), stateBehind(outcome.kind), outcome.says, handOver.are);
     if (!handOver.settings.canBeAsked() || outcome.kind == Outcome::Kind::Refused)
         return;
     Channel& channel = channels_.at(handOver.channel);
@@ -338,15 +347,22 @@ void LetterRunner::recordOutcome(HandOver const& handOver) {
     channel.askable[handOver.key] = handOver.ids();
 }
 
+void LetterRunner::finish(std::string const& channel, std::vector<LetterId> const& letters, LetterState state,
+                          std::string const& says, LettersAre are) {
+    letters_.finish(letters, state, says, surroundings_.now(), are);
+    auto const count = std::ranges::count_if(letters, [](LetterId const& id) { return !id.isNotice(); });
+    surroundings_.became(channel, state, static_cast<std::size_t>(count));
+}
+
 void LetterRunner::postpone(HandOver const& handOver) {
     long long const now = surroundings_.now();
     std::string const& says = handOver.outcome.says;
     for (StoredLetter const& letter : handOver.letters) {
         if (isGivenUp(letter.firstTry, now, handOver.settings))
-            letters_.finish({letter.id}, LetterState::Failed,
-                            Base::oneLine("given up after " + std::to_string(handOver.settings.giveUpHours) +
-                                          " hours: " + says),
-                            now, handOver.are);
+            finish(handOver.channel, {letter.id}, LetterState::Failed,
+                   Base::oneLine("given up after " + std::to_string(handOver.settings.giveUpHours) +
+                                 " hours: " + says),
+                   handOver.are);
         else
             letters_.postpone({letter.id}, says, now + pauseBehind(letter.attempts + 1, handOver.settings),
                               now, handOver.are);
@@ -433,7 +449,7 @@ bool LetterRunner::note(Channel const& channel, LetterId const& id, Carriers::Pr
 
 void LetterRunner::noteState(StoredLetter const& letter, LetterState state, std::string const& says) {
     if (state != letter.state || says != letter.says)
-        letters_.finish({letter.id}, state, says, surroundings_.now());
+        finish(letter.channel, {letter.id}, state, says);
 }
 
 void LetterRunner::noteCarrier(HandOver const& handOver) {
@@ -620,6 +636,7 @@ StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind k
     if (!isNoted)
         throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) +
                           ", which the report does not go with");
+    surroundings_.became(letter->channel, stateBehind(kind), id.isNotice() ? 0 : 1);
     if (!id.isNotice())
         unsettled_.insert(id.packId);
     proceed();

@@ -7,6 +7,7 @@
 #include "programs/vlserviced/jobs/carrier_pace.h"
 #include "programs/vlserviced/jobs/division.h"
 #include "programs/vlserviced/jobs/letter_parcel.h"
+#include "programs/vlserviced/jobs/step.h"
 #include "programs/vlserviced/settings/service_settings.h"
 #include "programs/vlserviced/store/history.h"
 
@@ -53,6 +54,10 @@ struct LetterSurroundings {
     /// Work, away from the own thread, that has a mailing's container in the outbox: another machine may have
     /// made it.
     std::function<Work(std::string const& packId)> container = [](std::string const&) { return [] {}; };
+    StepTook took = [](Step, std::chrono::duration<double>) {};
+    /// Told what became of letters that were handed over, or were to be.
+    std::function<void(std::string const& channel, LetterState state, std::size_t letters)> became =
+        [](std::string const&, LetterState, std::size_t) {};
 };
 
 /// Used by one thread; the work it hands to carriers touches nothing of it.
@@ -62,6 +67,8 @@ public:
     LetterRunner(LetterStore& letters, JobStore& jobs, LetterSurroundings surroundings);
 
     LetterStore const& store() const { return letters_; }
+    /// How many letters are in the hands of carriers.
+    std::size_t inHand() const;
 
     /// Takes up what an earlier process left.
     void resume();
@@ -152,6 +159,9 @@ private:
     /// What cannot be put on record is kept and tried again.
     void settle(std::shared_ptr<HandOver> const& handOver);
     void recordOutcome(HandOver const& handOver);
+    /// Notes it on record, and tells of it.
+    void finish(std::string const& channel, std::vector<LetterId> const& letters, LetterState state,
+                std::string const& says, LettersAre are = LettersAre::Anywhere);
     void postpone(HandOver const& handOver);
     void noteCarrier(HandOver const& handOver);
     static std::string keyOf(StoredLetter const& letter, std::string const& channel,

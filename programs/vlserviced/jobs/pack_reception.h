@@ -6,6 +6,7 @@
 #include "programs/vlserviced/store/pack_store.h"
 #include "vlservice/platform/cmd.h"
 
+#include <cstddef>
 #include <functional>
 #include <map>
 #include <memory>
@@ -57,6 +58,9 @@ public:
     /// That all of a pack is there; a pack that is not as it was said to be goes. `done` is called once,
     /// later, with the reason as one line or nothing.
     void complete(std::string const& packId, std::function<void(std::string const& failure)> done);
+
+    /// How many pieces wait for the store's thread.
+    std::size_t waiting() const { return waiting_.size(); }
 
     /// Looks whether the pages of a job are of use still.
     void onJobChanged(std::string const& packId);

@@ -381,4 +381,10 @@ std::vector<std::pair<JobState, long long>> JobStore::counts() const {
     return counts;
 }
 
+std::optional<long long> JobStore::oldestAcceptance(JobState state) const {
+    Database::Rows rows = database_.query(
+        "SELECT accepted_at FROM jobs WHERE state = $1 ORDER BY accepted_at, pack LIMIT 1", stateName(state));
+    return rows.next() ? std::optional(rows.number(0)) : std::nullopt;
+}
+
 } // namespace VlServiced

@@ -65,6 +65,8 @@ public:
 
     /// How many jobs are in each state that any is in.
     std::vector<std::pair<JobState, long long>> counts() const;
+    /// When the oldest job of a state was accepted.
+    std::optional<long long> oldestAcceptance(JobState state) const;
 
     /// Records a new job as accepted. False when there is one of that pack id already: it stays as it is.
     bool accept(Job const& job);

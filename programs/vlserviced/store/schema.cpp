@@ -285,6 +285,12 @@ std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path 
     return std::make_unique<Database::SqliteConnection>(std::move(database));
 }
 
+std::unique_ptr<Database::Connection> openToLook(std::filesystem::path const& file) {
+    constexpr int PATIENCE_MS = 5000;
+    return std::make_unique<Database::SqliteConnection>(
+        SQLite::Database(file.string(), SQLite::OPEN_READONLY, PATIENCE_MS));
+}
+
 SharedDatabase openSharedDatabase(std::string const& address) {
     Database::requirePostgresAddress(address);
     SharedDatabase shared{std::make_unique<Database::PostgresConnection>(address)};

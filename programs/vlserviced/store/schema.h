@@ -15,6 +15,9 @@ Database::DatabaseKind const& serviceDatabase();
 /// Opens, or creates, the service's database and tests it for damage. Throws Database::DatabaseError.
 std::unique_ptr<Database::Connection> openServiceDatabase(std::filesystem::path const& file);
 
+/// Another connection to one that is open, to look at what is on record. Throws std::exception.
+std::unique_ptr<Database::Connection> openToLook(std::filesystem::path const& file);
+
 struct SharedDatabase {
     std::unique_ptr<Database::Connection> connection;
     /// Whether its schema was made by this very call.

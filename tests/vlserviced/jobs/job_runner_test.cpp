@@ -8,6 +8,7 @@
 #include "tests/vlserviced/pack_help.h"
 
 #include <SQLiteCpp/Database.h>
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <deque>
@@ -17,6 +18,7 @@
 namespace {
 
 namespace fs = std::filesystem;
+using testing::ElementsAre;
 
 using VlServiced::JobRunner;
 using VlServiced::UploadFolder;
@@ -34,25 +36,28 @@ protected:
 
     void startRunner() {
         work_.clear();
-        runner_.emplace(
-            jobs_, VlServiced::JobSurroundings{
-                       [this](VlServiced::JobSurroundings::Work work) { work_.push_back(std::move(work)); },
-                       [this](VlServiced::JobSurroundings::Work const& work) {
-                           readersWork_ ? readersWork_->push_back(work) : work();
-                       },
-                       [](VlServiced::JobSurroundings::Work const& work) { work(); },
-                       [this] { return now_; },
-                       [this] { return VlServiced::ServiceSettings(settings_); },
-                       outbox_,
-                       [this](std::string const&) { return rules_; },
-                       [](std::string const& node, std::string const& packPreset) {
-                           return node + " for " + packPreset;
-                       },
-                       [](long long) { return 0LL; },
-                       [this](std::string const& node, std::string const& packPreset) {
-                           used_.push_back(node + ' ' + packPreset);
-                       },
-                   });
+        VlServiced::JobSurroundings surroundings{
+            [this](VlServiced::JobSurroundings::Work work) { work_.push_back(std::move(work)); },
+            [this](VlServiced::JobSurroundings::Work const& work) {
+                readersWork_ ? readersWork_->push_back(work) : work();
+            },
+            [](VlServiced::JobSurroundings::Work const& work) { work(); },
+            [this] { return now_; },
+            [this] { return VlServiced::ServiceSettings(settings_); },
+            outbox_,
+            [this](std::string const&) { return rules_; },
+            [](std::string const& node, std::string const& packPreset) {
+                return node + " for " + packPreset;
+            },
+            [](long long) { return 0LL; },
+            [this](std::string const& node, std::string const& packPreset) {
+                used_.push_back(node + ' ' + packPreset);
+            },
+        };
+        surroundings.took = [this](VlServiced::Step step, std::chrono::duration<double>) {
+            steps_.emplace_back(VlServiced::stepName(step));
+        };
+        runner_.emplace(jobs_, surroundings);
     }
     void doWork() {
         for (; !work_.empty(); work_.pop_front())
@@ -122,6 +127,7 @@ protected:
     Policy::Rules rules_;
     /// Nodes and pack presets of accepted mailings.
     std::vector<std::string> used_;
+    std::vector<std::string> steps_;
     std::optional<JobRunner> runner_;
 };
 
@@ -139,6 +145,16 @@ TEST_F(JobRunnerTest, PutsThePackOnRecordBeforeThePagesAreFetched) {
     EXPECT_EQ(state("p1"), "queued");
     EXPECT_EQ(jobs_.find("p1")->changedAt, 1005);
     EXPECT_EQ(contentOf(outbox_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(JobRunnerTest, TellsHowLongEachStepTakesOnTheWay) {
+    acceptStored("p1");
+    EXPECT_THAT(steps_, ElementsAre("admission"));
+    doWork();
+    runner_->upload("", "");
+    doWork();
+    EXPECT_EQ(state("p1"), "submitted");
+    EXPECT_THAT(steps_, ElementsAre("admission", "packing", "staging", "publishing"));
 }
 
 TEST_F(JobRunnerTest, TakesAPackOnceHoweverOftenItIsSent) {

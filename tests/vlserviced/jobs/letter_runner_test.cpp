@@ -98,21 +98,27 @@ protected:
     void start() {
         using Work = VlServiced::LetterSurroundings::Work;
         work_.clear();
-        letterRunner_.emplace(
-            letters_, jobs_,
-            VlServiced::LetterSurroundings{
-                [this](std::string const& channel, std::size_t, Work work) {
-                    work_.emplace_back(channel, std::move(work));
-                },
-                [](Work const& work) { work(); },
-                [](Work const& work) { work(); },
-                [this] { return now_; },
-                [this] { return VlServiced::ServiceSettings(settings_); },
-                outbox_,
-                [](long long) { return 0LL; },
-                [this](Protocol::CarrierSettings const&) { return std::make_unique<FakeCarrier>(other_); },
-                [this](std::string const& packId) { runner_->onLettersTaken(packId); },
-            });
+        VlServiced::LetterSurroundings around{
+            [this](std::string const& channel, std::size_t, Work work) {
+                work_.emplace_back(channel, std::move(work));
+            },
+            [](Work const& work) { work(); },
+            [](Work const& work) { work(); },
+            [this] { return now_; },
+            [this] { return VlServiced::ServiceSettings(settings_); },
+            outbox_,
+            [](long long) { return 0LL; },
+            [this](Protocol::CarrierSettings const&) { return std::make_unique<FakeCarrier>(other_); },
+            [this](std::string const& packId) { runner_->onLettersTaken(packId); },
+        };
+        around.took = [this](VlServiced::Step step, std::chrono::duration<double>) {
+            steps_.emplace_back(VlServiced::stepName(step));
+        };
+        around.became = [this](std::string const& channel, LetterState state, std::size_t letters) {
+            became_.push_back(channel + ' ' + Protocol::letterStateName(state) + ' ' +
+                              std::to_string(letters));
+        };
+        letterRunner_.emplace(letters_, jobs_, around);
         VlServiced::JobSurroundings surroundings{
             [](VlServiced::JobSurroundings::Work const& work) { work(); },
             [](VlServiced::JobSurroundings::Work const& work) { work(); },
@@ -184,6 +190,8 @@ protected:
     VlServiced::LetterStore letters_{*database_, jobs_};
     json::Object settings_;
     long long now_ = 1000;
+    std::vector<std::string> steps_;
+    std::vector<std::string> became_;
     OtherSide other_;
     std::deque<std::pair<std::string, std::function<void()>>> work_;
     std::optional<LetterRunner> letterRunner_;
@@ -234,6 +242,18 @@ TEST_F(LetterRunnerTest, TellsOfBothWhatTheContainersStateAndTheCarriersHaveLeft
     other_.answer = Outcome{Outcome::Kind::Refused, "no"};
     doWork();
     EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 1: no");
+}
+
+TEST_F(LetterRunnerTest, TellsWhatBecameOfLettersAndHowLongTheyTook) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "unit": "mailing"},
+                   "fax": {"type": "folder", "folder": "/fax"})");
+    send("p1", {"postal", "postal", "fax"});
+    other_.answers["p1-3"] = Outcome{Outcome::Kind::Refused, "no"};
+    EXPECT_EQ(letterRunner_->inHand(), 3U);
+    doWork();
+    EXPECT_EQ(letterRunner_->inHand(), 0U);
+    EXPECT_THAT(became_, UnorderedElementsAre("postal accepted 2", "fax failed 1"));
+    EXPECT_THAT(steps_, ElementsAre("handing over", "handing over"));
 }
 
 TEST_F(LetterRunnerTest, NeedsNoUploadFolderWhereThereAreCarriers) {
