@@ -1,6 +1,8 @@
 #include "programs/mailing/metadata.h"
 
+#include "programs/base/json_rows.h"
 #include "programs/mailing/page_blob.h"
+#include "vlservice/json/json_form.h"
 #include "vlservice/json/json_text.h"
 
 #include <algorithm>
@@ -27,17 +29,6 @@ constexpr char const* USED_DOCUMENTS_KEY = "used_documents";
 constexpr char const* SHA256_KEY = "sha256";
 constexpr char const* ENTRIES_DIGEST_KEY = "entries_digest";
 
-/// What is not the pack preset's in the object that it shares; its name's key is listed so that the name is
-/// not taken for an unknown key as well.
-std::unordered_set<std::string> const NOT_THE_PRESETS{ID_KEY,
-                                                      CREATED_KEY,
-                                                      LETTERS_KEY,
-                                                      MADE_READY_KEY,
-                                                      USED_DOCUMENTS_KEY,
-                                                      ENTRIES_DIGEST_KEY,
-                                                      PURCHASE_ORDER_KEY,
-                                                      "pack_preset"};
-
 using Role = DocumentPages::Role;
 
 constexpr std::array ROLES{
@@ -52,55 +43,165 @@ char const* nameOf(Role role) {
 }
 
 /// Older metadata has no roles: all its pages are those of letters.
-Role roleIn(json::Object const& object) {
-    std::string const name = object.get(ROLE_KEY).textOrEmpty();
+Role roleNamed(std::string const& name) {
     auto const found =
         std::find_if(ROLES.begin(), ROLES.end(), [&](auto const& one) { return one.second == name; });
     return found == ROLES.end() ? Role::Letter : found->first;
 }
 
-json::Object toJson(DocumentPages const& document) {
-    json::Array pages;
-    for (int const page : document.pages)
-        pages.append(page);
-    return {{NAME_KEY, document.document}, {PAGES_KEY, pages}, {ROLE_KEY, nameOf(document.role)}};
+std::vector<int> pagesIn(json::Value const& array) {
+    std::vector<int> pages;
+    for (json::Value const& page : array.toArray())
+        pages.push_back(static_cast<int>(page.toInt()));
+    return pages;
 }
 
-DocumentPages documentFrom(json::Object const& object) {
-    DocumentPages document{object.get(NAME_KEY).toString(), {}, roleIn(object)};
-    for (json::Value const& page : object.get(PAGES_KEY).toArray())
-        document.pages.push_back(static_cast<int>(page.toInt()));
-    return document;
+namespace Schema = Base::Schema;
+using Base::Presence;
+
+json::Object rolesSchema() {
+    json::Array names;
+    for (auto const& [role, name] : ROLES)
+        names.append(name);
+    return {{"enum", names}};
 }
 
-json::Object toJson(MailedLetter const& letter) {
-    json::Array documents;
-    for (DocumentPages const& document : letter.documents)
-        documents.append(toJson(document));
-    return {{DOCUMENTS_KEY, documents}, {FIELDS_KEY, letter.fields.serialize()}};
-}
+constexpr Base::JsonRow<DocumentPages> DOCUMENT_ROWS[] = {
+    {NAME_KEY, Presence::Always, &Schema::text,
+     [](DocumentPages const& document) -> json::Value { return document.document; },
+     [](json::Value const& node, DocumentPages& document) { document.document = node.toString(); }},
+    {PAGES_KEY, Presence::Always, [] { return Schema::listOf(Schema::integer(1)); },
+     [](DocumentPages const& document) -> json::Value {
+         return json::Form<std::vector<int>>::write(document.pages);
+     },
+     [](json::Value const& node, DocumentPages& document) { document.pages = pagesIn(node); }},
+    {ROLE_KEY, Presence::WhenThere, &rolesSchema,
+     [](DocumentPages const& document) -> json::Value { return nameOf(document.role); },
+     [](json::Value const& node, DocumentPages& document) { document.role = roleNamed(node.textOrEmpty()); }},
+};
 
-json::Object madeReadyToJson(MailedLetter const& letter) {
-    json::Object object = toJson(letter);
-    object.set(SHEETS_KEY, letter.sheets);
-    object.set(COLOURED_PAGES_KEY, letter.colouredPages);
-    return object;
-}
-
-json::Array toJson(std::vector<UsedDocument> const& documents) {
+template<typename Record>
+json::Array listOf(std::vector<Record> const& all, std::span<Base::JsonRow<Record> const> rows) {
     json::Array array;
-    for (UsedDocument const& document : documents)
-        array.append(json::Object{{ID_KEY, document.id}, {SHA256_KEY, document.sha256}});
+    for (Record const& each : all) {
+        json::Object object;
+        Base::writeRows(rows, each, object);
+        array.append(object);
+    }
     return array;
 }
 
-std::vector<UsedDocument> usedDocumentsIn(json::Value const& array) {
-    std::vector<UsedDocument> documents;
-    if (array)
-        for (json::Value const& document : array.toArray())
-            documents.push_back(
-                {document.toObject().get(ID_KEY).toString(), document.toObject().get(SHA256_KEY).toString()});
-    return documents;
+template<typename Record>
+std::vector<Record> recordsIn(json::Array const& array, std::span<Base::JsonRow<Record> const> rows) {
+    std::vector<Record> records;
+    for (json::Value const& object : array)
+        Base::readRows(rows, object.toObject(), records.emplace_back());
+    return records;
+}
+
+constexpr Base::JsonRow<MailedLetter> LETTER_ROWS[] = {
+    {DOCUMENTS_KEY, Presence::Always,
+     [] { return Schema::listOf(Base::schemaOf<DocumentPages>(DOCUMENT_ROWS)); },
+     [](MailedLetter const& letter) -> json::Value {
+         return listOf<DocumentPages>(letter.documents, DOCUMENT_ROWS);
+     },
+     [](json::Value const& node, MailedLetter& letter) {
+         letter.documents = recordsIn<DocumentPages>(node.toArray(), DOCUMENT_ROWS);
+     }},
+    {FIELDS_KEY, Presence::Always, [] { return Schema::listOf(Schema::definition(EXTRACTED_FIELD)); },
+     [](MailedLetter const& letter) -> json::Value { return letter.fields.serialize(); },
+     [](json::Value const& node, MailedLetter& letter) {
+         letter.fields = Cfg::ExtractedFields(node.toArray());
+     }},
+};
+
+/// Where the mailing is made ready.
+constexpr Base::JsonRow<MailedLetter> MADE_READY_ROWS[] = {
+    {SHEETS_KEY, Presence::WhenThere, [] { return Schema::integer(0); },
+     [](MailedLetter const& letter) -> json::Value { return letter.sheets; },
+     [](json::Value const& node, MailedLetter& letter) { letter.sheets = node.intOrZero(); }},
+    {COLOURED_PAGES_KEY, Presence::WhenThere, [] { return Schema::integer(0); },
+     [](MailedLetter const& letter) -> json::Value { return letter.colouredPages; },
+     [](json::Value const& node, MailedLetter& letter) { letter.colouredPages = node.intOrZero(); }},
+};
+
+json::Object letterSchema() {
+    Schema::Members members(Schema::Members::Others::Refused);
+    Base::describeRows<MailedLetter>(LETTER_ROWS, members);
+    Base::describeRows<MailedLetter>(MADE_READY_ROWS, members);
+    return members.schema();
+}
+
+json::Array lettersToJson(Metadata const& metadata) {
+    json::Array all;
+    for (MailedLetter const& letter : metadata.letters) {
+        json::Object object;
+        Base::writeRows<MailedLetter>(LETTER_ROWS, letter, object);
+        if (metadata.madeReady)
+            Base::writeRows<MailedLetter>(MADE_READY_ROWS, letter, object);
+        all.append(object);
+    }
+    return all;
+}
+
+constexpr Base::JsonRow<UsedDocument> USED_ROWS[] = {
+    {ID_KEY, Presence::Always, &Schema::text,
+     [](UsedDocument const& document) -> json::Value { return document.id; },
+     [](json::Value const& node, UsedDocument& document) { document.id = node.toString(); }},
+    {SHA256_KEY, Presence::Always, &Schema::text,
+     [](UsedDocument const& document) -> json::Value { return document.sha256; },
+     [](json::Value const& node, UsedDocument& document) { document.sha256 = node.toString(); }},
+};
+
+json::Value unlessEmpty(std::string const& text) { return text.empty() ? json::Value() : json::Value(text); }
+
+/// Beside the pack preset's own keys; its name is not among them.
+constexpr Base::JsonRow<Metadata> ROWS[] = {
+    {ID_KEY, Presence::Always, &Schema::text,
+     [](Metadata const& metadata) -> json::Value { return metadata.id; },
+     [](json::Value const& node, Metadata& metadata) { metadata.id = node.toString(); }},
+    {CREATED_KEY, Presence::Always, [] { return Schema::integer(); },
+     [](Metadata const& metadata) -> json::Value { return metadata.created; },
+     [](json::Value const& node, Metadata& metadata) { metadata.created = node.toInt(); }},
+    {LETTERS_KEY, Presence::Always, [] { return Schema::listOf(letterSchema()); },
+     [](Metadata const& metadata) -> json::Value { return lettersToJson(metadata); },
+     [](json::Value const& node, Metadata& metadata) {
+         for (json::Value const& letter : node.toArray())
+             metadata.letters.push_back(letterIn(letter.toObject()));
+     }},
+    {MADE_READY_KEY, Presence::WhenThere, &Schema::flag,
+     [](Metadata const& metadata) { return metadata.madeReady ? json::Value(true) : json::Value(); },
+     [](json::Value const& node, Metadata& metadata) { metadata.madeReady = node.isTrue(); }},
+    {USED_DOCUMENTS_KEY, Presence::WhenThere,
+     [] { return Schema::listOf(Base::schemaOf<UsedDocument>(USED_ROWS)); },
+     [](Metadata const& metadata) {
+         return metadata.usedDocuments.empty() ? json::Value()
+                                               : listOf<UsedDocument>(metadata.usedDocuments, USED_ROWS);
+     },
+     [](json::Value const& node, Metadata& metadata) {
+         if (node)
+             metadata.usedDocuments = recordsIn<UsedDocument>(node.toArray(), USED_ROWS);
+     }},
+    {ENTRIES_DIGEST_KEY, Presence::WhenThere, &Schema::text,
+     [](Metadata const& metadata) { return unlessEmpty(metadata.entriesDigest); },
+     [](json::Value const& node, Metadata& metadata) { metadata.entriesDigest = node.textOrEmpty(); }},
+    {PURCHASE_ORDER_KEY, Presence::WhenThere, &Schema::text,
+     [](Metadata const& metadata) { return unlessEmpty(metadata.purchaseOrder); },
+     [](json::Value const& node, Metadata& metadata) { metadata.purchaseOrder = node.textOrEmpty(); }},
+};
+
+constexpr char const* PACK_PRESET_KEY = "pack_preset";
+
+/// What is not the pack preset's in the object that it shares; its name's key is listed so that the name is
+/// not taken for an unknown key as well.
+std::unordered_set<std::string> const& notThePresets() {
+    static auto const keys = [] {
+        std::unordered_set<std::string> names{PACK_PRESET_KEY};
+        for (auto const& row : ROWS)
+            names.insert(row.name);
+        return names;
+    }();
+    return keys;
 }
 
 SharedMemBuffer blobOf(json::Object const& object) {
@@ -119,33 +220,20 @@ json::Object objectIn(SharedMemBuffer blob) {
 
 json::Object Metadata::toJson() const {
     json::Object object = packPreset.serialize(true);
-    object.set(ID_KEY, id);
-    object.set(CREATED_KEY, created);
-    json::Array all;
-    for (MailedLetter const& letter : letters)
-        all.append(madeReady ? madeReadyToJson(letter) : Mailing::toJson(letter));
-    object.set(LETTERS_KEY, all);
-    if (madeReady)
-        object.set(MADE_READY_KEY, true);
-    if (!usedDocuments.empty())
-        object.set(USED_DOCUMENTS_KEY, Mailing::toJson(usedDocuments));
-    if (!entriesDigest.empty())
-        object.set(ENTRIES_DIGEST_KEY, entriesDigest);
-    if (!purchaseOrder.empty())
-        object.set(PURCHASE_ORDER_KEY, purchaseOrder);
+    Base::writeRows<Metadata>(ROWS, *this, object);
     return object;
 }
 
 Metadata Metadata::fromJson(json::Object const& object) {
-    Metadata metadata{
-        object.get(ID_KEY).toString(), object.get(CREATED_KEY).toInt(), packPresetIn(object), {}};
-    for (json::Value const& letter : object.get(LETTERS_KEY).toArray())
-        metadata.letters.push_back(letterIn(letter.toObject()));
-    metadata.madeReady = object.get(MADE_READY_KEY).isTrue();
-    metadata.usedDocuments = usedDocumentsIn(object.get(USED_DOCUMENTS_KEY));
-    metadata.entriesDigest = object.get(ENTRIES_DIGEST_KEY).textOrEmpty();
-    metadata.purchaseOrder = object.get(PURCHASE_ORDER_KEY).textOrEmpty();
+    Metadata metadata;
+    metadata.packPreset = packPresetIn(object);
+    Base::readRows<Metadata>(ROWS, object, metadata);
     return metadata;
+}
+
+void Metadata::describe(Schema::Members& into) {
+    into.require(PACK_PRESET_KEY, Schema::text());
+    Base::describeRows<Metadata>(ROWS, into);
 }
 
 SharedMemBuffer Metadata::toBlob() const { return blobOf(toJson()); }
@@ -165,11 +253,9 @@ SharedMemBuffer withEntriesDigest(SharedMemBuffer metadata, std::string const& d
 }
 
 MailedLetter letterIn(json::Object const& object) {
-    MailedLetter letter{{}, Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray())};
-    for (json::Value const& document : object.get(DOCUMENTS_KEY).toArray())
-        letter.documents.push_back(documentFrom(document.toObject()));
-    letter.sheets = object.get(SHEETS_KEY).intOrZero();
-    letter.colouredPages = object.get(COLOURED_PAGES_KEY).intOrZero();
+    MailedLetter letter;
+    Base::readRows<MailedLetter>(LETTER_ROWS, object, letter);
+    Base::readRows<MailedLetter>(MADE_READY_ROWS, object, letter);
     return letter;
 }
 
@@ -186,7 +272,7 @@ bool isSameMailing(SharedMemBuffer const& a, SharedMemBuffer const& b) {
 }
 
 Cfg::PackPreset packPresetIn(json::Object const& metadata) {
-    return Cfg::PackPreset(metadata, NOT_THE_PRESETS);
+    return Cfg::PackPreset(metadata, notThePresets());
 }
 
 SharedMemBuffer withMembers(SharedMemBuffer metadata, json::Object const& members) {

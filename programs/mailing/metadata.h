@@ -9,6 +9,10 @@
 #include <string>
 #include <vector>
 
+namespace Base::Schema {
+class Members;
+} // namespace Base::Schema
+
 namespace Mailing {
 
 /// Pages of one document that belong to a letter. In a mailing that is made ready they begin on a front side
@@ -45,6 +49,9 @@ struct UsedDocument {
     std::string sha256;
 };
 
+/// As schemas name the object of a letter's field.
+inline constexpr char const* EXTRACTED_FIELD = "extracted_field";
+
 inline constexpr char const* PURCHASE_ORDER_KEY = "purchase_order";
 
 /// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
@@ -68,6 +75,9 @@ struct Metadata {
     json::Object toJson() const;
     /// Throws std::exception when a key has not the form above.
     static Metadata fromJson(json::Object const& object);
+    /// Its keys beside those of the pack preset, as a JSON schema's; fields are the definition
+    /// EXTRACTED_FIELD.
+    static void describe(Base::Schema::Members& into);
 
     /// The compressed JSON text, as the container takes it. Throws Error when there is no memory for it.
     SharedMemBuffer toBlob() const;

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <sstream>
 #include <string_view>
+#include <utility>
 
 namespace Manual {
 namespace {
@@ -64,6 +65,11 @@ bool isRemark(std::string const& line) {
 }
 
 bool isRule(std::string const& line) { return line.find_first_not_of("|-: ") == std::string::npos; }
+
+void addRow(Table& table, std::vector<std::string> cells) {
+    cells.resize(table.head.size());
+    table.rows.push_back(std::move(cells));
+}
 
 class Blocks {
 public:
@@ -141,6 +147,24 @@ private:
 } // namespace
 
 std::vector<Block> blocksOf(std::string const& markdown) { return Blocks().take(markdown); }
+
+std::vector<Table> tablesOf(std::string const& markdown) {
+    std::vector<Table> tables;
+    std::istringstream in(markdown);
+    std::string heading;
+    bool inTable = false;
+    for (std::string line; std::getline(in, line);) {
+        if (line.starts_with('#'))
+            heading = trimmed(line.substr(line.find_first_not_of('#')));
+        bool const isRow = line.starts_with('|');
+        if (isRow && !inTable)
+            tables.push_back({heading, cellsOf(line)});
+        else if (isRow && !isRule(line))
+            addRow(tables.back(), cellsOf(withoutAddresses(line)));
+        inTable = isRow;
+    }
+    return tables;
+}
 
 std::vector<Span> spansOf(std::string const& text) {
     std::vector<Span> spans{{}};

@@ -1,5 +1,6 @@
 #include "programs/production/finding.h"
 
+#include "programs/base/json_schema.h"
 #include "programs/base/plain_text.h"
 #include "vlservice/cfg/geometry.h"
 
@@ -91,6 +92,24 @@ Finding Finding::fromJson(json::Object const& object) {
     for (json::Value const& page : object.get(PAGES_KEY).toArray())
         finding.pages.push_back(static_cast<int>(page.toInt()));
     return finding;
+}
+
+json::Object Finding::schema() {
+    namespace Schema = Base::Schema;
+    json::Array names;
+    for (CodeRow const& row : ROWS)
+        names.append(row.name);
+    Schema::Members box(Schema::Members::Others::Refused);
+    for (json::KeyRow const& row : Cfg::Rect::keys().rows)
+        box.add(row.name, Schema::integer());
+    return Schema::Members(Schema::Members::Others::Refused)
+        .require(CODE_KEY, {{"enum", names}})
+        .require(SEVERITY_KEY, Schema::words({inWords(Error), inWords(Warning)}))
+        .require(PAGES_KEY, Schema::listOf(Schema::integer(1)))
+        .require(BOX_KEY, box.schema())
+        .require(SAYS_KEY, Schema::text())
+        .require(FIX_KEY, Schema::text())
+        .schema();
 }
 
 void Findings::add(Code code, Place const& place, std::string says, std::string fix) {

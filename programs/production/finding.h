@@ -70,6 +70,8 @@ struct Finding {
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc, also for a code or severity that there is none of.
     static Finding fromJson(json::Object const& object);
+    /// Of that object.
+    static json::Object schema();
 
     friend bool operator==(Finding const&, Finding const&) = default;
 };

@@ -1,5 +1,6 @@
 #include "programs/production/production_rules.h"
 
+#include "programs/base/json_schema.h"
 #include "programs/base/millimetres.h"
 #include "programs/base/quoting.h"
 #include "programs/mailing/print_wishes.h"
@@ -36,6 +37,9 @@ constexpr std::array SHEET_KEYS{WIDTH, HEIGHT};
 constexpr char const* PAGES = "pages";
 constexpr std::array EDGES{"left", "top", "right", "bottom"};
 constexpr std::array ZONE_KEYS{"left", "top", "right", "bottom", PAGES};
+
+constexpr char const* FIRST_PAGE = "first";
+constexpr char const* ALL_PAGES = "all";
 
 constexpr char const* MIN = "min";
 constexpr char const* MAX = "max";
@@ -175,11 +179,11 @@ private:
         std::optional<Box> const read = box(value, path, ZONE_KEYS);
         json::Value const pages = value.isObject() ? value.toObject().get(PAGES) : json::Value();
         std::string const word = pages.textOrEmpty();
-        if (pages && word != "first" && word != "all")
+        if (pages && word != FIRST_PAGE && word != ALL_PAGES)
             return fault(below(path, PAGES), "is neither \"first\" nor \"all\"",
                          "write \"first\" or \"all\"");
         if (read)
-            rules.clearZones.push_back({*read, word == "all"});
+            rules.clearZones.push_back({*read, word == ALL_PAGES});
     }
 
     void readLines(ProductionRules& rules, json::Value const& lines) {
@@ -240,6 +244,26 @@ private:
     PageSize sheet_ = A4_SHEET;
 };
 
+namespace Schema = Base::Schema;
+using Schema::Members;
+
+Members boxMembers() {
+    Members members(Members::Others::Refused);
+    for (char const* edge : EDGES)
+        members.require(edge, Schema::integer(0, ProductionRules::MAX_LENGTH));
+    return members;
+}
+
+json::Object sheetSchema() {
+    json::Object const length = Schema::integer(1, ProductionRules::MAX_LENGTH);
+    return Members(Members::Others::Refused).require(WIDTH, length).require(HEIGHT, length).schema();
+}
+
+json::Object linesSchema() {
+    json::Object const lines = Schema::integer(1, ProductionRules::MAX_LINES);
+    return Members(Members::Others::Refused).add(MIN, lines).add(MAX, lines).schema();
+}
+
 bool areWithin(int tolerance, PageSize one, PageSize other) {
     return std::abs(one.width - other.width) <= tolerance && std::abs(one.height - other.height) <= tolerance;
 }
@@ -252,6 +276,22 @@ bool ProductionRules::takes(PageSize page) const {
 
 ProductionRules ProductionRules::from(json::Value const& production, Faults& faults) {
     return Parser(faults).rules(production);
+}
+
+json::Object ProductionRules::schema() {
+    json::Object const zone = boxMembers().add(PAGES, Schema::words({FIRST_PAGE, ALL_PAGES})).schema();
+    json::Object const repair = Schema::listOf(Schema::constant(COVER_PAGE));
+    return Members(Members::Others::Refused)
+        .add(SHEET, sheetSchema())
+        .add(WINDOW, boxMembers().schema())
+        .add(CLEAR_ZONES, Schema::listOfAtMost(zone, MAX_ZONES))
+        .add(TOLERANCE,
+             Schema::with(Schema::integer(0, MAX_TOLERANCE), "default", ProductionRules().tolerance))
+        .add(ADDRESS_LINES, linesSchema())
+        .add(POSTCODE, Schema::with(Schema::text(), "minLength", 1))
+        .add(REPAIR, repair)
+        .add(COPIES, Schema::with(Schema::integer(1, PrintWishes::MAX_COPIES), "default", 1))
+        .schema();
 }
 
 ProductionRules ProductionRules::of(Cfg::PackPreset const& preset, Faults& faults) {

@@ -54,6 +54,8 @@ struct ProductionRules {
 
     /// Adds what is wrong to `faults`; such a value counts as not said.
     static ProductionRules from(json::Value const& production, std::vector<Reader::RulesFault>& faults);
+    /// What `production` may be, as a JSON schema.
+    static json::Object schema();
     static ProductionRules of(Cfg::PackPreset const& preset, std::vector<Reader::RulesFault>& faults);
 };
 

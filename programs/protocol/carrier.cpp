@@ -17,7 +17,12 @@
 namespace Protocol {
 namespace {
 
+namespace Schema = Base::Schema;
+
 constexpr char const* TYPE = "type";
+constexpr char const* AT_ONCE = "at_once";
+constexpr char const* USER = "user";
+constexpr char const* PASSWORD_FILE = "password_file";
 constexpr char const* ACTION = "action";
 constexpr std::size_t MAX_CHANNELS = 16;
 constexpr std::size_t MAX_CHANNEL_BYTES = 32;
@@ -28,6 +33,7 @@ struct PathForm {
         return text.starts_with('/') && Base::isPlainText(text, CarrierSettings::MAX_PATH_BYTES);
     }
     static std::string wanted() { return "an absolute path"; }
+    static json::Object schema() { return Schema::textLike("^/"); }
 };
 
 struct UnitForm {
@@ -35,6 +41,7 @@ struct UnitForm {
         return node.textOrEmpty() == "letter" || node.textOrEmpty() == "mailing";
     }
     static std::string wanted() { return "\"letter\" or \"mailing\""; }
+    static json::Object schema() { return Schema::words({"letter", "mailing"}); }
 };
 
 bool isLetterOrDigit(char c) {
@@ -68,6 +75,9 @@ struct SftpUrlForm {
     static std::string wanted() {
         return "sftp://USER@HOST:PORT/FOLDER/, with letters, digits and \"._-~/\" in the folder";
     }
+    static json::Object schema() {
+        return Schema::textLike("^sftp://[A-Za-z0-9._-]+@[^/@]+/([A-Za-z0-9/._~-]*/)?$");
+    }
 };
 
 /// A printer, or a queue of a print server.
@@ -86,6 +96,7 @@ struct PrinterUriForm {
     static std::string wanted() {
         return "ipp://HOST:PORT/PATH, with letters, digits and \"._-/\" in the path";
     }
+    static json::Object schema() { return Schema::textLike("^ipp://[^/]+/[A-Za-z0-9/._-]*$"); }
 };
 
 /// Of 32 bytes in base64.
@@ -99,6 +110,7 @@ struct HostKeyForm {
                isMadeOf(std::string_view(text).substr(BEGIN.size()), "+/");
     }
     static std::string wanted() { return "\"SHA256:\" and 43 characters, as ssh-keygen -l prints it"; }
+    static json::Object schema() { return Schema::textLike("^SHA256:[A-Za-z0-9+/]{43}$"); }
 };
 
 /// The host and port of a server.
@@ -111,11 +123,13 @@ struct SmtpUrlForm {
                isHostWithPort(std::string_view(text).substr(end + 3));
     }
     static std::string wanted() { return "smtp://HOST:PORT or smtps://HOST:PORT"; }
+    static json::Object schema() { return Schema::textLike("^smtps?://[^/]+$"); }
 };
 
 struct AddressForm {
     static bool fits(json::Value const& node) { return Base::isEmailAddress(node.textOrEmpty()); }
     static std::string wanted() { return "one plain address NAME@HOST"; }
+    static json::Object schema() { return Schema::textLike("^[^@ ]+@[^@ ]+$"); }
 };
 
 /// One line.
@@ -126,6 +140,7 @@ struct LineForm {
         return node.isString() && Base::isPlainText(node.textOrEmpty(), MAX_BYTES);
     }
     static std::string wanted() { return "a line of at most " + std::to_string(MAX_BYTES) + " bytes"; }
+    static json::Object schema() { return Schema::textOfAtMost(MAX_BYTES); }
 };
 
 /// A file that only the service may read, or what the system's manager hands over.
@@ -135,6 +150,7 @@ struct SecretForm {
         return PathForm::fits(node) || (!text.empty() && Base::safeFileName(text) == text);
     }
     static std::string wanted() { return "an absolute path, or the name of a credential"; }
+    static json::Object schema() { return Schema::textLike("^(/|[^/.])"); }
 };
 
 bool isDigit(char c) { return c >= '0' && c <= '9'; }
@@ -165,6 +181,9 @@ std::optional<DayWindow> windowIn(std::string const& text) {
 struct HoursForm {
     static bool fits(json::Value const& node) { return windowIn(node.textOrEmpty()).has_value(); }
     static std::string wanted() { return "a window of the day such as \"08:00-18:00\""; }
+    static json::Object schema() {
+        return Schema::textLike("^([01][0-9]|2[0-3]):[0-5][0-9]-([01][0-9]|2[0-3]):[0-5][0-9]$");
+    }
 };
 
 } // namespace
@@ -178,7 +197,7 @@ struct CarrierSettings::Keys {
         Asked{"retry_seconds", &CarrierSettings::retrySeconds, IntegerForm{1, MAX_RETRY_SECONDS}, 30LL},
         Asked{"give_up_hours", &CarrierSettings::giveUpHours, IntegerForm{1, MAX_GIVE_UP_HOURS}, 120LL},
         Asked{"per_minute", &CarrierSettings::perMinute, IntegerForm{1, 100'000}},
-        Asked{"at_once", &CarrierSettings::atOnce, IntegerForm{1, 16}, 1LL},
+        Asked{AT_ONCE, &CarrierSettings::atOnce, IntegerForm{1, 16}, 1LL},
         Asked{"hours", &CarrierSettings::hours, HoursForm{}},
     };
     static constexpr std::tuple FOLDER{
@@ -207,8 +226,8 @@ struct CarrierSettings::Keys {
         Asked{"url", &CarrierSettings::url, SmtpUrlForm{}},
         Asked{"starttls", &CarrierSettings::startsTls, FlagForm{}, true},
         Asked{"ca_file", &CarrierSettings::caFile, PathForm{}},
-        Asked{"user", &CarrierSettings::user, LineForm{}},
-        Asked{"password_file", &CarrierSettings::passwordFile, SecretForm{}},
+        Asked{USER, &CarrierSettings::user, LineForm{}},
+        Asked{PASSWORD_FILE, &CarrierSettings::passwordFile, SecretForm{}},
         Asked{"from", &CarrierSettings::from, AddressForm{}},
         Asked{"from_name", &CarrierSettings::fromName, LineForm{}},
         Asked{"to", &CarrierSettings::to, LineForm{}},
@@ -225,6 +244,7 @@ struct TypeRow {
     char const* name;
     void (*read)(json::Object const&, CarrierSettings&);
     bool (*hasKey)(std::string const&);
+    void (*describe)(Schema::Members&);
     /// Separated by blanks.
     char const* required;
 };
@@ -241,8 +261,14 @@ bool tableHasKey(std::string const& key) {
 }
 
 template<auto const& TABLE>
+void describeTables(Schema::Members& into) {
+    describeTable(CarrierSettings::Keys::COMMON, into);
+    describeTable(TABLE, into);
+}
+
+template<auto const& TABLE>
 constexpr TypeRow typeRow(CarrierType type, char const* name, char const* required) {
-    return {type, name, &readTable<TABLE>, &tableHasKey<TABLE>, required};
+    return {type, name, &readTable<TABLE>, &tableHasKey<TABLE>, &describeTables<TABLE>, required};
 }
 
 constexpr TypeRow TYPES[] = {
@@ -267,17 +293,21 @@ TypeRow const& typeRowNamed(std::string const& name) {
     return *found;
 }
 
+std::vector<std::string> requiredKeys(TypeRow const& row) {
+    std::istringstream words(row.required);
+    return {std::istream_iterator<std::string>(words), {}};
+}
+
 void requireKeys(json::Object const& object, TypeRow const& row) {
     for (auto const& [key, value] : object)
         if (!row.hasKey(key))
             throw Base::Error("a carrier of the type " + std::string(row.name) + " has no key " +
                               Base::inQuotes(Base::oneLine(key)));
-    std::istringstream required(row.required);
-    for (std::string key; required >> key;)
+    for (std::string const& key : requiredKeys(row))
         if (!object.get(key))
             throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
                               Base::inQuotes(key));
-    if (row.type == CarrierType::Smtp && !object.get("user") != !object.get("password_file"))
+    if (row.type == CarrierType::Smtp && !object.get(USER) != !object.get(PASSWORD_FILE))
         throw Base::Error("a carrier of the type smtp has either both of \"user\" and \"password_file\" or "
                           "none");
 }
@@ -285,6 +315,20 @@ void requireKeys(json::Object const& object, TypeRow const& row) {
 bool isChannel(std::string const& name) {
     return !name.empty() && name.size() <= MAX_CHANNEL_BYTES && name.front() >= 'a' && name.front() <= 'z' &&
            std::ranges::all_of(name, [](char c) { return (c >= 'a' && c <= 'z') || isDigit(c) || c == '_'; });
+}
+
+/// With the rules that hold between keys, as requireKeys() and the constructor test them.
+json::Object schemaOf(TypeRow const& row) {
+    Schema::Members members(Schema::Members::Others::Refused);
+    members.require(TYPE, Schema::constant(row.name));
+    row.describe(members);
+    if (row.type == CarrierType::Smtp)
+        members.needs(USER, PASSWORD_FILE).needs(PASSWORD_FILE, USER);
+    if (row.type == CarrierType::Printer)
+        members.add(AT_ONCE, Schema::integer(1, 1));
+    for (std::string const& key : requiredKeys(row))
+        members.require(key);
+    return members.schema();
 }
 
 CarrierSettings carrierIn(std::string const& channel, json::Value const& value) {
@@ -362,6 +406,21 @@ Carriers carriersIn(json::Object const& object) {
     if (carriers.size() > MAX_CHANNELS)
         throw Base::Error("\"carriers\" has more than " + std::to_string(MAX_CHANNELS) + " channels");
     return carriers;
+}
+
+std::vector<CarrierSchema> carrierSchemas() {
+    std::vector<CarrierSchema> schemas;
+    for (TypeRow const& row : TYPES)
+        schemas.push_back({row.name, schemaOf(row)});
+    return schemas;
+}
+
+json::Object carriersSchema(json::Object const& carrier) {
+    json::Object schema = Schema::mapOf(carrier);
+    schema.set("propertyNames",
+               Schema::textLike("^[a-z][a-z0-9_]{0," + std::to_string(MAX_CHANNEL_BYTES - 1) + "}$"));
+    schema.set("maxProperties", MAX_CHANNELS);
+    return schema;
 }
 
 json::Object CarriersQuery::serialize() { return question(KIND); }

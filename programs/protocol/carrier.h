@@ -125,6 +125,15 @@ bool sendsNotices(Carriers const& carriers);
 /// The value of the service's setting "carriers". Throws Error, which names the channel.
 Carriers carriersIn(json::Object const& object);
 
+/// What the settings of a type may be, as a JSON schema.
+struct CarrierSchema {
+    char const* type;
+    json::Object schema;
+};
+std::vector<CarrierSchema> carrierSchemas();
+/// Of the value of "carriers", with that of one of them.
+json::Object carriersSchema(json::Object const& carrier);
+
 /// Asks how the carriers are doing.
 struct CarriersQuery {
     static constexpr char const* KIND = "carriers";

@@ -18,6 +18,7 @@ struct CurrencyForm {
                std::all_of(text.begin(), text.end(), [](char c) { return c >= 'A' && c <= 'Z'; });
     }
     static std::string wanted() { return "three capital letters"; }
+    static json::Object schema() { return Base::Schema::textLike("^[A-Z]{3}$"); }
 };
 
 constexpr IntegerForm AMOUNT{-Tariff::MAX_AMOUNT, Tariff::MAX_AMOUNT};
@@ -75,6 +76,12 @@ Tariff::Tariff(json::Object const& object) {
     if (currency.empty())
         throw Base::Error("\"currency\" of the tariff has to be " + CurrencyForm::wanted());
     requireKnownKeys<Tariff>(object, " has no key ");
+}
+
+json::Object Tariff::schema() {
+    Base::Schema::Members members(Base::Schema::Members::Others::Refused);
+    describeTable(Keys::TABLE, members);
+    return members.require(CURRENCY).schema();
 }
 
 LetterBatch::LetterBatch(json::Object const& object) {

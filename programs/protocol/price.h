@@ -30,6 +30,8 @@ struct Tariff {
 
     /// Throws Error on an unknown key, a currency that is none, and amounts beyond MAX_AMOUNT either way.
     explicit Tariff(json::Object const& object);
+    /// What it may be, as a JSON schema.
+    static json::Object schema();
 
     struct Keys;
 };

@@ -4,6 +4,7 @@
 // read as it comes.
 
 #include "programs/base/error.h"
+#include "programs/base/json_schema.h"
 #include "vlservice/json/json_record.h"
 
 #include <limits>
@@ -42,7 +43,7 @@ private:
 };
 
 /// A row of a question: a key that may be missing, whose value has to be of one form. The record's IN_WORDS
-/// names it in messages. `Form` has static `fits(json::Value const&)` and `WANTED`.
+/// names it in messages. `Form` has `fits(json::Value const&)`, `wanted()` for people and `schema()`.
 template<typename Record, typename T, typename Form, typename Missing = json::Zero>
 class Asked {
 public:
@@ -59,6 +60,12 @@ public:
             into.set(name_, json::Form<T>::write(from.*member_));
     }
     bool same(Record const& a, Record const& b) const { return a.*member_ == b.*member_; }
+    json::Object schema() const {
+        if constexpr (std::same_as<Missing, json::Zero>)
+            return form_.schema();
+        else
+            return Base::Schema::with(form_.schema(), "default", json::Form<T>::write(missing()));
+    }
 
 private:
     constexpr T missing() const {
@@ -83,6 +90,7 @@ private:
 struct TextForm {
     static bool fits(json::Value const& node) { return node.isString(); }
     static std::string wanted() { return "a text"; }
+    static json::Object schema() { return Base::Schema::text(); }
 };
 
 struct TextsForm {
@@ -97,11 +105,13 @@ struct TextsForm {
         return true;
     }
     std::string wanted() const { return "an array of at most " + std::to_string(most) + " texts"; }
+    json::Object schema() const { return Base::Schema::listOfAtMost(Base::Schema::text(), most); }
 };
 
 struct FlagForm {
     static bool fits(json::Value const& node) { return json_is_boolean(node.node()); }
     static std::string wanted() { return "true or false"; }
+    static json::Object schema() { return Base::Schema::flag(); }
 };
 
 /// An integer within bounds, which belong to it.
@@ -117,12 +127,19 @@ struct IntegerForm {
                    ? "an integer above " + std::to_string(lowest - 1)
                    : "an integer from " + std::to_string(lowest) + " to " + std::to_string(highest);
     }
+    json::Object schema() const { return Base::Schema::integer(lowest, highest); }
 };
 
 /// Whether a row of the table has that key.
 template<typename... Rows>
 bool hasKey(std::tuple<Rows...> const& table, std::string const& key) {
     return std::apply([&](auto const&... rows) { return ((key == rows.name()) || ...); }, table);
+}
+
+/// Adds the keys of a table of questions.
+template<typename... Rows>
+void describeTable(std::tuple<Rows...> const& table, Base::Schema::Members& into) {
+    std::apply([&](auto const&... rows) { (into.add(rows.name(), rows.schema()), ...); }, table);
 }
 
 /// The record that an object holds.

@@ -28,6 +28,8 @@ struct ServiceSettings {
     static constexpr char const* RETENTION_DAYS = "retention_days";
     static constexpr char const* SUSPENDED = "suspended";
     static constexpr int RETENTION_DAYS_UNLESS_SET = 90;
+    static constexpr long long MAX_RETENTION_DAYS = 36'500;
+    static constexpr long long MAX_QUOTA_MEBIBYTES = 1LL << 30;
 
     /// Where finished containers are handed on; empty when nothing was set.
     std::string uploadFolder;
@@ -70,6 +72,9 @@ inline constexpr ServiceSetting SETTABLE[] = {
     {ServiceSettings::QUOTA, SettingForm::Document, "{...}"},
     {ServiceSettings::RETENTION_DAYS, SettingForm::Number, "N"},
 };
+
+/// What each of them may be, as a JSON schema; `carriers` and `tariff` are those of these two.
+json::Object serviceSettingsSchema(json::Object const& carriers, json::Object const& tariff);
 
 /// What the service tells of itself beside its settings: its outbox, and how many jobs are in each state that
 /// any is in, by the state's name.

@@ -1,6 +1,7 @@
 #include "programs/reader/reading_rules.h"
 
 #include "programs/base/error.h"
+#include "programs/base/json_schema.h"
 #include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/pattern.h"
@@ -25,6 +26,11 @@ constexpr char const* PAGE = "page";
 constexpr char const* ANCHOR = "anchor";
 constexpr char const* COLUMN = "column";
 constexpr std::array ZONE_KEYS{PAGE, ANCHOR, COLUMN};
+
+constexpr char const* DECIMAL_AUTO = "auto";
+constexpr char const* PAGE_LAST = "last";
+constexpr char const* PAGE_ANY = "any";
+constexpr std::size_t MOST_GROUPING = 8;
 
 using Base::inQuotes;
 
@@ -90,7 +96,7 @@ private:
                 fault({GROUPING}, "stands without \"decimal\" and changes nothing", "add \"decimal\"");
             return rules;
         }
-        if (decimal.textOrEmpty() == "auto") {
+        if (decimal.textOrEmpty() == DECIMAL_AUTO) {
             rules.kind = NumberRules::Decimal::Auto;
             return rules;
         }
@@ -107,12 +113,11 @@ private:
     }
 
     std::vector<std::string> grouping(json::Value const& value) {
-        constexpr std::size_t MOST = 8;
         if (!value)
             return {};
         std::vector<std::string> characters = charactersOf(value.textOrEmpty());
-        bool const isGood =
-            value.isString() && characters.size() <= MOST && std::ranges::all_of(characters, isSeparator);
+        bool const isGood = value.isString() && characters.size() <= MOST_GROUPING &&
+                            std::ranges::all_of(characters, isSeparator);
         if (isGood)
             return characters;
         fault({GROUPING}, "is no list of characters that stand between groups of digits",
@@ -169,9 +174,9 @@ private:
         std::string const word = page.textOrEmpty();
         if (page.isInt() && page.toInt() >= 1 && page.toInt() <= ReadingRules::MAX_PAGE)
             rules.page = static_cast<int>(page.toInt());
-        else if (word == "last")
+        else if (word == PAGE_LAST)
             rules.pages = ZoneRules::Pages::Last;
-        else if (word == "any")
+        else if (word == PAGE_ANY)
             rules.pages = ZoneRules::Pages::Any;
         else if (page)
             fault(below(path, PAGE), "is no page of a letter", "write 1, 2 and so on, \"last\" or \"any\"");
@@ -219,6 +224,28 @@ bool ReadingRules::isOnFirstPage(std::string const& zone) const {
 
 ReadingRules ReadingRules::from(json::Value const& reading, std::vector<RulesFault>& faults) {
     return Parser(faults).rules(reading);
+}
+
+json::Object ReadingRules::schema() {
+    namespace Schema = Base::Schema;
+    using Schema::Members;
+    json::Object const zone =
+        Members(Members::Others::Refused)
+            .add(PAGE, Schema::either({Schema::integer(1, MAX_PAGE), Schema::words({PAGE_LAST, PAGE_ANY})}))
+            .add(ANCHOR, Schema::with(Schema::text(), "minLength", 1))
+            .add(COLUMN, Schema::flag())
+            .schema();
+    // As isSeparator() has it.
+    std::string const separator = R"([^0-9A-Za-z+\-\u0000-\u001f])";
+    json::Object const decimal =
+        Schema::either({Schema::constant(DECIMAL_AUTO), Schema::textLike("^(?! )" + separator + '$')});
+    return Members(Members::Others::Refused)
+        .add(DECIMAL, decimal)
+        .add(GROUPING, Schema::textLike('^' + separator + "{0," + std::to_string(MOST_GROUPING) + "}$"))
+        .add(MONTHS, Schema::with(Schema::text(), "minLength", 1))
+        .add(ZONES, Schema::mapOf(zone))
+        .needs(GROUPING, DECIMAL)
+        .schema();
 }
 
 ReadingRules ReadingRules::of(Cfg::PackPreset const& preset) {

@@ -73,6 +73,8 @@ struct ReadingRules {
 
     /// Adds what is wrong to `faults`; such a value counts as not said.
     static ReadingRules from(json::Value const& reading, std::vector<RulesFault>& faults);
+    /// What `reading` may be, as a JSON schema.
+    static json::Object schema();
     /// Throws Base::Error with the first fault.
     static ReadingRules of(Cfg::PackPreset const& preset);
 };

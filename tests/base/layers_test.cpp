@@ -36,6 +36,7 @@ programs/carriers
 programs/vlmail/terminal programs/vlmail/service programs/vlmail/letters
 programs/vlmail/presets programs/vlmail/explain
 programs/vlmail/golden programs/vlmail/report programs/vlmail/mailings programs/vlmail/pack
+programs/vlmail/schema
 programs/vlmail/workbench
 programs/vlmail/commands
 programs/vlmail

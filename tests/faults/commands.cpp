@@ -87,6 +87,7 @@ std::vector<Command> const& commands() {
         {"presets_draft", {"presets", "draft", "letter.txt", "-o", "d.json"}, putDocuments},
         {"presets_lint", {"presets", "lint", "node.json"}, putSettings},
         {"presets_match", {"presets", "match", "letter.txt", "--settings", "node.json"}, putSettings},
+        {"schema", {"schema", "settings"}, putDocuments},
         {"presets_test", {"presets", "test", ".", "--update", "--jobs", "1"}, putSettings},
     };
     return all;

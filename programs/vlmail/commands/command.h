@@ -33,6 +33,7 @@ void addPackCommand(Base::Command const& app, Task& task);
 void addPlanCommand(Base::Command const& app, Task& task);
 void addPresetsCommand(Base::Command const& app, Task& task);
 void addPriceCommand(Base::Command const& app, Task& task);
+void addSchemaCommand(Base::Command const& app, Task& task);
 void addSendCommand(Base::Command const& app, Task& task);
 void addSettingsCommand(Base::Command const& app, Task& task);
 /// resume and discard.

@@ -32,6 +32,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addPlanCommand(command, task);
     addPresetsCommand(command, task);
     addPriceCommand(command, task);
+    addSchemaCommand(command, task);
     addSendCommand(command, task);
     addSettingsCommand(command, task);
     addStatusCommand(command, task);

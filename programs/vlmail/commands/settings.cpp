@@ -1,6 +1,7 @@
 // vlmail settings: the settings of the nodes, as the service keeps them.
 #include "programs/vlmail/commands/settings.h"
 #include "programs/base/error.h"
+#include "programs/base/json_schema.h"
 #include "programs/base/read_file.h"
 
 #include "vlservice/cfg/id.h"
@@ -48,7 +49,8 @@ json::Value valueIn(std::string const& key, std::string const& text, json::Value
 json::Object readDocument(std::string const& file) {
     std::string const text = file == "-" ? Base::readStandardInput() : Base::readFile(file);
     try {
-        return json::strToObject(text.data(), text.size());
+        // Editors alone look at the name of the schema.
+        return Base::Schema::without(json::strToObject(text.data(), text.size()), Base::Schema::KEY);
     } catch (json::Exc const& wrong) {
         throw Base::Error("cannot use \"" + file + "\": " + wrong.what() + "; correct the file there");
     }

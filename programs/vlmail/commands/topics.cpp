@@ -34,6 +34,7 @@ constexpr Manual::Topic TOPICS[] = {
     {"price", CLIENT, "Prices"},
     {"release", CLIENT, "Holding, releasing and cancelling"},
     {"resend", "carriers.md", "Letters that are uncertain"},
+    {"schema", "schemas.md", ""},
     {"send", CLIENT, "Sending mailing files"},
     {"settings impact", CLIENT, "What a change of settings would change"},
     {"settings show", CLIENT, "What counts at a node"},

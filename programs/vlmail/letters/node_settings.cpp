@@ -2,6 +2,7 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/json_schema.h"
 #include "programs/base/quoting.h"
 #include "programs/base/read_file.h"
 #include "programs/reader/document.h"
@@ -14,6 +15,7 @@
 
 #include <algorithm>
 #include <iterator>
+#include <string_view>
 
 namespace VlMail {
 namespace {
@@ -35,7 +37,7 @@ bool isPresetsPart(json::Object const& document) {
 /// A misspelt part would be passed over in silence, and with it all of its settings.
 void requirePartNames(json::Object const& document, fs::path const& file) {
     for (auto const& [name, part] : document) {
-        if (!isPartName(name))
+        if (!isPartName(name) && std::string_view(name) != Base::Schema::KEY)
             throw Base::Error(
                 "cannot use the settings in " + Base::inQuotes(file.string()) + ": \"" + name +
                 "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or "

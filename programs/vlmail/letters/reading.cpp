@@ -2,9 +2,11 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/json_rows.h"
 #include "programs/base/quoting.h"
 #include "programs/base/read_file.h"
 #include "programs/base/utf8.h"
+#include "programs/mailing/metadata.h"
 #include "programs/mailing/page_blob.h"
 #include "programs/policy/limits.h"
 #include "programs/production/colour.h"
@@ -50,13 +52,16 @@ json::Value nameOrNull(Cfg::ExtractedField const* field) {
     return field ? json::Value(field->name()) : json::Value(json_null());
 }
 
-void setUnlessEmpty(json::Object& object, char const* key, std::vector<std::string> const& texts) {
-    if (texts.empty())
-        return;
+/// The empty handle for a list without elements, which is not written.
+json::Value unlessEmpty(json::Array const& array) {
+    return array.empty() ? json::Value() : json::Value(array);
+}
+
+json::Array toJson(std::vector<std::string> const& texts) {
     json::Array array;
     for (std::string const& text : texts)
         array.append(text);
-    object.set(key, array);
+    return array;
 }
 
 std::vector<std::string> textsOf(json::Value const& array) {
@@ -98,25 +103,87 @@ std::vector<Production::Finding> findingsIn(json::Value const& array) {
     return findings;
 }
 
-json::Object toJson(LetterReading const& letter) {
+std::vector<int> numbersIn(json::Value const& array) {
+    std::vector<int> numbers;
+    for (json::Value const& number : array.toArray())
+        numbers.push_back(static_cast<int>(number.toInt()));
+    return numbers;
+}
+
+std::string messageOf(LetterReading const& letter) {
     std::string message;
-    bool const ready = letter.isProductionReady(message);
-    json::Object object{{PAGES_KEY, toJsonArray(letter.pages)},
-                        {FIELDS_KEY, letter.fields.serialize()},
-                        {READY_KEY, ready},
-                        {MESSAGE_KEY, message},
-                        {PRIMARY_ADDRESS_KEY, nameOrNull(letter.fields.primaryAddressField())}};
-    if (!letter.differingPages.empty())
-        object.set(DIFFERING_KEY, toJsonArray(letter.differingPages));
-    if (!letter.doubtfulJoins.empty())
-        object.set(NOT_SEPARATED_KEY, toJson(letter.doubtfulJoins));
-    if (!letter.findings.empty())
-        object.set(FINDINGS_KEY, toJson(letter.findings));
-    if (!letter.coverAddress.empty())
-        object.set(COVER_PAGE_KEY, letter.coverAddress);
-    setUnlessEmpty(object, MISSING_KEY, letter.missing);
-    setUnlessEmpty(object, WARNINGS_KEY, letter.warnings);
+    letter.isProductionReady(message);
+    return message;
+}
+
+bool isReady(LetterReading const& letter) {
+    std::string message;
+    return letter.isProductionReady(message);
+}
+
+namespace Schema = Base::Schema;
+using Base::Presence;
+using LetterRow = Base::JsonRow<LetterReading>;
+
+json::Object joinsSchema() {
+    using Schema::Members;
+    return Schema::listOf(Members(Members::Others::Refused)
+                              .require(PAGE_KEY, Schema::integer(1))
+                              .require(SAYS_KEY, Schema::text())
+                              .schema());
+}
+
+constexpr LetterRow LETTER_ROWS[] = {
+    {PAGES_KEY, Presence::Always, [] { return Schema::listOf(Schema::integer(1)); },
+     [](LetterReading const& letter) -> json::Value { return toJsonArray(letter.pages); },
+     [](json::Value const& node, LetterReading& letter) { letter.pages = numbersIn(node); }},
+    {FIELDS_KEY, Presence::Always,
+     [] { return Schema::listOf(Schema::definition(Mailing::EXTRACTED_FIELD)); },
+     [](LetterReading const& letter) -> json::Value { return letter.fields.serialize(); },
+     [](json::Value const& node, LetterReading& letter) {
+         letter.fields = Cfg::ExtractedFields(node.toArray());
+     }},
+    {READY_KEY, Presence::Always, &Schema::flag,
+     [](LetterReading const& letter) -> json::Value { return isReady(letter); }},
+    {MESSAGE_KEY, Presence::Always, &Schema::text,
+     [](LetterReading const& letter) -> json::Value { return messageOf(letter); }},
+    {PRIMARY_ADDRESS_KEY, Presence::Always, [] { return Schema::orNull(Schema::text()); },
+     [](LetterReading const& letter) { return nameOrNull(letter.fields.primaryAddressField()); }},
+    {DIFFERING_KEY, Presence::WhenThere, [] { return Schema::listOf(Schema::integer(1)); },
+     [](LetterReading const& letter) { return unlessEmpty(toJsonArray(letter.differingPages)); },
+     [](json::Value const& node, LetterReading& letter) {
+         if (node)
+             letter.differingPages = numbersIn(node);
+     }},
+    {NOT_SEPARATED_KEY, Presence::WhenThere, &joinsSchema,
+     [](LetterReading const& letter) { return unlessEmpty(toJson(letter.doubtfulJoins)); },
+     [](json::Value const& node, LetterReading& letter) { letter.doubtfulJoins = joinsIn(node); }},
+    {FINDINGS_KEY, Presence::WhenThere, [] { return Schema::listOf(Production::Finding::schema()); },
+     [](LetterReading const& letter) { return unlessEmpty(toJson(letter.findings)); },
+     [](json::Value const& node, LetterReading& letter) { letter.findings = findingsIn(node); }},
+    {COVER_PAGE_KEY, Presence::WhenThere, &Schema::text,
+     [](LetterReading const& letter) {
+         return letter.coverAddress.empty() ? json::Value() : json::Value(letter.coverAddress);
+     },
+     [](json::Value const& node, LetterReading& letter) { letter.coverAddress = node.textOrEmpty(); }},
+    {MISSING_KEY, Presence::WhenThere, [] { return Schema::listOf(Schema::text()); },
+     [](LetterReading const& letter) { return unlessEmpty(toJson(letter.missing)); },
+     [](json::Value const& node, LetterReading& letter) { letter.missing = textsOf(node); }},
+    {WARNINGS_KEY, Presence::WhenThere, [] { return Schema::listOf(Schema::text()); },
+     [](LetterReading const& letter) { return unlessEmpty(toJson(letter.warnings)); },
+     [](json::Value const& node, LetterReading& letter) { letter.warnings = textsOf(node); }},
+};
+
+json::Object toJson(LetterReading const& letter) {
+    json::Object object;
+    Base::writeRows<LetterReading>(LETTER_ROWS, letter, object);
     return object;
+}
+
+LetterReading letterFrom(json::Object const& object) {
+    LetterReading letter;
+    Base::readRows<LetterReading>(LETTER_ROWS, object, letter);
+    return letter;
 }
 
 json::Value lettersToJson(std::vector<LetterReading> const& letters) {
@@ -126,26 +193,54 @@ json::Value lettersToJson(std::vector<LetterReading> const& letters) {
     return array;
 }
 
-std::vector<int> numbersIn(json::Value const& array) {
-    std::vector<int> numbers;
-    for (json::Value const& number : array.toArray())
-        numbers.push_back(static_cast<int>(number.toInt()));
-    return numbers;
+using DocumentRow = Base::JsonRow<DocumentReading>;
+
+/// A document that could not be read has its error and none of the others.
+json::Value unlessFailed(DocumentReading const& reading, json::Value value) {
+    return reading.failed() ? json::Value() : std::move(value);
 }
 
-LetterReading letterFrom(json::Object const& object) {
-    LetterReading letter{numbersIn(object.get(PAGES_KEY)),
-                         Cfg::ExtractedFields(object.get(FIELDS_KEY).toArray()),
-                         textsOf(object.get(MISSING_KEY)),
-                         {},
-                         textsOf(object.get(WARNINGS_KEY))};
-    if (json::Value const differing = object.get(DIFFERING_KEY))
-        letter.differingPages = numbersIn(differing);
-    letter.doubtfulJoins = joinsIn(object.get(NOT_SEPARATED_KEY));
-    letter.findings = findingsIn(object.get(FINDINGS_KEY));
-    letter.coverAddress = object.get(COVER_PAGE_KEY).textOrEmpty();
-    return letter;
+json::Value lettersOrNull(DocumentReading const& reading) {
+    return reading.letters ? lettersToJson(*reading.letters) : json::Value(json_null());
 }
+
+void readLettersFrom(json::Value const& node, DocumentReading& reading) {
+    if (reading.failed() || !node.isArray())
+        return;
+    reading.letters.emplace();
+    for (json::Value const& letter : node.toArray())
+        reading.letters->push_back(letterFrom(letter.toObject()));
+}
+
+constexpr DocumentRow DOCUMENT_ROWS[] = {
+    {DOCUMENT_KEY, Presence::Always, &Schema::text,
+     [](DocumentReading const& reading) -> json::Value { return reading.document; },
+     [](json::Value const& node, DocumentReading& reading) { reading.document = node.toString(); }},
+    {ERROR_KEY, Presence::WhenThere, &Schema::text,
+     [](DocumentReading const& reading) {
+         return reading.failed() ? json::Value(reading.error) : json::Value();
+     },
+     [](json::Value const& node, DocumentReading& reading) { reading.error = node.textOrEmpty(); }},
+    {EXTRACT_PRESET_KEY, Presence::WhenThere, &Schema::text,
+     [](DocumentReading const& reading) { return unlessFailed(reading, reading.extractPreset); },
+     [](json::Value const& node, DocumentReading& reading) {
+         if (!reading.failed())
+             reading.extractPreset = node.toString();
+     }},
+    {PACK_PRESET_KEY, Presence::WhenThere, &Schema::text,
+     [](DocumentReading const& reading) { return unlessFailed(reading, reading.packPreset); },
+     [](json::Value const& node, DocumentReading& reading) {
+         if (!reading.failed())
+             reading.packPreset = node.toString();
+     }},
+    {LETTERS_KEY, Presence::WhenThere,
+     [] { return Schema::orNull(Schema::listOf(Schema::definition(LETTER_DEFINITION))); },
+     [](DocumentReading const& reading) { return unlessFailed(reading, lettersOrNull(reading)); },
+     &readLettersFrom},
+    {TRACE_KEY, Presence::WhenThere, &Schema::anything,
+     [](DocumentReading const& reading) { return reading.trace; },
+     [](json::Value const& node, DocumentReading& reading) { reading.trace = node; }},
+};
 
 /// The library takes a field with a bad pattern for one that was not found; here it is said instead.
 void requirePattern(std::string const& pattern, std::string const& whose, NodeSettings const& settings) {
@@ -472,36 +567,22 @@ std::string LetterReading::whyNot() const {
 }
 
 json::Object DocumentReading::toJson() const {
-    json::Object object{{DOCUMENT_KEY, document}};
-    if (failed()) {
-        object.set(ERROR_KEY, error);
-    } else {
-        object.set(EXTRACT_PRESET_KEY, extractPreset);
-        object.set(PACK_PRESET_KEY, packPreset);
-        object.set(LETTERS_KEY, letters ? lettersToJson(*letters) : json::Value(json_null()));
-    }
-    if (trace)
-        object.set(TRACE_KEY, trace);
+    json::Object object;
+    Base::writeRows<DocumentReading>(DOCUMENT_ROWS, *this, object);
     return object;
 }
 
 DocumentReading DocumentReading::fromJson(json::Object const& object) {
     DocumentReading reading;
-    reading.document = object.get(DOCUMENT_KEY).toString();
-    reading.error = object.get(ERROR_KEY).textOrEmpty();
-    reading.trace = object.get(TRACE_KEY);
-    if (reading.failed())
-        return reading;
-    reading.extractPreset = object.get(EXTRACT_PRESET_KEY).toString();
-    reading.packPreset = object.get(PACK_PRESET_KEY).toString();
-    json::Value const letters = object.get(LETTERS_KEY);
-    if (!letters.isArray())
-        return reading;
-    reading.letters.emplace();
-    for (json::Value const& letter : letters.toArray())
-        reading.letters->push_back(letterFrom(letter.toObject()));
+    Base::readRows<DocumentReading>(DOCUMENT_ROWS, object, reading);
     return reading;
 }
+
+void DocumentReading::describe(Base::Schema::Members& into) {
+    Base::describeRows<DocumentReading>(DOCUMENT_ROWS, into);
+}
+
+json::Object letterSchema() { return Base::schemaOf<LetterReading>(LETTER_ROWS); }
 
 ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSettings const& settings,
                         Along const& along, std::size_t place) {

@@ -15,6 +15,10 @@
 #include <string>
 #include <vector>
 
+namespace Base::Schema {
+class Members;
+} // namespace Base::Schema
+
 namespace Reader {
 class Document;
 struct Trace;
@@ -80,7 +84,14 @@ struct DocumentReading {
     json::Object toJson() const;
     /// Takes what toJson() gives. Throws json::Exc.
     static DocumentReading fromJson(json::Object const& object);
+    /// The keys of that object, as a JSON schema's; letters are the definition LETTER_DEFINITION.
+    static void describe(Base::Schema::Members& into);
 };
+
+/// As schemas name a letter's object.
+inline constexpr char const* LETTER_DEFINITION = "letter";
+/// Its fields are the definition Mailing::EXTRACTED_FIELD.
+json::Object letterSchema();
 
 /// A document as read.
 struct ReadResult {

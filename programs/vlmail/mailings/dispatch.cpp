@@ -1,6 +1,7 @@
 #include "programs/vlmail/mailings/dispatch.h"
 
 #include "programs/base/error.h"
+#include "programs/base/json_rows.h"
 #include "programs/base/quoting.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/preset_index.h"
@@ -26,6 +27,15 @@ Cfg::PackPreset const& requirePackPreset(std::string const& name, Cfg::Presets c
 long long sumOf(Mailing::Metadata const& mailing, long long Mailing::MailedLetter::*number) {
     return std::accumulate(mailing.letters.begin(), mailing.letters.end(), 0LL,
                            [&](long long sum, auto const& letter) { return sum + letter.*number; });
+}
+
+namespace Schema = Base::Schema;
+using Base::Presence;
+
+json::Value unlessEmpty(std::string const& text) { return text.empty() ? json::Value() : json::Value(text); }
+
+json::Value textsOf(std::vector<std::string> const& texts) {
+    return json::Form<std::vector<std::string>>::write(texts);
 }
 
 /// A document whose name a container cannot hold would fail all of its mailing in the end.
@@ -182,61 +192,115 @@ std::string Dispatch::priceInWords(OutgoingMailing const* mailing) const {
     return money(estimate.total) + ' ' + estimate.currency;
 }
 
-json::Object Dispatch::toJson() const {
-    json::Array mailings;
-    for (OutgoingMailing* const mailing : arrived_)
-        mailings.append(toJson(*mailing));
-    json::Array attachments;
-    for (std::string const& document : attachments_)
-        attachments.append(document);
-    json::Object object{{"mailings", mailings},
-                        {"left_out", toJson(leftOut_)},
-                        {"attachments", attachments},
-                        {"failures", toJson(failures_)}};
-    if (!notifications_.empty())
-        object.set("notifications", toJson(notifications_));
-    if (!notes_.empty())
-        object.set("notes", json::Form<std::vector<std::string>>::write(notes_));
-    return object;
-}
+struct Dispatch::Rows {
+    struct OfMailing {
+        Dispatch const& dispatch;
+        OutgoingMailing& mailing;
 
-json::Array Dispatch::toJson(std::vector<Notification> const& all) {
-    json::Array array;
-    for (Notification const& each : all)
-        array.append(json::Object{{"name", each.name},
-                                  {"pages", toJsonArray(each.pages)},
-                                  {"field", each.field},
-                                  {"address", each.address}});
-    return array;
-}
+        Mailing::Metadata const& metadata() const { return mailing.builder().metadata(); }
+    };
 
-json::Array Dispatch::toJson(std::vector<LeftBehind> const& all) {
+    static json::Object pages() { return Schema::listOf(Schema::integer(1)); }
+    static json::Object count() { return Schema::integer(0); }
+    static json::Object price() { return Schema::mapOf(Schema::anything()); }
+    template<typename Element>
+    static json::Array listOf(std::vector<Element> const& all, std::span<Base::JsonRow<Element> const> rows);
+
+    static constexpr Base::JsonRow<OfMailing> MAILING[] = {
+        {"pack_preset", Presence::Always, &Schema::text,
+         [](OfMailing const& of) -> json::Value { return of.metadata().packPreset.name(); }},
+        {"letters", Presence::Always, &count,
+         [](OfMailing const& of) -> json::Value { return of.mailing.builder().letterCount(); }},
+        {"sent_as", Presence::Always, &count,
+         [](OfMailing const& of) -> json::Value { return of.metadata().letters.size(); }},
+        {"pages", Presence::Always, &count,
+         [](OfMailing const& of) -> json::Value { return of.mailing.builder().pageCount(); }},
+        {"sheets", Presence::Always, &count,
+         [](OfMailing const& of) -> json::Value {
+             return sumOf(of.metadata(), &Mailing::MailedLetter::sheets);
+         }},
+        {"coloured_pages", Presence::Always, &count,
+         [](OfMailing const& of) -> json::Value {
+             return sumOf(of.metadata(), &Mailing::MailedLetter::colouredPages);
+         }},
+        {"id", Presence::WhenThere, &Schema::text,
+         [](OfMailing const& of) { return unlessEmpty(of.mailing.id()); }},
+        {"place", Presence::WhenThere, &Schema::text,
+         [](OfMailing const& of) {
+             return of.mailing.id().empty() ? json::Value() : json::Value(of.mailing.place());
+         }},
+        {"price", Presence::WhenThere, &price,
+         [](OfMailing const& of) {
+             auto const found = of.dispatch.prices_.find(&of.mailing);
+             return found == of.dispatch.prices_.end() ? json::Value() : json::Value(found->second);
+         }},
+    };
+    static constexpr Base::JsonRow<LeftBehind> LEFT_BEHIND[] = {
+        {"name", Presence::Always, &Schema::text,
+         [](LeftBehind const& left) -> json::Value { return left.name; }},
+        {"pages", Presence::WhenThere, &pages,
+         [](LeftBehind const& left) { return left.pages.empty() ? json::Value() : toJsonArray(left.pages); }},
+        {"reason", Presence::Always, &Schema::text,
+         [](LeftBehind const& left) -> json::Value { return left.reason; }},
+    };
+    static constexpr Base::JsonRow<Notification> NOTIFICATION[] = {
+        {"name", Presence::Always, &Schema::text,
+         [](Notification const& each) -> json::Value { return each.name; }},
+        {"pages", Presence::Always, &pages,
+         [](Notification const& each) -> json::Value { return toJsonArray(each.pages); }},
+        {"field", Presence::Always, &Schema::text,
+         [](Notification const& each) -> json::Value { return each.field; }},
+        {"address", Presence::Always, &Schema::text,
+         [](Notification const& each) -> json::Value { return each.address; }},
+    };
+    static constexpr Base::JsonRow<Dispatch> OUTCOME[] = {
+        {"mailings", Presence::Always, [] { return Schema::listOf(Base::schemaOf<OfMailing>(MAILING)); },
+         [](Dispatch const& all) -> json::Value { return all.mailingsToJson(); }},
+        {"left_out", Presence::Always, [] { return Schema::listOf(Base::schemaOf<LeftBehind>(LEFT_BEHIND)); },
+         [](Dispatch const& all) -> json::Value { return listOf<LeftBehind>(all.leftOut_, LEFT_BEHIND); }},
+        {"attachments", Presence::Always, [] { return Schema::listOf(Schema::text()); },
+         [](Dispatch const& all) { return textsOf(all.attachments_); }},
+        {"failures", Presence::Always, [] { return Schema::listOf(Base::schemaOf<LeftBehind>(LEFT_BEHIND)); },
+         [](Dispatch const& all) -> json::Value { return listOf<LeftBehind>(all.failures_, LEFT_BEHIND); }},
+        {"notifications", Presence::WhenThere,
+         [] { return Schema::listOf(Base::schemaOf<Notification>(NOTIFICATION)); },
+         [](Dispatch const& all) {
+             return all.notifications_.empty() ? json::Value()
+                                               : listOf<Notification>(all.notifications_, NOTIFICATION);
+         }},
+        {"notes", Presence::WhenThere, [] { return Schema::listOf(Schema::text()); },
+         [](Dispatch const& all) { return all.notes_.empty() ? json::Value() : textsOf(all.notes_); }},
+    };
+};
+
+template<typename Element>
+json::Array Dispatch::Rows::listOf(std::vector<Element> const& all,
+                                   std::span<Base::JsonRow<Element> const> rows) {
     json::Array array;
-    for (LeftBehind const& left : all) {
-        json::Object object{{"name", left.name}};
-        if (!left.pages.empty())
-            object.set("pages", toJsonArray(left.pages));
-        object.set("reason", left.reason);
+    for (Element const& each : all) {
+        json::Object object;
+        Base::writeRows(rows, each, object);
         array.append(object);
     }
     return array;
 }
 
-json::Object Dispatch::toJson(OutgoingMailing& mailing) const {
-    Mailing::Metadata const& metadata = mailing.builder().metadata();
-    json::Object object{{"pack_preset", metadata.packPreset.name()},
-                        {"letters", mailing.builder().letterCount()},
-                        {"sent_as", metadata.letters.size()},
-                        {"pages", mailing.builder().pageCount()},
-                        {"sheets", sumOf(metadata, &Mailing::MailedLetter::sheets)},
-                        {"coloured_pages", sumOf(metadata, &Mailing::MailedLetter::colouredPages)}};
-    if (std::string const id = mailing.id(); !id.empty()) {
-        object.set("id", id);
-        object.set("place", mailing.place());
+json::Array Dispatch::mailingsToJson() const {
+    json::Array array;
+    for (OutgoingMailing* const mailing : arrived_) {
+        json::Object object;
+        Base::writeRows<Rows::OfMailing>(Rows::MAILING, {*this, *mailing}, object);
+        array.append(object);
     }
-    if (auto const price = prices_.find(&mailing); price != prices_.end())
-        object.set("price", price->second);
+    return array;
+}
+
+json::Object Dispatch::toJson() const {
+    json::Object object;
+    Base::writeRows<Dispatch>(Rows::OUTCOME, *this, object);
     return object;
 }
+
+json::Object Dispatch::schema() { return Base::schemaOf<Dispatch>(Rows::OUTCOME); }
 
 } // namespace VlMail

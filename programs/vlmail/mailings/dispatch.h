@@ -35,6 +35,8 @@ public:
     /// {"mailings", "left_out", "attachments", "failures"}, and "notifications" and "notes" where there are
     /// any.
     json::Object toJson() const;
+    /// Of that object.
+    static json::Object schema();
     Outcome::End end() const { return outcome_.end(); }
 
 private:
@@ -60,9 +62,9 @@ private:
     OutgoingMailing& mailingFor(std::string const& packPreset);
     std::string priceInWords(OutgoingMailing const* mailing) const;
     void fail(std::string const& name, std::string const& reason);
-    static json::Array toJson(std::vector<LeftBehind> const& all);
-    static json::Array toJson(std::vector<Notification> const& all);
-    json::Object toJson(OutgoingMailing& mailing) const;
+    json::Array mailingsToJson() const;
+
+    struct Rows;
 
     Cfg::Presets const& presets_;
     MakingReady const& making_;

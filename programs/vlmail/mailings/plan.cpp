@@ -2,8 +2,10 @@
 
 #include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/json_schema.h"
 #include "programs/base/read_file.h"
 #include "programs/vlmail/letters/preset_index.h"
+#include "programs/vlmail/mailings/dispatch.h"
 #include "vlservice/json/json_text.h"
 
 #include <algorithm>
@@ -38,11 +40,11 @@ std::string textOf(json::Object const& object) {
     return std::move(text).str();
 }
 
-/// All members but the digest itself, which is the last.
+/// All members but the digest itself, which is the last, and the name of a schema, which says nothing.
 std::string digestOf(json::Object const& plan) {
     json::Object rest;
     for (auto const& [key, member] : plan) {
-        if (std::string_view(key) != DIGEST_KEY)
+        if (std::string_view(key) != DIGEST_KEY && std::string_view(key) != Base::Schema::KEY)
             rest.set(key, member);
     }
     return Base::sha256(textOf(rest));
@@ -158,6 +160,35 @@ std::string Plan::toText(json::Object const& outcome) const {
         plan.set(USED_DOCUMENTS_KEY, toJson(usedDocuments_));
     plan.set(DIGEST_KEY, digestOf(plan));
     return textOf(plan) + '\n';
+}
+
+json::Object Plan::schema() {
+    namespace Schema = Base::Schema;
+    using Schema::Members;
+    json::Object const settings = Members(Members::Others::Refused)
+                                      .add(FILE_KEY, Schema::text())
+                                      .add(SHA256_KEY, Schema::text())
+                                      .add(SERVICE_KEY, Schema::mapOf(Schema::anything()))
+                                      .add(PLACE_KEY, Schema::text())
+                                      .schema();
+    Members document(Members::Others::Refused);
+    document.require(FILE_KEY, Schema::text()).require(SHA256_KEY, Schema::text());
+    DocumentReading::describe(document);
+    json::Object const used = Members(Members::Others::Refused)
+                                  .require(ID_KEY, Schema::text())
+                                  .require(FILE_KEY, Schema::text())
+                                  .require(SHA256_KEY, Schema::text())
+                                  .add(SERVICE_KEY, Schema::flag())
+                                  .schema();
+    return Members(Members::Others::Refused)
+        .add(Schema::KEY, Schema::text())
+        .require(VERSION_KEY, Schema::constant(PLAN_VERSION))
+        .require(SETTINGS_KEY, Schema::orNull(settings))
+        .require(DOCUMENTS_KEY, Schema::listOf(document.schema()))
+        .require(OUTCOME_KEY, Dispatch::schema())
+        .add(USED_DOCUMENTS_KEY, Schema::listOf(used))
+        .require(DIGEST_KEY, Schema::text())
+        .schema();
 }
 
 void Plan::requireUnchanged() const {

@@ -33,6 +33,9 @@ public:
     /// The whole document as text; `outcome` comes from Dispatch::toJson().
     std::string toText(json::Object const& outcome) const;
 
+    /// Of that document, where the definitions of letterSchema() are.
+    static json::Object schema();
+
     /// Throws Error that names every document and settings file that is gone or has changed since.
     void requireUnchanged() const;
     NodeSettings settings() const;

@@ -1,8 +1,10 @@
 // Keys that nobody knows, and values that are not read as they stand.
+#include "programs/base/json_schema.h"
 #include "programs/production/production_rules.h"
 #include "programs/reader/reading_rules.h"
 #include "programs/vlmail/presets/acting.h"
 #include "programs/vlmail/presets/checks.h"
+#include "programs/vlmail/presets/known_numbers.h"
 #include "programs/vlmail/presets/nearest_name.h"
 #include "programs/vlmail/presets/words.h"
 #include "vlservice/json/json_text.h"
@@ -209,26 +211,9 @@ private:
     Findings& findings_;
 };
 
-/// Numbers that have a meaning here, where all others are kept without one.
-struct NumberRow {
-    char const* key;
-    long long least;
-    long long most;
-    char const* otherwise;
-};
-
-constexpr NumberRow PRESET_NUMBERS[] = {
-    {"type", 0, 1, "the preset is neither for letters nor for attachments"},
-};
-constexpr NumberRow FIELD_NUMBERS[] = {
-    {"value_type", 0, 3, "the value is taken for a text"},
-    {"ignore_on_group", -1, 6,
-     "letters with other values are grouped, or not, without a value being kept for them"},
-};
-
-void checkNumbersOf(json::Object const& object, Place const& place, std::span<NumberRow const> rows,
+void checkNumbersOf(json::Object const& object, Place const& place, std::span<KnownNumbers const> rows,
                     Findings& findings) {
-    for (NumberRow const& row : rows) {
+    for (KnownNumbers const& row : rows) {
         json::Value const value = object.get(row.key);
         if (value.isInt() && (value.toInt() < row.least || value.toInt() > row.most))
             findings.add(UnknownNumber, place / row.key,
@@ -253,7 +238,7 @@ void checkParts(PresetsDocument const& document, Findings& findings) {
         return;
     for (auto const& [key, part] : document.json()) {
         std::string const name = key;
-        if (!Cfg::findSettingsPart(name))
+        if (name != Base::Schema::KEY && !Cfg::findSettingsPart(name))
             findings.add(UnknownPart, Place() / name, {inQuotes(name), namesOfParts()});
     }
 }
@@ -266,7 +251,8 @@ void checkDuplicateKeys(PresetsDocument const& document, Findings& findings) {
 void checkKeys(PresetsDocument const& document, Findings& findings) {
     KeyChecker checker(findings);
     if (document.isPartAlone())
-        return checker.check(document.json(), Place(), Cfg::Presets::keys());
+        return checker.check(Base::Schema::without(document.json(), Base::Schema::KEY), Place(),
+                             Cfg::Presets::keys());
     for (Cfg::PartInfo const& part : Cfg::settingsParts())
         if (json::Value const node = document.json().get(part.name))
             checker.check(node, Place() / part.name, part.keys);
@@ -274,7 +260,7 @@ void checkKeys(PresetsDocument const& document, Findings& findings) {
 
 void checkNumbers(PresetsDocument const& document, Findings& findings) {
     for (ListedExtractPreset const& preset : document.extractPresets())
-        checkNumbersOf(preset.json, preset.place, PRESET_NUMBERS, findings);
+        checkNumbersOf(preset.json, preset.place, EXTRACT_PRESET_NUMBERS, findings);
     forEachField(document, [&](ListedExtractPreset const&, ListedZone const&, ListedField const& field) {
         checkNumbersOf(field.json, field.place, FIELD_NUMBERS, findings);
     });

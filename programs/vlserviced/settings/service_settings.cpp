@@ -53,21 +53,21 @@ bool isWithin(json::Value const& value, long long highest) {
 }
 
 void checkQuota(json::Value const& value) {
-    constexpr long long MAX_MEBIBYTES = 1LL << 30;
     if (!value.isObject())
         throw Base::Error("\"quota\" has to be an object of node ids and numbers of MiB");
     for (auto const& [node, mebibytes] : value.toObject()) {
         checkNodeId(node);
-        if (!isWithin(mebibytes, MAX_MEBIBYTES))
+        if (!isWithin(mebibytes, Values::MAX_QUOTA_MEBIBYTES))
             throw Base::Error("the \"quota\" of node \"" + std::string(node) +
-                              "\" has to be an integer from 0 to " + std::to_string(MAX_MEBIBYTES));
+                              "\" has to be an integer from 0 to " +
+                              std::to_string(Values::MAX_QUOTA_MEBIBYTES));
     }
 }
 
 void checkRetention(json::Value const& value) {
-    constexpr long long MAX_DAYS = 36'500;
-    if (!isWithin(value, MAX_DAYS))
-        throw Base::Error("\"retention_days\" has to be an integer from 0 to " + std::to_string(MAX_DAYS));
+    if (!isWithin(value, Values::MAX_RETENTION_DAYS))
+        throw Base::Error("\"retention_days\" has to be an integer from 0 to " +
+                          std::to_string(Values::MAX_RETENTION_DAYS));
 }
 
 void checkValue(std::string const& key, json::Value const& value) {
