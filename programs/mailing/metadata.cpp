@@ -218,6 +218,11 @@ json::Object objectIn(SharedMemBuffer blob) {
 
 } // namespace
 
+std::string channelOf(MailedLetter const& letter) {
+    Cfg::ExtractedField const* const address = letter.fields.primaryAddressField();
+    return address ? address->name() : std::string();
+}
+
 json::Object Metadata::toJson() const {
     json::Object object = packPreset.serialize(true);
     Base::writeRows<Metadata>(ROWS, *this, object);

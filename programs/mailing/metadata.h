@@ -41,6 +41,9 @@ struct MailedLetter {
     long long colouredPages = 0;
 };
 
+/// The channel that a letter goes by first: the name of its primary address, empty without one.
+std::string channelOf(MailedLetter const& letter);
+
 /// A letterhead or an attachment that is on or among the pages.
 struct UsedDocument {
     /// As the pack preset has it.

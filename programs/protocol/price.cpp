@@ -1,8 +1,10 @@
 #include "programs/protocol/price.h"
 
+#include "programs/base/plain_text.h"
 #include "programs/protocol/rows.h"
 
 #include <algorithm>
+#include <string_view>
 #include <utility>
 
 namespace Protocol {
@@ -21,7 +23,10 @@ struct CurrencyForm {
     static json::Object schema() { return Base::Schema::textLike("^[A-Z]{3}$"); }
 };
 
-constexpr IntegerForm AMOUNT{-Tariff::MAX_AMOUNT, Tariff::MAX_AMOUNT};
+constexpr char const* CHANNELS = "channels";
+constexpr char const* CHANNEL = "channel";
+
+constexpr IntegerForm AMOUNT{-Amounts::MAX_AMOUNT, Amounts::MAX_AMOUNT};
 
 /// A key that is not known is a mistake that would cost money.
 template<typename Record>
@@ -33,14 +38,20 @@ void requireKnownKeys(json::Object const& object, std::string const& haveNo) {
 
 } // namespace
 
+struct Amounts::Keys {
+    static constexpr std::tuple TABLE{
+        Asked{"letter", &Amounts::letter, AMOUNT},
+        Asked{"sheet", &Amounts::sheet, AMOUNT},
+        Asked{"colour_page", &Amounts::colourPage, AMOUNT},
+        Asked{"duplex_sheet", &Amounts::duplexSheet, AMOUNT},
+        Asked{"priority_letter", &Amounts::priorityLetter, AMOUNT},
+    };
+};
+
+/// The amounts and their channels are not among them.
 struct Tariff::Keys {
     static constexpr std::tuple TABLE{
         Asked{CURRENCY, &Tariff::currency, CurrencyForm{}},
-        Asked{"letter", &Tariff::letter, AMOUNT},
-        Asked{"sheet", &Tariff::sheet, AMOUNT},
-        Asked{"colour_page", &Tariff::colourPage, AMOUNT},
-        Asked{"duplex_sheet", &Tariff::duplexSheet, AMOUNT},
-        Asked{"priority_letter", &Tariff::priorityLetter, AMOUNT},
     };
 };
 
@@ -53,6 +64,7 @@ struct LetterBatch::Keys {
         Asked{"priority", &LetterBatch::priority, FlagForm{}},
         Asked{"paper_sheets", &LetterBatch::paperSheets, IntegerForm{0, MAX_PAGES}},
         Asked{"coloured_pages", &LetterBatch::colouredPages, IntegerForm{0, MAX_PAGES}},
+        Asked{CHANNEL, &LetterBatch::channel, TextForm{}},
     };
 };
 
@@ -71,17 +83,61 @@ struct Estimate::Keys {
     };
 };
 
+namespace {
+
+std::map<std::string, Amounts> channelsIn(json::Value const& each) {
+    if (!each.isObject() || each.toObject().size() > Tariff::MAX_CHANNELS)
+        throw Base::Error("\"channels\" of the tariff has to be an object of at most " +
+                          std::to_string(Tariff::MAX_CHANNELS) + " channels with the amounts of each");
+    std::map<std::string, Amounts> channels;
+    for (auto const& [channel, amounts] : each.toObject()) {
+        if (!amounts.isObject())
+            throw Base::Error("the amounts of " + Base::oneLine(channel) +
+                              " in the tariff have to be an object, such as {\"letter\": 10}");
+        channels.emplace(channel, amounts.toObject());
+    }
+    return channels;
+}
+
+} // namespace
+
+Amounts::Amounts(json::Object const& object) {
+    requireKnownKeys<Amounts>(object, " has no key ");
+    json::readKeys(Keys::TABLE, object, *this);
+}
+
 Tariff::Tariff(json::Object const& object) {
     json::readKeys(Keys::TABLE, object, *this);
     if (currency.empty())
         throw Base::Error("\"currency\" of the tariff has to be " + CurrencyForm::wanted());
-    requireKnownKeys<Tariff>(object, " has no key ");
+    json::Object general;
+    for (auto const& [key, value] : object)
+        if (std::string_view const name = key; name != CURRENCY && name != CHANNELS)
+            general.set(key, value);
+    amounts = Amounts(general);
+    if (json::Value const each = object.get(CHANNELS))
+        channels = channelsIn(each);
+}
+
+Amounts const& Tariff::of(std::string const& channel) const {
+    auto const found = channels.find(channel);
+    return found == channels.end() ? amounts : found->second;
+}
+
+json::Object Amounts::schema() {
+    Base::Schema::Members members(Base::Schema::Members::Others::Refused);
+    describeTable(Keys::TABLE, members);
+    return members.schema();
 }
 
 json::Object Tariff::schema() {
     Base::Schema::Members members(Base::Schema::Members::Others::Refused);
     describeTable(Keys::TABLE, members);
-    return members.require(CURRENCY).schema();
+    describeTable(Amounts::Keys::TABLE, members);
+    json::Object const channels = Base::Schema::mapOf(Amounts::schema());
+    return members.require(CURRENCY)
+        .add(CHANNELS, Base::Schema::with(channels, "maxProperties", MAX_CHANNELS))
+        .schema();
 }
 
 LetterBatch::LetterBatch(json::Object const& object) {

@@ -4,19 +4,18 @@
 #include "vlservice/json/json.h"
 
 #include <cstddef>
+#include <map>
 #include <string>
 #include <vector>
 
 namespace Protocol {
 
-/// Amounts are integers, in hundredths of the currency. All but the currency default to 0.
-struct Tariff {
+/// Integers, in hundredths of the currency. All default to 0.
+struct Amounts {
     static constexpr char const* IN_WORDS = "the tariff";
     /// Of each amount, either way.
     static constexpr long long MAX_AMOUNT = 100'000'000;
 
-    /// Three capital letters.
-    std::string currency;
     /// For each letter.
     long long letter = 0;
     /// For each sheet of paper.
@@ -28,10 +27,32 @@ struct Tariff {
     /// Added for each letter that is delivered with priority.
     long long priorityLetter = 0;
 
-    /// Throws Error on an unknown key, a currency that is none, and amounts beyond MAX_AMOUNT either way.
+    Amounts() = default;
+    /// Throws Error on an unknown key, and on amounts beyond MAX_AMOUNT either way.
+    explicit Amounts(json::Object const& object);
+    /// What they may be, as a JSON schema.
+    static json::Object schema();
+
+    struct Keys;
+};
+
+/// What letters cost.
+struct Tariff {
+    static constexpr char const* IN_WORDS = Amounts::IN_WORDS;
+    static constexpr std::size_t MAX_CHANNELS = 100;
+
+    /// Three capital letters.
+    std::string currency;
+    Amounts amounts;
+    /// Of letters of these channels, in place of the others.
+    std::map<std::string, Amounts> channels;
+
+    /// Throws Error on a currency that is none, and as Amounts does.
     explicit Tariff(json::Object const& object);
     /// What it may be, as a JSON schema.
     static json::Object schema();
+
+    Amounts const& of(std::string const& channel) const;
 
     struct Keys;
 };
@@ -52,6 +73,8 @@ struct LetterBatch {
     long long paperSheets = 0;
     /// Of one letter that is not in colour throughout.
     long long colouredPages = 0;
+    /// That they go by; empty where that is not known.
+    std::string channel;
 
     LetterBatch() = default;
     /// Throws Error on an unknown key, a wrong type, counts below 1 or beyond their bounds, more sheets or

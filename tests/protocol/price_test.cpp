@@ -37,6 +37,7 @@ TEST(PriceRequestReading, RefusesWhatItDoesNotKnow) {
         {R"({"letters":[{"pages":5,"coloured_pages":6}]})",
          R"("coloured_pages" of the letters have to be 5 at most)"},
         {R"({"letters":[{"colour":1}]})", R"("colour" of the letters has to be true or false)"},
+        {R"({"letters":[{"channel":1}]})", R"("channel" of the letters has to be a text)"},
     };
     for (auto const& [request, message] : cases)
         EXPECT_EQ(failureOf([&request = request] { PriceRequest{parse(request)}; }), message);
@@ -55,6 +56,15 @@ TEST(TariffReading, RefusesWhatIsNone) {
          R"("sheet" of the tariff has to be an integer from -100000000 to 100000000)"},
         {R"({"currency":"EUR","sheet":100000001})",
          R"("sheet" of the tariff has to be an integer from -100000000 to 100000000)"},
+        {R"({"currency":"EUR","channels":[]})",
+         R"("channels" of the tariff has to be an object of at most 100 channels with the amounts of each)"},
+        {R"({"currency":"EUR","channels":{"email":7}})",
+         R"(the amounts of email in the tariff have to be an object, such as {"letter": 10})"},
+        {R"({"currency":"EUR","channels":{"email":{"stamp":1}}})", R"(the tariff has no key "stamp")"},
+        {R"({"currency":"EUR","channels":{"email":{"currency":"EUR"}}})",
+         R"(the tariff has no key "currency")"},
+        {R"({"currency":"EUR","channels":{"email":{"letter":"1"}}})",
+         R"("letter" of the tariff has to be an integer from -100000000 to 100000000)"},
     };
     for (auto const& [object, message] : cases)
         EXPECT_EQ(failureOf([&object = object] { Tariff{parse(object)}; }), message);

@@ -543,10 +543,17 @@ TEST_F(ClientCommands, PricesFollowTheTariff) {
     output(
         {"settings", "service",
          "tariff=" + write("tariff.json", R"({"currency":"EUR","letter":85,"sheet":10,"duplex_sheet":-3})")});
-    EXPECT_EQ(output({"price", "20x3", "1", "--duplex"}), "letters  pages each  sheets each    EUR\n"
-                                                          "     20           3            2  20.40\n"
-                                                          "      1           1            1   0.95\n"
+    EXPECT_EQ(output({"price", "20x3", "1", "--duplex"}), "letters  channel  pages each  sheets each    EUR\n"
+                                                          "     20                    3            2  20.40\n"
+                                                          "      1                    1            1   0.95\n"
                                                           "in all 21.35 EUR\n");
+    output({"settings", "service",
+            R"(tariff={"currency":"EUR","letter":85,"sheet":10,"channels":{"email":{"letter":5}}})"});
+    EXPECT_EQ(output({"price", "20x3", "--channel", "email"}),
+              "letters  channel  pages each  sheets each   EUR\n"
+              "     20  email             3            3  1.00\n"
+              "in all 1.00 EUR\n");
+    EXPECT_THAT(output({"price", "3", "--channel", "postal"}), HasSubstr("in all 1.15 EUR\n"));
     EXPECT_EQ(output({"price", "3", "--json"}),
               "{\"currency\":\"EUR\",\"total\":115,\"letters\":[{\"sheets\":3,\"price\":115}]}\n");
     EXPECT_EQ(complaint({"price", "0x3"}),
@@ -782,6 +789,22 @@ TEST_F(MailingsOfANode, GoOutByThemselvesWhenTheyAreToGoAtOnce) {
     std::string const id = mail();
     awaitState(id, "submitted");
     EXPECT_TRUE(isHandedOver(id));
+}
+
+TEST_F(MailingsOfANode, ArePlannedWithTheChannelOfEachLetterAndItsPrice) {
+    output({"settings", "service",
+            R"(tariff={"currency":"EUR","letter":85,"channels":{"postal":{"letter":70,"sheet":12}}})"});
+    std::string const plan = (folder_ / "plan.json").string();
+    std::string const name = fs::path(letter_).filename().string();
+    EXPECT_THAT(output({"plan", letter_, "--node", "u=bob/a=acme", "-o", plan, "--price"}),
+                testing::ContainsRegex("\nletter +channel  pages  sheets  price\n" + name +
+                                       " +postal       1       1   0.82\n"));
+    EXPECT_THAT(output({"plan", letter_, "--node", "u=bob/a=acme", "-o", plan, "--price", "--json"}),
+                HasSubstr(R"("ways":[{"documents":[")" + name +
+                          R"("],"pages":1,"sheets":1,"channel":"postal","price":82}])"));
+    EXPECT_THAT(
+        output({"plan", letter_, "--node", "u=bob/a=acme", "-o", plan}),
+        testing::ContainsRegex("\nletter +channel  pages  sheets\n" + name + " +postal       1       1\n"));
 }
 
 TEST_F(MailingsOfANode, TellTheirSenderOnceTheyAreHandedOver) {

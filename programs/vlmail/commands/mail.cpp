@@ -129,6 +129,7 @@ int makePlan(Options const& options, Terminal const& terminal) {
                   options.price ? MakingReady::Colours::Counted : MakingReady::Colours::Ignored);
     Plan plan(settings, making.usedDocuments());
     Dispatch dispatch(presets, making, policiesOf(settings), mailingsNowhere(), terminal);
+    dispatch.tellLetters();
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
               {.pages = Along::Pages::Planned,

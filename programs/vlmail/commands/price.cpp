@@ -26,6 +26,7 @@ struct Options {
     bool colour = false;
     bool duplex = false;
     bool priority = false;
+    std::string channel;
     bool json = false;
 };
 
@@ -68,6 +69,8 @@ std::vector<Protocol::LetterBatch> lettersIn(Options const& options) {
             batch.paperSheets = 0;
         }
         batch.priority |= options.priority;
+        if (!options.channel.empty())
+            batch.channel = options.channel;
     }
     return batches;
 }
@@ -75,11 +78,14 @@ std::vector<Protocol::LetterBatch> lettersIn(Options const& options) {
 void print(std::ostream& out, std::vector<Protocol::LetterBatch> const& batches,
            Protocol::Estimate const& estimate) {
     constexpr auto RIGHT = TextTable::Align::Right;
-    TextTable table(
-        {{"letters", RIGHT}, {"pages each", RIGHT}, {"sheets each", RIGHT}, {estimate.currency, RIGHT}});
+    TextTable table({{"letters", RIGHT},
+                     {"channel"},
+                     {"pages each", RIGHT},
+                     {"sheets each", RIGHT},
+                     {estimate.currency, RIGHT}});
     for (std::size_t i = 0; i < std::min(batches.size(), estimate.letters.size()); ++i) {
         auto const& [sheets, price] = estimate.letters[i];
-        table.addRow({std::to_string(batches[i].count), std::to_string(batches[i].pages),
+        table.addRow({std::to_string(batches[i].count), batches[i].channel, std::to_string(batches[i].pages),
                       std::to_string(sheets), money(price)});
     }
     table.print(out);
@@ -109,6 +115,8 @@ void addPriceCommand(Base::Command const& app, Task& task) {
                   "Printed on both sides, also where the mailing does not say so");
     price.addFlag("--priority", options->priority,
                   "Delivered with priority, also where the mailing does not say so");
+    price.addOption("--channel", options->channel,
+                    "The channel that they go by, also where the mailing says another");
     price.addFlag("--json", options->json, "The service's answer as one JSON object");
     addServiceOptions(price, options->service);
     price.whenNamed(

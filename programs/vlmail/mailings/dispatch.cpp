@@ -5,7 +5,6 @@
 #include "programs/base/quoting.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/preset_index.h"
-#include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_form.h"
 #include "vlservice/pack/container_format.h"
@@ -36,6 +35,28 @@ json::Value unlessEmpty(std::string const& text) { return text.empty() ? json::V
 
 json::Value textsOf(std::vector<std::string> const& texts) {
     return json::Form<std::vector<std::string>>::write(texts);
+}
+
+std::string moneyOrNothing(std::optional<long long> const& hundredths) {
+    return hundredths ? money(*hundredths) : std::string();
+}
+
+/// As the mailing names them, without what is added to letters.
+std::vector<std::string> documentsOf(Mailing::MailedLetter const& letter) {
+    std::vector<std::string> names;
+    for (Mailing::DocumentPages const& document : letter.documents)
+        if (document.role == Mailing::DocumentPages::Role::Letter &&
+            std::ranges::find(names, document.document) == names.end())
+            names.push_back(document.document);
+    return names;
+}
+
+/// The first of them and how many more there are.
+std::string listed(std::vector<std::string> const& names) {
+    if (names.empty())
+        return {};
+    return names.size() == 1 ? names.front()
+                             : names.front() + " and " + std::to_string(names.size() - 1) + " more";
 }
 
 /// A document whose name a container cannot hold would fail all of its mailing in the end.
@@ -147,7 +168,7 @@ void Dispatch::finish() {
 
 void Dispatch::estimate(Channel::Client& service) {
     for (auto const& [packPreset, mailing] : mailings_)
-        prices_[mailing.get()] = estimatePrice(service, pricedLettersOf(mailing->builder().metadata()));
+        prices_.try_emplace(mailing.get(), service, mailing->builder().metadata());
 }
 
 void Dispatch::fail(std::string const& name, std::string const& reason) {
@@ -171,6 +192,8 @@ void Dispatch::print() const {
     }
     if (!table.empty())
         table.print(terminal_.out);
+    if (tellsLetters_)
+        printWays();
     for (std::string const& document : attachments_)
         terminal_.out << "not a letter: " << document << ", an attachment\n";
     for (Notification const& each : notifications_)
@@ -188,7 +211,7 @@ std::string Dispatch::priceInWords(OutgoingMailing const* mailing) const {
     auto const found = prices_.find(mailing);
     if (found == prices_.end())
         return {};
-    Protocol::Estimate const estimate(found->second);
+    Protocol::Estimate const estimate(found->second.answer());
     return money(estimate.total) + ' ' + estimate.currency;
 }
 
@@ -200,12 +223,33 @@ struct Dispatch::Rows {
         Mailing::Metadata const& metadata() const { return mailing.builder().metadata(); }
     };
 
+    struct OfLetter {
+        OfMailing const& of;
+        Mailing::MailedLetter const& letter;
+    };
+    static json::Value waysOf(OfMailing const& of);
+
     static json::Object pages() { return Schema::listOf(Schema::integer(1)); }
     static json::Object count() { return Schema::integer(0); }
     static json::Object price() { return Schema::mapOf(Schema::anything()); }
     template<typename Element>
     static json::Array listOf(std::vector<Element> const& all, std::span<Base::JsonRow<Element> const> rows);
 
+    static constexpr Base::JsonRow<OfLetter> WAY[] = {
+        {"documents", Presence::Always, [] { return Schema::listOf(Schema::text()); },
+         [](OfLetter const& of) { return textsOf(documentsOf(of.letter)); }},
+        {"pages", Presence::Always, &count,
+         [](OfLetter const& of) -> json::Value { return printedPages(of.letter); }},
+        {"sheets", Presence::Always, &count,
+         [](OfLetter const& of) -> json::Value { return of.letter.sheets; }},
+        {"channel", Presence::Always, &Schema::text,
+         [](OfLetter const& of) -> json::Value { return Mailing::channelOf(of.letter); }},
+        {"price", Presence::WhenThere, &count,
+         [](OfLetter const& of) {
+             auto const price = of.of.dispatch.priceOf(of.of.mailing, of.letter);
+             return price ? json::Value(*price) : json::Value();
+         }},
+    };
     static constexpr Base::JsonRow<OfMailing> MAILING[] = {
         {"pack_preset", Presence::Always, &Schema::text,
          [](OfMailing const& of) -> json::Value { return of.metadata().packPreset.name(); }},
@@ -232,8 +276,10 @@ struct Dispatch::Rows {
         {"price", Presence::WhenThere, &price,
          [](OfMailing const& of) {
              auto const found = of.dispatch.prices_.find(&of.mailing);
-             return found == of.dispatch.prices_.end() ? json::Value() : json::Value(found->second);
+             return found == of.dispatch.prices_.end() ? json::Value() : json::Value(found->second.answer());
          }},
+        {"ways", Presence::WhenThere, [] { return Schema::listOf(Base::schemaOf<OfLetter>(WAY)); },
+         [](OfMailing const& of) { return of.dispatch.tellsLetters_ ? waysOf(of) : json::Value(); }},
     };
     static constexpr Base::JsonRow<LeftBehind> LEFT_BEHIND[] = {
         {"name", Presence::Always, &Schema::text,
@@ -285,6 +331,16 @@ json::Array Dispatch::Rows::listOf(std::vector<Element> const& all,
     return array;
 }
 
+json::Value Dispatch::Rows::waysOf(OfMailing const& of) {
+    json::Array ways;
+    for (Mailing::MailedLetter const& letter : of.metadata().letters) {
+        json::Object way;
+        Base::writeRows<OfLetter>(WAY, {of, letter}, way);
+        ways.append(way);
+    }
+    return ways;
+}
+
 json::Array Dispatch::mailingsToJson() const {
     json::Array array;
     for (OutgoingMailing* const mailing : arrived_) {
@@ -302,5 +358,32 @@ json::Object Dispatch::toJson() const {
 }
 
 json::Object Dispatch::schema() { return Base::schemaOf<Dispatch>(Rows::OUTCOME); }
+
+std::optional<long long> Dispatch::priceOf(OutgoingMailing const& mailing,
+                                           Mailing::MailedLetter const& letter) const {
+    auto const price = prices_.find(&mailing);
+    return price == prices_.end() ? std::nullopt : price->second.of(letter);
+}
+
+void Dispatch::printWays() const {
+    constexpr auto RIGHT = TextTable::Align::Right;
+    std::vector<TextTable::Column> columns{{"letter"}, {"channel"}, {"pages", RIGHT}, {"sheets", RIGHT}};
+    if (!prices_.empty())
+        columns.push_back({"price", RIGHT});
+    TextTable table(columns);
+    for (OutgoingMailing* const mailing : arrived_)
+        for (Mailing::MailedLetter const& letter : mailing->builder().metadata().letters) {
+            std::vector<std::string> row{listed(documentsOf(letter)), Mailing::channelOf(letter),
+                                         std::to_string(printedPages(letter)), std::to_string(letter.sheets)};
+            if (!prices_.empty())
+                row.push_back(moneyOrNothing(priceOf(*mailing, letter)));
+            table.addRow(row);
+        }
+    if (table.empty())
+        return;
+    terminal_.out << '\n';
+    table.print(terminal_.out);
+    terminal_.out << '\n';
+}
 
 } // namespace VlMail

@@ -7,10 +7,12 @@
 #include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/mailings/mailing_policies.h"
 #include "programs/vlmail/mailings/outgoing_mailing.h"
+#include "programs/vlmail/mailings/price.h"
 #include "programs/vlmail/terminal/terminal.h"
 
 #include <map>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -25,6 +27,8 @@ public:
     /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
     /// of.
     void take(ReadResult result);
+    /// Has each letter told with its channel.
+    void tellLetters() { tellsLetters_ = true; }
     /// Asks what the mailings would cost. Throws std::exception with a line for people.
     void estimate(Channel::Client& service);
     /// Lets all mailings arrive; one that fails does not stop the others.
@@ -63,6 +67,9 @@ private:
     std::string priceInWords(OutgoingMailing const* mailing) const;
     void fail(std::string const& name, std::string const& reason);
     json::Array mailingsToJson() const;
+    void printWays() const;
+    std::optional<long long> priceOf(OutgoingMailing const& mailing,
+                                     Mailing::MailedLetter const& letter) const;
 
     struct Rows;
 
@@ -75,7 +82,8 @@ private:
     std::map<std::string, std::unique_ptr<OutgoingMailing>> mailings_;
     std::vector<OutgoingMailing*> arrived_;
     /// By mailing; empty when nobody has asked.
-    std::map<OutgoingMailing const*, json::Object> prices_;
+    std::map<OutgoingMailing const*, MailingPrice> prices_;
+    bool tellsLetters_ = false;
     std::vector<LeftBehind> leftOut_;
     std::vector<LeftBehind> failures_;
     std::vector<std::string> attachments_;

@@ -1,26 +1,21 @@
 #include "programs/vlmail/mailings/price.h"
 
 #include "programs/mailing/print_wishes.h"
+#include "programs/protocol/failure.h"
 #include "programs/vlmail/service/service_client.h"
 #include "vlservice/ipc/price_est.h"
 
 #include <cstdio>
-#include <map>
-#include <tuple>
+#include <utility>
 
 namespace VlMail {
 namespace {
 
-/// Printed pages, sheets and coloured pages of a letter.
-using Counts = std::tuple<long long, long long, long long>;
-
-long long printedPages(Mailing::MailedLetter const& letter) {
-    long long pages = 0;
-    for (Mailing::DocumentPages const& document : letter.documents)
-        if (document.role != Mailing::DocumentPages::Role::Blank)
-            pages += static_cast<long long>(document.pages.size());
-    return pages;
+Alike alikeOf(Mailing::MailedLetter const& letter) {
+    return {Mailing::channelOf(letter), printedPages(letter), letter.sheets, letter.colouredPages};
 }
+
+constexpr char const* KNOWS_NO_CHANNELS = "the letters have no key \"channel\"";
 
 /// An older service knows letters in colour throughout and no others.
 void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::Metadata const& mailing) {
@@ -30,29 +25,72 @@ void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::M
         batch.colouredPages = colouredPages;
 }
 
+/// How many letters of each kind there are, in the order of their batches.
+std::map<Alike, long long> lettersByKind(Mailing::Metadata const& mailing) {
+    std::map<Alike, long long> letters;
+    for (Mailing::MailedLetter const& letter : mailing.letters)
+        ++letters[alikeOf(letter)];
+    return letters;
+}
+
+Protocol::LetterBatch batchOf(Alike const& alike, long long count, Mailing::Metadata const& mailing) {
+    auto const& [channel, pages, sheets, colouredPages] = alike;
+    Protocol::LetterBatch batch;
+    batch.count = count;
+    batch.channel = channel;
+    batch.duplex = mailing.packPreset.duplex();
+    batch.priority = mailing.packPreset.priorityDelivery();
+    batch.pages = pages;
+    if (sheets != batch.sheets())
+        batch.paperSheets = sheets;
+    setColour(batch, colouredPages, mailing);
+    return batch;
+}
+
 } // namespace
 
+long long printedPages(Mailing::MailedLetter const& letter) {
+    long long pages = 0;
+    for (Mailing::DocumentPages const& document : letter.documents)
+        if (document.role != Mailing::DocumentPages::Role::Blank)
+            pages += static_cast<long long>(document.pages.size());
+    return pages;
+}
+
 std::vector<Protocol::LetterBatch> pricedLettersOf(Mailing::Metadata const& mailing) {
-    std::map<Counts, long long> lettersByCounts;
-    for (Mailing::MailedLetter const& letter : mailing.letters)
-        ++lettersByCounts[{printedPages(letter), letter.sheets, letter.colouredPages}];
     std::vector<Protocol::LetterBatch> batches;
-    for (auto const& [counts, letters] : lettersByCounts) {
-        Protocol::LetterBatch& batch = batches.emplace_back();
-        batch.count = letters;
-        batch.duplex = mailing.packPreset.duplex();
-        batch.priority = mailing.packPreset.priorityDelivery();
-        batch.pages = std::get<0>(counts);
-        if (std::get<1>(counts) != batch.sheets())
-            batch.paperSheets = std::get<1>(counts);
-        setColour(batch, std::get<2>(counts), mailing);
-    }
+    for (auto const& [alike, count] : lettersByKind(mailing))
+        batches.push_back(batchOf(alike, count, mailing));
     return batches;
 }
 
 json::Object estimatePrice(Channel::Client& service, std::vector<Protocol::LetterBatch> const& letters) {
-    json::Object const request = Protocol::PriceRequest(letters).serialize();
-    return requireAnswer(service.call<Ipc::PriceEst>(request)->resp());
+    return estimatePrice(
+        [&](json::Object const& request) { return service.call<Ipc::PriceEst>(request)->resp(); }, letters);
+}
+
+json::Object estimatePrice(AskPrice const& ask, std::vector<Protocol::LetterBatch> letters) {
+    json::Object answer = ask(Protocol::PriceRequest(letters).serialize());
+    if (Protocol::failureIn(answer) == KNOWS_NO_CHANNELS) {
+        for (Protocol::LetterBatch& batch : letters)
+            batch.channel.clear();
+        answer = ask(Protocol::PriceRequest(letters).serialize());
+    }
+    return requireAnswer(answer);
+}
+
+MailingPrice::MailingPrice(Channel::Client& service, Mailing::Metadata const& mailing)
+    : answer_(estimatePrice(service, pricedLettersOf(mailing))) {
+    Protocol::Estimate const estimate(answer_);
+    std::size_t batch = 0;
+    for (auto const& [alike, count] : lettersByKind(mailing))
+        if (batch < estimate.letters.size())
+            each_[alike] = estimate.letters[batch++].price / count;
+}
+
+std::optional<long long> MailingPrice::of(Mailing::MailedLetter const& letter) const {
+    auto const found = each_.find(alikeOf(letter));
+    return found == each_.end() ? std::nullopt : std::optional(found->second);
 }
 
 std::string money(long long hundredths) {

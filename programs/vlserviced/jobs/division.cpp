@@ -11,11 +11,6 @@
 namespace VlServiced {
 namespace {
 
-std::string channelOf(Mailing::MailedLetter const& letter) {
-    Cfg::ExtractedField const* const address = letter.fields.primaryAddressField();
-    return address ? address->name() : std::string();
-}
-
 /// What stays in the container.
 struct Rest {
     std::vector<std::size_t> letters;
@@ -56,7 +51,7 @@ Division divide(std::filesystem::path const& container, std::filesystem::path co
     for (std::size_t i = 0; i < mailing.letters().size(); ++i) {
         Mailing::MailedLetter const letter = mailing.letters().letter(i);
         auto const number = static_cast<long long>(i) + 1;
-        std::string const channel = channelOf(letter);
+        std::string const channel = Mailing::channelOf(letter);
         bool const byCarrier = hasCarrier(channel);
         division.letters.push_back({number, channel, byCarrier});
         if (!byCarrier)

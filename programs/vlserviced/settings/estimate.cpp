@@ -8,9 +8,10 @@ namespace VlServiced {
 
 // The bounds of both keep the price of a batch within 64 bits: less than 2.6e12 a letter.
 long long priceOf(Protocol::LetterBatch const& batch, Protocol::Tariff const& tariff) {
+    Protocol::Amounts const& amounts = tariff.of(batch.channel);
     long long const oneLetter =
-        tariff.letter + batch.sheets() * tariff.sheet + batch.pagesInColour() * tariff.colourPage +
-        batch.duplexSheets() * tariff.duplexSheet + (batch.priority ? tariff.priorityLetter : 0);
+        amounts.letter + batch.sheets() * amounts.sheet + batch.pagesInColour() * amounts.colourPage +
+        batch.duplexSheets() * amounts.duplexSheet + (batch.priority ? amounts.priorityLetter : 0);
     return batch.count * std::max(oneLetter, 0LL);
 }
 

@@ -29,6 +29,24 @@ TEST(PricedLetters, AreThoseOfEqualLengthTogether) {
     EXPECT_EQ(batches[1].count, 1);
 }
 
+TEST(PricedLetters, AreThoseOfTheSameChannelTogether) {
+    Mailing::Metadata mailing = mailingWith("");
+    auto const address = [&](std::size_t letter, char const* channel) {
+        mailing.letters[letter].fields.emplace(1, Cfg::ExtractedField(channel, "x", 1, true,
+                                                                      IgnoreOnGroup::MustMatch,
+                                                                      Cfg::ExtractedField::ValueType::Plain));
+    };
+    address(0, "email");
+    address(1, "postal");
+    std::vector<Protocol::LetterBatch> const batches = pricedLettersOf(mailing);
+    ASSERT_EQ(batches.size(), 3u);
+    EXPECT_EQ(batches[0].channel, "");
+    EXPECT_EQ(batches[1].channel, "email");
+    EXPECT_EQ(batches[2].channel, "postal");
+    address(2, "postal");
+    EXPECT_EQ(pricedLettersOf(mailing).back().count, 2);
+}
+
 TEST(PricedLetters, FollowThePackPreset) {
     Protocol::LetterBatch const plain = pricedLettersOf(mailingWith("")).front();
     EXPECT_FALSE(plain.colour || plain.duplex || plain.priority);
@@ -56,6 +74,26 @@ TEST(PricedLetters, HaveTheSheetsAndColouredPagesOfMailingsThatAreMadeReady) {
     EXPECT_EQ(batches[1].duplexSheets(), 1);
     EXPECT_FALSE(batches[1].colour);
     EXPECT_EQ(batches[1].pagesInColour(), 2);
+}
+
+TEST(PriceEstimates, AreAskedForWithoutChannelsWhereAnOlderServiceKnowsNone) {
+    int asked = 0;
+    auto const older = [&](json::Object const& request) -> json::Object {
+        ++asked;
+        if (request.get("letters").toArray().at(0).toObject().get("channel"))
+            return {{"err", "the letters have no key \"channel\""}};
+        return {{"currency", "EUR"}, {"total", 5}};
+    };
+    Protocol::LetterBatch batch;
+    batch.channel = "email";
+    EXPECT_EQ(Protocol::Estimate(VlMail::estimatePrice(older, {batch})).total, 5);
+    EXPECT_EQ(asked, 2);
+    EXPECT_THROW(VlMail::estimatePrice(
+                     [](json::Object const&) {
+                         return json::Object{{"err", "the service has no tariff yet"}};
+                     },
+                     {batch}),
+                 std::exception);
 }
 
 TEST(Money, IsWrittenWithItsSignInFront) {

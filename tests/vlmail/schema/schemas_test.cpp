@@ -233,7 +233,7 @@ constexpr char const* WHOLE_CARRIERS = R"({
               "user": "u", "password_file": "/etc/secret", "starttls": true, "to": "{email}"}})";
 
 constexpr char const* WHOLE_TARIFF = R"({"currency": "EUR", "letter": 85, "sheet": 10, "colour_page": 7,
-                                         "duplex_sheet": -3, "priority_letter": 150})";
+                                         "duplex_sheet": -3, "priority_letter": 150, "channels": {"email": {"letter": 5}}})";
 
 TEST(Schemas, AreListedAndSchemasOfTheirDraft) {
     Ran const list = runVlMail({"schema"});

@@ -45,6 +45,23 @@ TEST(PriceEstimate, CountsLettersSheetsColourDuplexAndPriority) {
     }
 }
 
+TEST(PriceEstimate, TakesTheAmountsOfAChannelWhereItHasSome) {
+    Tariff const byChannel(
+        parse(R"({"currency":"EUR","letter":85,"sheet":10,"channels":{"email":{"letter":5},)"
+              R"("fax":{"letter":1,"sheet":4,"priority_letter":2}}})"));
+    struct {
+        char const* letters;
+        long long price;
+    } const cases[] = {
+        {R"({"pages":3})", 85 + 30},
+        {R"({"pages":3,"channel":"postal"})", 85 + 30},
+        {R"({"pages":3,"channel":"email","priority":true,"colour":true})", 5},
+        {R"({"pages":3,"channel":"fax","priority":true,"count":2})", 2 * (1 + 12 + 2)},
+    };
+    for (auto const& [letters, price] : cases)
+        EXPECT_EQ(priceOf(LetterBatch(parse(letters)), byChannel), price) << letters;
+}
+
 TEST(PriceEstimate, AnswersWithTheTotalAndThePartsOfIt) {
     EXPECT_EQ(
         print(
