@@ -14,7 +14,7 @@ public:
     static constexpr char const* NODE_ID_FLD_NAME = "id";
 
     CfgNodeId() = default;
-    CfgNodeId(Id const& id);
+    CfgNodeId(Id const& id); ///< by the text of an id
     /// Shares the array. Throws json::Exc when the node is none.
     CfgNodeId(json::Value const& node);
 

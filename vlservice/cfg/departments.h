@@ -23,7 +23,7 @@ public:
     template<std::derived_from<json::Value> Node>
     Department(Node const& node) : Department(read(node)) {}
 
-    std::string const& name() const { return name_; }
+    std::string const& name() const { return name_; } ///< as people pick it
     std::string const& description() const { return description_; }
     /// "name = description", or the name alone when there is no description.
     std::string valForUI() const;
@@ -31,7 +31,7 @@ public:
     static json::RecordKeys const& keys();
     friend bool operator==(Department const&, Department const&) = default;
 
-    void changeName(std::string name) { name_ = std::move(name); }
+    void changeName(std::string name) { name_ = std::move(name); } ///< the description stays
 
 private:
     struct Keys;

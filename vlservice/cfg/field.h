@@ -20,20 +20,20 @@ namespace Cfg {
 /// One setting. `inh` tells that the value is not the node's own but inherited or a default.
 template<typename T>
 struct Value {
-    T value{};
-    bool inh = true;
+    T value{};       ///< what counts
+    bool inh = true; ///< not the node's own
 };
 
 /// One element of a list setting. `inh` tells that it came from a parent node.
 template<typename T>
 struct ArrValue {
-    T value{};
-    bool inh = false;
+    T value{};        ///< what counts
+    bool inh = false; ///< from a parent node
 };
 
 // On the wire an inherited value is wrapped: {"inh": true, "v": <plain value>}.
-inline constexpr char const* INH_KEY = "inh";
-inline constexpr char const* VALUE_KEY = "v";
+inline constexpr char const* INH_KEY = "inh"; ///< true in a wrapper
+inline constexpr char const* VALUE_KEY = "v"; ///< what it wraps
 
 /// An object whose "inh" is anything but true is no wrapper.
 inline bool isWrapper(json::Value const& node) {
@@ -59,7 +59,7 @@ concept Ordered = requires(T const& element) {
 /// every part.
 template<typename T>
 struct RootDefault {
-    T const& value;
+    T const& value; ///< has to outlive the parts
 };
 template<typename T>
 RootDefault(T) -> RootDefault<T>;
@@ -72,10 +72,10 @@ struct Field;
 
 template<typename T>
 struct Field<T, Value<T>> {
-    using Type = T;
+    using Type = T; ///< of the value, or of each element
 
-    char const* key;
-    Value<T> setting;
+    char const* key;  ///< static text
+    Value<T> setting; ///< with where it comes from
     /// Null when the initial value counts at the root too.
     T const* rootDefault = nullptr;
 
@@ -130,11 +130,11 @@ struct Field<T, Value<T>> {
 /// leaves alone.
 template<typename T>
 struct Field<T, ArrValue<T>> {
-    using Type = T;
-    using Elements = std::list<ArrValue<T>>;
+    using Type = T;                          ///< of the value, or of each element
+    using Elements = std::list<ArrValue<T>>; ///< each in a node of its own
 
-    char const* key;
-    Elements elements;
+    char const* key;   ///< static text
+    Elements elements; ///< own ones first
 
     Field(char const* fieldKey) : key(fieldKey) {}
 

@@ -16,12 +16,12 @@ struct VLSERVICE_EXPORT Point {
     std::int32_t y = 0;
 
     constexpr Point() = default;
-    constexpr Point(int px, int py) : x(px), y(py) {}
+    constexpr Point(int px, int py) : x(px), y(py) {} ///< in 1/100 mm
     /// Coordinates that are missing or no integers are 0, and so are all of the empty handle. Throws
     /// json::Exc when the node is no object.
     Point(json::Value const& node);
 
-    constexpr bool isZeroes() const { return *this == Point(); }
+    constexpr bool isZeroes() const { return *this == Point(); } ///< as when it is not set
     json::Object serialize() const;
     static json::RecordKeys const& keys();
 
@@ -36,11 +36,11 @@ struct VLSERVICE_EXPORT Rect {
     std::int32_t bottom = 0;
 
     constexpr Rect() = default;
-    constexpr Rect(int l, int t, int r, int b) : left(l), top(t), right(r), bottom(b) {}
+    constexpr Rect(int l, int t, int r, int b) : left(l), top(t), right(r), bottom(b) {} ///< 1/100 mm
     /// Reads as Point does.
     Rect(json::Value const& node);
 
-    constexpr bool isZeroes() const { return *this == Rect(); }
+    constexpr bool isZeroes() const { return *this == Rect(); } ///< as when it is not set
     json::Object serialize() const;
     static json::RecordKeys const& keys();
 

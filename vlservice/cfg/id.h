@@ -18,11 +18,11 @@ namespace Cfg {
 /// tests the JSON value itself.
 class VLSERVICE_EXPORT Id {
 public:
-    static std::string const ACCOUNT_PREFIX;
-    static std::string const GROUP_PREFIX;
-    static std::string const USER_PREFIX;
-    static constexpr char TYPE_SYMBOL = '=';
-    static constexpr char CFG_ID_DELIM = '/';
+    static std::string const ACCOUNT_PREFIX;  ///< in front of an account's name, "a="
+    static std::string const GROUP_PREFIX;    ///< in front of a group's name, "ou="
+    static std::string const USER_PREFIX;     ///< in front of a user's name, "u="
+    static constexpr char TYPE_SYMBOL = '=';  ///< between a type and a name
+    static constexpr char CFG_ID_DELIM = '/'; ///< between two tokens
 
     /// The invalid id, "/".
     Id();
@@ -45,14 +45,14 @@ public:
     Id(Node const& node) : text_(node.textOrEmpty()) {}
     Id(std::nullptr_t) = delete;
 
-    std::string const& str() const { return text_; }
+    std::string const& str() const { return text_; } ///< the path
     json::Value serialize() const { return text_; }
     friend bool operator==(Id const&, Id const&) = default;
 
-    bool valid() const { return !invalid(); }
-    bool invalid() const { return text_.starts_with(CFG_ID_DELIM); }
+    bool valid() const { return !invalid(); }                        ///< also for the root
+    bool invalid() const { return text_.starts_with(CFG_ID_DELIM); } ///< a leading slash
 
-    bool hasUser() const { return text_.starts_with(USER_PREFIX); }
+    bool hasUser() const { return text_.starts_with(USER_PREFIX); } ///< a user's node
     static bool hasUserStr(std::string text) { return text.starts_with(USER_PREFIX); }
     /// True for everything that is no user, the root and the invalid id included.
     bool isParentId() const { return isParentIdStr(text_); }

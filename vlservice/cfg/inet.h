@@ -29,7 +29,7 @@ class VLSERVICE_EXPORT Inet : public Part<InetFieldIdxs, InetFields> {
 public:
     static std::string const PART_NAME;
     static json::RecordKeys const& keys();
-    static constexpr int DEF_STATUS_UPDATE_HOURS = 2;
+    static constexpr int DEF_STATUS_UPDATE_HOURS = 2; ///< when nobody has set them
 
     Inet(json::Value const& j, bool global, bool sorted);
 

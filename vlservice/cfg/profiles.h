@@ -19,7 +19,7 @@ public:
     /// A description that is no text is empty. Throws json::Exc when there is no name.
     Profile(json::Object const& object);
 
-    std::string const& name() const { return name_; }
+    std::string const& name() const { return name_; } ///< as people pick it
     std::string const& descr() const { return descr_; }
     json::Object serialize() const;
     static json::RecordKeys const& keys();

@@ -15,17 +15,17 @@ namespace Cfg {
 /// written.
 class VLSERVICE_EXPORT ShowCtrls {
 public:
-    static constexpr std::size_t COUNT = 78;
-    using Bits = std::bitset<COUNT>;
+    static constexpr std::size_t COUNT = 78; ///< how many controls there are
+    using Bits = std::bitset<COUNT>;         ///< a bit for each control
 
     ShowCtrls() = default;
-    explicit ShowCtrls(Bits const& bits) : bits_(bits) {}
+    explicit ShowCtrls(Bits const& bits) : bits_(bits) {} ///< of these bits
     /// Integers that are missing leave their bits clear, and what is behind the last bit is dropped. The
     /// empty handle has no bit set. Throws json::Exc when the node is no array or an element no integer.
     ShowCtrls(json::Value const& node);
 
-    Bits const& bits() const { return bits_; }
-    Bits& bits() { return bits_; }
+    Bits const& bits() const { return bits_; } ///< one that is set is shown
+    Bits& bits() { return bits_; }             ///< for changing
     json::Array serialize() const;
     friend bool operator==(ShowCtrls const&, ShowCtrls const&) = default;
 

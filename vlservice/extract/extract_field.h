@@ -68,11 +68,11 @@ public:
     // What the client's letters hold when nobody has defined anything else: built at first use, valid to the
     // end of the process.
 
-    static ExtractField const& DefReference();
-    static ExtractField const& DefEmail();
-    static ExtractField const& DefFax();
-    static ExtractField const& DefSms();
-    static ExtractField const& DefPostal();
+    static ExtractField const& DefReference(); ///< "reference", behind "Ref:"
+    static ExtractField const& DefEmail();     ///< "email", behind "Email:"
+    static ExtractField const& DefFax();       ///< "fax", behind "Fax:"
+    static ExtractField const& DefSms();       ///< "sms", behind "Sms:"
+    static ExtractField const& DefPostal();    ///< "postal", the whole text
 
     /// Cuts this field's value out of `text`, not yet validated. Without a measure the whole match leaves the
     /// text. Without a match, or without a group "VAL" in it, gives a copy of the default value, or nothing.
@@ -87,7 +87,7 @@ public:
     /// Throws boost::regex_error for a bad pattern, std::out_of_range for text that is not UTF-8.
     void validate(ExtractedField& value) const;
 
-    bool isMyField(ExtractedField const& value) const { return value.name() == name_; }
+    bool isMyField(ExtractedField const& value) const { return value.name() == name_; } ///< by its name
     /// Whether one zone list may hold both: names differ, and they are not recipient addresses of the same
     /// priority.
     bool fieldsCanCoexist(ExtractField const& other) const;
@@ -103,7 +103,7 @@ public:
     /// Of the validators only their patterns are compared.
     bool operator==(ExtractField const& other) const;
 
-    std::string const& name() const { return name_; }
+    std::string const& name() const { return name_; } ///< under which a value is told
     LetterSeparatorMark mark() const { return mark_; }
     /// Above 0 a recipient address, the highest preferred; below 0 a notification address; 0 an ordinary
     /// field.
@@ -124,7 +124,7 @@ public:
 
     // Setters do not fix(): what belongs together is the caller's to keep.
 
-    void setName(std::string name) { name_ = std::move(name); }
+    void setName(std::string name) { name_ = std::move(name); } ///< of its values
     void setMark(LetterSeparatorMark mark) { mark_ = mark; }
     void setPriority(int priority) { priority_ = priority; }
     void setSendToServer(bool send) { sendToServer_ = send; }

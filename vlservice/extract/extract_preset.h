@@ -34,8 +34,8 @@ class VLSERVICE_EXPORT ExtractPreset {
 public:
     /// The order of presets that are not read from JSON. The library only reads it; a program may write it.
     static int MAX_ORDER;
-    static constexpr double MAX_SPACES_BETWEEN_FRAGS_DEFAULT = 3.0;
-    static constexpr double LINE_DISTANCE_MAX_DEFAULT = 1.8;
+    static constexpr double MAX_SPACES_BETWEEN_FRAGS_DEFAULT = 3.0; ///< widths of a blank
+    static constexpr double LINE_DISTANCE_MAX_DEFAULT = 1.8;        ///< font sizes
 
     ExtractPreset() = default;
     ExtractPreset(std::string const& regex, std::string const& packPreset,
@@ -74,7 +74,7 @@ public:
     /// The expression over the whole of a document's name.
     std::string const& strRegex() const { return match_; }
     ExtractPresetType type() const { return type_; }
-    bool isForLetters() const { return type_ == ExtractPresetType::Letters; }
+    bool isForLetters() const { return type_ == ExtractPresetType::Letters; } ///< what it reads are letters
     /// The odd spelling is the interface's.
     bool isForAttachemnt() const { return type_ == ExtractPresetType::Attachments; }
     bool useFieldsOnly() const { return useFieldsOnly_; }
@@ -93,7 +93,7 @@ public:
     double maxLineDistance() const { return maxLineDistance_; }
     /// Seconds since the epoch; 0 is never.
     long long lastUsedAt() const { return lastUsed_; }
-    bool lastUsedIsSet() const { return lastUsed_ != 0; }
+    bool lastUsedIsSet() const { return lastUsed_ != 0; } ///< it was used
     bool eraseMe() const { return eraseMe_; }
     /// Makes an empty list where there is none; the const form does too.
     ExtractZones& zones() { return zones_.list(); }
@@ -122,7 +122,7 @@ public:
     void setEraseMe(bool erase) const { eraseMe_ = erase; }
     /// Last used now.
     void resetLastUsed() const;
-    void deleteLastUsed() { lastUsed_ = 0; }
+    void deleteLastUsed() { lastUsed_ = 0; } ///< as if it was never used
     /// Makes of this a preset for exactly that document name, with a pack preset named after it and used just
     /// now, so that it can age out. As with setRegex, what has matched goes on matching by its former
     /// expression.
@@ -174,8 +174,8 @@ private:
     int signatureAdjust_ = 0;
     std::uint32_t retryOnRepeated_ = 0;
     bool skipFirstPage_ = false;
-    double maxSpacesBetweenFrags_ = MAX_SPACES_BETWEEN_FRAGS_DEFAULT;
-    double maxLineDistance_ = LINE_DISTANCE_MAX_DEFAULT;
+    double maxSpacesBetweenFrags_ = MAX_SPACES_BETWEEN_FRAGS_DEFAULT; ///< widths of a blank
+    double maxLineDistance_ = LINE_DISTANCE_MAX_DEFAULT;              ///< font sizes
     OwnedZones zones_;
     mutable long long lastUsed_ = 0;
     mutable bool eraseMe_ = false;

@@ -23,26 +23,26 @@ namespace Cfg {
 /// A zone is found by its location or, without one, by the point where its content is expected.
 class VLSERVICE_EXPORT ExtractZone {
 public:
-    static std::string const DEF_ZONE_NAME;
+    static std::string const DEF_ZONE_NAME; ///< of the zone that has an address
     /// Where an address is expected on a letter.
     static constexpr Point DEF_MOST_PROBABLE_POINT{4500, 6200};
 
     ExtractZone() = default;
-    ExtractZone(std::string const& name, std::vector<ExtractField> fields);
+    ExtractZone(std::string const& name, std::vector<ExtractField> fields); ///< found by its point
     ExtractZone(std::string const& name, std::vector<ExtractField> fields, Rect const& location,
                 CombineBlocksMethod combineBlocks, RestrictZoneLocation restrictToLocation);
     /// Throws json::Exc when "name" is not a string, "fields" is not an array of objects, or a field cannot
     /// be read.
     ExtractZone(json::Object const& object);
 
-    std::string const& name() const { return name_; }
-    std::vector<ExtractField>& fields() { return fields_; }
-    std::vector<ExtractField> const& fields() const { return fields_; }
+    std::string const& name() const { return name_; }                   ///< what people call it
+    std::vector<ExtractField>& fields() { return fields_; }             ///< for changing
+    std::vector<ExtractField> const& fields() const { return fields_; } ///< in the order of search
     /// Whether a field is a recipient address.
     bool hasAddress() const;
 
     Rect const& location() const { return location_; }
-    bool hasLocation() const { return !location_.isZeroes(); }
+    bool hasLocation() const { return !location_.isZeroes(); } ///< found by its rectangle
     /// The default point when none is set.
     Point const& mostProbablePoint() const {
         return mostProbablePoint_.isZeroes() ? DEF_MOST_PROBABLE_POINT : mostProbablePoint_;
@@ -58,7 +58,7 @@ public:
     json::Object serialize() const;
     static json::RecordKeys const& keys();
 
-    void setName(std::string name) { name_ = std::move(name); }
+    void setName(std::string name) { name_ = std::move(name); } ///< what people call it
     /// Leaves the most probable point alone.
     void setLocation(Rect const& location) { location_ = location; }
     /// Removes the location. The asymmetry is deliberate: a zone that is found by its point has no rectangle,

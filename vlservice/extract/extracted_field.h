@@ -13,6 +13,7 @@ namespace Cfg {
 /// A value object. Copies share the JSON value through an unsynchronised count: they stay on one thread.
 class VLSERVICE_EXPORT ExtractedField {
 public:
+    /// What validation has made of the value.
     enum class ValueType : signed char {
         NotValidated = -1, ///< a string with the raw text
         Plain = 0,         ///< a string, integer or real, or an array after grouping
@@ -34,15 +35,15 @@ public:
     std::string const& name() const { return name_; }
     ValueType valueType() const { return valueType_; }
     json::Value const& rawValue() const { return value_; }
-    bool isValidated() const { return valueType_ != ValueType::NotValidated; }
-    bool isValid() const { return isValidated() && valueType_ != ValueType::Invalid; }
+    bool isValidated() const { return valueType_ != ValueType::NotValidated; }         ///< typed or refused
+    bool isValid() const { return isValidated() && valueType_ != ValueType::Invalid; } ///< typed
 
     /// Above 0 a recipient address, the highest preferred; below 0 a notification address; 0 an ordinary
     /// field.
     int priority() const { return priority_; }
-    bool isAddress() const { return priority_ != 0; }
-    bool isRcptAddress() const { return priority_ > 0; }
-    bool isNotifyAddress() const { return priority_ < 0; }
+    bool isAddress() const { return priority_ != 0; }      ///< of a recipient, or for notes
+    bool isRcptAddress() const { return priority_ > 0; }   ///< of the recipient
+    bool isNotifyAddress() const { return priority_ < 0; } ///< to be notified only
     bool sendToServer() const { return sendToServer_; }
     IgnoreOnGroup ignoreType() const { return ignoreOnGroup_; }
     /// Whether the field is left out when letters are compared for grouping.
@@ -50,7 +51,7 @@ public:
 
     /// The value as the type asked for; each throws json::Exc when the JSON type is another.
     std::string strVal() const;
-    long long intVal() const;
+    long long intVal() const; ///< refuses a real
     /// Seconds since the epoch.
     long long timeVal() const { return intVal(); }
     /// Refuses an integer.
@@ -69,7 +70,7 @@ public:
     /// Throws json::Exc when this field is a date and either value is no integer.
     int cmpSort(ExtractedField const& other) const;
 
-    void setValidValue(json::Value const& value, bool isTime);
+    void setValidValue(json::Value const& value, bool isTime); ///< seconds when `isTime`
     /// The value stays as it is.
     void setInvalid() { valueType_ = ValueType::Invalid; }
 

@@ -13,7 +13,7 @@ namespace Cfg {
 /// engine's own limit of states holds. The innermost one counts, which ends no later than the outer ones.
 class VLSERVICE_EXPORT MatchTime {
 public:
-    explicit MatchTime(std::chrono::steady_clock::duration limit);
+    explicit MatchTime(std::chrono::steady_clock::duration limit); ///< from now on
     MatchTime(MatchTime const&) = delete;
     MatchTime& operator=(MatchTime const&) = delete;
     ~MatchTime();

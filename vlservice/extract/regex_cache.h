@@ -31,8 +31,8 @@ public:
 
     /// From here on by the other's compiled pattern, or by none if it has none.
     void shareWith(RegexCache const& other) noexcept { compiled_ = other.compiled_; }
-    void clear() noexcept { compiled_.reset(); }
-    bool isFilled() const noexcept { return compiled_ != nullptr; }
+    void clear() noexcept { compiled_.reset(); }                    ///< compiled anew when it is next wanted
+    bool isFilled() const noexcept { return compiled_ != nullptr; } ///< it has been compiled
 
 private:
     mutable std::shared_ptr<Regex const> compiled_;

@@ -8,14 +8,16 @@
 
 namespace Ipc {
 
+/// With a user: his node and all above it. Without one: all nodes that are no user's.
 class VLSERVICE_EXPORT CfgIdsForUser : public CmdVLSvcBase {
 public:
     static constexpr unsigned char CMD_ID = 18;
 
+    /// A node of the answer.
     struct IdData {
-        std::string id;
-        std::string description;
-        bool disabled = false;
+        std::string id;          ///< of the node
+        std::string description; ///< what people call it
+        bool disabled = false;   ///< nobody may send for it
     };
 
     CfgIdsForUser(std::shared_ptr<CmdProcessorI> processor);
@@ -26,7 +28,7 @@ public:
     /// The user whose own node is to be in the answer; empty for none.
     std::string const& inclUser() const { return user_; }
     std::vector<IdData> const& resp() const { return ids_; }
-    void addToResp(IdData idData);
+    void addToResp(IdData idData); ///< behind those that it has
 
     using CmdVLSvcBase::accept;
 

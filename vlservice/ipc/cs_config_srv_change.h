@@ -21,7 +21,7 @@ public:
     char const* name() const override;
     Timeouts::TimeoutId reqTimeoutId() const override;
 
-    SuspendType suspend() const { return suspend_; }
+    SuspendType suspend() const { return suspend_; } ///< what is held back
 
     using CmdVLSvcBase::accept;
 

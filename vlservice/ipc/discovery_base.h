@@ -28,18 +28,18 @@ namespace Ipc {
 /// callback, ends what is pending: no callback comes afterwards.
 class VLSERVICE_EXPORT DiscoveryBase {
 public:
-    using RcvFunc = std::function<void(json::Object)>;
+    using RcvFunc = std::function<void(json::Object)>; ///< takes what was received
 
     /// Keys of a service's answer.
     inline static std::string const SVC_HOST_FLD_NAME = "host";
-    inline static std::string const SVC_PORT_FLD_NAME = "port";
-    static constexpr std::uint16_t DISCOVERY_PORT = 45677;
+    inline static std::string const SVC_PORT_FLD_NAME = "port"; ///< as a number
+    static constexpr std::uint16_t DISCOVERY_PORT = 45677;      ///< UDP, of the group
 
     /// Opens the socket and joins the group. A failure is logged, for IPv6 only under g_LogVerbose since a
     /// host may well have none, and leaves the object as far as it got.
     DiscoveryBase(boost::asio::io_context& io, bool ipv4);
 
-    bool isOpen();
+    bool isOpen(); ///< it can send and receive
 
     /// Sends to the group. An object that cannot be printed throws json::Exc.
     void send(json::Object const& object);
@@ -55,8 +55,8 @@ public:
     /// Nothing is sent or received any more. A second call does nothing.
     void close();
 
-    static json::Object makeReq();
-    static bool isReq(json::Object const& object);
+    static json::Object makeReq();                 ///< what a client asks with
+    static bool isReq(json::Object const& object); ///< what makeReq() gives
 
 private:
     friend struct DiscoveryTestAccess;

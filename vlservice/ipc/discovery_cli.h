@@ -14,6 +14,7 @@ namespace Ipc {
 /// command. The answer is whatever somebody on the network sent; nothing in it has been tested.
 class VLSERVICE_EXPORT DiscoveryCli {
 public:
+    /// How long an answer is waited for.
     inline static boost::posix_time::time_duration const DISCOVERY_TIMEOUT = boost::posix_time::seconds(2);
 
     /// The search begins when the io_context, which is run by a single thread, runs next.

@@ -8,9 +8,10 @@
 
 namespace Ipc {
 
+/// Host and name; a database that is a file has its folder for the host.
 struct VLSERVICE_EXPORT PackDb {
-    std::string host;
-    std::string name;
+    std::string host; ///< or the folder of a file
+    std::string name; ///< of the database, or of the file
 
     json::Object serialize() const;
     /// Throws json::Exc at the first key that holds no string; one before it has been taken over.

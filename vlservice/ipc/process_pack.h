@@ -18,9 +18,9 @@ public:
 
     char const* name() const override;
 
-    std::string const& dbHostPort() const { return dbHostPort_; }
-    std::string const& dbName() const { return dbName_; }
-    std::string const& packId() const { return packId_; }
+    std::string const& dbHostPort() const { return dbHostPort_; } ///< or the folder of a file
+    std::string const& dbName() const { return dbName_; }         ///< of the database, or of the file
+    std::string const& packId() const { return packId_; }         ///< of the mailing
 
     using CmdVLSvcBase::accept;
 

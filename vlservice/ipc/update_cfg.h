@@ -21,7 +21,7 @@ public:
     Timeouts::TimeoutId reqTimeoutId() const override;
 
     Cfg::Id const& cfgId() const { return cfgId_; }
-    bool resetCfg() const { return resetCfg_; }
+    bool resetCfg() const { return resetCfg_; } ///< what it holds goes first
     bool respOK() const { return error_.empty(); }
     /// Empty on success.
     std::string const& respErrMsg() const { return error_; }

@@ -19,8 +19,8 @@ public:
     char const* name() const override;
     Timeouts::TimeoutId reqTimeoutId() const override;
 
-    std::string const& dbHost() const { return db_.host; }
-    std::string const& dbName() const { return db_.name; }
+    std::string const& dbHost() const { return db_.host; } ///< or the folder of a file
+    std::string const& dbName() const { return db_.name; } ///< of the database, or of the file
 
     using CmdVLSvcBase::accept;
 

@@ -24,7 +24,7 @@ class Object;
 /// their own.
 class VLSERVICE_EXPORT Exc : public std::runtime_error {
 public:
-    Exc(std::string const& message) : std::runtime_error(message) {}
+    Exc(std::string const& message) : std::runtime_error(message) {} ///< the text as it stands
 };
 
 namespace detail {
@@ -80,12 +80,12 @@ public:
     /// True when the handle holds a node, whatever its type.
     explicit operator bool() const noexcept { return node_ != nullptr; }
 
-    bool isObject() const noexcept { return json_is_object(node_); }
-    bool isArray() const noexcept { return json_is_array(node_); }
-    bool isString() const noexcept { return json_is_string(node_); }
-    bool isInt() const noexcept { return json_is_integer(node_); }
-    bool isReal() const noexcept { return json_is_real(node_); }
-    bool isTrue() const noexcept { return json_is_true(node_); }
+    bool isObject() const noexcept { return json_is_object(node_); } ///< false for the empty handle
+    bool isArray() const noexcept { return json_is_array(node_); }   ///< false for the empty handle
+    bool isString() const noexcept { return json_is_string(node_); } ///< false for the empty handle
+    bool isInt() const noexcept { return json_is_integer(node_); }   ///< false for the empty handle
+    bool isReal() const noexcept { return json_is_real(node_); }     ///< an integer is none
+    bool isTrue() const noexcept { return json_is_true(node_); }     ///< the value true, and no other
 
     /// The type as messages name it; "empty" for the empty handle.
     char const* typeName() const noexcept {
@@ -167,7 +167,7 @@ protected:
         }
     }
 
-    json_t* node_ = nullptr;
+    json_t* node_ = nullptr; ///< a reference of its own, or null
 
 private:
     void require(bool isWanted, char const* wanted) const {

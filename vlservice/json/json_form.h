@@ -62,7 +62,7 @@ struct Form<T> {
 template<typename T>
 requires std::is_enum_v<T>
 struct Form<T> {
-    using Integer = std::underlying_type_t<T>;
+    using Integer = std::underlying_type_t<T>; ///< what it travels as
     static bool fits(Value const& node) { return node.isInt(); }
     static T read(Value const& node) { return static_cast<T>(static_cast<Integer>(node.toInt())); }
     // By way of 64 bits, since the smallest underlying types are character types.

@@ -47,24 +47,24 @@ enum class Inheritance {
 
 /// A type with the keys of its records.
 struct KeyForm {
-    KeyType type;
+    KeyType type; ///< of a value
     /// Of a Record, or of each of the Records; null for other types.
     RecordKeys const* record = nullptr;
 };
 
 struct KeyRow {
-    std::string name;
-    KeyForm form;
-    KeyUse use = KeyUse::Lenient;
+    std::string name;             ///< as it is written
+    KeyForm form;                 ///< what it holds
+    KeyUse use = KeyUse::Lenient; ///< what becomes of another type
     /// What a missing key reads as, as JSON text, in a settings part the default of the root. Empty when that
     /// is no value at all.
     std::string missing = {};
-    Inheritance inheritance = Inheritance::None;
+    Inheritance inheritance = Inheritance::None; ///< in a settings part
 };
 
 /// The keys of a record in the order in which they are written, those that are dropped behind them.
 struct VLSERVICE_EXPORT RecordKeys {
-    std::vector<KeyRow> rows;
+    std::vector<KeyRow> rows; ///< a row for each key
     /// Keys without a row are kept and written back.
     bool keepsOthers = false;
     /// A text may stand for the object: the value of its first key.

@@ -30,7 +30,7 @@ inline constexpr std::int64_t WIDE_TRAILER_SIZE = 28;
 
 /// Begins the first blob of the other layouts; it is how blobs that were compressed for storage begin.
 inline constexpr std::string_view BLOB_START = "TE";
-inline constexpr std::size_t OFFSET_SIZE = sizeof(std::int64_t);
+inline constexpr std::size_t OFFSET_SIZE = sizeof(std::int64_t); ///< of a position
 /// An index of this size or more is none.
 inline constexpr std::int64_t INDEX_SIZE_LIMIT = std::int64_t{1} << 32;
 
@@ -38,26 +38,26 @@ inline constexpr std::int64_t INDEX_SIZE_LIMIT = std::int64_t{1} << 32;
 inline constexpr char JOB_METADATA[] = "DDT440001.TDD";
 
 // Elements, each inside the one before: one item for each blob.
-inline constexpr char TAG_ROOT[] = "vantelar";
-inline constexpr char TAG_MAILING[] = "corbulet";
-inline constexpr char TAG_ITEM[] = "mailitem";
+inline constexpr char TAG_ROOT[] = "vantelar";    ///< around all
+inline constexpr char TAG_MAILING[] = "corbulet"; ///< the mailing
+inline constexpr char TAG_ITEM[] = "mailitem";    ///< a blob
 
 // Attributes of the mailing.
-inline constexpr char MAILING_ID[] = "id";
-inline constexpr char MAILING_ITEMS[] = "items";
+inline constexpr char MAILING_ID[] = "id";       ///< the pack id
+inline constexpr char MAILING_ITEMS[] = "items"; ///< how many there are
 /// Never written, and ignored where it stands.
 inline constexpr char MAILING_TITLE[] = "subject";
 
 // Attributes of an item.
-inline constexpr char ITEM_NAME[] = "name";
-inline constexpr char ITEM_OFFSET[] = "offset";
-inline constexpr char ITEM_LENGTH[] = "length";
-inline constexpr char ITEM_ROLE[] = "role";
-inline constexpr char ITEM_CRC[] = "crc";
-inline constexpr char ITEM_DOCUMENT[] = "document";
+inline constexpr char ITEM_NAME[] = "name";         ///< of the page
+inline constexpr char ITEM_OFFSET[] = "offset";     ///< where the blob begins
+inline constexpr char ITEM_LENGTH[] = "length";     ///< in bytes
+inline constexpr char ITEM_ROLE[] = "role";         ///< one of those below
+inline constexpr char ITEM_CRC[] = "crc";           ///< CRC-32 as stored
+inline constexpr char ITEM_DOCUMENT[] = "document"; ///< that the page is of
 
-inline constexpr char ROLE_PAGE[] = "page";
-inline constexpr char ROLE_FRAMEWORK[] = "framework";
+inline constexpr char ROLE_PAGE[] = "page";           ///< a page
+inline constexpr char ROLE_FRAMEWORK[] = "framework"; ///< the metadata
 
 /// Whether the index can hold that id or name: UTF-8 of characters that XML 1.0 has.
 VLSERVICE_EXPORT bool mayStandInIndex(std::string_view text);

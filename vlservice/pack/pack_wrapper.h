@@ -25,6 +25,7 @@ class TiXmlDocument;
 /// state. Used by one thread at a time.
 class VLSERVICE_EXPORT PackWrapper : public PageLoaderI, public PageSaverI {
 public:
+    /// What becomes of the file.
     enum Purpose : std::uint32_t {
         PURPOSE_IMPORT = 0,
         PURPOSE_OUTPUT = 1,
@@ -34,10 +35,10 @@ public:
 
     /// What the index says of one blob.
     struct BinEntry {
-        std::string name;
+        std::string name; ///< of the page in its document
         /// From the start of the file, in bytes.
         std::uint64_t offset = 0;
-        std::uint32_t length = 0;
+        std::uint32_t length = 0; ///< in bytes
         /// "page" or "framework"; in a file from elsewhere any other text.
         std::string role;
         /// CRC-32 of the blob as stored.
@@ -46,9 +47,9 @@ public:
         std::string document;
     };
 
-    static std::string const TAG_CORBULET;
-    static std::string const TAG_CORBULET_ID;
-    static std::string const TAG_CORBULET_TITLE;
+    static std::string const TAG_CORBULET;       ///< of the index, around the entries
+    static std::string const TAG_CORBULET_ID;    ///< of the mailing's id
+    static std::string const TAG_CORBULET_TITLE; ///< of the mailing's title
 
     /// Creates the file, replacing one that is there, or opens it and reads its index.
     /// The id is that of a mailing to be written; an import's packId() comes from the file.
@@ -59,7 +60,7 @@ public:
 
     /// A failure has happened, which is logged; nothing can be read or written.
     bool failed() const { return !okSoFar(); }
-    boost::filesystem::path const& pthFile() const { return pth_; }
+    boost::filesystem::path const& pthFile() const { return pth_; } ///< as it was given
     /// Blobs in the index, the metadata included; 0 after a failed import.
     unsigned long long szBins() const { return bins_.size(); }
     /// In file order. Throws std::out_of_range.
@@ -85,11 +86,11 @@ public:
     bool finalizeOutput(SharedMemBuffer metadata);
 
 protected:
-    bool okSoFar() const { return purpose_ != PURPOSE_FAILED; }
+    bool okSoFar() const { return purpose_ != PURPOSE_FAILED; } ///< nothing has failed
     /// Closes the file, and removes it when it was being written. A file whose stream has failed already is
     /// left as it is, open until the wrapper goes. Does nothing in the failed state.
     void onFailure();
-    bool onFailureRetFalse();
+    bool onFailureRetFalse(); ///< the same, for a return
 
 private:
     static std::string const TAG_VANTELAR;

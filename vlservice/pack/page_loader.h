@@ -14,9 +14,9 @@
 /// which answers on the calling thread. Takes no lock: the derived class serialises requests and arrivals.
 class VLSERVICE_EXPORT PageLoaderI {
 public:
-    using PageFunc = std::function<void(SharedMemBuffer)>;
+    using PageFunc = std::function<void(SharedMemBuffer)>; ///< takes a page, or the empty buffer
 
-    PageLoaderI(std::string packId);
+    PageLoaderI(std::string packId); ///< of the mailing that pages are of
     /// Copies take the requests along.
     PageLoaderI(PageLoaderI const&) = default;
     PageLoaderI& operator=(PageLoaderI const&) = default;
@@ -30,7 +30,7 @@ public:
     /// A hook that runs each time an answered request was the last one. It may delete the loader.
     virtual void done();
 
-    std::string const& packId() const { return packId_; }
+    std::string const& packId() const { return packId_; } ///< of the mailing
 
     /// Undoes PageSaverI::zipDbData(). Anything that does not begin with the blob's magic comes back as it
     /// is, the same block. Where the stream holds less than the header says, the tail is zeroes. A damaged
@@ -47,9 +47,9 @@ protected:
     PageFunc findFuncToExec(std::string const& document, std::string const& page);
     /// Removes the oldest claimed request of the page; runs done() when it was the last of all requests.
     void afterExecutedFunc(std::string const& document, std::string const& page);
-    void chkCallDone();
+    void chkCallDone(); ///< runs done() when nothing waits
 
-    void setPackId(std::string packId);
+    void setPackId(std::string packId); ///< when it is known later
 
 private:
     // A list for each page: a hashed multimap would not keep the order in which equal keys arrived.

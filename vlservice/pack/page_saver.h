@@ -9,11 +9,12 @@
 /// A sink of pages.
 class VLSERVICE_EXPORT PageSaverI {
 public:
-    PageSaverI(std::string packId);
+    PageSaverI(std::string packId); ///< of the mailing that pages are of
     PageSaverI(PageSaverI const&) = default;
     PageSaverI& operator=(PageSaverI const&) = default;
     virtual ~PageSaverI();
 
+    /// Takes a page, which is in its compressed form.
     virtual void savePage(std::string const& document, std::string const& page, SharedMemBuffer data) = 0;
 
     /// The compressed form of the data, a header and a zlib stream; no data gives a blob too.

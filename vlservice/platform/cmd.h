@@ -17,6 +17,7 @@ class CmdI;
 /// How long a request may take.
 class VLSERVICE_EXPORT Timeouts {
 public:
+    /// Names of the limits.
     enum TimeoutId { TIMEOUT_ID_0 = 0, TIMEOUT_ID_1 = 1, TIMEOUT_ID_2 = 2, TIMEOUT_ID_3 = 3 };
 
     /// Zero, which is no limit, for 0; then 10 s, 30 s and 120 s.
@@ -28,6 +29,7 @@ public:
 /// at once.
 class VLSERVICE_EXPORT CmdTransferI {
 public:
+    /// Which half of a command travels.
     enum class Message { Request, Response };
 
     virtual ~CmdTransferI();
@@ -60,8 +62,8 @@ public:
     CmdI(unsigned char id, std::shared_ptr<CmdProcessorI> processor);
     CmdI(CmdI const&) = default;
 
-    unsigned char id() const { return id_; }
-    std::shared_ptr<CmdProcessorI> const& processor() const { return processor_; }
+    unsigned char id() const { return id_; }                                       ///< the number
+    std::shared_ptr<CmdProcessorI> const& processor() const { return processor_; } ///< shared
 
     /// The display name.
     virtual char const* name() const = 0;
@@ -71,9 +73,9 @@ public:
     virtual void onTransferError(std::string message);
     /// The four steps of a transfer. A command that has no form to be sent in ends them in onTransferError.
     virtual void sendReq();
-    virtual void readReq();
-    virtual void sendResp();
-    virtual void readResp();
+    virtual void readReq();  ///< on the other side
+    virtual void sendResp(); ///< on the other side
+    virtual void readResp(); ///< where it began
     /// Shows itself to the processor; here nothing.
     virtual void accept(CmdProcessorI& processor);
     /// Whether the next request may be sent when this command is done; true.
@@ -96,20 +98,20 @@ public:
     JsonCmdBase(JsonCmdBase const&) = default;
 
     void sendReq() override;
-    void readReq() override;
-    void sendResp() override;
-    void readResp() override;
+    void readReq() override;  ///< on the other side
+    void sendResp() override; ///< on the other side
+    void readResp() override; ///< where it began
 
-    virtual json::Object serializeReq() const;
+    virtual json::Object serializeReq() const; ///< what the request carries
     /// The request has gone.
     virtual void sendReqDone();
-    virtual void deserializeReq(json::Object const& request);
+    virtual void deserializeReq(json::Object const& request); ///< throws what it cannot take
     /// The request has been read.
     virtual void readReqDone();
-    virtual json::Object serializeResp() const;
+    virtual json::Object serializeResp() const; ///< what the response carries
     /// The response has gone.
     virtual void sendRespDone();
-    virtual void deserializeResp(json::Object const& response);
+    virtual void deserializeResp(json::Object const& response); ///< throws what it cannot take
     /// The response has been read.
     virtual void readRespDone();
 

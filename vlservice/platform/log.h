@@ -16,7 +16,7 @@ namespace Log {
 /// The journal's numbers: 3 and 4 are failures, 7 is a trace line.
 using LogPriority = int;
 
-using Sink = std::function<void(LogPriority, std::string const& line)>;
+using Sink = std::function<void(LogPriority, std::string const& line)>; ///< takes a line
 
 /// Installs a sink and returns the one before. An empty sink drops all lines.
 /// The sink at start writes to standard error, each line prefixed "<3>" and so on, which the journal
@@ -28,12 +28,12 @@ VLSERVICE_EXPORT Sink setSink(Sink sink);
 /// line for which there is no memory is cut or dropped: a failure can be told from anywhere.
 class VLSERVICE_EXPORT Lock {
 public:
-    Lock(LogPriority priority) noexcept;
+    Lock(LogPriority priority) noexcept; ///< begins a message
     ~Lock();
     Lock(Lock const&) = delete;
     Lock& operator=(Lock const&) = delete;
 
-    std::ostream& logStreamLine();
+    std::ostream& logStreamLine(); ///< takes its text
 
 private:
     LogPriority priority_;

@@ -11,5 +11,5 @@ class VLSERVICE_EXPORT ExportedUCharAlloc {
 public:
     /// Bytes are not initialised. Throws std::bad_alloc.
     static unsigned char* alloc(std::size_t size);
-    void operator()(unsigned char* block) const;
+    void operator()(unsigned char* block) const; ///< frees it
 };

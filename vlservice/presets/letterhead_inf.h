@@ -31,7 +31,7 @@ struct VLSERVICE_EXPORT LetterheadInf {
     bool operator==(LetterheadInf const& other) const;
     bool operator!=(LetterheadInf const& other) const { return !(*this == other); }
 
-    std::string id;
+    std::string id; ///< of the document
     bool skipLetters = false;
     bool skipAttachments = false;
     std::vector<std::string> whichAttachments;

@@ -31,9 +31,9 @@ class VLSERVICE_EXPORT PackPreset {
 public:
     /// A document that is added to a mailing.
     struct VLSERVICE_EXPORT Attachment {
-        static constexpr int NO_PREFERRED_POS = std::numeric_limits<int>::min();
+        static constexpr int NO_PREFERRED_POS = std::numeric_limits<int>::min(); ///< no position is set
 
-        Attachment(std::string document, int position, json::Value unknownKeys);
+        Attachment(std::string document, int position, json::Value unknownKeys); ///< a record of these
         /// From the id as a string, or from an object with "id". Throws json::Exc for anything else and for a
         /// position that is no integer.
         Attachment(json::Value const& value);
@@ -45,7 +45,7 @@ public:
 
         bool operator==(Attachment const& other) const = default;
 
-        std::string id;
+        std::string id; ///< of the document
         int preferredPos = NO_PREFERRED_POS;
         json::Value additional; ///< unknown keys as an object, or the empty handle
     };
@@ -72,8 +72,8 @@ public:
         std::set<int> mins;
     };
 
-    static std::string const NAME_FLD_NAME;
-    static std::string const PROC_MODE_FLD_NAME;
+    static std::string const NAME_FLD_NAME;      ///< key of the name
+    static std::string const PROC_MODE_FLD_NAME; ///< key of the process mode
 
     PackPreset() = default;
     /// Reads the configuration form, which has the name under "name", when `extraFields` is empty. Otherwise
@@ -89,34 +89,34 @@ public:
     /// Those of the configuration form.
     static json::RecordKeys const& keys();
 
-    std::string const& name() const { return name_; }
+    std::string const& name() const { return name_; } ///< by which presets are referred to
     std::string const& title() const { return title_; }
     PackColorModel colorModel() const { return colorModel_; }
     bool duplex() const { return duplex_; }
     PackForcedOrientation orientationForced() const { return orientation_; }
     std::string const& department() const { return department_; }
     bool noGroup() const { return noGroup_; }
-    ProcessMode processMode() const { return processMode_; }
+    ProcessMode processMode() const { return processMode_; } ///< never checked here
     ProcessModeClient processModeClient() const { return processModeClient_; }
     std::string const& profile() const { return profile_; }
     bool priorityDelivery() const { return priorityDelivery_; }
     bool confirmReceipt() const { return confirmReceipt_; }
     std::string const& userEmailOverride() const { return userEmailOverride_; }
-    bool lockPackUI() const { return lockPackUI_; }
+    bool lockPackUI() const { return lockPackUI_; } ///< nodes below keep to it
     /// Null when there is no delay; valid until this preset's delay is replaced and its copies are gone.
     DelayInfo const* pDelayInfo() const { return delay_.get(); }
-    std::vector<Attachment> const& attachments() const { return attachments_; }
-    std::vector<LetterheadInf> const& letterheads() const { return letterheads_; }
+    std::vector<Attachment> const& attachments() const { return attachments_; }    ///< in list order
+    std::vector<LetterheadInf> const& letterheads() const { return letterheads_; } ///< in list order
     /// The keys that the preset does not know; may be the empty handle.
     json::Value const& jAdditional() const { return additional_; }
-    bool eraseMe() const { return eraseMe_; }
+    bool eraseMe() const { return eraseMe_; } ///< it is to be erased
 
     /// Whether the presets say the same, by whatever name and whenever they were used.
     bool compareSettings(PackPreset const& other) const;
     bool operator==(PackPreset const& other) const;
     bool operator!=(PackPreset const& other) const { return !(*this == other); }
 
-    void setName(std::string name) { name_ = std::move(name); }
+    void setName(std::string name) { name_ = std::move(name); } ///< by which it is referred to
     void setTitle(std::string title) { title_ = std::move(title); }
     /// Of colorModel(); the odd name is the interface's.
     void setColourMode(PackColorModel model) { colorModel_ = model; }
@@ -124,7 +124,7 @@ public:
     void setOrientationForced(PackForcedOrientation orientation) { orientation_ = orientation; }
     void setDepartment(std::string department) { department_ = std::move(department); }
     void setNoGroup(bool noGroup) { noGroup_ = noGroup; }
-    void setProcessMode(ProcessMode mode) { processMode_ = mode; }
+    void setProcessMode(ProcessMode mode) { processMode_ = mode; } ///< any bits
     void setProcessModeClient(ProcessModeClient mode) { processModeClient_ = mode; }
     void setProfile(std::string profile) { profile_ = std::move(profile); }
     void setPriorityDelivery(bool priority) { priorityDelivery_ = priority; }
@@ -135,15 +135,15 @@ public:
     void setLockPackUI(bool lock) { lockPackUI_ = lock; }
     /// Replaces the delay; copies of this preset keep theirs.
     void setDelayInfo(DelayInfo const& delay) { delay_ = std::make_shared<DelayInfo const>(delay); }
-    std::vector<Attachment>& attachments() { return attachments_; }
-    std::vector<LetterheadInf>& letterheads() { return letterheads_; }
+    std::vector<Attachment>& attachments() { return attachments_; }    ///< for changing
+    std::vector<LetterheadInf>& letterheads() { return letterheads_; } ///< for changing
     /// The additional keys for changing; made when there are none yet.
     /// Throws json::Exc when the additional value is something else than an object.
     json::Object& jObjAdditional();
-    void setAdditional(json::Value additional) { additional_ = std::move(additional); }
+    void setAdditional(json::Value additional) { additional_ = std::move(additional); } ///< all of them
     /// Last used becomes the current time.
     void resetLastUsed();
-    void deleteLastUsed() { lastUsed_ = 0; }
+    void deleteLastUsed() { lastUsed_ = 0; } ///< as if it was never used
     /// The mark is no part of what the preset says, so it can be set on a preset that must not change.
     void setEraseMe(bool erase) const { eraseMe_ = erase; }
 

@@ -25,8 +25,8 @@ using SettingsParts = PartList<App, Inet, PO, Departments, Profiles, Presets>;
 
 /// A part as it can be told at run time. Both references live as long as the library.
 struct PartInfo {
-    std::string const& name;
-    json::RecordKeys const& keys;
+    std::string const& name;      ///< in settings documents
+    json::RecordKeys const& keys; ///< of its object
 };
 
 /// In the order of SettingsParts.
