@@ -7,6 +7,7 @@ import sys
 import tempfile
 import unittest
 
+sys.dont_write_bytecode = True
 sys.path.insert(0, os.path.dirname(__file__))
 import examples
 
