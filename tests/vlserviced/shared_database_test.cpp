@@ -1,10 +1,15 @@
 // Several services on one PostgreSQL database, whatever becomes of them.
 #include "programs/base/error.h"
+#include "programs/channel/stream.h"
 #include "programs/database/postgres_connection.h"
+#include "programs/vlmail/commands/service_options.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
+#include "tests/channel/test_certificate.h"
+#include "tests/support/failure_of.h"
 #include "tests/support/postgres_server.h"
 #include "tests/support/temporary_folder.h"
+#include "tests/support/two_networks.h"
 #include "tests/vlserviced/pack_help.h"
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/get_svc_cfg.h"
@@ -15,8 +20,11 @@
 
 #include <atomic>
 #include <csignal>
+#include <map>
+#include <memory>
 #include <mutex>
 #include <poll.h>
+#include <sstream>
 #include <sys/inotify.h>
 #include <thread>
 #include <unistd.h>
@@ -232,6 +240,79 @@ TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStil
     EXPECT_EQ(taken.size(), static_cast<std::size_t>(CLIENTS * PACKS)) << "none is lost";
     for (auto const& [id, times] : taken)
         EXPECT_EQ(times, 1) << id;
+}
+
+// --- on the way to them
+
+/// Two services in a network, and a client in another one that knows the first alone.
+class ServicesOnAnotherMachine : public testing::Test {
+protected:
+    void SetUp() override {
+        if (!server_.whyNot().empty())
+            GTEST_SKIP() << server_.whyNot();
+        if (!networks_.whyNot().empty())
+            GTEST_SKIP() << "There is no right to make network namespaces: " << networks_.whyNot();
+        certificate_ = ChannelTest::makeCertificate(folder_.path().string(), "service");
+        for (char const* const name : {"first", "second"})
+            start(name);
+    }
+
+    void start(char const* name) {
+        TwoNetworks::Inside const inside(networks_.service());
+        std::vector<std::string> arguments{
+            "--data",   (folder_ / name).string(), "--database",    database_.address(),
+            "--listen", TwoNetworks::SERVICE_IP4,  "--certificate", certificate_.certificateFile,
+            "--key",    certificate_.keyFile};
+        if (!services_.empty())
+            arguments.insert(arguments.end(), {"--token", token()});
+        services_[name] = std::make_unique<ServiceProcess>(arguments);
+    }
+    std::string token() const { return (folder_ / "first" / "token").string(); }
+    std::string addressOf(char const* name) {
+        return std::string(TwoNetworks::SERVICE_IP4) + ':' + std::to_string(services_.at(name)->port());
+    }
+    VlMail::ServiceOptions options() {
+        VlMail::ServiceOptions options;
+        options.service = addressOf("first");
+        options.tokenFile = token();
+        options.pinFile = (folder_ / "pins").string();
+        options.certificate = Channel::fingerprintOf(
+            *Channel::makeServiceContext(certificate_.certificateFile, certificate_.keyFile));
+        return options;
+    }
+    void kill(char const* name) {
+        services_.at(name)->signal(SIGKILL);
+        services_.at(name)->wait();
+    }
+
+    TwoNetworks networks_;
+    TemporaryFolder folder_;
+    VLServiceTest::PostgresServer server_;
+    VLServiceTest::PostgresDatabase database_{server_.folder()};
+    ChannelTest::TestCertificate certificate_;
+    std::map<std::string, std::unique_ptr<ServiceProcess>> services_;
+    std::ostringstream said_;
+    VlMail::Terminal const terminal_{said_, said_};
+};
+
+TEST_F(ServicesOnAnotherMachine, TakeOverAClientThatLosesItsService) {
+    TwoNetworks::Inside const inside(networks_.client());
+    VlMail::ServiceOptions const wanted = options();
+    VlMail::ServiceLine line = VlMail::lineToService(wanted, terminal_);
+    std::string const lost = addressOf("first");
+    kill("first");
+    storePack(folder_ / "p1.db", "p1");
+    EXPECT_EQ(VlMail::deliverPack(line, folder_ / "p1.db", "p1", false).state, Protocol::JobState::Queued);
+    EXPECT_THAT(said_.str(), HasSubstr("note: the service " + lost + " was lost; going on with " +
+                                       addressOf("second") + "\n"));
+}
+
+TEST_F(ServicesOnAnotherMachine, AreNotTakenForOneThatWasNeverReached) {
+    TwoNetworks::Inside const inside(networks_.client());
+    VlMail::ServiceOptions const wanted = options();
+    kill("first");
+    EXPECT_THAT(failureOf([&] { VlMail::lineToService(wanted, terminal_); }),
+                HasSubstr(wanted.service + ": Nobody answers there"));
 }
 
 } // namespace

@@ -1,6 +1,11 @@
 #include "programs/vlmail/commands/service_options.h"
 
 #include "programs/vlmail/commands/settings.h"
+#include "programs/vlmail/service/service_route.h"
+#include "programs/vlmail/service/service_search.h"
+
+#include <memory>
+#include <ostream>
 
 namespace VlMail {
 
@@ -19,7 +24,17 @@ void addServiceOptions(Base::Command const& command, ServiceOptions& options) {
 }
 
 ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal) {
-    return ServiceLine([&options, &terminal] { return connectToService(options, terminal.err); });
+    auto const tell = [&terminal](ServiceAddress const& lost, ServiceAddress const& next) {
+        terminal.err << "note: the service " << lost.text() << " was lost; going on with " << next.text()
+                     << '\n';
+    };
+    auto const route = std::make_shared<ServiceRoute>(
+        findService(options),
+        [&options, &terminal](ServiceAddress const& address) {
+            return connectToService(address, options, terminal.err);
+        },
+        [&options] { return searchProven(tokenIfAny(options)); }, tell);
+    return ServiceLine([route] { return route->connect(); });
 }
 
 void addPackDatabaseOptions(Base::Command const& command, PackDatabaseOptions& options) {

@@ -50,7 +50,8 @@ std::string tokenFile(ServiceOptions const& options) {
     return options.tokenFile.empty() ? (configFolder() / "token").string() : options.tokenFile;
 }
 
-/// Empty without one: connecting says what is wrong with it.
+} // namespace
+
 std::string tokenIfAny(ServiceOptions const& options) {
     try {
         return Channel::readToken(tokenFile(options));
@@ -58,8 +59,6 @@ std::string tokenIfAny(ServiceOptions const& options) {
         return {};
     }
 }
-
-} // namespace
 
 ServiceAddress findService(ServiceOptions const& options) {
     if (!options.service.empty())

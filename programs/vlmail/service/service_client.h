@@ -31,6 +31,9 @@ struct ServiceOptions {
     bool allowsChannel1 = false;
 };
 
+/// The token that the options mean; empty where there is none that can be read: connecting says what is wrong
+/// with it.
+std::string tokenIfAny(ServiceOptions const& options);
 /// Finds the service that the options mean. Throws Error when there is none.
 ServiceAddress findService(ServiceOptions const& options);
 /// Connects to it. A certificate that is new is shown to the person, who decides.

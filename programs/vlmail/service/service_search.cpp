@@ -12,7 +12,7 @@ namespace {
 /// Both IP versions at once.
 class Search {
 public:
-    explicit Search(std::string const& token) : token_(token) {
+    Search(std::string const& token, bool wantsProof) : token_(token), wantsProof_(wantsProof) {
         for (Ipc::DiscoveryBase* const base : {&v6_, &v4_})
             if (base->isOpen())
                 ask(*base);
@@ -36,13 +36,14 @@ private:
         if (!address)
             return;
         bool const isProven = !token_.empty() && Channel::isProven(datagram, token_, nonce_);
-        if (!found_ || isProven)
+        if (isProven || (!found_ && !wantsProof_))
             found_ = address;
         if (isProven || token_.empty())
             io_.stop();
     }
 
     std::string const& token_;
+    bool wantsProof_;
     std::string const nonce_ = Channel::makeNonce();
     boost::asio::io_context io_{1};
     Ipc::DiscoveryBase v6_{io_, false};
@@ -53,7 +54,11 @@ private:
 } // namespace
 
 std::optional<ServiceAddress> searchNetwork(std::string const& token, std::chrono::milliseconds time) {
-    return Search(token).run(time);
+    return Search(token, false).run(time);
+}
+
+std::optional<ServiceAddress> searchProven(std::string const& token, std::chrono::milliseconds time) {
+    return Search(token, true).run(time);
 }
 
 } // namespace VlMail

@@ -16,5 +16,8 @@ constexpr std::chrono::milliseconds SEARCH_TIME{2000};
 /// passed over.
 std::optional<ServiceAddress> searchNetwork(std::string const& token,
                                             std::chrono::milliseconds time = SEARCH_TIME);
+/// The same for services alone that prove that they know the token.
+std::optional<ServiceAddress> searchProven(std::string const& token,
+                                           std::chrono::milliseconds time = SEARCH_TIME);
 
 } // namespace VlMail
