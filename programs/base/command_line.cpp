@@ -94,6 +94,8 @@ Command Command::addCommand(std::string const& name, std::string const& descript
     return Command(*app_->add_subcommand(name, description));
 }
 
+void Command::takeOptionsAbove() const { app_->fallthrough(); }
+
 void Command::requireCommand() const { app_->require_subcommand(1); }
 
 Option Command::addOption(std::string const& names, std::string& value, std::string const& help) const {

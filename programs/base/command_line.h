@@ -52,6 +52,8 @@ public:
     explicit Command(CLI::App& app) : app_(&app) {}
 
     Command addCommand(std::string const& name, std::string const& description) const;
+    /// Behind its name the options of the command above may stand, too.
+    void takeOptionsAbove() const;
     /// The command line has to name one of the subcommands.
     void requireCommand() const;
 

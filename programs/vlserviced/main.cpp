@@ -3,14 +3,19 @@
 #include "programs/base/out_of_memory.h"
 #include "programs/base/plain_log.h"
 #include "programs/base/plain_text.h"
+#include "programs/vlserviced/jobs/backup.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
 #include "programs/vlserviced/system_manager.h"
+#include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
 
+#include <ctime>
 #include <exception>
+#include <filesystem>
 #include <iostream>
 #include <new>
+#include <string>
 
 namespace {
 
@@ -31,11 +36,45 @@ void serve(VlServiced::Options options) {
     service.run();
 }
 
+std::filesystem::path outboxOf(VlServiced::Options const& options) {
+    return std::filesystem::absolute(options.outbox.empty() ? options.data / "outbox" : options.outbox);
+}
+
+void backUp(VlServiced::Options const& options) {
+    VlServiced::backUp(options.data, outboxOf(options), options.file, std::time(nullptr));
+}
+
+std::string inWords(long long count, char const* one, char const* many) {
+    return std::to_string(count) + ' ' + (count == 1 ? one : many);
+}
+
+void restore(VlServiced::Options const& options) {
+    VlServiced::RestoredRecord const record = VlServiced::restoreBackup(
+        options.file, options.data, outboxOf(options),
+        options.nothingSince ? VlServiced::Since::Nothing : VlServiced::Since::Unknown, std::time(nullptr));
+    std::cout << "restored from the backup of " << LocalTime::toText(record.madeAt) << "; "
+              << inWords(record.foundJobs, "mailing was", "mailings were") << " found in the upload folder, "
+              << inWords(record.doubtfulJobs, "mailing is held", "mailings are held") << " and "
+              << inWords(record.doubtfulLetters, "letter is", "letters are")
+              << " uncertain until a person decides\n";
+}
+
+void carryOut(VlServiced::Options const& options) {
+    switch (options.task) {
+    case VlServiced::Task::Serve:
+        return serve(options);
+    case VlServiced::Task::BackUp:
+        return backUp(options);
+    case VlServiced::Task::Restore:
+        return restore(options);
+    }
+}
+
 int run(int argc, char** argv) {
     auto const parsed = VlServiced::parseOptions(argc, argv, std::cout, std::cerr, Base::COMMIT);
     if (int const* const status = std::get_if<int>(&parsed))
         return *status;
-    serve(std::get<VlServiced::Options>(parsed));
+    carryOut(std::get<VlServiced::Options>(parsed));
     return 0;
 }
 

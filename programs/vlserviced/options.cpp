@@ -61,6 +61,28 @@ void addOptions(Base::Command const& command, Options& options) {
     command.addFlag("--verbose", options.verbose, "Log every datagram of discovery");
 }
 
+void addTasks(Base::Command const& command, Options& options) {
+    Base::Command const backup =
+        command.addCommand("backup", "Write all that the service keeps into a file, while it runs or not");
+    backup.takeOptionsAbove();
+    backup.addOption("FILE", options.file, "New file for the backup").required();
+    backup.whenNamed([&options] { options.task = Task::BackUp; });
+    Base::Command const restore = command.addCommand(
+        "restore", "Have a service go on from a backup, in a data folder that holds nothing yet");
+    restore.takeOptionsAbove();
+    restore.addOption("FILE", options.file, "The backup").required();
+    restore.addFlag("--nothing-since", options.nothingSince,
+                    "The service handed nothing over behind the backup: have mailings that wait go on");
+    restore.whenNamed([&options] { options.task = Task::Restore; });
+}
+
+void requireOwnDatabase(Options const& options) {
+    if (options.task != Task::Serve && !options.database.empty())
+        throw Base::UsageError(
+            "backup and restore are for the database of a data folder; one of PostgreSQL is saved as "
+            "a whole by pg_dump");
+}
+
 } // namespace
 
 std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::ostream& out,
@@ -73,12 +95,14 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
     });
     addOptions(line.command(), options);
     line.addConfigFile();
+    addTasks(line.command(), options);
     try {
         if (!line.read(argc, argv, out))
             return 0;
         if (options.lease < 2 || options.lease > 600)
             throw Base::UsageError("--lease takes 2 to 600 seconds, and got " +
                                    std::to_string(options.lease));
+        requireOwnDatabase(options);
         return options;
     } catch (Base::UsageError const& wrong) {
         err << "vlserviced: " << wrong.what() << "; --help explains\n";
@@ -92,6 +116,7 @@ Base::CommandInfo commandInfo() {
     line.addVersion([] { return std::string(); });
     addOptions(line.command(), options);
     line.addConfigFile();
+    addTasks(line.command(), options);
     return line.command().info();
 }
 

@@ -11,7 +11,15 @@
 
 namespace VlServiced {
 
+/// What the program is started for.
+enum class Task { Serve, BackUp, Restore };
+
 struct Options {
+    Task task = Task::Serve;
+    /// Of a backup.
+    std::filesystem::path file;
+    /// Whether the service did nothing behind the backup.
+    bool nothingSince = false;
     std::filesystem::path data;
     /// Of a PostgreSQL database that several services may share; empty for the data folder's own file.
     std::string database;

@@ -213,6 +213,122 @@ TEST_F(ServiceProcessTest, RefusesToTellOthersThanThisMachine) {
               "unix:PATH, and got \"0.0.0.0:9117\"\n");
 }
 
+/// What the program prints when it is run for something else than to serve, and its status in front.
+std::string carriedOut(std::vector<std::string> const& arguments) {
+    ServiceProcess task(arguments);
+    int const status = task.wait();
+    return std::to_string(status) + ' ' + task.firstLine() + task.errors();
+}
+
+/// A service with two mailings that wait, and a backup of it that is made while it runs.
+class RestoredService : public ServiceProcessTest {
+protected:
+    RestoredService() {
+        fs::create_directory(upload_);
+        ServiceProcess const service(arguments());
+        auto const client = clientOf(service, data_);
+        client->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
+        for (char const* const id : {"p1", "p2"}) {
+            storePack(folder_ / "packs.db", id);
+            client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", id);
+        }
+        await(*client, "p1", "queued");
+        await(*client, "p2", "queued");
+        EXPECT_EQ(carriedOut({"backup", file_.string(), "--data", data_.string()}), "0 ");
+    }
+
+    static std::string stateOf(Channel::Client& client, std::string const& id) {
+        json::Object const answer =
+            client.call<Ipc::CSConfigIdsList>(parse(R"({"query":"jobs","states":["held"]})"))->resp();
+        for (json::Value const& job : answer.get("jobs").toArray())
+            if (job.toObject().get("id").textOrEmpty() == id)
+                return job.toObject().get("state").textOrEmpty();
+        return "none";
+    }
+    void await(Channel::Client& client, std::string const& id, std::string const& state) {
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (std::chrono::steady_clock::now() < end)
+            if (stateOf(client, id) == state)
+                return;
+        ADD_FAILURE() << id << " is not " << state << " but " << stateOf(client, id);
+    }
+    static void change(Channel::Client& client, char const* action, std::string const& id) {
+        client.call<Ipc::CSConfigIdsList>(parse(R"({"query":"change_jobs","action":")" + std::string(action) +
+                                                R"(","ids":[")" + id + "\"]}"));
+    }
+    std::string restored(std::vector<std::string> const& more = {}) {
+        std::vector<std::string> all{"restore", file_.string(), "--data", new_.string()};
+        all.insert(all.end(), more.begin(), more.end());
+        return carriedOut(all);
+    }
+    std::vector<std::string> argumentsOfNew() const {
+        return {"--data", new_.string(), "--no-discovery", "--local-packs", folder_.path().string()};
+    }
+
+    fs::path upload_ = folder_ / "upload";
+    fs::path file_ = folder_ / "backup";
+    fs::path new_ = folder_ / "new";
+};
+
+TEST_F(RestoredService, GoesOnWithWhatWaitedAndHandsItOverOnce) {
+    EXPECT_THAT(restored({"--nothing-since"}),
+                testing::EndsWith("0 mailings were found in the upload folder, 0 mailings are "
+                                  "held and 0 letters are uncertain until a person decides"));
+    // The pages that the client has erased are in the container that came with the backup.
+    fs::remove(folder_ / "packs.db");
+    ServiceProcess const service(argumentsOfNew());
+    auto const client = clientOf(service, new_);
+    client->call<Ipc::UploadQueued>("", "");
+    for (char const* const id : {"p1", "p2"}) {
+        await(*client, id, "submitted");
+        EXPECT_EQ(contentOf(upload_ / (std::string(id) + ".mailing")), contentOfPack(id));
+    }
+}
+
+TEST_F(RestoredService, HandsNothingOverTwiceThatTheFormerOneHasHandedOver) {
+    {
+        ServiceProcess const former(arguments());
+        auto const client = clientOf(former, data_);
+        change(*client, "upload", "p1");
+        await(*client, "p1", "submitted");
+        change(*client, "upload", "p2");
+        await(*client, "p2", "submitted");
+    }
+    // Of one the carrier has left nothing.
+    fs::rename(upload_ / "p1.mailing", folder_ / "taken");
+    EXPECT_THAT(
+        restored(),
+        testing::EndsWith("1 mailing was found in the upload folder, 1 mailing is held and 0 letters are "
+                          "uncertain until a person decides"));
+    ServiceProcess const service(argumentsOfNew());
+    auto const client = clientOf(service, new_);
+    client->call<Ipc::UploadQueued>("", "");
+    EXPECT_EQ(stateOf(*client, "p1"), "held");
+    EXPECT_EQ(stateOf(*client, "p2"), "submitted");
+    EXPECT_FALSE(fs::exists(upload_ / "p1.mailing"));
+    change(*client, "release", "p1");
+    await(*client, "p1", "submitted");
+    EXPECT_EQ(contentOf(upload_ / "p1.mailing"), contentOfPack("p1"));
+}
+
+TEST_F(RestoredService, IsNotMadeWhereOneRunsOrHasRun) {
+    EXPECT_THAT(
+        carriedOut({"restore", file_.string(), "--data", data_.string()}),
+        testing::StartsWith("1 vlserviced: there is " + (data_ / "service.db").string() + " already: "));
+    ServiceProcess const service(arguments());
+    EXPECT_THAT(
+        carriedOut({"restore", file_.string(), "--data", data_.string()}),
+        testing::StartsWith("1 vlserviced: the data folder " + data_.string() + " is in use by another "));
+}
+
+TEST_F(RestoredService, OfASharedDatabaseIsForItsServer) {
+    EXPECT_EQ(carriedOut({"backup", (folder_ / "other").string(), "--data", data_.string(), "--database",
+                          "postgresql:///x"}),
+              "1 vlserviced: backup and restore are for the database of a data folder; one of PostgreSQL is "
+              "saved as "
+              "a whole by pg_dump; --help explains\n");
+}
+
 TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {
     std::uint16_t port = 0;
     {

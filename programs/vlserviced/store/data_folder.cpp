@@ -1,6 +1,7 @@
 #include "programs/vlserviced/store/data_folder.h"
 
 #include "programs/base/error.h"
+#include "programs/base/file_descriptor.h"
 #include "programs/base/pending_file.h"
 
 #include <cerrno>
@@ -15,6 +16,9 @@ namespace VlServiced {
 namespace {
 
 namespace fs = std::filesystem;
+
+/// What was restored and is whole.
+constexpr char const* RESTORED = "restored";
 
 /// The lock goes with the process however that ends.
 Base::FileLock takeHold(fs::path const& folder) {
@@ -62,6 +66,26 @@ DataFolder::DataFolder(fs::path folder) : folder_(std::move(folder)) {
     makeWritableFolder(folder_);
     requireOwn(folder_);
     lock_ = takeHold(folder_);
+    finishAdopting();
+}
+
+void DataFolder::adopt(fs::path const& restored) {
+    Base::syncFolder(restored);
+    fs::rename(restored, folder_ / RESTORED);
+    Base::syncFolder(folder_);
+    finishAdopting();
+}
+
+/// The database goes last: without it there is none.
+void DataFolder::finishAdopting() const {
+    fs::path const restored = folder_ / RESTORED;
+    if (!fs::exists(restored))
+        return;
+    for (fs::path const& file : {token(), packs(), database()})
+        if (fs::path const from = restored / file.filename(); fs::exists(from))
+            fs::rename(from, file);
+    Base::syncFolder(folder_);
+    fs::remove_all(restored);
 }
 
 } // namespace VlServiced

@@ -26,7 +26,13 @@ public:
     /// Where finished containers wait unless another folder was named.
     std::filesystem::path outbox() const { return folder_ / "outbox"; }
 
+    /// Makes what a restored folder holds this one's, whatever ends the process in between: the next one that
+    /// uses this folder goes on with it. There is nothing of the same names here.
+    void adopt(std::filesystem::path const& restored);
+
 private:
+    void finishAdopting() const;
+
     std::filesystem::path folder_;
     std::optional<Base::FileLock> lock_;
 };

@@ -327,6 +327,26 @@ void JobStore::wantUpload(std::string const& folder, std::string const& database
                         wanted.values());
 }
 
+void JobStore::freeAll() {
+    database_.change("UPDATE jobs SET holder = '', try_at = 0");
+    database_.change("UPDATE carriers SET holder = '', held_until = 0");
+}
+
+void JobStore::doubt(std::string const& packId, std::string const& problem, long long now) {
+    told(packId, database_.change("UPDATE jobs SET to_hold = 1, due = NULL, problem = $1, changed_at = $2, "
+                                  "state = CASE WHEN letters_state = '' THEN 'held' ELSE 'failed' END "
+                                  "WHERE pack = $3",
+                                  problem, now, packId));
+}
+
+void JobStore::recogniseSubmitted(std::string const& packId, std::string const& uploadFolder,
+                                  std::string const& identity, long long now) {
+    told(packId, database_.change("UPDATE jobs SET state = 'submitted', problem = '', to_upload = 1, "
+                                  "to_hold = 0, due = NULL, upload_folder = $1, upload_identity = $2, "
+                                  "changed_at = $3 WHERE pack = $4",
+                                  uploadFolder, identity, now, packId));
+}
+
 // A job is accepted before it ends, so that the index on states bounds the search.
 std::vector<Job> JobStore::endedBefore(long long time, std::size_t limit) const {
     std::vector<Job> ended;

@@ -119,6 +119,17 @@ public:
     /// restriction.
     void wantUpload(std::string const& folder, std::string const& database);
 
+    // Of a record that was restored, in which others may have gone on with jobs.
+
+    /// Nobody holds any.
+    void freeAll();
+    /// Holds a job until a person decides, which the problem is about; gives it up where only its letters
+    /// can be decided of.
+    void doubt(std::string const& packId, std::string const& problem, long long now);
+    /// Its container lies in that folder.
+    void recogniseSubmitted(std::string const& packId, std::string const& uploadFolder,
+                            std::string const& identity, long long now);
+
     /// Those that ended before that time, a few of them.
     std::vector<Job> endedBefore(long long time, std::size_t limit) const;
     /// Removes what is on record of a job.

@@ -323,6 +323,12 @@ bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const&
     return isDecided;
 }
 
+long long LetterStore::doubtAll(std::string const& says, long long now) {
+    return database_.change("UPDATE letters SET state = 'uncertain', says = $1, changed_at = $2 WHERE "
+                            "by_carrier = 1 AND state IN ('waiting', 'handed over')",
+                            says, now);
+}
+
 void LetterStore::doubt(std::string const& says, long long now) {
     database_.change(
         "UPDATE letters SET state = 'uncertain', says = $1, changed_at = $2 WHERE state = 'handed over'",

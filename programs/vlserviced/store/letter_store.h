@@ -171,6 +171,8 @@ public:
 
     /// Those that were being handed over when a process ended become uncertain.
     void doubt(std::string const& says, long long now);
+    /// The same of all that go by carriers and have not been taken on, which is how many there are.
+    long long doubtAll(std::string const& says, long long now);
 
     CarrierRecord carrier(std::string const& channel) const;
     void setCarrier(std::string const& channel, CarrierRecord const& record);
