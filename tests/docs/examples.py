@@ -2,6 +2,7 @@
 """Runs the commands that pages show, and holds what they print against what is shown.
 
   examples.py marked PAGE...                     names what is shown as a command, is not run, and does not say why
+  examples.py named PROGRAMS PAGE...             tells commands and options in backticks that the programs do not have
   examples.py run SOURCES PROGRAMS PAGE [SETUP]  runs the commands of a page in their order, in an empty folder
 
 A block ```console holds commands, each behind "$ ", its further lines behind "> ", and below it all that it prints. PROGRAMS
@@ -331,6 +332,36 @@ def run(sources, programs, page, setup=None):
     return 1 if faults else 0
 
 
+class Tree:
+    """The commands of a program, as its --help tells them."""
+
+    def __init__(self, program):
+        said = subprocess.run([*program, "--help"], capture_output=True, text=True, check=True).stdout
+        below = re.findall(r"^  ([a-z]\S*) {2,}", said.partition("Subcommands:\n")[2], re.MULTILINE)
+        self.options = set(re.findall(r"(?<![\w-])-{1,2}[a-z][\w-]*", said))
+        self.commands = {name: Tree([*program, name]) for name in below}
+
+    def faults_of(self, words):
+        """What is not there of "settings show|set NODE [--origin]"."""
+        if words and self.commands and not words[0].startswith("-"):
+            return [fault for name in words[0].split("|") for fault in self.below(name, words[1:])]
+        return ["no option " + word for word in words if word.startswith("-") and word not in self.options]
+
+    def below(self, name, words):
+        return self.commands[name].faults_of(words) if name in self.commands else ["no command " + name]
+
+
+def named(programs, *pages):
+    trees = {name: Tree([shutil.which(name, path=programs)]) for name in ("vlmail", "vlserviced")}
+    faults = 0
+    for page in pages:
+        for program, rest in re.findall(r"`(vlmail|vlserviced) ([^`\n]+)`", read(page)):
+            for fault in trees[program].faults_of(re.sub(r"[][]|\.\.\.", "", rest).split()):
+                print("%s: `%s %s`: %s" % (page, program, rest, fault))
+                faults += 1
+    return 1 if faults else 0
+
+
 def marked(*pages):
     faults = [(page, fault) for page in pages for fault in faults_of(read(page))]
     for page, (line, what) in faults:
@@ -342,4 +373,4 @@ def marked(*pages):
 
 
 if __name__ == "__main__":
-    sys.exit({"marked": marked, "run": run}[sys.argv[1]](*sys.argv[2:]))
+    sys.exit({"marked": marked, "named": named, "run": run}[sys.argv[1]](*sys.argv[2:]))

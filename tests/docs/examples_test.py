@@ -137,6 +137,37 @@ class VaryingOnes(MadePage):
         self.assertEqual(self.run_page(), (0, ""))
 
 
+class NamedCommands(MadePage):
+    HELP = """#!/bin/sh
+case "$*" in
+"--help") printf 'Options:\\n  --version  Tells it\\nSubcommands:\\n  pack  Looks in\\n  send  Sends\\n' ;;
+"pack --help") printf 'Subcommands:\\n  list  Lists\\n  verify  Compares\\n' ;;
+*) printf 'Options:\\n  -o,--output FILE  Where to\\n  --json  As JSON\\n' ;;
+esac
+"""
+
+    def named(self, *commands):
+        with tempfile.TemporaryDirectory() as programs:
+            for name in ("vlmail", "vlserviced"):
+                with open(os.path.join(programs, name), "w") as file:
+                    file.write(self.HELP)
+                os.chmod(os.path.join(programs, name), 0o755)
+            self.write(*["Say `%s`." % command for command in commands])
+            told = io.StringIO()
+            with contextlib.redirect_stdout(told):
+                return examples.named(programs, self.page), told.getvalue().replace(self.page + ": ", "")
+
+    def test_are_those_of_the_programs(self):
+        self.assertEqual(
+            self.named("vlmail pack list FILE", "vlmail pack list|verify [--json] FILE...", "vlmail send -o X", "vlmail --version", "vlmail pack"), (0, ""))
+
+    def test_that_there_are_not_are_told_with_their_page(self):
+        self.assertEqual(
+            self.named("vlmail pac list", "vlmail pack list|look", "vlserviced send --jsn FILE", "vlmail --json"),
+            (1, "`vlmail pac list`: no command pac\n`vlmail pack list|look`: no command look\n"
+                "`vlserviced send --jsn FILE`: no option --jsn\n`vlmail --json`: no option --json\n"))
+
+
 class Marks(MadePage):
     def test_are_wanted_of_whatever_shows_commands(self):
         for lines in [["vlmail status"], ["$ ls"], ["# apt install x"], ["sudo systemctl start vlserviced"], ["  scripts/test asan"]]:
