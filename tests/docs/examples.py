@@ -44,6 +44,7 @@ VARYING = [
     ("address", r"\b127\.0\.0\.1:\d+", True),
     ("secret", r"\b[0-9a-f]{64}\b", True),
     ("time", r"\b\d{4}[/-]\d\d[/-]\d\d[ T]\d\d:\d\d(?::\d\d)?Z?", False),
+    ("process", r"\(process \d+\)", False),
     ("free space", r"\b\d+ MiB\b", False),
 ]
 FORMS = re.compile("|".join("(%s)" % form for _, form, _ in VARYING))
@@ -333,13 +334,13 @@ def run(sources, programs, page, setup=None):
 
 
 class Tree:
-    """The commands of a program, as its --help tells them."""
+    """The commands of a program, as its --help tells them. What is above a command may have its options behind it, too."""
 
-    def __init__(self, program):
+    def __init__(self, program, above=frozenset()):
         said = subprocess.run([*program, "--help"], capture_output=True, text=True, check=True).stdout
         below = re.findall(r"^  ([a-z]\S*) {2,}", said.partition("Subcommands:\n")[2], re.MULTILINE)
-        self.options = set(re.findall(r"(?<![\w-])-{1,2}[a-z][\w-]*", said))
-        self.commands = {name: Tree([*program, name]) for name in below}
+        self.options = above | set(re.findall(r"(?<![\w-])-{1,2}[a-z][\w-]*", said))
+        self.commands = {name: Tree([*program, name], self.options) for name in below}
 
     def faults_of(self, words):
         """What is not there of "settings show|set NODE [--origin]"."""
