@@ -3,8 +3,10 @@
 #include "programs/base/json_schema.h"
 #include "programs/base/millimetres.h"
 #include "programs/base/quoting.h"
+#include "programs/mailing/fallback.h"
 #include "programs/mailing/print_wishes.h"
 #include "programs/patterns/pattern.h"
+#include "programs/protocol/carrier.h"
 
 #include <algorithm>
 #include <array>
@@ -28,7 +30,9 @@ constexpr char const* ADDRESS_LINES = "address_lines";
 constexpr char const* POSTCODE = "postcode";
 constexpr char const* REPAIR = "repair";
 constexpr char const* COPIES = PrintWishes::COPIES;
-constexpr std::array KEYS{SHEET, WINDOW, CLEAR_ZONES, TOLERANCE, ADDRESS_LINES, POSTCODE, REPAIR, COPIES};
+constexpr char const* FALLBACK = Mailing::FALLBACK;
+constexpr std::array KEYS{SHEET,    WINDOW, CLEAR_ZONES, TOLERANCE, ADDRESS_LINES,
+                          POSTCODE, REPAIR, COPIES,      FALLBACK};
 
 constexpr char const* WIDTH = PrintWishes::WIDTH;
 constexpr char const* HEIGHT = PrintWishes::HEIGHT;
@@ -46,6 +50,7 @@ constexpr char const* MAX = "max";
 constexpr std::array LINES_KEYS{MIN, MAX};
 
 constexpr char const* COVER_PAGE = "cover-page";
+constexpr char const* FALLBACK_ADVICE = "write names of channels such as [\"email\", \"postal\"]";
 
 Path below(Path path, std::string key) {
     path.push_back(std::move(key));
@@ -80,6 +85,7 @@ public:
         // A printer is told; here nothing depends on it.
         if (json::Value const copies = object.get(COPIES))
             number(copies, {COPIES}, 1, PrintWishes::MAX_COPIES);
+        checkFallback(object.get(FALLBACK));
         return rules;
     }
 
@@ -240,6 +246,19 @@ private:
         }
     }
 
+    /// The service acts on it.
+    void checkFallback(json::Value const& fallback) {
+        if (!fallback)
+            return;
+        if (!fallback.isArray() || fallback.toArray().size() > Mailing::MAX_FALLBACKS)
+            return fault({FALLBACK},
+                         "is no list of at most " + std::to_string(Mailing::MAX_FALLBACKS) + " channels",
+                         FALLBACK_ADVICE);
+        for (std::size_t i = 0; i < fallback.toArray().size(); ++i)
+            if (!Protocol::isChannelName(fallback.toArray().at(i).textOrEmpty()))
+                fault({FALLBACK, std::to_string(i)}, "is no name of a channel", FALLBACK_ADVICE);
+    }
+
     Faults& faults_;
     PageSize sheet_ = A4_SHEET;
 };
@@ -291,6 +310,7 @@ json::Object ProductionRules::schema() {
         .add(POSTCODE, Schema::with(Schema::text(), "minLength", 1))
         .add(REPAIR, repair)
         .add(COPIES, Schema::with(Schema::integer(1, PrintWishes::MAX_COPIES), "default", 1))
+        .add(FALLBACK, Schema::listOfAtMost(Protocol::channelNameSchema(), Mailing::MAX_FALLBACKS))
         .schema();
 }
 

@@ -312,11 +312,6 @@ void requireKeys(json::Object const& object, TypeRow const& row) {
                           "none");
 }
 
-bool isChannel(std::string const& name) {
-    return !name.empty() && name.size() <= MAX_CHANNEL_BYTES && name.front() >= 'a' && name.front() <= 'z' &&
-           std::ranges::all_of(name, [](char c) { return (c >= 'a' && c <= 'z') || isDigit(c) || c == '_'; });
-}
-
 /// With the rules that hold between keys, as requireKeys() and the constructor test them.
 json::Object schemaOf(TypeRow const& row) {
     Schema::Members members(Schema::Members::Others::Refused);
@@ -332,7 +327,7 @@ json::Object schemaOf(TypeRow const& row) {
 }
 
 CarrierSettings carrierIn(std::string const& channel, json::Value const& value) {
-    if (!isChannel(channel))
+    if (!isChannelName(channel))
         throw Base::Error("\"carriers\" has " + Base::inQuotes(Base::oneLine(channel)) +
                           ", which is no name of an address such as postal, email, fax or sms");
     if (!value.isObject())
@@ -394,6 +389,15 @@ CarrierSettings::CarrierSettings(json::Object const& object) {
 
 std::optional<DayWindow> CarrierSettings::window() const { return windowIn(hours); }
 
+bool isChannelName(std::string const& name) {
+    return !name.empty() && name.size() <= MAX_CHANNEL_BYTES && name.front() >= 'a' && name.front() <= 'z' &&
+           std::ranges::all_of(name, [](char c) { return (c >= 'a' && c <= 'z') || isDigit(c) || c == '_'; });
+}
+
+json::Object channelNameSchema() {
+    return Schema::textLike("^[a-z][a-z0-9_]{0," + std::to_string(MAX_CHANNEL_BYTES - 1) + "}$");
+}
+
 bool sendsNotices(Carriers const& carriers) {
     auto const found = carriers.find(NOTICE_CHANNEL);
     return found != carriers.end() && found->second.type == CarrierType::Smtp;
@@ -417,8 +421,7 @@ std::vector<CarrierSchema> carrierSchemas() {
 
 json::Object carriersSchema(json::Object const& carrier) {
     json::Object schema = Schema::mapOf(carrier);
-    schema.set("propertyNames",
-               Schema::textLike("^[a-z][a-z0-9_]{0," + std::to_string(MAX_CHANNEL_BYTES - 1) + "}$"));
+    schema.set("propertyNames", channelNameSchema());
     schema.set("maxProperties", MAX_CHANNELS);
     return schema;
 }

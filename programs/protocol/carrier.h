@@ -117,6 +117,10 @@ struct CarrierSettings {
 /// By the channel's name.
 using Carriers = std::map<std::string, CarrierSettings>;
 
+/// Whether a carrier may be of a channel of that name: lower case letters, digits and "_", a letter in front.
+bool isChannelName(std::string const& name);
+json::Object channelNameSchema();
+
 /// The channel by whose carrier people are told of mailings, when it sends e-mails.
 inline constexpr char const* NOTICE_CHANNEL = "email";
 /// Whether there is such a carrier.

@@ -45,6 +45,7 @@ struct LetterReport::Keys {
         Always{"number", &LetterReport::number},   Always{"key", &LetterReport::key},
         Always{"channel", &LetterReport::channel}, StateKey{"state"},
         Always{"says", &LetterReport::says},       Always{"changed", &LetterReport::changed},
+        json::Key{"tried", &LetterReport::tried},
     };
 };
 

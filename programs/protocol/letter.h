@@ -44,13 +44,15 @@ struct LetterReport {
     long long number = 0;
     /// The same at every attempt.
     std::string key;
-    /// The name of the address that counts.
+    /// The name of the address that counts, or of the one that it falls back to.
     std::string channel;
     LetterState state = LetterState::Waiting;
     /// What the other side has said, or what keeps the letter where it is; one line.
     std::string says;
     /// Seconds since the epoch.
     long long changed = 0;
+    /// Channels that it failed by before, in their order.
+    std::vector<std::string> tried;
 
     LetterReport() = default;
     /// Throws Error on a state that is not known.

@@ -49,7 +49,7 @@ TEST(CarriersRules, AreReadKeyByKey) {
         "clear_zones": [{"left": 0, "top": 27000, "right": 21590, "bottom": 27940, "pages": "all"},
                         {"left": 15000, "top": 0, "right": 21590, "bottom": 4000}],
         "tolerance": 50, "address_lines": {"min": 3, "max": 6}, "postcode": "\\d{5}",
-        "repair": ["cover-page"]})"_json);
+        "repair": ["cover-page"], "fallback": ["email", "postal"]})"_json);
     EXPECT_THAT(faults, IsEmpty());
     EXPECT_EQ(rules.sheet, Production::LETTER_SHEET);
     EXPECT_EQ(rules.window, (Box{2000, 4500, 10500, 9000}));
@@ -67,11 +67,12 @@ TEST(CarriersRules, AreReadKeyByKey) {
 TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
     std::string const area = "write \"left\" less than \"right\", and \"top\" less than \"bottom\"";
     std::string const integer = "write one; lengths are in 1/100 mm";
+    std::string const channels = "write names of channels such as [\"email\", \"postal\"]";
     std::pair<json::Value, std::string> const table[] = {
         {json::Value("a"), R"("production" is no object; write an object such as {"window": {...}})"},
         {R"({"windows": 1})"_json,
          R"("production/windows" "windows" is no key here; write one of "sheet", "window", "clear_zones", )"
-         R"("tolerance", "address_lines", "postcode", "repair", "copies")"},
+         R"("tolerance", "address_lines", "postcode", "repair", "copies", "fallback")"},
         {R"({"sheet": {"width": 21000}})"_json, "\"production/sheet/height\" is missing; " + integer},
         {R"({"sheet": {"width": 0, "height": 99999999999}})"_json,
          "\"production/sheet/width\" is no integer from 1 to 200000; " + integer +
@@ -107,6 +108,11 @@ TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
         {R"({"postcode": ""})"_json,
          R"("production/postcode" is no pattern; write a pattern such as "\\b\\d{5}\\b")"},
         {R"({"copies": 100})"_json, "\"production/copies\" is no integer from 1 to 99; " + integer},
+        {R"({"fallback": "postal"})"_json,
+         "\"production/fallback\" is no list of at most 16 channels; " + channels},
+        {R"({"fallback": ["email", "By Post", 7]})"_json,
+         "\"production/fallback/1\" is no name of a channel; " + channels +
+             "\n\"production/fallback/2\" is no name of a channel; " + channels},
         {R"({"repair": "cover-page"})"_json, R"("production/repair" is no list; write ["cover-page"])"},
         {R"({"repair": ["paint"]})"_json,
          R"("production/repair/0" is no repair that is known; write "cover-page")"},

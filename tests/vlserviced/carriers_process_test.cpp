@@ -438,6 +438,48 @@ private:
     VLServiceTest::SmtpServer server_;
 };
 
+/// That a server of e-mail refuses, so that a program gets them.
+class LettersThatFellBack : public CountedLetters {
+public:
+    LettersThatFellBack()
+        : CountedLetters("email", mailing()),
+          server_(folder_ / "mails", parse(R"({"replies":{"RCPT":"550 no"}})")) {
+        std::ofstream(program_) << "#!/bin/sh\necho $1 >>'" + (folder_ / "had").string() + "'\n";
+        fs::permissions(program_, fs::perms::owner_all);
+    }
+
+    std::string missing() const { return server_.missing(); }
+
+private:
+    static Mailing::Metadata mailing() {
+        Mailing::Metadata mailing =
+            lettersOf("s1", {"email", "email", "email", "email"}, R"("production": {"fallback": ["sms"]}, )");
+        for (Mailing::MailedLetter& letter : mailing.letters)
+            addField(letter, "sms", "+49 341 1", 1);
+        return mailing;
+    }
+    json::Object carrier() const override {
+        return {{"type", "smtp"},     {"url", server_.url()},      {"from", "bills@acme.example"},
+                {"subject", "{key}"}, {"to", "{key}@example.com"}, {"starttls", false}};
+    }
+    json::Object carriers() const override {
+        return {{"email", carrier()},
+                {"sms", json::Object{{"type", "command"},
+                                     {"program", program_.string()},
+                                     {"arguments", parse(R"({"all":["{key}"]})").get("all")}}}};
+    }
+    std::map<std::string, int> times() const override {
+        std::map<std::string, int> times;
+        std::istringstream had(textOf(folder_ / "had"));
+        for (std::string key; had >> key;)
+            ++times[key];
+        return times;
+    }
+
+    fs::path program_ = folder_ / "program";
+    VLServiceTest::SmtpServer server_;
+};
+
 /// By a printer.
 class PrintedLetters : public CountedLetters {
 public:
@@ -550,6 +592,17 @@ TEST_P(ServiceThatIsKilledAtEachCall, MailsNoneTwiceAndTellsOfOneAsUncertainAtMo
     int call = GetParam();
     for (bool isKilled = true; isKilled && !HasFailure(); call += 4) {
         MailedLetters letters;
+        if (!letters.missing().empty())
+            GTEST_SKIP() << letters.missing();
+        isKilled = letters.killedAt(call);
+    }
+    EXPECT_GT(call, 40);
+}
+
+TEST_P(ServiceThatIsKilledAtEachCall, GivesThoseThatAreRefusedToTheNextChannelOnce) {
+    int call = GetParam();
+    for (bool isKilled = true; isKilled && !HasFailure(); call += 4) {
+        LettersThatFellBack letters;
         if (!letters.missing().empty())
             GTEST_SKIP() << letters.missing();
         isKilled = letters.killedAt(call);

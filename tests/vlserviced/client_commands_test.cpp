@@ -807,6 +807,25 @@ TEST_F(MailingsOfANode, ArePlannedWithTheChannelOfEachLetterAndItsPrice) {
         testing::ContainsRegex("\nletter +channel  pages  sheets\n" + name + " +postal       1       1\n"));
 }
 
+TEST_F(MailingsOfANode, ArePlannedWithThePricesOfAllWaysThatALetterMayFallBackTo) {
+    output({"settings", "set", "a=acme", "presets",
+            write("presets.json",
+                  R"({"extract_presets": [{"match": ".*", "pack_preset": "Bills", "zones": [)"
+                  R"({"name": "Page", "location": {"left": 0, "top": 0, "right": 21000, "bottom": 29700}, )"
+                  R"("fields": [{"name": "postal", "value_extract": "^To: (?<VAL>.*)$", "priority": 2, )"
+                  R"("send_to_server": true}, {"name": "email", "value_extract": "^Mail: (?<VAL>.*)$", )"
+                  R"("priority": 1, "send_to_server": true}]}]}], "pack_presets": [{"name": "Bills", )"
+                  R"("title": "Bills", "production": {"fallback": ["fax", "email"]}}]})")});
+    output({"settings", "service",
+            R"(tariff={"currency":"EUR","letter":85,"channels":{"email":{"letter":5}}})"});
+    std::string const letter = write("b.txt", "To: Ada\nMail: ada@example.org\n");
+    std::string const plan = (folder_ / "plan.json").string();
+    EXPECT_THAT(output({"plan", letter, "--node", "u=bob/a=acme", "-o", plan, "--price"}),
+                testing::ContainsRegex("\nb.txt +postal, else email +1 +1  0.85, else 0.05\n"));
+    EXPECT_THAT(output({"plan", letter, "--node", "u=bob/a=acme", "-o", plan, "--price", "--json"}),
+                HasSubstr(R"("channel":"postal","price":85,"fallback":[{"channel":"email","price":5}])"));
+}
+
 TEST_F(MailingsOfANode, TellTheirSenderOnceTheyAreHandedOver) {
     setPackPreset(
         R"("process_mode": 3, "confirmation_email": true, "customer_email": "office@acme.example")");

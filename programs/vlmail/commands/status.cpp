@@ -46,6 +46,14 @@ void print(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
         table.print(out);
 }
 
+/// By which channels it failed before, and what its carrier says.
+std::string noteOn(Protocol::LetterReport const& letter) {
+    std::string note;
+    for (std::string const& channel : letter.tried)
+        note += (note.empty() ? "behind " : ", ") + channel;
+    return note + (note.empty() || letter.says.empty() ? "" : "; ") + letter.says;
+}
+
 /// Of jobs whose letters go by carriers, or some of them do.
 void printLetters(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
     TextTable table(
@@ -54,7 +62,7 @@ void printLetters(std::ostream& out, std::vector<Protocol::JobReport> const& job
         for (Protocol::LetterReport const& letter : job.letters)
             table.addRow({job.id, std::to_string(letter.number), letter.channel,
                           Protocol::letterStateName(letter.state), LocalTime::toText(letter.changed),
-                          letter.says});
+                          noteOn(letter)});
     if (table.empty())
         return;
     out << '\n';

@@ -3,6 +3,7 @@
 #include "programs/base/error.h"
 #include "programs/base/json_rows.h"
 #include "programs/base/quoting.h"
+#include "programs/mailing/fallback.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/terminal/text_table.h"
@@ -57,6 +58,15 @@ std::string listed(std::vector<std::string> const& names) {
         return {};
     return names.size() == 1 ? names.front()
                              : names.front() + " and " + std::to_string(names.size() - 1) + " more";
+}
+
+/// The channels that a letter falls back to, in their order.
+std::vector<std::string> fallbackOf(Mailing::MailedLetter const& letter, Mailing::Metadata const& mailing) {
+    std::vector<std::string> channels;
+    for (Mailing::OtherWay const& way : Mailing::otherWaysOf(letter, mailing.packPreset))
+        if (way.hasAddress)
+            channels.push_back(way.channel);
+    return channels;
 }
 
 /// A document whose name a container cannot hold would fail all of its mailing in the end.
@@ -235,6 +245,22 @@ struct Dispatch::Rows {
     template<typename Element>
     static json::Array listOf(std::vector<Element> const& all, std::span<Base::JsonRow<Element> const> rows);
 
+    static json::Value priceBy(OfLetter const& of, std::string const& channel) {
+        auto const price = of.of.dispatch.priceOf(of.of.mailing, of.letter, channel);
+        return price ? json::Value(*price) : json::Value();
+    }
+    struct OfFallback {
+        OfLetter const& of;
+        std::string const& channel;
+    };
+    static json::Value fallbackOf(OfLetter const& of);
+
+    static constexpr Base::JsonRow<OfFallback> FALLBACK[] = {
+        {"channel", Presence::Always, &Schema::text,
+         [](OfFallback const& each) -> json::Value { return each.channel; }},
+        {"price", Presence::WhenThere, &count,
+         [](OfFallback const& each) { return priceBy(each.of, each.channel); }},
+    };
     static constexpr Base::JsonRow<OfLetter> WAY[] = {
         {"documents", Presence::Always, [] { return Schema::listOf(Schema::text()); },
          [](OfLetter const& of) { return textsOf(documentsOf(of.letter)); }},
@@ -245,10 +271,9 @@ struct Dispatch::Rows {
         {"channel", Presence::Always, &Schema::text,
          [](OfLetter const& of) -> json::Value { return Mailing::channelOf(of.letter); }},
         {"price", Presence::WhenThere, &count,
-         [](OfLetter const& of) {
-             auto const price = of.of.dispatch.priceOf(of.of.mailing, of.letter);
-             return price ? json::Value(*price) : json::Value();
-         }},
+         [](OfLetter const& of) { return priceBy(of, Mailing::channelOf(of.letter)); }},
+        {"fallback", Presence::WhenThere, [] { return Schema::listOf(Base::schemaOf<OfFallback>(FALLBACK)); },
+         &fallbackOf},
     };
     static constexpr Base::JsonRow<OfMailing> MAILING[] = {
         {"pack_preset", Presence::Always, &Schema::text,
@@ -331,6 +356,16 @@ json::Array Dispatch::Rows::listOf(std::vector<Element> const& all,
     return array;
 }
 
+json::Value Dispatch::Rows::fallbackOf(OfLetter const& of) {
+    json::Array ways;
+    for (std::string const& channel : VlMail::fallbackOf(of.letter, of.of.metadata())) {
+        json::Object way;
+        Base::writeRows<OfFallback>(FALLBACK, {of, channel}, way);
+        ways.append(way);
+    }
+    return ways.empty() ? json::Value() : json::Value(ways);
+}
+
 json::Value Dispatch::Rows::waysOf(OfMailing const& of) {
     json::Array ways;
     for (Mailing::MailedLetter const& letter : of.metadata().letters) {
@@ -360,9 +395,25 @@ json::Object Dispatch::toJson() const {
 json::Object Dispatch::schema() { return Base::schemaOf<Dispatch>(Rows::OUTCOME); }
 
 std::optional<long long> Dispatch::priceOf(OutgoingMailing const& mailing,
-                                           Mailing::MailedLetter const& letter) const {
+                                           Mailing::MailedLetter const& letter,
+                                           std::string const& channel) const {
     auto const price = prices_.find(&mailing);
-    return price == prices_.end() ? std::nullopt : price->second.of(letter);
+    return price == prices_.end() ? std::nullopt : price->second.of(letter, channel);
+}
+
+std::vector<std::string> Dispatch::wayInWords(OutgoingMailing& mailing,
+                                              Mailing::MailedLetter const& letter) const {
+    std::string channels = Mailing::channelOf(letter);
+    std::string prices = moneyOrNothing(priceOf(mailing, letter, channels));
+    for (std::string const& channel : fallbackOf(letter, mailing.builder().metadata())) {
+        channels += ", else " + channel;
+        prices += ", else " + moneyOrNothing(priceOf(mailing, letter, channel));
+    }
+    std::vector<std::string> row{listed(documentsOf(letter)), channels, std::to_string(printedPages(letter)),
+                                 std::to_string(letter.sheets)};
+    if (!prices_.empty())
+        row.push_back(prices);
+    return row;
 }
 
 void Dispatch::printWays() const {
@@ -372,13 +423,8 @@ void Dispatch::printWays() const {
         columns.push_back({"price", RIGHT});
     TextTable table(columns);
     for (OutgoingMailing* const mailing : arrived_)
-        for (Mailing::MailedLetter const& letter : mailing->builder().metadata().letters) {
-            std::vector<std::string> row{listed(documentsOf(letter)), Mailing::channelOf(letter),
-                                         std::to_string(printedPages(letter)), std::to_string(letter.sheets)};
-            if (!prices_.empty())
-                row.push_back(moneyOrNothing(priceOf(*mailing, letter)));
-            table.addRow(row);
-        }
+        for (Mailing::MailedLetter const& letter : mailing->builder().metadata().letters)
+            table.addRow(wayInWords(*mailing, letter));
     if (table.empty())
         return;
     terminal_.out << '\n';

@@ -68,8 +68,9 @@ private:
     void fail(std::string const& name, std::string const& reason);
     json::Array mailingsToJson() const;
     void printWays() const;
-    std::optional<long long> priceOf(OutgoingMailing const& mailing,
-                                     Mailing::MailedLetter const& letter) const;
+    std::vector<std::string> wayInWords(OutgoingMailing& mailing, Mailing::MailedLetter const& letter) const;
+    std::optional<long long> priceOf(OutgoingMailing const& mailing, Mailing::MailedLetter const& letter,
+                                     std::string const& channel) const;
 
     struct Rows;
 

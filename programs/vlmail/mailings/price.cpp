@@ -1,5 +1,6 @@
 #include "programs/vlmail/mailings/price.h"
 
+#include "programs/mailing/fallback.h"
 #include "programs/mailing/print_wishes.h"
 #include "programs/protocol/failure.h"
 #include "programs/vlmail/service/service_client.h"
@@ -11,8 +12,8 @@
 namespace VlMail {
 namespace {
 
-Alike alikeOf(Mailing::MailedLetter const& letter) {
-    return {Mailing::channelOf(letter), printedPages(letter), letter.sheets, letter.colouredPages};
+Alike alikeOf(Mailing::MailedLetter const& letter, std::string const& channel) {
+    return {channel, printedPages(letter), letter.sheets, letter.colouredPages};
 }
 
 constexpr char const* KNOWS_NO_CHANNELS = "the letters have no key \"channel\"";
@@ -29,7 +30,16 @@ void setColour(Protocol::LetterBatch& batch, long long colouredPages, Mailing::M
 std::map<Alike, long long> lettersByKind(Mailing::Metadata const& mailing) {
     std::map<Alike, long long> letters;
     for (Mailing::MailedLetter const& letter : mailing.letters)
-        ++letters[alikeOf(letter)];
+        ++letters[alikeOf(letter, Mailing::channelOf(letter))];
+    return letters;
+}
+
+/// The same by the channels that they may fall back to.
+std::map<Alike, long long> fallenBackByKind(Mailing::Metadata const& mailing) {
+    std::map<Alike, long long> letters;
+    for (Mailing::MailedLetter const& letter : mailing.letters)
+        for (Mailing::OtherWay const& way : Mailing::otherWaysOf(letter, mailing.packPreset))
+            ++letters[alikeOf(letter, way.channel)];
     return letters;
 }
 
@@ -47,6 +57,14 @@ Protocol::LetterBatch batchOf(Alike const& alike, long long count, Mailing::Meta
     return batch;
 }
 
+std::vector<Protocol::LetterBatch> batchesOf(std::map<Alike, long long> const& letters,
+                                             Mailing::Metadata const& mailing) {
+    std::vector<Protocol::LetterBatch> batches;
+    for (auto const& [alike, count] : letters)
+        batches.push_back(batchOf(alike, count, mailing));
+    return batches;
+}
+
 } // namespace
 
 long long printedPages(Mailing::MailedLetter const& letter) {
@@ -58,10 +76,7 @@ long long printedPages(Mailing::MailedLetter const& letter) {
 }
 
 std::vector<Protocol::LetterBatch> pricedLettersOf(Mailing::Metadata const& mailing) {
-    std::vector<Protocol::LetterBatch> batches;
-    for (auto const& [alike, count] : lettersByKind(mailing))
-        batches.push_back(batchOf(alike, count, mailing));
-    return batches;
+    return batchesOf(lettersByKind(mailing), mailing);
 }
 
 json::Object estimatePrice(Channel::Client& service, std::vector<Protocol::LetterBatch> const& letters) {
@@ -81,15 +96,23 @@ json::Object estimatePrice(AskPrice const& ask, std::vector<Protocol::LetterBatc
 
 MailingPrice::MailingPrice(Channel::Client& service, Mailing::Metadata const& mailing)
     : answer_(estimatePrice(service, pricedLettersOf(mailing))) {
-    Protocol::Estimate const estimate(answer_);
+    add(lettersByKind(mailing), answer_);
+    auto const fallenBack = fallenBackByKind(mailing);
+    if (!fallenBack.empty())
+        add(fallenBack, estimatePrice(service, batchesOf(fallenBack, mailing)));
+}
+
+void MailingPrice::add(std::map<Alike, long long> const& letters, json::Object const& answer) {
+    Protocol::Estimate const estimate(answer);
     std::size_t batch = 0;
-    for (auto const& [alike, count] : lettersByKind(mailing))
+    for (auto const& [alike, count] : letters)
         if (batch < estimate.letters.size())
             each_[alike] = estimate.letters[batch++].price / count;
 }
 
-std::optional<long long> MailingPrice::of(Mailing::MailedLetter const& letter) const {
-    auto const found = each_.find(alikeOf(letter));
+std::optional<long long> MailingPrice::of(Mailing::MailedLetter const& letter,
+                                          std::string const& channel) const {
+    auto const found = each_.find(alikeOf(letter, channel));
     return found == each_.end() ? std::nullopt : std::optional(found->second);
 }
 

@@ -40,10 +40,13 @@ public:
 
     /// As the service has answered it.
     json::Object const& answer() const { return answer_; }
-    /// Of a letter of the mailing, in hundredths; nothing where the service did not tell it.
-    std::optional<long long> of(Mailing::MailedLetter const& letter) const;
+    /// Of a letter of the mailing that goes by that channel, its first or one that it may fall back to, in
+    /// hundredths; nothing where the service did not tell it.
+    std::optional<long long> of(Mailing::MailedLetter const& letter, std::string const& channel) const;
 
 private:
+    void add(std::map<Alike, long long> const& letters, json::Object const& answer);
+
     json::Object answer_;
     /// Of one letter each, by what those have in common that cost the same.
     std::map<Alike, long long> each_;

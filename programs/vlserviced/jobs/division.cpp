@@ -11,6 +11,12 @@
 namespace VlServiced {
 namespace {
 
+/// What becomes of a letter in the container its carrier there has to say.
+std::vector<Mailing::OtherWay> otherWaysBy(Mailing::MailedLetter const& letter,
+                                           Mailing::Metadata const& mailing, bool byCarrier) {
+    return byCarrier ? Mailing::otherWaysOf(letter, mailing.packPreset) : std::vector<Mailing::OtherWay>();
+}
+
 /// What stays in the container.
 struct Rest {
     std::vector<std::size_t> letters;
@@ -53,7 +59,7 @@ Division divide(std::filesystem::path const& container, std::filesystem::path co
         auto const number = static_cast<long long>(i) + 1;
         std::string const channel = Mailing::channelOf(letter);
         bool const byCarrier = hasCarrier(channel);
-        division.letters.push_back({number, channel, byCarrier});
+        division.letters.push_back({number, channel, byCarrier, otherWaysBy(letter, whole, byCarrier)});
         if (!byCarrier)
             others.add(i, mailing.entriesOf(letter));
         if (notifying == Notifying::Yes)

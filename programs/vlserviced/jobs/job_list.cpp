@@ -114,6 +114,7 @@ Protocol::LetterReport reportOf(StoredLetter const& letter, Job const& job) {
     report.state = letter.byCarrier ? letter.state : stateInContainer(job.state);
     report.says = letter.byCarrier ? letter.says : "in the mailing's container";
     report.changed = letter.byCarrier ? letter.changedAt : job.changedAt;
+    report.tried = letter.tried;
     return report;
 }
 

@@ -27,6 +27,12 @@ constexpr char const* ENDED_MEANWHILE = "the service was ended while it was hand
 
 bool isFailing(CarrierRecord const& record) { return record.failures >= MANY_FAILURES; }
 
+/// Whether it is handed over without others of its mailing. Those that fell back come behind the others,
+/// whose file stays as it is.
+bool isAlone(StoredLetter const& letter, Protocol::CarrierSettings const& settings) {
+    return settings.unitOfFiles() == CarrierUnit::Letter || letter.id.isNotice() || !letter.tried.empty();
+}
+
 std::string lettersInWords(long long count) {
     return std::to_string(count) + (count == 1 ? " letter" : " letters");
 }
@@ -224,7 +230,7 @@ std::vector<StoredLetter> LetterRunner::next(std::string const& name, Channel co
     std::optional<StoredLetter> const first = firstToGo(name, channel, now);
     if (!first)
         return {};
-    if (channel.settings.unitOfFiles() == CarrierUnit::Letter || first->id.isNotice())
+    if (isAlone(*first, channel.settings))
         return {*first};
     std::vector<StoredLetter> together = letters_.toGoTogether(first->id.packId, name, now);
     std::erase_if(together, [&](StoredLetter const& one) { return channel.inHand.contains(one.id); });
@@ -338,8 +344,15 @@ void LetterRunner::recordOutcome(HandOver const& handOver) {
     Outcome const& outcome = handOver.outcome;
     if (outcome.kind == Outcome::Kind::Failed)
         return postpone(handOver);
+    if (outcome.kind == Outcome::Kind::Refused) {
+        jobs_.together([&] {
+            for (StoredLetter const& letter : handOver.letters)
+                fail(handOver, letter, outcome.says);
+        });
+        return;
+    }
     finish(handOver.channel, handOver.ids(), stateBehind(outcome.kind), outcome.says, handOver.are);
-    if (!handOver.settings.canBeAsked() || outcome.kind == Outcome::Kind::Refused)
+    if (!handOver.settings.canBeAsked())
         return;
     Channel& channel = channels_.at(handOver.channel);
     if (channel.askable.empty())
@@ -359,10 +372,8 @@ void LetterRunner::postpone(HandOver const& handOver) {
     std::string const& says = handOver.outcome.says;
     for (StoredLetter const& letter : handOver.letters) {
         if (isGivenUp(letter.firstTry, now, handOver.settings))
-            finish(handOver.channel, {letter.id}, LetterState::Failed,
-                   Base::oneLine("given up after " + std::to_string(handOver.settings.giveUpHours) +
-                                 " hours: " + says),
-                   handOver.are);
+            fail(handOver, letter,
+                 "given up after " + std::to_string(handOver.settings.giveUpHours) + " hours: " + says);
         else
             letters_.postpone({letter.id}, says, now + pauseBehind(letter.attempts + 1, handOver.settings),
                               now, handOver.are);
@@ -373,11 +384,27 @@ void LetterRunner::postpone(HandOver const& handOver) {
                           now + pauseBehind(first.attempts + 1, handOver.settings));
 }
 
+void LetterRunner::fail(HandOver const& handOver, StoredLetter const& letter, std::string const& says) {
+    Protocol::Carriers const carriers = surroundings_.settings().carriers();
+    std::vector<Mailing::OtherWay> left = letter.otherWays;
+    std::string why = says;
+    while (!left.empty()) {
+        Mailing::OtherWay const next = left.front();
+        left.erase(left.begin());
+        if (next.hasAddress && carriers.contains(next.channel)) {
+            letters_.fallBack(letter.id, next.channel, left, Base::oneLine(handOver.channel + ": " + why),
+                              surroundings_.now(), handOver.are);
+            return surroundings_.became(handOver.channel, LetterState::Failed, 1);
+        }
+        why += next.hasAddress ? "; there is no carrier of " + next.channel
+                               : "; the letter has no address " + next.channel;
+    }
+    finish(handOver.channel, {letter.id}, LetterState::Failed, Base::oneLine(why), handOver.are);
+}
+
 std::string LetterRunner::keyOf(StoredLetter const& letter, std::string const& channel,
                                 Protocol::CarrierSettings const& settings) {
-    return settings.unitOfFiles() == CarrierUnit::Letter || letter.id.isNotice()
-               ? letter.id.key()
-               : letter.id.packId + '-' + channel;
+    return isAlone(letter, settings) ? letter.id.key() : letter.id.packId + '-' + channel;
 }
 
 /// What is on record of an earlier process; a printer forgets jobs sooner than that.

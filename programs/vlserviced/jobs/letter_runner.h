@@ -163,6 +163,8 @@ private:
     void finish(std::string const& channel, std::vector<LetterId> const& letters, LetterState state,
                 std::string const& says, LettersAre are = LettersAre::Anywhere);
     void postpone(HandOver const& handOver);
+    /// Has a letter go by the next channel that it can go by, or notes that it has failed.
+    void fail(HandOver const& handOver, StoredLetter const& letter, std::string const& says);
     void noteCarrier(HandOver const& handOver);
     static std::string keyOf(StoredLetter const& letter, std::string const& channel,
                              Protocol::CarrierSettings const& settings);

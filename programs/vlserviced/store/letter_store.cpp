@@ -4,6 +4,8 @@
 #include "programs/protocol/carrier.h"
 
 #include <charconv>
+#include <iterator>
+#include <sstream>
 #include <system_error>
 
 namespace VlServiced {
@@ -14,9 +16,28 @@ using Protocol::letterStateNamed;
 
 constexpr char const* SELECT_LETTERS =
     "SELECT pack, number, channel, by_carrier, state, says, changed_at, attempts, first_try, "
-    "due, notice_of, recipient, reply_to, reference FROM letters ";
+    "due, notice_of, recipient, reply_to, reference, other_ways, tried FROM letters ";
 /// As the index has it that holds those alone.
 constexpr char const* TO_GO = "state = 'waiting' AND by_carrier = 1 ";
+
+/// Names of channels have no blanks.
+std::vector<std::string> namesIn(std::string const& text) {
+    std::istringstream words(text);
+    return {std::istream_iterator<std::string>(words), {}};
+}
+
+/// A channel that the letter has no address of has "-" in front.
+Mailing::OtherWay wayIn(std::string const& text) {
+    bool const hasAddress = !text.starts_with('-');
+    return {hasAddress ? text : text.substr(1), hasAddress};
+}
+
+std::string textOf(std::vector<Mailing::OtherWay> const& ways) {
+    std::string text;
+    for (Mailing::OtherWay const& way : ways)
+        text += (text.empty() ? "" : " ") + std::string(way.hasAddress ? "" : "-") + way.channel;
+    return text;
+}
 
 StoredLetter letterIn(Database::Rows const& row) {
     StoredLetter letter;
@@ -30,6 +51,9 @@ StoredLetter letterIn(Database::Rows const& row) {
     letter.firstTry = row.number(8);
     letter.due = row.number(9);
     letter.notice = {row.number(10), row.text(11), row.text(12), row.text(13)};
+    for (std::string const& way : namesIn(row.text(14)))
+        letter.otherWays.push_back(wayIn(way));
+    letter.tried = namesIn(row.text(15));
     return letter;
 }
 
@@ -90,10 +114,10 @@ bool LetterStore::divide(JobKey const& job, std::vector<DividedLetter> const& le
     if (!jobs_.divide(job, shareOf(letters), now))
         return false;
     for (DividedLetter const& letter : letters)
-        database_.change("INSERT INTO letters (pack, number, channel, by_carrier, state, changed_at) "
-                         "VALUES ($1, $2, $3, $4, $5, $6)",
+        database_.change("INSERT INTO letters (pack, number, channel, by_carrier, state, changed_at, "
+                         "other_ways) VALUES ($1, $2, $3, $4, $5, $6, $7)",
                          job.packId, letter.number, letter.channel, letter.byCarrier,
-                         letterStateName(LetterState::Waiting), now);
+                         letterStateName(LetterState::Waiting), now, textOf(letter.otherWays));
     addNotices(job.packId, notices, now);
     transaction.commit();
     return true;
@@ -159,7 +183,8 @@ std::vector<StoredLetter> LetterStore::toGoTogether(std::string const& packId, s
                                                     long long now) const {
     return lettersIn(database_.query(
         SELECT_LETTERS + database_.by("letters_by_state") +
-            "WHERE pack = $1 AND channel = $2 AND due <= $3 AND number > 0 AND " + TO_GO + "ORDER BY number",
+            "WHERE pack = $1 AND channel = $2 AND due <= $3 AND number > 0 AND tried = '' AND " + TO_GO +
+            "ORDER BY number",
         packId, channel, now));
 }
 
@@ -291,6 +316,17 @@ void LetterStore::postpone(std::vector<LetterId> const& letters, std::string con
     transaction.commit();
 }
 
+void LetterStore::fallBack(LetterId const& letter, std::string const& channel,
+                           std::vector<Mailing::OtherWay> const& left, std::string const& says, long long now,
+                           LettersAre are) {
+    database_.change(
+        "UPDATE letters SET tried = CASE WHEN tried = '' THEN channel ELSE tried || ' ' || channel END, "
+        "channel = $1, other_ways = $2, state = 'waiting', says = $3, changed_at = $4, due = 0, "
+        "attempts = 0, first_try = 0 WHERE pack = $5 AND number = $6" +
+            conditionOf(are),
+        channel, textOf(left), says, now, letter.packId, letter.number);
+}
+
 void LetterStore::holdBack(std::string const& packId, std::string const& channel, long long due) {
     database_.change("UPDATE letters SET due = $1 WHERE pack = $2 AND channel = $3 AND due < $1 AND " +
                          std::string(TO_GO),
@@ -324,9 +360,15 @@ bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const&
 }
 
 long long LetterStore::doubtAll(std::string const& says, long long now) {
-    return database_.change("UPDATE letters SET state = 'uncertain', says = $1, changed_at = $2 WHERE "
-                            "by_carrier = 1 AND state IN ('waiting', 'handed over')",
-                            says, now);
+    Database::Transaction transaction(database_);
+    constexpr char const* DOUBTED =
+        "UPDATE letters SET state = 'uncertain', says = $1, changed_at = $2 WHERE "
+        "by_carrier = 1 AND state IN ('waiting', 'handed over', 'held') AND number ";
+    long long const letters = database_.change(std::string(DOUBTED) + "> 0", says, now);
+    // Those that are held may have gone meanwhile.
+    database_.change(std::string(DOUBTED) + "< 0", says, now);
+    transaction.commit();
+    return letters;
 }
 
 void LetterStore::doubt(std::string const& says, long long now) {

@@ -1,6 +1,7 @@
 #pragma once
 // Letters that were divided among the channels, and how their carriers are doing, as the database keeps them.
 
+#include "programs/mailing/fallback.h"
 #include "programs/protocol/letter.h"
 #include "programs/vlserviced/store/job_store.h"
 
@@ -38,6 +39,8 @@ struct DividedLetter {
     std::string channel;
     /// Otherwise it goes in the container.
     bool byCarrier = false;
+    /// By which it may go when that channel fails, in their order.
+    std::vector<Mailing::OtherWay> otherWays = {};
 };
 
 /// Who is told that something was handed over.
@@ -69,6 +72,10 @@ struct StoredLetter {
     long long due = 0;
     /// Where it is one.
     Notice notice = {};
+    /// That are left, in their order.
+    std::vector<Mailing::OtherWay> otherWays = {};
+    /// Channels that it failed by, in their order.
+    std::vector<std::string> tried = {};
 };
 
 /// How many letters of a job by channel, by whether they go by carriers, and by state.
@@ -159,6 +166,11 @@ public:
                   LettersAre are = LettersAre::Anywhere);
     /// Lets none of a job that waits for a channel go before that time.
     void holdBack(std::string const& packId, std::string const& channel, long long due);
+    /// Has a letter wait for the carrier of another channel, where it is so still: the one that it goes by
+    /// has failed, and of its other ways those are left.
+    void fallBack(LetterId const& letter, std::string const& channel,
+                  std::vector<Mailing::OtherWay> const& left, std::string const& says, long long now,
+                  LettersAre are = LettersAre::Anywhere);
     /// Moves a letter that goes by a carrier to another state; false, and no change, unless it is in one of
     /// `from`. One that waits again is due at once and its attempts count anew.
     bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,

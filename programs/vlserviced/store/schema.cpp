@@ -260,6 +260,19 @@ CREATE TRIGGER notice_released AFTER UPDATE OF state ON letters
 FOR EACH ROW WHEN (old.state = 'held' AND new.state = 'waiting') EXECUTE FUNCTION tell_of_letters();
 )sql";
 
+/// Channels that a letter may go by yet when the one that it goes by fails, and those that have failed;
+/// separated by blanks. One that it has no address of has "-" in front.
+constexpr char const* SCHEMA_11 = R"sql(
+ALTER TABLE letters ADD COLUMN other_ways TEXT NOT NULL DEFAULT '';
+ALTER TABLE letters ADD COLUMN tried TEXT NOT NULL DEFAULT '';
+)sql";
+
+/// Another service may have the carrier of the other channel.
+constexpr char const* POSTGRES_11 = R"sql(
+CREATE TRIGGER letter_fell_back AFTER UPDATE OF channel ON letters
+FOR EACH STATEMENT EXECUTE FUNCTION tell_of_letters();
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -274,7 +287,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               SCHEMA_7,
                                               SCHEMA_8,
                                               {SCHEMA_9, "", POSTGRES_9},
-                                              {SCHEMA_10, "", POSTGRES_10}}};
+                                              {SCHEMA_10, "", POSTGRES_10},
+                                              {SCHEMA_11, "", POSTGRES_11}}};
     return kind;
 }
 

@@ -883,4 +883,93 @@ TEST_F(Notices, AreFoundByReportsOfServersToo) {
     EXPECT_EQ(job("p1"), "lodged");
 }
 
+/// Letters by e-mail that may go by post, and by a channel that nobody has.
+class LettersThatFallBack : public LetterRunnerTest {
+protected:
+    LettersThatFallBack() {
+        setCarriers(
+            R"("email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": ""},
+               "postal": {"type": "folder", "folder": "/shop", "unit": "mailing", "give_up_hours": 1})");
+    }
+
+    static Mailing::Metadata mailing(std::vector<std::string> const& channels) {
+        Mailing::Metadata mailing = lettersOf(
+            "p1", channels,
+            R"("process_mode": 2, "production": {"fallback": ["email", "fax", "sms", "postal"]}, )");
+        for (Mailing::MailedLetter& letter : mailing.letters)
+            for (char const* const other : {"postal", "sms"})
+                if (channelOf(letter) != other)
+                    addField(letter, other, "the other way", 0 + (other[0] == 'p' ? 1 : 0));
+        return mailing;
+    }
+    std::vector<std::string> tried(long long number) { return report("p1").letters.at(number - 1).tried; }
+};
+
+TEST_F(LettersThatFallBack, GoByTheNextChannelThatTheyHaveAnAddressOfAndACarrierIsOf) {
+    other_.answers["p1-1"] = {Outcome::Kind::Refused, "550 no such user"};
+    send(mailing({"email", "email"}));
+    doOne();
+    EXPECT_EQ(report("p1").letters.at(0).channel, "postal");
+    EXPECT_EQ(
+        state("p1", 1),
+        "waiting: email: 550 no such user; the letter has no address fax; the letter has no address sms");
+    EXPECT_THAT(tried(1), ElementsAre("email"));
+    EXPECT_EQ(job("p1"), "delivering");
+    other_.answers.clear();
+    doWork();
+    EXPECT_THAT(other_.taken, UnorderedElementsAre("p1-1", "p1-2", "p1-1"))
+        << "under its own key, though the carrier takes mailings";
+    EXPECT_EQ(state("p1", 1), "accepted: thanks");
+    EXPECT_THAT(tried(1), ElementsAre("email"));
+    EXPECT_THAT(tried(2), IsEmpty());
+    EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LettersThatFallBack, HaveFailedWhenNoChannelIsLeft) {
+    other_.answer = Outcome{Outcome::Kind::Refused, "no"};
+    send(mailing({"email"}));
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-1"));
+    EXPECT_EQ(state("p1", 1), "failed: no");
+    EXPECT_THAT(tried(1), ElementsAre("email"));
+    EXPECT_EQ(job("p1"), "failed: 1 letter failed, letter 1: no");
+}
+
+TEST_F(LettersThatFallBack, GoOnWhenTheirCarrierGivesThemUpAndNotBefore) {
+    other_.answer = Outcome{Outcome::Kind::Failed, "no connection"};
+    send(mailing({"postal"}));
+    doWork();
+    EXPECT_EQ(report("p1").letters.at(0).channel, "postal");
+    now_ += 3600;
+    letterRunner_->proceed();
+    doWork();
+    EXPECT_EQ(state("p1", 1),
+              "failed: given up after 1 hours: no connection; the letter has no address email; "
+              "the letter has no address fax; the letter has no address sms");
+    EXPECT_THAT(tried(1), IsEmpty());
+}
+
+TEST_F(LettersThatFallBack, StayWhereTheyAreWhileTheyAreUncertainOrCameBack) {
+    other_.answers["p1-1"] = {Outcome::Kind::Uncertain, "cut"};
+    send(mailing({"email", "email"}));
+    doWork();
+    EXPECT_EQ(state("p1", 1), "uncertain: cut");
+    letterRunner_->note({"p1", 2}, Carriers::MailReport::Kind::Returned, "550 full");
+    EXPECT_EQ(decision(Protocol::LetterAction::SettleFailed, "p1", 1), "nothing was thrown");
+    doWork();
+    EXPECT_EQ(state("p1", 1), "failed: a person says so");
+    EXPECT_EQ(state("p1", 2), "returned: 550 full");
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1", "p1-2"));
+}
+
+TEST_F(LettersThatFallBack, PassAChannelOverWhoseCarrierIsGone) {
+    other_.answer = Outcome{Outcome::Kind::Refused, "no"};
+    send(mailing({"email"}));
+    setCarriers(
+        R"("email": {"type": "smtp", "url": "smtp://mail.example", "from": "a@b.example", "subject": ""})");
+    doWork();
+    EXPECT_THAT(state("p1", 1), testing::EndsWith("; there is no carrier of postal"));
+    EXPECT_THAT(other_.taken, ElementsAre("p1-1"));
+}
+
 } // namespace

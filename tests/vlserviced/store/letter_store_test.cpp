@@ -60,6 +60,29 @@ TEST_P(LetterStoreTest, RecordsLettersWithTheirJobOnce) {
     EXPECT_EQ(letters_.countOfJob("p1"), 2);
 }
 
+TEST_P(LetterStoreTest, HasALetterGoByAnotherChannelWithWhatItHasTried) {
+    queue("p1");
+    letters_.divide("p1", {{1, "email", true, {{"fax", false}, {"sms", true}, {"postal", true}}}}, 5);
+    EXPECT_THAT(letters_.find({"p1", 1})->otherWays,
+                ElementsAre(Mailing::OtherWay{"fax", false}, Mailing::OtherWay{"sms", true},
+                            Mailing::OtherWay{"postal", true}));
+    letters_.postpone({{"p1", 1}}, "busy", 100, 6);
+    letters_.fallBack({"p1", 1}, "sms", {{"postal", true}}, "email: given up", 7);
+    EXPECT_THAT(toGo("email", 1000), IsEmpty());
+    EXPECT_THAT(toGo("sms", 7), ElementsAre("p1-1")) << "at once";
+    EXPECT_THAT(letters_.toGoTogether("p1", "sms", 7), IsEmpty()) << "the others' file stays as it is";
+    letters_.fallBack({"p1", 1}, "postal", {}, "sms: no", 8);
+    StoredLetter const letter = letters_.find({"p1", 1}).value();
+    EXPECT_THAT(letter.tried, ElementsAre("email", "sms"));
+    EXPECT_THAT(letter.otherWays, IsEmpty());
+    EXPECT_EQ(letter.attempts, 0);
+    EXPECT_EQ(letter.firstTry, 0);
+    EXPECT_EQ(letter.says, "sms: no");
+    letters_.beginHandingOver({{"p1", 1}}, 9);
+    letters_.fallBack({"p1", 1}, "fax", {}, "", 9, VlServiced::LettersAre::Waiting);
+    EXPECT_EQ(letters_.find({"p1", 1})->channel, "postal");
+}
+
 TEST_P(LetterStoreTest, HoldsNoticesUntilWhatTheyTellOfIsHandedOver) {
     queue("p1");
     EXPECT_TRUE(letters_.divide("p1", {{1, "postal", true}, {2, "email", true}, {3, "fax", false}}, 5,
@@ -93,6 +116,17 @@ TEST_P(LetterStoreTest, HoldsNoticesUntilWhatTheyTellOfIsHandedOver) {
     EXPECT_EQ(states(), "accepted waiting waiting ");
     EXPECT_THAT(letters_.counts("p1"),
                 ElementsAre(Pair(LetterState::Delivered, 1), Pair(LetterState::Failed, 1)));
+}
+
+TEST_P(LetterStoreTest, DoubtsNoticesWithAllLetters) {
+    queue("p1");
+    letters_.divide("p1", {{1, "postal", true}, {2, "postal", true}}, 5,
+                    {{0, "office@acme.example"}, {1, "ada@example.org"}});
+    letters_.finish({{"p1", 1}}, LetterState::Accepted, "", 6);
+    EXPECT_EQ(letters_.doubtAll("restored", 7), 1);
+    EXPECT_EQ(state("p1", 1), LetterState::Accepted);
+    for (long long const number : {2, -1, -2})
+        EXPECT_EQ(state("p1", number), LetterState::Uncertain) << number;
 }
 
 TEST_P(LetterStoreTest, ReleasesNoNoticeForALetterThatAnotherServiceHasDecided) {
