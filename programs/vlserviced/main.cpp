@@ -6,6 +6,8 @@
 #include "programs/vlserviced/jobs/backup.h"
 #include "programs/vlserviced/options.h"
 #include "programs/vlserviced/service.h"
+#include "programs/vlserviced/store/data_folder.h"
+#include "programs/vlserviced/store/move_database.h"
 #include "programs/vlserviced/system_manager.h"
 #include "vlservice/platform/local_time.h"
 #include "vlservice/platform/log.h"
@@ -41,7 +43,7 @@ std::filesystem::path outboxOf(VlServiced::Options const& options) {
 }
 
 void backUp(VlServiced::Options const& options) {
-    VlServiced::backUp(options.data, outboxOf(options), options.file, std::time(nullptr));
+    VlServiced::backUp({options.data, outboxOf(options), options.database}, options.file, std::time(nullptr));
 }
 
 std::string inWords(long long count, char const* one, char const* many) {
@@ -59,6 +61,14 @@ void restore(VlServiced::Options const& options) {
               << " uncertain until a person decides\n";
 }
 
+void moveDatabase(VlServiced::Options const& options) {
+    VlServiced::DataFolder const data(options.data);
+    VlServiced::MovedRecord const record = VlServiced::moveToPostgres(data, options.migrateTo);
+    std::cout << inWords(record.rows, "row", "rows") << " of " << inWords(record.tables, "table", "tables")
+              << " are the same there, and the files here are called service.db.moved and packs.db.moved; "
+                 "start the service with --database\n";
+}
+
 void carryOut(VlServiced::Options const& options) {
     switch (options.task) {
     case VlServiced::Task::Serve:
@@ -67,6 +77,8 @@ void carryOut(VlServiced::Options const& options) {
         return backUp(options);
     case VlServiced::Task::Restore:
         return restore(options);
+    case VlServiced::Task::MoveDatabase:
+        return moveDatabase(options);
     }
 }
 

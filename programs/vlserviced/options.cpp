@@ -29,6 +29,10 @@ void addOptions(Base::Command const& command, Options& options) {
                    "Seconds after which other services take up what one works on that stands still")
         .showDefault()
         .valueName("SECONDS");
+    command
+        .addOption("--migrate-to", options.migrateTo,
+                   "Move what the data folder's file holds into an empty database, and end")
+        .valueName("URL");
     command.addOption("--outbox", options.outbox, "Folder for finished mailings [outbox in the data folder]")
         .valueName("FOLDER");
     command.addOption("--token", options.token, "File with the access token [token in the data folder]")
@@ -77,10 +81,11 @@ void addTasks(Base::Command const& command, Options& options) {
 }
 
 void requireOwnDatabase(Options const& options) {
-    if (options.task != Task::Serve && !options.database.empty())
+    if (options.task == Task::Restore && !options.database.empty())
         throw Base::UsageError(
-            "backup and restore are for the database of a data folder; one of PostgreSQL is saved as "
-            "a whole by pg_dump");
+            "restore makes the database of a data folder; --migrate-to takes that to PostgreSQL");
+    if (!options.migrateTo.empty() && (options.task != Task::Serve || !options.database.empty()))
+        throw Base::UsageError("--migrate-to goes with the data folder alone");
 }
 
 } // namespace
@@ -103,6 +108,8 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
             throw Base::UsageError("--lease takes 2 to 600 seconds, and got " +
                                    std::to_string(options.lease));
         requireOwnDatabase(options);
+        if (!options.migrateTo.empty())
+            options.task = Task::MoveDatabase;
         return options;
     } catch (Base::UsageError const& wrong) {
         err << "vlserviced: " << wrong.what() << "; --help explains\n";

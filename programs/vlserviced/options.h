@@ -12,12 +12,14 @@
 namespace VlServiced {
 
 /// What the program is started for.
-enum class Task { Serve, BackUp, Restore };
+enum class Task { Serve, BackUp, Restore, MoveDatabase };
 
 struct Options {
     Task task = Task::Serve;
     /// Of a backup.
     std::filesystem::path file;
+    /// Of a PostgreSQL database that is to hold what the data folder does.
+    std::string migrateTo;
     /// Whether the service did nothing behind the backup.
     bool nothingSince = false;
     std::filesystem::path data;

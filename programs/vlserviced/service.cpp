@@ -20,6 +20,7 @@
 #include "programs/vlserviced/neighbours.h"
 #include "programs/vlserviced/processor.h"
 #include "programs/vlserviced/store/data_folder.h"
+#include "programs/vlserviced/store/move_database.h"
 #include "programs/vlserviced/store/schema.h"
 #include "programs/vlserviced/system_manager.h"
 #include "vlservice/cfg/inet.h"
@@ -86,8 +87,10 @@ Holder newHolder(Options const& options) {
 }
 
 SharedDatabase openDatabase(Options const& options, DataFolder const& data) {
-    return options.database.empty() ? SharedDatabase{openServiceDatabase(data.database()), true}
-                                    : openSharedDatabase(options.database);
+    if (!options.database.empty())
+        return openSharedDatabase(options.database);
+    requireNotMoved(data);
+    return {openServiceDatabase(data.database()), true};
 }
 
 std::shared_ptr<PackStore> openPackStore(Options const& options, DataFolder const& data) {

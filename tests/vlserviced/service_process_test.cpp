@@ -321,12 +321,14 @@ TEST_F(RestoredService, IsNotMadeWhereOneRunsOrHasRun) {
         testing::StartsWith("1 vlserviced: the data folder " + data_.string() + " is in use by another "));
 }
 
-TEST_F(RestoredService, OfASharedDatabaseIsForItsServer) {
-    EXPECT_EQ(carriedOut({"backup", (folder_ / "other").string(), "--data", data_.string(), "--database",
-                          "postgresql:///x"}),
-              "1 vlserviced: backup and restore are for the database of a data folder; one of PostgreSQL is "
-              "saved as "
-              "a whole by pg_dump; --help explains\n");
+TEST_F(RestoredService, IsMadeInADataFolderAlone) {
+    EXPECT_EQ(
+        restored({"--database", "postgresql:///x"}),
+        "1 vlserviced: restore makes the database of a data folder; --migrate-to takes that to PostgreSQL; "
+        "--help explains\n");
+    EXPECT_EQ(carriedOut({"--migrate-to", "postgresql:///x", "--database", "postgresql:///x", "--data",
+                          data_.string()}),
+              "1 vlserviced: --migrate-to goes with the data folder alone; --help explains\n");
 }
 
 TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {

@@ -13,7 +13,9 @@
 #include "tests/vlserviced/pack_help.h"
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/get_svc_cfg.h"
+#include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/set_svc_cfg.h"
+#include "vlservice/ipc/upload_queued.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -245,6 +247,37 @@ TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStil
 // --- on the way to them
 
 /// Two services in a network, and a client in another one that knows the first alone.
+/// A service that has its database in its folder, with a mailing that waits.
+TEST_F(SharedDatabaseTest, GoesOnWithWhatAFolderHeldThatWasMovedThere) {
+    {
+        ServiceProcess const service(
+            {"--data", data(0).string(), "--no-discovery", "--local-packs", folder_.path().string()});
+        auto const owner = clientOf(service, data(0));
+        owner->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
+        storePack(folder_ / "packs.db", "p1");
+        owner->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", "p1");
+        EXPECT_NE(ServiceProcess({"--data", data(0).string(), "--migrate-to", database_.address()}).wait(),
+                  0);
+    }
+    ServiceProcess moving({"--data", data(0).string(), "--migrate-to", database_.address()});
+    EXPECT_EQ(moving.wait(), 0) << moving.errors();
+    EXPECT_THAT(moving.firstLine(),
+                testing::MatchesRegex(
+                    "[0-9]+ rows of [0-9]+ tables are the same there, and the files here are called "
+                    "service.db.moved and packs.db.moved; start the service with --database"));
+    ServiceProcess without({"--data", data(0).string(), "--no-discovery"});
+    EXPECT_EQ(without.wait(), 1);
+    EXPECT_THAT(without.errors(), HasSubstr("was moved to PostgreSQL: name that one by --database"));
+    ServiceProcess const service({"--data", data(0).string(), "--no-discovery", "--local-packs",
+                                  folder_.path().string(), "--database", database_.address()});
+    TakingCarrier carrier(upload_);
+    auto const owner = clientOf(service, data(0));
+    owner->call<Ipc::UploadQueued>("", "");
+    while (carrier.taken().empty())
+        owner->call<Ipc::GetSvcCfg>();
+    EXPECT_EQ(carrier.taken(), (std::map<std::string, int>{{"p1", 1}}));
+}
+
 class ServicesOnAnotherMachine : public testing::Test {
 protected:
     void SetUp() override {

@@ -9,6 +9,7 @@
 #include "programs/vlserviced/store/backup_file.h"
 #include "programs/vlserviced/store/data_folder.h"
 #include "programs/vlserviced/store/letter_store.h"
+#include "programs/vlserviced/store/move_database.h"
 #include "programs/vlserviced/store/pack_store.h"
 #include "programs/vlserviced/store/schema.h"
 #include "programs/vlserviced/store/settings_store.h"
@@ -37,11 +38,10 @@ constexpr JobState BEFORE_HANDING_OVER[] = {JobState::Accepted, JobState::Held, 
 
 /// The database as it is at one moment, as a single file.
 void copyDatabase(fs::path const& file, Database::DatabaseKind const& kind, fs::path const& target) {
-    fs::permissions(target, fs::perms::owner_read | fs::perms::owner_write);
     try {
         SQLite::Database source(file.string(), SQLite::OPEN_READWRITE, PATIENCE_MS);
         Database::requireKind(source, kind, file);
-        SQLite::Database copy(target.string(), SQLite::OPEN_READWRITE);
+        SQLite::Database copy(target.string(), SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE);
         if (SQLite::Backup(copy, source).executeStep() != SQLITE_DONE)
             throw Base::Error(Database::theFile(kind, file) + " is busy: try again");
         copy.exec("PRAGMA journal_mode = DELETE");
@@ -161,6 +161,18 @@ private:
     fs::path folder_;
 };
 
+/// In front of the name of a file: for what it is made of.
+fs::path hiddenBeside(fs::path const& target) {
+    return Base::folderOf(target) / ('.' + target.filename().string() + ".parts");
+}
+
+/// Pages go when their job is done: all that a record needs are there still behind it.
+void copyFiles(fs::path const& data, fs::path const& target) {
+    copyDatabase(data / SERVICE, serviceDatabase(), target / SERVICE);
+    if (fs::exists(data / PACKS))
+        copyDatabase(data / PACKS, packStoreDatabase(), target / PACKS);
+}
+
 void requireNew(DataFolder const& data) {
     for (fs::path const& file : {data.database(), data.packs(), data.token()})
         if (fs::exists(file))
@@ -194,24 +206,22 @@ RestoredRecord settleIn(fs::path const& folder, long long madeAt, Since since, l
 
 } // namespace
 
-void backUp(fs::path const& data, fs::path const& outbox, fs::path const& target, long long now) {
-    if (!fs::exists(data / SERVICE))
-        throw Base::Error("there is no service database in " + data.string() +
+void backUp(KeptAt const& kept, fs::path const& target, long long now) {
+    bool const isShared = !kept.database.empty();
+    if (!isShared && !fs::exists(kept.data / SERVICE))
+        throw Base::Error("there is no service database in " + kept.data.string() +
                           ": name the data folder of the service by --data");
     if (fs::exists(target))
         throw Base::Error(target.string() + " is there already: name another file");
-    // Pages go when their job is done, so that all that this record needs are there still behind it.
-    Base::PendingFile const database(Base::folderOf(target) / SERVICE);
-    Base::PendingFile const packs(Base::folderOf(target) / PACKS);
-    copyDatabase(data / SERVICE, serviceDatabase(), database.temporary());
-    std::vector<BackupMember> members{{SERVICE, database.temporary()}};
-    addContainers(members, database.temporary(), outbox);
-    if (fs::exists(data / PACKS)) {
-        copyDatabase(data / PACKS, packStoreDatabase(), packs.temporary());
-        members.push_back({PACKS, packs.temporary()});
-    }
-    if (fs::exists(data / TOKEN))
-        members.push_back({TOKEN, data / TOKEN});
+    NewFolder const copies(hiddenBeside(target));
+    isShared ? copyFromPostgres(kept.database, copies.path() / SERVICE, copies.path() / PACKS)
+             : copyFiles(kept.data, copies.path());
+    std::vector<BackupMember> members{{SERVICE, copies.path() / SERVICE}};
+    addContainers(members, copies.path() / SERVICE, kept.outbox);
+    if (fs::exists(copies.path() / PACKS))
+        members.push_back({PACKS, copies.path() / PACKS});
+    if (fs::exists(kept.data / TOKEN))
+        members.push_back({TOKEN, kept.data / TOKEN});
     writeBackup(target, members, now);
 }
 

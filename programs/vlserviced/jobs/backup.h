@@ -2,14 +2,22 @@
 // The service's record as one file, and a service that goes on from such a file.
 
 #include <filesystem>
+#include <string>
 
 namespace VlServiced {
+
+/// Where a service keeps what it does.
+struct KeptAt {
+    std::filesystem::path data;
+    std::filesystem::path outbox;
+    /// Of a PostgreSQL database; empty for the data folder's own.
+    std::string database = {};
+};
 
 /// Writes what a service on a data folder keeps into a new file, while it runs or not: the database and then
 /// the packs, each as it was at one moment, containers that cannot be made of them, and the token. Seconds
 /// since the epoch. Throws std::exception with one line for a person.
-void backUp(std::filesystem::path const& data, std::filesystem::path const& outbox,
-            std::filesystem::path const& target, long long now);
+void backUp(KeptAt const& kept, std::filesystem::path const& target, long long now);
 
 /// What the service did behind the backup.
 enum class Since {

@@ -64,7 +64,7 @@ protected:
         if (state != JobState::Accepted)
             jobs_->advance(packId, JobState::Accepted, state, 1);
     }
-    void backUp() const { VlServiced::backUp(data_, data_ / "outbox", file_, AT_BACKUP); }
+    void backUp() const { VlServiced::backUp({data_, data_ / "outbox"}, file_, AT_BACKUP); }
     RestoredRecord restore(Since since = Since::Unknown) const {
         return VlServiced::restoreBackup(file_, restored_, restored_ / "outbox", since, AT_BACKUP + 1000);
     }
@@ -243,7 +243,7 @@ TEST_F(BackupTest, LeavesNoOtherFileBehind) {
 }
 
 TEST_F(BackupTest, OfAFolderWithoutAServiceIsNotMade) {
-    EXPECT_EQ(failureOf([&] { VlServiced::backUp(upload_, upload_, file_, 1); }),
+    EXPECT_EQ(failureOf([&] { VlServiced::backUp({upload_, upload_}, file_, 1); }),
               "there is no service database in " + upload_.string() +
                   ": name the data folder of the service by --data");
     EXPECT_FALSE(fs::exists(file_));
