@@ -44,6 +44,7 @@ VARYING = [
     ("address", r"\b127\.0\.0\.1:\d+", True),
     ("secret", r"\b[0-9a-f]{64}\b", True),
     ("time", r"\b\d{4}[/-]\d\d[/-]\d\d[ T]\d\d:\d\d(?::\d\d)?Z?", False),
+    ("rows", r"\b\d+ rows of \d+ tables\b", False),
     ("process", r"\(process \d+\)", False),
     ("free space", r"\b\d+ MiB\b", False),
 ]
