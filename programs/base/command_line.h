@@ -24,7 +24,7 @@ namespace Base {
 /// What is wrong with a command line, such as "--output or --send is required".
 class UsageError : public Error {
 public:
-    using Error::Error;
+    explicit UsageError(std::string const& line) : Error(Code::Usage, line) {}
 };
 
 /// An option that was added to a command; a handle, valid as long as its CommandLine. Changes give the option

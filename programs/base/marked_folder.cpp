@@ -82,9 +82,9 @@ void MarkedFolder::readIdentity() {
 
 void MarkedFolder::requireIdentity(FolderIdentity const& wanted) const {
     if (!identity_.isSameAs(wanted))
-        throw Error("the " + inWords_ + ' ' + path().string() +
-                    " is another one than before: mount the one whose file " + MARK_FILE + " reads " +
-                    wanted.mark);
+        throw Error(Base::Code::WrongFolder, "the " + inWords_ + ' ' + path().string() +
+                                                 " is another one than before: mount the one whose file " +
+                                                 MARK_FILE + " reads " + wanted.mark);
 }
 
 /// It appears whole, in place of whatever had its name.

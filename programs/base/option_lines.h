@@ -14,7 +14,7 @@ namespace Base {
 /// What is wrong with a line, such as "line 3: there is no option \"prot\"".
 class OptionLineError : public Error {
 public:
-    using Error::Error;
+    explicit OptionLineError(std::string const& line) : Error(Code::Usage, line) {}
 };
 
 struct OptionLine {

@@ -21,7 +21,8 @@ constexpr mode_t OF_OTHERS = 077;
 constexpr mode_t PERMISSIONS = 07777;
 
 [[noreturn]] void fail(std::string_view what, std::string const& file, int error) {
-    throw Error(std::string(what) + " \"" + file + "\": " + std::strerror(error) + '.');
+    throw Error(Base::Code::FileUnreadable,
+                std::string(what) + " \"" + file + "\": " + std::strerror(error) + '.');
 }
 
 std::string octal(mode_t mode) {
@@ -36,13 +37,14 @@ void requirePrivate(int descriptor, std::string const& file) {
     if (::fstat(descriptor, &status) != 0)
         fail("Cannot read", file, errno);
     if (!S_ISREG(status.st_mode))
-        throw Error("\"" + file + "\" is not a file.");
+        throw Error(Base::Code::FileUnsuitable, "\"" + file + "\" is not a file.");
     if (status.st_uid != ::geteuid() && status.st_uid != 0)
-        throw Error("The file \"" + file + "\" belongs to another user.");
+        throw Error(Base::Code::FileNotPrivate, "The file \"" + file + "\" belongs to another user.");
     mode_t const refused = status.st_uid == ::geteuid() ? OF_OTHERS : OF_OTHERS & ~S_IRGRP;
     if ((status.st_mode & refused) != 0)
-        throw Error("The file \"" + file + "\" is open to others (mode " +
-                    octal(status.st_mode & PERMISSIONS) + "); make it private with chmod 600.");
+        throw Error(Base::Code::FileNotPrivate, "The file \"" + file + "\" is open to others (mode " +
+                                                    octal(status.st_mode & PERMISSIONS) +
+                                                    "); make it private with chmod 600.");
 }
 
 /// Says what the system refused as a person reads it.
@@ -80,7 +82,8 @@ std::string readPrivateFile(std::string const& file, std::size_t limit) {
     contents.resize(
         orError("Cannot read", file, [&] { return descriptor.read(contents.data(), contents.size()); }));
     if (contents.size() > limit)
-        throw Error("The file \"" + file + "\" is larger than " + std::to_string(limit) + " bytes.");
+        throw Error(Base::Code::FileUnsuitable,
+                    "The file \"" + file + "\" is larger than " + std::to_string(limit) + " bytes.");
     return contents;
 }
 

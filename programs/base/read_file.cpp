@@ -30,9 +30,10 @@ void requireOrdinary(FileDescriptor const& file) {
     if (::fstat(file.number(), &status) != 0)
         throw std::system_error(errno, std::generic_category());
     if (S_ISDIR(status.st_mode))
-        throw Error(file.file().string() + ": is a folder; name the files in it");
+        throw Error(Base::Code::FileUnsuitable, file.file().string() + ": is a folder; name the files in it");
     if (!S_ISREG(status.st_mode))
-        throw Error(file.file().string() + ": is no ordinary file; save it to one");
+        throw Error(Base::Code::FileUnsuitable,
+                    file.file().string() + ": is no ordinary file; save it to one");
 }
 
 /// Grows with what comes: neither a file that grows meanwhile nor one that lies about its size is trusted.
@@ -46,8 +47,9 @@ std::string readAll(FileDescriptor& file, std::size_t limit) {
         got = file.read(bytes.data() + before, step);
         bytes.resize(before + got);
         if (bytes.size() > limit)
-            throw Error(file.file().string() + ": is larger than " + std::to_string(limit) +
-                        " bytes; name a smaller file");
+            throw Error(Base::Code::FileUnsuitable, file.file().string() + ": is larger than " +
+                                                        std::to_string(limit) +
+                                                        " bytes; name a smaller file");
     }
     return bytes;
 }
@@ -61,7 +63,7 @@ std::string readFile(fs::path const& name, std::size_t limit) {
         requireOrdinary(file);
         return readAll(file, limit);
     } catch (std::system_error const& failure) {
-        throw Error(name.string() + ": " + inWords(failure.code()));
+        throw Error(Base::Code::FileUnreadable, name.string() + ": " + inWords(failure.code()));
     }
 }
 
@@ -70,7 +72,7 @@ std::string readStandardInput(std::size_t limit) {
         FileDescriptor input(::fcntl(STDIN_FILENO, F_DUPFD_CLOEXEC, 0), "standard input");
         return readAll(input, limit);
     } catch (std::system_error const& failure) {
-        throw Error("standard input: " + inWords(failure.code()));
+        throw Error(Base::Code::FileUnreadable, "standard input: " + inWords(failure.code()));
     }
 }
 

@@ -12,7 +12,8 @@ std::string secretFile(std::string const& name) {
         return name;
     char const* const folder = std::getenv("CREDENTIALS_DIRECTORY");
     if (!folder)
-        throw Error("the service has been handed no credentials, and so no " + inQuotes(name));
+        throw Error(Base::Code::SettingMissing,
+                    "the service has been handed no credentials, and so no " + inQuotes(name));
     return std::string(folder) + '/' + name;
 }
 

@@ -60,7 +60,8 @@ User userNamed(std::string const& name) {
     passwd* found = nullptr;
     ::getpwnam_r(name.c_str(), &entry, buffer.data(), buffer.size(), &found);
     if (!found)
-        throw Base::Error("there is no user " + name + " that a program could run as");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "there is no user " + name + " that a program could run as");
     return {found->pw_uid != ::geteuid(), found->pw_uid, found->pw_gid};
 }
 

@@ -68,6 +68,7 @@ std::vector<std::string> CommandCarrier::argumentsFor(Parcel const& parcel) cons
         // A value is never an option.
         if (text.starts_with('{') && filled.starts_with('-'))
             throw Base::Error(
+                Base::Code::LetterUnsuitable,
                 "a field of the letter begins with \"-\", which a program would take for an option");
         arguments.push_back(std::move(filled));
     }
@@ -98,7 +99,8 @@ Outcome CommandCarrier::handOver(Parcel const& parcel, PutOnRecord const& mayHav
 
 std::string CommandCarrier::test() {
     if (::access(settings_.program.c_str(), X_OK) != 0)
-        throw Base::Error("there is no program " + settings_.program + " that may be run");
+        throw Base::Error(Base::Code::CarrierUnavailable,
+                          "there is no program " + settings_.program + " that may be run");
     return settings_.program + " can be run";
 }
 

@@ -49,8 +49,9 @@ FolderCarrier::FolderCarrier(fs::path folder, std::string identity)
 Base::MarkedFolder FolderCarrier::opened() const {
     if (identity_.empty()) {
         Base::FileDescriptor const there(folder_, O_RDONLY | O_DIRECTORY);
-        throw Base::Error("the folder " + folder_.string() +
-                          " could not be had when it was set: set \"carriers\" once more");
+        throw Base::Error(Base::Code::CarrierUnavailable,
+                          "the folder " + folder_.string() +
+                              " could not be had when it was set: set \"carriers\" once more");
     }
     return {IN_WORDS, folder_, identity_};
 }

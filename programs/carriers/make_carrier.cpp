@@ -21,7 +21,7 @@ std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) 
     case Protocol::CarrierType::Smtp:
         return std::make_unique<SmtpCarrier>(settings);
     }
-    throw Base::Error("there is no such carrier");
+    throw Base::Error(Base::Code::CarrierUnknown, "there is no such carrier");
 }
 
 } // namespace Carriers

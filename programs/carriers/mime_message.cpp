@@ -316,16 +316,19 @@ MailReport mailReportIn(std::string_view message) {
     auto const mime = Held<GMimeMessage>(g_mime_parser_construct_message(parser.get(), nullptr));
     GMimeObject* const body = mime ? g_mime_message_get_mime_part(mime.get()) : nullptr;
     if (!body || !isOfType(body, "multipart", "report"))
-        throw Base::Error("the message is no report of a server of e-mail (multipart/report)");
+        throw Base::Error(Base::Code::ReportUnreadable,
+                          "the message is no report of a server of e-mail (multipart/report)");
     Parts const parts = partsOf(body);
     if (!parts.status)
-        throw Base::Error("the report does not tell what became of a message (message/delivery-status)");
+        throw Base::Error(Base::Code::ReportUnreadable,
+                          "the report does not tell what became of a message (message/delivery-status)");
     MailReport report{kindOf(lowerCase(fieldIn(*parts.status, "action"))), parts.messageId,
                       wordsOf(*parts.status)};
     if (report.messageId.empty())
         report.messageId = idIn(fieldIn(headersOf(GMIME_OBJECT(mime.get())), "in-reply-to"));
     if (report.messageId.empty())
-        throw Base::Error("the report does not tell which message it is about (Message-ID)");
+        throw Base::Error(Base::Code::ReportUnreadable,
+                          "the report does not tell which message it is about (Message-ID)");
     return report;
 }
 

@@ -21,7 +21,8 @@ std::string phoneNumberIn(std::string_view address) {
         if ((c >= '0' && c <= '9') || (c == '+' && number.empty()))
             number += c;
     if (number.empty() || number == "+")
-        throw Base::Error("the letter's address is no telephone number, which its carrier needs");
+        throw Base::Error(Base::Code::LetterUnsuitable,
+                          "the letter's address is no telephone number, which its carrier needs");
     return number;
 }
 
@@ -34,7 +35,8 @@ std::string valueOf(std::string_view name, OutgoingLetter const& letter, std::st
         return phoneNumberIn(letter.address);
     auto const found = std::ranges::find(letter.fields, name, &std::pair<std::string, std::string>::first);
     if (found == letter.fields.end())
-        throw Base::Error("the letter has no field \"" + std::string(name) + "\", which its carrier needs");
+        throw Base::Error(Base::Code::LetterUnsuitable,
+                          "the letter has no field \"" + std::string(name) + "\", which its carrier needs");
     std::string value = found->second;
     std::ranges::replace_if(
         value, [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; }, ' ');

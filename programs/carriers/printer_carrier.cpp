@@ -129,9 +129,10 @@ void PrinterCarrier::cancelLeft(std::string const& key) {
 Outcome PrinterCarrier::handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) {
     PrinterFacts const facts = session_.facts();
     if (!facts.takesJobs)
-        throw Base::Error("the printer " + uri_ + " takes no jobs at the moment");
+        throw Base::Error(Base::Code::CarrierUnavailable,
+                          "the printer " + uri_ + " takes no jobs at the moment");
     if (!facts.takesPdf)
-        throw Base::Error("the printer " + uri_ + " takes no PDF");
+        throw Base::Error(Base::Code::CarrierUnsuitable, "the printer " + uri_ + " takes no PDF");
     cancelLeft(parcel.key);
     PrintWishes wishes = wishesOf(parcel);
     std::string const more = notOffered(wishes, facts);
@@ -192,7 +193,7 @@ Progress PrinterCarrier::toldOf(PrinterJob const& job, std::string const& hindra
 std::string PrinterCarrier::test() {
     PrinterFacts const facts = session_.facts();
     if (!facts.takesPdf)
-        throw Base::Error("the printer " + uri_ + " takes no PDF");
+        throw Base::Error(Base::Code::CarrierUnsuitable, "the printer " + uri_ + " takes no PDF");
     std::string const reasons = reasonsInWords(facts.reasons);
     return facts.name + (facts.takesJobs ? " takes jobs" : " takes no jobs at the moment") +
            (reasons.empty() ? reasons : " (" + reasons + ')') + "; it offers " + list(facts.sides) + "; " +

@@ -123,7 +123,7 @@ public:
         if (httpSeparateURI(HTTP_URI_CODING_ALL, uri_.c_str(), scheme.data(), scheme.size(), user.data(),
                             user.size(), host.data(), host.size(), &port_, path.data(),
                             path.size()) < HTTP_URI_STATUS_OK)
-            throw Base::Error(uri_ + " is no address of a printer");
+            throw Base::Error(Base::Code::SettingInvalid, uri_ + " is no address of a printer");
         host_ = host.data();
         path_ = path.data();
     }
@@ -171,7 +171,8 @@ public:
         wantJob(request.get());
         std::vector<PrinterJob> const jobs = jobsIn(answerTo(std::move(request)).get());
         if (jobs.empty())
-            throw Base::Error("the printer " + uri_ + " says nothing of job " + std::to_string(id));
+            throw Base::Error(Base::Code::CarrierUnavailable,
+                              "the printer " + uri_ + " says nothing of job " + std::to_string(id));
         return jobs.front();
     }
 
@@ -194,7 +195,8 @@ public:
         Message const told = answerTo(std::move(request));
         ipp_attribute_t* const id = ippFindAttribute(told.get(), "job-id", IPP_TAG_INTEGER);
         if (!id)
-            throw Base::Error("the printer " + uri_ + " makes jobs without a number");
+            throw Base::Error(Base::Code::CarrierUnavailable,
+                              "the printer " + uri_ + " makes jobs without a number");
         return ippGetInteger(id, 0);
     }
 
@@ -220,8 +222,8 @@ public:
         if (told && isRefusal(ippGetStatusCode(told.get())))
             throw PrinterRefusal(words);
         if (isWhole && !told)
-            throw PrinterSilence(words);
-        throw Base::Error(words);
+            throw PrinterSilence(Base::Code::CarrierUnavailable, words);
+        throw Base::Error(Base::Code::CarrierUnavailable, words);
     }
 
 private:
@@ -231,7 +233,7 @@ private:
         connection_.reset(httpConnect2(host_.c_str(), port_, nullptr, AF_UNSPEC, HTTP_ENCRYPTION_IF_REQUESTED,
                                        1, CONNECT_MILLISECONDS, nullptr));
         if (!connection_)
-            throw Base::Error(failureInWords());
+            throw Base::Error(Base::Code::CarrierUnavailable, failureInWords());
         httpSetTimeout(connection_.get(), STILL_SECONDS, &giveUp, nullptr);
     }
 
@@ -259,7 +261,7 @@ private:
             return told;
         std::string const words = failureInWords();
         connection_.reset();
-        throw Base::Error(words);
+        throw Base::Error(Base::Code::CarrierUnavailable, words);
     }
 
     std::string failureInWords() const {

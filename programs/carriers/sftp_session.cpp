@@ -153,7 +153,7 @@ private:
         if (code != CURLE_OK && wasConnected)
             code = perform(name, bytes, first, last);
         if (code != CURLE_OK)
-            throw Base::Error(inWords(code));
+            throw Base::Error(Base::Code::CarrierUnavailable, inWords(code));
         isConnected_ = true;
     }
 

@@ -29,7 +29,8 @@ std::string plainAddress(std::string const& address) {
                              return static_cast<unsigned char>(c) < 0x80;
                          });
     if (!isPlain)
-        throw Base::Error(Base::inQuotes(address) + " is not one plain e-mail address");
+        throw Base::Error(Base::Code::LetterUnsuitable,
+                          Base::inQuotes(address) + " is not one plain e-mail address");
     return address;
 }
 

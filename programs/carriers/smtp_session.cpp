@@ -151,7 +151,7 @@ public:
         set(CURLOPT_CUSTOMREQUEST, "NOOP");
         perform();
         if (result_ != CURLE_OK)
-            throw Base::Error(whatFailed());
+            throw Base::Error(Base::Code::CarrierUnavailable, whatFailed());
     }
 
 private:
@@ -161,8 +161,8 @@ private:
         if (result == CURLE_OUT_OF_MEMORY)
             throw std::bad_alloc();
         if (result != CURLE_OK)
-            throw Base::Error("e-mails cannot be sent with this libcurl: " +
-                              std::string(curl_easy_strerror(result)));
+            throw Base::Error(Base::Code::ProgramLimited, "e-mails cannot be sent with this libcurl: " +
+                                                              std::string(curl_easy_strerror(result)));
     }
 
     void perform() {

@@ -64,9 +64,9 @@ private:
         io_.restart();
         while (!*result)
             if (io_.run_one() == 0)
-                throw Base::Error("The connection was lost.");
+                throw Base::Error(Base::Code::ConnectionLost, "The connection was lost.");
         if (!(*result)->empty())
-            throw Base::Error(**result);
+            throw Base::errorSaid(**result, Base::Code::ServiceUnreachable);
     }
 
     boost::asio::io_context io_;

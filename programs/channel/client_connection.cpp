@@ -37,6 +37,11 @@ Deadline::Clock::time_point dueAfter(std::chrono::milliseconds time) {
     return time.count() > 0 ? Deadline::Clock::now() + time : Deadline::NEVER;
 }
 
+/// With the code that the service gives.
+std::string refusalIn(Frame const& error) {
+    return Base::codedLine("The service refuses: " + reasonOf(error.text), Base::Code::ServiceRefused);
+}
+
 } // namespace
 
 std::shared_ptr<ClientConnection> ClientConnection::make(asio::io_context& io, ClientSettings settings) {
@@ -134,10 +139,12 @@ void ClientConnection::requirePinned() const {
     PinStore const pins(settings_.pinFile);
     auto const pinned = pins.find(service());
     if (!pinned && !settings_.acceptNew)
-        throw Base::Error("Its certificate is new: " + fingerprint_ + ". It must be accepted first.");
+        throw Base::Error(Base::Code::CertificateUntrusted,
+                          "Its certificate is new: " + fingerprint_ + ". It must be accepted first.");
     if (pinned && *pinned != fingerprint_)
-        throw Base::Error("Its certificate has changed from " + *pinned + " to " + fingerprint_ +
-                          ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
+        throw Base::Error(Base::Code::CertificateUntrusted,
+                          "Its certificate has changed from " + *pinned + " to " + fingerprint_ +
+                              ". If that is right, remove its line from \"" + settings_.pinFile + "\".");
 }
 
 void ClientConnection::greet() {
@@ -203,7 +210,7 @@ void ClientConnection::pinNew() {
     if (pins.find(service()))
         return;
     if (!settings_.acceptNew(service(), fingerprint_))
-        throw Base::Error("Its certificate was not accepted.");
+        throw Base::Error(Base::Code::CertificateUntrusted, "Its certificate was not accepted.");
     pins.add(service(), fingerprint_);
 }
 
@@ -251,9 +258,9 @@ void ClientConnection::begin() {
             endRequest("It was not built for this connection.");
     } catch (std::exception const& e) {
         if (isSent_)
-            fail(e.what());
+            fail(Base::codedLine(e));
         else
-            endRequest(e.what());
+            endRequest(Base::codedLine(e));
     }
 }
 
@@ -265,7 +272,7 @@ void ClientConnection::send(std::shared_ptr<Ipc::CmdI> cmd, Message which, json:
         gone();
         cmd->readResp();
         if (!taken_)
-            throw Base::Error("This command cannot take an answer.");
+            throw Base::Error(Base::Code::Unexpected, "This command cannot take an answer.");
     });
     isSent_ = true;
 }
@@ -282,17 +289,19 @@ void ClientConnection::takeAnswer(Frame const& message) {
     bool const isAnswer = message.command == requests_.front().cmd->id() && message.sequence == sequence_ &&
                           message.kind != Kind::Request;
     if (!isAnswer && message.kind == Kind::Error)
-        throw Base::Error("It closes the connection: " + reasonOf(message.text));
+        throw Base::Error(Base::Code::ConnectionRefused,
+                          "It closes the connection: " + reasonOf(message.text));
     if (!isAnswer)
-        throw Base::Error("It answers what was not asked.");
+        throw Base::Error(Base::Code::ConnectionBroken, "It answers what was not asked.");
     std::string failure;
     try {
         if (message.kind == Kind::Error)
-            failure = "The service refuses: " + reasonOf(message.text);
+            failure = refusalIn(message);
         else
             taken_(parse(message.text, MAX_ANSWER_VALUES));
     } catch (std::exception const& e) {
-        failure = std::string("The answer cannot be used: ") + e.what();
+        failure = Base::codedLine(std::string("The answer cannot be used: ") + e.what(),
+                                  Base::Code::ConnectionBroken);
     }
     endRequest(failure);
     pump();
@@ -402,11 +411,12 @@ void ClientConnection::onStored(Frame const& message) {
             upload.bytes -= piece->second;
         upload.messages.erase(upload.messages.begin(), last + 1);
     } else if (message.kind != Kind::Error) {
-        throw Base::Error("It answers what was not asked.");
+        throw Base::Error(Base::Code::ConnectionBroken, "It answers what was not asked.");
     } else if (isOfData) {
-        upload.refusal = "The service refuses: " + reasonOf(message.text);
+        upload.refusal = refusalIn(message);
     } else {
-        throw Base::Error("It closes the connection: " + reasonOf(message.text));
+        throw Base::Error(Base::Code::ConnectionRefused,
+                          "It closes the connection: " + reasonOf(message.text));
     }
 }
 
@@ -437,7 +447,7 @@ void ClientConnection::orFail(Step step) {
     try {
         step();
     } catch (std::exception const& e) {
-        fail(e.what());
+        fail(Base::codedLine(e));
     }
 }
 

@@ -14,9 +14,10 @@ static_assert(PACK_DATA == Ipc::ProcessPack::CMD_ID);
 template<typename Length>
 void appendText(std::string& bytes, std::string_view text, char const* what) {
     if (text.size() > std::numeric_limits<Length>::max())
-        throw Base::Error(std::string("The name of a ") + what + " has " + std::to_string(text.size()) +
-                          " bytes, and " + std::to_string(std::numeric_limits<Length>::max()) +
-                          " is the most that can be sent.");
+        throw Base::Error(Base::Code::TooLarge, std::string("The name of a ") + what + " has " +
+                                                    std::to_string(text.size()) + " bytes, and " +
+                                                    std::to_string(std::numeric_limits<Length>::max()) +
+                                                    " is the most that can be sent.");
     appendNumber(bytes, static_cast<Length>(text.size()));
     bytes += text;
 }
@@ -39,7 +40,7 @@ public:
 private:
     std::string_view take(std::size_t size) {
         if (size > rest_.size())
-            throw Base::Error("A data message ends before its names do.");
+            throw Base::Error(Base::Code::ConnectionBroken, "A data message ends before its names do.");
         std::string_view const taken = rest_.substr(0, size);
         rest_.remove_prefix(size);
         return taken;
@@ -50,10 +51,12 @@ private:
 
 void requireInsidePage(DataPiece const& piece) {
     if (piece.bytes.empty() || piece.bytes.size() > MAX_PIECE)
-        throw Base::Error("A data message holds " + std::to_string(piece.bytes.size()) +
-                          " bytes of a page, and 1 to " + std::to_string(MAX_PIECE) + " is what it may.");
+        throw Base::Error(Base::Code::ConnectionBroken,
+                          "A data message holds " + std::to_string(piece.bytes.size()) +
+                              " bytes of a page, and 1 to " + std::to_string(MAX_PIECE) + " is what it may.");
     if (piece.offset > piece.size || piece.bytes.size() > piece.size - piece.offset)
-        throw Base::Error("A data message holds bytes behind the end of its page.");
+        throw Base::Error(Base::Code::ConnectionBroken,
+                          "A data message holds bytes behind the end of its page.");
 }
 
 } // namespace

@@ -22,8 +22,8 @@ constexpr std::size_t SEQUENCE_AT = 2;
 constexpr std::size_t LENGTH_AT = 6;
 
 [[noreturn]] void refuseLength(std::size_t length, std::size_t limit) {
-    throw Base::Error("A message of " + std::to_string(length) + " bytes is over the limit of " +
-                      std::to_string(limit) + ".");
+    throw Base::Error(Base::Code::TooLarge, "A message of " + std::to_string(length) +
+                                                " bytes is over the limit of " + std::to_string(limit) + ".");
 }
 
 bool isKind(std::uint8_t kind, std::uint16_t version) {
@@ -102,7 +102,8 @@ std::size_t FrameDecoder::announced() const {
         return 0;
     auto const kind = numberAt<std::uint8_t>(unread(), KIND_AT);
     if (!isKind(kind, version_))
-        throw Base::Error("There is no message of kind " + std::to_string(kind) + ".");
+        throw Base::Error(Base::Code::ConnectionBroken,
+                          "There is no message of kind " + std::to_string(kind) + ".");
     auto const length = numberAt<std::uint32_t>(unread(), LENGTH_AT);
     std::uint32_t const limit = limitOf(static_cast<Kind>(kind), limit_);
     if (length > limit)
@@ -112,20 +113,22 @@ std::size_t FrameDecoder::announced() const {
 
 void FrameDecoder::requireSeal(std::string_view message, std::string_view seal) {
     if (seal_ && !isSameProof(seal, seal_->next(message)))
-        throw Base::Error("A message is not sealed by the other side of this connection.");
+        throw Base::Error(Base::Code::ConnectionBroken,
+                          "A message is not sealed by the other side of this connection.");
 }
 
 bool FrameDecoder::readPreface() {
     std::string_view const magic = unread().substr(0, MAGIC.size());
     if (magic != MAGIC.substr(0, magic.size()))
-        throw Base::Error("The first bytes are not those of this protocol.");
+        throw Base::Error(Base::Code::ConnectionBroken, "The first bytes are not those of this protocol.");
     if (unread().size() < PREFACE_SIZE)
         return false;
     std::uint16_t const version = *versionIn(unread());
     if (version < VERSION_1 || version > VERSION)
-        throw Base::Error("Version " + std::to_string(version) +
-                          " of the protocol is not spoken here, only the versions " +
-                          std::to_string(VERSION_1) + " and " + std::to_string(VERSION) + '.');
+        throw Base::Error(Base::Code::VersionMismatch,
+                          "Version " + std::to_string(version) +
+                              " of the protocol is not spoken here, only the versions " +
+                              std::to_string(VERSION_1) + " and " + std::to_string(VERSION) + '.');
     begin_ += PREFACE_SIZE;
     version_ = version;
     return true;

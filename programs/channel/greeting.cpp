@@ -21,7 +21,7 @@ GreetingStep goOn(Kind kind, std::uint32_t sequence, json::Object const& text) {
 
 json::Object requestIn(Frame const& message, std::uint32_t sequence) {
     if (message.command != GREETING || message.kind != Kind::Request || message.sequence != sequence)
-        throw Base::Error("The greeting is missing.");
+        throw Base::Error(Base::Code::ConnectionBroken, "The greeting is missing.");
     return parse(message.text);
 }
 
@@ -44,9 +44,9 @@ std::optional<SealKeys> sealsFor(Terms const& terms, std::string const& clientNo
 
 json::Object answerIn(Frame const& message, std::uint32_t sequence) {
     if (message.kind == Kind::Error)
-        throw Base::Error("It refuses: " + reasonOf(message.text));
+        throw Base::Error(Base::Code::ConnectionRefused, "It refuses: " + reasonOf(message.text));
     if (message.command != GREETING || message.kind != Kind::Response || message.sequence != sequence)
-        throw Base::Error("It does not greet.");
+        throw Base::Error(Base::Code::ConnectionBroken, "It does not greet.");
     return parse(message.text);
 }
 
@@ -67,7 +67,7 @@ GreetingStep ServiceGreeting::take(Frame const& message) {
             break;
         }
     } catch (std::exception const& e) {
-        return refusal(e.what());
+        return refusal(Base::codedLine(e));
     }
     return refusal("The greeting is over.");
 }
@@ -91,7 +91,8 @@ void ServiceGreeting::lookUpToken(json::Value const& id) {
     if (tokens_)
         keys_ = tokens_(tokenId_);
     if (!keys_)
-        throw Base::Error("Its access token is none of this service, or was revoked.");
+        throw Base::Error(Base::Code::TokenRefused,
+                          "Its access token is none of this service, or was revoked.");
 }
 
 std::string ServiceGreeting::provenSecret(std::string const& proof) const {
@@ -150,7 +151,7 @@ GreetingStep ClientGreeting::take(Frame const& message) {
             break;
         }
     } catch (std::exception const& e) {
-        return refusal(e.what());
+        return refusal(Base::codedLine(e));
     }
     return refusal("The greeting is over.");
 }

@@ -26,7 +26,8 @@ std::vector<std::string> lookUpHost(std::string const& host) {
     wanted.ai_flags = AI_ADDRCONFIG;
     addrinfo* first = nullptr;
     if (int const failure = ::getaddrinfo(host.c_str(), nullptr, &wanted, &first); failure != 0)
-        throw Base::Error(std::string("The host cannot be found: ") + ::gai_strerror(failure) + '.');
+        throw Base::Error(Base::Code::ServiceUnreachable,
+                          std::string("The host cannot be found: ") + ::gai_strerror(failure) + '.');
     std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> const list(first, ::freeaddrinfo);
     std::vector<std::string> addresses;
     for (addrinfo const* found = list.get(); found; found = found->ai_next)

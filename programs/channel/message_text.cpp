@@ -53,12 +53,18 @@ std::string print(json::Object const& object) {
 
 json::Object parse(std::string_view text, std::size_t limit) {
     if (memoryOf(text) > limit)
-        throw Base::Error("The values of a message of " + std::to_string(text.size()) +
-                          " bytes would take more than " + std::to_string(limit / MIB) + " MiB of memory.");
+        throw Base::Error(Base::Code::TooLarge, "The values of a message of " + std::to_string(text.size()) +
+                                                    " bytes would take more than " +
+                                                    std::to_string(limit / MIB) + " MiB of memory.");
     return json::strToObject(text.data(), text.size());
 }
 
-std::string printError(std::string const& reason) { return print({{ERR, Base::oneLine(reason)}}); }
+std::string printError(std::string const& reason) {
+    // What is cut is the line and not its code.
+    Base::Error const said = Base::errorSaid(reason, Base::Code::Unexpected);
+    std::string const line = Base::oneLine(said.what());
+    return print({{ERR, said.what() == reason ? line : Base::codedLine(line, said.code())}});
+}
 
 std::string reasonOf(std::string_view errorText) {
     try {

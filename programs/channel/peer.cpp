@@ -294,23 +294,24 @@ void Peer::onRequest(Frame const& message) {
     try {
         takeRequest(message.command);
     } catch (std::exception const& e) {
-        return refuseRequest(e.what());
+        return refuseRequest(Base::codedLine(e));
     }
     Answer const answer(std::make_shared<Answer::State>(io_, weak_from_this()));
     try {
         context_->handler()(request_->cmd, answer);
     } catch (std::exception const& e) {
-        answer.fail(e.what());
+        answer.fail(Base::codedLine(e));
     }
 }
 
 void Peer::takeRequest(std::uint8_t command) {
     request_->cmd = context_->factory()(command, shared_from_this());
     if (!request_->cmd)
-        throw Base::Error("There is no command with the number " + std::to_string(command) + '.');
+        throw Base::Error(Base::Code::RequestInvalid,
+                          "There is no command with the number " + std::to_string(command) + '.');
     request_->cmd->readReq();
     if (!request_->isRead)
-        throw Base::Error("This command cannot be received.");
+        throw Base::Error(Base::Code::RequestInvalid, "This command cannot be received.");
 }
 
 void Peer::read(std::shared_ptr<Ipc::CmdI> cmd, Message which,
@@ -329,7 +330,7 @@ void Peer::answered(std::optional<std::string> const& failure, Telling telling) 
     try {
         request_->cmd->sendResp();
     } catch (std::exception const& e) {
-        return refuseRequest(e.what());
+        return refuseRequest(Base::codedLine(e));
     }
     if (!request_->isAnswered)
         refuseRequest("This command cannot be answered.");
@@ -415,7 +416,7 @@ void Peer::handOver(std::string text, DataStored const& stored) {
     try {
         context_->dataHandler()({shared_from_this(), std::move(text)}, stored);
     } catch (std::exception const& e) {
-        stored.fail(e.what());
+        stored.fail(Base::codedLine(e));
     }
 }
 

@@ -101,7 +101,7 @@ std::string hmac(std::string_view key, std::string_view message) {
               reinterpret_cast<unsigned char const*>(message.data()), message.size(), bytes.data(),
               &length) ||
         length != SHA256_DIGEST_LENGTH)
-        throw Base::Error("The crypto library cannot compute a proof.");
+        throw Base::Error(Base::Code::ProgramLimited, "The crypto library cannot compute a proof.");
     return {reinterpret_cast<char const*>(bytes.data()), length};
 }
 

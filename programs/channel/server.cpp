@@ -42,7 +42,8 @@ tcp::endpoint endpointOf(ServerSettings const& settings) {
     error_code ec;
     auto const address = asio::ip::make_address(settings.address, ec);
     if (ec)
-        throw Base::Error('"' + settings.address + "\" is no IP address to listen on.");
+        throw Base::Error(Base::Code::AddressUnusable,
+                          '"' + settings.address + "\" is no IP address to listen on.");
     return {address, settings.port};
 }
 
@@ -51,8 +52,9 @@ std::unique_ptr<asio::ssl::context> tlsFor(tcp::endpoint const& endpoint, Server
         return nullptr;
     if (settings.certificateFile.empty() || settings.keyFile.empty())
         throw Base::Error(
+            Base::Code::TlsUnusable,
             "TLS on " + settings.address +
-            " needs a certificate and its private key; only a loopback address can do without TLS.");
+                " needs a certificate and its private key; only a loopback address can do without TLS.");
     return makeServiceContext(settings.certificateFile, settings.keyFile);
 }
 
@@ -62,7 +64,7 @@ tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint, int 
     } catch (boost::system::system_error const& e) {
         std::ostringstream message;
         message << "Cannot listen on " << endpoint << ": " << e.code().message() << '.';
-        throw Base::Error(message.str());
+        throw Base::Error(Base::Code::AddressUnusable, message.str());
     }
 }
 
@@ -76,8 +78,9 @@ public:
           dataHandler_(std::move(dataHandler)) {
         tcp::endpoint const endpoint = endpointOf(settings_);
         if (settings_.token.size() < MIN_TOKEN_LENGTH)
-            throw Base::Error("An access token has at least " + std::to_string(MIN_TOKEN_LENGTH) +
-                              " characters.");
+            throw Base::Error(Base::Code::TokenInvalid, "An access token has at least " +
+                                                            std::to_string(MIN_TOKEN_LENGTH) +
+                                                            " characters.");
         tls_ = tlsFor(endpoint, settings_);
         if (tls_)
             fingerprint_ = fingerprintOf(*tls_);

@@ -34,7 +34,7 @@ std::string fingerprintOf(X509 const* certificate) {
     // Short of memory, the library may give the digest of another function and call that a success.
     if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1 ||
         length != SHA256_DIGEST_LENGTH)
-        throw Base::Error("The fingerprint of the certificate cannot be computed.");
+        throw Base::Error(Base::Code::TlsUnusable, "The fingerprint of the certificate cannot be computed.");
     constexpr char const* DIGITS = "0123456789ABCDEF";
     std::string text;
     for (unsigned int i = 0; i < length; ++i) {
@@ -110,13 +110,14 @@ private:
 std::unique_ptr<ssl::context> makeContext(ssl::context::method method) {
     auto context = std::make_unique<ssl::context>(method);
     if (SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_3_VERSION) != 1)
-        throw Base::Error("TLS 1.3 is not to be had.");
+        throw Base::Error(Base::Code::TlsUnusable, "TLS 1.3 is not to be had.");
     return context;
 }
 
 void orThrow(error_code const& ec, std::string const& what, std::string const& file) {
     if (ec)
-        throw Base::Error("Cannot use the " + what + " \"" + file + "\": " + ec.message() + '.');
+        throw Base::Error(Base::Code::TlsUnusable,
+                          "Cannot use the " + what + " \"" + file + "\": " + ec.message() + '.');
 }
 
 } // namespace
@@ -155,7 +156,7 @@ long long certificateEnd(ssl::context& context) {
     X509 const* const certificate = SSL_CTX_get0_certificate(context.native_handle());
     std::tm end{};
     if (!certificate || ASN1_TIME_to_tm(X509_get0_notAfter(certificate), &end) != 1)
-        throw Base::Error("The end of the certificate cannot be read.");
+        throw Base::Error(Base::Code::TlsUnusable, "The end of the certificate cannot be read.");
     return ::timegm(&end);
 }
 

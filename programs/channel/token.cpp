@@ -28,7 +28,7 @@ std::string randomHex(std::size_t size = RANDOM_BYTES) {
     Base::requireCrypto();
     std::array<unsigned char, RANDOM_BYTES> bytes;
     if (RAND_bytes(bytes.data(), static_cast<int>(size)) != 1)
-        throw Base::Error("The system gives no random numbers.");
+        throw Base::Error(Base::Code::ProgramLimited, "The system gives no random numbers.");
     return Base::toHex(bytes.data(), size);
 }
 
@@ -49,8 +49,9 @@ std::string readToken(std::string const& file) {
     std::string const contents = Base::readPrivateFile(file, MAX_TOKEN_FILE);
     std::string_view const token = trimmed(contents);
     if (token.size() < MIN_TOKEN_LENGTH || !std::all_of(token.begin(), token.end(), isWordCharacter))
-        throw Base::Error("The file \"" + file + "\" holds no access token, which is one word of at least " +
-                          std::to_string(MIN_TOKEN_LENGTH) + " characters.");
+        throw Base::Error(Base::Code::TokenInvalid,
+                          "The file \"" + file + "\" holds no access token, which is one word of at least " +
+                              std::to_string(MIN_TOKEN_LENGTH) + " characters.");
     return std::string(token);
 }
 

@@ -29,7 +29,10 @@ public:
         Lost,
     };
 
-    QueryError(Kind kind, std::string const& what) : DatabaseError(what), kind_(kind) {}
+    QueryError(Kind kind, std::string const& what)
+        : DatabaseError(kind == Kind::Lost ? Base::Code::DatabaseUnavailable : Base::Code::DatabaseFailed,
+                        what),
+          kind_(kind) {}
     Kind kind() const { return kind_; }
 
 private:

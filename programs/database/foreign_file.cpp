@@ -52,7 +52,8 @@ struct flock lockOf(short type, off_t start, off_t size) {
 struct stat statusOf(fs::path const& path, DatabaseKind const& kind, fs::path const& file) {
     struct stat status {};
     if (::lstat(path.c_str(), &status) != 0)
-        throw DatabaseError("there is no " + std::string(kind.name) + " " + file.string());
+        throw DatabaseError(Base::Code::DatabaseMissing,
+                            "there is no " + std::string(kind.name) + " " + file.string());
     return status;
 }
 
@@ -60,11 +61,12 @@ struct stat statusOf(fs::path const& path, DatabaseKind const& kind, fs::path co
 void requireOwn(fs::path const& path, DatabaseKind const& kind, fs::path const& file) {
     struct stat const status = statusOf(path, kind, file);
     if (status.st_uid != ::geteuid())
-        throw DatabaseError(theFile(kind, file) + " is not read, because " + path.string() +
-                            " belongs to another user");
+        throw DatabaseError(Base::Code::DatabaseUnusable, theFile(kind, file) + " is not read, because " +
+                                                              path.string() + " belongs to another user");
     if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
-        throw DatabaseError(theFile(kind, file) + " is not read, because others may write " + path.string() +
-                            ": take their right away (chmod go-w)");
+        throw DatabaseError(Base::Code::DatabaseUnusable,
+                            theFile(kind, file) + " is not read, because others may write " + path.string() +
+                                ": take their right away (chmod go-w)");
 }
 
 /// The file's name in a form that takes options.
@@ -111,7 +113,8 @@ public:
     SharedLock(fs::path const& file, DatabaseKind const& kind)
         : descriptor_(::open(file.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC)) {
         if (descriptor_ < 0)
-            throw DatabaseError("cannot open " + theFile(kind, file) + ": " + std::strerror(errno));
+            throw DatabaseError(Base::Code::DatabaseUnavailable,
+                                "cannot open " + theFile(kind, file) + ": " + std::strerror(errno));
         try {
             wait(PENDING_BYTE, 1, kind, file);
             wait(SHARED_FIRST, SHARED_SIZE, kind, file);
@@ -136,7 +139,8 @@ private:
         auto const end = std::chrono::steady_clock::now() + LOCK_TIME;
         while (!set(F_RDLCK, start, size)) {
             if (std::chrono::steady_clock::now() >= end)
-                throw DatabaseError(theFile(kind, file) + " is held by another program: try again later");
+                throw DatabaseError(Base::Code::DatabaseBusy,
+                                    theFile(kind, file) + " is held by another program: try again later");
             std::this_thread::sleep_for(LOCK_PAUSE);
         }
     }
@@ -147,9 +151,11 @@ private:
         std::error_code ignored;
         bool const hasJournal = fs::exists(file.string() + "-journal", ignored);
         if (hasJournal && ::fcntl(descriptor_, F_OFD_GETLK, &lock) == 0 && lock.l_type == F_UNLCK)
-            throw DatabaseError(theFile(kind, file) +
-                                " was left in the middle of a change: let the program that wrote it open it "
-                                "once more");
+            throw DatabaseError(
+                Base::Code::DatabaseUnusable,
+                theFile(kind, file) +
+                    " was left in the middle of a change: let the program that wrote it open it "
+                    "once more");
     }
 
     int descriptor_;
@@ -160,7 +166,8 @@ ForeignFile::ForeignFile(fs::path file, DatabaseKind const& kind, int maxValueBy
     : path_(std::move(file)), operationTime_(operationTime) {
     // A pipe would hold up the opening, and a folder would fail with a misleading text.
     if (!S_ISREG(statusOf(path_, kind, path_).st_mode))
-        throw DatabaseError("there is no " + std::string(kind.name) + " " + path_.string());
+        throw DatabaseError(Base::Code::DatabaseMissing,
+                            "there is no " + std::string(kind.name) + " " + path_.string());
     requireOwn(fs::absolute(path_).parent_path(), kind, path_);
     requireOwn(path_, kind, path_);
     lock_ = std::make_unique<SharedLock>(path_, kind);

@@ -44,7 +44,7 @@ Options optionsIn(std::string const& address) {
     std::string const why = problem ? firstLine(problem) : std::string();
     PQfreemem(problem);
     if (!options)
-        throw DatabaseError("the address of the database cannot be read: " + why);
+        throw DatabaseError(Base::Code::Usage, "the address of the database cannot be read: " + why);
     return options;
 }
 
@@ -182,11 +182,13 @@ struct PostgresSession {
 
 void requirePostgresAddress(std::string const& address) {
     if (!address.starts_with("postgresql://") && !address.starts_with("postgres://"))
-        throw DatabaseError("the address of the database is none: wanted is postgresql://HOST/NAME");
+        throw DatabaseError(Base::Code::Usage,
+                            "the address of the database is none: wanted is postgresql://HOST/NAME");
     Options const options = optionsIn(address);
     for (char const* const secret : {"password", "sslpassword"})
         if (optionOf(options.get(), secret))
-            throw DatabaseError("others on this machine can read a password that stands on the command line: "
+            throw DatabaseError(Base::Code::Usage,
+                                "others on this machine can read a password that stands on the command line: "
                                 "put it into ~/.pgpass or a service file");
 }
 

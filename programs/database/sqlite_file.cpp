@@ -24,8 +24,9 @@ constexpr int BUSY_TIMEOUT_MS = 60'000;
 constexpr char const* IN_MEMORY = ":memory:";
 
 [[noreturn]] void failDamaged(DatabaseKind const& kind, fs::path const& file, std::string const& how) {
-    throw DatabaseError(theFile(kind, file) + " is damaged (" + how +
-                        "): restore it from a backup, or move it away to begin anew");
+    throw DatabaseError(Base::Code::DatabaseDamaged,
+                        theFile(kind, file) + " is damaged (" + how +
+                            "): restore it from a backup, or move it away to begin anew");
 }
 
 int number(SQLite::Database& database, char const* query) { return database.execAndGet(query).getInt(); }
@@ -79,7 +80,8 @@ void create(fs::path const& file, DatabaseKind const& kind) {
     std::string temporary = file.string() + ".XXXXXX.part";
     int const reserved = ::mkstemps(temporary.data(), 5);
     if (reserved < 0)
-        throw DatabaseError("cannot open " + theFile(kind, file) + ": unable to open database file");
+        throw DatabaseError(Base::Code::DatabaseUnavailable,
+                            "cannot open " + theFile(kind, file) + ": unable to open database file");
     ::close(reserved);
     auto const remove = [&] { ::unlink(temporary.c_str()); };
     try {
@@ -91,7 +93,8 @@ void create(fs::path const& file, DatabaseKind const& kind) {
     if (!giveName(temporary.c_str(), file.c_str())) {
         int const error = errno;
         remove();
-        throw DatabaseError("cannot open " + theFile(kind, file) + ": " + std::strerror(error));
+        throw DatabaseError(Base::Code::DatabaseUnavailable,
+                            "cannot open " + theFile(kind, file) + ": " + std::strerror(error));
     }
     remove();
 }
@@ -103,7 +106,7 @@ std::string theFile(DatabaseKind const& kind, fs::path const& file) {
 }
 
 void failOther(DatabaseKind const& kind, fs::path const& file) {
-    throw DatabaseError(file.string() + " is not a " + kind.name);
+    throw DatabaseError(Base::Code::DatabaseUnusable, file.string() + " is not a " + kind.name);
 }
 
 void rethrow(SQLite::Exception const& failure, DatabaseKind const& kind, fs::path const& file) {
@@ -113,18 +116,21 @@ void rethrow(SQLite::Exception const& failure, DatabaseKind const& kind, fs::pat
     case SQLITE_CORRUPT:
         failDamaged(kind, file, failure.what());
     case SQLITE_READONLY:
-        throw DatabaseError(theFile(kind, file) + " cannot be written: check the rights of the file");
+        throw DatabaseError(Base::Code::DatabaseUnusable,
+                            theFile(kind, file) + " cannot be written: check the rights of the file");
     default:
-        throw DatabaseError("cannot open " + theFile(kind, file) + ": " + failure.what());
+        throw DatabaseError(Base::Code::DatabaseUnavailable,
+                            "cannot open " + theFile(kind, file) + ": " + failure.what());
     }
 }
 
 void requireKnownVersion(DatabaseKind const& kind, std::string const& database, long long version) {
     auto const known = static_cast<long long>(kind.migrations.size());
     if (version > known)
-        throw DatabaseError(database + " was written by a newer version of this program (schema " +
-                            std::to_string(version) + ", known is " + std::to_string(known) +
-                            "): use that version");
+        throw DatabaseError(Base::Code::DatabaseNewer,
+                            database + " was written by a newer version of this program (schema " +
+                                std::to_string(version) + ", known is " + std::to_string(known) +
+                                "): use that version");
 }
 
 void requireKind(SQLite::Database& database, DatabaseKind const& kind, fs::path const& file) {

@@ -31,8 +31,9 @@ void ContainerWriter::finish(SharedMemBuffer metadata, std::string const& remedy
     errno = 0;
     if (!container_.finalizeOutput(std::move(metadata))) {
         noteFailure();
-        throw Base::Error("cannot write " + Base::inQuotes(file_.target().string()) + ": " +
-                          std::generic_category().message(failure_) + "; " + remedy);
+        throw Base::Error(Base::Code::FileUnwritable,
+                          "cannot write " + Base::inQuotes(file_.target().string()) + ": " +
+                              std::generic_category().message(failure_) + "; " + remedy);
     }
     file_.commit();
 }

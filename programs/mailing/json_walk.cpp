@@ -167,6 +167,6 @@ void JsonWalk::skipNumberOrWord() {
         fail();
 }
 
-void JsonWalk::fail() { throw Base::Error("it is no metadata of a mailing"); }
+void JsonWalk::fail() { throw Base::Error(Base::Code::MailingDamaged, "it is no metadata of a mailing"); }
 
 } // namespace Mailing

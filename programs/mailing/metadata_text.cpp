@@ -23,7 +23,7 @@ std::uint64_t claimedBytes(SharedMemBuffer const& blob) {
 
 } // namespace
 
-void failAsMetadata() { throw Base::Error("it is no metadata of a mailing"); }
+void failAsMetadata() { throw Base::Error(Base::Code::MailingDamaged, "it is no metadata of a mailing"); }
 
 SharedMemBuffer expandedMetadata(SharedMemBuffer blob) {
     if (claimedBytes(blob) > MAX_BYTES)

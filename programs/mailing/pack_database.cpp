@@ -50,7 +50,8 @@ decltype(auto) orDatabaseError(fs::path const& file, Operation operation) {
     try {
         return operation();
     } catch (SQLite::Exception const& failure) {
-        throw Database::DatabaseError("the pack database " + file.string() + " failed: " + failure.what());
+        throw Database::DatabaseError(Base::Code::DatabaseFailed,
+                                      "the pack database " + file.string() + " failed: " + failure.what());
     }
 }
 
@@ -64,8 +65,8 @@ PackInfo infoIn(SQLite::Database& database, fs::path const& file, std::string co
     SQLite::Statement query(database, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
     query.bind(1, packId);
     if (!query.executeStep())
-        throw Database::DatabaseError("the pack database " + file.string() + " has no finished pack " +
-                                      packId);
+        throw Database::DatabaseError(Base::Code::MailingUnknown, "the pack database " + file.string() +
+                                                                      " has no finished pack " + packId);
     return {query.getColumn(0).getString(), query.getColumn(1).getString(), query.getColumn(2).getString()};
 }
 
@@ -79,7 +80,8 @@ std::vector<PackSource::PageName> namesIn(SQLite::Database& database, std::strin
             names.emplace_back(query.getColumn(0).getString(), query.getColumn(1).getString());
         bytes += sizeof name + name.document.size() + name.page.size();
         if (bytes > MAX_NAMES_BYTES)
-            throw Database::DatabaseError("pack " + packId + " has more pages than a mailing can hold");
+            throw Database::DatabaseError(Base::Code::TooLarge,
+                                          "pack " + packId + " has more pages than a mailing can hold");
     }
     return names;
 }
@@ -112,7 +114,8 @@ PackDatabaseWriter::PackDatabaseWriter(fs::path const& file, PackInfo const& pac
     : PageSaverI(pack.id), file_(file),
       database_(Database::openDatabase(file, packDatabase(), Database::Journal::Rollback)) {
     if (!isPackId(pack.id))
-        throw Database::DatabaseError("the pack id \"" + pack.id + "\" cannot name a file");
+        throw Database::DatabaseError(Base::Code::MailingIdInvalid,
+                                      "the pack id \"" + pack.id + "\" cannot name a file");
     orDatabaseError(file_, [&] { begin(pack); });
 }
 
@@ -141,17 +144,17 @@ void PackDatabaseWriter::begin(PackInfo const& pack) {
     insertion.bind(3, pack.title);
     insertion.bind(4, static_cast<std::int64_t>(now));
     if (insertion.exec() == 0)
-        throw Database::DatabaseError("the pack database " + file_.string() + " has a pack " + pack.id +
-                                      " already");
+        throw Database::DatabaseError(Base::Code::MailingExists, "the pack database " + file_.string() +
+                                                                     " has a pack " + pack.id + " already");
     transaction.commit();
 }
 
 void PackDatabaseWriter::savePage(std::string const& document, std::string const& page,
                                   SharedMemBuffer data) {
     if (data.empty() || data.size() > MAX_BLOB_BYTES)
-        throw Database::DatabaseError("page \"" + page + "\" of \"" + document +
-                                      "\" cannot be stored: it has " + std::to_string(data.size()) +
-                                      " bytes");
+        throw Database::DatabaseError(Base::Code::TooLarge, "page \"" + page + "\" of \"" + document +
+                                                                "\" cannot be stored: it has " +
+                                                                std::to_string(data.size()) + " bytes");
     batchBytes_ += data.size();
     batch_.push_back({document, page, std::move(data)});
     if (batchBytes_ < BATCH_BYTES)

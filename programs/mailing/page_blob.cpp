@@ -11,15 +11,16 @@ namespace Mailing {
 SharedMemBuffer compressed(std::string_view data) {
     SharedMemBuffer blob = PageSaverI::zipDbData(data.data(), data.size());
     if (blob.empty())
-        throw Base::Error("there is no memory to compress " + std::to_string(data.size()) +
-                          " bytes; close other programs or raise the limit");
+        throw Base::Error(Base::Code::OutOfMemory, "there is no memory to compress " +
+                                                       std::to_string(data.size()) +
+                                                       " bytes; close other programs or raise the limit");
     return blob;
 }
 
 SharedMemBuffer expanded(SharedMemBuffer blob) {
     SharedMemBuffer data = PageLoaderI::unzipDbData(std::move(blob));
     if (data.empty())
-        throw Base::Error("it cannot be expanded, or there is no memory for it");
+        throw Base::Error(Base::Code::MailingDamaged, "it cannot be expanded, or there is no memory for it");
     return data;
 }
 

@@ -16,7 +16,8 @@ namespace Patterns {
 /// A pattern that cannot be compiled, in the engine's words; `position` counts characters from its start.
 class Broken : public Base::Error {
 public:
-    Broken(std::string const& reason, std::size_t at) : Error(reason), position(at) {}
+    Broken(std::string const& reason, std::size_t at)
+        : Error(Base::Code::PatternInvalid, reason), position(at) {}
 
     std::size_t position;
 };

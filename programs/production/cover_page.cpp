@@ -39,7 +39,8 @@ Reader::Point placeFor(std::vector<std::string> const& lines, Box const& window)
     int const width = lengthOf(columnsOf(lines), TypedPage::COLUMN);
     int const height = lengthOf(static_cast<int>(lines.size()), TypedPage::ROW);
     if (lines.empty() || width > window.width() || height > window.height())
-        throw Base::Error("the address does not fit into the window; shorten its lines");
+        throw Base::Error(Base::Code::LetterUnsuitable,
+                          "the address does not fit into the window; shorten its lines");
     return {window.left + std::min(INDENT, (window.width() - width) / 2),
             window.top + (window.height() - height) / 2};
 }
@@ -65,7 +66,8 @@ bool isOfWindow(Finding const& finding) {
 
 std::string coverPage(std::string const& address, ProductionRules const& rules) {
     if (!rules.window)
-        throw Base::Error("the pack preset has no window; add \"window\" to its \"production\"");
+        throw Base::Error(Base::Code::SettingMissing,
+                          "the pack preset has no window; add \"window\" to its \"production\"");
     std::vector<std::string> const lines = linesOf(address);
     Reader::Point const first = placeFor(lines, *rules.window);
     Reader::Page page{1, rules.sheet.width, rules.sheet.height, {}, {{TypedPage::FONT}}, true};

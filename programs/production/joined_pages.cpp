@@ -133,7 +133,7 @@ void JoinedPages::add(std::string_view pdf) {
         throw;
     } catch (std::exception const&) {
         // What is wrong is told without words of the page.
-        throw Base::Error("is no page of a PDF");
+        throw Base::Error(Base::Code::DocumentUnreadable, "is no page of a PDF");
     }
 }
 

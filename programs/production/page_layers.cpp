@@ -148,7 +148,8 @@ void parse(QPDF& pdf, std::string const& bytes, std::string const& where) {
 }
 
 [[noreturn]] void failToLay(std::string const& where) {
-    throw Base::Error(where + ": cannot be made ready, it is damaged; print it to a new PDF");
+    throw Base::Error(Base::Code::DocumentUnreadable,
+                      where + ": cannot be made ready, it is damaged; print it to a new PDF");
 }
 
 } // namespace

@@ -28,8 +28,9 @@ std::string hasMoreThan(std::filesystem::path const& name, std::string const& wh
 PreparedPage preparedPage(Reader::Document& document, int number, std::string const& where) {
     PreparedPage made{document.singlePagePdf(number), document.pageSize(number)};
     if (!document.showsTheSame(number, made.pdf))
-        throw Base::Error(where + ": page " + std::to_string(number) +
-                          " would look different when it stands alone; print the document to a new PDF");
+        throw Base::Error(Base::Code::DocumentUnreadable,
+                          where + ": page " + std::to_string(number) +
+                              " would look different when it stands alone; print the document to a new PDF");
     made.isColoured = hasColour(document, number, made.pdf);
     return made;
 }
@@ -38,10 +39,11 @@ PreparedPage preparedPage(Reader::Document& document, int number, std::string co
 PreparedDocument takenApart(std::string bytes, std::filesystem::path const& name) {
     std::string const where = name.string();
     if (bytes.size() > MAX_DOCUMENT_BYTES)
-        throw Unusable(whyTooLarge(name));
+        throw Unusable(Base::Code::DocumentTooLarge, whyTooLarge(name));
     Reader::Document document = Reader::openDocument(std::move(bytes), name);
     if (document.pageCount() > MAX_DOCUMENT_PAGES)
-        throw Unusable(hasMoreThan(name, std::to_string(MAX_DOCUMENT_PAGES) + " pages"));
+        throw Unusable(Base::Code::DocumentTooLarge,
+                       hasMoreThan(name, std::to_string(MAX_DOCUMENT_PAGES) + " pages"));
     PreparedDocument prepared;
     for (int number = 1; number <= document.pageCount(); ++number) {
         prepared.pages.push_back(preparedPage(document, number, where));

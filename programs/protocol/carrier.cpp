@@ -289,7 +289,8 @@ std::string typeNames() {
 TypeRow const& typeRowNamed(std::string const& name) {
     auto const found = std::ranges::find(TYPES, name, &TypeRow::name);
     if (found == std::end(TYPES))
-        throw Base::Error("\"type\" of a carrier has to be one of " + typeNames());
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"type\" of a carrier has to be one of " + typeNames());
     return *found;
 }
 
@@ -301,14 +302,16 @@ std::vector<std::string> requiredKeys(TypeRow const& row) {
 void requireKeys(json::Object const& object, TypeRow const& row) {
     for (auto const& [key, value] : object)
         if (!row.hasKey(key))
-            throw Base::Error("a carrier of the type " + std::string(row.name) + " has no key " +
-                              Base::inQuotes(Base::oneLine(key)));
+            throw Base::Error(Base::Code::SettingInvalid, "a carrier of the type " + std::string(row.name) +
+                                                              " has no key " +
+                                                              Base::inQuotes(Base::oneLine(key)));
     for (std::string const& key : requiredKeys(row))
         if (!object.get(key))
-            throw Base::Error("a carrier of the type " + std::string(row.name) + " needs the key " +
-                              Base::inQuotes(key));
+            throw Base::Error(Base::Code::SettingInvalid, "a carrier of the type " + std::string(row.name) +
+                                                              " needs the key " + Base::inQuotes(key));
     if (row.type == CarrierType::Smtp && !object.get(USER) != !object.get(PASSWORD_FILE))
-        throw Base::Error("a carrier of the type smtp has either both of \"user\" and \"password_file\" or "
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "a carrier of the type smtp has either both of \"user\" and \"password_file\" or "
                           "none");
 }
 
@@ -328,14 +331,15 @@ json::Object schemaOf(TypeRow const& row) {
 
 CarrierSettings carrierIn(std::string const& channel, json::Value const& value) {
     if (!isChannelName(channel))
-        throw Base::Error("\"carriers\" has " + Base::inQuotes(Base::oneLine(channel)) +
-                          ", which is no name of an address such as postal, email, fax or sms");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"carriers\" has " + Base::inQuotes(Base::oneLine(channel)) +
+                              ", which is no name of an address such as postal, email, fax or sms");
     if (!value.isObject())
-        throw Base::Error("the carrier of " + channel + " has to be an object");
+        throw Base::Error(Base::Code::SettingInvalid, "the carrier of " + channel + " has to be an object");
     try {
         return CarrierSettings(value.toObject());
     } catch (Base::Error const& wrong) {
-        throw Base::Error("the carrier of " + channel + ": " + wrong.what());
+        throw Base::Error(Base::Code::SettingInvalid, "the carrier of " + channel + ": " + wrong.what());
     }
 }
 
@@ -383,8 +387,9 @@ CarrierSettings::CarrierSettings(json::Object const& object) {
     type = row.type;
     row.read(object, *this);
     if (keepsOrder() && atOnce > 1)
-        throw Base::Error("a carrier of the type " + std::string(row.name) +
-                          " has letters one after another, and so no \"at_once\" above 1");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "a carrier of the type " + std::string(row.name) +
+                              " has letters one after another, and so no \"at_once\" above 1");
 }
 
 std::optional<DayWindow> CarrierSettings::window() const { return windowIn(hours); }
@@ -408,7 +413,8 @@ Carriers carriersIn(json::Object const& object) {
     for (auto const& [channel, value] : object)
         carriers.emplace(channel, carrierIn(channel, value));
     if (carriers.size() > MAX_CHANNELS)
-        throw Base::Error("\"carriers\" has more than " + std::to_string(MAX_CHANNELS) + " channels");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"carriers\" has more than " + std::to_string(MAX_CHANNELS) + " channels");
     return carriers;
 }
 
@@ -446,7 +452,8 @@ CarrierChange::CarrierChange(json::Object const& object) {
     std::string const name = object.get(ACTION).textOrEmpty();
     auto const found = std::ranges::find_if(ACTIONS, [&](auto const& row) { return row.second == name; });
     if (found == std::end(ACTIONS))
-        throw Base::Error("\"action\" of a change of a carrier has to be \"test\", \"pause\" or \"resume\"");
+        throw Base::Error(Base::Code::RequestInvalid,
+                          "\"action\" of a change of a carrier has to be \"test\", \"pause\" or \"resume\"");
     action = found->first;
 }
 

@@ -127,8 +127,9 @@ char const* stateName(JobState state) { return rowOf(state).name; }
 JobState stateNamed(std::string const& name) {
     auto const found = std::ranges::find(STATES, name, &StateRow::name);
     if (found == std::end(STATES))
-        throw Base::Error("there is a job in the state \"" + name +
-                          "\", which this program does not know: use the version that wrote it");
+        throw Base::Error(Base::Code::VersionMismatch,
+                          "there is a job in the state \"" + name +
+                              "\", which this program does not know: use the version that wrote it");
     return found->state;
 }
 
@@ -172,10 +173,11 @@ JobsChange::JobsChange(json::Object const& object) {
     auto const found = std::ranges::find_if(ACTIONS, [&](auto const& row) { return row.second == name; });
     if (found == std::end(ACTIONS))
         throw Base::Error(
+            Base::Code::RequestInvalid,
             "\"action\" of a change of jobs has to be \"hold\", \"release\", \"cancel\" or \"upload\"");
     action = found->first;
     if (ids.empty())
-        throw Base::Error("\"ids\" of a change of jobs has to name one at least");
+        throw Base::Error(Base::Code::RequestInvalid, "\"ids\" of a change of jobs has to name one at least");
 }
 
 json::Object JobsChange::serialize() const {

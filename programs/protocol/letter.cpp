@@ -73,8 +73,9 @@ char const* letterStateName(LetterState state) {
 LetterState letterStateNamed(std::string const& name) {
     auto const found = std::ranges::find(STATES, name, &std::pair<LetterState, char const*>::second);
     if (found == std::end(STATES))
-        throw Base::Error("there is a letter in the state \"" + name +
-                          "\", which this program does not know: use the version that wrote it");
+        throw Base::Error(Base::Code::VersionMismatch,
+                          "there is a letter in the state \"" + name +
+                              "\", which this program does not know: use the version that wrote it");
     return found->first;
 }
 
@@ -92,11 +93,13 @@ LetterChange::LetterChange(json::Object const& object) {
     std::string const name = object.get(ACTION).textOrEmpty();
     auto const found = std::ranges::find_if(ACTIONS, [&](auto const& row) { return row.second == name; });
     if (found == std::end(ACTIONS))
-        throw Base::Error("\"action\" of a change of a letter has to be \"delivered\", \"failed\" or "
+        throw Base::Error(Base::Code::RequestInvalid,
+                          "\"action\" of a change of a letter has to be \"delivered\", \"failed\" or "
                           "\"resend\"");
     action = found->first;
     if (id.empty() || (letter == 0) == (notice == 0))
         throw Base::Error(
+            Base::Code::RequestInvalid,
             "a change of a letter needs the \"id\" of its mailing and its number, \"letter\", or "
             "that of a notice, \"notice\"");
 }

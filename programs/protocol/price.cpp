@@ -33,7 +33,8 @@ template<typename Record>
 void requireKnownKeys(json::Object const& object, std::string const& haveNo) {
     for (auto const& [key, value] : object)
         if (!hasKey(Record::Keys::TABLE, key))
-            throw Base::Error(std::string(Record::IN_WORDS) + haveNo + '"' + key + '"');
+            throw Base::Error(Base::Code::SettingInvalid,
+                              std::string(Record::IN_WORDS) + haveNo + '"' + key + '"');
 }
 
 } // namespace
@@ -87,13 +88,15 @@ namespace {
 
 std::map<std::string, Amounts> channelsIn(json::Value const& each) {
     if (!each.isObject() || each.toObject().size() > Tariff::MAX_CHANNELS)
-        throw Base::Error("\"channels\" of the tariff has to be an object of at most " +
-                          std::to_string(Tariff::MAX_CHANNELS) + " channels with the amounts of each");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"channels\" of the tariff has to be an object of at most " +
+                              std::to_string(Tariff::MAX_CHANNELS) + " channels with the amounts of each");
     std::map<std::string, Amounts> channels;
     for (auto const& [channel, amounts] : each.toObject()) {
         if (!amounts.isObject())
-            throw Base::Error("the amounts of " + Base::oneLine(channel) +
-                              " in the tariff have to be an object, such as {\"letter\": 10}");
+            throw Base::Error(Base::Code::SettingInvalid,
+                              "the amounts of " + Base::oneLine(channel) +
+                                  " in the tariff have to be an object, such as {\"letter\": 10}");
         channels.emplace(channel, amounts.toObject());
     }
     return channels;
@@ -109,7 +112,8 @@ Amounts::Amounts(json::Object const& object) {
 Tariff::Tariff(json::Object const& object) {
     json::readKeys(Keys::TABLE, object, *this);
     if (currency.empty())
-        throw Base::Error("\"currency\" of the tariff has to be " + CurrencyForm::wanted());
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"currency\" of the tariff has to be " + CurrencyForm::wanted());
     json::Object general;
     for (auto const& [key, value] : object)
         if (std::string_view const name = key; name != CURRENCY && name != CHANNELS)
@@ -144,11 +148,12 @@ LetterBatch::LetterBatch(json::Object const& object) {
     requireKnownKeys<LetterBatch>(object, " have no key ");
     json::readKeys(Keys::TABLE, object, *this);
     if (paperSheets > 0 && (paperSheets > pages || paperSheets < fewestSheets()))
-        throw Base::Error("\"paper_sheets\" of the letters have to be " + std::to_string(fewestSheets()) +
-                          " to " + std::to_string(pages));
+        throw Base::Error(Base::Code::RequestInvalid, "\"paper_sheets\" of the letters have to be " +
+                                                          std::to_string(fewestSheets()) + " to " +
+                                                          std::to_string(pages));
     if (colouredPages > pages)
-        throw Base::Error("\"coloured_pages\" of the letters have to be " + std::to_string(pages) +
-                          " at most");
+        throw Base::Error(Base::Code::RequestInvalid, "\"coloured_pages\" of the letters have to be " +
+                                                          std::to_string(pages) + " at most");
 }
 
 json::Object LetterBatch::serialize() const { return writeRecord(*this); }
@@ -158,8 +163,9 @@ PriceRequest::PriceRequest(std::vector<LetterBatch> batches) : letters(std::move
 PriceRequest::PriceRequest(json::Object const& object) {
     json::Value const batches = object.get(LETTERS);
     if (!batches.isArray() || batches.toArray().empty() || batches.toArray().size() > MAX_BATCHES)
-        throw Base::Error("\"letters\" of a price estimate has to be an array of 1 to " +
-                          std::to_string(MAX_BATCHES) + " objects");
+        throw Base::Error(Base::Code::RequestInvalid,
+                          "\"letters\" of a price estimate has to be an array of 1 to " +
+                              std::to_string(MAX_BATCHES) + " objects");
     for (json::Value const& batch : batches.toArray())
         letters.emplace_back(batch.toObject());
 }

@@ -16,7 +16,7 @@ std::string kindOf(json::Object const& question) { return question.get(QUERY).te
 std::string nodeIn(json::Object const& question, std::string const& owner) {
     json::Value const node = question.get(NODE_ID);
     if (!node.isString())
-        throw Base::Error("\"id\" of " + owner + " has to be the id of a node");
+        throw Base::Error(Base::Code::RequestInvalid, "\"id\" of " + owner + " has to be the id of a node");
     return node.toString();
 }
 

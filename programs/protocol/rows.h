@@ -76,8 +76,9 @@ private:
     }
     T checked(json::Value const& node) const {
         if (!form_.fits(node))
-            throw Base::Error('"' + std::string(name_) + "\" of " + Record::IN_WORDS + " has to be " +
-                              form_.wanted());
+            throw Base::Error(Base::Code::RequestInvalid, '"' + std::string(name_) + "\" of " +
+                                                              Record::IN_WORDS + " has to be " +
+                                                              form_.wanted());
         return json::Form<T>::read(node);
     }
 

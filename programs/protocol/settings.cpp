@@ -119,7 +119,8 @@ SettingsImpactQuery::SettingsImpactQuery(json::Object const& object) : id(nodeIn
     json::readKeys(Keys::TABLE, object, *this);
     json::Value const values = object.get(OWN);
     if (!values.isObject())
-        throw Base::Error(std::string("\"own\" of ") + IN_WORDS + " has to be an object");
+        throw Base::Error(Base::Code::RequestInvalid,
+                          std::string("\"own\" of ") + IN_WORDS + " has to be an object");
     own = values.toObject();
 }
 

@@ -32,8 +32,8 @@ Role roleNamed(std::string const& name) {
     for (Role const role : ALL_ROLES)
         if (name == roleName(role))
             return role;
-    throw Base::Error("there is no role \"" + Base::plainLine(name) +
-                      "\"; there are read, send, settings and admin");
+    throw Base::Error(Base::Code::RequestInvalid, "there is no role \"" + Base::plainLine(name) +
+                                                      "\"; there are read, send, settings and admin");
 }
 
 struct TokenAddition::Keys {

@@ -129,12 +129,13 @@ Document openDocument(fs::path const& path) { return openDocument(Base::readFile
 Document openDocument(std::string bytes, fs::path const& name) {
     std::string const where = name.string();
     if (bytes.empty())
-        throw Base::Error(where + ": is empty; export the document again");
+        throw Base::Error(Base::Code::DocumentUnreadable, where + ": is empty; export the document again");
     if (isPdf(bytes))
         return Document(name.filename().string(), openPdf(std::move(bytes), where));
     if (isNamedPdf(name))
-        throw Base::Error(where + ": is named .pdf but seems to be " + std::string(kindInWords(bytes)) +
-                          "; get the document again");
+        throw Base::Error(Base::Code::DocumentUnreadable, where + ": is named .pdf but seems to be " +
+                                                              std::string(kindInWords(bytes)) +
+                                                              "; get the document again");
     return Document(name.filename().string(), openText(bytes, where));
 }
 

@@ -178,9 +178,11 @@ void FieldSearch::takeValue(Try& field, std::shared_ptr<ExtractedField> value) {
 /// The last field is as good as any to look at first: it took some of the time.
 void FieldSearch::requireTime(ExtractField const& field) const {
     if (time_.isUp())
-        throw Base::Error(document_ + ": its patterns took longer than " +
-                          inSeconds(time_.limits().document) + ", that of the field \"" + field.name() +
-                          "\" last; run \"vlmail presets lint\" on the settings and correct the slow ones");
+        throw Base::Error(
+            Base::Code::LimitExceeded,
+            document_ + ": its patterns took longer than " + inSeconds(time_.limits().document) +
+                ", that of the field \"" + field.name() +
+                "\" last; run \"vlmail presets lint\" on the settings and correct the slow ones");
 }
 
 std::string FieldSearch::validate(ExtractField const& field, ExtractedField& value) const {
@@ -188,8 +190,9 @@ std::string FieldSearch::validate(ExtractField const& field, ExtractedField& val
         PatternTime::Turn turn(time_);
         return readValue(field, value, rules_);
     } catch (std::exception const& failure) {
-        throw Base::Error(document_ + ": the value of field \"" + field.name() + "\" cannot be validated (" +
-                          failure.what() + "); correct the field's value_match");
+        throw Base::Error(Base::Code::PatternInvalid, document_ + ": the value of field \"" + field.name() +
+                                                          "\" cannot be validated (" + failure.what() +
+                                                          "); correct the field's value_match");
     }
 }
 

@@ -96,7 +96,8 @@ auto PdfPageWriter::ofPage(int number, int pageCount, Work const& work) {
         return work(page);
     } catch (QPDFExc const& failure) {
         if (failure.getErrorCode() == qpdf_e_password)
-            throw Base::Error(where_ + ": is a PDF whose encryption is not known; save it without one");
+            throw Base::Error(Base::Code::DocumentEncrypted,
+                              where_ + ": is a PDF whose encryption is not known; save it without one");
         failToWrite(number);
     } catch (std::exception const&) {
         failToWrite(number);
@@ -123,7 +124,8 @@ bool PdfPageWriter::writesAnew(int number, int pageCount) {
 }
 
 void PdfPageWriter::failToWrite(int number) const {
-    throw Base::Error(where_ + ": page " + std::to_string(number) + " is damaged; export the document again");
+    throw Base::Error(Base::Code::DocumentUnreadable,
+                      where_ + ": page " + std::to_string(number) + " is damaged; export the document again");
 }
 
 std::string pdfOf(ShownPage const& page) {

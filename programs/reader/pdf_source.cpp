@@ -175,7 +175,8 @@ std::string pngOf(poppler::image const& image) {
     std::string bytes(size, '\0');
     if (!png_image_write_to_memory(&png, bytes.data(), &size, 0, image.const_data(), image.bytes_per_row(),
                                    nullptr))
-        throw Base::Error(std::string("the picture of the page cannot be written: ") + png.message);
+        throw Base::Error(Base::Code::FileUnwritable,
+                          std::string("the picture of the page cannot be written: ") + png.message);
     bytes.resize(size);
     return bytes;
 }
@@ -201,13 +202,15 @@ public:
           objects_(bytes_), extras_(bytes_, where_) {
         preparePoppler();
         if (bytes_.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
-            throw Base::Error(where_ + ": is larger than 2 GiB; split it");
+            throw Base::Error(Base::Code::DocumentTooLarge, where_ + ": is larger than 2 GiB; split it");
         document_.reset(
             poppler::document::load_from_raw_data(bytes_.data(), static_cast<int>(bytes_.size())));
         if (document_ && document_->is_locked())
-            throw Base::Error(where_ + ": is an encrypted PDF; save it without a password");
+            throw Base::Error(Base::Code::DocumentEncrypted,
+                              where_ + ": is an encrypted PDF; save it without a password");
         if (!document_ || document_->pages() < 1)
-            throw Base::Error(where_ + (saysEncrypted(bytes_)
+            throw Base::Error(Base::Code::DocumentUnreadable,
+                              where_ + (saysEncrypted(bytes_)
                                             ? ": is a PDF whose encryption is not known; save it without one"
                                             : ": is a damaged PDF; export the document again"));
     }
@@ -265,8 +268,9 @@ public:
 
     std::optional<Picture> drawPart(int number, Raster const& raster) override {
         if (raster.width < 1 || raster.height < 1 || 1.0 * raster.width * raster.height > MAX_PIXELS)
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " makes too large a picture; ask for fewer dots per inch");
+            throw Base::Error(Base::Code::TooLarge,
+                              where_ + ": page " + std::to_string(number) +
+                                  " makes too large a picture; ask for fewer dots per inch");
         poppler::page_renderer renderer;
         renderer.set_image_format(poppler::image::format_rgb24);
         poppler::image const image =
@@ -294,8 +298,9 @@ public:
         } catch (std::bad_alloc const&) {
             throw;
         } catch (std::exception const&) {
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " cannot be shown as it is printed; print the document to a new PDF");
+            throw Base::Error(Base::Code::DocumentUnreadable,
+                              where_ + ": page " + std::to_string(number) +
+                                  " cannot be shown as it is printed; print the document to a new PDF");
         }
     }
 
@@ -312,8 +317,9 @@ private:
 
     void requireDrawn(poppler::image const& image, int number) const {
         if (!image.is_valid())
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " cannot be drawn; export the document again");
+            throw Base::Error(Base::Code::DocumentUnreadable,
+                              where_ + ": page " + std::to_string(number) +
+                                  " cannot be drawn; export the document again");
     }
 
     std::vector<LostAnnotation> lostAnnotations(int number) {
@@ -340,8 +346,9 @@ private:
         poppler::rectf const sheet = page->page_rect();
         double const scale = dotsPerInch / 72;
         if (!(sheet.width() * scale * sheet.height() * scale <= MAX_PIXELS))
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " makes too large a picture; ask for fewer dots per inch");
+            throw Base::Error(Base::Code::TooLarge,
+                              where_ + ": page " + std::to_string(number) +
+                                  " makes too large a picture; ask for fewer dots per inch");
 
         poppler::page_renderer renderer;
         renderer.set_image_format(poppler::image::format_rgb24);
@@ -361,8 +368,8 @@ private:
     std::unique_ptr<poppler::page> popplerPage(int number) const {
         std::unique_ptr<poppler::page> page(document_->create_page(number - 1));
         if (!page)
-            throw Base::Error(where_ + ": page " + std::to_string(number) +
-                              " is damaged; export the document again");
+            throw Base::Error(Base::Code::DocumentUnreadable, where_ + ": page " + std::to_string(number) +
+                                                                  " is damaged; export the document again");
         return page;
     }
 

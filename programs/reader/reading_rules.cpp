@@ -254,8 +254,9 @@ ReadingRules ReadingRules::of(Cfg::PackPreset const& preset) {
     ReadingRules rules = from(additional.isObject() ? additional.toObject().get(KEY) : json::Value(), faults);
     if (faults.empty())
         return rules;
-    throw Base::Error(placeInWords(KEY, faults.front()) + " of the pack preset " + inQuotes(preset.name()) +
-                      ' ' + faults.front().what + "; " + faults.front().advice);
+    throw Base::Error(Base::Code::SettingInvalid, placeInWords(KEY, faults.front()) + " of the pack preset " +
+                                                      inQuotes(preset.name()) + ' ' + faults.front().what +
+                                                      "; " + faults.front().advice);
 }
 
 } // namespace Reader

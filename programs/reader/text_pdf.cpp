@@ -26,8 +26,8 @@ constexpr char const* FONT_NAME = "TYPING+DejaVuSansMono";
 FontFile const& wideFont() {
     static FontFile const font = [] {
         if (!std::filesystem::exists(FONT_FILE))
-            throw Base::Error(std::string("there is no font ") + FONT_FILE + "; install the package " +
-                              FONT_PACKAGE);
+            throw Base::Error(Base::Code::FontMissing, std::string("there is no font ") + FONT_FILE +
+                                                           "; install the package " + FONT_PACKAGE);
         return FontFile(Base::readFile(FONT_FILE));
     }();
     return font;
@@ -61,8 +61,9 @@ std::set<char32_t> wideCharacters(Page const& page, std::string const& where) {
             continue;
         forEachCharacter(word.text, [&](char32_t c) {
             if (!wideFont().has(c))
-                throw Base::Error(where + ": page " + std::to_string(page.number) + ": no font for \"" +
-                                  word.text + "\"; export the document as PDF");
+                throw Base::Error(Base::Code::FontMissing, where + ": page " + std::to_string(page.number) +
+                                                               ": no font for \"" + word.text +
+                                                               "\"; export the document as PDF");
             characters.insert(c);
         });
     }

@@ -19,7 +19,8 @@ constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
 /// Text in the encoding that it turns out to have.
 std::u16string decode(std::string_view bytes, std::string const& where) {
     if (bytes.find('\0') != std::string_view::npos)
-        throw Base::Error(where + ": is neither a PDF nor text; export the document as PDF");
+        throw Base::Error(Base::Code::DocumentUnreadable,
+                          where + ": is neither a PDF nor text; export the document as PDF");
     if (bytes.substr(0, UTF8_MARK.size()) == UTF8_MARK)
         bytes.remove_prefix(UTF8_MARK.size());
     std::optional<std::u16string> text = utf16Of(bytes);
@@ -130,7 +131,9 @@ private:
         column_ = 0;
     }
 
-    [[noreturn]] void fail(std::string const& what) const { throw Base::Error(where_ + ": " + what); }
+    [[noreturn]] void fail(std::string const& what) const {
+        throw Base::Error(Base::Code::DocumentUnreadable, where_ + ": " + what);
+    }
 
     // What no letter needs; places on larger pages would not fit their numbers.
     static constexpr int MAX_ROWS = 10000;
@@ -173,7 +176,7 @@ private:
 std::unique_ptr<PageSource> openText(std::string_view bytes, std::string const& where) {
     constexpr std::size_t MAX_BYTES = std::size_t{64} << 20;
     if (bytes.size() > MAX_BYTES)
-        throw Base::Error(where + ": has more than 64 MiB of text; split it");
+        throw Base::Error(Base::Code::DocumentTooLarge, where + ": has more than 64 MiB of text; split it");
     return std::make_unique<TextSource>(Typist(where).type(decode(bytes, where)), where);
 }
 

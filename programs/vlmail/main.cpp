@@ -14,7 +14,7 @@ namespace {
 int runOnTerminal(int argc, char** argv) {
     Base::removePendingFilesOnSignals();
     VlMail::Terminal const terminal{std::cout, std::cerr, ::isatty(STDERR_FILENO) == 1};
-    Log::setSink([&](LogPriority, std::string const& line) { terminal.complain(line); });
+    Log::setSink([&](LogPriority, std::string const& line) { terminal.note(line); });
     int const status = VlMail::run(argc, argv, terminal, Base::COMMIT);
     Log::setSink({});
     return status;

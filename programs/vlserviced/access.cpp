@@ -95,7 +95,7 @@ void Access::require(Policy::Right const& right, std::string const& node, Policy
     if (refusal.empty())
         return;
     refused_.note(refusal);
-    throw Base::Error(refusal);
+    throw Base::Error(Base::Code::NotAllowed, refusal);
 }
 
 } // namespace VlServiced

@@ -1,4 +1,5 @@
 #include "programs/base/commit.h"
+#include "programs/base/error.h"
 #include "programs/base/host_port.h"
 #include "programs/base/out_of_memory.h"
 #include "programs/base/plain_log.h"
@@ -22,7 +23,8 @@
 namespace {
 
 constexpr char const* OUT_OF_MEMORY =
-    "vlserviced: there is not enough memory; nothing that was acknowledged is lost, start it again\n";
+    "vlserviced: there is not enough memory; nothing that was acknowledged is lost, start it again "
+    "[out-of-memory]\n";
 
 void serve(VlServiced::Options options) {
     VlServiced::takeHandedOver(options);
@@ -99,7 +101,8 @@ int main(int argc, char** argv) {
     } catch (std::bad_alloc const&) {
         Base::endOutOfMemory();
     } catch (std::exception const& failure) {
-        std::cerr << "vlserviced: " << Base::oneLine(failure.what()) << std::endl;
+        std::cerr << "vlserviced: " << Base::codedLine(Base::oneLine(failure.what()), Base::codeOf(failure))
+                  << std::endl;
         return 1;
     }
 }

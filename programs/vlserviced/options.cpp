@@ -112,7 +112,8 @@ std::variant<Options, int> parseOptions(int argc, char const* const* argv, std::
             options.task = Task::MoveDatabase;
         return options;
     } catch (Base::UsageError const& wrong) {
-        err << "vlserviced: " << wrong.what() << "; --help explains\n";
+        err << "vlserviced: "
+            << Base::codedLine(wrong.what() + std::string("; --help explains"), wrong.code()) << '\n';
         return 1;
     }
 }

@@ -71,10 +71,10 @@ std::string Processor::errorOf(Ipc::CmdI const& cmd, Operation operation) {
         operation();
         return {};
     } catch (std::exception const& failure) {
-        std::string line = Base::oneLine(failure.what());
+        std::string const line = Base::oneLine(failure.what());
         Log::Lock(4).logStreamLine() << "Command " << cmd.name() << " was refused: " << line;
         noteRefusal(line);
-        return line;
+        return Base::codedLine(line, Base::codeOf(failure));
     }
 }
 
@@ -101,7 +101,7 @@ void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant co
         access_.require(*cmd, by_);
         cmd->accept(*this);
     } catch (std::exception const& failure) {
-        failed = failure.what();
+        failed = Base::codedLine(failure);
         noteRefusal(failed);
     }
     if (auto const unfinished = std::exchange(done_, {}))
@@ -137,7 +137,8 @@ void Processor::beginPack(Ipc::CSConfigIdsList& cmd) {
                  [this, answered, done = std::exchange(done_, {})](Protocol::BeginPackAnswer const& answer,
                                                                    std::string const& failure) {
                      answered->setResp(answerOrError(*answered, [&] {
-                         return failure.empty() ? answer.serialize() : throw Base::Error(failure);
+                         return failure.empty() ? answer.serialize()
+                                                : throw Base::errorSaid(failure, Base::Code::Unexpected);
                      }));
                      done({});
                  });
@@ -228,7 +229,7 @@ json::Object Processor::answer(json::Object const& question) {
             return known.answer(*this, question);
         all += (all.empty() ? "" : ", ") + std::string(known.kind);
     }
-    throw Base::Error("there is no query \"" + kind + "\"; there are " + all);
+    throw Base::Error(Base::Code::RequestInvalid, "there is no query \"" + kind + "\"; there are " + all);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
@@ -240,7 +241,7 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
             runner_.change(change.action, id);
             changed.ids.push_back(id);
         } catch (Base::Error const& refused) {
-            answer.refused.emplace_back(id, refused.what());
+            answer.refused.emplace_back(id, Base::codedLine(refused));
         }
     }
     if (!changed.ids.empty())
@@ -264,7 +265,7 @@ Protocol::HistoryAnswer Processor::historyOf(Protocol::HistoryQuery const& query
 void Processor::requireJob(std::string const& packId) const {
     std::optional<Job> const job = jobs_.find(packId);
     if (!job || !by_.covers(job->cfgId))
-        throw Base::Error("there is no mailing " + Base::oneLine(packId));
+        throw Base::Error(Base::Code::MailingUnknown, "there is no mailing " + Base::oneLine(packId));
 }
 
 json::Object Processor::changeLetter(Protocol::LetterChange const& change) {
@@ -280,7 +281,8 @@ Protocol::DeliveryReportAnswer Processor::noteReport(Protocol::DeliveryReport co
     Carriers::MailReport const mail = Carriers::mailReportIn(report.message);
     auto const id = LetterId::ofKey(Carriers::keyOfMessageId(mail.messageId));
     if (!id)
-        throw Base::Error("the report is about a message that is no letter of this service");
+        throw Base::Error(Base::Code::LetterUnknown,
+                          "the report is about a message that is no letter of this service");
     requireJob(id->packId);
     StoredLetter const letter = letters_.note(*id, mail.kind, mail.says);
     Protocol::DeliveryReportAnswer answer;
@@ -308,7 +310,9 @@ void Processor::testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cm
         letters_.test(channel, [&cmd, done](std::string const& says, std::string const& failure) {
             Protocol::CarrierTestAnswer answer;
             answer.says = says;
-            cmd.setResp(failure.empty() ? answer.serialize() : Protocol::failureAnswer(failure));
+            cmd.setResp(failure.empty() ? answer.serialize()
+                                        : Protocol::failureAnswer(
+                                              Base::codedLine(failure, Base::Code::CarrierUnavailable)));
             done({});
         });
     });
@@ -318,7 +322,9 @@ void Processor::testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cm
         cmd.setResp(Protocol::failureAnswer(refused));
 }
 
-void Processor::visit(Ipc::GuiFwd&) { throw Base::Error("the service forwards nothing to a user interface"); }
+void Processor::visit(Ipc::GuiFwd&) {
+    throw Base::Error(Base::Code::RequestInvalid, "the service forwards nothing to a user interface");
+}
 
 void Processor::visit(Ipc::SetSvcCfg& cmd) {
     settings_.changeService(cmd.req());

@@ -108,7 +108,7 @@ long long steadySeconds() {
 fs::path preparedOutbox(Options const& options, DataFolder const& data) {
     fs::path const outbox = fs::absolute(options.outbox.empty() ? data.outbox() : options.outbox);
     if (!Base::isPlainText(outbox.string(), MAX_PATH_BYTES))
-        throw Base::Error("the path of the outbox has to be a line of UTF-8 text");
+        throw Base::Error(Base::Code::Usage, "the path of the outbox has to be a line of UTF-8 text");
     makeWritableFolder(outbox);
     return outbox;
 }
@@ -173,8 +173,9 @@ OwnToken ownToken(Options const& options, DataFolder const& data, bool mayMakeIt
     bool const isNew = !fs::exists(data.token());
     if (isNew && !mayMakeIt)
         throw Base::Error(
+            Base::Code::TokenInvalid,
             "the token of this database lies with the service that has made it: copy that file to " +
-            data.token().string() + " or name it by --token");
+                data.token().string() + " or name it by --token");
     return {Channel::readOrCreateToken(data.token().string()), isNew};
 }
 

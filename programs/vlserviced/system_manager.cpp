@@ -36,7 +36,8 @@ tcp::endpoint endpointOf(int socket) {
     tcp::endpoint endpoint;
     auto size = static_cast<socklen_t>(endpoint.capacity());
     if (::getsockname(socket, endpoint.data(), &size) != 0)
-        throw Base::Error("The socket that the system's manager hands over has no address.");
+        throw Base::Error(Base::Code::AddressUnusable,
+                          "The socket that the system's manager hands over has no address.");
     endpoint.resize(size);
     return endpoint;
 }
@@ -47,10 +48,12 @@ void takeSocket(Options& options) {
         return;
     int const socket = SD_LISTEN_FDS_START;
     if (count > 1)
-        throw Base::Error("The system's manager hands over " + std::to_string(count) +
-                          " sockets; the service takes one: leave one ListenStream= in its unit.");
+        throw Base::Error(Base::Code::AddressUnusable,
+                          "The system's manager hands over " + std::to_string(count) +
+                              " sockets; the service takes one: leave one ListenStream= in its unit.");
     if (::sd_is_socket_inet(socket, AF_UNSPEC, SOCK_STREAM, 1, 0) <= 0)
-        throw Base::Error("The socket that the system's manager hands over does not listen for TCP.");
+        throw Base::Error(Base::Code::AddressUnusable,
+                          "The socket that the system's manager hands over does not listen for TCP.");
     tcp::endpoint const endpoint = endpointOf(socket);
     options.socket = socket;
     options.listen = endpoint.address().to_string();

@@ -16,7 +16,7 @@ constexpr Manual::Topic TOPICS[] = {{"", "service.md", "Running it"}};
 int main(int argc, char** argv) {
     try {
         if (argc != 2)
-            throw Base::Error("one folder is wanted");
+            throw Base::Error(Base::Code::Usage, "one folder is wanted");
         Manual::writeBook(argv[1], VlServiced::commandInfo(), TOPICS,
                           {"libVLService " + Base::projectVersion(), 8});
         return 0;

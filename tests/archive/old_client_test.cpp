@@ -86,7 +86,7 @@ public:
         address.sin_port = htons(port);
         address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
         if (::connect(socket_, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0)
-            throw Base::Error("the service takes no connection");
+            throw Base::Error(Base::Code::ConnectionLost, "the service takes no connection");
     }
     ~Line() { ::close(socket_); }
     Line(Line const&) = delete;
@@ -94,12 +94,12 @@ public:
 
     void send(std::string const& bytes) const {
         if (::send(socket_, bytes.data(), bytes.size(), MSG_NOSIGNAL) != static_cast<ssize_t>(bytes.size()))
-            throw Base::Error("the service takes no more");
+            throw Base::Error(Base::Code::ConnectionLost, "the service takes no more");
     }
     std::string receive(std::size_t size) const {
         std::string bytes(size, '\0');
         if (size > 0 && ::recv(socket_, bytes.data(), size, MSG_WAITALL) != static_cast<ssize_t>(size))
-            throw Base::Error("the service has closed the connection");
+            throw Base::Error(Base::Code::ConnectionLost, "the service has closed the connection");
         return bytes;
     }
     Message receiveMessage() const {

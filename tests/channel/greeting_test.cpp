@@ -5,6 +5,7 @@
 #include "programs/channel/message_text.h"
 #include "programs/channel/token.h"
 #include "tests/channel/known_texts.h"
+#include "tests/support/coded_lines.h"
 
 #include <gmock/gmock.h>
 
@@ -172,7 +173,7 @@ TEST(GreetingsByATokenWithAnId, TellTheServiceWhichItIs) {
 
 TEST(GreetingsByATokenWithAnId, EndWhereTheServiceHasNoSuchToken) {
     std::string const unknown = "f123456789abcdef." + std::string(64, 'a');
-    std::string const reason = "Its access token is none of this service, or was revoked.";
+    std::string const reason = "Its access token is none of this service, or was revoked. [token-refused]";
     EXPECT_EQ(greetByName(unknown, plainTerms()).service.reason, reason);
     EXPECT_EQ(greetByName(NAMED, plainTerms(), {}).service.reason, reason);
 }
@@ -246,7 +247,7 @@ template<typename Side>
 void expectRefused(Side& side, Case const& bad) {
     GreetingStep const step = side.take(bad.frame());
     EXPECT_EQ(step.verdict, Verdict::Refused);
-    EXPECT_EQ(step.reason, bad.reason);
+    EXPECT_EQ(wordsOf(step.reason), bad.reason);
     EXPECT_FALSE(step.reply);
     EXPECT_EQ(side.take(bad.frame()).reason, "The greeting is over.");
 }

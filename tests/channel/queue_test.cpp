@@ -229,7 +229,7 @@ TEST_F(Queue, EndsTheConnectionWhenAStepThrowsBehindTheRequest) {
     auto const cmd = std::make_shared<Throwing>(connection);
     connection->submit(cmd);
     io.run();
-    EXPECT_THAT(cmd->failure, EndsWith(": no room"));
+    EXPECT_THAT(cmd->failure, EndsWith(": no room [unexpected]"));
 }
 
 TEST_F(Queue, LetsTwoHundredClientsWorkAtOnce) {

@@ -81,8 +81,8 @@ TEST(Help, KnowsNothingOfOtherWords) {
     Ran const ran = runVlMail({"help", "letter", "boxes"});
     EXPECT_EQ(ran.status, VlMail::FAILED);
     EXPECT_EQ(ran.err,
-              "vlmail: there is no command or topic \"letter boxes\"; vlmail help lists what there is; "
-              "--help explains\n");
+              "vlmail: there is no command, topic or code \"letter boxes\"; vlmail help lists what there is; "
+              "--help explains [usage]\n");
 }
 
 constexpr char const* WITH_LIBRARIES =

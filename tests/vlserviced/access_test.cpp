@@ -95,7 +95,7 @@ TEST_F(AccessTest, ThatIsRefusedChangesNothing) {
     EXPECT_EQ(
         send(10, R"({"cfg_id":"u=bob/a=acme","part":{"descr":"Bob"}})"),
         "failed: this needs the role settings at u=bob/a=acme, and the token office has the role send at "
-        "a=acme: ask for a token that may (\"vlmail token add\")");
+        "a=acme: ask for a token that may (\"vlmail token add\") [not-allowed]");
     actAs(Role::Admin, "a=acme");
     EXPECT_THAT(send(30, R"({"susp_type":3})"), StartsWith("failed: this needs the role admin at the root"));
     EXPECT_FALSE(store_.contains("u=bob/a=acme"));
@@ -113,10 +113,10 @@ TEST_F(AccessTest, ToJobsOfOtherNodesIsNone) {
     actAs(Role::Send, "u=bob/a=acme");
     EXPECT_EQ(jobsTold(), "p2 ");
     EXPECT_EQ(ask(R"({"query":"change_jobs","action":"cancel","ids":["p1","p9"]})"),
-              R"({"jobs":[],"refused":[{"id":"p1","why":"there is no mailing p1"},)"
-              R"({"id":"p9","why":"there is no mailing p9"}]})");
+              R"({"jobs":[],"refused":[{"id":"p1","why":"there is no mailing p1 [mailing-unknown]"},)"
+              R"({"id":"p9","why":"there is no mailing p9 [mailing-unknown]"}]})");
     EXPECT_EQ(ask(R"({"query":"change_letter","id":"p1","letter":1,"action":"resend"})"),
-              R"({"err":"there is no mailing p1"})");
+              R"({"err":"there is no mailing p1 [mailing-unknown]"})");
     EXPECT_EQ(jobs_.find("p1")->state, VlServiced::JobState::Accepted);
 }
 

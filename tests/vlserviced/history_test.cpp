@@ -136,8 +136,9 @@ TEST_F(HistoryTest, TellsTheYoungestInTheirOrder) {
     EXPECT_EQ(ask(R"({"query":"history","limit":1})"),
               R"({"entries":[{"at":1000,"who":"ada","id":"a=acme","what":"settings po",)"
               R"("was":"{\"code\":\"R-3\"}","is":"{\"code\":\"R-4\"}"}]})");
-    EXPECT_EQ(ask(R"({"query":"history","limit":0})"),
-              R"({"err":"\"limit\" of a query for the history has to be an integer from 1 to 1000"})");
+    EXPECT_EQ(
+        ask(R"({"query":"history","limit":0})"),
+        R"({"err":"\"limit\" of a query for the history has to be an integer from 1 to 1000 [request-invalid]"})");
 }
 
 TEST_F(HistoryTest, TellsOfNothingThatTheServiceDoesOfItsOwn) {
@@ -245,9 +246,10 @@ TEST_F(ImpactTest, OfListsReachesThoseWhoAddToThem) {
 
 TEST_F(ImpactTest, OfWhatCannotBeSetIsRefused) {
     EXPECT_EQ(impact("a=acme", "po", R"({"cod":"R"})"),
-              R"({"err":"the settings \"po\" have no key \"cod\""})");
-    EXPECT_EQ(impact("a=acme", "po", "1"),
-              R"({"err":"\"own\" of a query for what settings would change has to be an object"})");
+              R"({"err":"the settings \"po\" have no key \"cod\" [setting-unknown]"})");
+    EXPECT_EQ(
+        impact("a=acme", "po", "1"),
+        R"({"err":"\"own\" of a query for what settings would change has to be an object [request-invalid]"})");
     EXPECT_THAT(impact("a=acme", "x", "{}"), StartsWith(R"({"err":"there are no settings \"x\")"));
 }
 

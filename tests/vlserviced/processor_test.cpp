@@ -32,33 +32,36 @@ TEST_F(ProcessorTest, TellsUnderErrWhyAPartWasNotSet) {
     EXPECT_EQ(
         send(10, R"({"cfg_id":"acme","part":{}})"),
         R"({"err":"node id \"acme\" is not valid: wanted is a path like u=NAME/ou=GROUP/a=ACCOUNT, or the )"
-        R"(same without its front"})");
+        R"(same without its front [node-invalid]"})");
     EXPECT_EQ(send(10, R"({"cfg_id":"a=acme","part":{"max":1}})"),
-              R"({"err":"the settings \"app\" have no key \"max\""})");
+              R"({"err":"the settings \"app\" have no key \"max\" [setting-unknown]"})");
     EXPECT_EQ(log_.back(), "Command \"Set app\" was refused: the settings \"app\" have no key \"max\"");
 }
 
 TEST_F(ProcessorTest, NeverTakesTheRootForAMissingId) {
     send(15, R"({"cfg_id":"","part":{"code":"R"}})");
     EXPECT_TRUE(send(10, R"({"part":{}})").starts_with("failed: JSON error"));
-    EXPECT_EQ(send(17, "{}"), R"({"err":"the root cannot be removed"})");
-    EXPECT_EQ(send(17, R"({"id":7})"), R"({"err":"the root cannot be removed"})");
-    EXPECT_EQ(send(22, R"({"reset_cfg":true})"),
-              R"({"err":"the root cannot be reset as a whole: set its parts to nothing one by one"})");
+    EXPECT_EQ(send(17, "{}"), R"({"err":"the root cannot be removed [node-in-use]"})");
+    EXPECT_EQ(send(17, R"({"id":7})"), R"({"err":"the root cannot be removed [node-in-use]"})");
+    EXPECT_EQ(
+        send(22, R"({"reset_cfg":true})"),
+        R"({"err":"the root cannot be reset as a whole: set its parts to nothing one by one [request-invalid]"})");
     EXPECT_EQ(send(29, R"({"query":"settings"})"),
-              R"({"err":"\"id\" of a query for settings has to be the id of a node"})");
+              R"({"err":"\"id\" of a query for settings has to be the id of a node [request-invalid]"})");
     EXPECT_EQ(print(store_.parts("")), R"({"po":{"code":"R"}})");
 }
 
 TEST_F(ProcessorTest, UpdatesResetsAndRemovesNodes) {
     EXPECT_EQ(send(22, R"({"cfg_id":"u=bob/a=acme"})"), "{}");
-    EXPECT_EQ(send(17, R"({"id":"a=acme"})"),
-              R"({"err":"node a=acme has 1 child (u=bob/a=acme): remove what is below it first"})");
+    EXPECT_EQ(
+        send(17, R"({"id":"a=acme"})"),
+        R"({"err":"node a=acme has 1 child (u=bob/a=acme): remove what is below it first [node-in-use]"})");
     send(15, R"({"cfg_id":"u=bob/a=acme","part":{"code":"C"}})");
     EXPECT_EQ(send(22, R"({"cfg_id":"u=bob/a=acme","reset_cfg":true})"), "{}");
     EXPECT_EQ(print(store_.parts("u=bob/a=acme")), "{}");
     EXPECT_EQ(send(17, R"({"id":"u=bob/a=acme"})"), "{}");
-    EXPECT_EQ(send(17, R"({"id":"u=bob/a=acme"})"), R"({"err":"there is no node u=bob/a=acme"})");
+    EXPECT_EQ(send(17, R"({"id":"u=bob/a=acme"})"),
+              R"({"err":"there is no node u=bob/a=acme [node-unknown]"})");
     EXPECT_EQ(send(17, R"({"id":"a=acme"})"), "{}");
     EXPECT_EQ(send(19, "{}"), R"({"id":"","descr":"","parts":[],"children":[]})");
 }
@@ -78,18 +81,20 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
     EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":["po"]})"),
               R"({"id":"a=acme","known":false,"chain":["a=acme",""],"parts":{"po":{"own":{},)"
               R"("values":{"code":"R","expiry":0},"origins":{"code":"","expiry":null}}}})");
-    EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":["p"]})"),
-              R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets"})");
-    EXPECT_EQ(send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
-              R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts"})");
+    EXPECT_EQ(
+        send(29, R"({"query":"settings","id":"a=acme","parts":["p"]})"),
+        R"({"err":"there are no settings \"p\"; there are app, inet, po, deps, profiles, presets [setting-unknown]"})");
+    EXPECT_EQ(
+        send(29, R"({"query":"settings","id":"a=acme","parts":"po"})"),
+        R"({"err":"\"parts\" of a query for settings has to be an array of at most 20 texts [request-invalid]"})");
     EXPECT_EQ(
         send(29, R"({"query":"x"})"),
         R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack [request-invalid]"})");
     EXPECT_EQ(
         send(29, "{}"),
         R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, begin_pack [request-invalid]"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {
@@ -97,7 +102,7 @@ TEST_F(ProcessorTest, KeepsTheServicesSettings) {
     EXPECT_EQ(send(27, R"({"tariff":{"currency":"EUR","sheet":10}})"), "{}");
     EXPECT_EQ(
         send(27, R"({"x":1})"),
-        R"(failed: the service has no setting "x"; there are upload_folder, tariff, carriers, disabled, quota, retention_days)");
+        R"(failed: the service has no setting "x"; there are upload_folder, tariff, carriers, disabled, quota, retention_days [setting-unknown])");
     EXPECT_EQ(send(26, "{}"),
               R"({"tariff":{"currency":"EUR","sheet":10},"outbox":")" + outbox_.string() + R"(","jobs":{}})");
 }
@@ -125,7 +130,8 @@ TEST_F(ProcessorTest, BringsAPackFromTheDatabaseToTheUploadFolder) {
 }
 
 TEST_F(ProcessorTest, FailsCommandsWhoseResponseHasNoRoomForAnError) {
-    EXPECT_EQ(processPack("p1"), "failed: there is no pack database " + (folder_ / "packs.db").string());
+    EXPECT_EQ(processPack("p1"),
+              "failed: there is no pack database " + (folder_ / "packs.db").string() + " [database-missing]");
     EXPECT_TRUE(
         send(20, R"({"db_host":"","db_name":""})").starts_with("failed: the service has no upload folder"));
     EXPECT_TRUE(send(25, "{}").starts_with("failed: JSON error"));
@@ -158,13 +164,15 @@ TEST_F(ProcessorTest, HoldsReleasesAndCancelsJobs) {
                     refused.toObject().get("why").textOrEmpty() + ';';
         return told;
     };
-    EXPECT_EQ(change("hold", R"("p1","none","p2")"), "p1 held;p2 held;none: there is no mailing none;");
+    EXPECT_EQ(change("hold", R"("p1","none","p2")"),
+              "p1 held;p2 held;none: there is no mailing none [mailing-unknown];");
     EXPECT_EQ(change("release", R"("p2")"), "p2 queued;");
     EXPECT_EQ(change("cancel", R"("p1")"), "p1 cancelled;");
-    EXPECT_EQ(change("hold", R"("p1")"), "p1: it is too late to hold mailing p1: it was cancelled;");
+    EXPECT_EQ(change("hold", R"("p1")"),
+              "p1: it is too late to hold mailing p1: it was cancelled [state-refused];");
     EXPECT_EQ(
         send(29, R"({"query":"change_jobs","action":"stop","ids":["p1"]})"),
-        R"({"err":"\"action\" of a change of jobs has to be \"hold\", \"release\", \"cancel\" or \"upload\""})");
+        R"({"err":"\"action\" of a change of jobs has to be \"hold\", \"release\", \"cancel\" or \"upload\" [request-invalid]"})");
 }
 
 } // namespace

@@ -139,11 +139,11 @@ TEST_F(ServiceProcessTest, FailsWithOneLineThatSaysWhatIsWrong) {
     std::ofstream(folder_ / "file") << "x";
     EXPECT_EQ(startFailure({"--data", (folder_ / "file").string()}),
               "vlserviced: cannot write into the folder " + (folder_ / "file").string() +
-                  ": Not a directory\n");
+                  ": Not a directory [data-folder-unusable]\n");
     fs::create_directory(data_);
     std::ofstream(data_ / "service.db") << std::string(5000, 'x');
-    EXPECT_EQ(startFailure(arguments()),
-              "vlserviced: " + (data_ / "service.db").string() + " is not a service database\n");
+    EXPECT_EQ(startFailure(arguments()), "vlserviced: " + (data_ / "service.db").string() +
+                                             " is not a service database [database-unusable]\n");
     fs::remove(data_ / "service.db");
     std::string const text = startFailure(arguments({"--listen", "nowhere"}));
     EXPECT_TRUE(text.starts_with("vlserviced: ")) << text;
@@ -210,7 +210,7 @@ TEST_F(ServiceProcessTest, TellsOfRefusalsByTheirReason) {
 TEST_F(ServiceProcessTest, RefusesToTellOthersThanThisMachine) {
     EXPECT_EQ(startFailure(arguments({"--metrics", "0.0.0.0:9117"})),
               "vlserviced: --metrics takes a loopback address with a port, such as 127.0.0.1:9117, or "
-              "unix:PATH, and got \"0.0.0.0:9117\"\n");
+              "unix:PATH, and got \"0.0.0.0:9117\" [usage]\n");
 }
 
 /// What the program prints when it is run for something else than to serve, and its status in front.
@@ -325,10 +325,10 @@ TEST_F(RestoredService, IsMadeInADataFolderAlone) {
     EXPECT_EQ(
         restored({"--database", "postgresql:///x"}),
         "1 vlserviced: restore makes the database of a data folder; --migrate-to takes that to PostgreSQL; "
-        "--help explains\n");
+        "--help explains [usage]\n");
     EXPECT_EQ(carriedOut({"--migrate-to", "postgresql:///x", "--database", "postgresql:///x", "--data",
                           data_.string()}),
-              "1 vlserviced: --migrate-to goes with the data folder alone; --help explains\n");
+              "1 vlserviced: --migrate-to goes with the data folder alone; --help explains [usage]\n");
 }
 
 TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {

@@ -168,7 +168,7 @@ TEST_F(SharedDatabaseTest, HasTheTokenWithTheServiceThatMadeIt) {
     EXPECT_EQ(
         second.errors(),
         "vlserviced: the token of this database lies with the service that has made it: copy that file to " +
-            (data(1) / "token").string() + " or name it by --token\n");
+            (data(1) / "token").string() + " or name it by --token [token-invalid]\n");
     EXPECT_FALSE(fs::exists(data(1) / "token"));
 }
 

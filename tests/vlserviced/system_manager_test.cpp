@@ -67,7 +67,7 @@ TEST_F(ManagedServices, EndWithOneLineForAFileOfOptionsThatIsWrong) {
     ServiceProcess service(config("prot = 7117\n"));
     EXPECT_EQ(service.wait(), 1);
     EXPECT_EQ(service.errors(), "vlserviced: " + (folder_ / "conf").string() +
-                                    ", line 3: there is no option \"prot\"; --help explains\n");
+                                    ", line 3: there is no option \"prot\"; --help explains [usage]\n");
 }
 
 TEST_F(ManagedServices, AnswerOnTheSocketThatTheyAreHanded) {
@@ -83,7 +83,7 @@ TEST_F(ManagedServices, RefuseASocketThatDoesNotListen) {
     ServiceProcess service(config(), {}, nullptr, silent.native_handle());
     EXPECT_EQ(service.wait(), 1);
     EXPECT_EQ(service.errors(),
-              "vlserviced: The socket that the system's manager hands over does not listen for TCP.\n");
+              "vlserviced: The socket that the system's manager hands over does not listen for TCP. [address-unusable]\n");
 }
 
 TEST_F(ManagedServices, SayThatTheyAreReadyThatTheyLiveAndThatTheyEnd) {

@@ -144,7 +144,7 @@ TEST_F(Upload, GoesOnWhereItWasWhenTheConnectionIsCutAtAnyMessage) {
         int messages = 0;
         VlMail::deliverPack(toService, database_, id, false, [&](long long, long long) {
             if (messages++ == cutAt)
-                throw Base::Error("cut");
+                throw Base::Error(Base::Code::ConnectionLost, "cut");
         });
         EXPECT_GT(messages, PAGES) << "nothing was cut";
         expectWhole(id);

@@ -72,8 +72,9 @@ DocumentsElsewhere documentsInService(ServiceLine& line, std::string const& node
             Protocol::StoredDocument const* const document = (*known)->find(id);
             return document ? std::optional(fetched(line, *document)) : std::nullopt;
         } catch (Base::Error const& failure) {
-            throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + "the service does not give \"" +
-                              id + "\": " + failure.what());
+            throw Base::Error(Base::Code::DocumentUnknown, std::string(Production::DOCUMENT_UNKNOWN) +
+                                                               "the service does not give \"" + id +
+                                                               "\": " + failure.what());
         }
     };
     return {find,

@@ -48,7 +48,8 @@ std::vector<fs::path> unseenIn(fs::path const& maildir) {
         if (!entry.path().filename().string().starts_with('.') && entry.is_regular_file())
             files.push_back(entry.path());
     if (failure || !fs::is_directory(maildir / "cur"))
-        throw Base::Error(maildir.string() + " is no mailbox (Maildir) with the folders new and cur");
+        throw Base::Error(Base::Code::FileUnsuitable,
+                          maildir.string() + " is no mailbox (Maildir) with the folders new and cur");
     std::ranges::sort(files);
     return files;
 }
@@ -66,7 +67,7 @@ int handOnAll(Channel::Client& service, Options const& options, Terminal const& 
             handOn(service, Base::readFile(file, MAX_MESSAGE_BYTES), options, terminal);
             putAway(file, options.maildir);
         } catch (Base::Error const& bad) {
-            terminal.complain(file.filename().string() + ": " + bad.what());
+            terminal.complain(bad.code(), file.filename().string() + ": " + bad.what());
             status = INCOMPLETE;
         }
     }

@@ -79,7 +79,7 @@ int checkDocuments(Options const& options, Terminal const& terminal) {
                   else
                       print(terminal.out, result.reading);
                   if (result.reading.failed())
-                      terminal.complain(result.reading.error);
+                      terminal.complain(result.reading.code, result.reading.error);
               });
     if (!options.json)
         terminal.out << outcome.inWords() << '\n';

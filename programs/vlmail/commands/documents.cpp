@@ -45,10 +45,11 @@ std::string nameFor(std::string const& id, fs::path const& file) {
 std::string usableBytes(fs::path const& file, Workers const& workers) {
     Production::PreparedDocument const prepared = prepareDocuments({{file}}, workers).front();
     if (!prepared.error.empty())
-        throw Base::Error(prepared.error);
+        throw Base::Error(Base::Code::DocumentUnreadable, prepared.error);
     std::string bytes = Base::readFile(file);
     if (Base::sha256(bytes) != prepared.sha256)
-        throw Base::Error(Base::inQuotes(file.string()) + " has changed while it was read; put it once more");
+        throw Base::Error(Base::Code::DocumentChanged,
+                          Base::inQuotes(file.string()) + " has changed while it was read; put it once more");
     return bytes;
 }
 
@@ -87,8 +88,9 @@ fs::path placeFor(Options const& options, StoredDocument const& document) {
     if (!options.file.empty())
         return options.file;
     if (fs::exists(fs::symlink_status(document.name)))
-        throw Base::Error(Base::inQuotes(document.name) +
-                          " is there already; name the file to write behind the document");
+        throw Base::Error(Base::Code::FileExists,
+                          Base::inQuotes(document.name) +
+                              " is there already; name the file to write behind the document");
     return document.name;
 }
 
@@ -98,8 +100,9 @@ int get(Options const& options, Terminal const& terminal) {
     Protocol::DocumentsAnswer const known = documentsOf(*service, node);
     StoredDocument const* const document = known.find(options.id);
     if (!document)
-        throw Base::Error("there is no document " + Base::inQuotes(options.id) + " at " + nodeInWords(node) +
-                          " and above it; \"vlmail documents list\" shows what there is");
+        throw Base::Error(Base::Code::DocumentUnknown,
+                          "there is no document " + Base::inQuotes(options.id) + " at " + nodeInWords(node) +
+                              " and above it; \"vlmail documents list\" shows what there is");
     fs::path const file = placeFor(options, *document);
     Base::writeFile(file, fetchDocument(*service, document->sha256));
     terminal.out << document->name << " of " << nodeInWords(document->node) << " is in "

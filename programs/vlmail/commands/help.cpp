@@ -1,4 +1,5 @@
 // vlmail help: what docs/ say of a command or a topic, where the program is.
+#include "programs/manual/markdown.h"
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/commands/topics.h"
 #include "programs/vlmail/terminal/text_table.h"
@@ -13,7 +14,34 @@ namespace {
 struct Found {
     std::string help;
     Manual::Topic const* topic = nullptr;
+    /// What pages say of a code.
+    std::string code = {};
 };
+
+/// Whose tables explain codes: of failures, and of findings.
+constexpr char const* PAGES_WITH_CODES[] = {"errors.md", "check.md", "settings.md", "letters-and-mailings.md",
+                                            "presets-tools.md"};
+
+/// "CODE", and what each column behind it says; empty unless it is a row of the table.
+std::string explanationIn(Manual::Table const& table, std::string const& code) {
+    std::string text;
+    for (std::vector<std::string> const& row : table.rows) {
+        if (row.front() != '`' + code + '`')
+            continue;
+        text = code + "\n";
+        for (std::size_t i = 1; i < row.size(); ++i)
+            text += '\n' + Manual::plainFrom(table.head[i] + ": " + row[i]);
+    }
+    return text;
+}
+
+std::string explanationOf(std::string const& code) {
+    for (char const* page : PAGES_WITH_CODES)
+        for (Manual::Table const& table : Manual::tablesOf(Manual::textOf({"", page, ""})))
+            if (std::string text = explanationIn(table, code); !text.empty())
+                return text;
+    return {};
+}
 
 std::string joined(std::vector<std::string> const& words) {
     std::string text;
@@ -23,9 +51,11 @@ std::string joined(std::vector<std::string> const& words) {
 }
 
 Found find(Base::Command const& app, std::vector<std::string> const& words) {
-    Found const found{app.helpOf(words), Manual::topicNamed(joined(words), topics())};
+    Found found{app.helpOf(words), Manual::topicNamed(joined(words), topics())};
     if (found.help.empty() && !found.topic)
-        throw Base::UsageError("there is no command or topic \"" + joined(words) +
+        found.code = explanationOf(joined(words));
+    if (found.help.empty() && !found.topic && found.code.empty())
+        throw Base::UsageError("there is no command, topic or code \"" + joined(words) +
                                "\"; vlmail help lists what there is");
     return found;
 }
@@ -42,12 +72,13 @@ int listTopics(Base::CommandInfo const& program, Terminal const& terminal) {
                                      program.commands.end()
                              ? ' ' + std::string(topic.name)
                              : std::string());
-    terminal.out << "\nvlmail help COMMAND or vlmail help TOPIC tells more\n";
+    terminal.out << "\nvlmail help COMMAND or vlmail help TOPIC tells more, and vlmail help CODE what to do "
+                    "about an error\n";
     return FINE;
 }
 
 int show(Found const& found, Terminal const& terminal) {
-    terminal.out << found.help;
+    terminal.out << found.help << found.code;
     if (found.topic)
         terminal.out << Manual::plainFrom(Manual::textOf(*found.topic));
     return FINE;
@@ -57,8 +88,9 @@ int show(Found const& found, Terminal const& terminal) {
 
 void addHelpCommand(Base::Command const& app, Task& task) {
     auto const words = std::make_shared<std::vector<std::string>>();
-    Base::Command const help = app.addCommand("help", "Explains a command or a topic");
-    help.addOption("TOPIC", *words, "The words of a command, or a topic; without one, lists them");
+    Base::Command const help = app.addCommand("help", "Explains a command, a topic or the code of an error");
+    help.addOption("TOPIC", *words,
+                   "The words of a command, a topic or a code; without one, lists commands and topics");
     help.whenNamed([=, &task] {
         if (words->empty())
             task = [program = app.info()](Terminal const& terminal) { return listTopics(program, terminal); };

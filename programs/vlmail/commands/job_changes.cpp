@@ -29,7 +29,7 @@ int changeJobs(Options const& options, Terminal const& terminal) {
         for (Protocol::JobReport const& job : answer.jobs)
             terminal.out << job.id << ", " << Protocol::stateName(job.state) << '\n';
     for (Protocol::JobRefusal const& refused : answer.refused)
-        terminal.complain(refused.why);
+        terminal.complain(Base::errorSaid(refused.why, Base::Code::StateRefused));
     if (answer.refused.empty())
         return FINE;
     return answer.jobs.empty() ? FAILED : INCOMPLETE;

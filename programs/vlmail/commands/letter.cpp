@@ -151,7 +151,7 @@ int showLetters(Options const& options, Terminal const& terminal) {
                   else
                       print(terminal.out, reading);
                   if (reading.failed())
-                      terminal.complain(reading.error);
+                      terminal.complain(reading.code, reading.error);
                   if (report)
                       report->take(result);
               });

@@ -30,7 +30,8 @@ Protocol::LetterChange changeOf(Options const& options, LetterAction action) {
     auto const [end, failure] =
         std::from_chars(text.data() + (isNotice ? 1 : 0), text.data() + text.size(), number);
     if (failure != std::errc() || end != text.data() + text.size() || number < 1)
-        throw Base::Error("\"" + text + "\" is no number of a letter: vlmail status MAILING shows them");
+        throw Base::Error(Base::Code::Usage,
+                          "\"" + text + "\" is no number of a letter: vlmail status MAILING shows them");
     return isNotice ? Protocol::LetterChange(action, options.mailing, 0, number)
                     : Protocol::LetterChange(action, options.mailing, number);
 }
@@ -60,7 +61,8 @@ int change(Options const& options, LetterAction action, Terminal const& terminal
 
 int settle(Options const& options, Terminal const& terminal) {
     if (options.outcome != "delivered" && options.outcome != "failed")
-        throw Base::Error("a letter is settled as delivered or failed, not as \"" + options.outcome + '"');
+        throw Base::Error(Base::Code::Usage,
+                          "a letter is settled as delivered or failed, not as \"" + options.outcome + '"');
     return change(options,
                   options.outcome == "delivered" ? LetterAction::SettleDelivered : LetterAction::SettleFailed,
                   terminal);

@@ -35,10 +35,12 @@ public:
         fs::create_directories(path_, failure);
         bool const isEmpty = !failure && fs::is_empty(path_, failure);
         if (failure)
-            throw Base::Error("cannot write into \"" + path_.string() + "\": " + failure.message() +
-                              "; name another folder with -o");
+            throw Base::Error(Base::Code::FileUnwritable, "cannot write into \"" + path_.string() +
+                                                              "\": " + failure.message() +
+                                                              "; name another folder with -o");
         if (!isEmpty)
-            throw Base::Error("the folder \"" + path_.string() + "\" is not empty; name a new one with -o");
+            throw Base::Error(Base::Code::FileExists,
+                              "the folder \"" + path_.string() + "\" is not empty; name a new one with -o");
     }
 
     /// Under a name made of `name`, which may be any text, and `ending`. Throws Error.
@@ -47,8 +49,10 @@ public:
         try {
             Base::writeFile(file, data, Base::PendingFile::Durability::Lazy);
         } catch (std::system_error const& failure) {
-            throw Base::Error("cannot write " + Base::inQuotes(file.string()) + ": " +
-                              failure.code().message() + "; make room on the disk or name another folder");
+            throw Base::Error(Base::Code::FileUnwritable,
+                              "cannot write " + Base::inQuotes(file.string()) + ": " +
+                                  failure.code().message() +
+                                  "; make room on the disk or name another folder");
         }
     }
 
@@ -99,7 +103,8 @@ SharedMemBuffer expanded(ContainerFile::Entry const& entry, ContainerFile::Blob 
     try {
         return Mailing::expanded(blob.bytes);
     } catch (Base::Error const& failure) {
-        throw Base::Error("cannot extract " + inWords(entry) + ": " + failure.what());
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "cannot extract " + inWords(entry) + ": " + failure.what());
     }
 }
 
@@ -113,7 +118,8 @@ int extract(Options const& options, Terminal const& terminal) {
         ContainerFile::Blob const blob = container.blob(i);
         std::string const why = blob.damage.empty() ? room.whyNot(blob.dataSize) : blob.damage;
         if (!why.empty()) {
-            terminal.complain(inWords(entry) + " in \"" + options.file + "\" is left out: " + why);
+            terminal.complain(Base::Code::MailingDamaged,
+                              inWords(entry) + " in \"" + options.file + "\" is left out: " + why);
             continue;
         }
         writeEntry(folder, entry, Mailing::viewOf(expanded(entry, blob)));

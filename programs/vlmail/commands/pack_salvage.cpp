@@ -32,11 +32,13 @@ struct Options {
 void requireOtherFile(Options const& options) {
     std::error_code ignored;
     if (fs::equivalent(options.file, options.target, ignored))
-        throw Base::Error("\"" + options.target +
-                          "\" is the damaged file itself, which is never written to; name " +
-                          "another with -o");
+        throw Base::Error(Base::Code::FileExists,
+                          "\"" + options.target +
+                              "\" is the damaged file itself, which is never written to; name " +
+                              "another with -o");
     if (fs::exists(fs::symlink_status(options.target, ignored)))
-        throw Base::Error("\"" + options.target + "\" is there already; name another with -o");
+        throw Base::Error(Base::Code::FileExists,
+                          "\"" + options.target + "\" is there already; name another with -o");
 }
 
 /// What stands in for metadata that is lost: a mailing of no letters.
@@ -121,7 +123,8 @@ int salvage(Options const& options, Terminal const& terminal) {
     requireOtherFile(options);
     SalvagePlan const plan = planSalvage(file);
     if (plan.pages.empty() && !plan.metadata)
-        throw Base::Error("nothing in \"" + options.file + "\" can be saved: it holds no page that is whole");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "nothing in \"" + options.file + "\" can be saved: it holds no page that is whole");
     write(file, plan, options.target);
     report(plan, options.target, terminal.out);
     return plan.isComplete() ? FINE : INCOMPLETE;

@@ -40,7 +40,7 @@ int verifyAll(std::vector<std::string> const& files, Terminal const& terminal) {
             if (!verify(file, terminal.out))
                 status = FAILED;
         } catch (Base::Error const& failure) {
-            terminal.complain(failure.what());
+            terminal.complain(failure);
             status = FAILED;
         }
     }

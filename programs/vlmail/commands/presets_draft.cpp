@@ -41,8 +41,8 @@ std::string printed(json::Object const& settings) {
 }
 
 Base::Error standsAlready(std::string const& file) {
-    return Base::Error("there is a file " + Base::inQuotes(file) +
-                       " already; name another one, or remove it");
+    return Base::Error(Base::Code::FileExists, "there is a file " + Base::inQuotes(file) +
+                                                   " already; name another one, or remove it");
 }
 
 constexpr char const* SETTINGS = "settings";
@@ -85,13 +85,14 @@ json::Object draftInWorker(Options const& options) {
             if (failure && *failure == JobFailure::NoMemory)
                 throw std::bad_alloc();
             if (failure)
-                throw Base::Error("cannot make a draft of " + counted(options.files.size(), "document") +
-                                  ": " + inWords(*failure, workers.limits));
+                throw Base::Error(Base::Code::LimitExceeded, "cannot make a draft of " +
+                                                                 counted(options.files.size(), "document") +
+                                                                 ": " + inWords(*failure, workers.limits));
             text = std::get<std::string>(std::move(result));
         });
     json::Object const draft = json::strToObject(text.data(), text.size());
     if (draft.get(ERROR))
-        throw Base::Error(draft.get(ERROR).toString());
+        throw Base::Error(Base::Code::DocumentUnreadable, draft.get(ERROR).toString());
     return draft;
 }
 

@@ -26,8 +26,9 @@ PresetsDocument readDocument(std::string const& file) {
     try {
         return PresetsDocument(text);
     } catch (json::Exc const& wrong) {
-        throw Base::Error("cannot read the settings in " + inQuotes(file) + ": " + wrong.what() +
-                          "; correct the file there");
+        throw Base::Error(Base::Code::SettingsMalformed, "cannot read the settings in " + inQuotes(file) +
+                                                             ": " + wrong.what() +
+                                                             "; correct the file there");
     }
 }
 

@@ -46,6 +46,8 @@ struct Found {
     std::optional<Place> packPlace;
     /// What failed and what to do; empty when both presets were found.
     std::string error;
+    /// Of the error, when there is one.
+    Base::Code code = Base::Code::PresetMissing;
 };
 
 /// The presets of the settings with their places. What it finds points into it.
@@ -55,7 +57,8 @@ public:
         : document_(text), presets_(settings.presets()) {}
 
     Found find(std::string const& name) const {
-        Found found{name, {}, {}, {}, {}, {}};
+        Found found;
+        found.name = name;
         NameTrial trial(name);
         for (auto const& element : presets_.elements<ExtractPresets>())
             if (endsWith(element.value, found, trial))
@@ -75,6 +78,7 @@ private:
                 return true;
             }
         } catch (std::exception const& failure) {
+            found.code = Base::Code::PatternInvalid;
             found.error = "preset " + std::to_string(tried.number) + ", " + inWords(preset) +
                           ", cannot be tried: " + failure.what() +
                           "; correct it, or no later preset is reached";
@@ -136,8 +140,10 @@ json::Object toJson(Found const& found) {
         earlier.append(one);
     }
     object.set("earlier", earlier);
-    if (!found.error.empty())
+    if (!found.error.empty()) {
         object.set("error", found.error);
+        object.set("code", Base::nameOf(found.code));
+    }
     return object;
 }
 
@@ -173,7 +179,7 @@ int match(Options const& options, Terminal const& terminal) {
             print(terminal.out, found);
         if (found.error.empty())
             continue;
-        terminal.complain(inQuotes(found.name) + ": " + found.error);
+        terminal.complain(found.code, inQuotes(found.name) + ": " + found.error);
         status = FAILED;
     }
     return status;

@@ -47,8 +47,9 @@ std::optional<Protocol::LetterBatch> batchIn(std::string const& text) {
 Mailing::Metadata metadataOf(std::string const& file) {
     PackWrapper container(file, PackWrapper::PURPOSE_IMPORT, "");
     if (container.szBins() == 0)
-        throw Base::Error("cannot estimate \"" + file +
-                          "\": it is neither a mailing file nor a number of letters and pages like 20x3");
+        throw Base::Error(Base::Code::Usage,
+                          "cannot estimate \"" + file +
+                              "\": it is neither a mailing file nor a number of letters and pages like 20x3");
     return Mailing::Metadata::fromBlob(container.inputFullMeta());
 }
 

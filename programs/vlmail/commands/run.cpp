@@ -11,7 +11,8 @@
 namespace VlMail {
 
 char const OUT_OF_MEMORY[] =
-    "vlmail: there is not enough memory; close other programs, or name fewer documents at once\n";
+    "vlmail: there is not enough memory; close other programs, or name fewer documents at once "
+    "[out-of-memory]\n";
 
 namespace {
 
@@ -63,9 +64,9 @@ int runPlainly(int argc, char const* const* argv, Terminal const& terminal, std:
     } catch (std::bad_alloc const&) {
         throw;
     } catch (Base::UsageError const& wrong) {
-        terminal.complain(std::string(wrong.what()) + "; --help explains");
+        terminal.complain(wrong.code(), std::string(wrong.what()) + "; --help explains");
     } catch (std::exception const& failure) {
-        terminal.complain(failure.what());
+        terminal.complain(failure);
     }
     return FAILED;
 }
@@ -76,7 +77,8 @@ int runAndFlush(int argc, char const* const* argv, Terminal const& terminal, std
     int const status = runPlainly(argc, argv, {out, terminal.err, terminal.showsProgress}, commit);
     if (out.flush())
         return status;
-    terminal.complain("the results cannot be written; make room on the disk, or send them elsewhere");
+    terminal.complain(Base::Code::FileUnwritable,
+                      "the results cannot be written; make room on the disk, or send them elsewhere");
     return FAILED;
 }
 

@@ -35,8 +35,9 @@ public:
             auto const pack = ContainerPack::open(file, nodeIdIn(options_.node));
             tell(file, deliver(service, *pack));
         } catch (Base::Error const& failure) {
-            failures_.append(json::Object{{"file", file}, {"reason", failure.what()}});
-            terminal_.complain(failure.what());
+            failures_.append(json::Object{
+                {"file", file}, {"reason", failure.what()}, {"code", Base::nameOf(failure.code())}});
+            terminal_.complain(failure);
         }
     }
     int finish() const {

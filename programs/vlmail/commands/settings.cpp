@@ -41,8 +41,9 @@ json::Value valueIn(std::string const& key, std::string const& text, json::Value
     try {
         return json::strToObject(document.data(), document.size()).get("v");
     } catch (json::Exc const&) {
-        throw Base::Error("\"" + key + "\" wants a value in JSON like " + valueInWords(model) + ", and \"" +
-                          text + "\" is none");
+        throw Base::Error(Base::Code::SettingInvalid, "\"" + key + "\" wants a value in JSON like " +
+                                                          valueInWords(model) + ", and \"" + text +
+                                                          "\" is none");
     }
 }
 
@@ -52,7 +53,8 @@ json::Object readDocument(std::string const& file) {
         // Editors alone look at the name of the schema.
         return Base::Schema::without(json::strToObject(text.data(), text.size()), Base::Schema::KEY);
     } catch (json::Exc const& wrong) {
-        throw Base::Error("cannot use \"" + file + "\": " + wrong.what() + "; correct the file there");
+        throw Base::Error(Base::Code::SettingsMalformed,
+                          "cannot use \"" + file + "\": " + wrong.what() + "; correct the file there");
     }
 }
 

@@ -53,7 +53,8 @@ void setPart(Channel::Client& service, std::string const& node, std::string cons
     for (SetCommand const& command : setCommands())
         if (command.part == part)
             return command.send(service, Cfg::Id(node, false), own);
-    throw Base::Error("there is no part \"" + part + "\"; name app, inet, po, deps, profiles or presets");
+    throw Base::Error(Base::Code::SettingUnknown,
+                      "there is no part \"" + part + "\"; name app, inet, po, deps, profiles or presets");
 }
 
 using Protocol::PartSettings;
@@ -68,7 +69,8 @@ void requireKey(std::string const& part, std::string const& key, json::Object co
     std::string known;
     for (auto const& [name, value] : values)
         known += (known.empty() ? "" : ", ") + std::string(name);
-    throw Base::Error("the part \"" + part + "\" has no setting \"" + key + "\"; it has " + known);
+    throw Base::Error(Base::Code::SettingUnknown,
+                      "the part \"" + part + "\" has no setting \"" + key + "\"; it has " + known);
 }
 
 /// The own values with some of them changed by KEY=VALUE.
@@ -77,7 +79,8 @@ json::Object assigned(PartSettings settings, std::string const& part,
     for (std::string const& assignment : assignments) {
         auto const equals = assignment.find('=');
         if (equals == std::string::npos)
-            throw Base::Error("\"" + assignment + "\" is neither the only argument, a file, nor KEY=VALUE");
+            throw Base::Error(Base::Code::Usage,
+                              "\"" + assignment + "\" is neither the only argument, a file, nor KEY=VALUE");
         std::string const key = assignment.substr(0, equals);
         requireKey(part, key, settings.values);
         settings.own.set(key, valueIn(key, assignment.substr(equals + 1), settings.values.get(key)));

@@ -68,7 +68,8 @@ json::Object changesIn(std::vector<std::string> const& assignments) {
             std::find_if(std::begin(Protocol::SETTABLE), std::end(Protocol::SETTABLE),
                          [&](Protocol::ServiceSetting const& setting) { return key == setting.key; });
         if (equals == std::string::npos || known == std::end(Protocol::SETTABLE))
-            throw Base::Error("\"" + assignment + "\" sets nothing; write " + assignmentsInWords());
+            throw Base::Error(Base::Code::Usage,
+                              "\"" + assignment + "\" sets nothing; write " + assignmentsInWords());
         changes.set(key, parsed(key, assignment.substr(equals + 1), known->form));
     }
     return changes;
@@ -83,8 +84,8 @@ void warnOfCarriers(Channel::Client& service, json::Object const& changes, Termi
         try {
             ask(service, Protocol::CarrierChange(Protocol::CarrierAction::Test, channel));
         } catch (Base::Error const& failure) {
-            terminal.complain(std::string("the carrier of ") + channel +
-                              " is set and cannot be had yet: " + failure.what());
+            terminal.complain(failure.code(), std::string("the carrier of ") + channel +
+                                                  " is set and cannot be had yet: " + failure.what());
         }
     }
 }
@@ -119,8 +120,9 @@ int suspend(Options const& options, Terminal const& terminal) {
     auto const found = std::find_if(std::begin(SUSPENSIONS), std::end(SUSPENSIONS),
                                     [&](auto const& row) { return options.suspended == row.first; });
     if (found == std::end(SUSPENSIONS))
-        throw Base::Error("\"" + options.suspended +
-                          "\" cannot be held back; name settings, jobs, all or nothing");
+        throw Base::Error(Base::Code::Usage,
+                          "\"" + options.suspended +
+                              "\" cannot be held back; name settings, jobs, all or nothing");
     auto const service = connectToService(options.service, terminal.err);
     service->call<Ipc::CSConfigSrvChange>(static_cast<Ipc::CSConfigSrvChange::SuspendType>(found->second));
     return FINE;

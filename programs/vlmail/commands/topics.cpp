@@ -49,6 +49,7 @@ constexpr Manual::Topic TOPICS[] = {
     // Beside the commands.
     {Manual::EXIT_STATUS, LETTERS, "Exit status"},
     {"carriers-documents", "carriers.md", ""},
+    {"errors", "errors.md", ""},
     {"explain", "explain.md", ""},
     {"formats", "formats.md", ""},
     {"jobs", "service.md", "Jobs"},

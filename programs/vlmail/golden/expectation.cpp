@@ -75,7 +75,8 @@ void requireKnownKeys(json::Object const& object, std::span<char const* const> k
         std::string all;
         for (char const* one : known)
             all += (all.empty() ? "" : ", ") + inQuotes(one);
-        throw Base::Error(inQuotes(name) + " is nothing that can be expected there; write one of " + all);
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          inQuotes(name) + " is nothing that can be expected there; write one of " + all);
     }
 }
 
@@ -88,17 +89,20 @@ bool isValue(json::Value const& value) {
 
 void requireLetter(json::Value const& letter) {
     if (!letter.isObject())
-        throw Base::Error("a letter must be an object; write {\"fields\": {...}}");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "a letter must be an object; write {\"fields\": {...}}");
     requireKnownKeys(letter.toObject(), LETTER_KEYS);
     json::Value const fields = letter.toObject().get(FIELDS);
     if (!fields.isObject())
-        throw Base::Error("a letter has no object \"fields\"; write the fields that it is to have");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "a letter has no object \"fields\"; write the fields that it is to have");
     for (auto const& [name, value] : fields.toObject())
         if (!isValue(value))
             throw Base::Error(
+                Base::Code::ExpectationMalformed,
                 "the value of " + inQuotes(name) +
-                " is none that a field can have; write a text, a number, {\"date\": \"...\"} or "
-                "{\"invalid\": \"...\"}");
+                    " is none that a field can have; write a text, a number, {\"date\": \"...\"} or "
+                    "{\"invalid\": \"...\"}");
 }
 
 std::string shown(json::Value const& value) {
@@ -227,7 +231,8 @@ std::string printed(json::Object const& expectation) {
     std::unique_ptr<char, decltype(&std::free)> const text(
         json_dumps(expectation.node(), JSON_INDENT(2) | JSON_REAL_PRECISION(15)), std::free);
     if (!text)
-        throw Base::Error("the fields hold text that is no UTF-8, which cannot be written");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "the fields hold text that is no UTF-8, which cannot be written");
     return std::string(text.get()) + '\n';
 }
 
@@ -236,17 +241,20 @@ json::Object readExpectation(std::string const& text) {
     try {
         expectation = json::strToObject(text.data(), text.size());
     } catch (json::Exc const& wrong) {
-        throw Base::Error(std::string(wrong.what()) + "; correct the file there");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          std::string(wrong.what()) + "; correct the file there");
     }
     requireKnownKeys(expectation, DOCUMENT_KEYS);
     json::Value const letters = expectation.get(LETTERS);
     if (!letters)
-        throw Base::Error("\"letters\" is missing; write a list of letters, or null for an attachment");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "\"letters\" is missing; write a list of letters, or null for an attachment");
     if (letters.isArray())
         for (json::Value const& letter : letters.toArray())
             requireLetter(letter);
     else if (!json_is_null(letters.node()))
-        throw Base::Error("\"letters\" is no list; write a list of letters, or null for an attachment");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "\"letters\" is no list; write a list of letters, or null for an attachment");
     return expectation;
 }
 

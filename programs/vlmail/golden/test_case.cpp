@@ -39,8 +39,9 @@ std::vector<fs::path> filesIn(fs::path const& folder) {
     std::error_code failure;
     fs::recursive_directory_iterator entries(folder, failure);
     if (failure)
-        throw Base::Error("cannot look into the folder " + inQuotes(folder.string()) + ": " +
-                          failure.message() + "; name a folder with test cases");
+        throw Base::Error(Base::Code::FileUnreadable,
+                          "cannot look into the folder " + inQuotes(folder.string()) + ": " +
+                              failure.message() + "; name a folder with test cases");
     std::vector<fs::path> files;
     for (fs::directory_entry const& entry : entries)
         if (entry.is_regular_file())
@@ -68,8 +69,9 @@ std::vector<TestCase> testCasesIn(fs::path const& folder) {
             cases.push_back({{}, file, nameOf(file)});
     }
     if (cases.empty())
-        throw Base::Error("there are no test cases in " + inQuotes(folder.string()) +
-                          "; put PDF or text documents there");
+        throw Base::Error(Base::Code::FileUnsuitable, "there are no test cases in " +
+                                                          inQuotes(folder.string()) +
+                                                          "; put PDF or text documents there");
     return cases;
 }
 

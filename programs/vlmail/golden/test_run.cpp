@@ -23,7 +23,8 @@ json::Object expectationIn(std::filesystem::path const& file) {
     try {
         return readExpectation(Base::readFile(file));
     } catch (Base::Error const& wrong) {
-        throw Base::Error("its expectation cannot be used: " + std::string(wrong.what()));
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "its expectation cannot be used: " + std::string(wrong.what()));
     }
 }
 

@@ -33,12 +33,14 @@ std::vector<ZoneSection> sectionsOf(std::string const& text) {
         if (isHeading(line))
             sections.push_back({line.substr(1, line.size() - 2), {}});
         else if (sections.empty())
-            throw Base::Error("it does not begin with the name of a zone; put [Name] in front");
+            throw Base::Error(Base::Code::ExpectationMalformed,
+                              "it does not begin with the name of a zone; put [Name] in front");
         else
             sections.back().text += (sections.back().text.empty() ? "" : "\n") + line;
     }
     if (sections.empty())
-        throw Base::Error("it is empty; write [Name of a zone] and the zone's text");
+        throw Base::Error(Base::Code::ExpectationMalformed,
+                          "it is empty; write [Name of a zone] and the zone's text");
     return sections;
 }
 
@@ -53,8 +55,9 @@ ExtractZone const& zoneNamed(std::string const& name, Cfg::ExtractPreset const& 
     auto const& zones = preset.zones();
     auto const zone = std::ranges::find(zones, name, &ExtractZone::name);
     if (zone == zones.end())
-        throw Base::Error("the preset for " + inQuotes(preset.strRegex()) + " has no zone " + inQuotes(name) +
-                          "; it has " + namesOf(zones));
+        throw Base::Error(Base::Code::ExpectationMalformed, "the preset for " + inQuotes(preset.strRegex()) +
+                                                                " has no zone " + inQuotes(name) +
+                                                                "; it has " + namesOf(zones));
     return *zone;
 }
 

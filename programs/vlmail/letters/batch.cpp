@@ -47,6 +47,7 @@ ReadResult unpack(std::string bytes) {
 ReadResult unread(std::string const& file, JobFailure failure, JobLimits const& limits) {
     ReadResult result;
     result.reading.document = Base::validUtf8(std::filesystem::path(file).filename().string());
+    result.reading.code = Base::Code::LimitExceeded;
     result.reading.error = "cannot read \"" + Base::validUtf8(file) + "\": " + inWords(failure, limits);
     return result;
 }

@@ -39,8 +39,9 @@ DocumentFolder::DocumentFolder(fs::path folder) : folder_(std::move(folder)) {
         for (fs::path const& file : filesIn(folder_))
             listed_.add(file);
     } catch (fs::filesystem_error const& failure) {
-        throw Base::Error("cannot list the folder " + Base::inQuotes(folder_.string()) + ": " +
-                          failure.code().message() + "; name another with --documents");
+        throw Base::Error(Base::Code::FileUnreadable,
+                          "cannot list the folder " + Base::inQuotes(folder_.string()) + ": " +
+                              failure.code().message() + "; name another with --documents");
     }
 }
 
@@ -58,8 +59,9 @@ fs::path const* DocumentFolder::Names::find(std::string const& id) const {
 
 FoundDocument DocumentFolder::find(std::string const& id) const {
     if (!Production::isDocumentId(id))
-        throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + Base::inQuotes(Base::plainText(id)) +
-                          " cannot be the name of a document; correct the pack preset");
+        throw Base::Error(Base::Code::DocumentUnknown,
+                          std::string(Production::DOCUMENT_UNKNOWN) + Base::inQuotes(Base::plainText(id)) +
+                              " cannot be the name of a document; correct the pack preset");
     if (auto const fixed = fixed_.find(id); fixed != fixed_.end())
         return fixed->second;
     if (fs::path const* const file = batch_.find(id))
@@ -71,17 +73,19 @@ FoundDocument DocumentFolder::find(std::string const& id) const {
     if (elsewhere_)
         if (std::optional<FoundDocument> found = elsewhere_->find(id))
             return std::move(*found);
-    throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + "there is no document " +
-                      Base::inQuotes(id) + places());
+    throw Base::Error(Base::Code::DocumentUnknown, std::string(Production::DOCUMENT_UNKNOWN) +
+                                                       "there is no document " + Base::inQuotes(id) +
+                                                       places());
 }
 
 /// A link may lead anywhere.
 void DocumentFolder::requireInside(std::string const& id, fs::path const& file) const {
     std::error_code failure;
     if (fs::canonical(file, failure).parent_path() != folder_ || failure)
-        throw Base::Error(std::string(Production::DOCUMENT_UNKNOWN) + Base::inQuotes(id) + " in " +
-                          Base::inQuotes(folder_.string()) +
-                          " is a link out of the folder; put the document there itself");
+        throw Base::Error(Base::Code::DocumentUnknown,
+                          std::string(Production::DOCUMENT_UNKNOWN) + Base::inQuotes(id) + " in " +
+                              Base::inQuotes(folder_.string()) +
+                              " is a link out of the folder; put the document there itself");
 }
 
 std::string DocumentFolder::places() const {

@@ -38,10 +38,11 @@ bool isPresetsPart(json::Object const& document) {
 void requirePartNames(json::Object const& document, fs::path const& file) {
     for (auto const& [name, part] : document) {
         if (!isPartName(name) && std::string_view(name) != Base::Schema::KEY)
-            throw Base::Error(
-                "cannot use the settings in " + Base::inQuotes(file.string()) + ": \"" + name +
-                "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", \"po\", \"deps\" or "
-                "\"profiles\"");
+            throw Base::Error(Base::Code::SettingUnknown,
+                              "cannot use the settings in " + Base::inQuotes(file.string()) + ": \"" + name +
+                                  "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", "
+                                  "\"po\", \"deps\" or "
+                                  "\"profiles\"");
     }
 }
 
@@ -55,8 +56,9 @@ NodeSettings NodeSettings::fromFile(fs::path const& file) {
     try {
         settings.parts_ = json::strToObject(settings.text_.data(), settings.text_.size());
     } catch (json::Exc const& wrong) {
-        throw Base::Error("cannot read the settings in " + Base::inQuotes(file.string()) + ": " +
-                          wrong.what() + "; correct the file there");
+        throw Base::Error(Base::Code::SettingsMalformed, "cannot read the settings in " +
+                                                             Base::inQuotes(file.string()) + ": " +
+                                                             wrong.what() + "; correct the file there");
     }
     if (isPresetsPart(settings.parts_))
         settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};
@@ -95,8 +97,8 @@ Cfg::Presets NodeSettings::presets() const {
     try {
         return Cfg::Presets(part(Cfg::Presets::PART_NAME), true, sorted_);
     } catch (std::exception const& wrong) {
-        throw Base::Error("cannot use the presets in " + place_ + ": " + wrong.what() +
-                          "; correct them there");
+        throw Base::Error(Base::Code::SettingsMalformed, "cannot use the presets in " + place_ + ": " +
+                                                             wrong.what() + "; correct them there");
     }
 }
 
@@ -106,8 +108,8 @@ Cfg::App const& NodeSettings::app() const {
             app_ = std::make_shared<Cfg::App const>(part(Cfg::App::PART_NAME), true, sorted_);
         return *app_;
     } catch (std::exception const& wrong) {
-        throw Base::Error("cannot use the part \"app\" in " + place_ + ": " + wrong.what() +
-                          "; correct it there");
+        throw Base::Error(Base::Code::SettingsMalformed, "cannot use the part \"app\" in " + place_ + ": " +
+                                                             wrong.what() + "; correct it there");
     }
 }
 

@@ -152,8 +152,9 @@ bool PresetIndex::fits(Cfg::ExtractPreset const& preset, std::string const& name
     } catch (std::runtime_error const&) {
         if (!time.isUp())
             throw;
-        throw Base::Error("the patterns of presets took longer than " + Reader::inSeconds(time_) +
-                          " for the document's name, " + Base::inQuotes(preset.strRegex()) + " last");
+        throw Base::Error(Base::Code::LimitExceeded,
+                          "the patterns of presets took longer than " + Reader::inSeconds(time_) +
+                              " for the document's name, " + Base::inQuotes(preset.strRegex()) + " last");
     }
 }
 

@@ -30,6 +30,7 @@ namespace fs = std::filesystem;
 
 constexpr char const* DOCUMENT_KEY = "document";
 constexpr char const* ERROR_KEY = "error";
+constexpr char const* CODE_KEY = "code";
 constexpr char const* EXTRACT_PRESET_KEY = "extract_preset";
 constexpr char const* PACK_PRESET_KEY = "pack_preset";
 constexpr char const* LETTERS_KEY = "letters";
@@ -221,6 +222,13 @@ constexpr DocumentRow DOCUMENT_ROWS[] = {
          return reading.failed() ? json::Value(reading.error) : json::Value();
      },
      [](json::Value const& node, DocumentReading& reading) { reading.error = node.textOrEmpty(); }},
+    {CODE_KEY, Presence::WhenThere, &Schema::text,
+     [](DocumentReading const& reading) {
+         return reading.failed() ? json::Value(Base::nameOf(reading.code)) : json::Value();
+     },
+     [](json::Value const& node, DocumentReading& reading) {
+         reading.code = Base::codeNamed(node.textOrEmpty()).value_or(Base::Code::Unexpected);
+     }},
     {EXTRACT_PRESET_KEY, Presence::WhenThere, &Schema::text,
      [](DocumentReading const& reading) { return unlessFailed(reading, reading.extractPreset); },
      [](json::Value const& node, DocumentReading& reading) {
@@ -247,8 +255,9 @@ void requirePattern(std::string const& pattern, std::string const& whose, NodeSe
     try {
         Cfg::ExtractPreset::match(pattern, std::string());
     } catch (std::exception const& bad) {
-        throw Base::Error("the pattern " + Base::inQuotes(pattern) + " of " + whose +
-                          " cannot be used: " + bad.what() + "; correct it in " + settings.place());
+        throw Base::Error(Base::Code::PatternInvalid, "the pattern " + Base::inQuotes(pattern) + " of " +
+                                                          whose + " cannot be used: " + bad.what() +
+                                                          "; correct it in " + settings.place());
     }
 }
 
@@ -269,7 +278,8 @@ findPresets(std::string const& name, PresetIndex const& presets, NodeSettings co
     try {
         return presets.findMatch(name);
     } catch (std::exception const& failure) {
-        throw Base::Error(std::string(failure.what()) + "; correct the presets in " + settings.place());
+        throw Base::Error(Base::Code::PresetMissing,
+                          std::string(failure.what()) + "; correct the presets in " + settings.place());
     }
 }
 
@@ -409,7 +419,7 @@ private:
             if (along_.pages == Along::Pages::Yes)
                 blob.data = Mailing::compressed(Production::coverPage(letter.coverAddress, rules_));
         } catch (Base::Error const& failure) {
-            throw Unmade(failure.what());
+            throw Unmade(Base::Code::DocumentUnreadable, failure.what());
         }
     }
 
@@ -452,7 +462,7 @@ private:
             return along_.pages == Along::Pages::Yes ? maker_->make(content, {kind}, place)
                                                      : maker_->plan(content, {kind}, place);
         } catch (Base::Error const& failure) {
-            throw Unmade(failure.what());
+            throw Unmade(Base::Code::DocumentUnreadable, failure.what());
         }
     }
 
@@ -515,6 +525,7 @@ void readLetters(ReadResult& result, Reader::Document& document, PresetIndex con
 void fail(ReadResult& result, std::exception const& failure) {
     result.reading.document = Base::validUtf8(result.reading.document);
     result.reading.error = Base::validUtf8(failure.what());
+    result.reading.code = Base::codeOf(failure);
     result.reading.letters.reset();
     result.report.clear();
 }
@@ -611,7 +622,8 @@ ReadResult splitDocument(DecidedDocument decided, Cfg::Presets const& presets, s
         std::string bytes = Base::readFile(decided.file);
         result.sha256 = Base::sha256(bytes);
         if (result.sha256 != decided.sha256)
-            throw Base::Error('"' + decided.file.string() + "\" has changed; make the plan again");
+            throw Base::Error(Base::Code::DocumentChanged,
+                              '"' + decided.file.string() + "\" has changed; make the plan again");
         Reader::Document document = Reader::openDocument(std::move(bytes), decided.file);
         // Without such a preset there is no mailing, which is said where it would begin.
         if (Cfg::PackPreset const* const preset = packPresetNamed(result.reading.packPreset, presets))

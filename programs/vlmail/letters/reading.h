@@ -2,6 +2,7 @@
 // What reading a document by the presets has given, and its JSON form, in which worker processes hand it
 // over.
 
+#include "programs/base/error_code.h"
 #include "programs/production/finding.h"
 #include "programs/reader/letter_joins.h"
 #include "programs/vlmail/letters/page_blob.h"
@@ -65,6 +66,8 @@ struct DocumentReading {
     std::string document;
     /// One line, when the document could not be read; of the rest only the trace is set then.
     std::string error;
+    /// Of the error, when there is one.
+    Base::Code code = Base::Code::Unexpected;
     /// The match text of the extraction preset, and what it is called.
     std::string extractPreset;
     std::string extractPresetName;
@@ -77,7 +80,8 @@ struct DocumentReading {
     bool failed() const { return !error.empty(); }
     bool isAttachment() const { return !failed() && !letters; }
 
-    /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error"}; and "trace".
+    /// {"document", "extract_preset", "pack_preset", "letters"}, or {"document", "error", "code"}; and
+    /// "trace".
     /// A letter is {"pages", "fields", "production_ready", "message", "primary_address"}, and where there are
     /// any "missing", the names of obligatory fields, "warnings", "differing_pages", "not_separated",
     /// "findings" and "cover_page".

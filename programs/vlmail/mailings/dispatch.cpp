@@ -21,7 +21,8 @@ namespace {
 Cfg::PackPreset const& requirePackPreset(std::string const& name, Cfg::Presets const& presets) {
     if (Cfg::PackPreset const* const preset = packPresetNamed(name, presets))
         return *preset;
-    throw Base::Error("there is no pack preset " + Base::inQuotes(name) + "; add it to the settings");
+    throw Base::Error(Base::Code::PresetMissing,
+                      "there is no pack preset " + Base::inQuotes(name) + "; add it to the settings");
 }
 
 long long sumOf(Mailing::Metadata const& mailing, long long Mailing::MailedLetter::*number) {
@@ -74,6 +75,7 @@ void requireName(DocumentReading& reading) {
     if (reading.failed() || !reading.letters || Container::mayStandInIndex(reading.document))
         return;
     reading.letters.reset();
+    reading.code = Base::Code::NameInvalid;
     reading.error = "cannot mail " + Base::inQuotes(reading.document) +
                     ": its name has a character that a mailing cannot hold; rename the document";
 }
@@ -91,7 +93,7 @@ void Dispatch::take(ReadResult result) {
     refuseLetters(reading);
     outcome_.count(reading);
     if (reading.failed()) {
-        fail(reading.document, reading.error);
+        fail(reading.document, {reading.code, reading.error});
     } else if (reading.isAttachment()) {
         attachments_.push_back(reading.document);
     } else {
@@ -171,7 +173,7 @@ void Dispatch::finish() {
             arrived_.push_back(mailing.get());
         } catch (std::exception const& failure) {
             outcome_.fail();
-            fail(packPreset, failure.what());
+            fail(packPreset, {Base::codeOf(failure), failure.what()});
         }
     }
 }
@@ -181,9 +183,9 @@ void Dispatch::estimate(Channel::Client& service) {
         prices_.try_emplace(mailing.get(), service, mailing->builder().metadata());
 }
 
-void Dispatch::fail(std::string const& name, std::string const& reason) {
-    failures_.push_back({name, {}, reason});
-    terminal_.complain(reason);
+void Dispatch::fail(std::string const& name, Base::Error const& failure) {
+    failures_.push_back({name, {}, failure.what(), Base::nameOf(failure.code())});
+    terminal_.complain(failure);
 }
 
 void Dispatch::print() const {
@@ -313,6 +315,8 @@ struct Dispatch::Rows {
          [](LeftBehind const& left) { return left.pages.empty() ? json::Value() : toJsonArray(left.pages); }},
         {"reason", Presence::Always, &Schema::text,
          [](LeftBehind const& left) -> json::Value { return left.reason; }},
+        {"code", Presence::WhenThere, &Schema::text,
+         [](LeftBehind const& left) { return unlessEmpty(left.code); }},
     };
     static constexpr Base::JsonRow<Notification> NOTIFICATION[] = {
         {"name", Presence::Always, &Schema::text,

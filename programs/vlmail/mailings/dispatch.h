@@ -1,6 +1,7 @@
 #pragma once
 // Sorts the letters of a batch into mailings, one a pack preset, and keeps account of what stays behind.
 
+#include "programs/base/error.h"
 #include "programs/channel/client.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -49,6 +50,8 @@ private:
         std::string name;
         std::vector<int> pages;
         std::string reason;
+        /// Of a failure; what is left out for a finding has the code in front of its reason.
+        std::string code = {};
     };
 
     /// Somebody who is to hear of a letter that goes out, by an address of a priority below 0.
@@ -65,7 +68,7 @@ private:
     void noteNotifications(std::string const& name, LetterReading const& letter);
     OutgoingMailing& mailingFor(std::string const& packPreset);
     std::string priceInWords(OutgoingMailing const* mailing) const;
-    void fail(std::string const& name, std::string const& reason);
+    void fail(std::string const& name, Base::Error const& failure);
     json::Array mailingsToJson() const;
     void printWays() const;
     std::vector<std::string> wayInWords(OutgoingMailing& mailing, Mailing::MailedLetter const& letter) const;

@@ -14,7 +14,8 @@ Policy::Rules rulesOf(Policy::SourcedSettings const& settings) {
     try {
         return Policy::Rules(settings);
     } catch (std::exception const& wrong) {
-        throw Base::Error(std::string("cannot use the settings: ") + wrong.what() + "; correct them there");
+        throw Base::Error(Base::Code::SettingsMalformed,
+                          std::string("cannot use the settings: ") + wrong.what() + "; correct them there");
     }
 }
 

@@ -107,8 +107,8 @@ void makeFolder(fs::path const& folder, ForOwner forOwner, char const* remedy) {
     if (isNew && forOwner == ForOwner::Alone)
         fs::permissions(folder, fs::perms::owner_all, failure);
     if (failure)
-        throw Base::Error("cannot make the folder \"" + folder.string() + "\": " + failure.message() + "; " +
-                          remedy);
+        throw Base::Error(Base::Code::FileUnwritable, "cannot make the folder \"" + folder.string() +
+                                                          "\": " + failure.message() + "; " + remedy);
 }
 
 } // namespace

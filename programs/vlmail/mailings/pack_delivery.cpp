@@ -58,7 +58,7 @@ void wantUpload(Channel::Client& service, std::string const& packId) {
     Protocol::JobsChangeAnswer const answer(
         ask(service, Protocol::JobsChange(Protocol::JobAction::Upload, {packId})));
     for (Protocol::JobRefusal const& refused : answer.refused)
-        throw Base::Error(refused.why);
+        throw Base::errorSaid(refused.why, Base::Code::StateRefused);
 }
 
 Protocol::JobReport awaitDelivery(ServiceLine& service, std::string const& packId) {
@@ -67,7 +67,7 @@ Protocol::JobReport awaitDelivery(ServiceLine& service, std::string const& packI
     // What it has of ours, it goes on with by itself.
     bool const isStuck = !job.problem.empty() && !isOverConnection(job);
     if (isStuck || job.state == Protocol::JobState::Failed)
-        throw Base::Error("the service has trouble with it: " + job.problem);
+        throw Base::Error(Base::Code::ServiceTrouble, "the service has trouble with it: " + job.problem);
     return job;
 }
 
@@ -95,7 +95,7 @@ Protocol::JobReport orNamed(std::string const& packId, std::string const& remedy
     try {
         return delivery();
     } catch (std::exception const& failure) {
-        throw Base::Error("mailing " + packId + ": " + failure.what() + remedy);
+        throw Base::Error(Base::codeOf(failure), "mailing " + packId + ": " + failure.what() + remedy);
     }
 }
 
@@ -127,7 +127,8 @@ Protocol::JobReport deliverPack(ServiceLine& service, fs::path const& database, 
 Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack, bool upload,
                                 UploadWatcher const& watcher) {
     if (!service.client().takesData())
-        throw Base::Error("the service takes no pages over the connection: bring it up to date");
+        throw Base::Error(Base::Code::ServiceOutdated,
+                          "the service takes no pages over the connection: bring it up to date");
     return orNamed(pack.packId(), "; sending it again goes on where it was, and never sends it twice",
                    [&] { return deliverOverConnection(service, pack, upload, watcher); });
 }
@@ -163,14 +164,16 @@ void discardPack(Channel::Client& service, fs::path const& database, std::string
     std::vector<Mailing::StoredPack> packs = Mailing::finishedPacks(database);
     std::erase_if(packs, [&](Mailing::StoredPack const& pack) { return pack.info.id != packId; });
     if (packs.empty())
-        throw Base::Error("the pack database " + database.string() + " has no mailing " + packId +
-                          "; \"vlmail status --stranded\" lists those that it has");
+        throw Base::Error(Base::Code::MailingUnknown,
+                          "the pack database " + database.string() + " has no mailing " + packId +
+                              "; \"vlmail status --stranded\" lists those that it has");
     Jobs const jobs = jobsOf(service, packs);
     if (!jobs.empty() && jobs.begin()->second.state == Protocol::JobState::Accepted)
-        throw Base::Error((isOverConnection(jobs.begin()->second)
+        throw Base::Error(Base::Code::StateRefused,
+                          (isOverConnection(jobs.begin()->second)
                                ? "the service has mailing "
                                : "the service is about to fetch mailing ") +
-                          packId + " and its letters will go out: it cannot be discarded");
+                              packId + " and its letters will go out: it cannot be discarded");
     Mailing::removePack(database, packId);
 }
 

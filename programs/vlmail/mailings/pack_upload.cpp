@@ -38,7 +38,8 @@ SharedMemBuffer blobAt(PackSource& pack, long long position) {
     bool const isPage = static_cast<std::size_t>(position) < pack.pages().size();
     SharedMemBuffer blob = isPage ? pageOf(pack, nameAt(pack, position)) : pack.metadata();
     if (blob.empty())
-        throw Base::Error(isPage ? "page " + std::to_string(position + 1) + " of it cannot be read"
+        throw Base::Error(Base::Code::MailingDamaged,
+                          isPage ? "page " + std::to_string(position + 1) + " of it cannot be read"
                                  : "its metadata cannot be read");
     return blob;
 }
@@ -142,9 +143,10 @@ BeginPack beginningOf(PackSource& pack) {
     }
     beginning.sha256 = digest.text();
     if (beginning.bytes > BeginPack::MAX_BYTES || beginning.pages > BeginPack::MAX_PAGES)
-        throw Base::Error("it has " + std::to_string(beginning.bytes) + " bytes and " +
-                          std::to_string(beginning.pages) +
-                          " pages, and 8 GiB and 10000000 pages are the most: mail fewer letters at once");
+        throw Base::Error(
+            Base::Code::TooLarge,
+            "it has " + std::to_string(beginning.bytes) + " bytes and " + std::to_string(beginning.pages) +
+                " pages, and 8 GiB and 10000000 pages are the most: mail fewer letters at once");
     return beginning;
 }
 

@@ -81,8 +81,8 @@ std::vector<UsedDocument> usedDocumentsIn(json::Value const& array) {
 void requireSame(UsedDocument const& used, std::vector<UsedDocument> const& planned) {
     auto const same = [&](UsedDocument const& one) { return one.id == used.id && one.sha256 == used.sha256; };
     if (std::none_of(planned.begin(), planned.end(), same))
-        throw Base::Error("cannot carry out the plan: \"" + used.file.string() +
-                          "\" has changed; make it again with vlmail plan");
+        throw Base::Error(Base::Code::PlanOutdated, "cannot carry out the plan: \"" + used.file.string() +
+                                                        "\" has changed; make it again with vlmail plan");
 }
 
 /// What is wrong with a file now, or nothing.
@@ -110,9 +110,9 @@ Plan Plan::fromFile(fs::path const& file) {
     try {
         json::Object const object = json::strToObject(text.data(), text.size());
         if (object.get(VERSION_KEY).intOrZero() != PLAN_VERSION)
-            throw Base::Error("it is no plan of this version");
+            throw Base::Error(Base::Code::PlanMalformed, "it is no plan of this version");
         if (object.get(DIGEST_KEY).textOrEmpty() != digestOf(object))
-            throw Base::Error("it was changed since it was made");
+            throw Base::Error(Base::Code::PlanMalformed, "it was changed since it was made");
         Plan plan;
         if (json::Value const settings = object.get(SETTINGS_KEY); settings.isObject())
             plan.readSettings(settings.toObject());
@@ -124,8 +124,8 @@ Plan Plan::fromFile(fs::path const& file) {
         }
         return plan;
     } catch (std::exception const& wrong) {
-        throw Base::Error("cannot use the plan \"" + file.string() + "\": " + wrong.what() +
-                          "; make it again with vlmail plan");
+        throw Base::Error(Base::Code::PlanMalformed, "cannot use the plan \"" + file.string() + "\": " +
+                                                         wrong.what() + "; make it again with vlmail plan");
     }
 }
 
@@ -208,7 +208,8 @@ void Plan::requireUnchanged() const {
             check(document.file, document.sha256);
     }
     if (!changes.empty())
-        throw Base::Error("cannot carry out the plan: " + changes + "; make it again with vlmail plan");
+        throw Base::Error(Base::Code::PlanOutdated,
+                          "cannot carry out the plan: " + changes + "; make it again with vlmail plan");
 }
 
 NodeSettings Plan::settings() const {
@@ -230,8 +231,9 @@ DocumentFolder Plan::usedDocuments(Fetch const& fetch) const {
                        {used.file, used.isOfService ? std::make_shared<std::string const>(fetch(used.sha256))
                                                     : nullptr});
         } catch (Base::Error const& gone) {
-            throw Base::Error("cannot carry out the plan: \"" + used.file.string() + "\": " + gone.what() +
-                              "; make it again with vlmail plan");
+            throw Base::Error(Base::Code::PlanOutdated, "cannot carry out the plan: \"" + used.file.string() +
+                                                            "\": " + gone.what() +
+                                                            "; make it again with vlmail plan");
         }
     }
     return folder;

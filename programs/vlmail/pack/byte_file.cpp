@@ -15,7 +15,7 @@ constexpr std::size_t WINDOW = std::size_t{1} << 20;
 constexpr std::size_t STEP = std::size_t{1} << 12;
 
 [[noreturn]] void cannotRead(std::filesystem::path const& path, std::string const& why) {
-    throw Base::Error("cannot read \"" + path.string() + "\": " + why);
+    throw Base::Error(Base::Code::FileUnreadable, "cannot read \"" + path.string() + "\": " + why);
 }
 
 Base::FileDescriptor openForReading(std::filesystem::path const& path) {

@@ -38,9 +38,10 @@ ContainerFile::ContainerFile(std::string const& path) : file_(path) {
     container_.emplace(path, PackWrapper::PURPOSE_IMPORT, std::string());
     if (container_->failed()) {
         requireReadable();
-        throw Base::Error("cannot read \"" + path +
-                          "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
-                          "salvage\" saves what is left of it");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "cannot read \"" + path +
+                              "\": it is no mailing file, or its index is damaged; \"vlmail pack " +
+                              "salvage\" saves what is left of it");
     }
     findOverlaps();
 }

@@ -11,10 +11,12 @@ namespace {
 void requireWhole(ContainerFile& file, std::string const& path) {
     ContainerCheck const check = checkContainer(file);
     if (!check.damages.empty())
-        throw Base::Error("cannot send " + Base::inQuotes(path) + ": " + check.damages.front() +
-                          "; \"vlmail pack verify\" tells all that is damaged");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "cannot send " + Base::inQuotes(path) + ": " + check.damages.front() +
+                              "; \"vlmail pack verify\" tells all that is damaged");
     if (check.pages == 0)
-        throw Base::Error("cannot send " + Base::inQuotes(path) + ": it has no pages");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "cannot send " + Base::inQuotes(path) + ": it has no pages");
 }
 
 } // namespace

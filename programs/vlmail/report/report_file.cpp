@@ -14,8 +14,9 @@ namespace fs = std::filesystem;
 
 fs::path const& requireHtml(fs::path const& target) {
     if (target.extension() != ".html" && target.extension() != ".htm")
-        throw Base::Error("cannot write a report to \"" + Base::validUtf8(target.string()) +
-                          "\": its name must end in .html; give --report another name");
+        throw Base::Error(Base::Code::Usage,
+                          "cannot write a report to \"" + Base::validUtf8(target.string()) +
+                              "\": its name must end in .html; give --report another name");
     return target;
 }
 

@@ -59,7 +59,7 @@ json::Object readDocument() {
     DocumentReading::describe(members);
     json::Object const whole = members.schema();
     json::Array either;
-    either.append(json::Object{{"required", listOf({"error"})}});
+    either.append(json::Object{{"required", listOf({"error", "code"})}});
     either.append(json::Object{{"required", listOf({"extract_preset", "pack_preset", "letters"})}});
     return Schema::with(described(whole, {LETTERS_PAGE, {"Reading: "}}), "oneOf", either);
 }

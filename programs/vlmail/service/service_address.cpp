@@ -13,8 +13,9 @@ std::string ServiceAddress::text() const { return Base::hostPortText(host, port)
 ServiceAddress parseServiceAddress(std::string const& text) {
     auto address = Base::hostPortIn(text);
     if (!address)
-        throw Base::Error("\"" + text +
-                          "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
+        throw Base::Error(Base::Code::Usage,
+                          "\"" + text +
+                              "\" names no service: write HOST:PORT, with an IPv6 address in brackets");
     return {std::move(address->host), address->port};
 }
 

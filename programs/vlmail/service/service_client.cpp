@@ -66,6 +66,7 @@ ServiceAddress findService(ServiceOptions const& options) {
     std::optional<ServiceAddress> const found = searchNetwork(tokenIfAny(options));
     if (!found)
         throw Base::Error(
+            Base::Code::ServiceNotFound,
             "no service answered on the network; name one with --service HOST:PORT, or see what "
             "\"vlmail discover --doctor\" says");
     return *found;
@@ -97,7 +98,7 @@ json::Object const& requireAnswer(json::Object const& answer) {
 
 void requireNoError(std::string const& error) {
     if (!error.empty())
-        throw Base::Error(error);
+        throw Base::errorSaid(error, Base::Code::ServiceRefused);
 }
 
 fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
@@ -107,8 +108,9 @@ fs::path packDatabaseOf(Channel::Client& service, std::string const& nodeId) {
     fs::path const folder = values.get("db_host").textOrEmpty();
     std::string const name = values.get("db_name").textOrEmpty();
     if (!name.empty() && Base::safeFileName(name) != name)
-        throw Base::Error("the setting \"db_name\" of node \"" + nodeId +
-                          "\" has to be the name of a file, and \"" + Base::plainLine(name) + "\" is none");
+        throw Base::Error(Base::Code::SettingInvalid, "the setting \"db_name\" of node \"" + nodeId +
+                                                          "\" has to be the name of a file, and \"" +
+                                                          Base::plainLine(name) + "\" is none");
     return (folder.is_absolute() ? folder : dataFolder()) / (name.empty() ? DEFAULT_PACK_DATABASE : name);
 }
 
@@ -132,7 +134,8 @@ Protocol::JobReport awaitJob(Channel::Client& service, std::string const& packId
         query.wait = std::max<long long>(left, 0);
         Protocol::JobsAnswer const answer(ask(service, query));
         if (answer.jobs.empty())
-            throw Base::Error("the service has no job of pack " + packId + "; send it again");
+            throw Base::Error(Base::Code::MailingUnknown,
+                              "the service has no job of pack " + packId + "; send it again");
         if (!waitsForPages(answer.jobs.front()) || left <= 0)
             return answer.jobs.front();
         // A service that holds no answers would be asked without a pause.

@@ -13,7 +13,8 @@ namespace {
 using Protocol::DocumentUpload;
 
 [[noreturn]] void failFetching() {
-    throw Base::Error("the service sent another document than was asked for; try again");
+    throw Base::Error(Base::Code::DocumentChanged,
+                      "the service sent another document than was asked for; try again");
 }
 
 } // namespace

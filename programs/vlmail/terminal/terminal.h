@@ -1,6 +1,9 @@
 #pragma once
 // Where a command writes, and how it ends.
 
+#include "programs/base/error_code.h"
+
+#include <exception>
 #include <iosfwd>
 #include <string>
 
@@ -21,8 +24,11 @@ struct Terminal {
     /// Whether a person watches `err`: progress is shown then.
     bool showsProgress = false;
 
-    /// "vlmail: " and the text, as one line in which nothing acts.
-    void complain(std::string const& text) const;
+    /// "vlmail: LINE [file-unreadable]", as one line in which nothing acts.
+    void complain(Base::Code code, std::string const& line) const;
+    void complain(std::exception const& failure) const;
+    /// "vlmail: LINE", of what is no failure.
+    void note(std::string const& line) const;
 };
 
 } // namespace VlMail

@@ -19,7 +19,8 @@ Mailing::MailingOutline outlineOf(Mailing::PackSource& pack) {
         return Mailing::outlineOf(metadata);
     } catch (std::exception const&) {
         // What is wrong would be told with values of letters.
-        throw Base::Error("the metadata of pack " + pack.info().id + " is none of a mailing");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "the metadata of pack " + pack.info().id + " is none of a mailing");
     }
 }
 
@@ -29,10 +30,11 @@ PackSummary summaryOf(Mailing::PackSource& pack) {
     PackSummary summary{pack.info().cfgId, pack.info().title, static_cast<long long>(pack.documentCount()),
                         static_cast<long long>(pack.pages().size())};
     if (summary.pages == 0)
-        throw Base::Error("pack " + pack.packId() + " has no pages");
+        throw Base::Error(Base::Code::MailingInvalid, "pack " + pack.packId() + " has no pages");
     if (!Base::isPlainText(summary.title, MAX_TITLE_BYTES))
-        throw Base::Error("the title of pack " + pack.packId() + " is not a line of text of at most " +
-                          std::to_string(MAX_TITLE_BYTES) + " bytes");
+        throw Base::Error(Base::Code::MailingInvalid, "the title of pack " + pack.packId() +
+                                                          " is not a line of text of at most " +
+                                                          std::to_string(MAX_TITLE_BYTES) + " bytes");
     checkNodeId(summary.cfgId);
     addOutline(summary, pack);
     return summary;
@@ -50,7 +52,8 @@ void requireAllowed(std::string const& packId, PackSummary const& summary, Polic
     if (auto const refusal = Policy::refusalOfSheets(summary.sheets, rules))
         refusals.push_back(*refusal);
     if (!refusals.empty())
-        throw Base::Error(Policy::inOneLine(refusals) + "; pack " + packId + " is not taken");
+        throw Base::Error(Base::Code::RefusedBySettings,
+                          Policy::inOneLine(refusals) + "; pack " + packId + " is not taken");
 }
 
 Job jobFor(PackLocation const& pack, PackSummary const& summary, Policy::Moment const& moment) {

@@ -43,7 +43,8 @@ void copyDatabase(fs::path const& file, Database::DatabaseKind const& kind, fs::
         Database::requireKind(source, kind, file);
         SQLite::Database copy(target.string(), SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE);
         if (SQLite::Backup(copy, source).executeStep() != SQLITE_DONE)
-            throw Base::Error(Database::theFile(kind, file) + " is busy: try again");
+            throw Base::Error(Base::Code::DatabaseBusy,
+                              Database::theFile(kind, file) + " is busy: try again");
         copy.exec("PRAGMA journal_mode = DELETE");
     } catch (SQLite::Exception const& failure) {
         Database::rethrow(failure, kind, file);
@@ -176,8 +177,10 @@ void copyFiles(fs::path const& data, fs::path const& target) {
 void requireNew(DataFolder const& data) {
     for (fs::path const& file : {data.database(), data.packs(), data.token()})
         if (fs::exists(file))
-            throw Base::Error("there is " + file.string() +
-                              " already: name an empty folder, or move away what a service has kept there");
+            throw Base::Error(
+                Base::Code::FileExists,
+                "there is " + file.string() +
+                    " already: name an empty folder, or move away what a service has kept there");
 }
 
 /// Ahead of the record, which names them: what nobody names does no harm.
@@ -209,10 +212,11 @@ RestoredRecord settleIn(fs::path const& folder, long long madeAt, Since since, l
 void backUp(KeptAt const& kept, fs::path const& target, long long now) {
     bool const isShared = !kept.database.empty();
     if (!isShared && !fs::exists(kept.data / SERVICE))
-        throw Base::Error("there is no service database in " + kept.data.string() +
-                          ": name the data folder of the service by --data");
+        throw Base::Error(Base::Code::DatabaseMissing, "there is no service database in " +
+                                                           kept.data.string() +
+                                                           ": name the data folder of the service by --data");
     if (fs::exists(target))
-        throw Base::Error(target.string() + " is there already: name another file");
+        throw Base::Error(Base::Code::FileExists, target.string() + " is there already: name another file");
     NewFolder const copies(hiddenBeside(target));
     isShared ? copyFromPostgres(kept.database, copies.path() / SERVICE, copies.path() / PACKS)
              : copyFiles(kept.data, copies.path());
@@ -232,7 +236,8 @@ RestoredRecord restoreBackup(fs::path const& file, fs::path const& data, fs::pat
     NewFolder const restoring(folder.path() / ".restoring.part");
     long long const madeAt = extractBackup(file, restoring.path());
     if (!fs::exists(restoring.path() / SERVICE))
-        throw Base::Error("the backup " + file.string() + " has no service database: take another one");
+        throw Base::Error(Base::Code::FileUnsuitable,
+                          "the backup " + file.string() + " has no service database: take another one");
     RestoredRecord const record = settleIn(restoring.path(), madeAt, since, now);
     makeWritableFolder(outbox);
     placeContainers(restoring.path() / OUTBOX, outbox);

@@ -19,7 +19,7 @@ bool isCompressed(SharedMemBuffer const& blob) {
 
 /// Names of documents stay out of it: what is at fault goes into the log, and they may be those of people.
 [[noreturn]] void refuse(std::size_t position, char const* why) {
-    throw BadPack("page " + std::to_string(position) + " of the pack " + why);
+    throw BadPack(Base::Code::MailingDamaged, "page " + std::to_string(position) + " of the pack " + why);
 }
 
 void copyPages(Mailing::PackSource& pack, PageSaverI& container) {
@@ -43,7 +43,7 @@ SharedMemBuffer decidedMetadata(SharedMemBuffer const& metadata, std::string con
     try {
         return Mailing::withMembers(metadata, decided);
     } catch (json::Exc const&) {
-        throw BadPack("the metadata of pack " + packId + " is none of a mailing");
+        throw BadPack(Base::Code::MailingDamaged, "the metadata of pack " + packId + " is none of a mailing");
     }
 }
 
@@ -53,7 +53,8 @@ void writeContainer(Mailing::PackSource& pack, std::filesystem::path const& targ
                     json::Object const& decided) {
     SharedMemBuffer const metadata = pack.metadata();
     if (!isCompressed(metadata))
-        throw BadPack("the metadata of pack " + pack.packId() + " is not compressed");
+        throw BadPack(Base::Code::MailingDamaged,
+                      "the metadata of pack " + pack.packId() + " is not compressed");
     Mailing::ContainerWriter container(target, pack.packId());
     copyPages(pack, container);
     container.finish(decidedMetadata(metadata, pack.packId(), decided), "make room on the disk");

@@ -21,8 +21,9 @@ void IncomingPack::add(KeptPage const& page) {
 
 PagePiece IncomingPack::take(Channel::DataPiece const& piece) {
     if (piece.position != static_cast<unsigned long long>(position_))
-        throw Base::Error("page " + std::to_string(piece.position + 1ULL) + " of pack " + head_.info.id +
-                          " comes where page " + std::to_string(position_ + 1) + " is wanted");
+        throw Base::Error(Base::Code::MailingDamaged, "page " + std::to_string(piece.position + 1ULL) +
+                                                          " of pack " + head_.info.id + " comes where page " +
+                                                          std::to_string(position_ + 1) + " is wanted");
     if (!page_)
         begin(piece);
     requireOfPage(piece);
@@ -70,14 +71,18 @@ void IncomingPack::requireOfPage(Channel::DataPiece const& piece) const {
 
 void IncomingPack::requireWhole() {
     if (position_ <= head_.pages)
-        throw Base::Error("pack " + head_.info.id + " is not whole: page " + std::to_string(position_ + 1) +
-                          " of " + std::to_string(head_.pages + 1) + " is missing, counting its metadata");
+        throw Base::Error(Base::Code::MailingDamaged, "pack " + head_.info.id + " is not whole: page " +
+                                                          std::to_string(position_ + 1) + " of " +
+                                                          std::to_string(head_.pages + 1) +
+                                                          " is missing, counting its metadata");
     if (bytes_ != head_.bytes || digest_.text() != head_.sha256)
-        throw Base::Error("pack " + head_.info.id + " is not what it was said to be: its digest is another");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "pack " + head_.info.id + " is not what it was said to be: its digest is another");
 }
 
 void IncomingPack::refuse(std::string const& why) const {
-    throw Base::Error("page " + std::to_string(position_ + 1) + " of pack " + head_.info.id + ' ' + why);
+    throw Base::Error(Base::Code::MailingDamaged,
+                      "page " + std::to_string(position_ + 1) + " of pack " + head_.info.id + ' ' + why);
 }
 
 } // namespace VlServiced

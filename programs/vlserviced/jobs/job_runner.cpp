@@ -35,28 +35,34 @@ std::string folderText(std::string const& folder) {
 
 PackLocation checkedLocation(PackLocation const& pack) {
     if (!Mailing::isPackId(pack.packId))
-        throw Base::Error("the pack id \"" + pack.packId + "\" cannot name a file");
+        throw Base::Error(Base::Code::MailingIdInvalid,
+                          "the pack id \"" + pack.packId + "\" cannot name a file");
     if (pack.isWithService())
         return pack;
     if (!fs::path(pack.folder).is_absolute())
         throw Base::Error(
+            Base::Code::SettingInvalid,
             "pages come over the connection or from a pack database below the folder of --local-packs: "
             "\"db_conn\" has to be the absolute path of a folder there, and \"" +
-            pack.folder + "\" is none");
+                pack.folder + "\" is none");
     if (Base::safeFileName(pack.database) != pack.database)
-        throw Base::Error("\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"db_name\" has to be the name of a file, and \"" + pack.database + "\" is none");
     return {folderText(pack.folder), pack.database, pack.packId};
 }
 
 /// A job that is there already: the pack is taken, or it cannot be.
 void requireSamePack(Job const& known, PackLocation const& pack) {
     if (!(known.pack == pack))
-        throw Base::Error("there is another pack " + pack.packId + ", from " +
-                          (known.pack.isWithService() ? "a connection" : known.pack.file().string()));
+        throw Base::Error(Base::Code::MailingExists,
+                          "there is another pack " + pack.packId + ", from " +
+                              (known.pack.isWithService() ? "a connection" : known.pack.file().string()));
     if (known.state == JobState::Failed)
-        throw Base::Error("pack " + pack.packId + " was given up: " + known.problem);
+        throw Base::Error(Base::Code::StateRefused,
+                          "pack " + pack.packId + " was given up: " + known.problem);
     if (known.state == JobState::Cancelled)
-        throw Base::Error("pack " + pack.packId + " was cancelled: mail its letters anew");
+        throw Base::Error(Base::Code::StateRefused,
+                          "pack " + pack.packId + " was cancelled: mail its letters anew");
 }
 
 /// Whether the outbox is no place for the container any more that goes to the upload folder.
@@ -202,7 +208,7 @@ void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
                        std::function<void(std::string const& failure)> done) {
     auto const finish = [done = std::move(done)](std::function<void()> const& step) {
         Outcome const outcome = outcomeOf(step);
-        done(outcome.why);
+        done(outcome.why.empty() ? outcome.why : Base::codedLine(outcome.why, outcome.code));
     };
     PackLocation location;
     std::optional<Job> known;
@@ -214,7 +220,7 @@ void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
         }
     });
     if (checked.kind != Outcome::Kind::Done)
-        return finish([&] { throw Base::Error(checked.why); });
+        return finish([&] { throw Base::Error(checked.code, checked.why); });
     if (known)
         return finish([&] { proceed(*known); });
     surroundings_.onReader([this, location, mayBeOf, finish, open = surroundings_.openPack,
@@ -228,7 +234,7 @@ void JobRunner::accept(PackLocation const& pack, RequireNode const& mayBeOf,
         onOwnThread([this, location, mayBeOf, finish, summary, read, who] {
             finish([&] {
                 if (read.kind != Outcome::Kind::Done)
-                    throw Base::Error(read.why);
+                    throw Base::Error(read.code, read.why);
                 surroundings_.recorder.as(who, [&] { admit(location, *summary, mayBeOf); });
             });
         });
@@ -259,7 +265,8 @@ void JobRunner::admit(PackLocation const& pack, PackSummary const& summary, Requ
 
 void JobRunner::requireNotDisabled(std::string const& packId, std::string const& cfgId) const {
     if (surroundings_.settings().isDisabled(cfgId))
-        throw Base::Error("node " + cfgId + " is disabled: pack " + packId + " is not taken");
+        throw Base::Error(Base::Code::NodeDisabled,
+                          "node " + cfgId + " is disabled: pack " + packId + " is not taken");
 }
 
 void JobRunner::proceed(Job const& job) {
@@ -471,12 +478,12 @@ bool JobRunner::recordChange(JobAction action, Job const& job) {
 void JobRunner::change(JobAction action, std::string const& packId) {
     std::optional<Job> const job = jobs_.find(packId);
     if (!job)
-        throw Base::Error("there is no mailing " + Base::oneLine(packId));
+        throw Base::Error(Base::Code::MailingUnknown, "there is no mailing " + Base::oneLine(packId));
     if (action == JobAction::Upload)
         requireUploadFolder();
     if (!recordChange(action, *job) && !isSoAlready(*job, action))
-        throw Base::Error("it is too late to " + std::string(actionName(action)) + " mailing " + packId +
-                          ": " + whoHas(*job));
+        throw Base::Error(Base::Code::StateRefused, "it is too late to " + std::string(actionName(action)) +
+                                                        " mailing " + packId + ": " + whoHas(*job));
     Job const changed = jobs_.find(packId).value();
     // What the worker is about to make is seen to when it has.
     if (changed.state == JobState::Cancelled && !busy_.contains(packId))
@@ -548,6 +555,7 @@ void JobRunner::requireUploadFolder() const {
     ServiceSettings const settings = surroundings_.settings();
     if (settings.uploadFolder().empty() && settings.carriers().empty())
         throw Base::Error(
+            Base::Code::SettingMissing,
             "the service has no upload folder: set one with \"vlmail settings service upload_folder=PATH\"");
 }
 
@@ -647,9 +655,9 @@ JobRunner::Outcome JobRunner::outcomeOf(std::function<void()> const& work) {
         work();
         return {};
     } catch (BadPack const& bad) {
-        return {Outcome::Kind::GiveUp, Base::oneLine(bad.what())};
+        return {Outcome::Kind::GiveUp, Base::oneLine(bad.what()), bad.code()};
     } catch (std::exception const& failure) {
-        return {Outcome::Kind::TryLater, Base::oneLine(failure.what())};
+        return {Outcome::Kind::TryLater, Base::oneLine(failure.what()), Base::codeOf(failure)};
     }
 }
 

@@ -2,6 +2,7 @@
 // Brings jobs along their way: from the client's database into the outbox, from there to the upload folder,
 // and on with what the carrier reports.
 
+#include "programs/base/error_code.h"
 #include "programs/base/local_offset.h"
 #include "programs/mailing/pack_source.h"
 #include "programs/policy/limits.h"
@@ -115,6 +116,7 @@ private:
     struct Outcome {
         enum class Kind { Done, TryLater, GiveUp } kind = Kind::Done;
         std::string why;
+        Base::Code code = Base::Code::Unexpected;
     };
 
     void proceed(Job const& job);

@@ -24,7 +24,7 @@ Mailing::MailedLetter letterOf(OutboxMailing const& mailing, StoredLetter const&
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const&) {
-        throw Base::Error("what the mailing says of the letter cannot be read");
+        throw Base::Error(Base::Code::MailingDamaged, "what the mailing says of the letter cannot be read");
     }
 }
 
@@ -87,7 +87,7 @@ public:
             addPages(letter);
             outgoing.pages = static_cast<long long>(pages_.size()) + 1 - outgoing.firstPage;
             if (outgoing.pages == 0)
-                throw Base::Error("the letter has no pages");
+                throw Base::Error(Base::Code::MailingDamaged, "the letter has no pages");
             parcel_.letters.push_back(std::move(outgoing));
         } catch (Base::Error const&) {
             shrink(before);
@@ -130,12 +130,13 @@ private:
     void add(Production::JoinedPages& pages, unsigned long long entry) {
         SharedMemBuffer const pdf = Mailing::expanded(mailing_.blob(entry));
         if ((bytes_ += pdf.size()) > MAX_PARCEL_BYTES)
-            throw Base::Error("there are more than 512 MiB of pages for one file; hand letters over one by "
+            throw Base::Error(Base::Code::TooLarge,
+                              "there are more than 512 MiB of pages for one file; hand letters over one by "
                               "one, with \"unit\" letter");
         try {
             pages.add(Mailing::viewOf(pdf));
         } catch (Base::Error const& wrong) {
-            throw Base::Error("a page " + std::string(wrong.what()));
+            throw Base::Error(Base::Code::MailingDamaged, "a page " + std::string(wrong.what()));
         }
     }
 

@@ -588,17 +588,18 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
     std::string const name = nameOf(id);
     std::optional<StoredLetter> const letter = letters_.find(id);
     if (!letter)
-        throw Base::Error("there is no " + name);
+        throw Base::Error(Base::Code::LetterUnknown, "there is no " + name);
     if (!letter->byCarrier)
-        throw Base::Error(name + " goes in the mailing's container");
+        throw Base::Error(Base::Code::StateRefused, name + " goes in the mailing's container");
     bool const isResent = change.action == Protocol::LetterAction::Resend;
     if (isResent && !id.isNotice() &&
         !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
-        throw Base::Error("the pages of " + name + " are gone: mail it anew");
+        throw Base::Error(Base::Code::MailingDamaged, "the pages of " + name + " are gone: mail it anew");
     if (!recordDecision(change, *letter))
-        throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) + ": " +
-                          (isResent ? "only one that is uncertain, failed or returned is sent again"
-                                    : "only one that is uncertain can be settled"));
+        throw Base::Error(Base::Code::StateRefused,
+                          name + " is " + Protocol::letterStateName(letter->state) + ": " +
+                              (isResent ? "only one that is uncertain, failed or returned is sent again"
+                                        : "only one that is uncertain can be settled"));
     if (!id.isNotice())
         unsettled_.insert(id.packId);
     proceed();
@@ -646,9 +647,9 @@ StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind k
     std::string const name = nameOf(id);
     std::optional<StoredLetter> const letter = letters_.find(id);
     if (!letter)
-        throw Base::Error("there is no " + name);
+        throw Base::Error(Base::Code::LetterUnknown, "there is no " + name);
     if (settingsOf(letter->channel).type != Protocol::CarrierType::Smtp)
-        throw Base::Error(name + " does not go by e-mail");
+        throw Base::Error(Base::Code::StateRefused, name + " does not go by e-mail");
     std::vector<LetterState> from{LetterState::Accepted, LetterState::Uncertain};
     if (kind != Kind::UnderWay)
         from.push_back(LetterState::Delivered);
@@ -661,8 +662,8 @@ StoredLetter LetterRunner::note(LetterId const& id, Carriers::MailReport::Kind k
             noteInHistory(*letter, stateBehind(kind));
     });
     if (!isNoted)
-        throw Base::Error(name + " is " + Protocol::letterStateName(letter->state) +
-                          ", which the report does not go with");
+        throw Base::Error(Base::Code::StateRefused, name + " is " + Protocol::letterStateName(letter->state) +
+                                                        ", which the report does not go with");
     surroundings_.became(letter->channel, stateBehind(kind), id.isNotice() ? 0 : 1);
     if (!id.isNotice())
         unsettled_.insert(id.packId);
@@ -732,8 +733,9 @@ Protocol::CarrierSettings LetterRunner::settingsOf(std::string const& channel) c
     Protocol::Carriers const carriers = surroundings_.settings().carriers();
     auto const found = carriers.find(channel);
     if (found == carriers.end())
-        throw Base::Error("there is no carrier of " + Base::oneLine(channel) +
-                          ": \"vlmail carriers list\" shows those that there are");
+        throw Base::Error(Base::Code::CarrierUnknown,
+                          "there is no carrier of " + Base::oneLine(channel) +
+                              ": \"vlmail carriers list\" shows those that there are");
     return found->second;
 }
 

@@ -7,7 +7,8 @@ namespace VlServiced {
 OutboxMailing::OutboxMailing(std::filesystem::path const& container)
     : container_(container.string(), PackWrapper::PURPOSE_IMPORT, {}) {
     if (container_.failed())
-        throw Base::Error("the container " + container.string() + " cannot be read");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "the container " + container.string() + " cannot be read");
     for (unsigned long long i = 0; i < container_.szBins(); ++i)
         entries_.try_emplace({container_.bin(i).document, container_.bin(i).name}, i);
     try {
@@ -15,14 +16,15 @@ OutboxMailing::OutboxMailing(std::filesystem::path const& container)
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const&) {
-        throw Base::Error("the metadata of the container " + container.string() + " is none of a mailing");
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "the metadata of the container " + container.string() + " is none of a mailing");
     }
 }
 
 unsigned long long OutboxMailing::entryOf(std::string const& document, int page) const {
     auto const found = entries_.find({document, std::to_string(page)});
     if (found == entries_.end())
-        throw Base::Error("a page is not in the container");
+        throw Base::Error(Base::Code::MailingDamaged, "a page is not in the container");
     return found->second;
 }
 
@@ -37,7 +39,7 @@ std::set<unsigned long long> OutboxMailing::entriesOf(Mailing::MailedLetter cons
 SharedMemBuffer OutboxMailing::blob(unsigned long long at) {
     SharedMemBuffer data = container_.binData(at);
     if (data.empty())
-        throw Base::Error("a page is damaged in the container");
+        throw Base::Error(Base::Code::MailingDamaged, "a page is damaged in the container");
     return data;
 }
 

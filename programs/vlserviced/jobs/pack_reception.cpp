@@ -27,15 +27,17 @@ bool isDigest(std::string const& text) {
 
 void checkBeginning(BeginPack const& pack) {
     if (!Mailing::isPackId(pack.id))
-        throw Base::Error("the pack id \"" + pack.id + "\" cannot name a file");
+        throw Base::Error(Base::Code::MailingIdInvalid, "the pack id \"" + pack.id + "\" cannot name a file");
     if (!Base::isPlainText(pack.title, MAX_TITLE_BYTES))
-        throw Base::Error("the title of pack " + pack.id + " is not a line of text of at most " +
-                          std::to_string(MAX_TITLE_BYTES) + " bytes");
+        throw Base::Error(Base::Code::MailingInvalid, "the title of pack " + pack.id +
+                                                          " is not a line of text of at most " +
+                                                          std::to_string(MAX_TITLE_BYTES) + " bytes");
     checkNodeId(pack.cfgId);
     if (pack.pages < 1 || pack.bytes < 1)
-        throw Base::Error("pack " + pack.id + " has no pages");
+        throw Base::Error(Base::Code::MailingInvalid, "pack " + pack.id + " has no pages");
     if (!isDigest(pack.sha256))
-        throw Base::Error("the digest of pack " + pack.id + " is none of 64 hexadecimal digits");
+        throw Base::Error(Base::Code::MailingInvalid,
+                          "the digest of pack " + pack.id + " is none of 64 hexadecimal digits");
 }
 
 PackHead headOf(BeginPack const& pack) {
@@ -50,8 +52,8 @@ bool isSame(PackHead const& kept, PackHead const& said) {
 }
 
 [[noreturn]] void refuseOther(std::string const& packId) {
-    throw Base::Error("there is another pack " + packId +
-                      " with other pages: give this one an id of its own");
+    throw Base::Error(Base::Code::MailingExists, "there is another pack " + packId +
+                                                     " with other pages: give this one an id of its own");
 }
 
 std::string notItsOwn(std::string const& packId) {
@@ -70,7 +72,7 @@ std::string failureOf(Operation operation) {
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const& failure) {
-        return Base::oneLine(failure.what());
+        return Base::codedLine(Base::oneLine(failure.what()), Base::codeOf(failure));
     }
 }
 
@@ -134,7 +136,8 @@ public:
     void complete(std::string const& packId) {
         std::optional<KeptPack> const kept = store_->find(packId);
         if (!kept || kept->state == KeptPack::State::Erased)
-            throw Base::Error("the service has no pack " + packId + ": send it again");
+            throw Base::Error(Base::Code::MailingUnknown,
+                              "the service has no pack " + packId + ": send it again");
         if (kept->state == KeptPack::State::Complete)
             return;
         try {
@@ -168,10 +171,11 @@ private:
     void add(PackHead const& head, std::optional<long long> quota) {
         long long const used = quota ? store_->bytesOf(head.info.cfgId) : 0;
         if (quota && used + head.bytes > *quota)
-            throw Base::Error("node " + head.info.cfgId + " may have " + inMebibytes(*quota) +
-                              " of packs with the service at once, and has " + inMebibytes(used) + ": pack " +
-                              head.info.id + " of " + inMebibytes(head.bytes) +
-                              " is not taken before some of them were handed over");
+            throw Base::Error(Base::Code::QuotaExceeded,
+                              "node " + head.info.cfgId + " may have " + inMebibytes(*quota) +
+                                  " of packs with the service at once, and has " + inMebibytes(used) +
+                                  ": pack " + head.info.id + " of " + inMebibytes(head.bytes) +
+                                  " is not taken before some of them were handed over");
         store_->add(head, now_());
     }
 
@@ -189,7 +193,8 @@ private:
         if (!pack) {
             std::optional<KeptPack> const kept = store_->find(packId);
             if (!kept || kept->state != KeptPack::State::Open)
-                throw Base::Error("pack " + packId + " is none that pages are wanted of");
+                throw Base::Error(Base::Code::StateRefused,
+                                  "pack " + packId + " is none that pages are wanted of");
             pack = std::make_unique<IncomingPack>(kept->head, store_->pagesOf(packId));
         }
         return *pack;
@@ -228,7 +233,8 @@ void PackReception::begin(BeginPack const& pack, Sender const& sender,
             refuseOther(pack.id);
         isKnown = job.has_value();
         if (!isKnown && surroundings_.isDisabled(pack.cfgId))
-            throw Base::Error("node " + pack.cfgId + " is disabled: pack " + pack.id + " is not taken");
+            throw Base::Error(Base::Code::NodeDisabled,
+                              "node " + pack.cfgId + " is disabled: pack " + pack.id + " is not taken");
     });
     if (!refused.empty())
         return done({}, refused);

@@ -50,7 +50,7 @@ constexpr char const* WANTED = "--metrics takes a loopback address with a port, 
                                "unix:PATH, and got ";
 
 [[noreturn]] void refuse(std::string const& place) {
-    throw Base::Error(WANTED + Base::inQuotes(Base::oneLine(place)));
+    throw Base::Error(Base::Code::Usage, WANTED + Base::inQuotes(Base::oneLine(place)));
 }
 
 tcp::endpoint endpointIn(std::string const& place) {
@@ -71,7 +71,8 @@ tcp::endpoint endpointIn(std::string const& place) {
 }
 
 [[noreturn]] void failToListen(std::string const& place, std::string const& why) {
-    throw Base::Error("Cannot listen for metrics on " + Base::oneLine(place) + ": " + why + '.');
+    throw Base::Error(Base::Code::AddressUnusable,
+                      "Cannot listen for metrics on " + Base::oneLine(place) + ": " + why + '.');
 }
 
 bool isSocket(std::string const& path) {

@@ -21,8 +21,9 @@ using Protocol::StoredDocument;
 std::string shownNode(std::string const& id) { return id.empty() ? "the root" : "node " + id; }
 
 [[noreturn]] void refuse(DocumentUpload const& piece, std::string const& why) {
-    throw Base::Error("the document " + Base::inQuotes(Base::plainLine(piece.name)) +
-                      " was not stored: " + why);
+    throw Base::Error(Base::Code::DocumentUnreadable, "the document " +
+                                                          Base::inQuotes(Base::plainLine(piece.name)) +
+                                                          " was not stored: " + why);
 }
 
 std::string bytesIn(DocumentUpload const& piece) {
@@ -34,8 +35,8 @@ std::string bytesIn(DocumentUpload const& piece) {
 }
 
 [[noreturn]] void refuseMissing(std::string const& sha256) {
-    throw Base::Error("the service has no document of the digest " + sha256 +
-                      " any more: it was replaced or removed");
+    throw Base::Error(Base::Code::DocumentUnknown, "the service has no document of the digest " + sha256 +
+                                                       " any more: it was replaced or removed");
 }
 
 /// Empty where there is none of that name.
@@ -169,8 +170,9 @@ void DocumentService::requirePlace(DocumentUpload const& piece) const {
 void DocumentService::requireNode(std::string const& id) const {
     checkNodeId(id);
     if (!nodes_.contains(id))
-        throw Base::Error("there is no node " + id +
-                          "; correct the id, or set something at it first (\"vlmail settings set\")");
+        throw Base::Error(Base::Code::NodeUnknown,
+                          "there is no node " + id +
+                              "; correct the id, or set something at it first (\"vlmail settings set\")");
 }
 
 StoredDocument DocumentService::remove(Protocol::DocumentRemoval const& removal) {
@@ -180,9 +182,10 @@ StoredDocument DocumentService::remove(Protocol::DocumentRemoval const& removal)
     there.documents = documents_.at(removal.id);
     StoredDocument const* const document = there.find(removal.document);
     if (!document)
-        throw Base::Error(shownNode(removal.id) + " has no document " +
-                          Base::inQuotes(Base::plainLine(removal.document)) +
-                          " of its own; \"vlmail documents list\" shows which lies where");
+        throw Base::Error(Base::Code::DocumentUnknown,
+                          shownNode(removal.id) + " has no document " +
+                              Base::inQuotes(Base::plainLine(removal.document)) +
+                              " of its own; \"vlmail documents list\" shows which lies where");
     recorder_.together([&] {
         documents_.remove(removal.id, document->name);
         recorder_.note(removal.id, "document " + document->name, document->sha256, "");

@@ -21,7 +21,7 @@ Protocol::Estimate estimate(Protocol::PriceRequest const& request, Protocol::Tar
     for (Protocol::LetterBatch const& batch : request.letters) {
         long long const price = priceOf(batch, tariff);
         if (__builtin_add_overflow(estimate.total, price, &estimate.total))
-            throw Base::Error("the price is beyond all bounds");
+            throw Base::Error(Base::Code::TooLarge, "the price is beyond all bounds");
         estimate.letters.emplace_back(batch.sheets(), price);
     }
     return estimate;

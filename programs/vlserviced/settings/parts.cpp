@@ -24,8 +24,9 @@ Part readLevel(SettingsLevel const& level, bool global) {
     try {
         return Part(level.parts.get(Part::PART_NAME), global, true);
     } catch (std::exception const& failure) {
-        throw Base::Error("the settings \"" + std::string(Part::PART_NAME) + "\" of " + shownNode(level.id) +
-                          " cannot be read: " + failure.what());
+        throw Base::Error(Base::Code::SettingsMalformed, "the settings \"" + std::string(Part::PART_NAME) +
+                                                             "\" of " + shownNode(level.id) +
+                                                             " cannot be read: " + failure.what());
     }
 }
 
@@ -74,8 +75,8 @@ void requireUsable(Cfg::Presets const& presets) {
         try {
             element.value.match("");
         } catch (std::exception const& failure) {
-            throw Base::Error("the expression " + element.value.strRegex() +
-                              " cannot be used: " + failure.what());
+            throw Base::Error(Base::Code::PatternInvalid, "the expression " + element.value.strRegex() +
+                                                              " cannot be used: " + failure.what());
         }
     }
 }
@@ -114,13 +115,15 @@ PartKind const& kindNamed(std::string const& name) {
     std::string known;
     for (std::string const& part : partNames())
         known += (known.empty() ? "" : ", ") + part;
-    throw Base::Error("there are no settings \"" + name + "\"; there are " + known);
+    throw Base::Error(Base::Code::SettingUnknown,
+                      "there are no settings \"" + name + "\"; there are " + known);
 }
 
 void checkKeys(PartKind const& kind, json::Object const& sent) {
     for (auto const& [key, value] : sent)
         if (!kind.keys.find(key))
-            throw Base::Error("the settings \"" + kind.name + "\" have no key \"" + key + "\"");
+            throw Base::Error(Base::Code::SettingUnknown,
+                              "the settings \"" + kind.name + "\" have no key \"" + key + "\"");
 }
 
 json::Value unwrapped(json::Value const& value) { return Cfg::isWrapper(value) ? Cfg::unwrap(value) : value; }
@@ -192,7 +195,8 @@ json::Value ownForm(std::string const& part, json::Value const& sent) {
     } catch (Base::Error const&) {
         throw;
     } catch (std::exception const& failure) {
-        throw Base::Error("the settings \"" + part + "\" were not changed: " + failure.what());
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "the settings \"" + part + "\" were not changed: " + failure.what());
     }
 }
 

@@ -29,8 +29,9 @@ Locks locksAbove(std::vector<SettingsLevel> const& chain) {
 }
 
 [[noreturn]] void refuse(std::string const& packPreset, std::string const& why) {
-    throw Base::Error("the settings \"presets\" were not changed: the pack preset " +
-                      Base::inQuotes(packPreset) + ' ' + why);
+    throw Base::Error(Base::Code::SettingInvalid,
+                      "the settings \"presets\" were not changed: the pack preset " +
+                          Base::inQuotes(packPreset) + ' ' + why);
 }
 
 void requireUnlocked(Cfg::PackPreset const& preset, Locks const& locks) {

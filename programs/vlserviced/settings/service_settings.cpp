@@ -21,30 +21,33 @@ void checkUploadFolder(json::Value const& value) {
     std::filesystem::path const folder = value.textOrEmpty();
     std::error_code error;
     if (!folder.is_absolute() || !std::filesystem::is_directory(folder, error))
-        throw Base::Error('"' + std::string(Values::UPLOAD_FOLDER) +
-                          "\" has to be the absolute path of a folder that is there");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          '"' + std::string(Values::UPLOAD_FOLDER) +
+                              "\" has to be the absolute path of a folder that is there");
 }
 
 void checkTariff(json::Value const& value) {
     if (!value.isObject())
-        throw Base::Error("\"tariff\" has to be an object");
+        throw Base::Error(Base::Code::SettingInvalid, "\"tariff\" has to be an object");
     Protocol::Tariff const readable(value.toObject());
 }
 
 void checkDisabled(json::Value const& value) {
     if (!value.isArray())
-        throw Base::Error("\"disabled\" has to be an array of node ids");
+        throw Base::Error(Base::Code::SettingInvalid, "\"disabled\" has to be an array of node ids");
     for (json::Value const& id : value.toArray()) {
         // Anything but a text would read as the root.
         if (!id.isString() || id.textOrEmpty().empty())
-            throw Base::Error("\"disabled\" has to be an array of node ids, and the root cannot be disabled");
+            throw Base::Error(Base::Code::SettingInvalid,
+                              "\"disabled\" has to be an array of node ids, and the root cannot be disabled");
         checkNodeId(id.toString());
     }
 }
 
 void checkCarriers(json::Value const& value) {
     if (!value.isObject())
-        throw Base::Error("\"carriers\" has to be an object with the names of channels");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"carriers\" has to be an object with the names of channels");
     Protocol::carriersIn(value.toObject());
 }
 
@@ -54,20 +57,21 @@ bool isWithin(json::Value const& value, long long highest) {
 
 void checkQuota(json::Value const& value) {
     if (!value.isObject())
-        throw Base::Error("\"quota\" has to be an object of node ids and numbers of MiB");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "\"quota\" has to be an object of node ids and numbers of MiB");
     for (auto const& [node, mebibytes] : value.toObject()) {
         checkNodeId(node);
         if (!isWithin(mebibytes, Values::MAX_QUOTA_MEBIBYTES))
-            throw Base::Error("the \"quota\" of node \"" + std::string(node) +
-                              "\" has to be an integer from 0 to " +
-                              std::to_string(Values::MAX_QUOTA_MEBIBYTES));
+            throw Base::Error(Base::Code::SettingInvalid, "the \"quota\" of node \"" + std::string(node) +
+                                                              "\" has to be an integer from 0 to " +
+                                                              std::to_string(Values::MAX_QUOTA_MEBIBYTES));
     }
 }
 
 void checkRetention(json::Value const& value) {
     if (!isWithin(value, Values::MAX_RETENTION_DAYS))
-        throw Base::Error("\"retention_days\" has to be an integer from 0 to " +
-                          std::to_string(Values::MAX_RETENTION_DAYS));
+        throw Base::Error(Base::Code::SettingInvalid, "\"retention_days\" has to be an integer from 0 to " +
+                                                          std::to_string(Values::MAX_RETENTION_DAYS));
 }
 
 void checkValue(std::string const& key, json::Value const& value) {
@@ -99,7 +103,8 @@ std::string settableKeys() {
 
 void checkChange(std::string const& key, json::Value const& value) {
     if (!isSettable(key))
-        throw Base::Error("the service has no setting \"" + key + "\"; there are " + settableKeys());
+        throw Base::Error(Base::Code::SettingUnknown,
+                          "the service has no setting \"" + key + "\"; there are " + settableKeys());
     if (!json_is_null(value.node()))
         checkValue(key, value);
 }
@@ -156,6 +161,7 @@ ServiceSettings::withCarrierFolders(std::map<std::string, std::string> const& id
 Protocol::Tariff ServiceSettings::tariff() const {
     if (values_.tariff.empty())
         throw Base::Error(
+            Base::Code::SettingMissing,
             "the service has no tariff yet: set one with \"vlmail settings service tariff=FILE\"");
     return Protocol::Tariff(values_.tariff);
 }
@@ -195,8 +201,9 @@ ServiceSettings ServiceSettings::withChanges(json::Object const& changes) const 
 
 ServiceSettings ServiceSettings::withSuspended(int bits) const {
     if ((bits & ~static_cast<int>(Suspended::All)) != 0)
-        throw Base::Error("the service cannot be suspended by the number " + std::to_string(bits) +
-                          ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
+        throw Base::Error(Base::Code::SettingInvalid,
+                          "the service cannot be suspended by the number " + std::to_string(bits) +
+                              ": 1 holds back changes of settings, 2 holds back jobs, 3 both, 0 nothing");
     json::Object changed = stored_;
     changed.set(Values::SUSPENDED, bits);
     return ServiceSettings(std::move(changed));

@@ -162,7 +162,8 @@ void SettingsService::update(std::string const& id, bool reset) {
     checkNodeId(id);
     // An id that is missing from a request reads as the root.
     if (reset && id.empty())
-        throw Base::Error("the root cannot be reset as a whole: set its parts to nothing one by one");
+        throw Base::Error(Base::Code::RequestInvalid,
+                          "the root cannot be reset as a whole: set its parts to nothing one by one");
     rules_.clear();
     recorder_.together([&] {
         bool const wasKnown = store_.contains(id);
@@ -367,7 +368,7 @@ bool SettingsService::holdsChangesBack() const { return service().isSuspended(Su
 
 void SettingsService::requireChangeable() const {
     if (holdsChangesBack())
-        throw Base::Error("changes of settings are held back at the moment");
+        throw Base::Error(Base::Code::ServiceSuspended, "changes of settings are held back at the moment");
 }
 
 } // namespace VlServiced

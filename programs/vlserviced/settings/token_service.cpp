@@ -25,9 +25,10 @@ void requireName(std::string const& name) {
                         Base::isPlainText(name, MAX_NAME_BYTES) && Base::plainLine(name) == name &&
                         name.find_first_of(" \t") == std::string::npos;
     if (!isGood)
-        throw Base::Error("\"" + Base::oneLine(name) +
-                          "\" cannot be the name of a token: give it one word of at most " +
-                          std::to_string(MAX_NAME_BYTES) + " bytes, other than " + TokenService::ADMIN);
+        throw Base::Error(Base::Code::NameInvalid,
+                          "\"" + Base::oneLine(name) +
+                              "\" cannot be the name of a token: give it one word of at most " +
+                              std::to_string(MAX_NAME_BYTES) + " bytes, other than " + TokenService::ADMIN);
 }
 
 TokenReport reportOf(StoredToken const& token) {
@@ -73,7 +74,7 @@ Protocol::TokenAdditionAnswer TokenService::add(Protocol::TokenAddition const& a
     checkNodeId(addition.id);
     if (std::string const refusal = Policy::refusalOfGranting(holder, addition.role, addition.id);
         !refusal.empty())
-        throw Base::Error(refusal);
+        throw Base::Error(Base::Code::NotAllowed, refusal);
     Protocol::TokenAdditionAnswer answer;
     answer.token = Channel::makeNamedToken();
     Grant const grant{addition.name, addition.role, addition.id};
@@ -81,8 +82,9 @@ Protocol::TokenAdditionAnswer TokenService::add(Protocol::TokenAddition const& a
         Channel::tokenIdOf(answer.token), grant, Channel::keysOf(answer.token), now_(), holder.name, 0};
     recorder_.together([&] {
         if (!tokens_.add(token))
-            throw Base::Error("there is a token " + addition.name +
-                              " already: choose another name, or revoke that one first");
+            throw Base::Error(Base::Code::NameTaken,
+                              "there is a token " + addition.name +
+                                  " already: choose another name, or revoke that one first");
         recorder_.note(addition.id, "token " + addition.name, "", roleName(addition.role));
     });
     return answer;
@@ -104,11 +106,12 @@ Protocol::TokensAnswer TokenService::list(Grant const& holder) const {
 TokenReport TokenService::revoke(Protocol::TokenRevocation const& revocation, Grant const& holder) {
     std::optional<StoredToken> const token = tokens_.named(revocation.name);
     if (!token && revocation.name == ADMIN && holder.covers({}))
-        throw Base::Error("the token admin is the one in the service's own file: put another one there, and "
+        throw Base::Error(Base::Code::TokenNeeded,
+                          "the token admin is the one in the service's own file: put another one there, and "
                           "start the service again");
     if (!token || !holder.covers(token->grant.node))
-        throw Base::Error("there is no token " + Base::oneLine(revocation.name) +
-                          ": \"vlmail token list\" shows those that there are");
+        throw Base::Error(Base::Code::TokenUnknown, "there is no token " + Base::oneLine(revocation.name) +
+                                                        ": \"vlmail token list\" shows those that there are");
     requireAnotherAdmin(*token);
     recorder_.together([&] {
         tokens_.revoke(revocation.name, now_());
@@ -125,8 +128,9 @@ void TokenService::requireAnotherAdmin(StoredToken const& revoked) const {
     };
     bool const isAdmin = revoked.grant.role == Role::Admin && revoked.grant.node.empty();
     if (isAdmin && !isOwnUnlisted() && std::none_of(all.begin(), all.end(), isOther))
-        throw Base::Error("the token " + revoked.grant.name +
-                          " is the last one with the role admin at the root: give out another one first");
+        throw Base::Error(Base::Code::TokenNeeded,
+                          "the token " + revoked.grant.name +
+                              " is the last one with the role admin at the root: give out another one first");
 }
 
 } // namespace VlServiced

@@ -89,11 +89,12 @@ std::string headerOf(std::vector<OpenMember> const& members, long long madeAt) {
 }
 
 [[noreturn]] void failForeign(fs::path const& file) {
-    throw Base::Error(file.string() + " is no backup of vlserviced");
+    throw Base::Error(Base::Code::FileUnsuitable, file.string() + " is no backup of vlserviced");
 }
 
 [[noreturn]] void failDamaged(fs::path const& file) {
-    throw Base::Error("the backup " + file.string() + " is damaged or cut off: take another one");
+    throw Base::Error(Base::Code::FileUnsuitable,
+                      "the backup " + file.string() + " is damaged or cut off: take another one");
 }
 
 struct Member {
@@ -137,8 +138,9 @@ private:
         if (!begin.starts_with(MAGIC))
             failForeign(file_.file());
         if (begin.substr(MAGIC.size()) != FORM)
-            throw Base::Error("the backup " + file_.file().string() +
-                              " was made by a newer version of this program: use that version");
+            throw Base::Error(Base::Code::VersionMismatch,
+                              "the backup " + file_.file().string() +
+                                  " was made by a newer version of this program: use that version");
         sum_.add(begin);
         left_ -= begin.size();
     }
@@ -201,7 +203,7 @@ void extract(BackupReader& backup, Member const& member, fs::path const& target)
 
 void writeBackup(fs::path const& target, std::vector<BackupMember> const& members, long long madeAt) {
     if (fs::exists(target))
-        throw Base::Error(target.string() + " is there already: name another file");
+        throw Base::Error(Base::Code::FileExists, target.string() + " is there already: name another file");
     Base::PendingFile pending(target);
     fs::permissions(pending.temporary(), fs::perms::owner_read | fs::perms::owner_write);
     SummedFile out(pending.temporary());
@@ -213,7 +215,8 @@ void writeBackup(fs::path const& target, std::vector<BackupMember> const& member
             std::size_t const size =
                 member.file.read(bytes.data(), std::min<std::uint64_t>(left, SOME_BYTES));
             if (size == 0)
-                throw Base::Error(member.file.file().string() + " became shorter while it was read");
+                throw Base::Error(Base::Code::FileUnreadable,
+                                  member.file.file().string() + " became shorter while it was read");
             out.write(std::string_view(bytes).substr(0, size));
             left -= size;
         }

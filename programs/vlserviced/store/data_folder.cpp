@@ -27,26 +27,32 @@ Base::FileLock takeHold(fs::path const& folder) {
         if (auto lock = Base::FileLock::tryTake(file))
             return std::move(*lock);
     } catch (std::system_error const& failure) {
-        throw Base::Error("cannot write into the data folder " + folder.string() + ": " +
-                          failure.code().message());
+        throw Base::Error(Base::Code::DataFolderUnusable, "cannot write into the data folder " +
+                                                              folder.string() + ": " +
+                                                              failure.code().message());
     }
     std::string const holder = Base::FileLock::holderOf(file);
-    throw Base::Error("the data folder " + folder.string() + " is in use by another vlserviced" +
-                      (holder.empty() ? "" : " (process " + holder + ")") +
-                      ": stop that one or name another folder");
+    throw Base::Error(Base::Code::DataFolderBusy, "the data folder " + folder.string() +
+                                                      " is in use by another vlserviced" +
+                                                      (holder.empty() ? "" : " (process " + holder + ")") +
+                                                      ": stop that one or name another folder");
 }
 
 /// Who may write here could put another token, database or container in place.
 void requireOwn(fs::path const& folder) {
     struct stat status {};
     if (::stat(folder.c_str(), &status) != 0)
-        throw Base::Error("cannot read the data folder " + folder.string() + ": " + std::strerror(errno));
+        throw Base::Error(Base::Code::DataFolderUnusable,
+                          "cannot read the data folder " + folder.string() + ": " + std::strerror(errno));
     if (status.st_uid != ::geteuid())
-        throw Base::Error("the data folder " + folder.string() +
-                          " belongs to another user: start vlserviced as that user or name another folder");
+        throw Base::Error(
+            Base::Code::DataFolderUnusable,
+            "the data folder " + folder.string() +
+                " belongs to another user: start vlserviced as that user or name another folder");
     if ((status.st_mode & (S_IWGRP | S_IWOTH)) != 0)
-        throw Base::Error("others may write into the data folder " + folder.string() +
-                          ": take their right away (chmod go-w)");
+        throw Base::Error(Base::Code::DataFolderUnusable, "others may write into the data folder " +
+                                                              folder.string() +
+                                                              ": take their right away (chmod go-w)");
 }
 
 } // namespace
@@ -57,8 +63,8 @@ void makeWritableFolder(fs::path const& folder) {
             fs::permissions(folder, fs::perms::owner_all);
         Base::PendingFile const probe(folder / "probe");
     } catch (std::system_error const& failure) {
-        throw Base::Error("cannot write into the folder " + folder.string() + ": " +
-                          failure.code().message());
+        throw Base::Error(Base::Code::DataFolderUnusable, "cannot write into the folder " + folder.string() +
+                                                              ": " + failure.code().message());
     }
 }
 

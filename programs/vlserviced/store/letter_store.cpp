@@ -246,7 +246,8 @@ void LetterStore::beginHandingOver(std::vector<LetterId> const& letters, long lo
         if (database_.change("UPDATE letters SET state = 'handed over', says = '', changed_at = $1 "
                              "WHERE pack = $2 AND number = $3 AND state = 'waiting'",
                              now, letter.packId, letter.number) == 0)
-            throw Base::Error("another service may have handed over letter " + letter.key());
+            throw Base::Error(Base::Code::LeaseLost,
+                              "another service may have handed over letter " + letter.key());
     transaction.commit();
 }
 

@@ -34,7 +34,8 @@ void requireEmpty(Database::Connection& target, std::vector<Table> const& tables
     for (Table const& table : tables) {
         long long const rows = target.number("SELECT count(*) FROM " + table.name);
         if (rows > (table.name == "nodes" ? 1 : 0))
-            throw Base::Error(inWords + " holds something already: name an empty database");
+            throw Base::Error(Base::Code::DatabaseUnusable,
+                              inWords + " holds something already: name an empty database");
     }
 }
 
@@ -43,8 +44,9 @@ void copyAll(Database::Connection& from, Database::Connection& to, std::vector<T
     for (Table const& table : tables) {
         TableSum const sum = Database::copyTable(from, to, table);
         if (!(Database::sumOf(to, table) == sum))
-            throw Base::Error("the table " + table.name +
-                              " is not the same in the new database: nothing was moved");
+            throw Base::Error(Base::Code::DatabaseFailed,
+                              "the table " + table.name +
+                                  " is not the same in the new database: nothing was moved");
         Database::goOnNumbering(to, table);
         record.rows += sum.rows;
         ++record.tables;
@@ -86,6 +88,7 @@ void commit(Database::Transaction& transaction, Renamed& renamed, std::string co
             throw;
         renamed.stay();
         throw Base::Error(
+            Base::Code::DatabaseUnavailable,
             inWords + " was lost at the end: where it has tables by now all was moved; else give the files "
                       "service.db.moved and packs.db.moved their former names and try again");
     }
@@ -112,8 +115,9 @@ MovedRecord copyFolder(DataFolder const& data, Database::Connection& target, std
 MovedRecord moveToPostgres(DataFolder const& data, std::string const& address) {
     requireNotMoved(data);
     if (!fs::exists(data.database()))
-        throw Base::Error("there is no service database in " + data.path().string() +
-                          ": name the data folder of the service by --data");
+        throw Base::Error(Base::Code::DatabaseMissing, "there is no service database in " +
+                                                           data.path().string() +
+                                                           ": name the data folder of the service by --data");
     Database::requirePostgresAddress(address);
     std::string const inWords = "the database " + Database::shownPostgresAddress(address);
     Database::PostgresConnection target(address);
@@ -129,9 +133,10 @@ MovedRecord moveToPostgres(DataFolder const& data, std::string const& address) {
 void requireNotMoved(DataFolder const& data) {
     fs::path const moved = movedNameOf(data.database());
     if (fs::exists(moved) && !fs::exists(data.database()))
-        throw Base::Error("the database of " + data.path().string() +
-                          " was moved to PostgreSQL: name that one by --database (" + moved.string() +
-                          " is what was moved)");
+        throw Base::Error(Base::Code::DatabaseUnusable,
+                          "the database of " + data.path().string() +
+                              " was moved to PostgreSQL: name that one by --database (" + moved.string() +
+                              " is what was moved)");
 }
 
 void copyFromPostgres(std::string const& address, fs::path const& database, fs::path const& packs) {

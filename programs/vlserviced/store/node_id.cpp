@@ -21,7 +21,7 @@ std::string shown(std::string const& id) {
 }
 
 [[noreturn]] void refuse(std::string const& id, std::string const& why) {
-    throw Base::Error("node id " + shown(id) + " is not valid: " + why);
+    throw Base::Error(Base::Code::NodeInvalid, "node id " + shown(id) + " is not valid: " + why);
 }
 
 /// The kind of a token whose name is not empty.

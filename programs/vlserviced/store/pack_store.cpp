@@ -69,8 +69,9 @@ constexpr std::pair<State, char const*> STATES[] = {
 State stateNamed(std::string const& name) {
     auto const found = std::ranges::find_if(STATES, [&](auto const& row) { return row.second == name; });
     if (found == std::end(STATES))
-        throw Base::Error("the pack store has a pack in the state \"" + name +
-                          "\", which this program does not know: use the version that wrote it");
+        throw Base::Error(Base::Code::VersionMismatch,
+                          "the pack store has a pack in the state \"" + name +
+                              "\", which this program does not know: use the version that wrote it");
     return found->first;
 }
 
@@ -98,7 +99,7 @@ decltype(auto) orError(Operation operation) {
     try {
         return operation();
     } catch (Database::QueryError const& failure) {
-        throw Base::Error(inWords(failure));
+        throw Base::Error(failure.code(), inWords(failure));
     }
 }
 
@@ -124,7 +125,8 @@ std::optional<KeptPack> packOf(Database::Connection& database, std::string const
 long long numberOf(Database::Connection& database, std::string const& packId) {
     Database::Rows rows = database.query("SELECT number FROM packs WHERE id = $1", packId);
     if (!rows.next())
-        throw Base::Error("the service has no pack " + packId + ": send it again");
+        throw Base::Error(Base::Code::MailingUnknown,
+                          "the service has no pack " + packId + ": send it again");
     return rows.number(0);
 }
 
@@ -135,7 +137,8 @@ public:
         : PackSource(packId), database_(std::move(database)) {
         std::optional<KeptPack> const pack = packOf(*database_, packId);
         if (!pack || pack->state != State::Complete)
-            throw Base::Error("the service has no finished pack " + packId + ": send it again");
+            throw Base::Error(Base::Code::MailingUnknown,
+                              "the service has no finished pack " + packId + ": send it again");
         info_ = pack->head.info;
         number_ = numberOf(*database_, packId);
         readNames(pack->head.pages);
@@ -182,8 +185,9 @@ private:
             after = rows.number(1);
         }
         if (filled != size || Base::sha256(Mailing::viewOf(data)) != sha256)
-            throw Base::Error("page " + std::to_string(position + 1) + " of pack " + packId() +
-                              " is damaged in the pack store of the service");
+            throw Base::Error(Base::Code::MailingDamaged, "page " + std::to_string(position + 1) +
+                                                              " of pack " + packId() +
+                                                              " is damaged in the pack store of the service");
         return data;
     }
 
@@ -294,7 +298,8 @@ public:
             if (database_->change("UPDATE packs SET state = 'complete', touched_at = $1 WHERE id = $2 AND "
                                   "state = 'open'",
                                   now, packId) == 0)
-                throw Base::Error("the service has no open pack " + packId + ": send it again");
+                throw Base::Error(Base::Code::MailingUnknown,
+                                  "the service has no open pack " + packId + ": send it again");
         });
     }
 

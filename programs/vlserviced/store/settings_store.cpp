@@ -76,8 +76,10 @@ std::vector<SettingsLevel> SettingsStore::chain(std::string const& id) const {
             continue;
         // Before anything is parsed: a tree of JSON takes many times what its text does.
         if ((bytes += bytesOf(level.str())) > MAX_CHAIN_BYTES)
-            throw Base::Error("the settings that count at node " + id + " are too large, more than " +
-                              std::to_string(MAX_CHAIN_BYTES) + " bytes of JSON: let its nodes hold less");
+            throw Base::Error(Base::Code::TooLarge, "the settings that count at node " + id +
+                                                        " are too large, more than " +
+                                                        std::to_string(MAX_CHAIN_BYTES) +
+                                                        " bytes of JSON: let its nodes hold less");
         levels.push_back({level.str(), parts(level.str())});
     }
     return levels;
@@ -99,9 +101,10 @@ void SettingsStore::requireRoomForNodes() const {
     Database::Rows rows = database_.query("SELECT count(*), sum(" + database_.bytesOf("id") + ") FROM nodes");
     rows.next();
     if (rows.number(0) > MAX_NODES || rows.number(1) > MAX_IDS_BYTES)
-        throw Base::Error("there is no room for more nodes: " + std::to_string(MAX_NODES) +
-                          " are possible, whose ids have " + std::to_string(MAX_IDS_BYTES) +
-                          " bytes together; remove some first");
+        throw Base::Error(Base::Code::TooLarge,
+                          "there is no room for more nodes: " + std::to_string(MAX_NODES) +
+                              " are possible, whose ids have " + std::to_string(MAX_IDS_BYTES) +
+                              " bytes together; remove some first");
 }
 
 void SettingsStore::add(std::string const& id) {
@@ -113,9 +116,10 @@ void SettingsStore::add(std::string const& id) {
 void SettingsStore::setPart(std::string const& id, std::string const& part, json::Value const& value) {
     std::string const text = value ? textOf(value.toObject()) : std::string();
     if (text.size() > MAX_PART_BYTES)
-        throw Base::Error("the settings \"" + part + "\" of node " + id + " are too large: they have " +
-                          std::to_string(text.size()) + " bytes, and " + std::to_string(MAX_PART_BYTES) +
-                          " are possible");
+        throw Base::Error(Base::Code::TooLarge, "the settings \"" + part + "\" of node " + id +
+                                                    " are too large: they have " +
+                                                    std::to_string(text.size()) + " bytes, and " +
+                                                    std::to_string(MAX_PART_BYTES) + " are possible");
     Database::Transaction transaction(database_, Database::Transaction::ALONE);
     addChain(id);
     if (value)
@@ -136,16 +140,16 @@ void SettingsStore::clear(std::string const& id) {
 
 void SettingsStore::remove(std::string const& id) {
     if (id.empty())
-        throw Base::Error("the root cannot be removed");
+        throw Base::Error(Base::Code::NodeInUse, "the root cannot be removed");
     Database::Transaction transaction(database_, Database::Transaction::ALONE);
     if (!contains(id))
-        throw Base::Error("there is no node " + id);
+        throw Base::Error(Base::Code::NodeUnknown, "there is no node " + id);
     Database::Rows children = database_.query("SELECT count(*), min(id) FROM nodes WHERE parent = $1", id);
     children.next();
     if (long long const count = children.number(0); count > 0)
-        throw Base::Error("node " + id + " has " + std::to_string(count) +
-                          (count == 1 ? " child" : " children") + " (" + children.text(1) +
-                          "): remove what is below it first");
+        throw Base::Error(Base::Code::NodeInUse, "node " + id + " has " + std::to_string(count) +
+                                                     (count == 1 ? " child" : " children") + " (" +
+                                                     children.text(1) + "): remove what is below it first");
     database_.change("DELETE FROM nodes WHERE id = $1", id);
     transaction.commit();
 }

@@ -156,21 +156,24 @@ TEST_F(VlMailTest, SaysInOneLineWhatCannotBeReadAndGoesOnWithTheRest) {
         lines.push_back(line);
     EXPECT_THAT(
         lines,
-        ElementsAre(HasSubstr("missing.pdf: there is no such file"), HasSubstr("empty.txt"),
-                    HasSubstr("noise.bin"), HasSubstr("cut.pdf"),
-                    MatchesRegex("vlmail: the pattern \"\\(\" of field \"total\" in zone \"Page\" of the "
-                                 "preset for \"broken.\\*\" cannot be used: .*; correct it in \".*\""),
-                    HasSubstr("Failed to find pack preset for extraction preset for homeless.txt"),
-                    HasSubstr("folder")));
+        ElementsAre(
+            HasSubstr("missing.pdf: there is no such file"), HasSubstr("empty.txt"), HasSubstr("noise.bin"),
+            HasSubstr("cut.pdf"),
+            MatchesRegex(
+                "vlmail: the pattern \"\\(\" of field \"total\" in zone \"Page\" of the "
+                "preset for \"broken.\\*\" cannot be used: .*; correct it in \".*\" \\[pattern-invalid\\]"),
+            HasSubstr("Failed to find pack preset for extraction preset for homeless.txt"),
+            HasSubstr("folder")));
 }
 
 TEST_F(VlMailTest, RefusesACommandLineInOneLine) {
     EXPECT_EQ(vlmail({"mail", "x.pdf"}), VlMail::FAILED);
-    EXPECT_EQ(err_, "vlmail: --output or --send is required; --help explains\n");
+    EXPECT_EQ(err_, "vlmail: --output or --send is required; --help explains [usage]\n");
     EXPECT_EQ(vlmail({"mail", "-o", path("out")}), VlMail::FAILED);
-    EXPECT_EQ(err_, "vlmail: FILE or --plan is required; --help explains\n");
+    EXPECT_EQ(err_, "vlmail: FILE or --plan is required; --help explains [usage]\n");
     EXPECT_EQ(vlmail({"letter", "--settings", path("gone.json"), "x.pdf"}), VlMail::FAILED);
-    EXPECT_EQ(err_, "vlmail: " + path("gone.json") + ": there is no such file; check the name\n");
+    EXPECT_EQ(err_,
+              "vlmail: " + path("gone.json") + ": there is no such file; check the name [file-unreadable]\n");
 }
 
 TEST_F(VlMailTest, WritesOneMailingAPackPreset) {
@@ -239,9 +242,9 @@ TEST_F(VlMailTest, SaysAtTheDocumentThatAMailingCannotHoldItsName) {
         vlmail("mail", {"invoice 1.txt", "invoice 2\x01.txt", "invoice 3\uFFFE.txt"}, {"-o", path("out")}),
         VlMail::FAILED);
     EXPECT_EQ(err_, "vlmail: cannot mail \"invoice 2\\u0001.txt\": its name has a character that a mailing "
-                    "cannot hold; rename the document\n"
+                    "cannot hold; rename the document [name-invalid]\n"
                     "vlmail: cannot mail \"invoice 3\uFFFE.txt\": its name has a character that a mailing "
-                    "cannot hold; rename the document\n");
+                    "cannot hold; rename the document [name-invalid]\n");
     ASSERT_EQ(mailings().size(), 1u);
     EXPECT_EQ(metadataOf(mailings()[0]).letters.size(), 1u);
     EXPECT_NE(metadataOf(mailings()[0]).entriesDigest, "");
@@ -251,7 +254,10 @@ TEST_F(VlMailTest, RefusesAFolderThatCannotBeMade) {
     write("invoice 1.txt", "No 1\nTo: Ada\n");
     write("out", "a file where the folder should be");
     EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", path("out")}), VlMail::FAILED);
-    EXPECT_THAT(err_, MatchesRegex("vlmail: cannot make the folder \".*out\": .*; name another with -o\n"));
+    EXPECT_THAT(
+        err_,
+        MatchesRegex(
+            "vlmail: cannot make the folder \".*out\": .*; name another with -o \\[file-unwritable\\]\n"));
 }
 
 TEST_F(VlMailTest, LeavesNoHalfFileOnAFullDisk) {
@@ -263,7 +269,7 @@ TEST_F(VlMailTest, LeavesNoHalfFileOnAFullDisk) {
         pages += "No 1\nTo: Ada\n\f";
     write("invoice 1.txt", pages);
     EXPECT_EQ(vlmail("mail", {"invoice 1.txt"}, {"-o", disk.path()}), VlMail::FAILED);
-    EXPECT_THAT(err_, HasSubstr("make room on the disk and mail again\n"));
+    EXPECT_THAT(err_, HasSubstr("make room on the disk and mail again [file-unwritable]\n"));
     EXPECT_TRUE(fs::is_empty(disk.path()));
 }
 
@@ -385,7 +391,7 @@ TEST_F(VlMailTest, RefusesAPlanWhoseInputsHaveChangedAndSaysWhich) {
     EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::FAILED);
     EXPECT_EQ(err_, "vlmail: cannot carry out the plan: \"" + path("node.json") + "\" has changed, \"" +
                         path("invoice 2.txt") + "\" has changed, \"" + path("invoice 3.txt") +
-                        "\" cannot be read any more; make it again with vlmail plan\n");
+                        "\" cannot be read any more; make it again with vlmail plan [plan-outdated]\n");
     EXPECT_FALSE(fs::exists(path("out")));
 }
 
@@ -397,8 +403,9 @@ TEST_F(VlMailTest, RefusesAPlanThatWasEdited) {
     text.replace(text.find("Ada"), 3, "Bob");
     write("plan.json", text);
     EXPECT_EQ(vlmail({"mail", "--plan", path("plan.json"), "-o", path("out")}), VlMail::FAILED);
-    EXPECT_EQ(err_, "vlmail: cannot use the plan \"" + path("plan.json") +
-                        "\": it was changed since it was made; make it again with vlmail plan\n");
+    EXPECT_EQ(err_,
+              "vlmail: cannot use the plan \"" + path("plan.json") +
+                  "\": it was changed since it was made; make it again with vlmail plan [plan-malformed]\n");
 }
 
 /// The settings with further parts, and further keys of the pack preset.
@@ -526,7 +533,7 @@ TEST_F(VlMailTest, SaysThatItsSettingsCannotBeUsed) {
     EXPECT_EQ(
         err_,
         "vlmail: cannot use the settings: JSON error: Wrong type: string. Expected type: integer; correct "
-        "them there\n");
+        "them there [settings-malformed]\n");
 }
 
 } // namespace

@@ -387,8 +387,9 @@ TEST_F(UnusableDocuments, AreToldByLetterAndPlanToo) {
 TEST_F(UnusableDocuments, MayBeAFolderThatIsNone) {
     Ran const ran = runVlMail({"mail", "--documents", path("nowhere"), "-o", path("out"), path("a.txt")});
     EXPECT_EQ(ran.status, 1);
-    EXPECT_EQ(ran.err, "vlmail: cannot list the folder \"" + path("nowhere") +
-                           "\": No such file or directory; name another with --documents\n");
+    EXPECT_EQ(ran.err,
+              "vlmail: cannot list the folder \"" + path("nowhere") +
+                  "\": No such file or directory; name another with --documents [file-unreadable]\n");
 }
 
 class PlansOfSheets : public MakeReadyTest {
@@ -429,7 +430,7 @@ TEST_F(PlansOfSheets, AreRefusedWhenADocumentHasChangedOrIsGone) {
     Ran const changed = carryOut();
     EXPECT_EQ(changed.status, 1);
     EXPECT_EQ(changed.err, "vlmail: cannot carry out the plan: \"" + path("docs/blue.txt") +
-                               "\" has changed; make it again with vlmail plan\n");
+                               "\" has changed; make it again with vlmail plan [plan-outdated]\n");
     fs::remove(folder_ / "docs" / "prices.txt");
     EXPECT_THAT(carryOut().err, HasSubstr("prices.txt\" cannot be read any more"));
 }

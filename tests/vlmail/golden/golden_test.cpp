@@ -308,12 +308,12 @@ TEST_F(GoldenTests, AreFoundInInnerFoldersAndNamedByThem) {
 TEST_F(GoldenTests, WantAFolderWithCases) {
     Ran ran = test();
     EXPECT_EQ(ran.status, FAILED);
-    EXPECT_EQ(ran.err,
-              "vlmail: there are no test cases in \"" + path() + "\"; put PDF or text documents there\n");
+    EXPECT_EQ(ran.err, "vlmail: there are no test cases in \"" + path() +
+                           "\"; put PDF or text documents there [file-unsuitable]\n");
     ran = runVlMail({"presets", "test", path() + "/none"});
     EXPECT_EQ(ran.status, FAILED);
     // In the words of the system, which follow the person's language.
     std::string const reason = std::make_error_code(std::errc::no_such_file_or_directory).message();
     EXPECT_EQ(ran.err, "vlmail: cannot look into the folder \"" + path() + "/none\": " + reason +
-                           "; name a folder with test cases\n");
+                           "; name a folder with test cases [file-unreadable]\n");
 }

@@ -258,10 +258,11 @@ TEST_F(PackCommand, SaysInOneLineWhyAFileCannotBeRead) {
     };
     std::string const damaged =
         "it is no mailing file, or its index is damaged; \"vlmail pack salvage\" saves what "
-        "is left of it";
+        "is left of it [mailing-damaged]";
     Case const cases[] = {
-        {"not there", [] {}, "No such file or directory; check the name"},
-        {"a folder", [&] { fs::create_directory(file_); }, "it is no file; name a mailing file"},
+        {"not there", [] {}, "No such file or directory; check the name [file-unreadable]"},
+        {"a folder", [&] { fs::create_directory(file_); },
+         "it is no file; name a mailing file [file-unreadable]"},
         {"empty", [&] { fs::remove(file_), write(""); }, damaged},
         {"another format", [&] { write(pdf("x")); }, damaged},
         {"a damaged index", [&] { pack(PAGES), damage(positionOf("<vantelar>")); }, damaged},
@@ -344,7 +345,8 @@ TEST_F(PackVerify, FindsThatThereIsNoMetadata) {
 TEST_F(PackVerify, GoesOnWithTheNextFile) {
     pack(PAGES);
     EXPECT_EQ(run({"verify", "missing.mailing", file_.string()}), 1);
-    EXPECT_EQ(err_, "vlmail: cannot read \"missing.mailing\": No such file or directory; check the name\n");
+    EXPECT_EQ(err_, "vlmail: cannot read \"missing.mailing\": No such file or directory; check the name "
+                    "[file-unreadable]\n");
     EXPECT_THAT(out_, EndsWith("all whole\n"));
 }
 
@@ -455,7 +457,7 @@ TEST_F(PackExtract, LeavesOutWhatNoMailingExpandsTo) {
     EXPECT_EQ(run({"extract", file_.string(), "-o", (folder_ / "out").string()}), 1);
     EXPECT_EQ(err_, "vlmail: page 3 of \"a.pdf\" in \"" + file_.string() +
                         "\" is left out: the mailing expands to more than " + std::to_string(limit) +
-                        " bytes\n");
+                        " bytes [mailing-damaged]\n");
     EXPECT_EQ(filesIn(folder_ / "out").size(), 2U);
 }
 
@@ -468,9 +470,9 @@ TEST_F(PackExtract, LeavesNoHalfFileOnAFullDisk) {
         noise += static_cast<char>(value >> 24);
     pack({PAGES[0], {"b.pdf", "1", pdf(noise)}});
     EXPECT_EQ(run({"extract", file_.string(), "-o", disk.path()}), 1);
-    EXPECT_EQ(err_,
-              "vlmail: cannot write \"" + disk.path() +
-                  "/b-1.pdf\": No space left on device; make room on the disk or name another folder\n");
+    EXPECT_EQ(err_, "vlmail: cannot write \"" + disk.path() +
+                        "/b-1.pdf\": No space left on device; make room on the disk or name another folder "
+                        "[file-unwritable]\n");
     EXPECT_EQ(read(disk.path() + "/a-1.pdf"), PAGES[0].content);
     EXPECT_EQ(std::distance(fs::directory_iterator(disk.path()), {}), 1);
 }
@@ -482,8 +484,8 @@ TEST_F(PackList, IsAFailureWhenItCannotBeWritten) {
     std::string const file = file_.string();
     char const* const argv[]{"vlmail", "pack", "list", file.c_str()};
     EXPECT_EQ(VlMail::run(4, argv, {full, err}), 1);
-    EXPECT_EQ(err.str(),
-              "vlmail: the results cannot be written; make room on the disk, or send them elsewhere\n");
+    EXPECT_EQ(err.str(), "vlmail: the results cannot be written; make room on the disk, or send them "
+                         "elsewhere [file-unwritable]\n");
 }
 
 TEST_F(PackList, ShowsNoControlOfATerminal) {
@@ -554,7 +556,7 @@ TEST_F(PackExtract, LeavesDamagedPagesOut) {
     fs::path const out = folder_ / "out";
     EXPECT_EQ(run({"extract", file_.string(), "-o", out.string()}), 1);
     EXPECT_EQ(err_, "vlmail: page 1 of \"a.pdf\" in \"" + file_.string() +
-                        "\" is left out: its checksum is wrong\n");
+                        "\" is left out: its checksum is wrong [mailing-damaged]\n");
     EXPECT_EQ(out_, "3 files written into " + out.string() + '\n');
     EXPECT_FALSE(filesIn(out).contains("a-1.pdf"));
 }
@@ -565,7 +567,8 @@ TEST_F(PackExtract, WritesOverNothing) {
     fs::create_directory(out);
     std::ofstream(out / "mine") << "mine";
     EXPECT_EQ(run({"extract", file_.string(), "-o", out.string()}), 1);
-    EXPECT_EQ(err_, "vlmail: the folder \"" + out.string() + "\" is not empty; name a new one with -o\n");
+    EXPECT_EQ(err_, "vlmail: the folder \"" + out.string() +
+                        "\" is not empty; name a new one with -o [file-exists]\n");
     EXPECT_THAT(filesIn(out), ElementsAre(Pair("mine", "mine")));
 
     EXPECT_EQ(run({"extract", file_.string(), "-o", file_.string()}), 1);
@@ -593,13 +596,14 @@ TEST_F(PackSalvage, NeverWritesToItsInput) {
     fs::create_hard_link(file_, hardLink);
     for (fs::path const& target : {file_, link, hardLink}) {
         EXPECT_EQ(run({"salvage", file_.string(), "-o", target.string()}), 1);
-        EXPECT_EQ(err_,
-                  "vlmail: \"" + target.string() +
-                      "\" is the damaged file itself, which is never written to; name another with -o\n");
+        EXPECT_EQ(err_, "vlmail: \"" + target.string() +
+                            "\" is the damaged file itself, which is never written to; name another with -o "
+                            "[file-exists]\n");
     }
     std::ofstream(target_) << "mine";
     EXPECT_EQ(run({"salvage", file_.string(), "-o", target_.string()}), 1);
-    EXPECT_EQ(err_, "vlmail: \"" + target_.string() + "\" is there already; name another with -o\n");
+    EXPECT_EQ(err_,
+              "vlmail: \"" + target_.string() + "\" is there already; name another with -o [file-exists]\n");
     EXPECT_EQ(read(target_), "mine");
     EXPECT_EQ(read(file_), before);
 }
@@ -755,7 +759,7 @@ TEST_F(PackSalvage, SaysWhenNothingCanBeSaved) {
         write(bytes);
         EXPECT_EQ(run({"salvage", file_.string(), "-o", target_.string()}), 1);
         EXPECT_EQ(err_, "vlmail: nothing in \"" + file_.string() +
-                            "\" can be saved: it holds no page that is whole\n");
+                            "\" can be saved: it holds no page that is whole [mailing-damaged]\n");
         EXPECT_FALSE(fs::exists(target_));
     }
 }

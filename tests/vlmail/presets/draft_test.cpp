@@ -171,7 +171,7 @@ TEST(DraftCommand, EndsOverADocumentThatTakesTooLong) {
     EXPECT_EQ(ran.status, FAILED);
     EXPECT_EQ(ran.err,
               "vlmail: cannot make a draft of 1 document: it took more than 1 s of processor time; print it "
-              "to a new PDF, or give --document-seconds a larger number\n");
+              "to a new PDF, or give --document-seconds a larger number [limit-exceeded]\n");
     EXPECT_EQ(contentOf(settings), "");
 }
 
@@ -197,7 +197,7 @@ TEST(DraftCommand, WritesSettingsOnce) {
     EXPECT_EQ(read.status, FINE) << read.out << read.err;
     Ran const second = runVlMail({"presets", "draft", letter, "-o", settings});
     EXPECT_EQ(second.status, FAILED);
-    EXPECT_EQ(second.err,
-              "vlmail: there is a file \"" + settings + "\" already; name another one, or remove it\n");
+    EXPECT_EQ(second.err, "vlmail: there is a file \"" + settings +
+                              "\" already; name another one, or remove it [file-exists]\n");
     EXPECT_EQ(contentOf(settings), written);
 }

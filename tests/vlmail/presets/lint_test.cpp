@@ -788,12 +788,13 @@ TEST(LintCommand, RefusesWhatIsNoDocument) {
     Ran ran = runVlMail({"presets", "lint", file.path()});
     EXPECT_EQ(ran.status, FAILED);
     EXPECT_EQ(ran.out, "");
-    EXPECT_EQ(ran.err,
-              "vlmail: cannot read the settings in \"" + file.path() +
-                  "\": JSON error: Wrong type: array. Expected type: object; correct the file there\n");
+    EXPECT_EQ(ran.err, "vlmail: cannot read the settings in \"" + file.path() +
+                           "\": JSON error: Wrong type: array. Expected type: object; correct the file there "
+                           "[settings-malformed]\n");
     ran = runVlMail({"presets", "lint", file.path() + ".none"});
     EXPECT_EQ(ran.status, FAILED);
-    EXPECT_EQ(ran.err, "vlmail: " + file.path() + ".none: there is no such file; check the name\n");
+    EXPECT_EQ(ran.err,
+              "vlmail: " + file.path() + ".none: there is no such file; check the name [file-unreadable]\n");
 }
 
 TEST(LintCommand, EndsSoonOnManyHardPatterns) {

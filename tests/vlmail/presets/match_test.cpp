@@ -75,7 +75,7 @@ TEST(MatchCommand, SaysThatThePackPresetIsMissing) {
     EXPECT_EQ(
         ran.err,
         "vlmail: \"reminder.pdf\": there is no pack preset \"Reminders\"; add it, or name another one in "
-        "\"reminder.*\"\n");
+        "\"reminder.*\" [preset-missing]\n");
 }
 
 TEST(MatchCommand, StopsAtABrokenExpressionAsReadingDoes) {
@@ -86,7 +86,8 @@ TEST(MatchCommand, StopsAtABrokenExpressionAsReadingDoes) {
     EXPECT_EQ(ran.out, "b.pdf\n  1. \"a.*\": no, the name does not begin with \"a\"\n");
     EXPECT_THAT(ran.err, testing::StartsWith(
                              "vlmail: \"b.pdf\": preset 2, \"B\" (\"b(\"), cannot be tried: Unmatched"));
-    EXPECT_THAT(ran.err, testing::EndsWith("; correct it, or no later preset is reached\n"));
+    EXPECT_THAT(ran.err,
+                testing::EndsWith("; correct it, or no later preset is reached [pattern-invalid]\n"));
     ran = match(json, {"--json", "b.pdf"});
     EXPECT_THAT(ran.out, testing::HasSubstr(R"("error":"preset 2, \"B\" (\"b(\"), cannot be tried: )"));
 }
@@ -116,5 +117,6 @@ TEST(MatchCommand, RefusesSettingsThatCannotBeUsed) {
     Ran const ran = runVlMail({"presets", "match", "--settings", file.path(), "a"});
     EXPECT_EQ(ran.status, FAILED);
     EXPECT_EQ(ran.err, "vlmail: cannot use the presets in \"" + file.path() +
-                           "\": JSON error: Wrong type: integer. Expected type: array; correct them there\n");
+                           "\": JSON error: Wrong type: integer. Expected type: array; correct them there "
+                           "[settings-malformed]\n");
 }

@@ -152,7 +152,7 @@ TEST_F(ReportCommand, RefusesToOverwriteWhatIsNoPage) {
     Ran const ran = report({"one.txt"}, "node.json");
     EXPECT_EQ(ran.status, 1);
     EXPECT_EQ(ran.err, "vlmail: cannot write a report to \"" + path("node.json") +
-                           "\": its name must end in .html; give --report another name\n");
+                           "\": its name must end in .html; give --report another name [usage]\n");
     EXPECT_EQ(contentOf(path("node.json")), SETTINGS);
 }
 

@@ -250,7 +250,7 @@ TEST(Schemas, OfOtherNamesAreRefused) {
     Ran const ran = runVlMail({"schema", "letters"});
     EXPECT_EQ(ran.status, VlMail::FAILED);
     EXPECT_EQ(ran.err, "vlmail: there is no schema \"letters\"; vlmail schema lists what there is; "
-                       "--help explains\n");
+                       "--help explains [usage]\n");
 }
 
 TEST(Schemas, TakeAllSettingsAmongTheExamplesButThoseWithValuesOfAnotherType) {

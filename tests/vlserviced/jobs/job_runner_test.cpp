@@ -208,26 +208,29 @@ TEST_F(JobRunnerTest, RefusesPacksThatItCannotTake) {
     } const cases[] = {
         {"db.example:5432", "packs", "p1",
          "pages come over the connection or from a pack database below the folder of --local-packs: "
-         "\"db_conn\" has to be the absolute path of a folder there, and \"db.example:5432\" is none"},
+         "\"db_conn\" has to be the absolute path of a folder there, and \"db.example:5432\" is none "
+         "[setting-invalid]"},
         {"", "packs.db", "p1",
          "pages come over the connection or from a pack database below the folder of --local-packs: "
-         "\"db_conn\" has to be the absolute path of a folder there, and \"\" is none"},
+         "\"db_conn\" has to be the absolute path of a folder there, and \"\" is none [setting-invalid]"},
         {folder, "../packs.db", "p1",
-         "\"db_name\" has to be the name of a file, and \"../packs.db\" is none"},
-        {folder, "", "p1", "\"db_name\" has to be the name of a file, and \"\" is none"},
-        {folder, "packs.db", "../p1", "the pack id \"../p1\" cannot name a file"},
-        {folder, "packs.db", "", "the pack id \"\" cannot name a file"},
-        {folder, "other.db", "p1", "there is no pack database " + folder + "/other.db"},
-        {folder, "service.db", "p1", folder + "/service.db is not a pack database"},
-        {folder, "packs.db", "p2", "the pack database " + folder + "/packs.db has no finished pack p2"},
+         "\"db_name\" has to be the name of a file, and \"../packs.db\" is none [setting-invalid]"},
+        {folder, "", "p1", "\"db_name\" has to be the name of a file, and \"\" is none [setting-invalid]"},
+        {folder, "packs.db", "../p1", "the pack id \"../p1\" cannot name a file [mailing-id-invalid]"},
+        {folder, "packs.db", "", "the pack id \"\" cannot name a file [mailing-id-invalid]"},
+        {folder, "other.db", "p1", "there is no pack database " + folder + "/other.db [database-missing]"},
+        {folder, "service.db", "p1", folder + "/service.db is not a pack database [database-unusable]"},
+        {folder, "packs.db", "p2",
+         "the pack database " + folder + "/packs.db has no finished pack p2 [mailing-unknown]"},
         {folder, "packs.db", "wrong node",
          "node id \"acme\" is not valid: wanted is a path like u=NAME/ou=GROUP/a=ACCOUNT, or the same "
          "without its "
-         "front"},
-        {folder, "packs.db", "no pages", "pack no pages has no pages"},
+         "front [node-invalid]"},
+        {folder, "packs.db", "no pages", "pack no pages has no pages [mailing-invalid]"},
         {folder, "packs.db", "bad title",
-         "the title of pack bad title is not a line of text of at most 500 bytes"},
-        {folder, "packs.db", "disabled", "node u=eve/a=closed is disabled: pack disabled is not taken"},
+         "the title of pack bad title is not a line of text of at most 500 bytes [mailing-invalid]"},
+        {folder, "packs.db", "disabled",
+         "node u=eve/a=closed is disabled: pack disabled is not taken [node-disabled]"},
     };
     for (auto const& [db, name, packId, message] : cases) {
         EXPECT_EQ(acceptFailure(db, name, packId), message);
@@ -238,7 +241,7 @@ TEST_F(JobRunnerTest, RefusesPacksThatItCannotTake) {
 TEST_F(JobRunnerTest, RefusesAnotherPackOfAnIdThatIsKnown) {
     acceptStored("p1");
     EXPECT_EQ(acceptFailure("/elsewhere", "packs.db", "p1"),
-              "there is another pack p1, from " + packs_.string());
+              "there is another pack p1, from " + packs_.string() + " [mailing-exists]");
 }
 
 TEST_F(JobRunnerTest, GivesUpAPackThatIsBad) {
@@ -247,7 +250,7 @@ TEST_F(JobRunnerTest, GivesUpAPackThatIsBad) {
     doWork();
     EXPECT_EQ(state("p1"), "failed: page 1 of the pack is not a compressed page");
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
-              "pack p1 was given up: page 1 of the pack is not a compressed page");
+              "pack p1 was given up: page 1 of the pack is not a compressed page [state-refused]");
     runner_->resume();
     EXPECT_TRUE(work_.empty());
 }
@@ -539,7 +542,7 @@ TEST_F(JobRunnerTest, RefusesAPackDatabaseThatOthersMayWrite) {
     fs::permissions(folder_.path(), fs::perms(0770));
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
               "the pack database " + packs_.string() + " is not read, because others may write " +
-                  folder_.path().string() + ": take their right away (chmod go-w)");
+                  folder_.path().string() + ": take their right away (chmod go-w) [database-unusable]");
     EXPECT_EQ(state("p1"), "none");
 }
 
@@ -685,7 +688,7 @@ TEST_F(JobRunnerTest, CallsAMailingBackWhereverItIsUntilItIsHandedOver) {
     EXPECT_FALSE(isInOutbox());
     EXPECT_EQ(change(CANCEL), DONE);
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
-              "pack p1 was cancelled: mail its letters anew");
+              "pack p1 was cancelled: mail its letters anew [state-refused]");
 
     acceptStored("p2");
     doWork();
@@ -826,8 +829,9 @@ TEST_F(JobRunnerTest, RemovesBehindARestartWhatIsLeftOfACancelledMailing) {
 TEST_F(JobRunnerTest, RefusesWhatTheSettingsDoNotAllow) {
     rules_.maxLetterSheets = {2, "u=bob/a=acme"};
     storePack(packs_, "p1");
-    EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
-              "too-many-sheets: 3 sheets, 2 allowed by u=bob/a=acme; pack p1 is not taken");
+    EXPECT_EQ(
+        acceptFailure(folder_.path().string(), "packs.db", "p1"),
+        "too-many-sheets: 3 sheets, 2 allowed by u=bob/a=acme; pack p1 is not taken [refused-by-settings]");
     EXPECT_EQ(state("p1"), "none");
     storePack(packs_, "both sides", "a=acme", R"("duplex": true, )");
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "both sides"), DONE);
@@ -838,7 +842,7 @@ TEST_F(JobRunnerTest, RefusesWhatTheSettingsDoNotAllow) {
               "\"week_days\", 0 to 6 "
               "possible, as set by a=acme for Bills; too-many-sheets: 3 sheets, 2 allowed by u=bob/a=acme; "
               "pack p2 is "
-              "not taken");
+              "not taken [refused-by-settings]");
     EXPECT_EQ(used_, std::vector<std::string>{"a=acme Bills"});
 }
 
@@ -846,7 +850,7 @@ TEST_F(JobRunnerTest, RefusesMetadataThatIsNone) {
     storePack(packs_, "p1");
     run("UPDATE packs SET metadata = 'x'");
     EXPECT_EQ(acceptFailure(folder_.path().string(), "packs.db", "p1"),
-              "the metadata of pack p1 is none of a mailing");
+              "the metadata of pack p1 is none of a mailing [mailing-damaged]");
     EXPECT_EQ(state("p1"), "none");
 }
 

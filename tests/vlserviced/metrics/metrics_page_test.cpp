@@ -62,7 +62,10 @@ protected:
     }
     MetricsPage page() {
         return {measures_,
-                {[this] { return isGone_ ? throw Database::DatabaseError("gone") : openAnother(); },
+                {[this] {
+                     return isGone_ ? throw Database::DatabaseError(Base::Code::DatabaseFailed, "gone")
+                                    : openAnother();
+                 },
                  [this] { return moment_; },
                  {{"data", folder_.path()}, {"nowhere", folder_ / "missing"}},
                  [] { return TEN_O_CLOCK; },
