@@ -3,6 +3,7 @@
 
 #include "programs/protocol/carrier.h"
 
+#include <atomic>
 #include <functional>
 #include <map>
 #include <memory>
@@ -105,6 +106,16 @@ struct Progress {
     std::string says;
 };
 
+/// Raised when what hangs is to be given up, since the service ends: by any thread, once, for all copies.
+class StopSign {
+public:
+    void raise() const { *isRaised_ = true; }
+    bool isRaised() const { return *isRaised_; }
+
+private:
+    std::shared_ptr<std::atomic<bool>> isRaised_ = std::make_shared<std::atomic<bool>>(false);
+};
+
 /// Puts on record, until the disk has it, that the other side may have a parcel from here on. Throws
 /// std::exception when that cannot be done: the parcel stays here then.
 using PutOnRecord = std::function<void()>;
@@ -129,7 +140,8 @@ public:
     virtual std::string test() = 0;
 };
 
-/// The carrier that the settings name.
-std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings);
+/// The carrier that the settings name. One that talks to another machine gives up what it does some seconds
+/// behind the raising of the sign.
+std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings, StopSign const& stop = {});
 
 } // namespace Carriers

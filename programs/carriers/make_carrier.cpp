@@ -8,18 +8,18 @@
 
 namespace Carriers {
 
-std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings) {
+std::unique_ptr<Carrier> makeCarrier(Protocol::CarrierSettings const& settings, StopSign const& stop) {
     switch (settings.type) {
     case Protocol::CarrierType::Folder:
         return std::make_unique<FolderCarrier>(settings.folder, settings.folderIdentity);
     case Protocol::CarrierType::Sftp:
-        return std::make_unique<SftpCarrier>(settings);
+        return std::make_unique<SftpCarrier>(settings, stop);
     case Protocol::CarrierType::Printer:
-        return std::make_unique<PrinterCarrier>(settings.uri);
+        return std::make_unique<PrinterCarrier>(settings.uri, stop);
     case Protocol::CarrierType::Command:
         return std::make_unique<CommandCarrier>(settings);
     case Protocol::CarrierType::Smtp:
-        return std::make_unique<SmtpCarrier>(settings);
+        return std::make_unique<SmtpCarrier>(settings, stop);
     }
     throw Base::Error(Base::Code::CarrierUnknown, "there is no such carrier");
 }

@@ -117,7 +117,8 @@ std::string reasonsInWords(std::vector<std::string> const& reasons) {
     return words;
 }
 
-PrinterCarrier::PrinterCarrier(std::string const& uri) : uri_(uri), session_(uri) {}
+PrinterCarrier::PrinterCarrier(std::string const& uri, StopSign const& stop)
+    : uri_(uri), session_(uri, stop) {}
 
 /// What an earlier attempt has made of jobs that the printer has done nothing with.
 void PrinterCarrier::cancelLeft(std::string const& key) {

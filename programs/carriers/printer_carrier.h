@@ -10,7 +10,7 @@ namespace Carriers {
 /// taken back and asked about by its number.
 class PrinterCarrier : public Carrier {
 public:
-    explicit PrinterCarrier(std::string const& uri);
+    explicit PrinterCarrier(std::string const& uri, StopSign const& stop = {});
 
     Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
     std::map<std::string, Progress> ask(std::set<std::string> const& keys) override;

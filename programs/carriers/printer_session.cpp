@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <utility>
 
 namespace Carriers {
@@ -15,14 +16,37 @@ namespace {
 
 constexpr int CONNECT_MILLISECONDS = 30'000;
 /// A printer that says nothing for so long is given up.
-constexpr double STILL_SECONDS = 60;
+constexpr int STILL_SECONDS = 60;
 constexpr char const* PDF = "application/pdf";
 constexpr char const* USER = "vlserviced";
 
 using Connection = std::unique_ptr<http_t, decltype(&httpClose)>;
 using Message = std::unique_ptr<ipp_t, decltype(&ippDelete)>;
 
-int giveUp(http_t*, void*) { return 0; }
+/// How long a printer has been silent, as far as CUPS asks about it once a second.
+class Silence {
+public:
+    explicit Silence(StopSign stop) : stop_(std::move(stop)) {}
+
+    StopSign const& stop() const { return stop_; }
+    /// Behind a second of silence: whether the printer gets another one.
+    static int another(http_t*, void* silence) { return static_cast<Silence*>(silence)->isToWait() ? 1 : 0; }
+
+private:
+    bool isToWait() {
+        constexpr std::chrono::milliseconds AT_ONCE(1500);
+        auto const now = std::chrono::steady_clock::now();
+        // Something came in between.
+        if (now - last_ > AT_ONCE)
+            seconds_ = 0;
+        last_ = now;
+        return ++seconds_ < STILL_SECONDS && !stop_.isRaised();
+    }
+
+    StopSign stop_;
+    std::chrono::steady_clock::time_point last_;
+    int seconds_ = 0;
+};
 
 std::vector<std::string> textsOf(ipp_t* message, char const* name) {
     ipp_attribute_t* const found = ippFindAttribute(message, name, IPP_TAG_ZERO);
@@ -115,7 +139,8 @@ bool isGood(ipp_t* message) {
 
 class PrinterSession::Impl {
 public:
-    explicit Impl(std::string uri) : uri_(std::move(uri)), connection_(nullptr, &httpClose) {
+    Impl(std::string uri, StopSign stop)
+        : silence_(std::move(stop)), uri_(std::move(uri)), connection_(nullptr, &httpClose) {
         std::array<char, 32> scheme{};
         std::array<char, 256> user{};
         std::array<char, 256> host{};
@@ -231,10 +256,10 @@ private:
         if (connection_)
             return;
         connection_.reset(httpConnect2(host_.c_str(), port_, nullptr, AF_UNSPEC, HTTP_ENCRYPTION_IF_REQUESTED,
-                                       1, CONNECT_MILLISECONDS, nullptr));
+                                       1, silence_.stop().isRaised() ? 1000 : CONNECT_MILLISECONDS, nullptr));
         if (!connection_)
             throw Base::Error(Base::Code::CarrierUnavailable, failureInWords());
-        httpSetTimeout(connection_.get(), STILL_SECONDS, &giveUp, nullptr);
+        httpSetTimeout(connection_.get(), 1, &Silence::another, &silence_);
     }
 
     Message newRequest(ipp_op_t operation) const {
@@ -268,6 +293,7 @@ private:
         return "the printer " + uri_ + ": " + Base::plainLine(cupsLastErrorString());
     }
 
+    Silence silence_;
     std::string uri_;
     std::string host_;
     int port_ = 0;
@@ -275,7 +301,8 @@ private:
     Connection connection_;
 };
 
-PrinterSession::PrinterSession(std::string uri) : impl_(std::make_unique<Impl>(std::move(uri))) {}
+PrinterSession::PrinterSession(std::string uri, StopSign stop)
+    : impl_(std::make_unique<Impl>(std::move(uri), std::move(stop))) {}
 PrinterSession::~PrinterSession() = default;
 
 PrinterFacts PrinterSession::facts() { return impl_->facts(); }

@@ -2,6 +2,7 @@
 // What a printer is asked and told, by the Internet Printing Protocol.
 
 #include "programs/base/error.h"
+#include "programs/carriers/carrier.h"
 
 #include <functional>
 #include <memory>
@@ -64,7 +65,8 @@ public:
 class PrinterSession {
 public:
     /// "ipp://HOST:PORT/PATH"
-    explicit PrinterSession(std::string uri);
+    /// What hangs is given up when the sign is raised.
+    explicit PrinterSession(std::string uri, StopSign stop = {});
     ~PrinterSession();
 
     PrinterFacts facts();

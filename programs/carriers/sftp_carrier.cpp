@@ -12,12 +12,13 @@ constexpr unsigned long long MIB = 1 << 20;
 
 } // namespace
 
-SftpCarrier::SftpCarrier(Protocol::CarrierSettings settings) : settings_(std::move(settings)) {}
+SftpCarrier::SftpCarrier(Protocol::CarrierSettings settings, StopSign stop)
+    : settings_(std::move(settings)), stop_(std::move(stop)) {}
 
 SftpSession& SftpCarrier::session() {
     if (!session_)
         session_ = std::make_unique<SftpSession>(
-            SftpTarget{settings_.url, settings_.hostKey, Base::secretFile(settings_.identityFile)});
+            SftpTarget{settings_.url, settings_.hostKey, Base::secretFile(settings_.identityFile)}, stop_);
     return *session_;
 }
 

@@ -11,7 +11,7 @@ namespace Carriers {
 /// The same files as those of FolderCarrier, each there when it is whole.
 class SftpCarrier : public Carrier {
 public:
-    explicit SftpCarrier(Protocol::CarrierSettings settings);
+    explicit SftpCarrier(Protocol::CarrierSettings settings, StopSign stop = {});
 
     Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
     std::string test() override;
@@ -21,6 +21,7 @@ private:
     SftpSession& session();
 
     Protocol::CarrierSettings settings_;
+    StopSign stop_;
     std::unique_ptr<SftpSession> session_;
 };
 

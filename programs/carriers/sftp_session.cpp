@@ -4,6 +4,7 @@
 #include "programs/base/marked_folder.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/private_file.h"
+#include "programs/carriers/curl_stop.h"
 
 #include <curl/curl.h>
 
@@ -99,8 +100,9 @@ std::optional<unsigned long long> roomIn(std::string const& told) {
 
 class SftpSession::Impl {
 public:
-    explicit Impl(SftpTarget target)
-        : target_(std::move(target)), host_(hostIn(target_.url)), folder_(folderIn(target_.url)) {
+    Impl(SftpTarget target, StopSign stop)
+        : target_(std::move(target)), stop_(std::move(stop)), host_(hostIn(target_.url)),
+          folder_(folderIn(target_.url)) {
         startLibrary();
         handle_ = curl_easy_init();
         if (!handle_)
@@ -178,6 +180,7 @@ private:
         // The library reads the file by its name, and says nothing of whom it is open to.
         Base::readPrivateFile(target_.identityFile);
         failure_.front() = '\0';
+        giveUpWhenRaised(handle_, stop_);
         set(CURLOPT_ERRORBUFFER, failure_.data());
         set(CURLOPT_NOSIGNAL, 1L);
         set(CURLOPT_PROTOCOLS_STR, "sftp");
@@ -208,6 +211,7 @@ private:
     }
 
     SftpTarget target_;
+    StopSign stop_;
     std::string host_;
     std::string folder_;
     CURL* handle_ = nullptr;
@@ -216,7 +220,8 @@ private:
     std::string told_;
 };
 
-SftpSession::SftpSession(SftpTarget target) : impl_(std::make_unique<Impl>(std::move(target))) {}
+SftpSession::SftpSession(SftpTarget target, StopSign stop)
+    : impl_(std::make_unique<Impl>(std::move(target), std::move(stop))) {}
 SftpSession::~SftpSession() = default;
 
 void SftpSession::put(std::string const& name, std::string_view bytes, std::string const& goesFirst) {

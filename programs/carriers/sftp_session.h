@@ -1,6 +1,8 @@
 #pragma once
 // A connection over which files are put into a folder of another machine.
 
+#include "programs/carriers/carrier.h"
+
 #include <memory>
 #include <optional>
 #include <string>
@@ -22,7 +24,8 @@ struct SftpTarget {
 /// Error with one line.
 class SftpSession {
 public:
-    explicit SftpSession(SftpTarget target);
+    /// What hangs is given up when the sign is raised.
+    explicit SftpSession(SftpTarget target, StopSign stop = {});
     ~SftpSession();
 
     /// Puts a file there under a temporary name, and renames it when it is whole; what had its name goes.

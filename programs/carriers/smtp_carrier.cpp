@@ -67,7 +67,8 @@ std::string keyOfMessageId(std::string_view messageId) {
     return key;
 }
 
-SmtpCarrier::SmtpCarrier(Protocol::CarrierSettings settings) : settings_(std::move(settings)) {}
+SmtpCarrier::SmtpCarrier(Protocol::CarrierSettings settings, StopSign const& stop)
+    : settings_(std::move(settings)), session_(stop) {}
 
 SmtpServer SmtpCarrier::server() const {
     SmtpServer server{settings_.url, settings_.caFile, settings_.startsTls, settings_.user};

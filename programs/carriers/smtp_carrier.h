@@ -16,7 +16,7 @@ std::string keyOfMessageId(std::string_view messageId);
 /// mails off has failed.
 class SmtpCarrier : public Carrier {
 public:
-    explicit SmtpCarrier(Protocol::CarrierSettings settings);
+    explicit SmtpCarrier(Protocol::CarrierSettings settings, StopSign const& stop = {});
 
     Outcome handOver(Parcel const& parcel, PutOnRecord const& mayHaveIt) override;
     Outcome send(Notice const& notice, PutOnRecord const& mayHaveIt) override;

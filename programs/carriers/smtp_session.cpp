@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
+#include "programs/carriers/curl_stop.h"
 
 #include <curl/curl.h>
 
@@ -13,6 +14,7 @@
 #include <new>
 #include <optional>
 #include <string_view>
+#include <sys/socket.h>
 #include <utility>
 
 namespace Carriers {
@@ -97,8 +99,9 @@ std::optional<std::size_t> sizeLimitIn(std::string_view extensions) {
 /// One mail, or a trial.
 class SmtpSession::Transfer {
 public:
-    Transfer(CURL* handle, SmtpServer const& server, std::string& extensions)
+    Transfer(CURL* handle, SmtpServer const& server, std::string& extensions, StopSign const& stop)
         : handle_(handle), server_(server), extensions_(extensions) {
+        giveUpWhenRaised(handle, stop);
         set(CURLOPT_URL, server.url.c_str());
         set(CURLOPT_PROTOCOLS_STR, "smtp,smtps");
         set(CURLOPT_PROXY, "");
@@ -286,6 +289,8 @@ private:
         return server_.url + ": " + libraryWords();
     }
     std::string libraryWords() const {
+        if (result_ == CURLE_ABORTED_BY_CALLBACK && !isTooLarge_)
+            return "the service was ended before it answered";
         if (isGarbage_)
             return "it does not answer as a server of e-mail does";
         return error_.front() ? std::string(error_.data()) : std::string(curl_easy_strerror(result_));
@@ -314,15 +319,22 @@ private:
     std::exception_ptr failure_;
 };
 
-SmtpSession::SmtpSession() : handle_(openHandle(), &curl_easy_cleanup) {}
-SmtpSession::~SmtpSession() = default;
+SmtpSession::SmtpSession(StopSign stop) : stop_(std::move(stop)), handle_(openHandle(), &curl_easy_cleanup) {}
+/// libcurl says goodbye and waits for the answer, which a server that hangs does not give.
+SmtpSession::~SmtpSession() {
+    curl_socket_t connection = CURL_SOCKET_BAD;
+    if (stop_.isRaised() &&
+        curl_easy_getinfo(handle_.get(), CURLINFO_ACTIVESOCKET, &connection) == CURLE_OK &&
+        connection != CURL_SOCKET_BAD)
+        ::shutdown(connection, SHUT_RDWR);
+}
 
 Outcome SmtpSession::send(SmtpServer const& server, Mail const& mail, PutOnRecord const& mayHaveIt) {
-    return Transfer(handle_.get(), server, extensions_).send(mail, mayHaveIt);
+    return Transfer(handle_.get(), server, extensions_, stop_).send(mail, mayHaveIt);
 }
 
 std::string SmtpSession::extensions(SmtpServer const& server) {
-    Transfer(handle_.get(), server, extensions_).tryServer();
+    Transfer(handle_.get(), server, extensions_, stop_).tryServer();
     return extensions_;
 }
 

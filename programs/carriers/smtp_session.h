@@ -34,7 +34,8 @@ struct Mail {
 /// Stays connected from one mail to the next. Used by one thread at a time.
 class SmtpSession {
 public:
-    SmtpSession();
+    /// What hangs is given up when the sign is raised.
+    explicit SmtpSession(StopSign stop = {});
     ~SmtpSession();
     SmtpSession(SmtpSession const&) = delete;
     SmtpSession& operator=(SmtpSession const&) = delete;
@@ -48,6 +49,7 @@ public:
 private:
     class Transfer;
 
+    StopSign stop_;
     /// A CURL, which curl's header calls void.
     std::unique_ptr<void, void (*)(void*)> handle_;
     /// The server's extensions as it told them when it was connected to.

@@ -66,6 +66,8 @@ constexpr std::chrono::hours SWEEP_TIME{24};
 /// How often packs are looked for that nobody needs, and jobs whose time is up.
 constexpr std::chrono::hours ENDED_SWEEP_TIME{1};
 constexpr std::size_t MAX_PATH_BYTES = 1000;
+/// How long carriers get for what they have begun when the service ends.
+constexpr std::chrono::seconds CARRIERS_PATIENCE{3};
 
 constexpr char const* REVOKED = "this access token was revoked: ask for another one (\"vlmail token add\")";
 
@@ -372,12 +374,18 @@ private:
         }
     }
 
-    /// What carriers have begun they finish, and put on record meanwhile.
+    /// What carriers have begun they finish, and put on record meanwhile; what hangs they give up.
     void endCarriers() {
         io_.restart();
         auto guard = asio::make_work_guard(io_);
+        asio::steady_timer patience(io_, CARRIERS_PATIENCE);
+        patience.async_wait([this](boost::system::error_code const& ec) {
+            if (!ec)
+                carriersStop_.raise();
+        });
         std::thread ending([&] {
             carrierThreads_.end();
+            asio::post(io_, [&] { patience.cancel(); });
             guard.reset();
         });
         runHandlers();
@@ -656,7 +664,9 @@ private:
                 [this] { return settings_.service(); },
                 outbox_,
                 &Base::localOffset,
-                &Carriers::makeCarrier,
+                [stop = carriersStop_](Protocol::CarrierSettings const& settings) {
+                    return Carriers::makeCarrier(settings, stop);
+                },
                 [this](std::string const& packId) { runner_.onLettersTaken(packId); },
                 [this] { awaitLetters(); },
                 [this](LetterSurroundings::Work const& work) { doOnOwnThread(work); },
@@ -665,7 +675,8 @@ private:
                 took_,
                 [this](std::string const& channel, LetterState state, std::size_t letters) {
                     measures_.noteLetters(channel, state, letters);
-                }};
+                },
+                carriersStop_};
     }
 
     ReceptionSurroundings receptionSurroundings() {
@@ -717,6 +728,7 @@ private:
     /// As many as may wait for databases that somebody holds, before others have to wait for them.
     asio::thread_pool reader_{8};
     CarrierThreads carrierThreads_;
+    Carriers::StopSign carriersStop_;
     /// For the pack store alone, which is used by one thread.
     asio::thread_pool storeThread_{1};
     HeldQueries held_{io_, jobs_};

@@ -10,11 +10,14 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <arpa/inet.h>
 #include <chrono>
 #include <fstream>
 #include <iterator>
+#include <netinet/in.h>
 #include <optional>
 #include <sstream>
+#include <stdexcept>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -226,6 +229,41 @@ TEST(PrinterReasons, AreToldInWords) {
     EXPECT_EQ(Carriers::reasonsInWords({}), "");
     EXPECT_EQ(Carriers::reasonsInWords({"media-empty-error", "toner-empty-warning", "fuser-over-temp"}),
               "out of paper, out of toner, fuser-over-temp");
+}
+
+/// Whoever connects to it is never answered.
+class SilentMachine {
+public:
+    SilentMachine() {
+        sockaddr_in address{};
+        address.sin_family = AF_INET;
+        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+        socklen_t size = sizeof address;
+        auto* const generic = reinterpret_cast<sockaddr*>(&address);
+        if (::bind(socket_, generic, size) != 0 || ::listen(socket_, 5) != 0 ||
+            ::getsockname(socket_, generic, &size) != 0)
+            throw std::runtime_error("no socket");
+        port_ = ntohs(address.sin_port);
+    }
+    ~SilentMachine() { ::close(socket_); }
+    SilentMachine(SilentMachine const&) = delete;
+    SilentMachine& operator=(SilentMachine const&) = delete;
+
+    std::string uri() const { return "ipp://127.0.0.1:" + std::to_string(port_) + "/ipp/print"; }
+
+private:
+    int socket_ = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    int port_ = 0;
+};
+
+TEST(PrinterThatHangs, IsGivenUpWhenTheServiceEnds) {
+    SilentMachine const machine;
+    Carriers::StopSign const stop;
+    stop.raise();
+    Carriers::PrinterCarrier carrier(machine.uri(), stop);
+    auto const begin = std::chrono::steady_clock::now();
+    EXPECT_THROW(carrier.handOver(parcelOf("p1-1", {"Ada"}), &noRecord), std::exception);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(40)) << "others get a minute";
 }
 
 } // namespace

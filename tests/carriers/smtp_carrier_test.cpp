@@ -130,6 +130,17 @@ TEST_F(SmtpCarrierTest, SendsAttachmentsAsFilesAndSaysWhereAnswersGo) {
                       HasSubstr("\r\nReply-To: service@acme.example\r\n")));
 }
 
+TEST_F(SmtpCarrierTest, GivesUpAServerThatHangsWhenTheServiceEnds) {
+    REQUIRE_SERVER(begin(R"({"behind":{".":"hang once"}})"));
+    Carriers::StopSign const stop;
+    Carriers::SmtpCarrier carrier(settings_, stop);
+    Outcome const cut = carrier.handOver(parcel_, [&] { stop.raise(); });
+    EXPECT_EQ(cut.kind, Outcome::Kind::Uncertain) << "the server may have it";
+    EXPECT_THAT(cut.says, testing::EndsWith("the service was ended before it answered"));
+    Outcome const begun = carrier.handOver(parcel_, [] { ADD_FAILURE() << "nothing is begun"; });
+    EXPECT_EQ(begun.kind, Outcome::Kind::Failed) << "nobody has it";
+}
+
 TEST_F(SmtpCarrierTest, SendsNoticesAsTextsAlone) {
     REQUIRE_SERVER(begin());
     Carriers::SmtpCarrier carrier(settings_);

@@ -362,6 +362,15 @@ public:
         service.signal(SIGKILL);
         service.wait();
     }
+    /// The same, and the service is to end.
+    void endWhileTheServerHasALetter() {
+        ServiceProcess service(arguments());
+        auto const client = clientOf(service, data_);
+        begin(*client);
+        server_.awaitMessage();
+        service.signal(SIGTERM);
+        EXPECT_EQ(service.wait(), 0);
+    }
     void goOn() {
         ServiceProcess const service(arguments());
         EXPECT_TRUE(send(service));
@@ -509,7 +518,7 @@ public:
         return !survived;
     }
 
-private:
+protected:
     json::Object carrier() const override {
         return {{"type", "printer"}, {"uri", printer_.uri()}, {"retry_seconds", 1}};
     }
@@ -546,10 +555,55 @@ private:
     IppPrinter printer_{folder_ / "printer", ""};
 };
 
+/// All of a mailing in one job.
+class PrintedMailing : public PrintedLetters {
+public:
+    void printAtOnce() {
+        ServiceProcess const service(arguments());
+        EXPECT_TRUE(send(service));
+        std::istringstream words(told(*clientOf(service, data_)));
+        std::string state;
+        words >> state >> state;
+        int letters = 0;
+        for (; words >> state; ++letters)
+            EXPECT_TRUE(state == "accepted" || state == "delivered") << state;
+        EXPECT_EQ(letters, 4);
+        auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+        while (!times().contains("s1-postal") && std::chrono::steady_clock::now() < end) {
+        }
+        EXPECT_EQ(times()["s1-postal"], 1);
+        EXPECT_FALSE(times().contains("s1-1"));
+    }
+
+private:
+    json::Object carrier() const override {
+        json::Object carrier = PrintedLetters::carrier();
+        carrier.set("unit", "mailing");
+        return carrier;
+    }
+};
+
 TEST(ServiceThatIsEndedAmongLetters, FinishesThoseThatAreOnTheirWayAndPutsThemOnRecord) {
     CommandedLetters letters;
     letters.endWithALetterOnItsWay();
     letters.goOn();
+}
+
+TEST(ServiceThatIsEndedAmongLetters, GivesUpAServerOfEMailThatHangsAndTellsTheLetterAsUncertain) {
+    MailedLetters letters(R"({"behind":{".":"hang once"}})");
+    if (!letters.missing().empty())
+        GTEST_SKIP() << letters.missing();
+    auto const begin = std::chrono::steady_clock::now();
+    letters.endWhileTheServerHasALetter();
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(120))
+        << "far below the server's time";
+    letters.goOn();
+}
+
+TEST(LettersOfAMailing, ArePrintedAsOneJobWhereThatIsTheUnit) {
+    if (!IppPrinter::whyNot().empty())
+        GTEST_SKIP() << IppPrinter::whyNot();
+    PrintedMailing().printAtOnce();
 }
 
 TEST(ServiceThatIsKilledAmongLetters, TellsOneAsUncertainThatAServerOfEMailHasTakenAndNotAnswered) {

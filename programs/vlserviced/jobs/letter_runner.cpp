@@ -265,13 +265,15 @@ void LetterRunner::start(std::string const& name, Channel& channel, std::vector<
     surroundings_.onCarrier(
         name, static_cast<std::size_t>(channel.settings.atOnce),
         [this, handOver, isShared = letters_.isShared(), onOwnThread = surroundings_.onOwnThread,
-         doneOnOwnThread = surroundings_.doneOnOwnThread, took = surroundings_.took] {
+         doneOnOwnThread = surroundings_.doneOnOwnThread, took = surroundings_.took,
+         stop = surroundings_.stop] {
             // Whoever finds them so on record cannot know whether the other side has them.
             {
                 StepTime const time(took, Step::HandingOver);
                 carryOut(*handOver, isShared, [&] {
                     doneOnOwnThread([&] { letters_.beginHandingOver(handOver->ids(), surroundings_.now()); });
                 });
+                handOver->isGivenUp = handOver->outcome.kind == Outcome::Kind::Failed && stop.isRaised();
             }
             onOwnThread([this, handOver] { onDone(handOver); });
         });
@@ -340,6 +342,8 @@ void LetterRunner::recordOutcome(HandOver const& handOver) {
                letters_.isShared() ? LettersAre::Waiting : LettersAre::Anywhere);
     if (handOver.letters.empty())
         return;
+    if (handOver.isGivenUp)
+        return letters_.finish(handOver.ids(), LetterState::Waiting, {}, surroundings_.now(), handOver.are);
     noteCarrier(handOver);
     Outcome const& outcome = handOver.outcome;
     if (outcome.kind == Outcome::Kind::Failed)

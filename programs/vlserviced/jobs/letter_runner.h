@@ -41,7 +41,7 @@ struct LetterSurroundings {
     /// The clock of the place that carriers' hours are meant for.
     Policy::UtcOffset offset = &Base::localOffset;
     std::function<std::unique_ptr<Carriers::Carrier>(Protocol::CarrierSettings const&)> makeCarrier =
-        &Carriers::makeCarrier;
+        [](Protocol::CarrierSettings const& carrier) { return Carriers::makeCarrier(carrier); };
     /// Told when the last of a job's letters was taken on, with the pack id.
     std::function<void(std::string const& packId)> taken = [](std::string const&) {};
     /// Told whenever nextTime() may be another.
@@ -58,6 +58,8 @@ struct LetterSurroundings {
     /// Told what became of letters that were handed over, or were to be.
     std::function<void(std::string const& channel, LetterState state, std::size_t letters)> became =
         [](std::string const&, LetterState, std::size_t) {};
+    /// Raised when carriers are to give up what hangs.
+    Carriers::StopSign stop = {};
 };
 
 /// Used by one thread; the work it hands to carriers touches nothing of it.
@@ -132,6 +134,8 @@ private:
         LettersAre are = LettersAre::Anywhere;
         /// Whether it was the carrier that failed, where the outcome says so.
         bool isCarriersFault = true;
+        /// Whether nothing failed, and nobody has anything: the service ends.
+        bool isGivenUp = false;
 
         std::vector<LetterId> ids() const;
         /// Takes them from the letters.

@@ -118,6 +118,7 @@ protected:
             became_.push_back(channel + ' ' + Protocol::letterStateName(state) + ' ' +
                               std::to_string(letters));
         };
+        around.stop = stop_;
         letterRunner_.emplace(letters_, jobs_, around);
         VlServiced::JobSurroundings surroundings{
             [](VlServiced::JobSurroundings::Work const& work) { work(); },
@@ -194,6 +195,7 @@ protected:
     std::vector<std::string> became_;
     OtherSide other_;
     std::deque<std::pair<std::string, std::function<void()>>> work_;
+    Carriers::StopSign stop_;
     std::optional<LetterRunner> letterRunner_;
     std::optional<JobRunner> runner_;
 };
@@ -533,6 +535,20 @@ TEST_F(LetterRunnerTest, NeverSendsALetterAgainByItselfThatTheOtherSideMayHave) 
     EXPECT_EQ(letterRunner_->nextTime(), std::nullopt);
     EXPECT_EQ(decision(Protocol::LetterAction::SettleDelivered, "p1", 2), "nothing was thrown");
     EXPECT_EQ(job("p1"), "lodged");
+}
+
+TEST_F(LetterRunnerTest, LetsALetterWaitAsItWasThatACarrierGaveUpSinceTheServiceEnds) {
+    other_.isRepeatable = false;
+    other_.answer = Outcome{Outcome::Kind::Failed, "the service was ended"};
+    send("p1", {"postal", "postal"});
+    stop_.raise();
+    doOne();
+    EXPECT_EQ(state("p1", 1), "waiting");
+    EXPECT_EQ(letters_.find({"p1", 1})->attempts, 0);
+    EXPECT_EQ(letters_.carrier("postal").failures, 0);
+    other_.answer = Outcome{Outcome::Kind::Uncertain, "cut"};
+    doOne();
+    EXPECT_THAT(state("p1", 2) + state("p1", 1), HasSubstr("uncertain: cut"));
 }
 
 TEST_F(LetterRunnerTest, TriesALetterAgainThatNobodyHasAlthoughItWasOnRecordAsHandedOver) {
