@@ -139,8 +139,9 @@ TEST_F(GivenTokens, AreShownOnceAndListed) {
     std::string const list = output({"token", "list"});
     EXPECT_THAT(list, testing::ContainsRegex("\nadmin +admin +the root "));
     EXPECT_THAT(list, testing::ContainsRegex("\noffice +send +u=bob/a=acme +[0-9/]+ [0-9:]+ +admin\n"));
-    EXPECT_EQ(complaint({"token", "add", "office", "--role", "boss", "--node", "/"}),
-              "vlmail: there is no role \"boss\"; there are read, send, settings and admin\n");
+    EXPECT_EQ(
+        complaint({"token", "add", "office", "--role", "boss", "--node", "/"}),
+        "vlmail: there is no role \"boss\"; there are read, send, settings and admin [request-invalid]\n");
     EXPECT_EQ(output({"token", "revoke", "office"}),
               "The token office, which had the role send at u=bob/a=acme, is revoked.\n");
 }
@@ -152,7 +153,7 @@ TEST_F(GivenTokens, AllowWhatTheirRoleSaysAtTheirNodes) {
     EXPECT_EQ(
         as("reader", {"settings", "set", "a=acme", "po", "code=R"}).err,
         "vlmail: The service refuses: this needs the role settings at a=acme, and the token reader has the "
-        "role read at a=acme: ask for a token that may (\"vlmail token add\")\n");
+        "role read at a=acme: ask for a token that may (\"vlmail token add\") [not-allowed]\n");
     EXPECT_EQ(as("boss", {"settings", "set", "a=acme", "po", "code=R"}).status, VlMail::FINE);
     EXPECT_THAT(as("boss", {"settings", "suspend", "jobs"}).err,
                 HasSubstr("this needs the role admin at the root"));
@@ -257,13 +258,13 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     Result const set = vlmail({"settings", "service", "carriers=" + file});
     EXPECT_EQ(set.status, VlMail::FINE);
     EXPECT_EQ(set.err, "vlmail: the carrier of postal is set and cannot be had yet: cannot open " + shop +
-                           ": No such file or directory\n");
+                           ": No such file or directory [carrier-unavailable]\n");
     EXPECT_EQ(complaint({"carriers", "test", "postal"}),
-              "vlmail: cannot open " + shop + ": No such file or directory\n");
+              "vlmail: cannot open " + shop + ": No such file or directory [carrier-unavailable]\n");
     fs::create_directory(shop);
     EXPECT_EQ(complaint({"carriers", "test", "postal"}),
               "vlmail: the folder " + shop +
-                  " could not be had when it was set: set \"carriers\" once more\n");
+                  " could not be had when it was set: set \"carriers\" once more [carrier-unavailable]\n");
     EXPECT_EQ(output({"settings", "service", "carriers=" + file}), "");
     EXPECT_THAT(output({"carriers", "test", "postal"}),
                 HasSubstr(shop + " can be written into and has room for "));
@@ -272,7 +273,8 @@ TEST_F(ClientCommands, CarriersAreSetListedAndTried) {
     EXPECT_THAT(output({"carriers", "pause", "postal"}), HasSubstr("postal   folder  paused"));
     EXPECT_THAT(output({"carriers", "resume", "postal", "--json"}), HasSubstr(R"("state":"working")"));
     EXPECT_EQ(complaint({"carriers", "pause", "fax"}),
-              "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are\n");
+              "vlmail: there is no carrier of fax: \"vlmail carriers list\" shows those that there are "
+              "[carrier-unknown]\n");
     EXPECT_THAT(complaint({"settings", "service", R"(carriers={"postal":{"type":"pigeon"}})"}),
                 HasSubstr("the carrier of postal: \"type\" of a carrier has to be one of folder, sftp, "
                           "printer, command, smtp"));
@@ -350,12 +352,14 @@ TEST_F(ClientCommands, LettersAreShownWhereTheyAre) {
                 HasSubstr(R"("letters":[{"number":1,"key":"p1-1","channel":"postal",)"
                           R"("state":"accepted","says":"in )"));
     EXPECT_EQ(complaint({"settle", "p1", "1", "failed"}),
-              "vlmail: letter 1 of mailing p1 is accepted: only one that is uncertain can be settled\n");
+              "vlmail: letter 1 of mailing p1 is accepted: only one that is uncertain can be settled "
+              "[state-refused]\n");
     EXPECT_EQ(complaint({"settle", "p1", "1", "lost"}),
-              "vlmail: a letter is settled as delivered or failed, not as \"lost\"\n");
+              "vlmail: a letter is settled as delivered or failed, not as \"lost\" [usage]\n");
     EXPECT_EQ(complaint({"resend", "p1", "one"}),
-              "vlmail: \"one\" is no number of a letter: vlmail status MAILING shows them\n");
-    EXPECT_EQ(complaint({"resend", "p1", "3"}), "vlmail: there is no letter 3 of mailing p1\n");
+              "vlmail: \"one\" is no number of a letter: vlmail status MAILING shows them [usage]\n");
+    EXPECT_EQ(complaint({"resend", "p1", "3"}),
+              "vlmail: there is no letter 3 of mailing p1 [letter-unknown]\n");
 }
 
 TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {
@@ -373,14 +377,16 @@ TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {
     fs::path const mailbox = folder_ / "mailbox";
     fs::create_directories(mailbox / "new");
     EXPECT_EQ(complaint({"bounce", "--maildir", mailbox.string()}),
-              "vlmail: " + mailbox.string() + " is no mailbox (Maildir) with the folders new and cur\n");
+              "vlmail: " + mailbox.string() +
+                  " is no mailbox (Maildir) with the folders new and cur [file-unsuitable]\n");
     fs::create_directories(mailbox / "cur");
     std::ofstream(mailbox / "new" / "1.a") << "Subject: hello\n\nyou\n";
     std::ofstream(mailbox / "new" / "2.b") << reportOn("p1-1", "failed");
     Result const taken = vlmail({"bounce", "--maildir", mailbox.string()});
     EXPECT_EQ(taken.status, VlMail::INCOMPLETE);
     EXPECT_EQ(taken.out, "p1-1, returned: 550 no such user\n");
-    EXPECT_EQ(taken.err, "vlmail: 1.a: the message is no report of a server of e-mail (multipart/report)\n");
+    EXPECT_EQ(taken.err, "vlmail: 1.a: the message is no report of a server of e-mail (multipart/report) "
+                         "[report-unreadable]\n");
     EXPECT_TRUE(fs::exists(mailbox / "new" / "1.a"));
     EXPECT_TRUE(fs::exists(mailbox / "cur" / "2.b:2,S"));
     EXPECT_THAT(vlmail({"status", "p1"}).out, HasSubstr("returned"));
@@ -407,10 +413,13 @@ TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAPipe) {
         int const status = std::system(command.c_str());
         return std::to_string(WEXITSTATUS(status)) + ' ' + Base::readFile(folder_ / "told");
     };
-    EXPECT_EQ(bounce("Subject: hello\n\nyou\n"),
-              "1 vlmail: the message is no report of a server of e-mail (multipart/report)\n");
-    EXPECT_EQ(bounce(""), "1 vlmail: the message is no report of a server of e-mail (multipart/report)\n");
-    EXPECT_EQ(bounce(reportOn("p2-1", "failed")), "1 vlmail: there is no mailing p2\n");
+    EXPECT_EQ(
+        bounce("Subject: hello\n\nyou\n"),
+        "1 vlmail: the message is no report of a server of e-mail (multipart/report) [report-unreadable]\n");
+    EXPECT_EQ(
+        bounce(""),
+        "1 vlmail: the message is no report of a server of e-mail (multipart/report) [report-unreadable]\n");
+    EXPECT_EQ(bounce(reportOn("p2-1", "failed")), "1 vlmail: there is no mailing p2 [mailing-unknown]\n");
     EXPECT_EQ(bounce(reportOn("p1-1", "delivered")), "0 p1-1, delivered: 550 no such user\n");
     EXPECT_THAT(
         bounce(reportOn("p1-1", "failed"), "--json"),
@@ -499,19 +508,20 @@ TEST_F(ClientCommands, WhatCannotBeSetIsToldInOneLine) {
         std::string line;
     } const cases[] = {
         {{"settings", "set", "a=acme", "po", "kode=A"},
-         "vlmail: the part \"po\" has no setting \"kode\"; it has code, expiry\n"},
+         "vlmail: the part \"po\" has no setting \"kode\"; it has code, expiry [setting-unknown]\n"},
         {{"settings", "set", "a=acme", "po", "expiry=soon"},
-         "vlmail: \"expiry\" wants a value in JSON like 0, and \"soon\" is none\n"},
+         "vlmail: \"expiry\" wants a value in JSON like 0, and \"soon\" is none [setting-invalid]\n"},
         {{"settings", "set", "a=acme", "po", "expiry=\"5\""},
-         "vlmail: JSON error: Wrong type: string. Expected type: integer\n"},
+         "vlmail: JSON error: Wrong type: string. Expected type: integer [json-malformed]\n"},
         {{"settings", "set", "a=acme", "pos", "code=A"},
-         "vlmail: there are no settings \"pos\"; there are app, inet, po, deps, profiles, presets\n"},
+         "vlmail: there are no settings \"pos\"; there are app, inet, po, deps, profiles, presets "
+         "[setting-unknown]\n"},
         {{"settings", "set", "a=acme", "po", "code=A", "B"},
-         "vlmail: \"B\" is neither the only argument, a file, nor KEY=VALUE\n"},
+         "vlmail: \"B\" is neither the only argument, a file, nor KEY=VALUE [usage]\n"},
         {{"settings", "set", "a=acme", "po", "/missing.json"},
-         "vlmail: /missing.json: there is no such file; check the name\n"},
-        {{"settings", "remove", "a=acme"}, "vlmail: there is no node a=acme\n"},
-        {{"settings", "remove", "/"}, "vlmail: the root cannot be removed\n"},
+         "vlmail: /missing.json: there is no such file; check the name [file-unreadable]\n"},
+        {{"settings", "remove", "a=acme"}, "vlmail: there is no node a=acme [node-unknown]\n"},
+        {{"settings", "remove", "/"}, "vlmail: the root cannot be removed [node-in-use]\n"},
     };
     for (auto const& [arguments, line] : cases)
         EXPECT_EQ(complaint(arguments), line);
@@ -528,8 +538,9 @@ TEST_F(ClientCommands, NodesAreShownAsATreeAndRemovedFromBelow) {
     EXPECT_EQ(output({"settings", "ids", "bob"}), "node          description  state\n"
                                                   "a=acme        Acme Ltd\n"
                                                   "u=bob/a=acme               disabled\n");
-    EXPECT_EQ(complaint({"settings", "remove", "a=acme"}),
-              "vlmail: node a=acme has 1 child (u=bob/a=acme): remove what is below it first\n");
+    EXPECT_EQ(
+        complaint({"settings", "remove", "a=acme"}),
+        "vlmail: node a=acme has 1 child (u=bob/a=acme): remove what is below it first [node-in-use]\n");
     output({"settings", "remove", "u=bob/a=acme"});
     output({"settings", "remove", "a=acme"});
     EXPECT_EQ(output({"settings", "tree", "--json"}),
@@ -539,7 +550,7 @@ TEST_F(ClientCommands, NodesAreShownAsATreeAndRemovedFromBelow) {
 TEST_F(ClientCommands, PricesFollowTheTariff) {
     EXPECT_EQ(complaint({"price", "3"}),
               "vlmail: the service has no tariff yet: set one with \"vlmail settings "
-              "service tariff=FILE\"\n");
+              "service tariff=FILE\" [setting-missing]\n");
     output(
         {"settings", "service",
          "tariff=" + write("tariff.json", R"({"currency":"EUR","letter":85,"sheet":10,"duplex_sheet":-3})")});
@@ -558,7 +569,7 @@ TEST_F(ClientCommands, PricesFollowTheTariff) {
               "{\"currency\":\"EUR\",\"total\":115,\"letters\":[{\"sheets\":3,\"price\":115}]}\n");
     EXPECT_EQ(complaint({"price", "0x3"}),
               "vlmail: cannot estimate \"0x3\": it is neither a mailing file nor a "
-              "number of letters and pages like 20x3\n");
+              "number of letters and pages like 20x3 [usage]\n");
 }
 
 TEST_F(ClientCommands, AMailingIsSentHandedOnAndFollowed) {
@@ -645,9 +656,10 @@ TEST_F(ClientCommands, StrandedMailingsAreListedResumedAndDiscarded) {
     EXPECT_THAT(vlmail({"status", "--stranded", "--json", "--database", file}).out,
                 testing::StartsWith("{\"stranded\":[{\"id\":\"p3\",\"title\":\"Title of "
                                     "p3\",\"cfg_id\":\"a=acme\",\"created\":"));
-    EXPECT_EQ(complaint({"discard", "p2", "--database", file}),
-              "vlmail: the pack database " + file +
-                  " has no mailing p2; \"vlmail status --stranded\" lists those that it has\n");
+    EXPECT_EQ(
+        complaint({"discard", "p2", "--database", file}),
+        "vlmail: the pack database " + file +
+            " has no mailing p2; \"vlmail status --stranded\" lists those that it has [mailing-unknown]\n");
     output({"discard", "p3", "--database", file});
     EXPECT_EQ(output({"status", "--stranded", "--database", file}), "no mailing is stranded\n");
     EXPECT_EQ(output({"status", "p2"}), "the service has no such mailings\n");
@@ -663,7 +675,7 @@ TEST_F(ClientCommands, AMailingThatTheServiceIsAboutToFetchIsNotDiscarded) {
     }
     EXPECT_EQ(complaint({"discard", "p1", "--database", database.string()}),
               "vlmail: the service is about to fetch mailing p1 and its letters will go out: it cannot be "
-              "discarded\n");
+              "discarded [state-refused]\n");
     EXPECT_EQ(output({"status", "--stranded", "--database", database.string()}), "no mailing is stranded\n");
     EXPECT_EQ(Mailing::finishedPacks(database).size(), 1u);
 }
@@ -688,11 +700,11 @@ TEST_F(ClientCommands, ThePackDatabaseIsThatOfTheNodesSettings) {
 TEST_F(ClientCommands, ChangesAndJobsAreHeldBack) {
     output({"settings", "suspend", "settings"});
     EXPECT_EQ(complaint({"settings", "set", "a=acme", "po", "code=A"}),
-              "vlmail: changes of settings are held back at the moment\n");
+              "vlmail: changes of settings are held back at the moment [service-suspended]\n");
     output({"settings", "suspend", "nothing"});
     output({"settings", "set", "a=acme", "po", "code=A"});
     EXPECT_EQ(complaint({"settings", "suspend", "me"}),
-              "vlmail: \"me\" cannot be held back; name settings, jobs, all or nothing\n");
+              "vlmail: \"me\" cannot be held back; name settings, jobs, all or nothing [usage]\n");
 }
 
 TEST_F(ClientCommands, TheServicesSettingsAreShown) {
@@ -709,7 +721,7 @@ TEST_F(ClientCommands, TheServicesSettingsAreShown) {
     EXPECT_THAT(output({"settings", "service", "--json"}), testing::StartsWith("{\"outbox\":"));
     EXPECT_EQ(complaint({"settings", "service", "colour=red"}),
               "vlmail: \"colour=red\" sets nothing; write upload_folder=PATH, tariff=FILE, carriers=FILE, "
-              "disabled=[...], quota={...} or retention_days=N\n");
+              "disabled=[...], quota={...} or retention_days=N [usage]\n");
 }
 
 TEST_F(ClientCommands, DiscoverTellsWhetherTheNamedServiceCanBeUsed) {
@@ -849,11 +861,12 @@ TEST_F(MailingsOfANode, TellTheirSenderOnceTheyAreHandedOver) {
         shown = output({"status", id});
     EXPECT_THAT(shown, testing::ContainsRegex("\nmailing +notice  of           state     since +note\n" + id +
                                               "  n1      the mailing  accepted  "));
-    EXPECT_EQ(complaint({"resend", id, "n1"}),
-              "vlmail: notice 1 of mailing " + id +
-                  " is accepted: only one that is uncertain, failed or returned is sent again\n");
+    EXPECT_EQ(
+        complaint({"resend", id, "n1"}),
+        "vlmail: notice 1 of mailing " + id +
+            " is accepted: only one that is uncertain, failed or returned is sent again [state-refused]\n");
     EXPECT_EQ(complaint({"resend", id, "n"}),
-              "vlmail: \"n\" is no number of a letter: vlmail status MAILING shows them\n");
+              "vlmail: \"n\" is no number of a letter: vlmail status MAILING shows them [usage]\n");
 }
 
 TEST_F(MailingsOfANode, AreHeldThroughAnUploadAndAKilledServiceUntilTheyAreReleased) {
@@ -904,7 +917,7 @@ TEST_F(MailingsOfANode, AreCalledBackUntilTheyAreHandedOver) {
     EXPECT_THAT(late.err, testing::StartsWith("vlmail: it is too late to cancel mailing " + two +
                                               ": the upload folder " + upload_.string() + " has it since "));
     EXPECT_EQ(vlmail({"hold", two}).status, VlMail::FAILED);
-    EXPECT_EQ(complaint({"release", "none"}), "vlmail: there is no mailing none\n");
+    EXPECT_EQ(complaint({"release", "none"}), "vlmail: there is no mailing none [mailing-unknown]\n");
 }
 
 TEST_F(MailingsOfANode, AreTriedWithoutBeingHandedOver) {
@@ -955,7 +968,7 @@ TEST_F(MailingsOfANode, CannotReplaceALockedPresetBelow) {
     EXPECT_EQ(
         complaint({"settings", "set", "u=bob/a=acme", "presets", R"(pack_presets=[{"name":"Bills"}])"}),
         "vlmail: the settings \"presets\" were not changed: the pack preset \"Bills\" is locked by a=acme "
-        "(\"lock_pack_ui\"): nodes below cannot replace it\n");
+        "(\"lock_pack_ui\"): nodes below cannot replace it [setting-invalid]\n");
 }
 
 // Without a service.

@@ -111,13 +111,13 @@ TEST_F(ServedDocuments, ArePutListedReadBackAndRemoved) {
     EXPECT_EQ(complaint({"documents", "remove", "--node", "bob/acme", "Blue"}),
               "vlmail: node u=bob/a=acme has no document \"Blue\" of its own; \"vlmail documents list\" "
               "shows which "
-              "lies where\n");
+              "lies where [document-unknown]\n");
     EXPECT_EQ(output({"documents", "remove", "--node", "a=acme", "Blue"}),
               "Blue.txt is gone from a=acme, version " + version + "\n");
     EXPECT_EQ(
         complaint({"documents", "get", "--node", "a=acme", "Blue"}),
         "vlmail: there is no document \"Blue\" at a=acme and above it; \"vlmail documents list\" shows what "
-        "there is\n");
+        "there is [document-unknown]\n");
     EXPECT_EQ(output({"documents", "remove", "--node", "/", "root.txt"}).substr(0, 8), "root.txt");
     EXPECT_EQ(output({"documents", "list", "--node", "a=acme"}), "no document counts at a=acme\n");
 }
@@ -185,7 +185,8 @@ TEST_F(ServedDocuments, ArePlannedByTheirDigests) {
         complaint({"mail", "--plan", path("plan.json"), "-o", path("out")}),
         "vlmail: cannot carry out the plan: \"service:a=acme/blue.txt\": the service has no document of the "
         "digest " +
-            planned + " any more: it was replaced or removed; make it again with vlmail plan\n");
+            planned +
+            " any more: it was replaced or removed; make it again with vlmail plan [plan-outdated]\n");
 }
 
 TEST_F(ServedDocuments, ArePlannedWithTheSettingsOfTheirNode) {
@@ -234,21 +235,23 @@ TEST_F(ServedDocuments, AreRefusedInALineWithWhatToDo) {
     EXPECT_THAT(complaint({"documents", "put", "--node", "a=acme", path("cut.pdf")}),
                 testing::MatchesRegex("vlmail: document-damaged: .*cut.pdf: [^\n]*; [^\n]*\n"));
     EXPECT_EQ(complaint({"documents", "put", "--node", "a=acme", path("empty.pdf")}),
-              "vlmail: document-damaged: " + path("empty.pdf") + ": is empty; export the document again\n");
+              "vlmail: document-damaged: " + path("empty.pdf") +
+                  ": is empty; export the document again [document-unreadable]\n");
     EXPECT_THAT(complaint({"documents", "put", "--node", "a=acme", path("gone.pdf")}),
                 StartsWith("vlmail: document-unknown: "));
     EXPECT_EQ(complaint({"documents", "put", "--node", "a=acme", "../up", path("blue.txt")}),
               "vlmail: the document \"../up.txt\" was not stored: that cannot be the name of a document; "
               "choose one "
-              "without / \\ : * ? \" < > |, control characters and a dot in front, of at most 200 bytes\n");
+              "without / \\ : * ? \" < > |, control characters and a dot in front, of at most 200 bytes "
+              "[document-unreadable]\n");
     EXPECT_EQ(
         complaint({"documents", "put", "--node", "nobody/acme", path("blue.txt")}),
         "vlmail: there is no node u=nobody/a=acme; correct the id, or set something at it first (\"vlmail "
-        "settings set\")\n");
+        "settings set\") [node-unknown]\n");
     fs::resize_file(path("empty.pdf"), Protocol::MAX_DOCUMENT_BYTES + 1);
     EXPECT_EQ(complaint({"documents", "put", "--node", "a=acme", path("empty.pdf")}),
               "vlmail: document-size: " + path("empty.pdf") +
-                  ": has more than 64 MiB; leave out what is not to be printed\n");
+                  ": has more than 64 MiB; leave out what is not to be printed [document-unreadable]\n");
     EXPECT_EQ(output({"documents", "list", "--node", "a=acme"}), "no document counts at a=acme\n");
 }
 
