@@ -102,7 +102,7 @@ void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant co
         cmd->accept(*this);
     } catch (std::exception const& failure) {
         failed = Base::codedLine(failure);
-        noteRefusal(failed);
+        noteRefusal(failure.what());
     }
     if (auto const unfinished = std::exchange(done_, {}))
         unfinished(failed);
