@@ -124,6 +124,11 @@ bool isKnownState(std::string const& state) {
     return states.contains(state);
 }
 
+/// Behind the line of a failure its code may stand.
+bool saysTheSame(std::string const& before, std::string const& now) {
+    return now == before || (now.starts_with(before + " [") && now.find(']') == now.size() - 1);
+}
+
 std::string whatIsMissing(json::Value const& before, json::Value const& now, std::string const& where = "");
 
 std::string missingInObject(json::Object const& before, json::Object const& now, std::string const& where) {
@@ -131,7 +136,11 @@ std::string missingInObject(json::Object const& before, json::Object const& now,
         std::string const name = key;
         json::Value const found = now.get(key);
         std::string why;
-        if (name == "state")
+        if (name == "err")
+            why = found && saysTheSame(value.textOrEmpty(), found.textOrEmpty())
+                      ? ""
+                      : where + "/err is " + print(found);
+        else if (name == "state")
             why = isKnownState(found.textOrEmpty()) ? "" : "the state \"" + found.textOrEmpty() + '"';
         else if (!isOfTheMoment(name, value))
             why = whatIsMissing(value, found, where + '/' + name);

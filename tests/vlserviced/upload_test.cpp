@@ -339,7 +339,7 @@ TEST_F(SendingFiles, TellsEachThatCannotBeSent) {
     EXPECT_EQ(ran.status, VlMail::FAILED);
     EXPECT_EQ(ran.out, "m1, queued\n");
     EXPECT_THAT(ran.err, HasSubstr("vlmail: cannot send \"" + bad + "\": "));
-    EXPECT_THAT(ran.err, HasSubstr("; \"vlmail pack verify\" tells all that is damaged\n"));
+    EXPECT_THAT(ran.err, HasSubstr("; \"vlmail pack verify\" tells all that is damaged [mailing-damaged]\n"));
     EXPECT_THAT(ran.err, HasSubstr("vlmail: cannot read \"/missing.mailing\": "));
     EXPECT_THAT(vlmail({"send", good, "--node", "other"}).err,
                 HasSubstr("there is another pack m1 with other pages: give this one an id of its own"));

@@ -28,7 +28,6 @@ namespace fs = std::filesystem;
 using testing::ElementsAre;
 using testing::EndsWith;
 using testing::HasSubstr;
-using testing::IsEmpty;
 using testing::Not;
 using testing::Pair;
 using testing::StartsWith;
