@@ -121,6 +121,8 @@ TEST(TheCommandsWhoseCallsFail, AreAllOfVlMail) {
     // What it does of its own is reading, as pack verify does; its way to the service is that of
     // MailThatIsSent.
     missing.erase("send");
+    // It serves until it is ended, by workers that read as those of a batch do.
+    missing.erase("workbench");
     EXPECT_GT(all.size(), 20u);
     EXPECT_THAT(missing, testing::IsEmpty());
 }

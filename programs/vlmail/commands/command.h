@@ -41,6 +41,7 @@ void addStrandedCommands(Base::Command const& app, Task& task);
 void addStatusCommand(Base::Command const& app, Task& task);
 void addTokenCommand(Base::Command const& app, Task& task);
 void addUploadCommand(Base::Command const& app, Task& task);
+void addWorkbenchCommand(Base::Command const& app, Task& task);
 
 /// The line of a run that ends because memory does; it is written as it stands, without taking any.
 extern char const OUT_OF_MEMORY[];

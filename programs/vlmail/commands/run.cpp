@@ -40,6 +40,7 @@ void addCommands(Base::Command const& command, Task& task) {
     addStrandedCommands(command, task);
     addTokenCommand(command, task);
     addUploadCommand(command, task);
+    addWorkbenchCommand(command, task);
     addHelpCommand(command, task);
 }
 

@@ -46,6 +46,7 @@ constexpr Manual::Topic TOPICS[] = {
     {"token add", CLIENT, "Access tokens"},
     {"token list", CLIENT, "Access tokens"},
     {"token revoke", CLIENT, "Access tokens"},
+    {"workbench", "workbench.md", ""},
     // Beside the commands.
     {Manual::EXIT_STATUS, LETTERS, "Exit status"},
     {"carriers-documents", "carriers.md", ""},

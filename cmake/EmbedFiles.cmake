@@ -1,0 +1,11 @@
+# cmake -DOUT=FILE.cpp -DFILES=A.html,B.js -P EmbedFiles.cmake: the files of the workbench's page as constants of a program.
+string(REPLACE "," ";" files "${FILES}")
+set(text "#include \"programs/vlmail/workbench/page_files.h\"\n\nnamespace VlMail::Workbench {\nnamespace {\n\n")
+string(APPEND text "using namespace std::string_view_literals;\n\nconstexpr PageFile FILES[] = {\n")
+foreach(file ${files})
+    get_filename_component(name "${file}" NAME)
+    file(READ "${file}" content)
+    string(APPEND text "{\"${name}\"sv, R\"FILE(${content})FILE\"sv},\n")
+endforeach()
+string(APPEND text "};\n\n} // namespace\n\nstd::span<PageFile const> embeddedFiles() { return FILES; }\n\n} // namespace VlMail::Workbench\n")
+file(WRITE "${OUT}" "${text}")
