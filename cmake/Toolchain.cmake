@@ -39,6 +39,9 @@ if(VLSERVICE_SANITIZE AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     # The instrumentation makes g++ see uninitialised values where there are none.
     target_compile_options(vlservice_warnings INTERFACE -Wno-maybe-uninitialized)
 endif()
+if(CMAKE_CXX_COMPILER_ID STREQUAL "Clang")
+    target_compile_options(vlservice_warnings INTERFACE -Wreserved-identifier)
+endif()
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
     # Optimising, g++ 12 takes `"literal" + text` for a copy between overlapping blocks.
     target_compile_options(vlservice_warnings INTERFACE -Wno-restrict)
