@@ -1,0 +1,175 @@
+// What is open: the documents, the settings with their history, and what reading by them has given. Whoever shows a
+// part of it listens; nobody else keeps a copy.
+import { History } from "./history.js";
+
+/**
+ * What happens, and what has changed then: "text" the settings' text, "saved" what it is compared with, "documents"
+ * their list, "document" which one is open, "page" which page of it, "evaluation" what reading it gave, "verdicts" those
+ * of the others, "choice" what is chosen on the page, "message" what there is to say.
+ */
+export class Session extends EventTarget {
+    constructor() {
+        super();
+        /** @type {{name: string, size: number, golden: boolean}[]} */
+        this.documents = [];
+        /** Of the settings: kind, name, and the version that was read. */
+        this.settings = { kind: "none", name: "", version: "" };
+        /** As read or written last. */
+        this.savedText = "";
+        /** What verdicts are compared with. */
+        this.baseline = "";
+        this.history = new History("");
+        this.document = "";
+        this.page = 1;
+        /** The last one of settings that could be read; null before. */
+        this.evaluation = null;
+        /** The settings' text that it is of. */
+        this.evaluatedText = "";
+        /** What is no JSON in the text as it is; null when all is. */
+        this.broken = null;
+        this.lint = [];
+        /** @type {Map<string, object>} by document */
+        this.verdicts = new Map();
+        /** A zone and perhaps a field of it, by their places in the settings. */
+        this.choice = "";
+    }
+
+    /** @param {string} what */
+    tell(what, detail = undefined) {
+        this.dispatchEvent(new CustomEvent(what, { detail }));
+    }
+
+    /**
+     * @param {string} whats  separated by blanks
+     * @param {(detail: *) => void} listener
+     */
+    on(whats, listener) {
+        for (const what of whats.split(" "))
+            this.addEventListener(what, (event) => listener(event.detail));
+    }
+
+    get text() {
+        return this.history.text;
+    }
+
+    get isChanged() {
+        return this.text !== this.savedText;
+    }
+
+    /** @returns {boolean} whether the evaluation is of the settings as they are */
+    get isCurrent() {
+        return this.evaluation !== null && this.evaluatedText === this.text;
+    }
+
+    /** Takes over what the program has told at the start. */
+    begin(state) {
+        this.settings = state.settings;
+        this.savedText = this.baseline = state.settings.text;
+        this.history.restart(state.settings.text);
+        this.documents = state.documents;
+        this.tell("documents");
+        this.tell("text");
+    }
+
+    /**
+     * @param {string} text
+     * @param {string} says  what was done, for the names of undo and redo
+     * @param {string} kind  as of History.add()
+     */
+    change(text, says, kind = "") {
+        if (text === this.text)
+            return;
+        this.history.add(text, says, kind);
+        this.tell("text", kind);
+    }
+
+    undo() {
+        if (this.history.undo())
+            this.tell("text");
+    }
+
+    redo() {
+        if (this.history.redo())
+            this.tell("text");
+    }
+
+    saved({ text, version }) {
+        this.settings = { ...this.settings, version };
+        this.savedText = text;
+        this.tell("saved");
+    }
+
+    compareWith(text) {
+        this.baseline = text;
+        this.verdicts.clear();
+        this.tell("baseline");
+        this.tell("verdicts");
+    }
+
+    open(document, page = 1) {
+        if (document === this.document)
+            return this.turnTo(page);
+        this.document = document;
+        this.page = page;
+        this.evaluation = null;
+        this.tell("document");
+        this.tell("page");
+        return undefined;
+    }
+
+    turnTo(page) {
+        if (page === this.page)
+            return;
+        this.page = page;
+        this.tell("page");
+    }
+
+    choose(choice) {
+        this.choice = choice;
+        this.tell("choice");
+    }
+
+    /** Takes an answer over; one that no document was read for has findings alone. */
+    evaluated(evaluation, text) {
+        this.broken = evaluation.broken ?? null;
+        this.lint = evaluation.lint ?? [];
+        if (!this.broken && evaluation.document) {
+            this.evaluation = evaluation;
+            this.evaluatedText = text;
+        }
+        this.tell("evaluation");
+    }
+
+    judged(verdicts) {
+        for (const verdict of verdicts)
+            this.verdicts.set(verdict.document, verdict);
+        this.tell("verdicts");
+    }
+
+    /** @param {string} text  @param {"fine"|"bad"} kind */
+    say(text, kind = "fine") {
+        this.tell("message", { text, kind });
+    }
+
+    /** @returns {object|null} the letter that the page belongs to, else the document's first */
+    get letter() {
+        const letters = this.evaluation?.letters ?? [];
+        return letters.find((letter) => letter.pages.includes(this.page)) ?? letters[0] ?? null;
+    }
+
+    /** @returns {object|null} what is drawn on the page */
+    get sheet() {
+        return this.letter?.sheets.find((sheet) => sheet.page === this.page) ?? null;
+    }
+
+    /** @returns {object|null} the zone of the letter that stands there in the settings */
+    zoneAt(pointer) {
+        return this.letter?.zones.find((zone) => zone.pointer && pointer.startsWith(zone.pointer) &&
+            /^(\/|$)/.test(pointer.slice(zone.pointer.length))) ?? null;
+    }
+
+    /** @returns {string} the part "presets" among the settings */
+    get presetPointer() {
+        return this.evaluation?.extract_preset?.pointer ?? "";
+    }
+}

@@ -1,0 +1,59 @@
+"""What the browser tests share: arguments, the browser, a workbench for each test, pictures of the page."""
+import os
+import sys
+import unittest
+
+import workbench_page as at
+
+VLMAIL, EXAMPLES, PICTURES = sys.argv[1:4]
+THE_BROWSER = []
+
+
+def browser():
+    """One for all tests: starting one takes longer than a test."""
+    if not THE_BROWSER:
+        THE_BROWSER.append(at.start_browser())
+    return THE_BROWSER[0]
+
+
+class BrowserTest(unittest.TestCase):
+    def setUp(self):
+        self.driver = browser()
+        at.look(self.driver)
+        self.driver.get_log("browser")
+
+    def begin(self, folder, settings="settings.json"):
+        """A workbench with a folder of its own, which is a copy of one of the examples."""
+        bench = at.Workbench(VLMAIL, os.path.join(EXAMPLES, folder), settings)
+        self.addCleanup(bench.end)
+        return bench
+
+    def open(self, folder, settings="settings.json"):
+        self.bench = self.begin(folder, settings)
+        return self.page_of(self.bench)
+
+    def page_of(self, bench):
+        page = at.Page(self.driver, bench.url).wait_until_read()
+        self.addCleanup(at.leave, self.driver)
+        return page
+
+    def write_picture(self, page, name):
+        """The picture that a page of the documents shows; it has to be there."""
+        file = os.path.join(PICTURES, name)
+        if os.environ.get("UPDATE_GOLDEN") == "1":
+            os.makedirs(PICTURES, exist_ok=True)
+            page.picture(file)
+        self.assertTrue(os.path.exists(file), "no picture %s; UPDATE_GOLDEN=1 makes it" % file)
+
+
+def main():
+    missing = at.missing_parts()
+    if missing:
+        print("no browser can be driven here: %s; scripts/setup tests installs what it takes" % missing)
+        return 77
+    try:
+        program = unittest.main("__main__", argv=sys.argv[:1] + sys.argv[4:], exit=False, verbosity=2)
+    finally:
+        for driver in THE_BROWSER:
+            driver.quit()
+    return int(not program.result.wasSuccessful())
