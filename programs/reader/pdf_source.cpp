@@ -309,9 +309,10 @@ public:
 private:
     static Picture pictureOf(poppler::image const& image) {
         Picture picture{image.width(), image.height(), {}};
+        std::size_t const rowSize = 3 * static_cast<std::size_t>(image.width());
+        picture.points.reserve(rowSize * static_cast<std::size_t>(image.height()));
         for (int row = 0; row < image.height(); ++row)
-            picture.points.append(image.const_data() + row * image.bytes_per_row(),
-                                  3 * static_cast<std::size_t>(image.width()));
+            picture.points.append(image.const_data() + row * image.bytes_per_row(), rowSize);
         return picture;
     }
 

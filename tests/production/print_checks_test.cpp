@@ -1,3 +1,4 @@
+#include "programs/production/page_ink.h"
 #include "tests/production/paper.h"
 #include "tests/support/raw_pdf.h"
 
@@ -588,6 +589,31 @@ TEST(PostalAddresses, AreThoseThatCountAndAreNoEMailAddressesAndNumbers) {
     EXPECT_EQ(addressOf({{2, "lena@example.org"}, {1, "Lena Brandt\n04109 Leipzig"}}), "");
     EXPECT_EQ(addressOf({{3, "+49 341 4711"}, {1, "Lena Brandt"}}), "");
     EXPECT_EQ(addressOf({{0, "Lena Brandt\n04109 Leipzig"}}), "");
+}
+
+/// Specks that lie one after another at every place among the bytes that are looked at together.
+TEST(Ink, IsFoundOfEverySpeckWhereverItLies) {
+    for (int i = 0; i < 24; ++i) {
+        Box const speck{8000 + 70 * i, 14000, 8000 + 70 * i + 80, 14080};
+        Reader::Document document = Reader::openDocument(a4Page(box(speck)), "a.pdf");
+        std::optional<Box> const bounds = Production::PageInk(document, 1).bounds();
+        ASSERT_TRUE(bounds) << i;
+        EXPECT_TRUE(bounds->contains(speck.centre())) << i;
+        EXPECT_LT(bounds->width(), 300) << i;
+    }
+}
+
+TEST(Ink, IsFoundInEachCornerOfAPageAndNotOnAnEmptyOne) {
+    Reader::Document empty = Reader::openDocument(a4Page(""), "a.pdf");
+    EXPECT_TRUE(Production::PageInk(empty, 1).isEmpty());
+    for (int const left : {0, 20900})
+        for (int const top : {0, 29600}) {
+            Reader::Document document =
+                Reader::openDocument(a4Page(box({left, top, left + 100, top + 100})), "a.pdf");
+            std::optional<Box> const bounds = Production::PageInk(document, 1).bounds();
+            ASSERT_TRUE(bounds) << left << ", " << top;
+            EXPECT_TRUE(bounds->contains({left + 50, top + 50})) << left << ", " << top;
+        }
 }
 
 } // namespace

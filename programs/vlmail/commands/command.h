@@ -6,6 +6,7 @@
 
 #include <functional>
 #include <string>
+#include <string_view>
 
 namespace VlMail {
 
@@ -50,7 +51,8 @@ extern char const OUT_OF_MEMORY[];
 /// std::exception. `commit` is what --version tells.
 int run(int argc, char const* const* argv, Terminal const& terminal, std::string const& commit = {});
 
-/// All that the command line knows, for the manual.
-Base::CommandInfo commandInfo();
+/// What the command line knows when `firstWord` is its first: that command and those beside it, or all, as
+/// the manual tells them.
+Base::CommandInfo commandInfo(std::string_view firstWord = {});
 
 } // namespace VlMail

@@ -5,8 +5,11 @@
 #include "programs/mailing/pack_database.h"
 #include "programs/reader/library_versions.h"
 
+#include <algorithm>
 #include <new>
 #include <ostream>
+#include <string_view>
+#include <vector>
 
 namespace VlMail {
 
@@ -16,35 +19,60 @@ char const OUT_OF_MEMORY[] =
 
 namespace {
 
-void addCommands(Base::Command const& command, Task& task) {
+constexpr char const* PROGRAM = "vlmail";
+constexpr std::string_view VERSION = "--version";
+
+/// Commands that are added together.
+struct Source {
+    std::vector<std::string_view> names;
+    void (*add)(Base::Command const& command, Task& task);
+};
+
+/// In the order of the help.
+std::vector<Source> const& sources() {
+    static std::vector<Source> const all{
+        {{"bounce"}, addBounceCommand},
+        {{"carriers"}, addCarriersCommand},
+        {{"check"}, addCheckCommand},
+        {{"discover"}, addDiscoverCommand},
+        {{"doctor"}, addDoctorCommand},
+        {{"documents"}, addDocumentsCommand},
+        {{"history"}, addHistoryCommand},
+        {{"hold", "release", "cancel"}, addJobChangeCommands},
+        {{"settle", "resend"}, addLetterChangeCommands},
+        {{"letter"}, addLetterCommand},
+        {{"mail"}, addMailCommand},
+        {{"pack"}, addPackCommand},
+        {{"plan"}, addPlanCommand},
+        {{"presets"}, addPresetsCommand},
+        {{"price"}, addPriceCommand},
+        {{"schema"}, addSchemaCommand},
+        {{"send"}, addSendCommand},
+        {{"settings"}, addSettingsCommand},
+        {{"status"}, addStatusCommand},
+        {{"resume", "discard"}, addStrandedCommands},
+        {{"token"}, addTokenCommand},
+        {{"upload"}, addUploadCommand},
+        {{"workbench"}, addWorkbenchCommand},
+    };
+    return all;
+}
+
+/// The options of all commands take longer than what is left of starting the program, so where the first word
+/// is a command's name, the others are left out, and all where it asks for the version.
+void addCommands(Base::Command const& command, Task& task, std::string_view firstWord) {
     command.requireCommand();
-    addBounceCommand(command, task);
-    addCarriersCommand(command, task);
-    addCheckCommand(command, task);
-    addDiscoverCommand(command, task);
-    addDoctorCommand(command, task);
-    addDocumentsCommand(command, task);
-    addHistoryCommand(command, task);
-    addJobChangeCommands(command, task);
-    addLetterChangeCommands(command, task);
-    addLetterCommand(command, task);
-    addMailCommand(command, task);
-    addPackCommand(command, task);
-    addPlanCommand(command, task);
-    addPresetsCommand(command, task);
-    addPriceCommand(command, task);
-    addSchemaCommand(command, task);
-    addSendCommand(command, task);
-    addSettingsCommand(command, task);
-    addStatusCommand(command, task);
-    addStrandedCommands(command, task);
-    addTokenCommand(command, task);
-    addUploadCommand(command, task);
-    addWorkbenchCommand(command, task);
+    if (firstWord == VERSION)
+        return;
+    auto const named = std::ranges::find_if(
+        sources(), [&](Source const& source) { return std::ranges::count(source.names, firstWord) != 0; });
+    if (named != sources().end())
+        return named->add(command, task);
+    for (Source const& source : sources())
+        source.add(command, task);
     addHelpCommand(command, task);
 }
 
-constexpr char const* PROGRAM = "vlmail";
 constexpr char const* DESCRIPTION =
     "Sends letters out of documents: reads them, says what was found, and packs mailings.";
 
@@ -60,7 +88,7 @@ int runPlainly(int argc, char const* const* argv, Terminal const& terminal, std:
         Base::CommandLine line(DESCRIPTION, PROGRAM);
         line.addVersion([&commit] { return versionText(commit); });
         Task task;
-        addCommands(line.command(), task);
+        addCommands(line.command(), task, argc > 1 ? argv[1] : "");
         return line.read(argc, argv, terminal.out) ? task(terminal) : FINE;
     } catch (std::bad_alloc const&) {
         throw;
@@ -85,11 +113,11 @@ int runAndFlush(int argc, char const* const* argv, Terminal const& terminal, std
 
 } // namespace
 
-Base::CommandInfo commandInfo() {
+Base::CommandInfo commandInfo(std::string_view firstWord) {
     Base::CommandLine line(DESCRIPTION, PROGRAM);
     line.addVersion([] { return std::string(); });
     Task task;
-    addCommands(line.command(), task);
+    addCommands(line.command(), task, firstWord);
     return line.command().info();
 }
 
