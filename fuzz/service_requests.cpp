@@ -46,12 +46,13 @@ struct MemoryService {
                                      [](VlServiced::JobSurroundings::Work const& work) { work(); },
                                      [] { return 1LL; }, [](std::string const&) { return std::nullopt; },
                                      [](std::string const&) { return false; }}};
+    VlServiced::LetterRegister letterRegister{database};
     VlServiced::TokenStore tokenStore{database};
     VlServiced::TokenService tokens{tokenStore, std::string(32, 't'), [] { return 1LL; }, history};
     VlServiced::Access access{[] { return 1LL; }};
     std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, documents, tokens, access, history, jobs, runner, letterRunner, packs, "/missing/outbox",
-        [] { return 1LL; }, [] { return Protocol::HealthAnswer(); });
+        settings, documents, tokens, access, history, jobs, runner, letterRunner, packs, letterRegister,
+        "/missing/outbox", [] { return 1LL; }, [] { return Protocol::HealthAnswer(); });
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

@@ -37,6 +37,10 @@ std::string sha256(std::string_view bytes) {
     return toHex(digest.data(), size);
 }
 
+bool isSha256(std::string_view text) {
+    return text.size() == SHA256_DIGITS && text.find_first_not_of("0123456789abcdef") == text.npos;
+}
+
 void Sha256::Release::operator()(void* context) const { EVP_MD_CTX_free(static_cast<EVP_MD_CTX*>(context)); }
 
 Sha256::Sha256() {

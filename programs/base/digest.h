@@ -1,6 +1,7 @@
 #pragma once
 // Fingerprints by which changed files are noticed.
 
+#include <cstddef>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -11,8 +12,12 @@ namespace Base {
 /// call of anything. Throws std::bad_alloc then.
 void requireCrypto();
 
+constexpr std::size_t SHA256_DIGITS = 64;
+
 /// SHA-256 in hexadecimal, 64 lower-case digits.
 std::string sha256(std::string_view bytes);
+/// Whether a text is written as one.
+bool isSha256(std::string_view text);
 
 /// The same over what comes in pieces.
 class Sha256 {

@@ -66,6 +66,7 @@ constexpr std::array ROWS{
             "A letter does not have what its way out needs, a field or an address"},
     CodeRow{Code::StateRefused, "state-refused",
             "It is too late for that, or too early: the mailing or the letter is in another state"},
+    CodeRow{Code::SentBefore, "sent-before", "The same letters went out before"},
     CodeRow{Code::QuotaExceeded, "quota-exceeded", "The node has as many packs with the service as it may"},
     CodeRow{Code::CarrierUnknown, "carrier-unknown", "There is no carrier of that channel"},
     CodeRow{Code::CarrierUnavailable, "carrier-unavailable", "A way out cannot be had at the moment"},

@@ -50,6 +50,7 @@ enum class Code {
     LetterUnknown,
     LetterUnsuitable,
     StateRefused,
+    SentBefore,
     QuotaExceeded,
     CarrierUnknown,
     CarrierUnavailable,

@@ -28,6 +28,7 @@ constexpr char const* MADE_READY_KEY = "made_ready";
 constexpr char const* USED_DOCUMENTS_KEY = "used_documents";
 constexpr char const* SHA256_KEY = "sha256";
 constexpr char const* ENTRIES_DIGEST_KEY = "entries_digest";
+constexpr char const* DIGESTS_KEY = "digests";
 
 using Role = DocumentPages::Role;
 
@@ -113,6 +114,16 @@ constexpr Base::JsonRow<MailedLetter> LETTER_ROWS[] = {
      [](json::Value const& node, MailedLetter& letter) {
          letter.fields = Cfg::ExtractedFields(node.toArray());
      }},
+    {DIGESTS_KEY, Presence::WhenThere, [] { return Schema::listOf(Schema::text()); },
+     [](MailedLetter const& letter) {
+         return letter.digests.empty()
+                    ? json::Value()
+                    : json::Value(json::Form<std::vector<std::string>>::write(letter.digests));
+     },
+     [](json::Value const& node, MailedLetter& letter) {
+         if (node.isArray())
+             letter.digests = json::Form<std::vector<std::string>>::read(node);
+     }},
 };
 
 /// Where the mailing is made ready.
@@ -188,6 +199,9 @@ constexpr Base::JsonRow<Metadata> ROWS[] = {
     {PURCHASE_ORDER_KEY, Presence::WhenThere, &Schema::text,
      [](Metadata const& metadata) { return unlessEmpty(metadata.purchaseOrder); },
      [](json::Value const& node, Metadata& metadata) { metadata.purchaseOrder = node.textOrEmpty(); }},
+    {AGAIN_KEY, Presence::WhenThere, &Schema::text,
+     [](Metadata const& metadata) { return unlessEmpty(metadata.again); },
+     [](json::Value const& node, Metadata& metadata) { metadata.again = node.textOrEmpty(); }},
 };
 
 constexpr char const* PACK_PRESET_KEY = "pack_preset";

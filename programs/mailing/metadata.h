@@ -39,6 +39,9 @@ struct MailedLetter {
     long long sheets = 0;
     /// Of the pages that are printed in colour, where the mailing is made ready.
     long long colouredPages = 0;
+    /// Of each letter that goes out in it, by which the service knows it again: 64 hexadecimal digits; none
+    /// in older mailings.
+    std::vector<std::string> digests = {};
 };
 
 /// The channel that a letter goes by first: the name of its primary address, empty without one.
@@ -56,10 +59,11 @@ struct UsedDocument {
 inline constexpr char const* EXTRACTED_FIELD = "extracted_field";
 
 inline constexpr char const* PURCHASE_ORDER_KEY = "purchase_order";
+inline constexpr char const* AGAIN_KEY = "again";
 
 /// In JSON one object: the pack preset in its embedded form, which names it under "pack_preset", and beside
-/// its keys "id", "created", "letters", "made_ready", "used_documents", "entries_digest" and
-/// "purchase_order".
+/// its keys "id", "created", "letters", "made_ready", "used_documents", "entries_digest",
+/// "purchase_order" and "again".
 struct Metadata {
     std::string id;
     /// Seconds since the epoch, UTC.
@@ -74,6 +78,8 @@ struct Metadata {
     /// nobody lays a letterhead on them or adds an attachment. Older mailings are not.
     bool madeReady = false;
     std::vector<UsedDocument> usedDocuments = {};
+    /// Why its letters go out although they did before; empty where they are not to.
+    std::string again = {};
 
     json::Object toJson() const;
     /// Throws std::exception when a key has not the form above.

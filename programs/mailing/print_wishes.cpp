@@ -26,6 +26,9 @@ PrintWishes PrintWishes::of(Cfg::PackPreset const& preset) {
     wishes.height = numberIn(sheet, HEIGHT, MAX_LENGTH);
     if (int const copies = numberIn(production, COPIES, MAX_COPIES))
         wishes.copies = copies;
+    json::Value const days = production.get(DUPLICATE_DAYS);
+    if (days.isInt() && days.toInt() >= 0 && days.toInt() <= MAX_DUPLICATE_DAYS)
+        wishes.duplicateDays = static_cast<int>(days.toInt());
     return wishes;
 }
 

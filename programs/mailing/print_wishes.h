@@ -1,5 +1,5 @@
 #pragma once
-// How a pack preset wants its letters printed, as far as a printer is told.
+// How a pack preset wants its letters printed, as far as a printer is told, and how often.
 
 #include "vlservice/presets/pack_preset.h"
 
@@ -16,12 +16,17 @@ struct PrintWishes {
     static constexpr char const* WIDTH = "width";
     static constexpr char const* HEIGHT = "height";
     static constexpr char const* COPIES = "copies";
+    static constexpr char const* DUPLICATE_DAYS = "duplicate_days";
     static constexpr int MAX_COPIES = 99;
+    static constexpr int MAX_DUPLICATE_DAYS = 3650;
+    static constexpr int DUPLICATE_DAYS_UNLESS_SET = 90;
 
     /// Of the sheet, in 1/100 mm; 0 where the preset says nothing.
     int width = 0;
     int height = 0;
     int copies = 1;
+    /// For how long a letter does not go out a second time; 0 is not at all.
+    int duplicateDays = DUPLICATE_DAYS_UNLESS_SET;
 
     /// What cannot be used counts as not said.
     static PrintWishes of(Cfg::PackPreset const& preset);

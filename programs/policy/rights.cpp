@@ -8,6 +8,7 @@
 #include "programs/protocol/history.h"
 #include "programs/protocol/job.h"
 #include "programs/protocol/letter.h"
+#include "programs/protocol/letter_register.h"
 #include "programs/protocol/pack_upload.h"
 #include "programs/protocol/settings.h"
 #include "vlservice/cfg/cfg_node_id.h"
@@ -75,6 +76,7 @@ constexpr QuestionRight OF_QUESTIONS[] = {
     {Protocol::LetterChange::KIND, {Role::Send, Place::Anywhere}},
     {Protocol::DeliveryReport::KIND, {Role::Send, Place::Anywhere}},
     {Protocol::BeginPack::KIND, {Role::Send, Place::Node}},
+    {Protocol::RegisterQuery::KIND, {Role::Send, Place::Node}},
     {Protocol::CarriersQuery::KIND, {Role::Admin, Place::Root}},
     {Protocol::CarrierChange::KIND, {Role::Admin, Place::Root}},
     {Protocol::HealthQuery::KIND, {Role::Admin, Place::Root}},

@@ -31,8 +31,9 @@ constexpr char const* POSTCODE = "postcode";
 constexpr char const* REPAIR = "repair";
 constexpr char const* COPIES = PrintWishes::COPIES;
 constexpr char const* FALLBACK = Mailing::FALLBACK;
+constexpr char const* DUPLICATE_DAYS = PrintWishes::DUPLICATE_DAYS;
 constexpr std::array KEYS{SHEET,    WINDOW, CLEAR_ZONES, TOLERANCE, ADDRESS_LINES,
-                          POSTCODE, REPAIR, COPIES,      FALLBACK};
+                          POSTCODE, REPAIR, COPIES,      FALLBACK,  DUPLICATE_DAYS};
 
 constexpr char const* WIDTH = PrintWishes::WIDTH;
 constexpr char const* HEIGHT = PrintWishes::HEIGHT;
@@ -86,6 +87,9 @@ public:
         if (json::Value const copies = object.get(COPIES))
             number(copies, {COPIES}, 1, PrintWishes::MAX_COPIES);
         checkFallback(object.get(FALLBACK));
+        // The register of letters goes by it.
+        if (json::Value const days = object.get(DUPLICATE_DAYS))
+            number(days, {DUPLICATE_DAYS}, 0, PrintWishes::MAX_DUPLICATE_DAYS);
         return rules;
     }
 
@@ -311,6 +315,8 @@ json::Object ProductionRules::schema() {
         .add(REPAIR, repair)
         .add(COPIES, Schema::with(Schema::integer(1, PrintWishes::MAX_COPIES), "default", 1))
         .add(FALLBACK, Schema::listOfAtMost(Protocol::channelNameSchema(), Mailing::MAX_FALLBACKS))
+        .add(DUPLICATE_DAYS, Schema::with(Schema::integer(0, PrintWishes::MAX_DUPLICATE_DAYS), "default",
+                                          PrintWishes::DUPLICATE_DAYS_UNLESS_SET))
         .schema();
 }
 

@@ -7,6 +7,7 @@
 #include "programs/protocol/failure.h"
 #include "programs/protocol/query.h"
 #include "programs/vlserviced/jobs/job_list.h"
+#include "programs/vlserviced/jobs/known_letters.h"
 #include "programs/vlserviced/settings/estimate.h"
 #include "vlservice/ipc/cfg_ids_for_user.h"
 #include "vlservice/ipc/cfg_ids_tree.h"
@@ -58,11 +59,12 @@ Protocol::TreeNode coveredOf(Protocol::TreeNode tree, Policy::Grant const& by) {
 
 Processor::Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens,
                      Access& access, History& history, JobStore& jobs, JobRunner& runner,
-                     LetterRunner& letters, PackReception& packs, std::filesystem::path outbox,
-                     std::function<long long()> now, std::function<Protocol::HealthAnswer()> health)
+                     LetterRunner& letters, PackReception& packs, LetterRegister const& letterRegister,
+                     std::filesystem::path outbox, std::function<long long()> now,
+                     std::function<Protocol::HealthAnswer()> health)
     : settings_(settings), documents_(documents), tokens_(tokens), access_(access), history_(history),
-      jobs_(jobs), runner_(runner), letters_(letters), packs_(packs), outbox_(std::move(outbox)),
-      now_(std::move(now)), health_(std::move(health)) {}
+      jobs_(jobs), runner_(runner), letters_(letters), packs_(packs), letterRegister_(letterRegister),
+      outbox_(std::move(outbox)), now_(std::move(now)), health_(std::move(health)) {}
 
 /// The line for "err": empty when the operation succeeds.
 template<typename Operation>
@@ -209,6 +211,12 @@ std::vector<Processor::Question> const& Processor::answerers() {
          [](Processor& self, json::Object const& question) {
              return self.settings_.impact(SettingsImpactQuery(question)).serialize();
          }},
+        {RegisterQuery::KIND,
+         [](Processor& self, json::Object const& question) {
+             return knownLetters(RegisterQuery(question), self.letterRegister_, self.jobs_,
+                                 self.letters_.store(), self.now_(), self.by_)
+                 .serialize();
+         }},
         {BeginPack::KIND, nullptr},
     };
     return all;
@@ -229,7 +237,7 @@ json::Object Processor::answer(json::Object const& question) {
             return known.answer(*this, question);
         all += (all.empty() ? "" : ", ") + std::string(known.kind);
     }
-    throw Base::Error(Base::Code::RequestInvalid, "there is no query \"" + kind + "\"; there are " + all);
+    throw Base::Error(Base::Code::ServiceOutdated, "there is no query \"" + kind + "\"; there are " + all);
 }
 
 json::Object Processor::changeJobs(Protocol::JobsChange const& change) {

@@ -11,6 +11,7 @@
 #include "programs/vlserviced/settings/document_service.h"
 #include "programs/vlserviced/settings/settings_service.h"
 #include "programs/vlserviced/settings/token_service.h"
+#include "programs/vlserviced/store/letter_register.h"
 #include "vlservice/ipc/cmd_processor_vlsvc.h"
 #include "vlservice/ipc/set_part_base.h"
 
@@ -29,8 +30,8 @@ public:
     /// All have to outlive the processor.
     Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens, Access& access,
               History& history, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
-              PackReception& packs, std::filesystem::path outbox, std::function<long long()> now,
-              std::function<Protocol::HealthAnswer()> health);
+              PackReception& packs, LetterRegister const& letterRegister, std::filesystem::path outbox,
+              std::function<long long()> now, std::function<Protocol::HealthAnswer()> health);
 
     /// Notes refusals from here on; the measures have to outlive the processor.
     void countIn(Measures& measures) { measures_ = &measures; }
@@ -95,6 +96,7 @@ private:
     JobRunner& runner_;
     LetterRunner& letters_;
     PackReception& packs_;
+    LetterRegister const& letterRegister_;
     std::filesystem::path outbox_;
     std::function<long long()> now_;
     std::function<Protocol::HealthAnswer()> health_;

@@ -649,7 +649,9 @@ private:
                     return pack.isWithService() ? packStore_->open(pack.packId) : localPacks_.open(pack);
                 },
                 history_,
-                took_};
+                took_,
+                &letterRegister_,
+                [this](std::string const& packId) { packs_.drop(packId); }};
     }
 
     LetterSurroundings letterSurroundings() {
@@ -716,6 +718,7 @@ private:
     DocumentService documents_{documentStore_, store_, settings_, &now, history_};
     JobStore jobs_;
     LetterStore letters_{*opened_.connection, jobs_};
+    LetterRegister letterRegister_{*opened_.connection};
     LocalPacks localPacks_;
     std::shared_ptr<PackStore> packStore_;
     OwnToken ownToken_;
@@ -734,11 +737,11 @@ private:
     HeldQueries held_{io_, jobs_};
     LetterRunner letterRunner_{letters_, jobs_, letterSurroundings()};
     JobRunner runner_{jobs_, surroundings()};
-    Retention retention_{jobs_, outbox_, [this] { return settings_.service(); }, &now};
+    Retention retention_{jobs_, letterRegister_, outbox_, [this] { return settings_.service(); }, &now};
     PackReception packs_{packStore_, jobs_, receptionSurroundings()};
     std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(
-        settings_, documents_, tokens_, access_, history_, jobs_, runner_, letterRunner_, packs_, outbox_,
-        &now, [this] { return healthOf(healthSources()); });
+        settings_, documents_, tokens_, access_, history_, jobs_, runner_, letterRunner_, packs_,
+        letterRegister_, outbox_, &now, [this] { return healthOf(healthSources()); });
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};

@@ -34,8 +34,10 @@ auto after(Arguments const& arguments) {
 
 std::string mailed(ServiceAtHand const& service) {
     static std::regex const id("[0-9]{8}T[0-9]{6}Z-[0-9a-f]{8}");
-    std::string const out =
-        service.vlmail({"mail", "letter.txt", "--send", "--node", "a=acme", "--jobs", "1"}).out;
+    std::string const out = service
+                                .vlmail({"mail", "letter.txt", "--send", "--again", "a further try", "--node",
+                                         "a=acme", "--jobs", "1"})
+                                .out;
     std::smatch found;
     return std::regex_search(out, found, id) ? found.str() : "";
 }

@@ -1,6 +1,10 @@
 #include "tests/faults/sent_mail.h"
 
+#include "programs/base/read_file.h"
+
 #include <chrono>
+#include <filesystem>
+#include <fstream>
 #include <iterator>
 #include <regex>
 #include <utility>
@@ -31,7 +35,16 @@ std::vector<std::string> SentMail::run(Fault const& fault) {
     return std::exchange(findings_, {});
 }
 
-Ended SentMail::send(Fault const& fault) const {
+/// One that nobody had before.
+void SentMail::writeNewLetter() {
+    std::filesystem::path const file = service_.folder() / "letter.txt";
+    if (letter_.empty())
+        letter_ = Base::readFile(file);
+    std::ofstream(file) << letter_ << "Letter " << ++letters_ << '\n';
+}
+
+Ended SentMail::send(Fault const& fault) {
+    writeNewLetter();
     return service_.vlmail({"mail", "letter.txt", "--send", "--node", "a=acme", "--jobs", "1"}, fault);
 }
 

@@ -5,6 +5,8 @@
 #include "tests/faults/service_at_hand.h"
 
 #include <set>
+#include <string>
+#include <vector>
 
 namespace Faults {
 
@@ -18,7 +20,8 @@ public:
     std::vector<std::string> run(Fault const& fault);
 
 private:
-    Ended send(Fault const& fault) const;
+    Ended send(Fault const& fault);
+    void writeNewLetter();
     void check(Ended const& ended);
     void resumeStranded();
     /// The ids of all mailings, once the service has fetched them.
@@ -29,6 +32,9 @@ private:
     /// Those of the runs before.
     std::multiset<std::string> before_;
     std::vector<std::string> findings_;
+    /// As it was at first.
+    std::string letter_;
+    long letters_ = 0;
 };
 
 } // namespace Faults

@@ -51,6 +51,7 @@ std::map<std::string, Row> const OF_QUESTIONS{
     {"health", {"admin", "root"}},
     {"history", {"admin", "any"}},
     {"settings_impact", {"settings", "node"}},
+    {"register", {"send", "node"}},
 };
 
 std::map<int, Row> const OF_COMMANDS{

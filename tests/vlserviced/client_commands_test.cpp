@@ -756,8 +756,9 @@ protected:
                    R"("send_to_server": true}]}]}], "pack_presets": [{"name": "Bills", "title": "Bills")" +
                        (keys.empty() ? "" : ", " + keys) + "}]}")});
     }
-    /// Mails a letter; the mailing's id.
+    /// Mails a letter that nobody had before; the mailing's id.
     std::string mail(std::vector<std::string> const& more = {}) {
+        write("a.txt", "To: Ada\nLetter " + std::to_string(++letters_) + '\n');
         std::vector<std::string> arguments{"mail", "--send", "--node", "u=bob/a=acme", "--json", letter_};
         arguments.insert(arguments.end(), more.begin(), more.end());
         json::Object const mailed = parse(output(arguments));
@@ -777,6 +778,7 @@ protected:
 
     fs::path upload_ = folder_ / "upload";
     std::string letter_;
+    int letters_ = 0;
 };
 
 TEST_F(MailingsOfANode, AreSentByTokensThatMaySendForIt) {

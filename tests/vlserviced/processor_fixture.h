@@ -60,6 +60,7 @@ protected:
     VlServiced::DocumentService documents_{documentStore_, store_, settings_, [] { return 1000LL; },
                                            history_};
     VlServiced::JobStore jobs_{*database_};
+    VlServiced::LetterRegister register_{*database_};
     VlServiced::LetterStore letters_{*database_, jobs_};
     VlServiced::LetterSurroundings letterSurroundings() {
         VlServiced::LetterSurroundings all{
@@ -84,6 +85,7 @@ protected:
             outbox_,
         };
         all.recorder = history_;
+        all.letterRegister = &register_;
         return all;
     }
     VlServiced::JobRunner runner_{jobs_, jobSurroundings()};
@@ -99,6 +101,6 @@ protected:
     VlServiced::TokenService tokens_{tokenStore_, std::string(32, 't'), [] { return 1000LL; }, history_};
     VlServiced::Access access_{[] { return 1000LL; }};
     std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, tokens_, access_, history_, jobs_, runner_, carriers_, packs_, outbox_,
-        [] { return 1000LL; }, [] { return Protocol::HealthAnswer(); });
+        settings_, documents_, tokens_, access_, history_, jobs_, runner_, carriers_, packs_, register_,
+        outbox_, [] { return 1000LL; }, [] { return Protocol::HealthAnswer(); });
 };

@@ -1,7 +1,10 @@
 // Pages on their way to the service: from any machine, through broken connections and killed programs.
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
+#include "programs/base/read_file.h"
 #include "programs/channel/stream.h"
 #include "programs/mailing/container_writer.h"
+#include "programs/mailing/metadata.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
 #include "tests/channel/test_certificate.h"
@@ -14,11 +17,14 @@
 #include "vlservice/ipc/cs_config_ids_list.h"
 #include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/set_svc_cfg.h"
+#include "vlservice/platform/local_time.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <csignal>
+#include <ctime>
 #include <fstream>
 #include <sys/wait.h>
 #include <thread>
@@ -379,8 +385,8 @@ TEST_F(SendingLetters, GoesOnWithARunThatWasNotFinished) {
     EXPECT_EQ(idIn(output(mailing())), left.front().info.id);
     EXPECT_TRUE(Mailing::finishedPacks(ownPacks()).empty());
     EXPECT_EQ(jobs(), 1u);
-    EXPECT_NE(idIn(output(mailing())), left.front().info.id) << "a run that was finished is no such run";
-    EXPECT_EQ(jobs(), 2u);
+    EXPECT_EQ(vlmail(mailing()).status, VlMail::INCOMPLETE) << "a run that was finished is no such run";
+    EXPECT_EQ(jobs(), 1u);
 }
 
 TEST_F(SendingLetters, SendsNothingTwiceWhenTheClientDiedBeforeItLearnedOfItsSuccess) {
@@ -409,6 +415,163 @@ TEST_F(SendingLetters, MailsOtherLettersUnderAnIdOfTheirOwn) {
     std::ofstream(folder_ / "a.txt") << "To: Eve\n";
     EXPECT_NE(idIn(output(mailing())), left);
     EXPECT_EQ(Mailing::finishedPacks(ownPacks()).front().info.id, left) << "it waits to be resumed";
+}
+
+// --- letters that were sent before
+
+class LettersSentBefore : public SendingLetters {
+protected:
+    /// As a person reads it.
+    std::vector<std::string> mailed(std::vector<std::string> const& more = {}) {
+        std::vector<std::string> arguments = mailing();
+        arguments.pop_back();
+        arguments.insert(arguments.end(), more.begin(), more.end());
+        return arguments;
+    }
+    static std::string today() {
+        std::string date = LocalTime::toText(std::time(nullptr)).substr(0, 10);
+        std::ranges::replace(date, '/', '-');
+        return date;
+    }
+    static std::string digest(int letter) { return Base::sha256("letter " + std::to_string(letter)); }
+    /// A pack whose letters have one page each, and these digests.
+    void storeLetters(std::string const& id, std::vector<int> const& letters,
+                      std::string const& preset = "") {
+        Mailing::PackDatabaseWriter writer(database_, {id, "a=acme", "Title"});
+        std::string texts;
+        int page = 0;
+        for (int const letter : letters) {
+            ++page;
+            writer.savePage("a.pdf", std::to_string(page), zipped("letter " + std::to_string(letter)));
+            texts += std::string(texts.empty() ? "" : ", ") +
+                     R"({"documents": [{"name": "a.pdf", "pages": [)" + std::to_string(page) +
+                     R"(]}], "fields": [], "digests": [")" + digest(letter) + "\"]}";
+        }
+        writer.finish(zipped("{\"pack_preset\": \"Bills\", " + preset + "\"id\": \"" + id +
+                             "\", \"created\": 1, \"letters\": [" + texts + "]}"));
+    }
+    /// Delivers it; what stayed behind.
+    std::vector<std::string> deliver(std::string const& id) {
+        std::vector<std::string> left;
+        auto toService = line();
+        try {
+            VlMail::deliverPack(toService, database_, id, false, {},
+                                [&](long long number, std::string const& why) {
+                                    left.push_back(std::to_string(number) + ": " + why);
+                                });
+        } catch (VlMail::NothingToSend const&) {
+            left.push_back("nothing is sent");
+        }
+        return left;
+    }
+};
+
+TEST_F(LettersSentBefore, StayBehindWithTheirDayTheirMailingAndItsState) {
+    std::string const id = idIn(output(mailing()));
+    Ran const again = vlmail(mailed());
+    EXPECT_EQ(again.status, VlMail::INCOMPLETE);
+    EXPECT_EQ(again.out, "left out: a.txt, page 1: sent-before: " + today() + " in " + id +
+                             ", queued\n1 document, 1 letter: 0 ready, 1 cannot go out\n");
+    EXPECT_EQ(again.err, "");
+    EXPECT_EQ(jobs(), 1u);
+}
+
+TEST_F(LettersSentBefore, GoOutAgainForAReasonThatIsOnRecord) {
+    output(mailing());
+    output(mailed({"--again", "lost in the post"}));
+    EXPECT_EQ(jobs(), 2u);
+    EXPECT_THAT(output({"history"}), HasSubstr("accepted, again: lost in the post"));
+}
+
+TEST_F(LettersSentBefore, AreOthersWhenTheySaySomethingElse) {
+    output(mailing());
+    std::ofstream(folder_ / "a.txt") << "To: Ada\n2026-11-20\n";
+    output(mailing());
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, StayBehindTheSecondTimeInOneBatch) {
+    std::ofstream(folder_ / "b.txt") << "To: Ada\n";
+    Ran const ran = vlmail(mailed({(folder_ / "b.txt").string()}));
+    EXPECT_EQ(ran.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(ran.out, HasSubstr("left out: b.txt, page 1: sent-before: in this batch, a.txt, page 1\n"));
+    EXPECT_EQ(jobs(), 1u);
+}
+
+TEST_F(LettersSentBefore, MayGoOutOnceTheirMailingWasCalledBack) {
+    output({"cancel", idIn(output(mailing()))});
+    output(mailing());
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, AreNotLookedForWithoutAReach) {
+    std::string presets = Base::readFile(folder_ / "presets.json");
+    presets.replace(presets.find(R"("title": "Bills")"), 0, R"("production": {"duplicate_days": 0}, )");
+    std::ofstream(folder_ / "presets.json") << presets;
+    output(mailing());
+    output(mailing());
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, AreLeftOutOfAPackOfWhichTheOthersGo) {
+    storeLetters("p1", {1, 2});
+    storeLetters("p2", {2, 3, 3});
+    EXPECT_TRUE(deliver("p1").empty());
+    EXPECT_THAT(deliver("p2"), testing::ElementsAre("1: sent-before: " + today() + " in p1, queued",
+                                                    "3: sent-before: letter 2 of the same mailing"));
+    PackWrapper container((data_ / "outbox/p2.mailing").string(), PackWrapper::PURPOSE_IMPORT, "");
+    EXPECT_EQ(Mailing::Metadata::fromBlob(container.inputFullMeta()).letters.size(), 1U);
+    storeLetters("p3", {3, 1});
+    EXPECT_EQ(deliver("p3").back(), "nothing is sent");
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, AreRefusedByTheServiceToAClientThatDoesNotAsk) {
+    storeLetters("p1", {1, 2});
+    storeLetters("p2", {3, 2});
+    deliver("p1");
+    Mailing::OwnPackReader pack(database_, "p2");
+    auto toService = line();
+    EXPECT_THAT(failureOf([&] { VlMail::uploadPack(toService, pack); }),
+                HasSubstr("letter 2 of pack p2 went out before: send the others without them, or all "
+                          "of them with \"--again REASON\""));
+    EXPECT_EQ(jobs(), 1u);
+    EXPECT_EQ(deliver("p2").size(), 1U) << "the same id comes with other letters";
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, AreNotThoseOfThePackItself) {
+    storeLetters("p1", {1});
+    {
+        Mailing::OwnPackReader pack(database_, "p1");
+        auto toService = line();
+        VlMail::uploadPack(toService, pack);
+    }
+    EXPECT_TRUE(deliver("p1").empty());
+    EXPECT_EQ(jobs(), 1u);
+}
+
+TEST_F(LettersSentBefore, AreNoneThatWereOnlyTried) {
+    storeLetters("p1", {1}, "\"process_mode\": 128, ");
+    storeLetters("p2", {1});
+    EXPECT_TRUE(deliver("p1").empty());
+    EXPECT_TRUE(deliver("p2").empty());
+    EXPECT_EQ(jobs(), 2u);
+}
+
+TEST_F(LettersSentBefore, StayBehindInMailingFilesToo) {
+    std::vector<std::string> const toFolder{"mail",       (folder_ / "a.txt").string(),
+                                            "--settings", (folder_ / "presets.json").string(),
+                                            "-o",         (folder_ / "out").string()};
+    output(mailing());
+    ASSERT_EQ(runVlMail(toFolder).status, VlMail::FINE);
+    fs::path const file = fs::directory_iterator(folder_ / "out")->path();
+    Ran const sent = vlmail({"send", file.string(), "--node", "a=acme"});
+    EXPECT_EQ(sent.status, VlMail::INCOMPLETE);
+    EXPECT_THAT(sent.out,
+                testing::StartsWith("left out: " + file.stem().string() + ", letter 1: sent-before: "));
+    EXPECT_EQ(output({"send", file.string(), "--node", "a=acme", "--again", "he asked for it"}),
+              file.stem().string() + ", queued\n");
 }
 
 // --- another machine

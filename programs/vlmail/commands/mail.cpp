@@ -19,7 +19,9 @@
 #include <ctime>
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <ostream>
+#include <utility>
 
 namespace VlMail {
 namespace {
@@ -36,6 +38,7 @@ struct Options {
     WorkerOptions reading;
     std::size_t checkEvery = 1;
     bool acceptJoined = false;
+    std::string again;
 
     Along::Joins joins() const { return acceptJoined ? Along::Joins::Accept : Along::Joins::Doubt; }
 };
@@ -68,6 +71,33 @@ void settleEarlier(Options const& options, BatchSources& sources) {
     }
 }
 
+/// What the service had before stays behind, unless it is to go out again. What is left of a run that was not
+/// finished is gone on with.
+class Known {
+public:
+    Known(Options const& options, BatchSources& sources) : again_(options.again) {
+        if (!options.send || !again_.empty())
+            return;
+        std::vector<std::string> begun;
+        std::string const node = options.sources.nodeId();
+        for (Mailing::StoredPack const& pack :
+             Mailing::finishedPacks(packDatabaseOf(sources.service()->client(), node)))
+            if (begun.size() < Protocol::RegisterQuery::MAX_PACKS)
+                begun.push_back(pack.info.id);
+        sent_.emplace(*sources.service(), node, std::move(begun));
+    }
+
+    void tell(Dispatch& dispatch) {
+        dispatch.sendAgain(again_);
+        if (sent_)
+            dispatch.leaveOut(*sent_);
+    }
+
+private:
+    std::string again_;
+    std::optional<SentBefore> sent_;
+};
+
 /// Prepares what the documents' pack presets name.
 MakingReady makingFor(Options const& options, BatchSources& sources, Cfg::Presets const& presets,
                       MakingReady::Colours colours) {
@@ -86,7 +116,9 @@ int mailDocuments(Options const& options, Terminal const& terminal) {
     NodeSettings const settings = sources.settings();
     Cfg::Presets const presets = settings.presets();
     MakingReady making = makingFor(options, sources, presets, MakingReady::Colours::Counted);
+    Known known(options, sources);
     Dispatch dispatch(presets, making, policiesOf(settings), destinationOf(options, sources), terminal);
+    known.tell(dispatch);
     BatchProgress progress(terminal);
     readBatch(options.files, settings, options.reading.workers(),
               {.pages = Along::Pages::Yes,
@@ -111,7 +143,9 @@ int mailPlan(Options const& options, Terminal const& terminal) {
         return sources.service()->repeat(
             [&](Channel::Client& service) { return fetchDocument(service, sha256); });
     });
+    Known known(options, sources);
     Dispatch dispatch(presets, making, policiesOf(settings), destinationOf(options, sources), terminal);
+    known.tell(dispatch);
     BatchProgress progress(terminal);
     splitBatch(plan.documents(), presets, options.reading.workers(), options.checkEvery, making, progress,
                [&](std::size_t, ReadResult result) { dispatch.take(std::move(result)); });
@@ -177,6 +211,9 @@ void addMailCommand(Base::Command const& app, Task& task) {
     auto const send =
         mail.addFlag("--send", options->send, "Gives the mailings to the service instead").excludes(output);
     mail.addFlag("--upload", options->upload, "Has the service hand the mailings on at once").needs(send);
+    mail.addOption("--again", options->again,
+                   "Sends letters that went out before, too, for this reason, which goes on record")
+        .needs(send);
     addBatchOptions(mail, *options);
     mail.addCount("--check-every", options->checkEvery,
                   "Holds each N-th page that is written against the document's; 1 is every page")

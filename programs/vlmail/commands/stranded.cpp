@@ -22,9 +22,19 @@ struct Options {
 int resume(Options const& options, Terminal const& terminal) {
     ServiceLine line = lineToService(options.service, terminal);
     std::filesystem::path const database = databaseFor(options.database, line.client());
-    Protocol::JobReport const job = deliverPack(line, database, options.pack, options.upload);
-    terminal.out << job.id << ", " << Protocol::stateName(job.state) << '\n';
-    return FINE;
+    int status = FINE;
+    auto const tellLeftOut = [&](long long number, std::string const& why) {
+        terminal.out << "left out: " << options.pack << ", letter " << number << ": " << why << '\n';
+        status = INCOMPLETE;
+    };
+    try {
+        Protocol::JobReport const job =
+            deliverPack(line, database, options.pack, options.upload, {}, tellLeftOut);
+        terminal.out << job.id << ", " << Protocol::stateName(job.state) << '\n';
+    } catch (NothingToSend const&) {
+        Mailing::removePack(database, options.pack);
+    }
+    return status;
 }
 
 int discard(Options const& options, Terminal const& terminal) {

@@ -26,6 +26,7 @@ std::string pack(ReadResult const& result) {
         for (LetterReading const& letter : *result.reading.letters) {
             put(message, letter.cover);
             put(message, letter.blobs);
+            message.put(letter.digest);
         }
     return message.take();
 }
@@ -40,6 +41,7 @@ ReadResult unpack(std::string bytes) {
         for (LetterReading& letter : *result.reading.letters) {
             letter.cover = takeBlobs(message);
             letter.blobs = takeBlobs(message);
+            letter.digest = message.text();
         }
     return result;
 }

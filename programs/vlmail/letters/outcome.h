@@ -19,6 +19,8 @@ public:
     };
 
     void count(DocumentReading const& reading);
+    /// So many of those that were ready stay behind after all.
+    void leaveOut(std::size_t letters) { readyLetters_ -= letters; }
     /// Something beside the documents failed.
     void fail() { failed_ = true; }
 

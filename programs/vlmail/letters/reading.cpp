@@ -11,9 +11,11 @@
 #include "programs/policy/limits.h"
 #include "programs/production/colour.h"
 #include "programs/production/cover_page.h"
+#include "programs/production/letter_digest.h"
 #include "programs/production/maker.h"
 #include "programs/reader/document.h"
 #include "programs/reader/letters.h"
+#include "programs/reader/page_pictures.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/node_settings.h"
@@ -392,8 +394,11 @@ public:
             return;
         try {
             addCover(letter);
+            Production::LetterDigest digest(letter.fields);
             for (int const page : letter.pages)
-                addPage(letter, page);
+                addPage(letter, page, digest);
+            if (along_.pages == Along::Pages::Yes)
+                letter.digest = digest.text();
         } catch (Unmade const& failure) {
             addTo(letter, Production::DOCUMENT_DAMAGED + Base::validUtf8(failure.what()));
         }
@@ -423,12 +428,14 @@ private:
         }
     }
 
-    void addPage(LetterReading& letter, int number) {
+    void addPage(LetterReading& letter, int number, Production::LetterDigest& digest) {
         Production::PreparedPage const content = contentOf(number);
         if (document_.isWrittenAnew(number))
             noteWrittenAnew(letter, number);
-        if (along_.pages == Along::Pages::Yes)
+        if (along_.pages == Along::Pages::Yes) {
             hold(content.pdf, letter, number);
+            describe(digest, number, content.pdf);
+        }
         int const place = static_cast<int>(letter.blobs.size()) + 1;
         PageBlob& blob = letter.blobs.emplace_back();
         blob.number = number;
@@ -447,6 +454,13 @@ private:
             content.pdf = document_.singlePagePdf(number);
         content.isColoured = countsColours_ && Production::hasColour(document_, number, content.pdf);
         return content;
+    }
+
+    /// Before anything is laid on it: what lies on all letters tells none from another.
+    void describe(Production::LetterDigest& digest, int number, std::string const& pdf) {
+        Reader::Page const& page = document_.page(number);
+        digest.add(page, page.isTyped ? std::vector<std::string>()
+                                      : Reader::pictureDigests(pdf, page.words.empty()));
     }
 
     /// What is written is held against the document before anything is laid on it.

@@ -52,6 +52,8 @@ struct LetterReading {
     std::string coverAddress = {};
     /// The cover page, when pages were asked for and there is one.
     std::vector<PageBlob> cover = {};
+    /// By which the service knows it again, where its pages were asked for; 64 hexadecimal digits.
+    std::string digest = {};
     /// What of it the settings do not allow, "code: line". It keeps the letter from going out.
     std::string refusal = {};
 

@@ -6,6 +6,7 @@
 #include "programs/mailing/fallback.h"
 #include "programs/vlmail/letters/checking.h"
 #include "programs/vlmail/letters/preset_index.h"
+#include "programs/vlmail/mailings/careful_upload.h"
 #include "programs/vlmail/terminal/text_table.h"
 #include "vlservice/json/json_form.h"
 #include "vlservice/pack/container_format.h"
@@ -91,6 +92,7 @@ void Dispatch::take(ReadResult result) {
     DocumentReading& reading = result.reading;
     requireName(reading);
     refuseLetters(reading);
+    refuseKnown(reading);
     outcome_.count(reading);
     if (reading.failed()) {
         fail(reading.document, {reading.code, reading.error});
@@ -111,6 +113,30 @@ void Dispatch::refuseLetters(DocumentReading& reading) {
             letter.refusal = policies_.whyNot(
                 sheetsOf(letter, *preset) + sheetsOf(making_.attachmentsOf(reading.packPreset), *preset),
                 *preset);
+}
+
+void Dispatch::refuseKnown(DocumentReading& reading) {
+    Cfg::PackPreset const* const preset = packPresetNamed(reading.packPreset, presets_);
+    if (!sent_ || !preset || reading.failed() || reading.isAttachment() || !looksForDuplicates(*preset))
+        return;
+    std::vector<LetterReading*> ready;
+    std::vector<std::string> digests;
+    for (LetterReading& letter : *reading.letters)
+        if (letter.whyNot().empty() && !letter.digest.empty()) {
+            ready.push_back(&letter);
+            digests.push_back(letter.digest);
+        }
+    std::map<std::string, std::string> const known = sent_->of(digests);
+    for (LetterReading* const letter : ready) {
+        if (auto const found = known.find(letter->digest); found != known.end()) {
+            letter->refusal = found->second;
+            continue;
+        }
+        auto const [first, isFirst] =
+            going_.emplace(letter->digest, reading.document + ", " + pagesInWords(letter->pages));
+        if (!isFirst)
+            letter->refusal = "sent-before: in this batch, " + first->second;
+    }
 }
 
 void Dispatch::mailLetters(DocumentReading reading) {
@@ -158,6 +184,7 @@ OutgoingMailing& Dispatch::mailingFor(std::string const& packPreset) {
     MailingBuilder& builder = mailing->builder();
     builder.useDocuments(making_.attachmentsOf(packPreset), making_.usedDocumentsOf(preset));
     builder.setPurchaseOrder(policies_.purchaseOrder());
+    builder.setAgain(again_);
     builder.limitGroups([this](long long sheets) { return policies_.allows(sheets); });
     if (std::string note = policies_.noteOn(preset); !note.empty())
         notes_.push_back(std::move(note));
@@ -171,10 +198,24 @@ void Dispatch::finish() {
         try {
             mailing->finish();
             arrived_.push_back(mailing.get());
+        } catch (NothingToSend const&) {
+            // Which letters stay behind is told of each.
         } catch (std::exception const& failure) {
             outcome_.fail();
             fail(packPreset, {Base::codeOf(failure), failure.what()});
         }
+        noteLeftOut(*mailing);
+    }
+}
+
+/// Another client has sent them while this one was at it.
+void Dispatch::noteLeftOut(OutgoingMailing& mailing) {
+    for (OutgoingMailing::LeftOut const& left : mailing.leftOut()) {
+        Mailing::MailedLetter const& letter = mailing.builder().metadata().letters.at(left.index);
+        outcome_.leaveOut(letter.digests.size());
+        for (Mailing::DocumentPages const& part : letter.documents)
+            if (part.role == Mailing::DocumentPages::Role::Letter)
+                leftOut_.push_back({part.document, part.pages, left.why});
     }
 }
 

@@ -9,6 +9,7 @@
 #include "programs/vlmail/mailings/mailing_policies.h"
 #include "programs/vlmail/mailings/outgoing_mailing.h"
 #include "programs/vlmail/mailings/price.h"
+#include "programs/vlmail/mailings/sent_before.h"
 #include "programs/vlmail/terminal/terminal.h"
 
 #include <map>
@@ -24,6 +25,12 @@ public:
     /// `presets` are those that the documents were read by, `making` is what they were made ready with.
     Dispatch(Cfg::Presets const& presets, MakingReady const& making, MailingPolicies policies,
              BeginMailing begin, Terminal const& terminal);
+
+    /// Has letters stay behind that went out before, or twice in the batch; `sent` has to outlive the
+    /// dispatch.
+    void leaveOut(SentBefore& sent) { sent_ = &sent; }
+    /// Has them go out all the same, for that reason.
+    void sendAgain(std::string reason) { again_ = std::move(reason); }
 
     /// Adds a document's letters to their mailings. What cannot go out is remembered; failures are complained
     /// of.
@@ -63,6 +70,8 @@ private:
     };
 
     void refuseLetters(DocumentReading& reading);
+    void refuseKnown(DocumentReading& reading);
+    void noteLeftOut(OutgoingMailing& mailing);
     void mailLetters(DocumentReading reading);
     void noteRedrawnPages(std::string const& name, LetterReading const& letter);
     void noteNotifications(std::string const& name, LetterReading const& letter);
@@ -81,6 +90,10 @@ private:
     MakingReady const& making_;
     MailingPolicies policies_;
     BeginMailing begin_;
+    SentBefore* sent_ = nullptr;
+    std::string again_;
+    /// Letters that go out, by their digests: their document and pages.
+    std::map<std::string, std::string> going_;
     Terminal const& terminal_;
     /// By the pack preset's name, so that the same documents give the same order of mailings.
     std::map<std::string, std::unique_ptr<OutgoingMailing>> mailings_;

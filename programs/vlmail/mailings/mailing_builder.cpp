@@ -73,6 +73,7 @@ void MailingBuilder::add(std::string const& document, LetterReading letter) {
     if (Group* const group = metadata_.packPreset.noGroup() ? nullptr : joinedGroup(letter)) {
         group->sheets += ownSheetsOf(letter, metadata_.packPreset);
         group->letters.push_back(stored(document, letter.blobs, Place::Later));
+        noteDigest(*group, letter);
         return;
     }
     byFields_.emplace(groupKey(letter.fields), groups_.size());
@@ -81,6 +82,12 @@ void MailingBuilder::add(std::string const& document, LetterReading letter) {
                        {stored(document, letter.blobs, Place::First)},
                        std::move(letter.fields),
                        sheets});
+    noteDigest(groups_.back(), letter);
+}
+
+void MailingBuilder::noteDigest(Group& group, LetterReading const& letter) {
+    if (!letter.digest.empty())
+        group.digests.push_back(letter.digest);
 }
 
 /// The window shows the first sheet of those that go out as one: only the first letter's counts.
@@ -196,6 +203,7 @@ std::vector<MailingBuilder::Part const*> MailingBuilder::partsOf(Group const& gr
 Mailing::MailedLetter MailingBuilder::composed(Group const& group) {
     Production::Sides const sides = sidesOf(metadata_.packPreset);
     Mailing::MailedLetter letter{{}, group.fields};
+    letter.digests = group.digests;
     std::vector<int> pageCounts;
     std::vector<Part const*> const parts = partsOf(group);
     for (Part const* const part : parts) {

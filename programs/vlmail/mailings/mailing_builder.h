@@ -44,6 +44,9 @@ public:
 
     void setPurchaseOrder(std::string code) { metadata_.purchaseOrder = std::move(code); }
 
+    /// Why the letters go out although they did before.
+    void setAgain(std::string reason) { metadata_.again = std::move(reason); }
+
     /// A letter joins no group that would have a number of sheets then that `allows` denies.
     void limitGroups(std::function<bool(long long sheets)> allows) { allows_ = std::move(allows); }
 
@@ -71,11 +74,14 @@ private:
         Cfg::ExtractedFields fields;
         /// Of its letters and the cover page.
         long long sheets = 0;
+        /// Of its letters.
+        std::vector<std::string> digests = {};
     };
     enum class Place { First, Later };
 
     /// The group that the letter has joined, or nullptr.
     Group* joinedGroup(LetterReading const& letter);
+    static void noteDigest(Group& group, LetterReading const& letter);
     Part stored(std::string const& document, std::vector<PageBlob> const& pages, Place place);
     int storedPage(std::string const& document, int number, SharedMemBuffer const& data);
     void save(std::string const& document, int number, SharedMemBuffer const& data);

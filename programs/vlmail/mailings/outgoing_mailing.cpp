@@ -54,14 +54,27 @@ public:
     void finish() override {
         pack_.finish(builder_.finish().toBlob());
         goOnWithWhatWasLeftBehind();
-        state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_).state);
+        try {
+            deliver();
+        } catch (NothingToSend const&) {
+            Mailing::removePack(database_, id_);
+            throw;
+        }
     }
+    std::vector<LeftOut> leftOut() const override { return leftOut_; }
 
     std::string id() const override { return id_; }
 
     std::string place() const override { return id_ + ", " + state_; }
 
 private:
+    void deliver() {
+        auto const noteLeftOut = [this](long long number, std::string const& why) {
+            leftOut_.push_back({static_cast<std::size_t>(number - 1), why});
+        };
+        state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_, {}, noteLeftOut).state);
+    }
+
     /// The same letters under the id that the service may know already, so that none goes out twice.
     void goOnWithWhatWasLeftBehind() {
         std::optional<std::string> const left = samePackLeftBehind(database_, id_);
@@ -76,6 +89,7 @@ private:
     bool upload_;
     std::string id_;
     std::string state_;
+    std::vector<LeftOut> leftOut_;
     Mailing::PackDatabaseWriter pack_;
     MailingBuilder builder_;
 };

@@ -4,11 +4,13 @@
 #include "programs/vlmail/mailings/mailing_builder.h"
 #include "programs/vlmail/service/service_line.h"
 
+#include <cstddef>
 #include <ctime>
 #include <filesystem>
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 namespace VlMail {
 
@@ -17,12 +19,21 @@ public:
     virtual ~OutgoingMailing();
 
     virtual MailingBuilder& builder() = 0;
-    /// Lets the mailing arrive. Throws std::exception with a line for people; nothing has arrived then.
+    /// Lets the mailing arrive. Throws NothingToSend when none of its letters is to be sent, and
+    /// std::exception with a line for people; nothing has arrived then.
     virtual void finish() = 0;
     /// Once it has arrived; empty when it arrives nowhere.
     virtual std::string id() const = 0;
     /// Where it is once it has arrived.
     virtual std::string place() const = 0;
+
+    /// A letter that stayed behind, by its place among those of the metadata, and why.
+    struct LeftOut {
+        std::size_t index;
+        std::string why;
+    };
+    /// Once finish() has ended, also where it has thrown NothingToSend.
+    virtual std::vector<LeftOut> leftOut() const { return {}; }
 };
 
 /// Begins a mailing for a pack preset.

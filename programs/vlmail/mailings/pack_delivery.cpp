@@ -72,18 +72,18 @@ Protocol::JobReport awaitDelivery(ServiceLine& service, std::string const& packI
 }
 
 Protocol::JobReport deliverOverConnection(ServiceLine& service, Mailing::PackSource& pack, bool upload,
-                                          UploadWatcher const& watcher) {
-    uploadPack(service, pack, watcher);
+                                          UploadWatcher const& watcher, LeftOutWatcher const& leftOut) {
+    CarefulUpload(service, pack, watcher, leftOut).send();
     if (upload)
         service.repeat([&](Channel::Client& client) { wantUpload(client, pack.packId()); });
     return awaitDelivery(service, pack.packId());
 }
 
 Protocol::JobReport deliver(ServiceLine& service, fs::path const& database, std::string const& packId,
-                            bool upload, UploadWatcher const& watcher) {
+                            bool upload, UploadWatcher const& watcher, LeftOutWatcher const& leftOut) {
     if (service.client().takesData()) {
         Mailing::OwnPackReader pack(database, packId);
-        return deliverOverConnection(service, pack, upload, watcher);
+        return deliverOverConnection(service, pack, upload, watcher, leftOut);
     }
     service.repeat([&](Channel::Client& client) { sendPack(client, database, packId, upload); });
     return awaitDelivery(service, packId);
@@ -94,6 +94,8 @@ template<typename Delivery>
 Protocol::JobReport orNamed(std::string const& packId, std::string const& remedy, Delivery delivery) {
     try {
         return delivery();
+    } catch (NothingToSend const&) {
+        throw;
     } catch (std::exception const& failure) {
         throw Base::Error(Base::codeOf(failure), "mailing " + packId + ": " + failure.what() + remedy);
     }
@@ -113,24 +115,24 @@ bool isSame(Mailing::PackSource& a, Mailing::PackSource& b) {
 } // namespace
 
 Protocol::JobReport deliverPack(ServiceLine& service, fs::path const& database, std::string const& packId,
-                                bool upload, UploadWatcher const& watcher) {
+                                bool upload, UploadWatcher const& watcher, LeftOutWatcher const& leftOut) {
     std::string const remedy =
         "; \"vlmail status " + packId + "\" tells what the service knows of it, \"vlmail resume " + packId +
         "\" sends it again, never twice, and \"vlmail discard " + packId + "\" erases it";
     Protocol::JobReport job =
-        orNamed(packId, remedy, [&] { return deliver(service, database, packId, upload, watcher); });
+        orNamed(packId, remedy, [&] { return deliver(service, database, packId, upload, watcher, leftOut); });
     if (isFetched(job))
         eraseFetched(database, packId);
     return job;
 }
 
 Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack, bool upload,
-                                UploadWatcher const& watcher) {
+                                UploadWatcher const& watcher, LeftOutWatcher const& leftOut) {
     if (!service.client().takesData())
         throw Base::Error(Base::Code::ServiceOutdated,
                           "the service takes no pages over the connection: bring it up to date");
     return orNamed(pack.packId(), "; sending it again goes on where it was, and never sends it twice",
-                   [&] { return deliverOverConnection(service, pack, upload, watcher); });
+                   [&] { return deliverOverConnection(service, pack, upload, watcher, leftOut); });
 }
 
 std::optional<std::string> samePackLeftBehind(fs::path const& database, std::string const& packId) {

@@ -4,6 +4,7 @@
 
 #include "programs/mailing/pack_database.h"
 #include "programs/protocol/job.h"
+#include "programs/vlmail/mailings/careful_upload.h"
 #include "programs/vlmail/mailings/pack_upload.h"
 #include "programs/vlmail/service/service_line.h"
 
@@ -16,14 +17,16 @@ namespace VlMail {
 
 /// Sends a finished pack of a pack database over the connection, to an older service by its path, and has it
 /// processed and, with `upload`, handed on; goes on when the connection breaks. Waits some seconds for the
-/// service to make its container, and erases the pack when the service has its pages. Throws Error, whose
-/// line names the pack and what can be done with it.
+/// service to make its container, and erases the pack when the service has its pages. Letters that went out
+/// before stay behind. Throws NothingToSend when these are all, and Error, whose line names the pack and what
+/// can be done with it.
 Protocol::JobReport deliverPack(ServiceLine& service, std::filesystem::path const& database,
-                                std::string const& packId, bool upload, UploadWatcher const& watcher = {});
+                                std::string const& packId, bool upload, UploadWatcher const& watcher = {},
+                                LeftOutWatcher const& leftOut = {});
 
 /// The same for a pack that lies elsewhere, and stays there.
 Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack, bool upload,
-                                UploadWatcher const& watcher = {});
+                                UploadWatcher const& watcher = {}, LeftOutWatcher const& leftOut = {});
 
 /// The id of another finished pack of the database that says the same in the same pages, for the same node:
 /// what is left of a sending that was not finished. Throws Error.

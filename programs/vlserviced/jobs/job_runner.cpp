@@ -254,13 +254,28 @@ void JobRunner::admit(PackLocation const& pack, PackSummary const& summary, Requ
             pack.packId, summary, surroundings_.rules(summary.cfgId), moment,
             [&](std::string const& name) { return surroundings_.presetSource(summary.cfgId, name); });
         job = jobFor(pack, summary, moment);
-        jobs_.together([&] {
-            if (jobs_.accept(*job))
-                surroundings_.recorder.note(job->cfgId, nameInHistory(*job), "", inHistory(*job));
-        });
+        enter(*job, summary);
         surroundings_.usedPreset(summary.cfgId, summary.packPreset.name());
     }
     proceed(*job);
+}
+
+/// The job with its letters, or nothing of it.
+void JobRunner::enter(Job const& job, PackSummary const& summary) {
+    try {
+        jobs_.together([&] {
+            if (!jobs_.accept(job))
+                return;
+            if (surroundings_.letterRegister)
+                enterLetters(*surroundings_.letterRegister, job, summary);
+            surroundings_.recorder.note(job.cfgId, nameInHistory(job), "",
+                                        inHistory(job) + (summary.again.empty() ? "" : ", again: ") +
+                                            summary.again);
+        });
+    } catch (SentBefore const&) {
+        surroundings_.refusedLetters(job.pack.packId);
+        throw;
+    }
 }
 
 void JobRunner::requireNotDisabled(std::string const& packId, std::string const& cfgId) const {

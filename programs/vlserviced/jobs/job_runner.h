@@ -63,6 +63,10 @@ struct JobSurroundings {
     /// Where is noted what people do.
     Recorder recorder = {};
     StepTook took = [](Step, std::chrono::duration<double>) {};
+    /// Letters that went out are in it; null where nobody looks.
+    LetterRegister* letterRegister = nullptr;
+    /// Told that a pack is not taken as it is: of the same id it comes with other letters, if at all.
+    std::function<void(std::string const& packId)> refusedLetters = [](std::string const&) {};
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the
@@ -142,6 +146,7 @@ private:
     void discard(Job const& job);
     void noteProblem(std::string const& packId, std::string const& problem);
     void admit(PackLocation const& pack, PackSummary const& summary, RequireNode const& mayBeOf);
+    void enter(Job const& job, PackSummary const& summary);
     void wantUpload(std::string const& folder, std::string const& database, Policy::Grant const& by);
     bool recordChange(Protocol::JobAction action, Job const& job);
     void requireUploadFolder() const;

@@ -1,5 +1,6 @@
 #include "programs/vlserviced/jobs/pack_reception.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/base/plain_text.h"
 #include "programs/channel/data_message.h"
@@ -17,13 +18,8 @@ using Protocol::BeginPack;
 using Protocol::BeginPackAnswer;
 
 constexpr std::size_t MAX_TITLE_BYTES = 500;
-constexpr std::size_t DIGEST_DIGITS = 64;
 /// How long a pack waits for its rest, or for its Process Pack.
 constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
-
-bool isDigest(std::string const& text) {
-    return text.size() == DIGEST_DIGITS && text.find_first_not_of("0123456789abcdef") == std::string::npos;
-}
 
 void checkBeginning(BeginPack const& pack) {
     if (!Mailing::isPackId(pack.id))
@@ -35,7 +31,7 @@ void checkBeginning(BeginPack const& pack) {
     checkNodeId(pack.cfgId);
     if (pack.pages < 1 || pack.bytes < 1)
         throw Base::Error(Base::Code::MailingInvalid, "pack " + pack.id + " has no pages");
-    if (!isDigest(pack.sha256))
+    if (!Base::isSha256(pack.sha256))
         throw Base::Error(Base::Code::MailingInvalid,
                           "the digest of pack " + pack.id + " is none of 64 hexadecimal digits");
 }

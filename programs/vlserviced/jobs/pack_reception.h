@@ -59,6 +59,9 @@ public:
     /// later, with the reason as one line or nothing.
     void complete(std::string const& packId, std::function<void(std::string const& failure)> done);
 
+    /// Has a pack come anew, if it comes at all.
+    void drop(std::string const& packId) { erase(packId); }
+
     /// How many pieces wait for the store's thread.
     std::size_t waiting() const { return waiting_.size(); }
 

@@ -31,6 +31,12 @@ void removeHandedOver(Job const& job) {
 } // namespace
 
 bool Retention::removeSome() {
+    bool const isPast = letterRegister_.removeSome(now_());
+    hasRemoved_ |= isPast;
+    return removeJobs() || isPast;
+}
+
+bool Retention::removeJobs() {
     long long const days = settings_().retentionDays();
     if (days == 0)
         return false;

@@ -273,6 +273,71 @@ CREATE TRIGGER letter_fell_back AFTER UPDATE OF channel ON letters
 FOR EACH STATEMENT EXECUTE FUNCTION tell_of_letters();
 )sql";
 
+/// Letters that were accepted, each under a key that tells nothing of it, until somebody may send the same
+/// one again. `number` is that of what it goes out in; a key that is free belongs to a letter that went
+/// nowhere. Triggers keep that in step with jobs and letters, whoever changes them.
+constexpr char const* SCHEMA_12 = R"sql(
+CREATE TABLE register_secret (
+    one    INTEGER NOT NULL PRIMARY KEY CHECK (one = 1),
+    secret TEXT NOT NULL
+);
+CREATE TABLE registered_mailings (
+    id      INTEGER NOT NULL PRIMARY KEY,
+    pack    TEXT NOT NULL UNIQUE,
+    node    TEXT NOT NULL,
+    at      INTEGER NOT NULL,
+    ends_at INTEGER NOT NULL
+);
+CREATE INDEX registered_mailings_by_end ON registered_mailings (ends_at);
+CREATE TABLE registered_letters (
+    letter  TEXT NOT NULL PRIMARY KEY,
+    mailing INTEGER NOT NULL,
+    number  INTEGER NOT NULL,
+    ends_at INTEGER NOT NULL,
+    is_free INTEGER NOT NULL
+) WITHOUT ROWID;
+CREATE INDEX registered_letters_by_mailing ON registered_letters (mailing, number);
+)sql";
+
+constexpr char const* SQLITE_12 = R"sql(
+CREATE TRIGGER job_freed AFTER UPDATE OF state ON jobs
+WHEN (old.state IN ('failed', 'cancelled')) <> (new.state IN ('failed', 'cancelled')) BEGIN
+    UPDATE registered_letters SET is_free = CASE WHEN new.state IN ('failed', 'cancelled') THEN 1 ELSE 0 END
+    WHERE mailing = (SELECT id FROM registered_mailings WHERE pack = new.pack) AND
+          (new.divided = 0 OR
+           number IN (SELECT number FROM letters WHERE pack = new.pack AND by_carrier = 0));
+END;
+CREATE TRIGGER letter_freed AFTER UPDATE OF state ON letters
+WHEN new.number > 0 AND (old.state = 'failed') <> (new.state = 'failed') BEGIN
+    UPDATE registered_letters SET is_free = CASE WHEN new.state = 'failed' THEN 1 ELSE 0 END
+    WHERE mailing = (SELECT id FROM registered_mailings WHERE pack = new.pack) AND number = new.number;
+END;
+)sql";
+
+constexpr char const* POSTGRES_12 = R"sql(
+CREATE FUNCTION free_letters_of_job() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    UPDATE registered_letters SET is_free = CASE WHEN new.state IN ('failed', 'cancelled') THEN 1 ELSE 0 END
+    WHERE mailing = (SELECT id FROM registered_mailings WHERE pack = new.pack) AND
+          (new.divided = 0 OR
+           number IN (SELECT number FROM letters WHERE pack = new.pack AND by_carrier = 0));
+    RETURN NULL;
+END $$;
+CREATE TRIGGER job_freed AFTER UPDATE OF state ON jobs FOR EACH ROW
+WHEN ((old.state IN ('failed', 'cancelled')) <> (new.state IN ('failed', 'cancelled')))
+EXECUTE FUNCTION free_letters_of_job();
+
+CREATE FUNCTION free_letter() RETURNS trigger LANGUAGE plpgsql AS $$
+BEGIN
+    UPDATE registered_letters SET is_free = CASE WHEN new.state = 'failed' THEN 1 ELSE 0 END
+    WHERE mailing = (SELECT id FROM registered_mailings WHERE pack = new.pack) AND number = new.number;
+    RETURN NULL;
+END $$;
+CREATE TRIGGER letter_freed AFTER UPDATE OF state ON letters FOR EACH ROW
+WHEN (new.number > 0 AND (old.state = 'failed') <> (new.state = 'failed'))
+EXECUTE FUNCTION free_letter();
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -288,7 +353,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               SCHEMA_8,
                                               {SCHEMA_9, "", POSTGRES_9},
                                               {SCHEMA_10, "", POSTGRES_10},
-                                              {SCHEMA_11, "", POSTGRES_11}}};
+                                              {SCHEMA_11, "", POSTGRES_11},
+                                              {SCHEMA_12, SQLITE_12, POSTGRES_12}}};
     return kind;
 }
 

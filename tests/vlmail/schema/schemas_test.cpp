@@ -219,7 +219,7 @@ constexpr char const* WHOLE_SETTINGS = R"json({
                 "window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000},
                 "clear_zones": [{"left": 0, "top": 28000, "right": 21000, "bottom": 29700, "pages": "all"}],
                 "tolerance": 50, "address_lines": {"min": 3, "max": 6}, "postcode": "\\d{5}",
-                "repair": ["cover-page"], "copies": 2}}]}})json";
+                "repair": ["cover-page"], "copies": 2, "duplicate_days": 30}}]}})json";
 
 constexpr char const* WHOLE_CARRIERS = R"({
     "postal": {"type": "folder", "folder": "/srv/shop", "unit": "mailing", "hours": "06:00-17:30",

@@ -72,10 +72,12 @@ protected:
     fs::path upload_ = folder_ / "upload";
     std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::JobStore jobs_{*database_};
+    VlServiced::LetterRegister register_{*database_};
     json::Object settings_;
     long long now_ = 1000 * DAY;
-    VlServiced::Retention retention_{
-        jobs_, outbox_, [this] { return VlServiced::ServiceSettings(settings_); }, [this] { return now_; }};
+    VlServiced::Retention retention_{jobs_, register_, outbox_,
+                                     [this] { return VlServiced::ServiceSettings(settings_); },
+                                     [this] { return now_; }};
 };
 
 TEST_F(RetentionTest, RemovesJobsThatEnded90DaysAgo) {

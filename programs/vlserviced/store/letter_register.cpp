@@ -1,0 +1,140 @@
+#include "programs/vlserviced/store/letter_register.h"
+
+#include "programs/base/base64.h"
+#include "programs/base/hex.h"
+#include "programs/channel/proof.h"
+#include "programs/channel/token.h"
+
+#include <algorithm>
+#include <map>
+#include <set>
+
+namespace VlServiced {
+namespace {
+
+/// Rows of one statement.
+constexpr std::size_t AT_ONCE = 100;
+/// Others wait meanwhile.
+constexpr int REMOVED_AT_ONCE = 1000;
+constexpr long long EVER = std::numeric_limits<long long>::max();
+
+std::string secretIn(Database::Connection& database) {
+    Database::Rows rows = database.query("SELECT secret FROM register_secret");
+    return rows.next() ? rows.text(0) : std::string();
+}
+
+std::string secretOf(Database::Connection& database) {
+    std::string secret = secretIn(database);
+    if (!secret.empty())
+        return secret;
+    // Another service may be quicker.
+    database.change("INSERT INTO register_secret (one, secret) VALUES (1, $1) ON CONFLICT DO NOTHING",
+                    Channel::makeNonce());
+    return secretIn(database);
+}
+
+std::string placeholder(std::size_t number) { return '$' + std::to_string(number); }
+
+} // namespace
+
+LetterRegister::LetterRegister(Database::Connection& database)
+    : database_(database), secret_(Base::fromHex(secretOf(database)).value_or("")) {}
+
+std::string LetterRegister::keyOf(std::string const& digest) const {
+    return Base::toBase64(Channel::hmac(secret_, Base::fromHex(digest).value_or(digest)));
+}
+
+/// A pack whose job is forgotten may be sent once more.
+long long LetterRegister::mailingId(RegisteredMailing const& mailing) {
+    Database::Rows rows = database_.query(
+        "INSERT INTO registered_mailings (pack, node, at, ends_at) VALUES ($1, $2, $3, $4) ON CONFLICT "
+        "(pack) "
+        "DO UPDATE SET node = excluded.node, at = excluded.at, ends_at = excluded.ends_at RETURNING id",
+        mailing.pack, mailing.node, mailing.at, mailing.endsAt);
+    rows.next();
+    long long const id = rows.number(0);
+    rows.next();
+    return id;
+}
+
+std::vector<std::string> LetterRegister::insert(Keys const& keys, std::size_t from, std::size_t to,
+                                                long long mailing, long long endsAt, long long freeAt) {
+    constexpr std::size_t COMMON = 3;
+    Database::Values values{mailing, endsAt, freeAt};
+    std::string rows;
+    for (std::size_t i = from; i < to; ++i) {
+        values.emplace_back(keys[i].first);
+        values.emplace_back(keys[i].second);
+        std::size_t const at = COMMON + 2 * (i - from);
+        rows +=
+            (rows.empty() ? "(" : ", (") + placeholder(at + 1) + ", $1, " + placeholder(at + 2) + ", $2, 0)";
+    }
+    Database::Rows entered = database_.queryAll(
+        "INSERT INTO registered_letters (letter, mailing, number, ends_at, is_free) VALUES " + rows +
+            " ON CONFLICT (letter) DO UPDATE SET mailing = excluded.mailing, number = excluded.number, "
+            "ends_at = excluded.ends_at, is_free = 0 WHERE registered_letters.is_free = 1 OR "
+            "registered_letters.ends_at <= $3 RETURNING letter",
+        values);
+    std::vector<std::string> all;
+    while (entered.next())
+        all.push_back(entered.text(0));
+    return all;
+}
+
+std::vector<long long> LetterRegister::enter(RegisteredMailing const& mailing,
+                                             std::vector<Mailing::LetterDigest> const& letters, Known known) {
+    std::set<long long> refused;
+    std::map<std::string, long long> byKey;
+    for (Mailing::LetterDigest const& letter : letters)
+        if (!byKey.emplace(keyOf(letter.digest), letter.number).second && known == Known::Refused)
+            refused.insert(letter.number);
+    // In the order of their keys, so that two services never wait for one another.
+    Keys const keys(byKey.begin(), byKey.end());
+    long long const id = mailingId(mailing);
+    for (std::size_t from = 0; from < keys.size(); from += AT_ONCE) {
+        std::size_t const to = std::min(from + AT_ONCE, keys.size());
+        std::vector<std::string> const entered =
+            insert(keys, from, to, id, mailing.endsAt, known == Known::Refused ? mailing.at : EVER);
+        std::set<std::string> const there(entered.begin(), entered.end());
+        for (std::size_t i = from; i < to; ++i)
+            if (!there.contains(keys[i].first))
+                refused.insert(keys[i].second);
+    }
+    return {refused.begin(), refused.end()};
+}
+
+std::vector<RegisteredLetter> LetterRegister::find(std::vector<std::string> const& digests,
+                                                   long long now) const {
+    std::vector<RegisteredLetter> found;
+    for (std::string const& digest : digests) {
+        std::string const key = keyOf(digest);
+        Database::Rows rows =
+            database_.query("SELECT m.pack, m.node, m.at, l.ends_at, l.number FROM registered_letters l "
+                            "JOIN registered_mailings m ON m.id = l.mailing "
+                            "WHERE l.letter = $1 AND l.is_free = 0 AND l.ends_at > $2",
+                            key, now);
+        if (rows.next())
+            found.push_back(
+                {digest, {rows.text(0), rows.text(1), rows.number(2), rows.number(3)}, rows.number(4)});
+    }
+    return found;
+}
+
+bool LetterRegister::removeSome(long long now) {
+    Database::Rows past = database_.query(
+        "SELECT id FROM registered_mailings WHERE ends_at <= $1 ORDER BY ends_at LIMIT 1", now);
+    if (!past.next())
+        return false;
+    long long const id = past.number(0);
+    past.next();
+    Database::Transaction transaction(database_);
+    if (database_.change("DELETE FROM registered_letters WHERE letter IN (SELECT letter FROM "
+                         "registered_letters WHERE mailing = $1 LIMIT " +
+                             std::to_string(REMOVED_AT_ONCE) + ")",
+                         id) == 0)
+        database_.change("DELETE FROM registered_mailings WHERE id = $1", id);
+    transaction.commit();
+    return true;
+}
+
+} // namespace VlServiced

@@ -1,0 +1,65 @@
+#pragma once
+// The register of letters that were accepted: it knows a letter again, and tells nothing of it.
+
+#include "programs/database/connection.h"
+#include "programs/mailing/mailing_outline.h"
+
+#include <cstddef>
+#include <limits>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace VlServiced {
+
+/// A mailing whose letters are registered.
+struct RegisteredMailing {
+    std::string pack;
+    std::string node;
+    /// When it was accepted, and until when nobody sends one of its letters again; seconds since the epoch.
+    long long at = 0;
+    long long endsAt = 0;
+};
+
+/// A letter that is there.
+struct RegisteredLetter {
+    std::string digest;
+    RegisteredMailing mailing;
+    /// Of what it goes out in.
+    long long number = 0;
+};
+
+/// A letter stands there under an HMAC-SHA-256 of its digest, by a secret that the database keeps. Letters
+/// and mailings that fail or are called back free it, in the transaction that notes that.
+class LetterRegister {
+public:
+    /// The database has to outlive it. Makes the secret, where there is none.
+    explicit LetterRegister(Database::Connection& database);
+
+    enum class Known { Refused, SentAgain };
+    /// Enters the letters of a mailing within a transaction of the caller, who takes it back where any are
+    /// refused: the numbers of those that are there already, or twice in the mailing, each once.
+    std::vector<long long> enter(RegisteredMailing const& mailing,
+                                 std::vector<Mailing::LetterDigest> const& letters, Known known);
+
+    /// Those of the digests that are there at that time.
+    std::vector<RegisteredLetter> find(std::vector<std::string> const& digests, long long now) const;
+
+    /// Removes some of what is past; false when nothing is left.
+    bool removeSome(long long now);
+
+private:
+    /// Keys with their letters' numbers.
+    using Keys = std::vector<std::pair<std::string, long long>>;
+
+    std::string keyOf(std::string const& digest) const;
+    long long mailingId(RegisteredMailing const& mailing);
+    /// The keys that could be entered, of some of them.
+    std::vector<std::string> insert(Keys const& keys, std::size_t from, std::size_t to, long long mailing,
+                                    long long endsAt, long long freeAt);
+
+    Database::Connection& database_;
+    std::string secret_;
+};
+
+} // namespace VlServiced
