@@ -72,7 +72,7 @@ TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
         {json::Value("a"), R"("production" is no object; write an object such as {"window": {...}})"},
         {R"({"windows": 1})"_json,
          R"("production/windows" "windows" is no key here; write one of "sheet", "window", "clear_zones", )"
-         R"("tolerance", "address_lines", "postcode", "repair", "copies", "fallback")"},
+         R"("tolerance", "address_lines", "postcode", "repair", "copies", "fallback", "duplicate_days")"},
         {R"({"sheet": {"width": 21000}})"_json, "\"production/sheet/height\" is missing; " + integer},
         {R"({"sheet": {"width": 0, "height": 99999999999}})"_json,
          "\"production/sheet/width\" is no integer from 1 to 200000; " + integer +
@@ -108,6 +108,10 @@ TEST(CarriersRules, AreRefusedWithPlaceAndRemedy) {
         {R"({"postcode": ""})"_json,
          R"("production/postcode" is no pattern; write a pattern such as "\\b\\d{5}\\b")"},
         {R"({"copies": 100})"_json, "\"production/copies\" is no integer from 1 to 99; " + integer},
+        {R"({"duplicate_days": -1})"_json,
+         "\"production/duplicate_days\" is no integer from 0 to 3650; " + integer},
+        {R"({"duplicate_days": 3651})"_json,
+         "\"production/duplicate_days\" is no integer from 0 to 3650; " + integer},
         {R"({"fallback": "postal"})"_json,
          "\"production/fallback\" is no list of at most 16 channels; " + channels},
         {R"({"fallback": ["email", "By Post", 7]})"_json,

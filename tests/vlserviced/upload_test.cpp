@@ -5,9 +5,11 @@
 #include "programs/channel/stream.h"
 #include "programs/mailing/container_writer.h"
 #include "programs/mailing/metadata.h"
+#include "programs/protocol/letter_register.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
 #include "programs/vlmail/service/service_client.h"
 #include "tests/channel/test_certificate.h"
+#include "tests/faults/fault.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/two_networks.h"
@@ -26,9 +28,11 @@
 #include <csignal>
 #include <ctime>
 #include <fstream>
+#include <map>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
+#include <utility>
 
 namespace {
 
@@ -572,6 +576,72 @@ TEST_F(LettersSentBefore, StayBehindInMailingFilesToo) {
                 testing::StartsWith("left out: " + file.stem().string() + ", letter 1: sent-before: "));
     EXPECT_EQ(output({"send", file.string(), "--node", "a=acme", "--again", "he asked for it"}),
               file.stem().string() + ", queued\n");
+}
+
+class KilledAmongSentLetters : public LettersSentBefore {
+protected:
+    fs::path counter() const { return folder_ / "calls"; }
+    /// Starts a service that is killed at its call of that number; 0 lets it live.
+    void start(long call) {
+        service_.reset();
+        service_.emplace(arguments(), Faults::environmentOf({"durable", 0, call}, counter()));
+    }
+    /// Between which of its calls a service takes a mailing.
+    std::pair<long, long> callsOfADelivery() {
+        start(0);
+        long const before = Faults::callsIn(counter());
+        storeLetters("p0", {-1, -2});
+        EXPECT_TRUE(deliver("p0").empty());
+        return {before, Faults::callsIn(counter())};
+    }
+    void deliverToADyingService(std::string const& id, long call) {
+        start(call);
+        try {
+            // The pack stays with the client, even where it has arrived and been written.
+            Mailing::OwnPackReader pack(database_, id);
+            auto toService = line(std::chrono::milliseconds(0));
+            VlMail::uploadPack(toService, pack);
+        } catch (std::exception const&) {
+            // It died too early.
+        }
+        service_->signal(SIGKILL);
+        service_->wait();
+    }
+    bool isOnRecord(std::string const& id) {
+        auto const client = clientOf(*service_, data_);
+        auto const all = Protocol::JobsAnswer(VlMail::ask(*client, Protocol::JobsQuery())).jobs;
+        return std::ranges::any_of(all, [&](auto const& job) { return job.id == id; });
+    }
+    std::size_t known(std::vector<int> const& letters) {
+        Protocol::RegisterQuery query;
+        query.id = "a=acme";
+        for (int const letter : letters)
+            query.digests.push_back(digest(letter));
+        auto const client = clientOf(*service_, data_);
+        return Protocol::RegisterAnswer(VlMail::ask(*client, query)).letters.size();
+    }
+};
+
+TEST_F(KilledAmongSentLetters, HasThemRegisteredWithTheirMailingOrNotAtAll) {
+    auto const [first, last] = callsOfADelivery();
+    ASSERT_GT(last, first);
+    std::map<bool, int> rounds;
+    for (int call = static_cast<int>(first) + 1; call <= last; ++call) {
+        std::string const id = "p" + std::to_string(call);
+        std::vector<int> const letters{2 * call, 2 * call + 1};
+        storeLetters(id, letters);
+        deliverToADyingService(id, call);
+        start(0);
+        bool const isThere = isOnRecord(id);
+        ++rounds[isThere];
+        EXPECT_EQ(known(letters), isThere ? letters.size() : 0) << "killed at call " << call;
+        EXPECT_TRUE(deliver(id).empty()) << "killed at call " << call;
+        EXPECT_EQ(known(letters), letters.size()) << "killed at call " << call;
+        storeLetters("again-" + id, letters);
+        EXPECT_EQ(deliver("again-" + id).back(), "nothing is sent") << "killed at call " << call;
+    }
+    EXPECT_EQ(rounds.size(), 2U) << "it has to die before it has the mailing, and after that";
+    EXPECT_EQ(jobs(), static_cast<std::size_t>(last - first) + 1);
 }
 
 // --- another machine
