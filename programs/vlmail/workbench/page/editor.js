@@ -100,6 +100,7 @@ export class Editor {
             : new PlainEditor(byId("editor"), label, typed);
         this.session.on("text", () => this.#take());
         this.session.on("evaluation", () => this.#mark());
+        this.session.on("choice", () => this.session.choice && this.#reveal(this.session.choice));
     }
 
     #take() {
@@ -145,15 +146,12 @@ export class Editor {
             to: { line: cursor.line, ch: cursor.ch + (isClosed ? 1 : 0) } };
     }
 
-    /**
-     * @param {string} pointer  what stands there in the settings is brought into view
-     * @param {boolean} isFocused
-     */
-    reveal(pointer, isFocused = false) {
+    /** Brings what stands there in the settings into view. */
+    #reveal(pointer) {
         if (this.session.broken)
             return;
         const node = nodeAt(parse(this.session.text), pointer);
         if (node)
-            this.view.reveal(placeOf(this.session.text, node.start), isFocused);
+            this.view.reveal(placeOf(this.session.text, node.start), false);
     }
 }

@@ -22,6 +22,7 @@ export class Evaluation {
     #open = new Newest();
     #others = new Newest();
     #timer = 0;
+    #asked = null;
 
     /**
      * @param {import("./state.js").Session} session
@@ -37,11 +38,12 @@ export class Evaluation {
 
     #soon() {
         clearTimeout(this.#timer);
-        this.#timer = setTimeout(() => this.#readNow(), PAUSE_MS);
+        this.#timer = setTimeout(() => this.#asked === this.session.text || this.#readNow(), PAUSE_MS);
     }
 
     #readNow() {
         clearTimeout(this.#timer);
+        this.#asked = this.session.text;
         this.#open.run((signal) => this.#read(signal), (failure) => this.#lost(failure));
     }
 

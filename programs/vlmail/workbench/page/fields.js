@@ -15,7 +15,6 @@ export class Fields {
      * @param {import("./state.js").Session} parts.session
      * @param {import("./edits.js").Edits} parts.edits
      * @param {import("./texts.js").Texts} parts.texts
-     * @param {(pointer: string) => void} parts.reveal  shows a place of the settings
      * @param {(zone: object) => void} parts.addField
      */
     constructor(parts) {
@@ -145,8 +144,6 @@ export class Fields {
         if (page)
             this.session.turnTo(page);
         this.session.choose(pointer ?? "");
-        if (pointer)
-            this.reveal(pointer);
     }
 
     #choose() {

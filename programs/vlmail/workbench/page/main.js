@@ -64,7 +64,7 @@ class Page {
         const addField = (zone) => newField.inZone(zone);
         this.zoneForm = new ZoneForm(session, tools, edits, texts, addField);
         this.editor = new Editor({ session, texts, schema });
-        this.fields = new Fields({ session, edits, texts, addField, reveal: (pointer) => this.editor.reveal(pointer) });
+        this.fields = new Fields({ session, edits, texts, addField });
         this.form = new Form({ session, edits, texts, schema });
         this.compare = new Compare(session, texts);
         this.tabs = new Tabs(byId("tabs"), () => {
@@ -85,6 +85,7 @@ class Page {
         this.session.on("message", (message) => this.#say(message));
         this.session.on("text saved", () => this.#showState());
         this.session.on("evaluation", () => this.#sayBroken());
+        document.addEventListener("visibilitychange", () => document.hidden || this.#refresh());
         window.addEventListener("beforeunload", (event) => this.session.isChanged && event.preventDefault());
     }
 
@@ -137,6 +138,18 @@ class Page {
             byId(id).title = says;
         }
         document.title = (isChanged ? "\u2022 " : "") + this.texts.of("title");
+    }
+
+    /** Files come and go while somebody looks elsewhere. */
+    async #refresh() {
+        const { session } = this;
+        const state = await this.api.call("state").catch((failure) => void this.failed(failure));
+        if (!state)
+            return;
+        session.documents = state.documents;
+        session.tell("documents");
+        if (state.settings.version !== session.settings.version)
+            session.say(this.texts.of("changedOutside", { name: state.settings.name }), "bad");
     }
 
     async start() {

@@ -332,7 +332,10 @@ export class ZoneTools {
     }
 
     #endDraft() {
-        this.#draft?.mark.remove();
+        if (!this.#draft)
+            return;
+        this.#draft.mark.remove();
+        this.canvas.note.textContent = "";
         this.#draft = null;
         this.drawButton.setAttribute("aria-pressed", "false");
         this.canvas.sheet.classList.remove("drawing");

@@ -1,18 +1,24 @@
 #!/usr/bin/python3
 """modules_test.py VLMAIL EXAMPLES PICTURES [TEST...]: asks the modules of the workbench's page, in a browser, what they give."""
+import os
 import sys
 
 sys.dont_write_bytecode = True
 import workbench_page as at
-from browser_test import BrowserTest, main
+from browser_test import EXAMPLES, VLMAIL, BrowserTest, browser, main
 
 
 class Modules(BrowserTest):
-    """Rules of the page's modules that are told best by tables."""
+    """Rules of the page's modules that are told best by tables. They keep nothing, so that one page does for all."""
 
-    def setUp(self):
-        super().setUp()
-        self.page = at.Page(self.driver, self.begin("office", None).url)
+    @classmethod
+    def setUpClass(cls):
+        cls.bench = at.Workbench(VLMAIL, os.path.join(EXAMPLES, "office"), None)
+        cls.page = at.Page(browser(), cls.bench.url)
+
+    @classmethod
+    def tearDownClass(cls):
+        cls.bench.end()
 
     def test_json_knows_where_its_values_stand(self):
         text = '{"a": [1, {"b/c": "x"}],\n "d": null}'

@@ -188,14 +188,24 @@ class Page:
         chain = ActionChains(self.driver, 0).key_down(modifier)
         chain.send_keys(*keys).key_up(modifier).perform()
 
-    def drag(self, element, start, by):
-        """From a place in the element, from its middle, by so many pixels."""
-        from selenium.webdriver.common.action_chains import ActionChains
+    def drag(self, selector, start, by):
+        """From a part of the element, such as (0.5, 1) for the middle of its lower edge, by so many millimetres of the page."""
+        from selenium.webdriver.common.actions.action_builder import ActionBuilder
 
-        chain = ActionChains(self.driver, 0).move_to_element_with_offset(element, *start).click_and_hold()
+        self.run("document.querySelector(arguments[0]).scrollIntoView({ block: 'center' })", selector)
+        left, top, width, height = self.rectangle(selector)
+        millimetre = self.rectangle("#stage .sheet")[2] / 210
+        x, y = left + start[0] * width, top + start[1] * height
+        builder = ActionBuilder(self.driver, duration=0)
+        builder.pointer_action.move_to_location(round(x), round(y)).pointer_down()
         for part in (0.5, 1):
-            chain.move_by_offset(round(by[0] * 0.5), round(by[1] * 0.5))
-        chain.release().perform()
+            builder.pointer_action.move_to_location(round(x + part * by[0] * millimetre), round(y + part * by[1] * millimetre))
+        builder.pointer_action.pointer_up()
+        builder.perform()
+
+    def rectangle(self, selector):
+        """Left, top, width and height in pixels of the window."""
+        return self.run("const b = document.querySelector(arguments[0]).getBoundingClientRect(); return [b.left, b.top, b.width, b.height]", selector)
 
     def focused(self):
         return self.run("const e = document.activeElement; return e.ariaLabel || e.textContent || e.id")
