@@ -1,7 +1,9 @@
 // A document's bytes, PDF or text: read, searched with the presets that every node has, its first page
-// written, held against the document's and read again.
+// written, held against the document's and read again, and its pictures looked into.
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/reader/letters.h"
+#include "programs/reader/page_pictures.h"
 
 #include "vlservice/platform/log.h"
 #include "vlservice/presets/presets.h"
@@ -41,6 +43,9 @@ void read(std::string bytes) {
     document.drawPart(1, {2540, 72, 100, 0, 100, 842});
     std::string const page = document.singlePagePdf(1);
     document.showsTheSame(1, page);
+    for (bool const isBare : {false, true})
+        for (std::string const& picture : Reader::pictureDigests(page, isBare))
+            require(Base::isSha256(picture));
     Reader::Document const single = Reader::openDocument(page, "page");
     require(single.pageCount() == 1);
 }

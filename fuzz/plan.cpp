@@ -1,6 +1,6 @@
 // What a plan says of a document, and a mailing's metadata of its letters: read, and the same when it is
 // written and read again. Of a plan's letters pages are asked for as they stand there. The outline of a
-// mailing, which is told from the text, is that of its letters.
+// mailing, which is told from the text, is that of its letters, and so are their digests.
 #include "programs/mailing/mailing_outline.h"
 #include "programs/mailing/metadata.h"
 #include "programs/vlmail/letters/outcome.h"
@@ -15,6 +15,7 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace {
 
@@ -48,13 +49,26 @@ long long sheetsOf(Mailing::MailedLetter const& letter, bool duplex) {
     return sheets;
 }
 
+void requireDigests(std::vector<Mailing::LetterDigest> const& told,
+                    std::vector<Mailing::MailedLetter> const& letters) {
+    std::size_t at = 0;
+    for (std::size_t letter = 0; letter < letters.size(); ++letter)
+        for (std::string const& digest : letters[letter].digests) {
+            require(at < told.size() && told[at].digest == digest);
+            require(told[at++].number == static_cast<long long>(letter) + 1);
+        }
+    require(at == told.size());
+}
+
 void outlineWhole(json::Object const& object) {
     try {
         auto const metadata = Mailing::Metadata::fromJson(object);
         long long most = 0;
         for (Mailing::MailedLetter const& letter : metadata.letters)
             most = std::max(most, sheetsOf(letter, metadata.packPreset.duplex()));
-        require(Mailing::outlineIn(textOf(metadata.toJson())).mostSheets == most);
+        Mailing::MailingOutline const outline = Mailing::outlineIn(textOf(metadata.toJson()));
+        require(outline.mostSheets == most && outline.again == metadata.again);
+        requireDigests(outline.digests, metadata.letters);
     } catch (std::runtime_error const&) { // is none
     }
 }

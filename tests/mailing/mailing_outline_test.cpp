@@ -55,6 +55,43 @@ TEST(MailingOutline, RefusesWhatIsNone) {
         EXPECT_NE(failureOf([&] { outlineIn(bad); }), "nothing was thrown") << bad;
 }
 
+std::string letterWith(std::string const& digests) {
+    return R"({"documents": [{"name": "a", "pages": [1]}], "digests": )" + digests + "}";
+}
+
+std::string const ONE = std::string(64, '1');
+std::string const TWO = std::string(64, 'a');
+
+TEST(MailingOutline, HasTheDigestsOfLettersWithTheNumberOfWhatTheyGoOutIn) {
+    std::string const all = letterWith("[\"" + ONE + "\"]") + ", " + letterWith("[]") + ", " +
+                            letterWith("[ \"" + TWO + "\" , \"" + ONE + "\" ]");
+    std::string digests;
+    for (Mailing::LetterDigest const& digest : outlineIn(metadata(all)).digests)
+        digests += std::to_string(digest.number) + ' ' + digest.digest + '\n';
+    EXPECT_EQ(digests, "1 " + ONE + "\n3 " + TWO + "\n3 " + ONE + '\n');
+}
+
+TEST(MailingOutline, HasNoDigestsOfLettersOfOlderClients) {
+    Mailing::MailingOutline const outline = outlineIn(metadata(letter(R"({"name": "a", "pages": [1]})")));
+    EXPECT_TRUE(outline.digests.empty());
+    EXPECT_EQ(outline.again, "");
+    EXPECT_EQ(outline.mostSheets, 1);
+}
+
+TEST(MailingOutline, HasTheReasonWhyLettersGoOutAgain) {
+    EXPECT_EQ(outlineIn(metadata("", R"("again": "lost in the post", )")).again, "lost in the post");
+}
+
+TEST(MailingOutline, RefusesDigestsThatAreNone) {
+    std::string const quoted = '"' + ONE + '"';
+    for (std::string const& bad :
+         {std::string("7"), quoted, std::string("[7]"), "[\"" + ONE.substr(1) + "\"]", "[\"" + ONE + "1\"]",
+          "[\"" + ONE.substr(1) + "A\"]", "[\"" + ONE.substr(1) + "\"\"]", "[[" + quoted + "]]",
+          '[' + quoted + "], \"digests\": [" + quoted + ']'})
+        EXPECT_EQ(failureOf([&] { outlineIn(metadata(letterWith(bad))); }), "it is no metadata of a mailing")
+            << bad;
+}
+
 TEST(MailingOutline, EndsAtEveryLength) {
     std::string const whole = metadata(letter(R"({"name": "a\\", "pages": [1, 2]})"));
     outlineIn(whole);

@@ -120,6 +120,20 @@ TEST_F(AccessTest, ToJobsOfOtherNodesIsNone) {
     EXPECT_EQ(jobs_.find("p1")->state, VlServiced::JobState::Accepted);
 }
 
+TEST_F(AccessTest, ToLettersOfOtherNodesIsTheirDayAlone) {
+    std::string const own(64, '1');
+    std::string const others(64, '2');
+    accept("p1", "a=acme");
+    accept("p2", "a=other");
+    auto const refused = VlServiced::LetterRegister::Known::Refused;
+    EXPECT_TRUE(register_.enter({"p1", "a=acme", 1000, 2000}, {{own, 1}}, refused).empty());
+    EXPECT_TRUE(register_.enter({"p2", "a=other", 1000, 2000}, {{others, 1}}, refused).empty());
+    actAs(Role::Send, "a=acme");
+    EXPECT_EQ(ask(R"({"query":"register","id":"a=acme","digests":[")" + own + R"(",")" + others + "\"]}"),
+              R"({"letters":[{"digest":")" + own + R"(","at":1000,"pack":"p1","state":"accepted"},)" +
+                  R"({"digest":")" + others + R"(","at":1000,"pack":"","state":""}]})");
+}
+
 TEST_F(AccessTest, ToUploadingReachesTheJobsOfCoveredNodes) {
     settings_.changeService(parse(R"({"upload_folder":")" + upload_.string() + "\"}"));
     accept("p1", "a=acme");

@@ -544,6 +544,14 @@ TEST_F(LettersSentBefore, AreRefusedByTheServiceToAClientThatDoesNotAsk) {
     EXPECT_EQ(jobs(), 2u);
 }
 
+TEST_F(LettersSentBefore, AreNoneOfMailingsThatAnOlderClientHasMade) {
+    for (char const* id : {"p1", "p2"}) {
+        storePack(database_, id);
+        EXPECT_TRUE(deliver(id).empty());
+    }
+    EXPECT_EQ(jobs(), 2u);
+}
+
 TEST_F(LettersSentBefore, AreNotThoseOfThePackItself) {
     storeLetters("p1", {1});
     {

@@ -84,7 +84,7 @@ public:
              Mailing::finishedPacks(packDatabaseOf(sources.service()->client(), node)))
             if (begun.size() < Protocol::RegisterQuery::MAX_PACKS)
                 begun.push_back(pack.info.id);
-        sent_.emplace(*sources.service(), node, std::move(begun));
+        sent_.emplace(registerOf(*sources.service()), node, std::move(begun));
     }
 
     void tell(Dispatch& dispatch) {

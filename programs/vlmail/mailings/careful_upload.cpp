@@ -74,7 +74,7 @@ bool CarefulUpload::leaveOutKnown() {
     for (Mailing::LetterDigest const& letter : digests_)
         asked.push_back(letter.digest);
     std::map<std::string, std::string> const known =
-        SentBefore(service_, pack_.info().cfgId, {pack_.packId()}).of(asked);
+        SentBefore(registerOf(service_), pack_.info().cfgId, {pack_.packId()}).of(asked);
     std::map<std::string, long long> own;
     std::size_t const before = left_.size();
     for (Mailing::LetterDigest const& letter : digests_) {

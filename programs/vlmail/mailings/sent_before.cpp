@@ -28,6 +28,13 @@ std::string sentBeforeInWords(Protocol::RegisteredLetter const& letter) {
     return "sent-before: " + date + " in " + letter.pack + (letter.state.empty() ? "" : ", ") + letter.state;
 }
 
+RegisterAsker registerOf(ServiceLine& service) {
+    return [&service](Protocol::RegisterQuery const& query) {
+        return service.repeat(
+            [&](Channel::Client& client) { return Protocol::RegisterAnswer(VlMail::ask(client, query)); });
+    };
+}
+
 std::map<std::string, std::string> SentBefore::of(std::vector<std::string> const& digests) {
     constexpr std::size_t AT_ONCE = Protocol::RegisterQuery::MAX_DIGESTS;
     std::map<std::string, std::string> known;
@@ -47,9 +54,7 @@ std::vector<Protocol::RegisteredLetter> SentBefore::ask(std::vector<std::string>
     query.digests = digests;
     query.besides = besides_;
     try {
-        return service_.repeat([&](Channel::Client& client) {
-            return Protocol::RegisterAnswer(VlMail::ask(client, query)).letters;
-        });
+        return asker_(query).letters;
     } catch (Base::Error const& failure) {
         if (hasNoRegister(failure))
             return {};
