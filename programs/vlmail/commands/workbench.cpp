@@ -1,19 +1,50 @@
-// vlmail workbench: presets are changed in a browser, and the letters beside them.
+// vlmail workbench: presets are changed in a browser, and the letters with them.
 #include "programs/vlmail/workbench/workbench.h"
+#include "programs/vlmail/commands/batch_command.h"
 #include "programs/vlmail/commands/command.h"
 
 #include <memory>
 #include <ostream>
+#include <spawn.h>
+#include <string>
+#include <sys/wait.h>
+#include <unistd.h>
+#include <utility>
 
 namespace VlMail {
 namespace {
 
 struct Options {
     Workbench::Setup setup;
+    std::string settings;
+    bool opens = false;
+    WorkerOptions reading;
 };
 
+/// The desktop's own way to a browser; whoever has none opens the address himself.
+void open(std::string const& url, Terminal const& terminal) {
+    char program[] = "xdg-open";
+    std::string address = url;
+    char* const arguments[] = {program, address.data(), nullptr};
+    pid_t process = 0;
+    int status = 0;
+    bool const isDone = ::posix_spawnp(&process, program, nullptr, nullptr, arguments, environ) == 0 &&
+                        ::waitpid(process, &status, 0) == process && WIFEXITED(status) &&
+                        WEXITSTATUS(status) == 0;
+    if (!isDone)
+        terminal.note("no browser could be opened; open the address above in one");
+}
+
 int work(Options const& options, Terminal const& terminal) {
-    Workbench::serve(options.setup, [&](std::string const& url) { terminal.out << url << std::endl; });
+    Workbench::Setup setup = options.setup;
+    setup.limits = options.reading.workers().limits;
+    auto store =
+        options.settings.empty() ? Workbench::settingsNowhere() : Workbench::settingsInFile(options.settings);
+    Workbench::serve(setup, std::move(store), [&](std::string const& url) {
+        terminal.out << url << std::endl;
+        if (options.opens)
+            open(url, terminal);
+    });
     return FINE;
 }
 
@@ -22,8 +53,12 @@ int work(Options const& options, Terminal const& terminal) {
 void addWorkbenchCommand(Base::Command const& app, Task& task) {
     auto const options = std::make_shared<Options>();
     Base::Command const command = app.addCommand(
-        "workbench", "Opens presets and documents in a browser: a preset is changed and the letter with it");
+        "workbench", "Shows presets and documents in a browser: a preset is changed and the letter with it");
     command.addOption("FOLDER", options->setup.folder, "The folder with the documents").required();
+    command.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    command.addOption("--documents", options->setup.letterheads, DOCUMENTS_HELP);
+    command.addFlag("--open", options->opens, "Open the address in a browser, too");
+    addLimitOptions(command, options->reading);
     command.whenNamed(
         [=, &task] { task = [=](Terminal const& terminal) { return work(*options, terminal); }; });
 }

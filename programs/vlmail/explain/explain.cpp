@@ -62,6 +62,8 @@ json::Object toJson(Reader::JoinedMatch const& joined) {
 
 json::Object toJson(NearMiss const& miss) {
     json::Object object{{KIND, VlMail::nameOf(miss.kind)}, {SAYS, miss.says}};
+    if (miss.change)
+        object.set(CHANGE, miss.change);
     if (miss.page == 0)
         return object;
     object.set(TEXT, miss.text);

@@ -99,6 +99,8 @@ constexpr char const* IS_PASSED_OVER = "passed_over";
 
 // Of a near miss.
 constexpr char const* KIND = "kind";
+/// What it would change in the settings, as near_miss_change.h has it.
+constexpr char const* CHANGE = "change";
 
 } // namespace Explanation
 

@@ -78,7 +78,8 @@ public:
 
     void add(Kind kind, Found found) {
         auto& list = found.isValid ? valid_ : others_;
-        list.push_back({kind, std::move(found.says), std::move(found.text), found.page, found.box});
+        list.push_back({kind, std::move(found.says), std::move(found.text), found.page, found.box,
+                        std::move(found.change)});
     }
 
     std::vector<NearMiss> take() {

@@ -5,6 +5,7 @@
 #include "programs/reader/field_search.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/explain/read_pages.h"
+#include "vlservice/json/json.h"
 
 #include <string>
 #include <vector>
@@ -48,6 +49,8 @@ struct NearMiss {
     std::string text;
     int page = 0;
     Reader::Box box;
+    /// What it would change in the settings; the empty handle when that cannot be told.
+    json::Value change = {};
 };
 
 /// A field that a letter lacks or has an invalid value of, with the search for it.

@@ -2,7 +2,9 @@
 #include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/patterns/parts.h"
+#include "programs/patterns/repairs.h"
 #include "programs/patterns/text_forms.h"
+#include "programs/vlmail/explain/near_miss_change.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/words.h"
 
@@ -57,8 +59,23 @@ Stretch linesOf(ZoneText const& text, std::string_view otherWriting, PlainHit co
 std::optional<Found> byPattern(Search const& search, std::string const& pattern, std::string const& how) {
     if (pattern == search.pattern())
         return std::nullopt;
-    return search.told(search.find(search.withPattern(pattern), search.searchedText()), search.pageNumber(),
-                       [&](Hit const& hit) { return "would match " + excerpt(hit.match.text) + how; });
+    auto found =
+        search.told(search.find(search.withPattern(pattern), search.searchedText()), search.pageNumber(),
+                    [&](Hit const& hit) { return "would match " + excerpt(hit.match.text) + how; });
+    if (found)
+        found->change = Change::pattern(pattern);
+    return found;
+}
+
+/// The first of the patterns by which the field has a valid value in the text where it was searched, as a
+/// change.
+json::Value firstThatFits(Search const& search, std::vector<std::string> const& patterns) {
+    for (std::string const& pattern : patterns) {
+        auto const hit = search.find(search.withPattern(pattern), search.searchedText());
+        if (hit && hit->isValid)
+            return Change::pattern(pattern);
+    }
+    return {};
 }
 
 std::string lookAlikeAdvice(std::string const& matched, std::string const& pattern) {
@@ -89,7 +106,8 @@ std::optional<Found> joinedAt(Search const& search, ZoneText const& text, std::s
                        excerpt(both.text.substr(middle + 1)) + " joined" +
                        (joint.empty() ? "" : " by a blank") +
                        ": let the pattern take a line break there, \\s in the place of a blank or \\h";
-    return Found{std::move(says), both.text, search.pageNumber(), both.box, hit->isValid};
+    return Found{std::move(says), both.text, search.pageNumber(), both.box, hit->isValid}.by(
+        firstThatFits(search, Patterns::withLineBreaks(search.pattern())));
 }
 
 /// The text of a letter, to look up what a pattern wants.
@@ -229,7 +247,8 @@ std::optional<Found> valueGroup(Search const& search) {
             ? "its group (?<VAL>...) takes no part in the match: put it where a value always is"
             : "has no group (?<VAL>...): put one round the part that is the value";
     return Found{"the pattern matches " + excerpt(hit->match.text) + ", but " + why, hit->match.text,
-                 search.pageNumber(), hit->match.box, true};
+                 search.pageNumber(), hit->match.box, true}
+        .by(firstThatFits(search, Patterns::withValueGroups(search.pattern())));
 }
 
 std::optional<Found> earlierField(Search const& search) {
@@ -242,13 +261,16 @@ std::optional<Found> earlierField(Search const& search) {
         cutField(*earlier->definition, text, taken);
         if (search.find(text))
             continue;
-        return search.told(hit, search.pageNumber(), [&](Hit const& at) {
+        auto found = search.told(hit, search.pageNumber(), [&](Hit const& at) {
             return "would match " + excerpt(at.match.text) + ", but the field " +
                    Base::inQuotes(earlier->definition->name()) +
                    ", which is searched before it, takes that line: put this field in front of it, or into a "
                    "zone "
                    "of its own";
         });
+        if (found)
+            found->change = Change::before(earlier->definition->name());
+        return found;
     }
     return std::nullopt;
 }
@@ -280,7 +302,8 @@ std::optional<Found> lookAlike(Search const& search) {
     std::string says =
         "would match " + excerpt(lines.text) +
         " if characters that look alike were the same: " + lookAlikeAdvice(lines.text, search.pattern());
-    return Found{std::move(says), lines.text, search.pageNumber(), lines.box, hit->isValid};
+    return Found{std::move(says), lines.text, search.pageNumber(), lines.box, hit->isValid}.by(
+        firstThatFits(search, Patterns::withLookAlikes(plainPattern, lines.text)));
 }
 
 std::optional<Found> blanks(Search const& search) {
@@ -338,6 +361,8 @@ std::optional<Found> literal(Search const& search) {
     found.page = likest->page;
     found.box = likest->stretch.box;
     found.isValid = true;
+    found.change =
+        firstThatFits(search, Patterns::withOtherLiteral(search.pattern(), *absent, likest->stretch.text));
     return found;
 }
 
@@ -357,7 +382,8 @@ std::optional<Found> rest(Search const& search) {
         std::string says = excerpt(matchIn(all, *hit)) + " fits " + Base::inQuotes(cut.front) + ", but " +
                            (behind.empty() ? "the end of the line" : excerpt(behind)) +
                            " behind it does not fit " + Base::inQuotes(cut.rest);
-        return Found{std::move(says), stretch.text, search.pageNumber(), stretch.box, false};
+        return Found{std::move(says), stretch.text, search.pageNumber(), stretch.box, false}.by(
+            firstThatFits(search, Patterns::withOtherRest(cut, behind)));
     }
     return standingSomewhere(search);
 }

@@ -1,6 +1,7 @@
 // Near misses in which the text stands elsewhere: beyond the zone, in another line or block, on another page.
 #include "programs/base/error.h"
 #include "programs/base/quoting.h"
+#include "programs/vlmail/explain/near_miss_change.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/words.h"
 #include "programs/vlmail/explain/zone_change.h"
@@ -78,6 +79,11 @@ std::string lossesBy(Search const& search, LaidOutPage const& changed) {
     return lost.empty() ? lost : ", but would lose " + lost;
 }
 
+/// As people write it: 60 rather than 60.0.
+json::Value numberFor(double value) {
+    return value == std::floor(value) ? json::Value(static_cast<long long>(value)) : json::Value(value);
+}
+
 std::optional<Found> withRule(Search const& search, Rule const& rule, double value) {
     LayoutRules rules = search.pages().rules();
     double const current = rules.*rule.member;
@@ -91,6 +97,7 @@ std::optional<Found> withRule(Search const& search, Rule const& rule, double val
         });
     if (!found)
         return found;
+    found->change = Change::setting(Change::PRESET, {rule.key}, numberFor(value));
     // The rule is the whole preset's: advice that harms other fields stands behind all that does not.
     std::string const losses = lossesBy(search, page);
     if (search.isGivenUp())
@@ -163,6 +170,12 @@ std::string pointAdvice(Search const& search, Point onPage) {
                                    : "give the field a zone of its own with the point " + pointInWords(to);
 }
 
+json::Value changeForPoint(Search const& search, Point onPage) {
+    json::Object const point = Change::point({onPage.x - search.origin().x, onPage.y - search.origin().y});
+    return search.takesWholeText() ? Change::setting(Change::ZONE, {"most_probable_point"}, point)
+                                   : Change::toOwnZone({{"most_probable_point", point}});
+}
+
 std::vector<Box> blocksByDistance(Search const& search, Point point) {
     std::vector<Box> boxes;
     for (Reader::Block const& block : search.page().layout.blocks)
@@ -189,6 +202,27 @@ std::string otherPageAdvice(Search const& search, int page) {
     return maybeCovered ? advice + ", or set \"skip_first_page\" if page 1 is a cover sheet" : advice;
 }
 
+/// Room for the text, in whole millimetres.
+json::Object placeFor(Search const& search, Box const& box) {
+    constexpr int ROOM = 100;
+    Box const onPage{static_cast<int>(wholeMillimetres(box.left - ROOM)),
+                     static_cast<int>(wholeMillimetres(box.top - ROOM)),
+                     static_cast<int>(wholeMillimetres(box.right + 2.0 * ROOM)),
+                     static_cast<int>(wholeMillimetres(box.bottom + ROOM))};
+    return {{"location", Change::location(onPage.movedBy({-search.origin().x, -search.origin().y}))}};
+}
+
+/// Where the letter's page of that number is wanted.
+json::Value changeForPage(Search const& search, int page, json::Object const& where) {
+    int const first = search.missed().firstPage;
+    if (page < first)
+        return Change::setting(Change::PRESET, {"skip_first_page"});
+    int const place = page - first + 1;
+    if (!where.empty())
+        return Change::toOwnZone(where, place);
+    return Change::setting(Change::PACK_PRESET, {"reading", "zones", search.zone().name(), "page"}, place);
+}
+
 std::optional<Found> onPage(Search const& search, LaidOutPage const& page) {
     int const number = page.page->number;
     auto const saying = [&](char const* where) {
@@ -198,9 +232,16 @@ std::optional<Found> onPage(Search const& search, LaidOutPage const& page) {
         };
     };
     Best best;
-    best.offer(search.told(search.find(search.remaining(search.textOn(page))), number, saying(" in the ")));
-    if (!best.isValid() && !search.takesWholeText())
-        best.offer(search.told(search.find(Search::everythingOn(page)), number, saying(" outside the ")));
+    auto inside = search.told(search.find(search.remaining(search.textOn(page))), number, saying(" in the "));
+    if (inside)
+        inside->change = changeForPage(search, number, {});
+    best.offer(std::move(inside));
+    if (best.isValid() || search.takesWholeText())
+        return best.take();
+    auto outside = search.told(search.find(Search::everythingOn(page)), number, saying(" outside the "));
+    if (outside)
+        outside->change = changeForPage(search, number, placeFor(search, outside->box));
+    best.offer(std::move(outside));
     return best.take();
 }
 
@@ -237,11 +278,14 @@ std::optional<Found> zone(Search const& search) {
         if (best.isValid())
             break;
         ZoneText text = search.textInside(change.after);
-        best.offer(
+        ZoneChange const told = change.toldFrom(search.origin());
+        auto found =
             search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), [&](Hit const&) {
-                return "would match " + change.where("the " + search.zoneName()) + ": " +
-                       change.toldFrom(search.origin()).advice();
-            }));
+                return "would match " + change.where("the " + search.zoneName()) + ": " + told.advice();
+            });
+        if (found)
+            found->change = Change::setting(Change::ZONE, {"location"}, Change::location(told.after));
+        best.offer(std::move(found));
     }
     return best.take();
 }
@@ -260,7 +304,10 @@ std::optional<Found> block(Search const& search) {
             return "would match in the text block " + millimetres(wholeMillimetres(box.distanceTo(point))) +
                    " away from the point of the " + search.zoneName() + ": " + pointAdvice(search, middle);
         };
-        best.offer(search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), says));
+        auto found = search.told(search.find(search.remaining(std::move(text))), search.pageNumber(), says);
+        if (found)
+            found->change = changeForPoint(search, middle);
+        best.offer(std::move(found));
     }
     return best.take();
 }
@@ -273,10 +320,13 @@ std::optional<Found> otherZone(Search const& search) {
         if (&zone == &search.zone() || !search.missed().mayLieOn(search.pageNumber(), zone))
             continue;
         auto const hit = search.find(search.textOn(search.page(), zone));
-        best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
+        auto found = search.told(hit, search.pageNumber(), [&](Hit const& at) {
             return "would match " + excerpt(at.match.text) + " in the zone " + Base::inQuotes(zone.name()) +
                    ": move the field there";
-        }));
+        });
+        if (found)
+            found->change = Change::toZone(zone.name());
+        best.offer(std::move(found));
     }
     return best.take();
 }
@@ -300,10 +350,13 @@ std::optional<Found> elsewhere(Search const& search) {
         ZoneChange const change = grownToHold(search.location(), hit.match.box);
         if (change.distance() <= NEAR)
             continue;
-        best.offer(search.told(hit, search.pageNumber(), [&](Hit const& at) {
+        auto found = search.told(hit, search.pageNumber(), [&](Hit const& at) {
             return "would match " + excerpt(at.match.text) + " " + change.where("the " + search.zoneName()) +
                    ": move the zone there, or give the field a zone of its own";
-        }));
+        });
+        if (found)
+            found->change = Change::toOwnZone(placeFor(search, found->box));
+        best.offer(std::move(found));
     }
     return best.take();
 }

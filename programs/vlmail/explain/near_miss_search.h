@@ -36,6 +36,13 @@ struct Found {
     Reader::Box box = {};
     /// The field would have a valid value; or the cause is certain.
     bool isValid = false;
+    /// As NearMiss has it.
+    json::Value change = {};
+
+    Found by(json::Value what) && {
+        change = std::move(what);
+        return std::move(*this);
+    }
 };
 
 class Search {

@@ -1,4 +1,5 @@
 // What keeps a value that was found from being taken.
+#include "programs/vlmail/explain/near_miss_change.h"
 #include "programs/vlmail/explain/near_miss_kinds.h"
 #include "programs/vlmail/explain/refusal.h"
 #include "programs/vlmail/explain/words.h"
@@ -32,7 +33,8 @@ std::optional<Found> limit(Search const& search) {
         return std::nullopt;
     bool const isAbove = refusal->reason == Refusal::Reason::AboveMaximum;
     return certain(search, refusal->says + ": " + (isAbove ? "raise \"value_max\"" : "lower \"value_min\"") +
-                               ", or correct the letter");
+                               ", or correct the letter")
+        .by(Change::setting(Change::FIELD, {isAbove ? "value_max" : "value_min"}, refusal->value));
 }
 
 std::optional<Found> validationPattern(Search const& search) {
@@ -54,7 +56,8 @@ std::optional<Found> width(Search const& search) {
     auto const most = static_cast<long long>(search.field().maxWidth());
     return certain(search, "the match is " + millimetres(is) + " wide and the field allows " +
                                millimetres(most) + ": raise \"width\" to " + std::to_string(is) +
-                               " or more, or let the pattern or the zone take less text");
+                               " or more, or let the pattern or the zone take less text")
+        .by(Change::setting(Change::FIELD, {"width"}, is));
 }
 
 } // namespace VlMail::NearMisses

@@ -103,13 +103,15 @@ std::optional<Refusal> refusalBy(ExtractField const& field, std::string const& t
         return Refusal{Reason::BelowMinimum,
                        Words::shortened(text) +
                            (isDate ? " is before the earliest date " : " is below the minimum ") +
-                           limitInWords(least, type)};
+                           limitInWords(least, type),
+                       value.rawValue()};
     json::Value const most = validation.maxVal();
     if (most && isLess(most, value.rawValue()))
         return Refusal{Reason::AboveMaximum,
                        Words::shortened(text) +
                            (isDate ? " is after the latest date " : " is above the maximum ") +
-                           limitInWords(most, type)};
+                           limitInWords(most, type),
+                       value.rawValue()};
     return std::nullopt;
 }
 

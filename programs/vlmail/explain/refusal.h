@@ -19,6 +19,8 @@ struct Refusal {
     Reason reason;
     /// Such as "12.30 is above the maximum 10".
     std::string says;
+    /// Of what is beyond a limit: the value, as the limit is written.
+    json::Value value = {};
 };
 
 /// Nothing when the validator takes the text, or cannot be tried on it: its pattern is bad or takes too long.

@@ -24,8 +24,6 @@ bool isDocument(fs::path const& file) {
     return ending == ".pdf" || ending == ".txt" || ending == ZONES_ENDING;
 }
 
-fs::path expectationBeside(fs::path const& document) { return document.string().append(EXPECTED_ENDING); }
-
 /// The document that an expectation belongs to; empty for any other file.
 fs::path documentBeside(fs::path const& expectation) {
     std::string text = expectation.string();
@@ -51,6 +49,8 @@ std::vector<fs::path> filesIn(fs::path const& folder) {
 }
 
 } // namespace
+
+fs::path expectationBeside(fs::path const& document) { return document.string().append(EXPECTED_ENDING); }
 
 bool TestCase::isZonesText() const { return document.extension() == ZONES_ENDING; }
 

@@ -20,6 +20,9 @@ struct TestCase {
     bool isZonesText() const;
 };
 
+/// The file of what is expected of a document.
+std::filesystem::path expectationBeside(std::filesystem::path const& document);
+
 /// Sorted by name, those of inner folders too. Throws Error when there is no such folder or nothing in it.
 std::vector<TestCase> testCasesIn(std::filesystem::path const& folder);
 

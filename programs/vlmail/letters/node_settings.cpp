@@ -35,11 +35,11 @@ bool isPresetsPart(json::Object const& document) {
 }
 
 /// A misspelt part would be passed over in silence, and with it all of its settings.
-void requirePartNames(json::Object const& document, fs::path const& file) {
+void requirePartNames(json::Object const& document, std::string const& file) {
     for (auto const& [name, part] : document) {
         if (!isPartName(name) && std::string_view(name) != Base::Schema::KEY)
             throw Base::Error(Base::Code::SettingUnknown,
-                              "cannot use the settings in " + Base::inQuotes(file.string()) + ": \"" + name +
+                              "cannot use the settings in " + Base::inQuotes(file) + ": \"" + name +
                                   "\" is no settings part; name the parts \"presets\", \"app\", \"inet\", "
                                   "\"po\", \"deps\" or "
                                   "\"profiles\"");
@@ -49,21 +49,26 @@ void requirePartNames(json::Object const& document, fs::path const& file) {
 } // namespace
 
 NodeSettings NodeSettings::fromFile(fs::path const& file) {
-    NodeSettings settings;
-    settings.text_ = Base::readFile(file);
+    NodeSettings settings = fromText(Base::readFile(file), file.string());
     settings.file_ = file;
-    settings.place_ = Base::inQuotes(file.string());
+    return settings;
+}
+
+NodeSettings NodeSettings::fromText(std::string text, std::string const& name) {
+    NodeSettings settings;
+    settings.text_ = std::move(text);
+    settings.place_ = Base::inQuotes(name);
     try {
         settings.parts_ = json::strToObject(settings.text_.data(), settings.text_.size());
     } catch (json::Exc const& wrong) {
         throw Base::Error(Base::Code::SettingsMalformed, "cannot read the settings in " +
-                                                             Base::inQuotes(file.string()) + ": " +
-                                                             wrong.what() + "; correct the file there");
+                                                             Base::inQuotes(name) + ": " + wrong.what() +
+                                                             "; correct the file there");
     }
     if (isPresetsPart(settings.parts_))
         settings.parts_ = json::Object{{Cfg::Presets::PART_NAME.c_str(), settings.parts_}};
-    requirePartNames(settings.parts_, file);
-    settings.sourced_ = Policy::SourcedSettings(settings.parts_, file.string());
+    requirePartNames(settings.parts_, name);
+    settings.sourced_ = Policy::SourcedSettings(settings.parts_, name);
     settings.presets();
     return settings;
 }

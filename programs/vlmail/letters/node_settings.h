@@ -24,6 +24,8 @@ public:
     /// Throws std::runtime_error with a line for people when the file cannot be read or is not such a
     /// document.
     static NodeSettings fromFile(std::filesystem::path const& file);
+    /// The same of a text that a person calls by that name.
+    static NodeSettings fromText(std::string text, std::string const& name);
     /// The same, or the global defaults for an empty name.
     static NodeSettings fromFileIfNamed(std::string const& file);
     /// What counts at a node, {"presets": ...} and so on, in the order in which a service has resolved it.

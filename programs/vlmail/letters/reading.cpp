@@ -627,6 +627,20 @@ ReadResult readDocument(fs::path const& file, PresetIndex const& presets, NodeSe
     return result;
 }
 
+ReadResult readDocument(Reader::Document& document, PresetIndex const& presets, NodeSettings const& settings,
+                        Along const& along) {
+    ReadResult result;
+    result.reading.document = document.name();
+    try {
+        if (along.beforeReading)
+            along.beforeReading(result, presets.presets());
+        readLetters(result, document, presets, settings, along, 1);
+    } catch (std::exception const& failure) {
+        fail(result, failure);
+    }
+    return result;
+}
+
 ReadResult splitDocument(DecidedDocument decided, Cfg::Presets const& presets, std::size_t checkEvery,
                          MakingReady& making) {
     ReadResult result{std::move(decided.reading)};

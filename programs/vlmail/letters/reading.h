@@ -154,6 +154,10 @@ struct Along {
 ReadResult readDocument(std::filesystem::path const& file, PresetIndex const& presets,
                         NodeSettings const& settings, Along const& along, std::size_t place);
 
+/// The same with a document that is open already.
+ReadResult readDocument(Reader::Document& document, PresetIndex const& presets, NodeSettings const& settings,
+                        Along const& along);
+
 /// A document whose letters have been decided on.
 struct DecidedDocument {
     /// Absolute.

@@ -1,6 +1,7 @@
 #include "programs/vlmail/letters/worker_pool.h"
 
 #include "programs/vlmail/letters/process_usage.h"
+#include "programs/vlmail/letters/worker_socket.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -25,34 +26,6 @@ namespace {
 
 // What goes over a worker's socket: the job's number one way, the result's length and bytes the other.
 using Number = std::uint64_t;
-
-bool writeAll(int file, void const* data, std::size_t size) {
-    auto at = static_cast<char const*>(data);
-    while (size > 0) {
-        ssize_t const step = ::send(file, at, size, MSG_NOSIGNAL);
-        if (step < 0 && errno == EINTR)
-            continue;
-        if (step <= 0)
-            return false;
-        at += step;
-        size -= static_cast<std::size_t>(step);
-    }
-    return true;
-}
-
-bool readAll(int file, void* data, std::size_t size) {
-    auto at = static_cast<char*>(data);
-    while (size > 0) {
-        ssize_t const step = ::read(file, at, size);
-        if (step < 0 && errno == EINTR)
-            continue;
-        if (step <= 0)
-            return false;
-        at += step;
-        size -= static_cast<std::size_t>(step);
-    }
-    return true;
-}
 
 class Worker {
 public:

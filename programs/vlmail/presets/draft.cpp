@@ -3,6 +3,7 @@
 #include "programs/base/millimetres.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/quoting.h"
+#include "programs/patterns/repairs.h"
 #include "programs/reader/address_text.h"
 #include "programs/reader/letters.h"
 #include "programs/reader/month_names.h"
@@ -277,7 +278,7 @@ std::string withDigitRuns(std::string const& name) {
             at = end;
         } else {
             std::size_t const digit = std::min(name.find_first_of("0123456789", at), name.size());
-            pattern += escaped(std::string_view(name).substr(at, digit - at));
+            pattern += Patterns::escaped(std::string_view(name).substr(at, digit - at));
             at = digit;
         }
     }
@@ -308,7 +309,7 @@ std::string expressionFor(std::vector<std::string> const& names) {
     bool const shareEnding = std::ranges::all_of(names, [&](std::string const& name) {
         return name.ends_with(ending) && name.size() >= front.size() + ending.size();
     });
-    return escaped(front) + ".*" + (shareEnding ? escaped(ending) : "");
+    return Patterns::escaped(front) + ".*" + (shareEnding ? Patterns::escaped(ending) : "");
 }
 
 Draft draftFrom(std::vector<Reader::Document>& documents) {

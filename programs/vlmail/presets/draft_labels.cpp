@@ -1,6 +1,7 @@
 #include "programs/vlmail/presets/draft_labels.h"
 
 #include "programs/patterns/pattern.h"
+#include "programs/patterns/repairs.h"
 
 #include <algorithm>
 #include <array>
@@ -78,17 +79,7 @@ std::optional<LabelledValue> labelledValue(DraftField const& field, std::string_
 }
 
 std::string patternFor(DraftField const& field, std::string const& label) {
-    return "^(?i:" + escaped(label) + ')' + GAP + "(?<VAL>" + field.value + R"()(?=\s|$|[.,;)]))";
-}
-
-std::string escaped(std::string_view text) {
-    std::string pattern;
-    for (char const c : text) {
-        if (std::string_view(".[{}()\\*+?|^$").find(c) != std::string_view::npos)
-            pattern += '\\';
-        pattern += c;
-    }
-    return pattern;
+    return "^(?i:" + Patterns::escaped(label) + ')' + GAP + "(?<VAL>" + field.value + R"()(?=\s|$|[.,;)]))";
 }
 
 } // namespace VlMail

@@ -34,7 +34,4 @@ std::optional<LabelledValue> labelledValue(DraftField const& field, std::string_
 /// The extraction pattern for values of the kind behind that label.
 std::string patternFor(DraftField const& field, std::string const& label);
 
-/// The text as a pattern that fits it alone.
-std::string escaped(std::string_view text);
-
 } // namespace VlMail

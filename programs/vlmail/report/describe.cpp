@@ -94,7 +94,7 @@ Box boxOf(ZoneTrace const& zone) {
     return {point.x, point.y, point.x, point.y};
 }
 
-Sheet sheetOf(LetterReading const& letter, int number, PrintedPages& pages) {
+Sheet sheetOf(LetterReading const& letter, int number, ShownPages& pages) {
     Production::PageSize const size = pages.size(number);
     Sheet sheet{number, size.width, size.height};
     try {
@@ -109,8 +109,7 @@ Sheet sheetOf(LetterReading const& letter, int number, PrintedPages& pages) {
 }
 
 /// The place of the page among the sheets, to which it is added when it is not there yet.
-std::size_t placeAmong(std::vector<Sheet>& sheets, int page, LetterReading const& letter,
-                       PrintedPages& pages) {
+std::size_t placeAmong(std::vector<Sheet>& sheets, int page, LetterReading const& letter, ShownPages& pages) {
     auto const place =
         static_cast<std::size_t>(std::ranges::find(sheets, page, &Sheet::page) - sheets.begin());
     if (place == sheets.size())
@@ -126,7 +125,7 @@ void turn(Zone& zone, Production::PageSize page, int quarterTurns) {
             box = turned(box, page, quarterTurns);
 }
 
-std::vector<Side> sidesOf(LetterReading const& letter, PrintedPages& pages) {
+std::vector<Side> sidesOf(LetterReading const& letter, ShownPages& pages) {
     try {
         return pages.sides(letter);
     } catch (Base::Error const&) {
@@ -148,7 +147,7 @@ Zone zoneOf(ZoneTrace const& seen, LetterReading const& letter, Reader::Page con
 constexpr std::size_t MOST_SHEETS = 20;
 
 Fault faultOf(Production::Finding const& finding, Letter& letter, LetterReading const& reading,
-              PrintedPages& pages) {
+              ShownPages& pages) {
     Fault fault{nameOf(finding.code), finding.isError(),
                 finding.pages.empty() ? "document" : pagesInWords(finding.pages), finding.says, finding.fix};
     if (finding.box == Box() || finding.pages.empty())
@@ -165,7 +164,7 @@ Fault faultOf(Production::Finding const& finding, Letter& letter, LetterReading 
 
 /// A page that may begin another letter: what makes it look like that is drawn on it.
 Fault faultOf(Reader::DoubtfulJoin const& join, Letter& letter, LetterReading const& reading,
-              PrintedPages& pages) {
+              ShownPages& pages) {
     Fault fault{"letter-not-separated", true, pagesInWords({join.page}),
                 "may begin another letter: " + join.says,
                 "correct the mark or the document, or mail them as one letter with --accept-joined"};
@@ -178,7 +177,7 @@ Fault faultOf(Reader::DoubtfulJoin const& join, Letter& letter, LetterReading co
     return fault;
 }
 
-Letter letterOf(LetterReading const& reading, PrintedPages& pages, Reader::PageTrace const& trace) {
+Letter letterOf(LetterReading const& reading, ShownPages& pages, Reader::PageTrace const& trace) {
     Letter letter{pagesInWords(reading.pages), reading.whyNot(), {sheetOf(reading, trace.page, pages)}};
     for (ZoneTrace const& seen : trace.zones) {
         int const page = seen.place.page == 0 ? trace.page : seen.place.page;
@@ -203,7 +202,7 @@ Document describe(DocumentReading const& reading) {
     return described;
 }
 
-Document describe(DocumentReading const& reading, PrintedPages& pages, Reader::Trace const& trace) {
+Document describe(DocumentReading const& reading, ShownPages& pages, Reader::Trace const& trace) {
     Document described = describe(reading);
     auto letter = reading.letters->begin();
     for (Reader::PageTrace const& page : trace.pages) {

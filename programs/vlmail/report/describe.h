@@ -11,8 +11,8 @@ namespace VlMail::Report {
 /// The document without its letters.
 Document describe(DocumentReading const& reading);
 
-/// The document with its letters and the pictures of their pages as they are printed. A page that cannot be
+/// The document with its letters and the pictures of their pages as they are shown. A page that cannot be
 /// drawn has the reason instead. Throws Reader::Error when a page cannot be read.
-Document describe(DocumentReading const& reading, PrintedPages& pages, Reader::Trace const& trace);
+Document describe(DocumentReading const& reading, ShownPages& pages, Reader::Trace const& trace);
 
 } // namespace VlMail::Report

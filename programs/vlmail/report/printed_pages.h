@@ -12,20 +12,34 @@
 
 namespace VlMail::Report {
 
-class PrintedPages {
+/// The pages of a document as they are shown.
+class ShownPages {
+public:
+    virtual ~ShownPages() = default;
+
+    virtual Reader::Document& document() const = 0;
+    /// By how many quarters a page is turned clockwise.
+    virtual int quarterTurns(int page) const = 0;
+    virtual Production::PageSize size(int page) const = 0;
+    /// A PNG of a page of the letter; empty where pictures are shown in another way. Throws Base::Error.
+    virtual std::string picture(LetterReading const& letter, int page, double dotsPerInch) = 0;
+    /// What goes out with the letter; mostly none.
+    virtual std::vector<Side> sides(LetterReading const& letter) = 0;
+};
+
+class PrintedPages : public ShownPages {
 public:
     /// All must outlive this object.
     PrintedPages(Reader::Document& document, Cfg::PackPreset const& preset, MakingReady& making)
         : document_(document), preset_(preset), making_(making) {}
 
-    Reader::Document& document() const { return document_; }
-    /// By how many quarters a page is turned clockwise.
-    int quarterTurns(int page) const;
-    Production::PageSize size(int page) const;
-    /// A PNG of a page of a letter that goes out by itself. Throws Base::Error.
-    std::string picture(LetterReading const& letter, int page, double dotsPerInch);
+    Reader::Document& document() const override { return document_; }
+    int quarterTurns(int page) const override;
+    Production::PageSize size(int page) const override;
+    /// Of a letter that goes out by itself.
+    std::string picture(LetterReading const& letter, int page, double dotsPerInch) override;
     /// All sides of such a letter with what goes out with it, small; none when it is made of its pages alone.
-    std::vector<Side> sides(LetterReading const& letter);
+    std::vector<Side> sides(LetterReading const& letter) override;
 
 private:
     struct Part;

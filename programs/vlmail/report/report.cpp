@@ -3,6 +3,7 @@
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/presets/words.h"
 #include "programs/vlmail/report/html.h"
+#include "programs/vlmail/report/shapes.h"
 #include "programs/vlmail/report/style.h"
 
 #include <algorithm>
@@ -18,28 +19,6 @@ using Reader::Box;
 /// Nothing may be loaded or run but what the page brings itself; texts that slip through stay harmless.
 constexpr char const* POLICY =
     "default-src 'none'; img-src data:; style-src 'unsafe-inline'; base-uri 'none'; form-action 'none'";
-
-struct StateLook {
-    char const* words;
-    /// Of the style sheet.
-    char const* look;
-};
-
-/// In the order of Field::State.
-constexpr std::array STATES{
-    StateLook{"\u2713 found", ""},         StateLook{"= default", "quiet"},
-    StateLook{"\u2013 not used", "quiet"}, StateLook{"\u2013 not found", "quiet"},
-    StateLook{"\u2717 invalid", "bad"},    StateLook{"\u2717 missing", "bad"},
-};
-
-/// In the order of Field::Tag.
-constexpr std::array TAGS{"", " front", " above"};
-
-StateLook lookOf(Field const& field) { return STATES.at(static_cast<std::size_t>(field.state)); }
-
-bool isTrouble(Field const& field) {
-    return field.state == Field::State::Invalid || field.state == Field::State::Missing;
-}
 
 std::string stateSpan(std::string const& words, std::string const& look) {
     return "<span class=\"state " + look + "\">" + escaped(words) + "</span>";
@@ -57,117 +36,42 @@ std::string placeOf(Box const& box) {
            inMillimetres(box.top) + "\u2013" + inMillimetres(box.bottom) + " mm";
 }
 
-/// Settings may place a zone anywhere: what lies off the page ends at its edge.
-Box onPage(Box const& box, Sheet const& sheet) {
-    Box clipped;
-    clipped.left = std::clamp(box.left, 0, sheet.width);
-    clipped.top = std::clamp(box.top, 0, sheet.height);
-    clipped.right = std::clamp(box.right, clipped.left, sheet.width);
-    clipped.bottom = std::clamp(box.bottom, clipped.top, sheet.height);
-    return clipped;
-}
-
 std::string styleOf(Box const& box, Sheet const& sheet) {
     return "left:" + percent(box.left, sheet.width) + ";top:" + percent(box.top, sheet.height) +
            ";width:" + percent(box.width(), sheet.width) + ";height:" + percent(box.height(), sheet.height);
 }
 
-/// A mark on a sheet that leads to `row`.
-std::string overlay(std::string const& anchor, std::string const& row, std::string const& look,
-                    Box const& box, Sheet const& sheet, std::string const& tag, std::string const& label) {
-    return "<a class=\"" + look + "\" id=\"" + anchor + "\" href=\"#" + row + "\" style=\"" +
-           styleOf(box, sheet) + "\" aria-label=\"" + escaped(label) + "\"><span class=\"tag\">" +
-           isolated(tag) + "</span></a>\n";
-}
+/// Where a mark leads, and its own anchor; of a match in several lines, or a fault on several sheets, the
+/// first is what the row leads back to.
+struct Anchors {
+    std::string row;
+    std::string own = {};
+};
 
-std::string overlay(std::string const& anchor, std::string const& look, Box const& box, Sheet const& sheet,
-                    std::string const& tag, std::string const& label) {
-    return overlay(anchor, rowAnchor(anchor), look, box, sheet, tag, label);
-}
-
-std::string kindOf(Zone const& zone) { return zone.isAddressWindow ? "address window" : "zone"; }
-
-std::string overlayOf(Zone const& zone, std::string const& anchor, Sheet const& sheet) {
-    constexpr int TAG_HEIGHT = 400;
-    Box const box = onPage(zone.box, sheet);
-    std::string look = "zone";
-    look += zone.isAddressWindow ? " window" : "";
-    look += zone.isByPoint ? " point" : "";
-    look += box.top < TAG_HEIGHT ? " high" : "";
-    std::string const name = kindOf(zone) + ' ' + zone.name;
-    return overlay(anchor, look, box, sheet, name, name);
-}
-
-/// The first box of a match bears the name; those of lines that were joined with it lead to the same row.
-std::string overlayOf(Field const& field, std::string const& anchor, Sheet const& sheet) {
-    StateLook const state = lookOf(field);
-    std::string const look = std::string("match ") + state.look;
-    std::string const tag = (isTrouble(field) ? "\u2717 " : "") + field.name;
-    std::string html =
-        overlay(anchor, look + TAGS.at(static_cast<std::size_t>(field.tag)),
-                onPage(field.match.front(), sheet), sheet, tag, "field " + field.name + ": " + state.words);
-    for (std::size_t i = 1; i < field.match.size(); ++i)
-        html += "<a class=\"" + look + "\" href=\"#" + rowAnchor(anchor) + "\" style=\"" +
-                styleOf(onPage(field.match[i], sheet), sheet) + "\" aria-label=\"field " +
-                escaped(field.name) + ", joined line\"></a>\n";
-    return html;
-}
-
-/// The name stands where the sheet does not end.
-std::string overlayOf(Fault const& fault, std::string const& anchor, std::string const& row,
-                      Sheet const& sheet) {
-    constexpr int TAG_HEIGHT = 500;
-    Box const box = onPage(fault.box, sheet);
-    std::string look = fault.isError ? "fault" : "fault slight";
-    look += box.centre().x > sheet.width / 2 ? " front" : "";
-    look += box.bottom > sheet.height - TAG_HEIGHT ? " above" : "";
-    return overlay(anchor, row, look, box, sheet, fault.code, fault.code + ": " + fault.says);
-}
-
-/// Those of a sheet, the largest first, so that none hides another from the pointer.
-std::vector<std::size_t> bySize(std::vector<Zone> const& zones, std::size_t sheet) {
-    std::vector<std::size_t> order;
-    for (std::size_t i = 0; i < zones.size(); ++i)
-        if (zones[i].sheet == sheet && zones[i].whyNowhere.empty())
-            order.push_back(i);
-    auto const area = [&](std::size_t index) {
-        return 1.0 * zones[index].box.width() * zones[index].box.height();
-    };
-    std::stable_sort(order.begin(), order.end(),
-                     [&](std::size_t one, std::size_t other) { return area(one) > area(other); });
-    return order;
-}
-
-std::string faultsOn(Letter const& letter, std::size_t place, std::string const& anchor) {
-    std::string html;
-    for (std::size_t i = 0; i < letter.faults.size(); ++i) {
-        Fault const& fault = letter.faults[i];
-        std::string const one = numbered(anchor, 'p', i);
-        auto const on = std::ranges::find(fault.sheets, place);
-        if (on != fault.sheets.end())
-            html += overlayOf(fault, on == fault.sheets.begin() ? one : numbered(one, 's', place),
-                              rowAnchor(one), letter.sheets[place]);
+Anchors anchorsOf(Shape const& shape, Letter const& letter, std::size_t place, std::string const& anchor) {
+    if (shape.fault) {
+        std::string const one = numbered(anchor, 'p', *shape.fault);
+        bool const isFirst = letter.faults[*shape.fault].sheets.front() == place;
+        return {rowAnchor(one), isFirst ? one : numbered(one, 's', place)};
     }
-    return html;
+    std::string one = numbered(anchor, 'z', *shape.zone);
+    if (shape.field)
+        one = numbered(one, 'f', *shape.field);
+    return {rowAnchor(one), shape.tag ? one : std::string()};
+}
+
+std::string htmlOf(Shape const& shape, Anchors const& anchors, Sheet const& sheet) {
+    return "<a class=\"" + shape.look + '"' + (anchors.own.empty() ? "" : " id=\"" + anchors.own + '"') +
+           " href=\"#" + anchors.row + "\" style=\"" + styleOf(shape.box, sheet) + "\" aria-label=\"" +
+           escaped(shape.label) + "\">" +
+           (shape.tag ? "<span class=\"tag\">" + isolated(*shape.tag) + "</span>" : "") + "</a>\n";
 }
 
 std::string overlaysOf(Letter const& letter, std::size_t place, std::string const& anchor) {
-    Sheet const& sheet = letter.sheets[place];
-    if (sheet.width <= 0 || sheet.height <= 0)
-        return {};
-    std::vector<std::size_t> order = bySize(letter.zones, place);
     std::string html;
-    for (std::size_t const index : order)
-        html += overlayOf(letter.zones[index], numbered(anchor, 'z', index), sheet);
-    std::sort(order.begin(), order.end());
-    for (std::size_t const index : order) {
-        std::vector<Field> const& fields = letter.zones[index].fields;
-        for (std::size_t k = 0; k < fields.size(); ++k) {
-            if (!fields[k].match.empty())
-                html += overlayOf(fields[k], numbered(numbered(anchor, 'z', index), 'f', k), sheet);
-        }
-    }
-    return html + faultsOn(letter, place, anchor);
+    for (Shape const& shape : shapesOn(letter, place))
+        html += htmlOf(shape, anchorsOf(shape, letter, place, anchor), letter.sheets[place]);
+    return html;
 }
 
 std::string pictureOf(Sheet const& sheet) {
@@ -366,7 +270,7 @@ std::string headOf(std::string const& outcome) {
            "<meta http-equiv=\"Content-Security-Policy\" content=\"" + POLICY + "\">\n" +
            "<meta name=\"viewport\" content=\"width=device-width, initial-scale=1\">\n" +
            "<meta name=\"referrer\" content=\"no-referrer\">\n<title>Letters: " + escaped(outcome) +
-           "</title>\n<style>" + STYLE + "</style>\n</head>\n";
+           "</title>\n<style>" + STYLE + DRAWING_STYLE + PRINT_STYLE + "</style>\n</head>\n";
 }
 
 } // namespace

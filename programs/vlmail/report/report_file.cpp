@@ -26,16 +26,21 @@ std::size_t stuckLetters(DocumentReading const& reading) {
                       [](LetterReading const& letter) { return !letter.whyNot().empty(); }));
 }
 
-std::string stateOf(DocumentReading const& reading, std::size_t stuck) {
+} // namespace
+
+std::string stateOf(DocumentReading const& reading) {
     if (reading.failed())
         return "failed";
     if (reading.isAttachment())
         return "an attachment";
+    std::size_t const stuck = stuckLetters(reading);
     std::string const letters = counted(reading.letters->size(), "letter");
     return letters + ", " + (stuck == 0 ? "ready" : std::to_string(stuck) + " cannot go out");
 }
 
-} // namespace
+bool isTrouble(DocumentReading const& reading) {
+    return reading.failed() || (reading.letters && stuckLetters(reading) > 0);
+}
 
 File::File(fs::path const& target) : target_(requireHtml(target)) {
     // Known now rather than after a long batch.
@@ -44,9 +49,8 @@ File::File(fs::path const& target) : target_(requireHtml(target)) {
 
 void File::take(ReadResult const& result) {
     DocumentReading const& reading = result.reading;
-    std::size_t const stuck = reading.letters ? stuckLetters(reading) : 0;
     entries_.push_back(
-        {reading.document, stateOf(reading, stuck), reading.failed() || stuck > 0,
+        {reading.document, stateOf(reading), isTrouble(reading),
          result.report.empty() ? section(describe(reading), entries_.size() + 1) : result.report});
 }
 

@@ -6,9 +6,15 @@
 #include "programs/vlmail/report/report.h"
 
 #include <filesystem>
+#include <string>
 #include <vector>
 
 namespace VlMail::Report {
+
+/// Such as "2 letters, 1 cannot go out".
+std::string stateOf(DocumentReading const& reading);
+/// It failed, or some of its letters cannot go out.
+bool isTrouble(DocumentReading const& reading);
 
 /// Takes the results of a batch in its order; write() makes the file. Without it there is none.
 class File {

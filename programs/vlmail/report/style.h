@@ -47,39 +47,6 @@ h3 .state, .why { white-space: normal; }
 figure { margin: 0; }
 figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9em; }
 
-.sheet { --high: 75rem; position: relative; container-type: inline-size; width: min(100%, calc(var(--high) * var(--w) / var(--h)));
-    aspect-ratio: var(--w) / var(--h); background: #fff; color: #1b1f24; overflow: hidden;
-    box-shadow: 0 0 0 1px var(--line); }
-.sheet img { display: block; width: 100%; height: 100%; }
-.sheet p { margin: 0; padding: 45% 10%; text-align: center; }
-.sheet a { position: absolute; text-decoration: none; }
-.zone { border: 1px dashed #35548c; }
-.zone.point { border-style: dotted; border-width: 2px; }
-.zone.window { border: 2px solid #7b2d9b; }
-.match { border: 1px solid #17692f; background-image: linear-gradient(rgb(23 105 47 / 14%) 0 100%); }
-.match.quiet { border: 1px dotted #555d68;
-    background-image: linear-gradient(rgb(85 93 104 / 14%) 0 100%); }
-.match.bad { border: 2px dashed #b3152a; background-image: repeating-linear-gradient(135deg, rgb(179 21 42 / 22%) 0 3px,
-    rgb(179 21 42 / 6%) 3px 8px); }
-.fault { border: 3px double #d00000; background-image: linear-gradient(rgb(208 0 0 / 16%) 0 100%); }
-.fault.slight { border: 2px dotted #d00000; background-image: none; }
-.tag { position: absolute; z-index: 1; padding: 0 .3em; font: 600 .68rem/1.35 system-ui, sans-serif; white-space: nowrap;
-    font-size: clamp(.3rem, 1.5cqw, .72rem); color: #fff; background: #35548c; }
-.zone > .tag { left: -1px; bottom: 100%; }
-.zone.high > .tag { top: 0; bottom: auto; }
-.window > .tag { left: -2px; background: #7b2d9b; }
-.match > .tag { left: calc(100% + 1px); top: -1px; background: #17692f; }
-.match.front > .tag { left: auto; right: calc(100% + 1px); }
-.match.above > .tag { left: -1px; top: auto; bottom: 100%; }
-.match.quiet > .tag { background: #555d68; }
-.match.bad > .tag { background: #b3152a; }
-.fault > .tag { left: -1px; top: 100%; background: #d00000; }
-.fault.front > .tag { left: auto; right: -1px; }
-.fault.above > .tag { top: auto; bottom: 100%; }
-.sheet a:focus-visible { outline: 3px solid #0b57d0; box-shadow: 0 0 0 6px #fff; z-index: 3; }
-.sheet a:hover { z-index: 2; box-shadow: 0 0 0 2px #0b57d0; }
-.sheet a:target { z-index: 2; outline: 4px solid #d97706; outline-offset: 1px; }
-
 .sides { display: flex; flex-wrap: wrap; gap: 1rem; margin: 1.25rem 0 0; padding: 0; list-style: none;
     color: var(--quiet); font-size: .85em; }
 .side { width: calc(8rem * var(--w) / var(--h)); height: 8rem; margin-bottom: .25rem; background: #fff;
@@ -111,7 +78,9 @@ tr, .sheet a { scroll-margin: 5rem; }
     .fields { position: sticky; top: 1rem; max-height: calc(100vh - 2rem); overflow-y: auto; padding: .2rem; }
 }
 .fields { overflow-x: auto; }
-@page { size: A4 landscape; margin: 10mm; }
+)css";
+
+constexpr char const* PRINT_STYLE = R"css(@page { size: A4 landscape; margin: 10mm; }
 @media print {
     :root { --ground: #fff; --card: #fff; --text: #000; --quiet: #333; --line: #999; --fine: #17692f; --bad: #b3152a;
         --bad-ground: #fdecee; --mark: transparent; --link: #000; color-scheme: light; }

@@ -2,6 +2,7 @@
 
 #include "programs/base/error.h"
 #include "programs/base/read_file.h"
+#include "programs/vlmail/report/shapes.h"
 
 #include <algorithm>
 #include <array>
@@ -80,6 +81,8 @@ Answer pageFile(std::string_view target, std::filesystem::path const& codemirror
     name.remove_prefix(name.starts_with('/') ? 1 : 0);
     if (name.starts_with(EDITOR))
         return editorFile(name.substr(EDITOR.size()), codemirror);
+    if (name == "drawing.css")
+        return {200, typeOf(name), Report::DRAWING_STYLE};
     auto const files = embeddedFiles();
     auto const file = std::ranges::find(files, name.empty() ? "index.html" : name, &PageFile::name);
     return file == files.end() ? noSuchFile() : Answer{200, typeOf(file->name), std::string(file->content)};

@@ -1,0 +1,179 @@
+#include "programs/vlmail/workbench/desk.h"
+
+#include "programs/base/error.h"
+#include "programs/base/quoting.h"
+#include "programs/base/utf8.h"
+#include "programs/reader/layout.h"
+#include "programs/reader/letters.h"
+#include "programs/reader/lines.h"
+#include "programs/vlmail/letters/making_ready.h"
+#include "programs/vlmail/workbench/evaluation.h"
+#include "vlservice/json/json_text.h"
+
+#include <array>
+#include <new>
+
+namespace VlMail::Workbench {
+namespace {
+
+namespace fs = std::filesystem;
+
+struct Question {
+    char const* name;
+    Answer (Desk::*answer)(json::Object const&);
+};
+
+constexpr std::array QUESTIONS{
+    Question{"evaluate", &Desk::evaluate}, Question{"lint", &Desk::lint},     Question{"edit", &Desk::edit},
+    Question{"picture", &Desk::picture},   Question{"blocks", &Desk::blocks},
+};
+
+json::Object brokenToJson(BrokenText const& broken) {
+    return {{"line", broken.says}, {"from", toJson(broken.place)}};
+}
+
+/// {"broken"} of a text that is no JSON, and the findings of one that is.
+json::Object linted(std::optional<BrokenText> const& broken, SettingsInWork* settings) {
+    json::Object answer;
+    answer.set("broken", broken ? json::Value(brokenToJson(*broken)) : json::Value(json_null()));
+    answer.set("lint", settings ? settings->findings() : json::Array());
+    return answer;
+}
+
+fs::path fileOf(json::Object const& query, fs::path const& folder) {
+    return folder / query.get("document").toString();
+}
+
+int pageOf(json::Object const& query, Reader::Document const& document) {
+    long long const page = query.get("page").toInt();
+    if (page < 1 || page > document.pageCount())
+        throw Base::Error(Base::Code::RequestInvalid, "the document has no page " + std::to_string(page) +
+                                                          "; it has " + std::to_string(document.pageCount()));
+    return static_cast<int>(page);
+}
+
+SettingsText changed(SettingsText const& text, json::Object const& change) {
+    std::string const pointer = change.get("pointer").toString();
+    if (change.get("remove").isTrue())
+        return text.without(pointer);
+    json::Value const value = change.get("value");
+    if (!value)
+        throw Base::Error(Base::Code::RequestInvalid, "a change wants \"value\" or \"remove\"");
+    return change.get("insert").isTrue() ? text.withInserted(pointer, value) : text.with(pointer, value);
+}
+
+json::Array linesOf(Reader::Page const& page, Reader::Layout const& layout) {
+    json::Array lines;
+    for (Reader::Line const& line : layout.lines)
+        lines.append(json::Object{{"text", Reader::textOf(page, line)}, {"box", toJson(line.box)}});
+    return lines;
+}
+
+json::Array blocksOf(Reader::Layout const& layout) {
+    json::Array blocks;
+    for (Reader::Block const& block : layout.blocks)
+        blocks.append(toJson(block.box));
+    return blocks;
+}
+
+} // namespace
+
+Answer Desk::answer(std::string const& what, std::string const& query) {
+    try {
+        json::Object const parameters = json::strToObject(query.data(), query.size());
+        for (Question const& question : QUESTIONS)
+            if (what == question.name)
+                return (this->*question.answer)(parameters);
+        return failureOf(404, Base::Code::RequestInvalid,
+                         "there is no request " + Base::inQuotes(Base::validUtf8(what)));
+    } catch (std::bad_alloc const&) {
+        throw;
+    } catch (json::Exc const& wrong) {
+        return failureOf(400, Base::Code::RequestInvalid,
+                         std::string("a parameter of the request is wrong: ") + wrong.what());
+    } catch (std::exception const& failure) {
+        return failureOf(failure);
+    }
+}
+
+SettingsInWork& Desk::settings(json::Object const& query) {
+    std::string text = query.get("settings").toString();
+    if (!settings_ || settings_->text().text() != text) {
+        settings_.reset();
+        settings_ = std::make_unique<SettingsInWork>(std::move(text));
+    }
+    return *settings_;
+}
+
+Reader::Document& Desk::document(json::Object const& query) {
+    return documents_.document(fileOf(query, folders_.documents));
+}
+
+Answer Desk::evaluate(json::Object const& query) {
+    std::optional<BrokenText> const broken = whatIsBroken(query.get("settings").toString());
+    json::Object answer = linted(broken, broken ? nullptr : &settings(query));
+    answer.set("document", query.get("document").toString());
+    if (broken)
+        return answerOf(answer);
+    try {
+        if (!query.get("checks").isTrue()) {
+            addEvaluation(answer, document(query), *settings_, nullptr);
+            return answerOf(answer);
+        }
+        MakingReady making(MakingReady::Colours::Ignored);
+        making.prepareFor({fileOf(query, folders_.documents).string()}, settings_->presets().presets(),
+                          DocumentFolder(folders_.letterheads), {});
+        addEvaluation(answer, document(query), *settings_, &making);
+    } catch (Base::Error const& failure) {
+        answer.set("verdict", "failed");
+        answer.set("says", "failed");
+        answer.set("error", json::Object{{"code", Base::nameOf(failure.code())},
+                                         {"line", Base::validUtf8(failure.what())}});
+    }
+    return answerOf(answer);
+}
+
+Answer Desk::lint(json::Object const& query) {
+    std::optional<BrokenText> const broken = whatIsBroken(query.get("settings").toString());
+    return answerOf(linted(broken, broken ? nullptr : &settings(query)));
+}
+
+Answer Desk::edit(json::Object const& query) {
+    SettingsText const before(query.get("settings").toString());
+    SettingsText after = before;
+    for (json::Value const& change : query.get("changes").toArray())
+        after = changed(after, change.toObject());
+    return answerOf({{"settings", after.text()}, {"edits", toJson(editsBetween(before, after.text()))}});
+}
+
+Answer Desk::picture(json::Object const& query) {
+    constexpr long long LEAST = 20;
+    constexpr long long MOST = 300;
+    Reader::Document& read = document(query);
+    int const page = pageOf(query, read);
+    long long const dots = query.get("dots").toInt();
+    if (dots < LEAST || dots > MOST)
+        throw Base::Error(Base::Code::RequestInvalid, "\"dots\" is from 20 to 300 an inch");
+    std::optional<Reader::Document> printed = read.printed(page);
+    auto const dotsPerInch = static_cast<double>(dots);
+    return {200, "image/png",
+            printed ? printed->renderPage(1, dotsPerInch) : read.renderPage(page, dotsPerInch)};
+}
+
+Answer Desk::blocks(json::Object const& query) {
+    Reader::Document& read = document(query);
+    Reader::Page const& page = read.page(pageOf(query, read));
+    Reader::LayoutRules rules;
+    if (query.get("settings").isString() && !whatIsBroken(query.get("settings").toString())) {
+        auto const [preset, pack] = settings(query).presets().findMatch(read.name());
+        rules = Reader::rulesOf(preset);
+    }
+    Reader::Layout const layout = Reader::layOut(page, rules);
+    return answerOf({{"page", page.number},
+                     {"width", page.width},
+                     {"height", page.height},
+                     {"blocks", blocksOf(layout)},
+                     {"lines", linesOf(page, layout)}});
+}
+
+} // namespace VlMail::Workbench

@@ -1,0 +1,49 @@
+#pragma once
+// What the reading process does: documents by settings that are being written.
+
+#include "programs/vlmail/workbench/answer.h"
+#include "programs/vlmail/workbench/kept_documents.h"
+#include "programs/vlmail/workbench/settings_in_work.h"
+
+#include "vlservice/json/json.h"
+
+#include <filesystem>
+#include <memory>
+#include <string>
+
+namespace VlMail::Workbench {
+
+/// Where the documents lie, and those that pack presets name.
+struct Folders {
+    std::filesystem::path documents;
+    /// Empty for none.
+    std::filesystem::path letterheads = {};
+};
+
+/// Keeps what it has read and what it has understood of settings, so that a change of a pattern costs the
+/// search for it alone. Used by one process.
+class Desk {
+public:
+    explicit Desk(Folders folders) : folders_(std::move(folders)) {}
+
+    /// What is asked and its parameters as JSON; docs/workbench.md lists them. Failures are answers.
+    Answer answer(std::string const& what, std::string const& query);
+
+    // Each takes its parameters and throws Base::Error or json::Exc.
+
+    Answer evaluate(json::Object const& query);
+    Answer lint(json::Object const& query);
+    Answer edit(json::Object const& query);
+    Answer picture(json::Object const& query);
+    Answer blocks(json::Object const& query);
+
+private:
+    SettingsInWork& settings(json::Object const& query);
+    Reader::Document& document(json::Object const& query);
+
+    Folders folders_;
+    KeptDocuments documents_;
+    std::unique_ptr<SettingsInWork> settings_;
+};
+
+} // namespace VlMail::Workbench

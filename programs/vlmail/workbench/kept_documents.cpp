@@ -1,0 +1,42 @@
+#include "programs/vlmail/workbench/kept_documents.h"
+
+#include "programs/base/error.h"
+#include "programs/base/quoting.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <sys/stat.h>
+#include <system_error>
+
+namespace VlMail::Workbench {
+
+FileMark markOf(std::filesystem::path const& file) {
+    constexpr std::int64_t NANOSECONDS = 1'000'000'000;
+    struct stat status {};
+    if (::stat(file.c_str(), &status) != 0)
+        throw Base::Error(Base::Code::FileUnreadable, "cannot read " + Base::inQuotes(file.string()) + ": " +
+                                                          std::generic_category().message(errno) +
+                                                          "; look whether it is still there");
+    if (!S_ISREG(status.st_mode))
+        throw Base::Error(Base::Code::FileUnsuitable,
+                          "cannot read " + Base::inQuotes(file.string()) + ": it is no ordinary file");
+    return {status.st_dev, status.st_ino, static_cast<std::uint64_t>(status.st_size),
+            status.st_mtim.tv_sec * NANOSECONDS + status.st_mtim.tv_nsec};
+}
+
+Reader::Document& KeptDocuments::document(std::filesystem::path const& file) {
+    FileMark const mark = markOf(file);
+    auto const kept = std::ranges::find(kept_, file, &Kept::file);
+    if (kept != kept_.end() && kept->mark == mark) {
+        kept_.splice(kept_.begin(), kept_, kept);
+        return kept_.front().document;
+    }
+    if (kept != kept_.end())
+        kept_.erase(kept);
+    kept_.push_front({file, mark, Reader::openDocument(file)});
+    if (kept_.size() > MOST)
+        kept_.pop_back();
+    return kept_.front().document;
+}
+
+} // namespace VlMail::Workbench

@@ -1,0 +1,48 @@
+#pragma once
+// Documents that were read, as long as their files stay what they were.
+
+#include "programs/reader/document.h"
+
+#include <cstdint>
+#include <filesystem>
+#include <list>
+#include <memory>
+#include <string>
+#include <sys/types.h>
+
+namespace VlMail::Workbench {
+
+/// What tells that a file is the one that was read.
+struct FileMark {
+    std::uint64_t device = 0;
+    std::uint64_t inode = 0;
+    std::uint64_t size = 0;
+    std::int64_t modified = 0;
+
+    friend bool operator==(FileMark const&, FileMark const&) = default;
+};
+
+/// Throws Base::Error for what is no ordinary file.
+FileMark markOf(std::filesystem::path const& file);
+
+class KeptDocuments {
+public:
+    /// The document of that file, read anew when it has changed; valid until the next call. Throws
+    /// Base::Error.
+    Reader::Document& document(std::filesystem::path const& file);
+
+private:
+    /// Those that a person goes back and forth between.
+    static constexpr std::size_t MOST = 8;
+
+    struct Kept {
+        std::filesystem::path file;
+        FileMark mark;
+        Reader::Document document;
+    };
+
+    /// The last that was asked for is the first.
+    std::list<Kept> kept_;
+};
+
+} // namespace VlMail::Workbench
