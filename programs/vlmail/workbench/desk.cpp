@@ -6,12 +6,16 @@
 #include "programs/reader/layout.h"
 #include "programs/reader/letters.h"
 #include "programs/reader/lines.h"
+#include "programs/vlmail/golden/expectation.h"
+#include "programs/vlmail/golden/test_case.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/workbench/evaluation.h"
 #include "vlservice/json/json_text.h"
 
+#include <algorithm>
 #include <array>
 #include <new>
+#include <system_error>
 
 namespace VlMail::Workbench {
 namespace {
@@ -24,8 +28,13 @@ struct Question {
 };
 
 constexpr std::array QUESTIONS{
-    Question{"evaluate", &Desk::evaluate}, Question{"lint", &Desk::lint},     Question{"edit", &Desk::edit},
-    Question{"picture", &Desk::picture},   Question{"blocks", &Desk::blocks},
+    Question{"evaluate", &Desk::evaluate},
+    Question{"lint", &Desk::lint},
+    Question{"edit", &Desk::edit},
+    Question{"picture", &Desk::picture},
+    Question{"blocks", &Desk::blocks},
+    Question{"verdict", &Desk::verdict},
+    Question{"expectation", &Desk::expectation},
 };
 
 json::Object brokenToJson(BrokenText const& broken) {
@@ -96,13 +105,18 @@ Answer Desk::answer(std::string const& what, std::string const& query) {
     }
 }
 
-SettingsInWork& Desk::settings(json::Object const& query) {
-    std::string text = query.get("settings").toString();
-    if (!settings_ || settings_->text().text() != text) {
-        settings_.reset();
-        settings_ = std::make_unique<SettingsInWork>(std::move(text));
-    }
-    return *settings_;
+SettingsInWork& Desk::settingsOf(std::string const& text) {
+    // Those that are written, and those before.
+    constexpr std::size_t MOST = 2;
+    auto const known =
+        std::ranges::find_if(settings_, [&](SettingsInWork const& one) { return one.text().text() == text; });
+    if (known != settings_.end())
+        settings_.splice(settings_.begin(), settings_, known);
+    else
+        settings_.emplace_front(text);
+    if (settings_.size() > MOST)
+        settings_.pop_back();
+    return settings_.front();
 }
 
 Reader::Document& Desk::document(json::Object const& query) {
@@ -117,13 +131,13 @@ Answer Desk::evaluate(json::Object const& query) {
         return answerOf(answer);
     try {
         if (!query.get("checks").isTrue()) {
-            addEvaluation(answer, document(query), *settings_, nullptr);
+            addEvaluation(answer, document(query), settings(query), nullptr);
             return answerOf(answer);
         }
         MakingReady making(MakingReady::Colours::Ignored);
-        making.prepareFor({fileOf(query, folders_.documents).string()}, settings_->presets().presets(),
+        making.prepareFor({fileOf(query, folders_.documents).string()}, settings(query).presets().presets(),
                           DocumentFolder(folders_.letterheads), {});
-        addEvaluation(answer, document(query), *settings_, &making);
+        addEvaluation(answer, document(query), settings(query), &making);
     } catch (Base::Error const& failure) {
         answer.set("verdict", "failed");
         answer.set("says", "failed");
@@ -174,6 +188,99 @@ Answer Desk::blocks(json::Object const& query) {
                      {"height", page.height},
                      {"blocks", blocksOf(layout)},
                      {"lines", linesOf(page, layout)}});
+}
+
+namespace {
+
+std::optional<FileMark> markIfThere(fs::path const& file) {
+    std::error_code ignored;
+    return fs::exists(file, ignored) ? std::optional(markOf(file)) : std::nullopt;
+}
+
+/// As a batch reads it, without looking at paper.
+DocumentReading readingOf(Reader::Document& document, SettingsInWork& settings) {
+    Along along;
+    along.limits = Along::Limits::Yes;
+    return readDocument(document, settings.presets(), settings.node(), along).reading;
+}
+
+/// The definitions that the document was read by; none when it got no preset.
+Cfg::ExtractZones definitionsFor(DocumentReading const& reading, SettingsInWork& settings) {
+    return reading.failed() ? Cfg::ExtractZones()
+                            : settings.presets().findMatch(reading.document).first.zones();
+}
+
+/// One that cannot be read at all.
+DocumentReading unreadable(std::string const& document, Base::Error const& failure) {
+    DocumentReading reading;
+    reading.document = document;
+    reading.error = Base::validUtf8(failure.what());
+    reading.code = failure.code();
+    return reading;
+}
+
+} // namespace
+
+DocumentVerdict const& Desk::judge(std::string const& text, std::string const& name) {
+    // Those of a few steps back, too.
+    constexpr std::size_t MOST = 6;
+    auto const known = std::ranges::find(judged_, text, [](auto const& one) { return one.first; });
+    if (known != judged_.end())
+        judged_.splice(judged_.begin(), judged_, known);
+    else
+        judged_.emplace_front(text, std::map<std::string, Judged>());
+    if (judged_.size() > MOST)
+        judged_.pop_back();
+    std::map<std::string, Judged>& byName = judged_.front().second;
+    fs::path const file = folders_.documents / name;
+    fs::path const expectation = expectationBeside(file);
+    try {
+        FileMark const mark = markOf(file);
+        std::optional<FileMark> const expected = markIfThere(expectation);
+        auto const found = byName.find(name);
+        if (found != byName.end() && found->second.document == mark && found->second.expectation == expected)
+            return found->second.verdict;
+        SettingsInWork& settings = settingsOf(text);
+        DocumentReading reading = readingOf(documents_.document(file), settings);
+        Cfg::ExtractZones const definitions = definitionsFor(reading, settings);
+        return byName
+            .insert_or_assign(name,
+                              Judged{mark, expected, verdictOf(std::move(reading), expectation, definitions)})
+            .first->second.verdict;
+    } catch (Base::Error const& failure) {
+        return byName
+            .insert_or_assign(name, Judged{{}, {}, verdictOf(unreadable(name, failure), expectation, {})})
+            .first->second.verdict;
+    }
+}
+
+Answer Desk::verdict(json::Object const& query) {
+    std::string const name = query.get("document").toString();
+    DocumentVerdict const& after = judge(query.get("settings").toString(), name);
+    json::Object answer = after.toJson();
+    answer.set("document", name);
+    json::Value const before = query.get("before");
+    answer.set("before", json::Value(json_null()));
+    answer.set("change", json::Value(json_null()));
+    answer.set("changes", json::Array());
+    if (!before.isString())
+        return answerOf(answer);
+    DocumentVerdict const& old = judge(before.toString(), name);
+    Comparison const comparison = compare(old, after);
+    json::Array lines;
+    for (std::string const& line : comparison.lines)
+        lines.append(line);
+    answer.set("before", old.toJson());
+    answer.set("change", nameOf(comparison.change));
+    answer.set("changes", lines);
+    return answerOf(answer);
+}
+
+Answer Desk::expectation(json::Object const& query) {
+    DocumentReading const reading = readingOf(document(query), settings(query));
+    if (reading.failed())
+        throw Base::Error(reading.code, reading.error);
+    return answerOf({{"text", printed(expectationOf(reading))}});
 }
 
 } // namespace VlMail::Workbench

@@ -4,12 +4,16 @@
 #include "programs/vlmail/workbench/answer.h"
 #include "programs/vlmail/workbench/kept_documents.h"
 #include "programs/vlmail/workbench/settings_in_work.h"
+#include "programs/vlmail/workbench/verdict.h"
 
 #include "vlservice/json/json.h"
 
 #include <filesystem>
-#include <memory>
+#include <list>
+#include <map>
+#include <optional>
 #include <string>
+#include <utility>
 
 namespace VlMail::Workbench {
 
@@ -36,14 +40,31 @@ public:
     Answer edit(json::Object const& query);
     Answer picture(json::Object const& query);
     Answer blocks(json::Object const& query);
+    /// Of one document, against the settings before where they are told.
+    Answer verdict(json::Object const& query);
+    /// What would be kept as a golden case.
+    Answer expectation(json::Object const& query);
 
 private:
-    SettingsInWork& settings(json::Object const& query);
+    /// Verdicts by settings, for the document of that file.
+    struct Judged {
+        FileMark document;
+        std::optional<FileMark> expectation;
+        DocumentVerdict verdict;
+    };
+
+    SettingsInWork& settings(json::Object const& query) {
+        return settingsOf(query.get("settings").toString());
+    }
+    SettingsInWork& settingsOf(std::string const& text);
     Reader::Document& document(json::Object const& query);
+    DocumentVerdict const& judge(std::string const& text, std::string const& document);
 
     Folders folders_;
     KeptDocuments documents_;
-    std::unique_ptr<SettingsInWork> settings_;
+    /// The last are the first.
+    std::list<SettingsInWork> settings_;
+    std::list<std::pair<std::string, std::map<std::string, Judged>>> judged_;
 };
 
 } // namespace VlMail::Workbench

@@ -7,6 +7,7 @@
 #include "programs/vlmail/report/report_file.h"
 #include "programs/vlmail/report/shapes.h"
 #include "programs/vlmail/workbench/changes.h"
+#include "programs/vlmail/workbench/verdict.h"
 
 #include <algorithm>
 #include <array>
@@ -218,13 +219,6 @@ void addPresets(json::Object& answer, DocumentReading const& reading, SettingsIn
     answer.set("pack_preset", json::Object{{"name", pack.name()}, {"pointer", teller.packPointer()}});
 }
 
-char const* verdictOf(DocumentReading const& reading) {
-    return reading.failed()             ? "failed"
-           : reading.isAttachment()     ? "attachment"
-           : Report::isTrouble(reading) ? "trouble"
-                                        : "ready";
-}
-
 json::Value errorOf(DocumentReading const& reading) {
     if (!reading.failed())
         return null();
@@ -255,7 +249,7 @@ void addEvaluation(json::Object& answer, Reader::Document& document, SettingsInW
     DocumentReading const reading =
         readDocument(document, settings.presets(), settings.node(), along).reading;
     answer.set("page_count", document.pageCount());
-    answer.set("verdict", verdictOf(reading));
+    answer.set("verdict", verdictWord(reading));
     answer.set("says", Report::stateOf(reading));
     answer.set("error", errorOf(reading));
     addPresets(answer, reading, settings);

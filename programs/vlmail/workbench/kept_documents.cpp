@@ -31,12 +31,21 @@ Reader::Document& KeptDocuments::document(std::filesystem::path const& file) {
         kept_.splice(kept_.begin(), kept_, kept);
         return kept_.front().document;
     }
-    if (kept != kept_.end())
+    if (kept != kept_.end()) {
+        bytes_ -= kept->mark.size;
         kept_.erase(kept);
+    }
     kept_.push_front({file, mark, Reader::openDocument(file)});
-    if (kept_.size() > MOST)
-        kept_.pop_back();
+    bytes_ += mark.size;
+    dropOldest();
     return kept_.front().document;
+}
+
+void KeptDocuments::dropOldest() {
+    while (kept_.size() > 1 && (kept_.size() > MOST || bytes_ > MOST_BYTES)) {
+        bytes_ -= kept_.back().mark.size;
+        kept_.pop_back();
+    }
 }
 
 } // namespace VlMail::Workbench

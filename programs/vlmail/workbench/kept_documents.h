@@ -32,8 +32,11 @@ public:
     Reader::Document& document(std::filesystem::path const& file);
 
 private:
-    /// Those that a person goes back and forth between.
-    static constexpr std::size_t MOST = 8;
+    /// A folder of letters, as far as they are small; what is large is read anew when its turn comes again.
+    static constexpr std::size_t MOST = 1'200;
+    static constexpr std::uint64_t MOST_BYTES = std::uint64_t{64} << 20;
+
+    void dropOldest();
 
     struct Kept {
         std::filesystem::path file;
@@ -43,6 +46,7 @@ private:
 
     /// The last that was asked for is the first.
     std::list<Kept> kept_;
+    std::uint64_t bytes_ = 0;
 };
 
 } // namespace VlMail::Workbench

@@ -12,6 +12,9 @@
 
 namespace VlMail::Workbench {
 
+/// Documents whose verdicts were asked for at once.
+struct Batch;
+
 class Session {
 public:
     Session(boost::asio::io_context& io, Folders folders, JobLimits const& limits,
@@ -26,11 +29,20 @@ private:
     Answer reload();
     Answer save(json::Object const& query);
     static Answer schema();
+    void judge(json::Object const& query, Door::Respond const& respond);
+    void passOverMissing(Batch& batch) const;
+    void judgeNext(std::shared_ptr<Batch> const& batch);
+    void keepGolden(json::Object const& query, std::string body, Door::Respond const& respond);
+    void requireDocument(std::string const& name) const;
 
     Folders folders_;
     std::unique_ptr<SettingsStore> store_;
     /// For the document that a person looks at.
     ReaderProcess front_;
+    /// For all the others, behind it.
+    ReaderProcess back_;
+    /// The verdicts that were asked for last.
+    std::shared_ptr<Batch> batch_;
 };
 
 } // namespace VlMail::Workbench
