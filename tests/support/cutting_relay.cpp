@@ -19,11 +19,11 @@ namespace {
 
 [[noreturn]] void fail(char const* what) { throw std::system_error(errno, std::generic_category(), what); }
 
-sockaddr_in loopback(std::uint16_t port) {
+sockaddr_in endpointAt(char const* host, std::uint16_t port) {
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_port = htons(port);
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    ::inet_pton(AF_INET, host, &address.sin_addr);
     return address;
 }
 
@@ -45,9 +45,9 @@ void withoutDelay(int socket) {
 
 } // namespace
 
-int connectedTo(std::uint16_t port) {
+int connectedTo(std::uint16_t port, char const* host) {
     int const socket = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in const address = loopback(port);
+    sockaddr_in const address = endpointAt(host, port);
     if (::connect(socket, reinterpret_cast<sockaddr const*>(&address), sizeof address) != 0) {
         ::close(socket);
         return -1;
@@ -56,9 +56,9 @@ int connectedTo(std::uint16_t port) {
     return socket;
 }
 
-CuttingRelay::CuttingRelay(Connect connect)
+CuttingRelay::CuttingRelay(Connect connect, char const* host)
     : connect_(std::move(connect)), listener_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-    sockaddr_in address = loopback(0);
+    sockaddr_in address = endpointAt(host, 0);
     socklen_t size = sizeof address;
     auto* const plain = reinterpret_cast<sockaddr*>(&address);
     if (::bind(listener_, plain, size) != 0 || ::listen(listener_, 16) != 0 ||

@@ -9,17 +9,19 @@
 
 namespace VLServiceTest {
 
-/// Listens on a port of its own on loopback, and passes on what comes by, piece by piece, in a thread of its
-/// own.
+/// Listens on a port of its own, on loopback unless it is told another address, and passes on what comes by,
+/// piece by piece, in a thread of its own.
 class CuttingRelay {
 public:
+    static constexpr char const* LOOPBACK = "127.0.0.1";
+
     /// Gives a socket to the server; called for each connection, in the relay's thread.
     using Connect = std::function<int()>;
     /// Called before a piece is passed on, with its number from 1 on over all connections; false cuts the
     /// connection in its place.
     using OnPiece = std::function<bool(int piece)>;
 
-    explicit CuttingRelay(Connect connect);
+    explicit CuttingRelay(Connect connect, char const* host = LOOPBACK);
     ~CuttingRelay();
     CuttingRelay(CuttingRelay const&) = delete;
     CuttingRelay& operator=(CuttingRelay const&) = delete;
@@ -53,7 +55,7 @@ private:
     std::thread thread_;
 };
 
-/// A socket to a port on loopback.
-int connectedTo(std::uint16_t port);
+/// A socket to a port; below 0 when nobody listens there.
+int connectedTo(std::uint16_t port, char const* host = CuttingRelay::LOOPBACK);
 
 } // namespace VLServiceTest
