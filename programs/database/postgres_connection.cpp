@@ -78,7 +78,8 @@ std::string connectionText(std::string const& address) {
 QueryError::Kind kindOf(std::string const& state) {
     if (state.starts_with("23"))
         return QueryError::Kind::Constraint;
-    if (state.starts_with("53"))
+    // Of the class of what a server has too little of: others pass by themselves.
+    if (state == "53100")
         return QueryError::Kind::Full;
     // Taken down, or dropped for standing still.
     if (state.starts_with("57P") || state.starts_with("08") || state == "25P03")

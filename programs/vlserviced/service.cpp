@@ -479,7 +479,7 @@ private:
                         static_cast<long long>(std::time(nullptr));
     }
 
-    /// A few times in the time after which others take up what this service works on.
+    /// A few times in the time after which others take up what this service works on, and it what they did.
     void awaitHold() {
         hold_.expires_after(std::chrono::milliseconds(jobs_.holder().seconds * 1000 / 4));
         hold_.async_wait([this](boost::system::error_code const& ec) {
@@ -488,6 +488,9 @@ private:
             awaitHold();
             runner_.keepHold();
             letterRunner_.keepHold();
+            // What a service that is gone has left is nobody's from the end of its time on.
+            if (neighbours_)
+                runner_.takeUp();
         });
     }
 

@@ -18,8 +18,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// With room for an empty database and a few MiB of mailings. The server's account has it.
-constexpr char const* SMALL_DISK = "size=64m,mode=0700,uid=65534,gid=65534";
+/// With room for an empty database and the mailings of a few minutes. The server's account has it.
+constexpr char const* SMALL_DISK = "size=128m,mode=0700,uid=65534,gid=65534";
 constexpr char const* DATABASE = "chaos";
 
 int connectedTo(fs::path const& path) {
@@ -54,7 +54,8 @@ bool Line::mayPass() {
     return left != 0;
 }
 
-Installation::Installation() {
+// What is erased has to give its room back soon.
+Installation::Installation() : server_({"autovacuum_naptime=1s", "autovacuum_vacuum_cost_delay=0"}) {
     if (!whyNot().empty())
         return;
     if (whyNoRelay().empty())
@@ -181,11 +182,11 @@ void Installation::thaw(std::size_t service) {
         process->signal(SIGCONT);
 }
 
-bool Installation::start(std::size_t service) {
+bool Installation::start(std::size_t service, ServiceProcess::Environment const& more) {
     Place& place = places_.at(service);
     if (place.port != 0)
         return true;
-    place.process = std::make_unique<ServiceProcess>(argumentsOf(service));
+    place.process = std::make_unique<ServiceProcess>(argumentsOf(service), more);
     place.port = place.process->port();
     return place.port != 0;
 }

@@ -81,7 +81,8 @@ public:
     // What goes on.
 
     /// Starts the service anew when it does not run. False when it did not come up.
-    bool start(std::size_t service);
+    bool start(std::size_t service, ServiceProcess::Environment const& more = {});
+    bool runs(std::size_t service) const { return places_.at(service).process->isRunning(); }
     /// Ends each and starts it anew; what went wrong with that, a line each.
     std::vector<std::string> restartAll();
     /// Past the relays, as often as it is asked.

@@ -44,8 +44,12 @@ std::vector<std::string> Round::run(std::vector<Step> const& steps, int clients)
     for (Step const& step : steps)
         step.run(installation_);
     load.stop();
-    answered_ = load.answered();
     findAll(load.unanswered());
+    return check(load.answered());
+}
+
+std::vector<std::string> Round::check(std::map<std::string, SentMailing> answered) {
+    answered_ = std::move(answered);
     findAll(installation_.restartAll());
     awaitRest();
     // What earlier processes have left is looked for at a start.

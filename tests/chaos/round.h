@@ -20,6 +20,8 @@ public:
 
     /// What was promised and not kept; empty when all was.
     std::vector<std::string> run(std::vector<Step> const& steps, int clients);
+    /// The same of mailings that were answered otherwise, with all services going on.
+    std::vector<std::string> check(std::map<std::string, SentMailing> answered);
     /// How many mailings were answered, and how many letters a person had to decide about.
     std::size_t answered() const { return answered_.size(); }
     std::size_t decided() const { return decided_; }

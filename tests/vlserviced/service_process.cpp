@@ -90,6 +90,13 @@ void ServiceProcess::signal(int number) const {
         ::kill(process_, number);
 }
 
+bool ServiceProcess::isRunning() const {
+    siginfo_t ended{};
+    return process_ > 0 &&
+           ::waitid(P_PID, static_cast<id_t>(process_), &ended, WEXITED | WNOHANG | WNOWAIT) == 0 &&
+           ended.si_pid == 0;
+}
+
 bool ServiceProcess::awaitEnd(int& status) const {
     if (process_ > 0 && starter_)
         status = starter_->wait();

@@ -40,6 +40,7 @@ public:
     std::uint16_t port() const;
 
     void signal(int number) const;
+    bool isRunning() const;
     /// Waits for its end and gives the exit status, or minus the number of the signal that ended it.
     int wait();
     /// What it has written to standard error, after its end.

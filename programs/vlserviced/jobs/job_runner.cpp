@@ -191,9 +191,11 @@ void JobRunner::keepHold() {
     jobs_.keep(packIds);
 }
 
+/// Of one that is not held nothing is changed: somebody else may have it.
 JobKey JobRunner::held(std::string const& packId) const {
+    constexpr long long NO_FENCE = -1;
     auto const found = held_.find(packId);
-    return found == held_.end() ? JobKey(packId) : JobKey(packId, found->second);
+    return {packId, found == held_.end() ? NO_FENCE : found->second};
 }
 
 void JobRunner::releaseDue() {
@@ -425,10 +427,13 @@ void JobRunner::sweep() {
     discardLeft();
 }
 
-/// What nobody may publish is staged under a fence that is past and not on record.
+/// What nobody may publish is staged under a fence that is past and not on record, or of a job that goes no
+/// further. Of an unknown job it may be that of others who use the folder.
 bool JobRunner::isStagedOfUse(std::string const& name, long long fence) const {
     std::optional<Job> const job = jobs_.find(fs::path(name).stem().string());
-    return !job || fence >= job->fence || (job->state == JobState::Submitting && fence == job->submitFence);
+    if (!job || (job->state == JobState::Submitting && fence == job->submitFence))
+        return true;
+    return fence >= job->fence && !hasLeft(job->state) && !hasEnded(job->state);
 }
 
 void JobRunner::startStaging(Job const& job) {
@@ -440,7 +445,7 @@ void JobRunner::startStaging(Job const& job) {
     inBackground(
         job.pack.packId, Step::Staging,
         [container = containerToStage(job), make = makingRest(job), folder, identity,
-         fence = held(job.pack.packId).fence.value_or(0)] {
+         fence = *held(job.pack.packId).fence] {
             UploadFolder const target(folder, *identity);
             make();
             stage(container, target, fence);
@@ -468,16 +473,23 @@ void JobRunner::onStaged(std::string const& packId, std::string const& folder, s
 void JobRunner::discard(Job const& job) {
     Outcome const unstaged = outcomeOf([&] {
         ServiceSettings const settings = surroundings_.settings();
-        if (!settings.uploadFolder().empty())
+        std::optional<long long> const fence = fenceToUnstage(job);
+        if (fence && !settings.uploadFolder().empty())
             unstage(job.containerName(),
-                    UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()),
-                    held(job.pack.packId).fence.value_or(job.fence));
+                    UploadFolder(settings.uploadFolder(), settings.uploadFolderIdentity()), *fence);
     });
     if (unstaged.kind != Outcome::Kind::Done)
         Log::Lock(4).logStreamLine() << "Pack " << job.pack.packId << " may lie in the upload folder under a "
                                      << "temporary name: " << unstaged.why;
     if (hasLeftOutbox(job))
         clearOutbox(job);
+}
+
+/// What others stage and are about to publish is theirs.
+std::optional<long long> JobRunner::fenceToUnstage(Job const& job) const {
+    if (auto const found = held_.find(job.pack.packId); found != held_.end())
+        return found->second;
+    return hasLeft(job.state) ? std::optional(job.fence) : std::nullopt;
 }
 
 bool JobRunner::recordChange(JobAction action, Job const& job) {
@@ -628,7 +640,7 @@ void JobRunner::noteProblem(std::string const& packId, std::string const& proble
     if (jobs_.find(packId).value().problem == problem)
         return;
     Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot go on: " << problem;
-    jobs_.setProblem(held(packId), problem);
+    jobs_.setProblem(held_.contains(packId) ? held(packId) : JobKey(packId), problem);
 }
 
 void JobRunner::inBackground(std::string const& packId, Step step, std::function<void()> work,
@@ -642,8 +654,10 @@ void JobRunner::inBackground(std::string const& packId, Step step, std::function
                 letGo(packId);
             takeUp();
         } catch (std::exception const& failure) {
-            // The record did not change, so the step is made again by whoever takes it up next.
-            held_.erase(packId);
+            // The record did not change, so the step is made again by whoever takes it up next; unless it is
+            // the next step that has begun already.
+            if (!busy_.contains(packId))
+                held_.erase(packId);
             Log::Lock(3).logStreamLine() << "Pack " << packId << " cannot be recorded. " << failure.what();
         }
     };

@@ -17,6 +17,7 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <optional>
 #include <set>
 #include <string>
 
@@ -128,6 +129,7 @@ private:
     void goOn(Job const& job);
     void letGo(std::string const& packId);
     JobKey held(std::string const& packId) const;
+    std::optional<long long> fenceToUnstage(Job const& job) const;
     std::function<void()> packing(Job const& job) const;
     /// The same where it is not in this outbox: another machine may have made it.
     std::function<void()> makingContainer(Job const& job) const;

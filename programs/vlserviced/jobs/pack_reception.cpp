@@ -89,12 +89,15 @@ public:
             store_->forget(id);
             kept.reset();
         }
+        if (!kept) {
+            add(head, quota);
+            // Another service may have been faster.
+            kept = store_->find(id);
+        }
         if (kept && !isSame(kept->head, head))
             refuseOther(id);
         if (kept && kept->state == KeptPack::State::Complete)
             return ask(head, isKnown);
-        if (!kept)
-            add(head, quota);
         return goOn(head);
     }
 
@@ -115,12 +118,12 @@ public:
         std::string const& packId = pieces[from].packId;
         bool isOpen = false;
         std::string const failure = failureOf([&] {
-            IncomingPack& pack = incoming(packId);
+            Incoming& incoming = comingOf(packId);
             isOpen = true;
             std::vector<PagePiece> taken;
             for (std::size_t i = from; i < to; ++i)
-                taken.push_back(pack.take(Channel::parseData(pieces[i].text)));
-            store_->store(packId, taken, now_());
+                taken.push_back(incoming.pack.take(Channel::parseData(pieces[i].text)));
+            store_->store(packId, incoming.fence, taken, now_());
         });
         // One that is complete may be that of a job.
         if (!failure.empty() && isOpen)
@@ -134,11 +137,15 @@ public:
         if (!kept || kept->state == KeptPack::State::Erased)
             throw Base::Error(Base::Code::MailingUnknown,
                               "the service has no pack " + packId + ": send it again");
-        if (kept->state == KeptPack::State::Complete)
+        // While somebody looks for what is of no use.
+        if (store_->touch(packId, now_()))
             return;
+        if (!incoming_.contains(packId))
+            return completeUnheld(*kept);
         try {
-            incoming(packId).requireWhole();
-            store_->complete(packId, now_());
+            Incoming& incoming = comingOf(packId);
+            incoming.pack.requireWhole();
+            store_->complete(packId, incoming.fence, now_());
             incoming_.erase(packId);
         } catch (std::exception const&) {
             drop(packId);
@@ -157,13 +164,19 @@ public:
         return store_->find(packId) && store_->eraseSome(packId);
     }
     /// The same of one that is erased already, and has not come anew since.
-    bool eraseMore(std::string const& packId) {
-        std::optional<KeptPack> const kept = store_->find(packId);
-        return kept && kept->state == KeptPack::State::Erased && store_->eraseSome(packId);
+    bool eraseMore(std::string const& packId) { return store_->eraseMore(packId); }
+    void forgetUnused(std::string const& packId, long long touchedBefore) {
+        store_->retire(packId, touchedBefore);
+        store_->forget(packId);
     }
-    void forget(std::string const& packId) { store_->forget(packId); }
 
 private:
+    struct Incoming {
+        IncomingPack pack;
+        /// Under which it is held; another service may go on with it meanwhile.
+        long long fence;
+    };
+
     void add(PackHead const& head, std::optional<long long> quota) {
         long long const used = quota ? store_->bytesOf(head.info.cfgId) : 0;
         if (quota && used + head.bytes > *quota)
@@ -176,38 +189,48 @@ private:
     }
 
     BeginPackAnswer goOn(PackHead const& head) {
-        store_->dropUnfinishedPage(head.info.id);
-        auto pack = std::make_unique<IncomingPack>(head, store_->pagesOf(head.info.id));
         BeginPackAnswer answer;
-        answer.have = pack->have();
-        incoming_[head.info.id] = std::move(pack);
+        answer.have = takeHold(head).pack.have();
         return answer;
     }
 
-    IncomingPack& incoming(std::string const& packId) {
-        auto& pack = incoming_[packId];
-        if (!pack) {
-            std::optional<KeptPack> const kept = store_->find(packId);
-            if (!kept || kept->state != KeptPack::State::Open)
-                throw Base::Error(Base::Code::StateRefused,
-                                  "pack " + packId + " is none that pages are wanted of");
-            pack = std::make_unique<IncomingPack>(kept->head, store_->pagesOf(packId));
-        }
-        return *pack;
+    Incoming& takeHold(PackHead const& head) {
+        std::string const& id = head.info.id;
+        long long const fence = store_->takeHold(id);
+        incoming_.erase(id);
+        return incoming_.emplace(id, Incoming{IncomingPack(head, store_->pagesOf(id)), fence}).first->second;
+    }
+
+    Incoming& comingOf(std::string const& packId) {
+        if (auto const found = incoming_.find(packId); found != incoming_.end())
+            return found->second;
+        std::optional<KeptPack> const kept = store_->find(packId);
+        if (kept && kept->state == KeptPack::State::Open)
+            throw Base::Error(Base::Code::LeaseLost, notItsOwn(packId));
+        throw Base::Error(Base::Code::StateRefused, "pack " + packId + " is none that pages are wanted of");
+    }
+
+    /// Who holds it, of this service or another, may be about to send more.
+    void completeUnheld(KeptPack const& kept) {
+        std::string const& packId = kept.head.info.id;
+        IncomingPack(kept.head, store_->pagesOf(packId)).requireWhole();
+        store_->complete(packId, kept.fence, now_());
     }
 
     /// From here on it is erased, so that it may come anew; the rest goes step by step.
     void drop(std::string const& packId) {
-        incoming_.erase(packId);
+        auto const held = incoming_.extract(packId);
+        if (!held)
+            return;
         dropped_.insert(packId);
-        std::string const failure = failureOf([&] { store_->refuse(packId); });
+        std::string const failure = failureOf([&] { store_->refuse(packId, held.mapped().fence); });
         if (!failure.empty())
             Log::Lock(4).logStreamLine() << "Pack " << packId << " cannot be erased yet. " << failure;
     }
 
     std::shared_ptr<PackStore> store_;
     std::function<long long()> now_;
-    std::map<std::string, std::unique_ptr<IncomingPack>> incoming_;
+    std::map<std::string, Incoming> incoming_;
     /// Refused, and not erased yet.
     std::set<std::string> dropped_;
 };
@@ -364,8 +387,8 @@ void PackReception::eraseUnneeded(std::vector<KeptPack> const& packs) {
             continue;
         }
         senders_.erase(id);
-        surroundings_.onStoreThread([id, shelf = shelf_] {
-            std::string const failure = failureOf([&] { shelf->forget(id); });
+        surroundings_.onStoreThread([id, touched = pack.touchedAt, shelf = shelf_] {
+            std::string const failure = failureOf([&] { shelf->forgetUnused(id, touched); });
             if (!failure.empty())
                 Log::Lock(4).logStreamLine() << "Pack " << id << " cannot be forgotten. " << failure;
         });

@@ -51,7 +51,7 @@ DocumentService::DocumentService(DocumentStore& documents, SettingsStore const& 
                                  SettingsService const& settings, std::function<long long()> now,
                                  Recorder recorder)
     : documents_(documents), nodes_(nodes), settings_(settings), now_(std::move(now)), recorder_(recorder) {
-    documents_.dropUnfinished();
+    documents_.dropUnfinished(UPLOAD_PATIENCE);
 }
 
 Protocol::DocumentsAnswer DocumentService::list(Protocol::DocumentsQuery const& query) const {
@@ -205,7 +205,7 @@ void DocumentService::dropStalled() {
 void DocumentService::makeRoom() {
     // What could not be dropped in its time, for want of room for that.
     if (uploads_.empty())
-        documents_.dropUnfinished();
+        documents_.dropUnfinished(UPLOAD_PATIENCE);
     if (uploads_.size() >= MAX_UPLOADS)
         drop(std::min_element(uploads_.begin(), uploads_.end(), [](auto const& a, auto const& b) {
             return a.second.lastAt < b.second.lastAt;

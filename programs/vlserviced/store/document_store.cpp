@@ -50,8 +50,8 @@ std::optional<std::string> DocumentStore::piece(std::string const& sha256, long 
 }
 
 long long DocumentStore::begin() {
-    Database::Rows rows =
-        database_.query("INSERT INTO document_contents (bytes) VALUES (0) RETURNING number");
+    Database::Rows rows = database_.query(
+        "INSERT INTO document_contents (bytes, touched_at) VALUES (0, clock_ms()) RETURNING number");
     rows.next();
     long long const number = rows.number(0);
     // Carried out in full when there is nothing left of it.
@@ -64,8 +64,9 @@ void DocumentStore::add(long long content, std::string_view piece) {
     database_.change("INSERT INTO document_pieces (content, place, data) "
                      "SELECT number, bytes, $2 FROM document_contents WHERE number = $1",
                      content, Database::Bytes{piece});
-    database_.change("UPDATE document_contents SET bytes = bytes + $1 WHERE number = $2", piece.size(),
-                     content);
+    database_.change(
+        "UPDATE document_contents SET bytes = bytes + $1, touched_at = clock_ms() WHERE number = $2",
+        piece.size(), content);
     transaction.commit();
 }
 
@@ -88,8 +89,9 @@ void DocumentStore::drop(long long content) {
     database_.change("DELETE FROM document_contents WHERE number = $1 AND sha256 IS NULL", content);
 }
 
-void DocumentStore::dropUnfinished() {
-    database_.change("DELETE FROM document_contents WHERE sha256 IS NULL");
+void DocumentStore::dropUnfinished(long long seconds) {
+    database_.change("DELETE FROM document_contents WHERE sha256 IS NULL AND touched_at <= clock_ms() - $1",
+                     database_.isSqlite() ? 0 : seconds * 1000);
 }
 
 void DocumentStore::remove(std::string const& node, std::string const& name) {

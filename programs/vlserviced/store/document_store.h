@@ -33,9 +33,11 @@ public:
     void add(long long content, std::string_view piece);
     /// Makes a document of it, which replaces one of that name at that node.
     void finish(long long content, Protocol::StoredDocument const& document);
-    /// Forgets a content that is not finished, or all of them.
+    /// Forgets a content that is not finished.
     void drop(long long content);
-    void dropUnfinished();
+    /// All of them; of services that share the database, those to which nothing was added for so long: others
+    /// may be about to finish theirs.
+    void dropUnfinished(long long seconds);
 
     void remove(std::string const& node, std::string const& name);
 

@@ -60,6 +60,9 @@ CREATE TABLE pieces (
 );
 )sql";
 
+/// Who takes hold of a pack makes it greater.
+constexpr char const* SCHEMA_2 = "ALTER TABLE packs ADD COLUMN fence INTEGER NOT NULL DEFAULT 0;";
+
 /// Compressed pages are compressed no further.
 constexpr char const* POSTGRES_1 = "ALTER TABLE pieces ALTER COLUMN data SET STORAGE EXTERNAL;";
 
@@ -104,7 +107,7 @@ decltype(auto) orError(Operation operation) {
 }
 
 constexpr char const* SELECT_PACKS =
-    "SELECT id, cfg_id, title, pages, bytes, sha256, state, touched_at FROM packs ";
+    "SELECT id, cfg_id, title, pages, bytes, sha256, state, touched_at, fence FROM packs ";
 
 KeptPack packIn(Database::Rows const& row) {
     KeptPack pack;
@@ -114,6 +117,7 @@ KeptPack packIn(Database::Rows const& row) {
     pack.head.sha256 = row.text(5);
     pack.state = stateNamed(row.text(6));
     pack.touchedAt = row.number(7);
+    pack.fence = row.number(8);
     return pack;
 }
 
@@ -269,65 +273,77 @@ public:
         orError([&] {
             database_->change(
                 "INSERT INTO packs (id, cfg_id, title, pages, bytes, sha256, state, touched_at) "
-                "VALUES ($1, $2, $3, $4, $5, $6, 'open', $7)",
+                "VALUES ($1, $2, $3, $4, $5, $6, 'open', $7) ON CONFLICT DO NOTHING",
                 head.info.id, head.info.cfgId, head.info.title, head.pages, head.bytes, head.sha256, now);
         });
     }
 
-    void dropUnfinishedPage(std::string const& packId) override {
-        orError([&] {
+    long long takeHold(std::string const& packId) override {
+        return orError([&] {
+            Database::Transaction transaction(*database_);
+            if (database_->change("UPDATE packs SET fence = fence + 1 WHERE id = $1 AND state = 'open'",
+                                  packId) == 0)
+                refuseNotOpen(packId);
             database_->change("DELETE FROM pieces WHERE pack = $1 AND position >= (SELECT "
                               "coalesce(max(position) + 1, 0) FROM pages WHERE pack = $1)",
                               numberOf(*database_, packId));
+            long long const fence = database_->number("SELECT fence FROM packs WHERE id = $1", packId);
+            transaction.commit();
+            return fence;
         });
     }
 
-    void store(std::string const& packId, std::vector<PagePiece> const& pieces, long long now) override {
+    void store(std::string const& packId, long long fence, std::vector<PagePiece> const& pieces,
+               long long now) override {
         orError([&] {
             Database::Transaction transaction(*database_);
+            // Before all else, so that nobody takes hold of it in between.
+            changeHeld("touched_at = $1", packId, fence, now);
             long long const number = numberOf(*database_, packId);
             for (std::size_t at = 0; at < pieces.size();)
                 at = insertPieces(number, pieces, at);
-            database_->change("UPDATE packs SET touched_at = $1 WHERE number = $2", now, number);
             transaction.commit();
         });
     }
 
-    void complete(std::string const& packId, long long now) override {
-        orError([&] {
-            if (database_->change("UPDATE packs SET state = 'complete', touched_at = $1 WHERE id = $2 AND "
-                                  "state = 'open'",
-                                  now, packId) == 0)
-                throw Base::Error(Base::Code::MailingUnknown,
-                                  "the service has no open pack " + packId + ": send it again");
+    void complete(std::string const& packId, long long fence, long long now) override {
+        orError([&] { changeHeld("state = 'complete', touched_at = $1", packId, fence, now); });
+    }
+
+    bool touch(std::string const& packId, long long now) override {
+        return orError([&] {
+            return database_->change("UPDATE packs SET touched_at = $1 WHERE id = $2 AND state = 'complete'",
+                                     now, packId) == 1;
         });
     }
 
-    void refuse(std::string const& packId) override {
+    void refuse(std::string const& packId, long long fence) override {
         orError([&] {
-            database_->change("UPDATE packs SET state = 'erased' WHERE id = $1 AND state = 'open'", packId);
+            database_->change(
+                "UPDATE packs SET state = 'erased' WHERE id = $1 AND fence = $2 AND state = 'open'", packId,
+                fence);
+        });
+    }
+
+    void retire(std::string const& packId, long long touchedBefore) override {
+        orError([&] {
+            database_->change("UPDATE packs SET state = 'erased' WHERE id = $1 AND touched_at <= $2", packId,
+                              touchedBefore);
         });
     }
 
     bool eraseSome(std::string const& packId) override {
-        return orError([&] {
-            long long const number = numberOf(*database_, packId);
-            try {
-                return eraseRows(number, SOME_ROWS);
-            } catch (Database::QueryError const& failure) {
-                if (failure.kind() != Database::QueryError::Kind::Full || !reserve_)
-                    throw;
-                // What is overwritten is kept in a journal until that is done.
-                reserve_->giveUp();
-                return eraseRows(number, 1);
-            }
-        });
+        return eraseInRoom(packId, "(state <> 'erased' OR title <> '')");
+    }
+
+    bool eraseMore(std::string const& packId) override {
+        return eraseInRoom(packId, "state = 'erased' AND title <> ''");
     }
 
     void forget(std::string const& packId) override {
-        while (eraseSome(packId)) {
+        while (eraseMore(packId)) {
         }
-        orError([&] { database_->change("DELETE FROM packs WHERE id = $1", packId); });
+        orError([&] { database_->change("DELETE FROM packs WHERE id = $1 AND state = 'erased'", packId); });
     }
 
     std::unique_ptr<Mailing::PackSource> open(std::string const& packId) const override {
@@ -364,21 +380,55 @@ private:
                           pack, position, page.document, page.page, page.size, page.sha256);
     }
 
-    bool eraseRows(long long number, int rows) {
+    /// `marked` says of which packs the mark is to be made that they are erased.
+    bool eraseInRoom(std::string const& packId, std::string const& marked) {
+        return orError([&] {
+            try {
+                return eraseRows(packId, marked, SOME_ROWS);
+            } catch (Database::QueryError const& failure) {
+                if (failure.kind() != Database::QueryError::Kind::Full || !reserve_)
+                    throw;
+                // What is overwritten is kept in a journal until that is done.
+                reserve_->giveUp();
+                return eraseRows(packId, marked, 1);
+            }
+        });
+    }
+
+    bool eraseRows(std::string const& packId, std::string const& marked, int rows) {
         Database::Transaction transaction(*database_);
-        long long changed = database_->change("UPDATE packs SET state = 'erased', title = '' WHERE "
-                                              "number = $1 AND (state <> 'erased' OR title <> '')",
-                                              number);
+        long long changed = database_->change(
+            "UPDATE packs SET state = 'erased', title = '' WHERE id = $1 AND " + marked, packId);
         std::string const row = database_->rowId();
         for (std::string const table : {"pieces", "pages"})
-            changed +=
-                database_->change("DELETE FROM " + table + " WHERE " + row + " IN (SELECT " + row + " FROM " +
-                                      table + " WHERE pack = $1 LIMIT " + std::to_string(rows) + ")",
-                                  number);
+            changed += database_->change("DELETE FROM " + table + " WHERE " + row + " IN (SELECT " + row +
+                                             " FROM " + table +
+                                             " WHERE pack = (SELECT number FROM packs WHERE id = $1 AND "
+                                             "state = 'erased') LIMIT " +
+                                             std::to_string(rows) + ")",
+                                         packId);
         transaction.commit();
         if (reserve_)
             giveRoomBack(changed == 0);
         return changed > 0;
+    }
+
+    /// Of a pack that nobody has taken hold of since.
+    void changeHeld(std::string const& assignments, std::string const& packId, long long fence,
+                    long long now) {
+        if (database_->change("UPDATE packs SET " + assignments +
+                                  " WHERE id = $2 AND fence = $3 AND state = 'open'",
+                              now, packId, fence) == 0)
+            refuseNotOpen(packId);
+    }
+
+    [[noreturn]] void refuseNotOpen(std::string const& packId) {
+        if (packOf(*database_, packId))
+            throw Base::Error(Base::Code::LeaseLost,
+                              "pack " + packId +
+                                  " is none that this connection sends: another one goes on with it");
+        throw Base::Error(Base::Code::MailingUnknown,
+                          "the service has no open pack " + packId + ": send it again");
     }
 
     void giveRoomBack(bool isDone) {
@@ -398,7 +448,7 @@ PackStore::~PackStore() = default;
 
 Database::DatabaseKind const& packStoreDatabase() {
     static Database::DatabaseKind const kind{
-        "pack store", APPLICATION_ID, {{SCHEMA_1, "", POSTGRES_1}}, BEGINNING};
+        "pack store", APPLICATION_ID, {{SCHEMA_1, "", POSTGRES_1}, SCHEMA_2}, BEGINNING};
     return kind;
 }
 

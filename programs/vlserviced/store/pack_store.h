@@ -40,6 +40,8 @@ struct KeptPack {
     State state = State::Open;
     /// When something of it came last, seconds since the epoch.
     long long touchedAt = 0;
+    /// Of who took hold of it last.
+    long long fence = 0;
 };
 
 /// A page that is there as a whole.
@@ -73,19 +75,27 @@ public:
     /// Those of a pack that are there, from the first on.
     virtual std::vector<KeptPage> pagesOf(std::string const& packId) = 0;
 
-    /// Begins a pack that is not there.
+    /// Begins a pack; nothing happens to one that is there.
     virtual void add(PackHead const& head, long long now) = 0;
-    /// Drops the pieces of the page that is not there as a whole.
-    virtual void dropUnfinishedPage(std::string const& packId) = 0;
-    virtual void store(std::string const& packId, std::vector<PagePiece> const& pieces, long long now) = 0;
-    virtual void complete(std::string const& packId, long long now) = 0;
+    /// Drops the pieces of the page that is not there as a whole, and gives a number that grows each time:
+    /// from here on whoever has a smaller one changes the pack no more, in whichever process he is.
+    virtual long long takeHold(std::string const& packId) = 0;
+    virtual void store(std::string const& packId, long long fence, std::vector<PagePiece> const& pieces,
+                       long long now) = 0;
+    virtual void complete(std::string const& packId, long long fence, long long now) = 0;
+    /// Has a complete pack be of use from here on; false when there is none.
+    virtual bool touch(std::string const& packId, long long now) = 0;
 
     /// Takes a pack for erased that is not complete; nothing happens to another.
-    virtual void refuse(std::string const& packId) = 0;
+    virtual void refuse(std::string const& packId, long long fence) = 0;
+    /// Takes a pack for erased that was not of use since; nothing happens to another.
+    virtual void retire(std::string const& packId, long long touchedBefore) = 0;
     /// Takes the pack for erased, and erases some MiB of it; false when nothing of it is left but id and
     /// digest.
     virtual bool eraseSome(std::string const& packId) = 0;
-    /// Erases what is left of an erased pack.
+    /// Erases some MiB of an erased pack; false when nothing is left, and of another.
+    virtual bool eraseMore(std::string const& packId) = 0;
+    /// Erases what is left of an erased pack; nothing happens to another.
     virtual void forget(std::string const& packId) = 0;
 
     /// A pack that is complete. May be called from any thread.

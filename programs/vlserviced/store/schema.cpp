@@ -338,6 +338,11 @@ WHEN (new.number > 0 AND (old.state = 'failed') <> (new.state = 'failed'))
 EXECUTE FUNCTION free_letter();
 )sql";
 
+/// When something was added to a content that is on its way, in milliseconds by the database's clock.
+constexpr char const* SCHEMA_13 = R"sql(
+ALTER TABLE document_contents ADD COLUMN touched_at INTEGER NOT NULL DEFAULT 0;
+)sql";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -354,7 +359,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               {SCHEMA_9, "", POSTGRES_9},
                                               {SCHEMA_10, "", POSTGRES_10},
                                               {SCHEMA_11, "", POSTGRES_11},
-                                              {SCHEMA_12, SQLITE_12, POSTGRES_12}}};
+                                              {SCHEMA_12, SQLITE_12, POSTGRES_12},
+                                              SCHEMA_13}};
     return kind;
 }
 

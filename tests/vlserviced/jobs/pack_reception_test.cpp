@@ -158,6 +158,7 @@ TEST_F(PackReceptionTest, PutsPagesTogetherOfPiecesOfAnySize) {
                 ASSERT_EQ(send(pack.text(i, offset, length)), "") << length;
         ASSERT_EQ(complete("p1"), "");
         EXPECT_EQ(unzipped(store_->open("p1")->metadata()), metadataText("p1"));
+        store_->eraseSome("p1");
         store_->forget("p1");
     }
 }
@@ -451,6 +452,89 @@ TEST_F(PackReceptionTest, KeepsNothingWhenTheDiskIsFull) {
     SentPack const small("p2");
     sendAll(small);
     EXPECT_EQ(complete("p2"), "");
+}
+
+// --- of several services with one store
+
+/// A service of its own, on the same store.
+class OtherReception {
+public:
+    OtherReception(fs::path const& file, VlServiced::JobStore& jobs)
+        : reception_(VlServiced::openSqlitePackStore(file), jobs,
+                     {[](std::function<void()> const& work) { work(); },
+                      [](std::function<void()> const& work) { work(); }, [] { return 1000; },
+                      [](std::string const&) { return std::optional<long long>(); },
+                      [](std::string const&) { return false; }}) {}
+
+    long long begin(SentPack const& pack) {
+        long long have = -1;
+        reception_.begin(
+            pack.head, connection_,
+            [&](Protocol::BeginPackAnswer const& answer, std::string const&) { have = answer.have; });
+        return have;
+    }
+    std::string send(std::string const& text) {
+        std::string told = "never told";
+        reception_.take(connection_, text, [&](std::string const& failure) { told = failure; });
+        return told;
+    }
+    std::string complete(std::string const& packId) {
+        std::string told = "never told";
+        reception_.complete(packId, [&](std::string const& failure) { told = failure; });
+        return told;
+    }
+
+private:
+    std::shared_ptr<NoProcessor> connection_ = std::make_shared<NoProcessor>();
+    PackReception reception_;
+};
+
+constexpr char const* GONE_ON_WITH =
+    "pack p1 is none that this connection sends: another one goes on with it "
+    "[lease-lost]";
+
+TEST_F(PackReceptionTest, TakesWhatAServiceStillHasOfAPackForNothingThatAnotherOneGoesOnWith) {
+    SentPack const pack("p1");
+    OtherReception other(file_, jobs_);
+    begin(pack);
+    EXPECT_EQ(send(pack.text(0)), "");
+    EXPECT_EQ(send(pack.text(1, 0, 5)), "");
+    EXPECT_EQ(other.begin(pack), 1);
+    EXPECT_EQ(send(pack.text(1, 5)), GONE_ON_WITH);
+    EXPECT_EQ(other.send(pack.text(1, 0, 7)), "");
+    EXPECT_EQ(other.send(pack.text(1, 7)), "") << "what came late has done it no harm";
+    EXPECT_THAT(complete("p1"), HasSubstr("pack p1 is not whole"))
+        << "whoever is asked looks at what is there";
+    EXPECT_THAT(send(pack.text(2)), HasSubstr("another one goes on with it"));
+    EXPECT_EQ(stateOf("p1"), "open");
+    for (std::size_t i = 2; i < pack.pages.size(); ++i)
+        EXPECT_EQ(other.send(pack.text(i)), "");
+    EXPECT_EQ(other.complete("p1"), "");
+    EXPECT_EQ(unzipped(pageOf(*store_->open("p1"), {"one.pdf", "2"})), "second page of p1");
+}
+
+TEST_F(PackReceptionTest, BeginsAPackOnceThatComesToTwoServicesAtOnce) {
+    SentPack const pack("p1");
+    Protocol::BeginPack const& said = pack.head;
+    for (int service = 0; service < 2; ++service)
+        store_->add({{said.id, said.cfgId, said.title}, said.pages, said.bytes, said.sha256}, now_);
+    EXPECT_EQ(rowsIn("packs"), 1);
+    EXPECT_EQ(begin(pack), "0");
+}
+
+TEST_F(PackReceptionTest, ErasesNothingOfAPackThatHasComeAnewMeanwhile) {
+    SentPack const pack("p1");
+    begin(pack);
+    sendAll(pack);
+    complete("p1");
+    EXPECT_FALSE(store_->eraseMore("p1"));
+    store_->forget("p1");
+    store_->retire("p1", now_ - 1);
+    EXPECT_EQ(stateOf("p1"), "complete");
+    now_ += 100'000;
+    EXPECT_EQ(complete("p1"), "") << "it is about to become a job";
+    store_->retire("p1", now_ - 1);
+    EXPECT_EQ(stateOf("p1"), "complete");
 }
 
 // --- what goes

@@ -118,9 +118,20 @@ TEST_P(DocumentStoreTest, ShowsNobodyWhatIsNotFinished) {
     EXPECT_EQ(store_.piece(Base::sha256("other"), 0), std::nullopt);
     store_.drop(other);
     EXPECT_EQ(count("document_pieces"), 2);
-    store_.dropUnfinished();
+    store_.dropUnfinished(0);
     EXPECT_EQ(count("document_pieces"), 1);
     EXPECT_EQ(store_.piece(digest, 0), "whole");
+}
+
+TEST_P(DocumentStoreTest, LeavesWhatAnotherServiceIsAboutToFinish) {
+    long long const content = store_.begin();
+    store_.add(content, "first half, ");
+    auto const database = open();
+    VlServiced::DocumentStore(*database).dropUnfinished(60);
+    EXPECT_EQ(count("document_pieces"), isPostgres() ? 1 : 0) << "a file belongs to one service";
+    database_->change("UPDATE document_contents SET touched_at = clock_ms() - 60001");
+    VlServiced::DocumentStore(*database).dropUnfinished(60);
+    EXPECT_EQ(count("document_pieces"), 0);
 }
 
 VLSERVICE_ON_EACH_DATABASE(DocumentStoreTest);
