@@ -208,7 +208,7 @@ std::vector<std::string> Installation::restartAll() {
     return wrong;
 }
 
-void Installation::fillDisk() {
+void Installation::fillDisk() const {
     try {
         // What a statement has taken stays taken when it fails.
         database()->run("INSERT INTO filler SELECT repeat('x', 7000) FROM generate_series(1, 1000000)");
@@ -218,7 +218,7 @@ void Installation::fillDisk() {
     }
 }
 
-void Installation::emptyDisk() { database()->run("TRUNCATE filler"); }
+void Installation::emptyDisk() const { database()->run("TRUNCATE filler"); }
 
 std::vector<std::string> Installation::leftBehind() const {
     std::vector<std::string> left;

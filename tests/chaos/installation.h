@@ -73,8 +73,8 @@ public:
     void crashDatabase() { server_.crash(); }
     void startDatabase() { server_.startAgain(); }
     /// Until there is no room for another page of a table.
-    void fillDisk();
-    void emptyDisk();
+    void fillDisk() const;
+    void emptyDisk() const;
     Line& toDatabase(std::size_t service) { return *places_.at(service).toDatabase; }
     Line& toService(std::size_t service) { return *places_.at(service).toService; }
 

@@ -43,7 +43,11 @@ protected:
             },
             [](VlServiced::JobSurroundings::Work const& work) { work(); },
             [this] { return now_; },
-            [this] { return VlServiced::ServiceSettings(settings_); },
+            [this] {
+                if (settingsFailIn_ > 0 && --settingsFailIn_ == 0)
+                    throw Database::QueryError(Database::QueryError::Kind::Lost, "the database is gone");
+                return VlServiced::ServiceSettings(settings_);
+            },
             outbox_,
             [this](std::string const&) { return rules_; },
             [](std::string const& node, std::string const& packPreset) {
@@ -120,6 +124,8 @@ protected:
     std::unique_ptr<Database::Connection> database_ = VlServiced::openServiceDatabase(folder_ / "service.db");
     VlServiced::JobStore jobs_{*database_};
     json::Object settings_;
+    /// The question for them that is not answered, counted from 1.
+    int settingsFailIn_ = 0;
     std::deque<VlServiced::JobSurroundings::Work> work_;
     /// When it is there, what the readers were given waits in it.
     std::optional<std::deque<VlServiced::JobSurroundings::Work>> readersWork_;
@@ -482,6 +488,24 @@ TEST_F(JobRunnerTest, StagesNothingIntoAnotherFolderThanTheOneThatWasSet) {
     doWork();
     EXPECT_EQ(state("p1"), "queued: " + anotherFolder(set.identity().mark));
     EXPECT_TRUE(fs::is_empty(upload_));
+}
+
+TEST_F(JobRunnerTest, ChangesNothingOfAJobThatAnotherServiceHasTakenHoldOf) {
+    // Whichever question fails while its container is made and about to be staged.
+    for (int question = 1; question <= 8; ++question) {
+        std::string const id = "p" + std::to_string(question);
+        acceptStored(id, R"("process_mode": 2, )");
+        settingsFailIn_ = question;
+        work_.front()();
+        work_.pop_front();
+        settingsFailIn_ = 0;
+        std::string const before = state(id);
+        database_->run("UPDATE jobs SET holder = 'another', fence = fence + 1, try_at = clock_ms() + 60000");
+        doWork();
+        EXPECT_EQ(state(id), before) << question;
+        EXPECT_FALSE(fs::exists(upload_ / (id + ".mailing"))) << question;
+        startRunner();
+    }
 }
 
 TEST_F(JobRunnerTest, RemovesLaterWhatStayedInTheOutbox) {
