@@ -18,6 +18,13 @@ const KINDS = {
     golden: (verdict) => Boolean(verdict?.golden) && verdict.golden.verdict !== "ok",
 };
 
+function renew(row, { attributes, style, childNodes }) {
+    for (const { name, value } of [...attributes].filter((one) => one.name !== "style"))
+        row.setAttribute(name, value);
+    row.style.top = style.top;
+    row.replaceChildren(...childNodes);
+}
+
 export class DocumentList {
     #shown = [];
 
@@ -73,9 +80,20 @@ export class DocumentList {
         const first = Math.max(0, Math.floor(this.box.scrollTop / height) - SPARE_ROWS);
         const count = Math.ceil(this.box.clientHeight / height) + 2 * SPARE_ROWS;
         this.space.style.height = this.#shown.length * height + "px";
-        this.space.replaceChildren(...this.#shown.slice(first, first + count)
-            .map((document, place) => this.#row(document, first + place, height)));
+        this.#place(this.#shown.slice(first, first + count).map((document, place) => this.#row(document, first + place, height)));
         this.#markActive();
+    }
+
+    /** Rows stay the same elements: a button of the mouse may be down on one. */
+    #place(rows) {
+        const old = [...this.space.children];
+        old.slice(rows.length).forEach((row) => row.remove());
+        rows.forEach((row, place) => {
+            if (!old[place])
+                this.space.append(row);
+            else if (!old[place].isEqualNode(row))
+                renew(old[place], row);
+        });
     }
 
     #markActive() {
@@ -109,12 +127,12 @@ export class DocumentList {
         return parts.join(" \u00b7 ");
     }
 
-    #place() {
+    #openPlace() {
         return this.#shown.findIndex(({ name }) => name === this.session.document);
     }
 
     #reveal() {
-        const place = this.#place();
+        const place = this.#openPlace();
         const height = this.#rowHeight;
         if (place < 0)
             return;
@@ -136,7 +154,7 @@ export class DocumentList {
         if (step === undefined || event.ctrlKey || event.altKey)
             return;
         event.preventDefault();
-        this.#open(Math.max(this.#place(), step > 0 ? -1 : 0) + step);
+        this.#open(Math.max(this.#openPlace(), step > 0 ? -1 : 0) + step);
     }
 
     #click(event) {

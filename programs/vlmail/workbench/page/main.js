@@ -131,7 +131,9 @@ class Page {
 
     #showState() {
         const { settings, isChanged, history } = this.session;
-        byId("settings-name").replaceChildren(el("bdi", {}, settings.name || this.texts.of("noSettings")),
+        const short = settings.kind === "file" ? settings.name.split("/").at(-1) : settings.name;
+        byId("settings-name").title = settings.name;
+        byId("settings-name").replaceChildren(el("bdi", {}, short || this.texts.of("noSettings")),
             isChanged ? " \u2022 " + this.texts.of("unsaved") : "");
         for (const [id, can, says] of [["undo", history.canUndo, history.undoes], ["redo", history.canRedo, history.redoes]]) {
             byId(id).setAttribute("aria-disabled", String(!can));

@@ -155,6 +155,11 @@ class Page:
         self.wait(lambda: self.run("const i = document.querySelector('#stage img'); return i.complete && i.naturalWidth > 0"), "the picture")
         return self
 
+    def choose(self, document):
+        """Opens a document of the list by the mouse."""
+        row = "return [...document.querySelectorAll('#list .row')].find((one) => one.innerText.startsWith(arguments[0]))"
+        self.wait(lambda: self.run(row, document).click() is None, "the row of " + document)
+
     def field(self, name):
         """The state and the value that the field is shown with."""
         script = """

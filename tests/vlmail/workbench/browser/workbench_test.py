@@ -1,0 +1,462 @@
+#!/usr/bin/python3
+"""workbench_test.py VLMAIL EXAMPLES PICTURES [TEST...]: uses the workbench in a browser as a person does.
+
+With UPDATE_GOLDEN=1 it writes the pictures that the documents show anew, into the folder PICTURES."""
+import json
+import os
+import sys
+
+sys.dont_write_bytecode = True
+import workbench_page as at
+from browser_test import EXAMPLES, BrowserTest, main
+
+BROKEN = os.path.join(EXAMPLES, "broken")
+XSS = "<img src=x onerror=\"document.title='taken'\"><script>document.title='taken'</script>"
+
+
+class Reading(BrowserTest):
+    def test_documents_page_fields_and_settings_are_shown(self):
+        page = self.open("office").wait_for_picture()
+        page.wait_for_field("number", "2024-17")
+        self.assertEqual(page.texts("#list .name")[0], "Invoice 17.pdf")
+        self.assertEqual(page.run("return document.querySelectorAll('#stage .zone').length"), 2)
+        self.assertIn('"Invoices"', page.settings())
+        self.assertEqual(page.logged(), [])
+
+    def test_another_document_is_read_when_it_is_chosen(self):
+        page = self.open("office")
+        page.wait(lambda: len(page.find("#list .row")) == 4, "the list")
+        page.choose("Invoice 18.pdf")
+        page.wait_for_field("number", "2024-18")
+        self.assertEqual(page.texts("#list [aria-selected=true] .name"), ["Invoice 18.pdf"])
+
+    def test_the_list_filters_by_name_and_by_verdict(self):
+        page = self.open("office")
+        page.wait(lambda: page.texts("#counts")[0].startswith("4 of 4 shown") and "not read" not in page.texts("#counts")[0], "the verdicts")
+        page.one("#filter").send_keys("march")
+        page.wait(lambda: page.texts("#list .name") == ["Invoices March.pdf"], "the filter")
+        page.one("#kind").send_keys("with trouble")
+        page.wait(lambda: page.texts("#counts")[0].startswith("0 of 4 shown"), "no trouble")
+
+    def test_a_thousand_documents_are_a_few_rows(self):
+        bench = self.begin("office")
+        source = os.path.join(bench.folder, "Invoice 17.pdf")
+        for number in range(1000):
+            os.link(source, os.path.join(bench.folder, "Invoice %04d.pdf" % number))
+        page = self.page_of(bench)
+        page.wait(lambda: "of 1004 shown" in page.texts("#counts")[0], "all documents")
+        self.assertLess(len(page.find("#list .row")), 60)
+        page.one("#list").send_keys(at.keys().END)
+        page.wait(lambda: page.texts("#list [aria-selected=true] .name") == ["Invoices March.pdf"], "the last one")
+
+
+    def test_pages_of_a_long_document_are_drawn_when_they_are_turned_to(self):
+        bench = self.begin("broken/other-letter-case")
+        document = os.path.join(bench.folder, "invoice 17.txt")
+        with open(document, "a", encoding="utf-8") as file:
+            file.write("".join("\fPage %d" % page for page in range(2, 501)))
+        page = self.page_of(bench).wait_for_picture()
+        self.assertEqual(page.texts("#page-count"), ["of 500"])
+        page.one("#page-number").send_keys(at.keys().BACKSPACE, "500", at.keys().TAB)
+        page.wait(lambda: page.run("return document.querySelector('#stage img').alt") == "page 500 of invoice 17.txt", "the last page")
+        page.wait_for_picture()
+        drawn = "return performance.getEntriesByType('resource').filter((one) => one.name.endsWith('/api/picture')).length"
+        self.assertEqual(page.run(drawn), 2)
+
+    def test_a_document_that_has_vanished_is_told_in_a_line(self):
+        page = self.open("office")
+        page.wait(lambda: "4 of 4 shown" in page.texts("#counts")[0], "the list")
+        os.remove(os.path.join(self.bench.folder, "Invoice 18.pdf"))
+        page.choose("Invoice 18.pdf")
+        page.wait(lambda: "Invoice 18.pdf" in "".join(page.texts("#alert, #fields-body .why")), "the complaint")
+        page.choose("Invoice 17.pdf")
+        page.wait_for_field("number", "2024-17")
+
+    def test_a_pattern_that_runs_away_is_refused_and_the_page_lives(self):
+        bench = self.begin("broken/other-letter-case")
+        with open(os.path.join(bench.folder, "invoice 17.txt"), "a", encoding="utf-8") as file:
+            file.write("\n" + "a" * 60 + "\n")
+        page = self.page_of(bench)
+        text = page.settings()
+        page.type_settings(text.replace("^Total: (?<VAL>[\\\\d.]+) EUR$", "^(a|aa)+(?<VAL>)b$"))
+        page.wait(lambda: "cannot be searched in this text" in "".join(page.texts("#fields-body")), "the refusal")
+        page.type_settings(text.replace("^Total", "^TOTAL"))
+        page.wait_for_field("total", "12.3")
+
+
+class Changing(BrowserTest):
+    def test_every_near_miss_of_the_broken_examples_is_repaired_by_its_button(self):
+        for name in sorted(os.listdir(BROKEN)):
+            if os.path.isdir(os.path.join(BROKEN, name)):
+                with self.subTest(name):
+                    self.repair_each(self.open(os.path.join("broken", name)), self.bench)
+
+    def repair_each(self, page, bench):
+        misses = page.find(".near li")
+        self.assertGreater(len(misses), 0)
+        for place in range(len(misses)):
+            before = page.settings()
+            field = page.run("return document.querySelectorAll('.near li')[arguments[0]].closest('.field').ariaLabel", place)
+            button = page.run("return document.querySelectorAll('.near li')[arguments[0]].querySelector('.repair')", place)
+            if button is None:
+                continue
+            page.run("arguments[0].click()", button)
+            page.wait(lambda: page.settings() != before, "a change of the settings")
+            page.wait(lambda: (page.field(field) or [""])[0] == "\u2713 found", "%s, mended by miss %d" % (field, place + 1))
+            page.one("#undo").click()
+            page.wait(lambda: page.settings() == before and len(page.find(".near li")) == len(misses), "the settings before")
+        self.assertGreater(len(page.find(".repair")), 0)
+
+    def test_a_pattern_that_is_typed_shows_its_effect(self):
+        page = self.open("broken/other-letter-case")
+        pattern = page.one("[aria-label=total] .pattern input")
+        pattern.clear()
+        pattern.send_keys("^TOTAL: (?<VAL>[\\d.]+) EUR$")
+        page.wait_for_field("total", "12.3")
+        self.assertIn('"^TOTAL: (?<VAL>[\\\\d.]+) EUR$"', page.settings())
+
+    def test_undo_and_redo_go_through_the_whole_session(self):
+        page = self.open("broken/other-letter-case")
+        first = page.settings()
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        second = page.settings()
+        page.type_settings(second.replace("Invoices", "Bills"))
+        page.wait(lambda: "Bills" in "".join(page.texts("#fields-body .quietly")), "the new name")
+        page.one("#undo").click()
+        page.one("#undo").click()
+        page.wait(lambda: page.settings() == first and page.field("total")[0] == "\u2717 missing", "the settings at first")
+        page.one("#redo").click()
+        page.wait_for_field("total", "12.3")
+        self.assertEqual(page.settings(), second)
+
+    def test_broken_json_names_its_line_and_keeps_the_last_picture(self):
+        page = self.open("broken/other-letter-case").wait_for_picture()
+        text = page.settings()
+        page.type_settings(text.replace('"pack_preset"', 'pack_preset"', 1))
+        page.wait(lambda: "Line 5:" in "".join(page.texts("#alert")), "the line")
+        self.assertEqual(page.texts("#lint li button"), ["Line 5"])
+        self.assertGreater(len(page.find("#stage .zone")), 0)
+        self.assertTrue(page.run("return document.querySelector('#stage img').naturalWidth"))
+        page.type_settings(text)
+        page.wait(lambda: page.texts("#alert") == [""], "the end of the complaint")
+
+    def test_findings_of_lint_stand_at_their_lines(self):
+        page = self.open("broken/other-letter-case")
+        page.type_settings(page.settings().replace('"obligatory"', '"obligatry"'))
+        line = page.settings().split("\n").index('       "obligatry": true') + 1
+        page.wait(lambda: "Line %d" % line in page.texts("#lint li button"), "the finding at line %d" % line)
+        page.one("#lint li button").click()
+        self.assertEqual(page.run("return document.querySelector('#editor .CodeMirror').CodeMirror.getCursor().line"), line - 1)
+
+    def test_a_key_is_completed_with_its_documentation(self):
+        page = self.open("broken/other-letter-case")
+        line = page.settings().split("\n").index('       "obligatory": true')
+        page.run("const m = document.querySelector('#editor .CodeMirror').CodeMirror; m.focus(); m.setCursor({line: arguments[0], ch: 7});", line)
+        page.keys('"mak')
+        hint = page.one(".CodeMirror-hint")
+        self.assertIn("make_one_line: delete line breaks", hint.text)
+        page.keys(at.keys().ENTER)
+        page.wait(lambda: '"make_one_line": true"obligatory"' in page.settings(), "the completed key")
+
+    def test_a_form_changes_a_key_and_tells_what_it_is_for(self):
+        page = self.open("broken/other-letter-case")
+        page.one("#tab-form").click()
+        row = page.one('[data-pointer="/extract_presets/0/skip_first_page"]')
+        says = page.run("return document.getElementById(arguments[0].getAttribute('aria-describedby')).textContent", row)
+        self.assertEqual(says, "the first page is a cover sheet and belongs to no letter")
+        row.click()
+        page.wait(lambda: '"skip_first_page": true' in page.settings(), "the key")
+        page.one("#undo").click()
+        page.wait(lambda: "skip_first_page" not in page.settings(), "no key")
+
+    def test_what_becomes_better_and_worse_can_be_walked_through(self):
+        page = self.open("broken/other-letter-case")
+        page.one(".repair").click()
+        page.wait(lambda: page.texts("#tab-effect") == ["Effect: 1 better, 0 worse"], "what is better")
+        page.one("#tab-effect").click()
+        self.assertEqual(page.texts(".effect.better .link"), ["invoice 17.txt"])
+        page.one('[data-key="compareFromHere"]').click()
+        page.wait(lambda: page.texts("#tab-effect") == ["Effect: 0 better, 0 worse"], "the comparison from here")
+
+
+class Zones(BrowserTest):
+    def test_a_zone_is_dragged_and_the_field_appears(self):
+        page = self.open("broken/zone-ends-too-high").wait_for_picture()
+        page.one('#stage .zone[aria-label="zone Text"]').click()
+        page.drag('#stage .zone[aria-label="zone Text"] .handle.b', (0.5, 0.5), (0, 9))
+        page.wait_for_field("total", "12.3")
+        bottom = json.loads(page.settings())["extract_presets"][0]["zones"][1]["location"]["bottom"]
+        self.assertGreater(bottom, 14000)
+        self.assertEqual(page.texts("#undo")[0] and page.one("#undo").get_attribute("title"), "place of zone Text")
+
+    def test_a_zone_snaps_to_the_text_under_it(self):
+        page = self.open("broken/zone-ends-too-high").wait_for_picture()
+        zone = page.one('#stage .zone[aria-label="zone Text"]')
+        zone.send_keys("f")
+        page.wait(lambda: json.loads(page.settings())["extract_presets"][0]["zones"][1]["location"] != {"left": 2000, "top": 8500, "right": 20000, "bottom": 13400}, "the zone around its text")
+        location = json.loads(page.settings())["extract_presets"][0]["zones"][1]["location"]
+        self.assertEqual(location, {"left": 2400, "top": 11060, "right": 7892, "bottom": 12460})
+
+    def test_arrows_move_and_resize_a_zone(self):
+        keys = at.keys()
+        page = self.open("broken/zone-ends-too-high").wait_for_picture()
+        zone = page.one('#stage .zone[aria-label="zone Text"]')
+        zone.send_keys(keys.ARROW_LEFT)
+        page.wait(lambda: '"left": 1900' in page.settings(), "one millimetre to the left")
+        page.wait_until_read()
+        page.wait(lambda: page.focused() == "zone Text", "the focus on the zone")
+        for step in range(8):
+            page.chord(keys.SHIFT, keys.ARROW_DOWN)
+        page.wait_for_field("total", "12.3")
+
+    def test_a_zone_has_numbers_and_a_name(self):
+        keys = at.keys()
+        page = self.open("broken/zone-ends-too-high")
+        page.one('#stage .zone[aria-label="zone Text"]').send_keys(keys.ENTER)
+        name, left, top, right, bottom = page.find("#zone-form input")
+        name.clear()
+        name.send_keys("Body", keys.TAB)
+        page.wait(lambda: page.find('#stage .zone[aria-label="zone Body"]'), "the new name")
+        bottom = page.find("#zone-form input")[4]
+        bottom.clear()
+        bottom.send_keys("141", keys.TAB)
+        page.wait_for_field("total", "12.3")
+
+    def test_a_new_zone_is_drawn_and_its_field_is_read(self):
+        page = self.open("broken/zone-ends-too-high").wait_for_picture()
+        page.one("#draw").click()
+        page.drag('#stage .zone[aria-label="address window Address"]', (0.02, 0.02), (60, 18))
+        page.one("dialog[open]")
+        page.keys("first")
+        page.one('dialog[open] option[value="0"]').click()
+        page.one('dialog[open] button[value="accept"]').click()
+        page.wait_for_field("first", "Anna Arnold")
+
+    def test_a_new_zone_is_made_by_keyboard_alone(self):
+        keys = at.keys()
+        page = self.open("broken/zone-ends-too-high").wait_for_picture()
+        page.one('#stage .zone[aria-label="zone Text"]').send_keys("n")
+        for step in range(12):
+            page.keys(keys.ARROW_DOWN)
+        page.keys(keys.ENTER)
+        page.one("dialog[open]")
+        page.keys("greeting", keys.ENTER)
+        page.wait(lambda: page.field("greeting"), "the new field")
+        self.assertEqual(json.loads(page.settings())["extract_presets"][0]["zones"][2]["name"], "Zone 3")
+
+
+class Saving(BrowserTest):
+    def accept(self, page):
+        page.one('dialog[open] button[value="accept"]').click()
+
+    def test_what_differs_is_shown_before_it_is_saved(self):
+        page = self.open("broken/other-letter-case")
+        before = self.bench.text()
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        self.assertEqual(self.bench.text(), before)
+        page.one("#save").click()
+        self.assertEqual(len(page.find(".diff tr.gone")), 1)
+        self.assertIn("(?i)", page.texts(".diff tr.new .text")[0])
+        self.accept(page)
+        page.wait(lambda: page.texts("#message") == ["Saved in %s." % self.bench.settings], "the saving")
+        self.assertEqual(self.bench.text(), page.settings())
+
+    def test_two_tabs_that_save_see_both_sides_of_the_conflict(self):
+        page = self.open("broken/other-letter-case")
+        text = self.bench.text()
+        other = at.Page(self.second_tab(), self.bench.url).wait_until_read()
+        other.type_settings(text.replace("Invoices", "Bills"))
+        other.one("#save").click()
+        self.accept(other)
+        other.wait(lambda: other.texts("#message") == ["Saved in %s." % self.bench.settings], "the saving")
+        self.leave_second_tab()
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        page.one("#save").click()
+        self.accept(page)
+        page.wait(lambda: len(page.find("dialog[open] .diff")) == 3, "both sides")
+        self.assertIn("Bills", page.texts(".diff")[0])
+        self.assertIn("(?i)", page.texts(".diff")[1])
+        self.assertIn("Bills", self.bench.text())
+        self.accept(page)
+        page.wait(lambda: "(?i)" in self.bench.text(), "the saving over it")
+
+    def second_tab(self):
+        self.first = self.driver.current_window_handle
+        self.driver.switch_to.new_window("tab")
+        self.addCleanup(at.look, self.driver)
+        return self.driver
+
+    def leave_second_tab(self):
+        self.driver.close()
+        self.driver.switch_to.window(self.first)
+
+    def test_what_is_shown_is_kept_as_right_by_one_button(self):
+        page = self.open("office")
+        page.wait_for_field("number", "2024-17")
+        page.one("#golden").click()
+        page.wait(lambda: page.texts("#message") == ["Kept in Invoice 17.pdf.expected.json."], "the case")
+        self.assertTrue(os.path.exists(os.path.join(self.bench.folder, "Invoice 17.pdf.expected.json")))
+        page.type_settings(page.settings().replace("^Invoice:", "^No such label:"))
+        page.wait(lambda: "1 not as kept" in page.texts("#tab-effect")[0], "the difference")
+
+
+class Safety(BrowserTest):
+    def test_a_wrong_token_host_or_origin_is_refused(self):
+        bench = self.begin("office")
+        for name, headers, code in (
+            ("token", {"X-Workbench-Token": "x" * 64}, "token-refused"),
+            ("no token", {"X-Workbench-Token": ""}, "token-refused"),
+            ("host", {"Host": "example.org"}, "not-allowed"),
+            ("origin", {"Origin": "http://example.org"}, "not-allowed"),
+        ):
+            with self.subTest(name):
+                status, answer = bench.ask("state", {}, headers)
+                self.assertEqual((status, answer["error"]["code"]), (403, code))
+        self.assertEqual(bench.ask("state", {})[0], 200)
+
+    def test_the_page_says_that_its_token_is_wrong(self):
+        bench = self.begin("office")
+        page = at.Page(self.driver, bench.origin + "/#" + "x" * 43)
+        page.wait(lambda: page.texts("#alert")[0].startswith("\u2717 "), "a complaint")
+
+    def test_the_token_leaves_the_address(self):
+        page = self.open("office")
+        self.assertEqual(page.run("return location.hash"), "")
+
+    def test_names_and_values_and_patterns_are_never_taken_as_html(self):
+        bench = self.begin("broken/other-letter-case")
+        name = "invoice <img src=x onerror=document.title='taken'>.txt"
+        document = os.path.join(bench.folder, "invoice 17.txt")
+        with open(document, encoding="utf-8") as file:
+            text = file.read()
+        os.remove(document)
+        with open(os.path.join(bench.folder, name), "w", encoding="utf-8") as file:
+            file.write(text.replace("Anna Arnold", XSS[:70]))
+        settings = json.loads(bench.text())
+        preset = settings["extract_presets"][0]
+        preset["name"] = preset["zones"][0]["name"] = preset["zones"][1]["fields"][0]["name"] = XSS
+        preset["zones"][1]["fields"][0]["value_extract"] = "^" + XSS + "(?<VAL>x)$"
+        bench.write(json.dumps(settings, indent=1))
+        page = self.page_of(bench).wait_for_picture()
+        self.assertIn("<img", page.texts("#list .name")[0])
+        self.assertIn("<img", "".join(page.texts("#fields-body")))
+        for tab in ("#tab-form", "#tab-effect", "#tab-json"):
+            page.one(tab).click()
+        self.assertEqual(page.run("return [...document.querySelectorAll('img')].length"), 1)
+        self.assertNotIn("taken", page.run("return document.title"))
+        self.assertEqual(page.logged(), [])
+
+
+class Access(BrowserTest):
+    def test_all_is_reached_by_keyboard_alone(self):
+        keys = at.keys()
+        page = self.open("broken/other-letter-case")
+        seen = set()
+        page.run("document.querySelector('#title').tabIndex = -1; document.querySelector('#title').focus()")
+        for step in range(60):
+            page.keys(keys.TAB)
+            seen.add(page.run("const e = document.activeElement; return e.id || e.dataset.key || e.tagName"))
+        for wanted in ("propose", "golden", "save", "help", "filter", "kind", "list", "page-number", "draw", "tab-json", "TEXTAREA"):
+            self.assertIn(wanted, seen)
+        self.assertTrue(any(one.startswith("repair") for one in seen), seen)
+        self.assertTrue(any(one.startswith("/extract_presets/0/zones/1") for one in seen), seen)
+
+    def test_a_letter_is_mended_and_saved_by_keyboard_alone(self):
+        keys = at.keys()
+        page = self.open("broken/other-letter-case")
+        for step in range(3):
+            page.keys(keys.F6)
+        for step in range(30):
+            page.keys(keys.TAB)
+            if page.run("return document.activeElement.className") == "repair":
+                break
+        page.keys(keys.ENTER)
+        page.wait_for_field("total", "12.3")
+        page.chord(keys.CONTROL, "s")
+        page.one("dialog[open]")
+        page.keys(keys.ENTER)
+        page.wait(lambda: "(?i)" in self.bench.text(), "the saving")
+
+    def test_whatever_can_be_operated_has_a_role_and_a_name(self):
+        page = self.open("broken/other-letter-case")
+        for tab in ("#tab-json", "#tab-form", "#tab-effect"):
+            page.one(tab).click()
+            nodes = self.driver.execute_cdp_cmd("Accessibility.getFullAXTree", {})["nodes"]
+            operated = {"button", "textbox", "checkbox", "combobox", "listbox", "option", "spinbutton", "searchbox", "tab", "link"}
+            nameless = [
+                node["role"]["value"]
+                for node in nodes
+                if not node.get("ignored") and node.get("role", {}).get("value") in operated and not node.get("name", {}).get("value")
+            ]
+            self.assertEqual(nameless, [], tab)
+
+    def test_it_speaks_the_language_of_the_browser(self):
+        at.look(self.driver, language="de-AT")
+        page = self.open("broken/other-letter-case")
+        self.assertEqual(page.texts("#save"), ["Sichern\u2026"])
+        self.assertEqual(page.run("return document.documentElement.lang"), "de")
+        self.assertEqual(page.field("total")[0], "\u2717 fehlt")
+
+    def test_no_control_is_lost_at_twice_the_size(self):
+        at.look(self.driver, size=(640, 480))
+        page = self.open("broken/other-letter-case").wait_for_picture()
+        wide = page.run("return document.documentElement.scrollWidth > document.documentElement.clientWidth")
+        self.assertFalse(wide)
+        script = """
+            return [...document.querySelectorAll('button, input, select, [role=tab], #list, #editor, #stage .sheet')]
+                .filter((one) => one.checkVisibility() && one.closest('[hidden]') === null)
+                .filter((one) => { const box = one.getBoundingClientRect(); return box.width === 0 || box.right > innerWidth + 1 || box.left < -1; })
+                .filter((one) => one.closest('.CodeMirror') === null).map((one) => one.outerHTML);
+        """
+        self.assertEqual(page.run(script), [])
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+
+    def test_texts_can_be_read_in_light_and_dark(self):
+        for scheme in ("light", "dark"):
+            with self.subTest(scheme):
+                at.look(self.driver, scheme)
+                page = self.open("broken/other-letter-case").wait_for_picture()
+                self.assertEqual(page.run(CONTRAST), [])
+
+
+# Texts whose colours differ from their ground's by less than 4.5 to 1.
+CONTRAST = """
+    const parts = (colour) => colour.match(/[\\d.]+/g).map(Number);
+    const light = (c) => { const [r, g, b] = c.map((v) => { v /= 255; return v <= .03928 ? v / 12.92 : ((v + .055) / 1.055) ** 2.4; });
+        return .2126 * r + .7152 * g + .0722 * b; };
+    const ground = (e) => { for (; e; e = e.parentElement) { const c = parts(getComputedStyle(e).backgroundColor);
+        if (c.length < 4 || c[3] > .9) return c; } return [255, 255, 255]; };
+    const poor = new Set();
+    for (const e of document.querySelectorAll('body *:not(.marks *)')) {
+        const own = [...e.childNodes].some((n) => n.nodeType === 3 && n.textContent.trim());
+        if (!own || !e.checkVisibility() || e.disabled || e.ariaDisabled === 'true') continue;
+        const [a, b] = [light(parts(getComputedStyle(e).color).slice(0, 3)), light(ground(e).slice(0, 3))];
+        if ((Math.max(a, b) + .05) / (Math.min(a, b) + .05) < 4.5) poor.add(e.tagName + '.' + e.className + ': ' + e.textContent.slice(0, 40));
+    }
+    return [...poor];
+"""
+
+
+class Pictures(BrowserTest):
+    def test_pictures_of_the_documents_are_there(self):
+        for scheme in ("light", "dark"):
+            at.look(self.driver, scheme, (1400, 1000))
+            bench = self.begin("office")
+            bench.write(bench.text().replace("^Customer:", "^customer:"))
+            page = self.page_of(bench).wait_for_picture()
+            page.wait(lambda: "not read" not in page.texts("#counts")[0], "the verdicts")
+            page.one('#stage .zone[aria-label="zone Details"]').click()
+            self.write_picture(page, "workbench-%s.png" % scheme)
+        page.one(".repair").click()
+        page.wait_for_field("customer", "C-1008")
+        page.one("#save").click()
+        page.one(".diff")
+        self.write_picture(page, "workbench-save.png")
+
+
+if __name__ == "__main__":
+    sys.exit(main())
