@@ -181,6 +181,18 @@ TEST_F(PlacedZones, AreEmptyWhereTheAnchorRunsAwayAndItIsSaid) {
     EXPECT_THAT(letters.at(0).missing, ElementsAre("total"));
 }
 
+TEST_F(PlacedZones, MayReachAsFarAsNumbersGo) {
+    preset_ = Cfg::ExtractPreset(R"_({"zones": [{"name": "Sum",
+        "location": {"left": -2147483648, "top": -2147483648, "right": 2147483647, "bottom": 2147483647},
+        "fields": [{"name": "all", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}]}]})_"_json.toObject());
+    EXPECT_THAT(valuesOf("Ann\n\nMill Lane 7"), ElementsAre("all Ann\nMill Lane 7"));
+    // Turned inside out it holds nothing.
+    preset_ = Cfg::ExtractPreset(R"_({"zones": [{"name": "Sum",
+        "location": {"left": 2147483647, "top": 2147483647, "right": -2147483648, "bottom": -2147483648},
+        "fields": [{"name": "all", "value_extract": "\\A(?<VAL>(.|\\n)*)\\z"}]}]})_"_json.toObject());
+    EXPECT_THAT(valuesOf("Ann\n\nMill Lane 7"), ElementsAre("all "));
+}
+
 TEST_F(PlacedZones, AreMovedNoFartherThanNumbersGo) {
     constexpr int LAST = std::numeric_limits<int>::max();
     EXPECT_EQ((Box{-5, LAST, LAST, -LAST}).movedBy({10, 10}), (Box{5, LAST, LAST, -LAST + 10}));

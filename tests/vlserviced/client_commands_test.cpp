@@ -476,6 +476,20 @@ TEST_F(ClientCommands, AFileReplacesAPart) {
     EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"B"})"));
 }
 
+TEST_F(ClientCommands, AFileMayBeNamedAfterItsNodeWhereNoKeyOfThePartIsCalledLikeThat) {
+    std::string const file = write("a=acme.json", R"({"code":"B"})");
+    output({"settings", "set", "a=acme", "po", file});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"B"})"));
+    fs::path const before = fs::current_path();
+    fs::current_path(fs::path(file).parent_path());
+    write("code=C", R"({"code":"no"})");
+    output({"settings", "set", "a=acme", "po", "code=C"});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"C"})"));
+    output({"settings", "set", "a=acme", "po", "./code=C"});
+    EXPECT_THAT(output({"settings", "show", "a=acme", "po", "--json"}), HasSubstr(R"("own":{"code":"no"})"));
+    fs::current_path(before);
+}
+
 TEST_F(ClientCommands, AFileWithSettingsOfANodeGivesThePartThatIsNamed) {
     std::string const file = write("node.json", R"({"po":{"code":"C"},"app":{"descr":"x"}})");
     output({"settings", "set", "a=acme", "po", file});

@@ -9,6 +9,7 @@
 #include "vlservice/ipc/update_cfg.h"
 #include "vlservice/json/json_text.h"
 
+#include <filesystem>
 #include <memory>
 #include <ostream>
 #include <utility>
@@ -95,13 +96,20 @@ json::Object readPart(std::string const& file, std::string const& part) {
     return named.isObject() ? named.toObject() : document;
 }
 
+/// A file may be named after its node, such as "a=acme.json": what is no key of the part may be its name.
+bool isFile(std::string const& what, PartSettings const& settings) {
+    std::size_t const equals = what.find('=');
+    return equals == std::string::npos ||
+           (!settings.values.get(what.substr(0, equals)) && std::filesystem::exists(what));
+}
+
 int set(Options const& options, Terminal const& terminal) {
     auto const service = connectToService(options.service, terminal.err);
     std::string const node = nodeIdIn(options.node);
-    bool const isFile = options.what.size() == 1 && options.what.front().find('=') == std::string::npos;
     PartSettings const settings = fetchPart(*service, node, options.part);
-    json::Object const own = isFile ? readPart(options.what.front(), options.part)
-                                    : assigned(settings, options.part, options.what);
+    json::Object const own = options.what.size() == 1 && isFile(options.what.front(), settings)
+                                 ? readPart(options.what.front(), options.part)
+                                 : assigned(settings, options.part, options.what);
     for (auto const& [key, value] : own)
         requireKey(options.part, key, settings.values);
     setPart(*service, node, options.part, own);

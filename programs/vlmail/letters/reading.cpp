@@ -51,6 +51,10 @@ constexpr char const* SAYS_KEY = "says";
 constexpr char const* PRIMARY_ADDRESS_KEY = "primary_address";
 constexpr char const* TRACE_KEY = "trace";
 
+// Why a letter cannot go out, beside the codes of findings and of what settings do not allow.
+constexpr char const* PAGE_DIFFERS = "page-differs";
+constexpr char const* LETTER_NOT_SEPARATED = "letter-not-separated";
+
 json::Value nameOrNull(Cfg::ExtractedField const* field) {
     return field ? json::Value(field->name()) : json::Value(json_null());
 }
@@ -565,8 +569,9 @@ std::string partsInWords(LetterReading const& letter) {
 /// All evidence is in JSON.
 std::string joinsInWords(LetterReading const& letter) {
     Reader::DoubtfulJoin const& first = letter.doubtfulJoins.front();
-    return "letter-not-separated: " + partsInWords(letter) + ": on page " + std::to_string(first.page) + ' ' +
-           first.says + "; correct the mark or the document, or mail them as one letter with --accept-joined";
+    return std::string(LETTER_NOT_SEPARATED) + ": " + partsInWords(letter) + ": on page " +
+           std::to_string(first.page) + ' ' + first.says +
+           "; correct the mark or the document, or mail them as one letter with --accept-joined";
 }
 
 } // namespace
@@ -580,7 +585,7 @@ json::Array toJsonArray(std::vector<int> const& numbers) {
 
 std::string LetterReading::whyNot() const {
     if (!differingPages.empty())
-        return "page-differs: " + pagesInWords(differingPages) +
+        return std::string(PAGE_DIFFERS) + ": " + pagesInWords(differingPages) +
                " would not look like the document's; print it to a new PDF";
     if (!doubtfulJoins.empty())
         return joinsInWords(*this);
@@ -589,6 +594,19 @@ std::string LetterReading::whyNot() const {
         return message.empty() ? "no address to go to" : message;
     std::string const faults = errorsInWords(findings);
     return faults.empty() ? refusal : faults;
+}
+
+std::string LetterReading::codeOfWhyNot() const {
+    if (!differingPages.empty())
+        return PAGE_DIFFERS;
+    if (!doubtfulJoins.empty())
+        return LETTER_NOT_SEPARATED;
+    if (!isReady(*this))
+        return {};
+    // Errors stand first.
+    if (!findings.empty() && findings.front().isError())
+        return nameOf(findings.front().code);
+    return refusal.substr(0, refusal.find(':'));
 }
 
 json::Object DocumentReading::toJson() const {

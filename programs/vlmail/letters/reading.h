@@ -62,6 +62,8 @@ struct LetterReading {
     bool isProductionReady(std::string& message) const { return fields.isProductionReady(message); }
     /// Why the letter cannot go out, for people; empty when it can.
     std::string whyNot() const;
+    /// The code that stands in front of it; empty when there is none.
+    std::string codeOfWhyNot() const;
 };
 
 struct DocumentReading {

@@ -144,7 +144,7 @@ void Dispatch::mailLetters(DocumentReading reading) {
     for (LetterReading& letter : *reading.letters) {
         std::string const why = letter.whyNot();
         if (!why.empty()) {
-            leftOut_.push_back({reading.document, letter.pages, why});
+            leftOut_.push_back({reading.document, letter.pages, why, letter.codeOfWhyNot()});
             continue;
         }
         MailingBuilder& mailing = mailingFor(reading.packPreset).builder();

@@ -57,7 +57,7 @@ private:
         std::string name;
         std::vector<int> pages;
         std::string reason;
-        /// Of a failure; what is left out for a finding has the code in front of its reason.
+        /// Of what is left out it also stands in front of the reason. Empty when there is none.
         std::string code = {};
     };
 

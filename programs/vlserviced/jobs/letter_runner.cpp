@@ -616,6 +616,13 @@ void LetterRunner::noteInHistory(StoredLetter const& letter, LetterState to) {
                                     Protocol::letterStateName(to));
 }
 
+/// Whether one file holds it and others of its mailing: what is sent again must not take its place.
+bool LetterRunner::goesWithOthers(StoredLetter const& letter) const {
+    Protocol::Carriers const carriers = surroundings_.settings().carriers();
+    auto const found = carriers.find(letter.channel);
+    return found != carriers.end() && !isAlone(letter, found->second);
+}
+
 bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter) {
     using Protocol::LetterAction;
     bool const isResent = change.action == LetterAction::Resend;
@@ -627,7 +634,8 @@ bool LetterRunner::recordDecision(Protocol::LetterChange const& change, StoredLe
         isDecided =
             isResent ? letters_.decide(letter.id,
                                        {LetterState::Uncertain, LetterState::Failed, LetterState::Returned},
-                                       to, "a person has it sent again", surroundings_.now())
+                                       to, "a person has it sent again", surroundings_.now(),
+                                       goesWithOthers(letter) ? Goes::Alone : Goes::AsBefore)
                      : letters_.decide(letter.id, {LetterState::Uncertain}, to, "a person says so",
                                        surroundings_.now());
         if (isDecided)

@@ -183,6 +183,7 @@ private:
     bool isDelivering(std::string const& packId) const;
     bool isHandedOver(std::string const& packId) const;
     void noteInHistory(StoredLetter const& letter, LetterState to);
+    bool goesWithOthers(StoredLetter const& letter) const;
     bool recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter);
     void recordCarrier(std::string const& channel, CarrierRecord const& record);
     std::string problemOf(std::string const& packId, LetterCounts const& counts) const;

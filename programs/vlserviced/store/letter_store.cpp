@@ -20,6 +20,9 @@ constexpr char const* SELECT_LETTERS =
 /// As the index has it that holds those alone.
 constexpr char const* TO_GO = "state = 'waiting' AND by_carrier = 1 ";
 
+/// What was tried by a channel before goes without the others of its mailing.
+constexpr char const* WITHOUT_OTHERS = ", tried = CASE WHEN tried = '' THEN channel ELSE tried END";
+
 /// Names of channels have no blanks.
 std::vector<std::string> namesIn(std::string const& text) {
     std::istringstream words(text);
@@ -343,16 +346,17 @@ std::vector<StoredLetter> LetterStore::withOtherSide(std::string const& channel,
 }
 
 bool LetterStore::decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
-                         std::string const& says, long long now) {
+                         std::string const& says, long long now, Goes goes) {
     std::string states;
     for (LetterState const state : from)
         states += (states.empty() ? "'" : ", '") + std::string(letterStateName(state)) + '\'';
     Database::Transaction transaction(database_);
     bool const isDecided =
         database_.change("UPDATE letters SET state = $1, says = $2, changed_at = $3, due = 0, "
-                         "attempts = 0, first_try = 0 WHERE pack = $4 AND number = $5 AND "
-                         "by_carrier = 1 AND state IN (" +
-                             states + ')',
+                         "attempts = 0, first_try = 0" +
+                             std::string(goes == Goes::Alone ? WITHOUT_OTHERS : "") +
+                             " WHERE pack = $4 AND number = $5 AND by_carrier = 1 AND state IN (" + states +
+                             ')',
                          letterStateName(to), says, now, letter.packId, letter.number) == 1;
     if (isDecided && isTaken(to))
         releaseNoticesOf(letter, now);

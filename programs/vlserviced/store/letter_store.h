@@ -74,7 +74,8 @@ struct StoredLetter {
     Notice notice = {};
     /// That are left, in their order.
     std::vector<Mailing::OtherWay> otherWays = {};
-    /// Channels that it failed by, in their order.
+    /// Channels that it failed by, in their order; its own when it goes by that once more, without the others
+    /// of its mailing.
     std::vector<std::string> tried = {};
 };
 
@@ -99,6 +100,13 @@ struct CarrierRecord {
     long long since = 0;
     /// When it may be tried again while it fails.
     long long tryAt = 0;
+};
+
+/// How a letter goes that is moved to another state.
+enum class Goes {
+    AsBefore,
+    /// Without the others of its mailing, whose file stays as it is.
+    Alone,
 };
 
 /// Where letters are that something became of.
@@ -174,7 +182,7 @@ public:
     /// Moves a letter that goes by a carrier to another state; false, and no change, unless it is in one of
     /// `from`. One that waits again is due at once and its attempts count anew.
     bool decide(LetterId const& letter, std::vector<LetterState> const& from, LetterState to,
-                std::string const& says, long long now);
+                std::string const& says, long long now, Goes goes = Goes::AsBefore);
 
     /// Lets notices go that are held: that of a whole job, or those of its letters that are in its container.
     /// Those of a letter that goes by a carrier go when that has taken it.

@@ -121,7 +121,11 @@ TEST_F(PrintReadiness, KeepsLettersWithErrorsOutOfMailingsAndPlans) {
     Ran const plan = run({"plan", "--json", "-o", path("plan.json"), path("bill 1.pdf"), path("bill 2.pdf")});
     EXPECT_EQ(plan.status, 2);
     json::Object const outcome = json::strToObject(plan.out.data(), plan.out.size());
-    EXPECT_EQ(outcome.get("left_out").toArray().size(), 1U);
+    ASSERT_EQ(outcome.get("left_out").toArray().size(), 1U);
+    json::Object const left = outcome.get("left_out").toArray().at(0).toObject();
+    EXPECT_EQ(left.get("code").textOrEmpty(), "content-outside-print-area");
+    EXPECT_THAT(left.get("reason").textOrEmpty(),
+                testing::StartsWith("content-outside-print-area: page 1: "));
     Ran const planned = runVlMail({"mail", "--plan", path("plan.json"), "-o", path("planned")});
     EXPECT_EQ(planned.status, 2);
     EXPECT_THAT(planned.out, HasSubstr("content-outside-print-area: page 1: something reaches "));

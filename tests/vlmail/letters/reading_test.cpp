@@ -17,7 +17,9 @@ namespace {
 using testing::ElementsAre;
 using testing::Field;
 using testing::IsEmpty;
+using testing::Not;
 using testing::SizeIs;
+using testing::StartsWith;
 
 /// A document of two letters, of which the second has no address.
 class Readings : public testing::Test {
@@ -77,6 +79,28 @@ TEST_F(Readings, HoldBackALetterWhosePagesDiffer) {
     EXPECT_EQ(handedOver.letters.value().at(0).whyNot(),
               "page-differs: pages 1-2 would not look like the document's; print it to a new PDF");
     EXPECT_EQ(handedOver.letters->at(1).differingPages, std::vector<int>());
+}
+
+TEST_F(Readings, HaveTheCodeInFrontOfWhyALetterCannotGoOut) {
+    DocumentReading reading = read({}).reading;
+    LetterReading const ready = reading.letters.value().at(0);
+    EXPECT_EQ(ready.codeOfWhyNot(), "");
+    LetterReading differing = ready;
+    differing.differingPages = {2};
+    LetterReading joined = ready;
+    joined.doubtfulJoins = {{2, "the mark is missing"}};
+    LetterReading found = ready;
+    found.findings = {{Production::Code::PageEmpty, Production::Severity::Error, {1}, {}, "x", "y"}};
+    LetterReading refused = ready;
+    refused.refusal = "too-many-sheets: 31 sheets, 5 allowed by u=bob/a=acme";
+    for (LetterReading const* letter : {&differing, &joined, &found, &refused}) {
+        EXPECT_THAT(letter->codeOfWhyNot(), Not(IsEmpty()));
+        EXPECT_THAT(letter->whyNot(), StartsWith(letter->codeOfWhyNot() + ": "));
+    }
+    LetterReading lost = ready;
+    lost.fields = {};
+    EXPECT_EQ(lost.whyNot(), "no address to go to");
+    EXPECT_EQ(lost.codeOfWhyNot(), "");
 }
 
 TEST_F(Readings, TakeWhatComesAlong) {

@@ -512,6 +512,25 @@ TEST_F(LetterRunnerTest, SendsALetterAgainWhenAPersonWantsIt) {
     EXPECT_EQ(job("p1"), "lodged");
 }
 
+TEST_F(LetterRunnerTest, SendsALetterAgainWithoutTheOthersOfItsMailingAndUnderItsOwnKey) {
+    setCarriers(R"("postal": {"type": "folder", "folder": "/shop", "unit": "mailing"})");
+    other_.answer = Outcome{Outcome::Kind::Refused, "no paper"};
+    send("p1", {"postal", "postal", "postal"});
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-postal"));
+    other_.answer = {};
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 3), "nothing was thrown");
+    doWork();
+    EXPECT_EQ(decision(Protocol::LetterAction::Resend, "p1", 2), "nothing was thrown");
+    restart();
+    doWork();
+    EXPECT_THAT(other_.taken, ElementsAre("p1-postal", "p1-3", "p1-2"));
+    EXPECT_THAT(report("p1").letters.at(2).tried, ElementsAre("postal"));
+    EXPECT_EQ(state("p1", 1), "failed: no paper");
+    EXPECT_EQ(state("p1", 2), "accepted: thanks");
+    EXPECT_EQ(state("p1", 3), "accepted: thanks");
+}
+
 TEST_F(LetterRunnerTest, NeverSendsALetterAgainByItselfThatTheOtherSideMayHave) {
     other_.isRepeatable = false;
     send("p1", {"postal", "postal", "postal"});
