@@ -50,9 +50,10 @@ struct MemoryService {
     VlServiced::TokenStore tokenStore{database};
     VlServiced::TokenService tokens{tokenStore, std::string(32, 't'), [] { return 1LL; }, history};
     VlServiced::Access access{[] { return 1LL; }};
-    std::shared_ptr<VlServiced::Processor> processor = std::make_shared<VlServiced::Processor>(
-        settings, documents, tokens, access, history, jobs, runner, letterRunner, packs, letterRegister,
-        "/missing/outbox", [] { return 1LL; }, [] { return Protocol::HealthAnswer(); });
+    std::shared_ptr<VlServiced::Processor> processor =
+        std::make_shared<VlServiced::Processor>(VlServiced::ProcessorSurroundings{
+            settings, documents, tokens, access, history, jobs, runner, letterRunner, packs, letterRegister,
+            "/missing/outbox", [] { return 1LL; }, [] { return Protocol::HealthAnswer(); }});
 
     void carryOut(std::string const& request) {
         auto const cmd = Ipc::makeEmptyCmd(static_cast<unsigned char>(request[0]), processor);

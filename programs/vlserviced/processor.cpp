@@ -57,15 +57,6 @@ Protocol::TreeNode coveredOf(Protocol::TreeNode tree, Policy::Grant const& by) {
 
 } // namespace
 
-Processor::Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens,
-                     Access& access, History& history, JobStore& jobs, JobRunner& runner,
-                     LetterRunner& letters, PackReception& packs, LetterRegister const& letterRegister,
-                     std::filesystem::path outbox, std::function<long long()> now,
-                     std::function<Protocol::HealthAnswer()> health)
-    : settings_(settings), documents_(documents), tokens_(tokens), access_(access), history_(history),
-      jobs_(jobs), runner_(runner), letters_(letters), packs_(packs), letterRegister_(letterRegister),
-      outbox_(std::move(outbox)), now_(std::move(now)), health_(std::move(health)) {}
-
 /// The line for "err": empty when the operation succeeds.
 template<typename Operation>
 std::string Processor::errorOf(Ipc::CmdI const& cmd, Operation operation) {
@@ -90,17 +81,17 @@ json::Object Processor::answerOrError(Ipc::CmdI const& cmd, Operation operation)
 
 void Processor::noteRefusal(std::string const& line) {
     if (measures_)
-        measures_->noteRefusal(access_.refused().isLast(line) ? Refusal::Rights : Refusal::Request);
+        measures_->noteRefusal(around_.access.refused().isLast(line) ? Refusal::Rights : Refusal::Request);
 }
 
 void Processor::carryOut(std::shared_ptr<Ipc::CmdI> const& cmd, Policy::Grant const& by,
                          std::function<void(std::string const& failure)> done) {
     by_ = by;
-    History::Person const acting(history_, by_.name);
+    History::Person const acting(around_.history, by_.name);
     done_ = std::move(done);
     std::string failed;
     try {
-        access_.require(*cmd, by_);
+        around_.access.require(*cmd, by_);
         cmd->accept(*this);
     } catch (std::exception const& failure) {
         failed = Base::codedLine(failure);
@@ -115,9 +106,9 @@ void Processor::submit(std::shared_ptr<Ipc::CmdI> cmd) {
 }
 
 void Processor::visit(Ipc::CSConfigSrvChange& cmd) {
-    settings_.suspend(static_cast<int>(cmd.suspend()));
-    runner_.resume();
-    letters_.proceed();
+    around_.settings.suspend(static_cast<int>(cmd.suspend()));
+    around_.runner.resume();
+    around_.letters.proceed();
 }
 
 void Processor::visit(Ipc::CSConfigIdsList& cmd) {
@@ -135,15 +126,16 @@ void Processor::beginPack(Ipc::CSConfigIdsList& cmd) {
     if (!malformed.empty())
         return cmd.setResp(Protocol::failureAnswer(malformed));
     auto const answered = std::static_pointer_cast<Ipc::CSConfigIdsList>(cmd.shared_from_this());
-    packs_.begin(pack, cmd.processor(),
-                 [this, answered, done = std::exchange(done_, {})](Protocol::BeginPackAnswer const& answer,
-                                                                   std::string const& failure) {
-                     answered->setResp(answerOrError(*answered, [&] {
-                         return failure.empty() ? answer.serialize()
-                                                : throw Base::errorSaid(failure, Base::Code::Unexpected);
-                     }));
-                     done({});
-                 });
+    around_.packs.begin(pack, cmd.processor(),
+                        [this, answered, done = std::exchange(done_, {})](
+                            Protocol::BeginPackAnswer const& answer, std::string const& failure) {
+                            answered->setResp(answerOrError(*answered, [&] {
+                                return failure.empty()
+                                           ? answer.serialize()
+                                           : throw Base::errorSaid(failure, Base::Code::Unexpected);
+                            }));
+                            done({});
+                        });
 }
 
 /// The command has one payload for many questions.
@@ -152,7 +144,7 @@ std::vector<Processor::Question> const& Processor::answerers() {
     static std::vector<Question> const all{
         {SettingsQuery::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.settings_.effective(SettingsQuery(question)).serialize();
+             return self.around_.settings.effective(SettingsQuery(question)).serialize();
          }},
         {JobsQuery::KIND,
          [](Processor& self, json::Object const& question) {
@@ -162,21 +154,21 @@ std::vector<Processor::Question> const& Processor::answerers() {
          [](Processor& self, json::Object const& question) { return self.changeJobs(JobsChange(question)); }},
         {DocumentsQuery::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.documents_.list(DocumentsQuery(question)).serialize();
+             return self.around_.documents.list(DocumentsQuery(question)).serialize();
          }},
         {DocumentPieceQuery::KIND,
          [](Processor& self, json::Object const& question) {
              DocumentPieceQuery const query(question);
-             self.documents_.requireTold(query.sha256, self.by_);
-             return self.documents_.piece(query).serialize();
+             self.around_.documents.requireTold(query.sha256, self.by_);
+             return self.around_.documents.piece(query).serialize();
          }},
         {DocumentUpload::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.documents_.put(DocumentUpload(question)).serialize();
+             return self.around_.documents.put(DocumentUpload(question)).serialize();
          }},
         {DocumentRemoval::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.documents_.remove(DocumentRemoval(question)).serialize();
+             return self.around_.documents.remove(DocumentRemoval(question)).serialize();
          }},
         {LetterChange::KIND,
          [](Processor& self, json::Object const& question) {
@@ -187,34 +179,35 @@ std::vector<Processor::Question> const& Processor::answerers() {
              return self.noteReport(DeliveryReport(question)).serialize();
          }},
         {CarriersQuery::KIND,
-         [](Processor& self, json::Object const&) { return self.letters_.list().serialize(); }},
+         [](Processor& self, json::Object const&) { return self.around_.letters.list().serialize(); }},
         {CarrierChange::KIND,
          [](Processor& self, json::Object const& question) {
              return self.changeCarrier(CarrierChange(question));
          }},
         {TokenAddition::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.tokens_.add(TokenAddition(question), self.by_).serialize();
+             return self.around_.tokens.add(TokenAddition(question), self.by_).serialize();
          }},
         {TokensQuery::KIND,
-         [](Processor& self, json::Object const&) { return self.tokens_.list(self.by_).serialize(); }},
+         [](Processor& self, json::Object const&) { return self.around_.tokens.list(self.by_).serialize(); }},
         {TokenRevocation::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.tokens_.revoke(TokenRevocation(question), self.by_).serialize();
+             return self.around_.tokens.revoke(TokenRevocation(question), self.by_).serialize();
          }},
-        {HealthQuery::KIND, [](Processor& self, json::Object const&) { return self.health_().serialize(); }},
+        {HealthQuery::KIND,
+         [](Processor& self, json::Object const&) { return self.around_.health().serialize(); }},
         {HistoryQuery::KIND,
          [](Processor& self, json::Object const& question) {
              return self.historyOf(HistoryQuery(question)).serialize();
          }},
         {SettingsImpactQuery::KIND,
          [](Processor& self, json::Object const& question) {
-             return self.settings_.impact(SettingsImpactQuery(question)).serialize();
+             return self.around_.settings.impact(SettingsImpactQuery(question)).serialize();
          }},
         {RegisterQuery::KIND,
          [](Processor& self, json::Object const& question) {
-             return knownLetters(RegisterQuery(question), self.letterRegister_, self.jobs_,
-                                 self.letters_.store(), self.now_(), self.by_)
+             return knownLetters(RegisterQuery(question), self.around_.letterRegister, self.around_.jobs,
+                                 self.around_.letters.store(), self.around_.now(), self.by_)
                  .serialize();
          }},
         {BeginPack::KIND, nullptr},
@@ -246,7 +239,7 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
     for (std::string const& id : change.ids) {
         try {
             requireJob(id);
-            runner_.change(change.action, id);
+            around_.runner.change(change.action, id);
             changed.ids.push_back(id);
         } catch (Base::Error const& refused) {
             answer.refused.emplace_back(id, Base::codedLine(refused));
@@ -258,27 +251,28 @@ json::Object Processor::changeJobs(Protocol::JobsChange const& change) {
 }
 
 Protocol::JobsAnswer Processor::listed(Protocol::JobsQuery const& query) const {
-    return listJobs(query, jobs_, letters_.store(), settings_, outbox_, now_(), by_);
+    return listJobs(query, around_.jobs, around_.letters.store(), around_.settings, around_.outbox,
+                    around_.now(), by_);
 }
 
 Protocol::HistoryAnswer Processor::historyOf(Protocol::HistoryQuery const& query) {
     if (query.id)
-        access_.require(Policy::Role::Admin, *query.id, by_);
+        around_.access.require(Policy::Role::Admin, *query.id, by_);
     Protocol::HistoryAnswer answer;
-    answer.entries = history_.of(query.id.value_or(by_.node), query.limit);
+    answer.entries = around_.history.of(query.id.value_or(by_.node), query.limit);
     return answer;
 }
 
 /// Of jobs of other nodes the holder is told what he is told of those that there are not.
 void Processor::requireJob(std::string const& packId) const {
-    std::optional<Job> const job = jobs_.find(packId);
+    std::optional<Job> const job = around_.jobs.find(packId);
     if (!job || !by_.covers(job->cfgId))
         throw Base::Error(Base::Code::MailingUnknown, "there is no mailing " + Base::oneLine(packId));
 }
 
 json::Object Processor::changeLetter(Protocol::LetterChange const& change) {
     requireJob(change.id);
-    letters_.decide(change);
+    around_.letters.decide(change);
     Protocol::JobsQuery changed;
     changed.ids = {change.id};
     changed.letters = true;
@@ -292,7 +286,7 @@ Protocol::DeliveryReportAnswer Processor::noteReport(Protocol::DeliveryReport co
         throw Base::Error(Base::Code::LetterUnknown,
                           "the report is about a message that is no letter of this service");
     requireJob(id->packId);
-    StoredLetter const letter = letters_.note(*id, mail.kind, mail.says);
+    StoredLetter const letter = around_.letters.note(*id, mail.kind, mail.says);
     Protocol::DeliveryReportAnswer answer;
     answer.id = letter.id.packId;
     answer.letter.number = letter.id.isNotice() ? -letter.id.number : letter.id.number;
@@ -306,16 +300,16 @@ Protocol::DeliveryReportAnswer Processor::noteReport(Protocol::DeliveryReport co
 
 json::Object Processor::changeCarrier(Protocol::CarrierChange const& change) {
     if (change.action == Protocol::CarrierAction::Pause)
-        letters_.pause(change.channel);
+        around_.letters.pause(change.channel);
     else
-        letters_.resume(change.channel);
-    return letters_.list().serialize();
+        around_.letters.resume(change.channel);
+    return around_.letters.list().serialize();
 }
 
 void Processor::testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd) {
     auto const done = done_;
     std::string const refused = errorOf(cmd, [&] {
-        letters_.test(channel, [&cmd, done](std::string const& says, std::string const& failure) {
+        around_.letters.test(channel, [&cmd, done](std::string const& says, std::string const& failure) {
             Protocol::CarrierTestAnswer answer;
             answer.says = says;
             cmd.setResp(failure.empty() ? answer.serialize()
@@ -335,8 +329,8 @@ void Processor::visit(Ipc::GuiFwd&) {
 }
 
 void Processor::visit(Ipc::SetSvcCfg& cmd) {
-    settings_.changeService(cmd.req());
-    letters_.proceed();
+    around_.settings.changeService(cmd.req());
+    around_.letters.proceed();
 }
 
 void Processor::visit(Ipc::GetSvcCfg& cmd) {
@@ -345,60 +339,62 @@ void Processor::visit(Ipc::GetSvcCfg& cmd) {
 
 json::Object Processor::serviceOverview() const {
     json::Object counts;
-    for (auto const& [state, count] : jobs_.counts())
+    for (auto const& [state, count] : around_.jobs.counts())
         counts.set(Protocol::stateName(state), count);
-    return Protocol::serviceOverview(settings_.service().told(), outbox_.string(), counts);
+    return Protocol::serviceOverview(around_.settings.service().told(), around_.outbox.string(), counts);
 }
 
 void Processor::visit(Ipc::ProcessPack& cmd) {
     PackLocation pack{cmd.dbHostPort(), cmd.dbName(), cmd.packId()};
     auto done = std::exchange(done_, {});
     JobRunner::RequireNode const mayBeOf = [this, by = by_](std::string const& node) {
-        access_.require(Policy::Role::Send, node, by);
+        around_.access.require(Policy::Role::Send, node, by);
     };
     if (!pack.isWithService())
-        return runner_.accept(pack, mayBeOf, std::move(done));
+        return around_.runner.accept(pack, mayBeOf, std::move(done));
     pack.database = Protocol::PACKS_OF_CONNECTION;
     // Of a job that is on record the pages may be gone.
-    if (jobs_.find(pack.packId))
-        return runner_.accept(pack, mayBeOf, std::move(done));
-    packs_.complete(pack.packId, [this, pack, mayBeOf, done = std::move(done),
-                                  who = by_.name](std::string const& failure) {
-        History::Person const acting(history_, who);
-        failure.empty() ? runner_.accept(pack, mayBeOf, done) : done(failure);
+    if (around_.jobs.find(pack.packId))
+        return around_.runner.accept(pack, mayBeOf, std::move(done));
+    around_.packs.complete(pack.packId, [this, pack, mayBeOf, done = std::move(done),
+                                         who = by_.name](std::string const& failure) {
+        History::Person const acting(around_.history, who);
+        failure.empty() ? around_.runner.accept(pack, mayBeOf, done) : done(failure);
     });
 }
 
 void Processor::visit(Ipc::PriceEst& cmd) {
     cmd.setResp(answerOrError(cmd, [&] {
-        return estimate(Protocol::PriceRequest(cmd.reqParams()), settings_.service().tariff()).serialize();
+        return estimate(Protocol::PriceRequest(cmd.reqParams()), around_.settings.service().tariff())
+            .serialize();
     }));
 }
 
 void Processor::visit(Ipc::UpdateCfg& cmd) {
-    cmd.setResp(errorOf(cmd, [&] { settings_.update(cmd.cfgId().str(), cmd.resetCfg()); }));
+    cmd.setResp(errorOf(cmd, [&] { around_.settings.update(cmd.cfgId().str(), cmd.resetCfg()); }));
 }
 
-void Processor::visit(Ipc::UpdateStatus& cmd) { runner_.updateStatus(cmd.dbHost(), cmd.dbName()); }
+void Processor::visit(Ipc::UpdateStatus& cmd) { around_.runner.updateStatus(cmd.dbHost(), cmd.dbName()); }
 
-void Processor::visit(Ipc::UploadQueued& cmd) { runner_.upload(cmd.dbHost(), cmd.dbName(), by_); }
+void Processor::visit(Ipc::UploadQueued& cmd) { around_.runner.upload(cmd.dbHost(), cmd.dbName(), by_); }
 
 void Processor::visit(Ipc::CfgIdsTree& cmd) {
-    cmd.setResp(answerOrError(cmd, [&] { return coveredOf(settings_.tree(), by_).serialize(); }));
+    cmd.setResp(answerOrError(cmd, [&] { return coveredOf(around_.settings.tree(), by_).serialize(); }));
 }
 
 void Processor::visit(Ipc::CfgIdsForUser& cmd) {
-    for (auto const& [id, description, disabled] : settings_.usableNodes(cmd.inclUser()))
+    for (auto const& [id, description, disabled] : around_.settings.usableNodes(cmd.inclUser()))
         if (by_.covers(id))
             cmd.addToResp({id, description, disabled});
 }
 
 void Processor::visit(Ipc::RemoveCfgNode& cmd) {
-    cmd.setResp(errorOf(cmd, [&] { settings_.remove(cmd.cfgId().str()); }));
+    cmd.setResp(errorOf(cmd, [&] { around_.settings.remove(cmd.cfgId().str()); }));
 }
 
 void Processor::visit(Ipc::SetPartBase& cmd) {
-    cmd.setResp(errorOf(cmd, [&] { settings_.setPart(cmd.cfgId().str(), cmd.partName(), cmd.partJson()); }));
+    cmd.setResp(
+        errorOf(cmd, [&] { around_.settings.setPart(cmd.cfgId().str(), cmd.partName(), cmd.partJson()); }));
 }
 
 } // namespace VlServiced

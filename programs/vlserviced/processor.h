@@ -18,20 +18,34 @@
 #include <filesystem>
 #include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace VlServiced {
+
+/// What commands are carried out on. All that is referred to has to outlive the processor.
+struct ProcessorSurroundings {
+    SettingsService& settings;
+    DocumentService& documents;
+    TokenService& tokens;
+    Access& access;
+    History& history;
+    JobStore& jobs;
+    JobRunner& runner;
+    LetterRunner& letters;
+    PackReception& packs;
+    LetterRegister const& letterRegister;
+    std::filesystem::path outbox;
+    std::function<long long()> now;
+    std::function<Protocol::HealthAnswer()> health;
+};
 
 /// A command is done when its visit returns, unless the visit takes what is to be called then. What fails is
 /// told in the command's own response where that has room for it, as one line under "err"; otherwise the
 /// visit throws Error.
 class Processor : public Ipc::CmdProcessorVLSvcI, public Ipc::SetPartProcessorI {
 public:
-    /// All have to outlive the processor.
-    Processor(SettingsService& settings, DocumentService& documents, TokenService& tokens, Access& access,
-              History& history, JobStore& jobs, JobRunner& runner, LetterRunner& letters,
-              PackReception& packs, LetterRegister const& letterRegister, std::filesystem::path outbox,
-              std::function<long long()> now, std::function<Protocol::HealthAnswer()> health);
+    explicit Processor(ProcessorSurroundings surroundings) : around_(std::move(surroundings)) {}
 
     /// Notes refusals from here on; the measures have to outlive the processor.
     void countIn(Measures& measures) { measures_ = &measures; }
@@ -87,19 +101,7 @@ private:
     void testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd);
     json::Object serviceOverview() const;
 
-    SettingsService& settings_;
-    DocumentService& documents_;
-    TokenService& tokens_;
-    Access& access_;
-    History& history_;
-    JobStore& jobs_;
-    JobRunner& runner_;
-    LetterRunner& letters_;
-    PackReception& packs_;
-    LetterRegister const& letterRegister_;
-    std::filesystem::path outbox_;
-    std::function<long long()> now_;
-    std::function<Protocol::HealthAnswer()> health_;
+    ProcessorSurroundings const around_;
     Measures* measures_ = nullptr;
     /// Of the command at hand.
     Policy::Grant by_;

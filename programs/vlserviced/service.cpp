@@ -742,9 +742,9 @@ private:
     JobRunner runner_{jobs_, surroundings()};
     Retention retention_{jobs_, letterRegister_, outbox_, [this] { return settings_.service(); }, &now};
     PackReception packs_{packStore_, jobs_, receptionSurroundings()};
-    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(
+    std::shared_ptr<Processor> processor_ = std::make_shared<Processor>(ProcessorSurroundings{
         settings_, documents_, tokens_, access_, history_, jobs_, runner_, letterRunner_, packs_,
-        letterRegister_, outbox_, &now, [this] { return healthOf(healthSources()); });
+        letterRegister_, outbox_, &now, [this] { return healthOf(healthSources()); }});
 
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};

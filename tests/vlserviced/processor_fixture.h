@@ -100,7 +100,8 @@ protected:
     VlServiced::TokenStore tokenStore_{*database_};
     VlServiced::TokenService tokens_{tokenStore_, std::string(32, 't'), [] { return 1000LL; }, history_};
     VlServiced::Access access_{[] { return 1000LL; }};
-    std::shared_ptr<VlServiced::Processor> processor_ = std::make_shared<VlServiced::Processor>(
-        settings_, documents_, tokens_, access_, history_, jobs_, runner_, carriers_, packs_, register_,
-        outbox_, [] { return 1000LL; }, [] { return Protocol::HealthAnswer(); });
+    std::shared_ptr<VlServiced::Processor> processor_ =
+        std::make_shared<VlServiced::Processor>(VlServiced::ProcessorSurroundings{
+            settings_, documents_, tokens_, access_, history_, jobs_, runner_, carriers_, packs_, register_,
+            outbox_, [] { return 1000LL; }, [] { return Protocol::HealthAnswer(); }});
 };
