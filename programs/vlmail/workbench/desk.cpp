@@ -10,12 +10,14 @@
 #include "programs/vlmail/golden/test_case.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/workbench/evaluation.h"
+#include "programs/vlmail/workbench/proposal.h"
 #include "vlservice/json/json_text.h"
 
 #include <algorithm>
 #include <array>
 #include <new>
 #include <system_error>
+#include <vector>
 
 namespace VlMail::Workbench {
 namespace {
@@ -35,6 +37,8 @@ constexpr std::array QUESTIONS{
     Question{"blocks", &Desk::blocks},
     Question{"verdict", &Desk::verdict},
     Question{"expectation", &Desk::expectation},
+    Question{"propose", &Desk::propose},
+    Question{"adopt", &Desk::adopt},
 };
 
 json::Object brokenToJson(BrokenText const& broken) {
@@ -281,6 +285,23 @@ Answer Desk::expectation(json::Object const& query) {
     if (reading.failed())
         throw Base::Error(reading.code, reading.error);
     return answerOf({{"text", printed(expectationOf(reading))}});
+}
+
+Answer Desk::propose(json::Object const& query) {
+    std::vector<Reader::Document> documents;
+    for (json::Value const& name : query.get("documents").toArray())
+        documents.push_back(Reader::openDocument(folders_.documents / name.toString()));
+    if (documents.empty())
+        throw Base::Error(Base::Code::RequestInvalid, "a proposal is made from 1 document or more");
+    return answerOf(proposalFrom(documents));
+}
+
+Answer Desk::adopt(json::Object const& query) {
+    SettingsInWork const& before = settings(query);
+    Adopted const after = adopted(before, query.get("proposal").toObject());
+    return answerOf({{"settings", after.text.text()},
+                     {"edits", toJson(editsBetween(before.text(), after.text.text()))},
+                     {"pointer", after.pointer}});
 }
 
 } // namespace VlMail::Workbench

@@ -44,6 +44,9 @@ public:
     Answer verdict(json::Object const& query);
     /// What would be kept as a golden case.
     Answer expectation(json::Object const& query);
+    /// A new preset from documents, and the settings with it.
+    Answer propose(json::Object const& query);
+    Answer adopt(json::Object const& query);
 
 private:
     /// Verdicts by settings, for the document of that file.

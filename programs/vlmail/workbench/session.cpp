@@ -37,6 +37,8 @@ constexpr std::array READINGS{
     Reading{"edit", false, false},
     Reading{"picture"},
     Reading{"blocks"},
+    Reading{"propose", true, false},
+    Reading{"adopt", false, false},
 };
 
 ReaderProcess::Work deskWork(Folders const& folders) {
@@ -68,7 +70,7 @@ std::vector<std::string> documentsOf(json::Object const& query) {
     for (json::Value const& name : query.get("documents").toArray())
         names.push_back(name.toString());
     if (names.empty() || names.size() > MOST_IN_BATCH)
-        throw Base::Error(Base::Code::RequestInvalid, "verdicts are asked for 1 to 50 documents at once");
+        throw Base::Error(Base::Code::RequestInvalid, "1 to 50 documents can be asked for at once");
     return names;
 }
 
@@ -150,6 +152,9 @@ void Session::answer(std::string const& what, std::string body, Door::Respond co
         std::string const document = query.get("document").textOrEmpty();
         if (reading->isOfDocument)
             requireDocument(document);
+        if (what == "propose")
+            for (std::string const& name : documentsOf(query))
+                requireDocument(name);
         front_.ask({what, std::move(body), document, reading->isReplaceable}, respond);
     } catch (std::bad_alloc const&) {
         throw;

@@ -189,6 +189,58 @@ TEST_F(WorkbenchDesk, RefusesParametersThatAreNone) {
     EXPECT_EQ(desk.answer("nothing", "{}").status, 404);
 }
 
+/// Proposals are taken into settings of every form.
+class AProposal : public testing::TestWithParam<char const*> {};
+
+TEST_P(AProposal, IsAPresetThatReadsItsDocumentAndThatLintFindsNoFaultWith) {
+    Desk office({fs::path(SOURCE_FOLDER) / "examples/office"});
+    auto const ask = [&](char const* what, json::Object const& query) {
+        return objectIn(office.answer(what, json::toText(query)));
+    };
+    json::Array documents;
+    documents.append("Invoice 17.pdf");
+    documents.append("Invoice 19.pdf");
+    json::Object proposal = ask("propose", {{"documents", documents}});
+    EXPECT_EQ(proposal.get("match").toObject().get("proposal").textOrEmpty(), "Invoice \\d+\\.pdf");
+    EXPECT_THAT(proposal.get("address").toObject().get("says").textOrEmpty(),
+                StartsWith("\"Ms Ada Brook / "));
+    json::Array const fields = proposal.get("fields").toArray();
+    ASSERT_EQ(fields.size(), 3U);
+    EXPECT_EQ(fields.at(0).toObject().get("value").textOrEmpty(), "2024-17");
+    EXPECT_EQ(fields.at(0).toObject().get("page").toInt(), 1);
+    EXPECT_THAT(fields.at(2).toObject().get("says").textOrEmpty(), HasSubstr("behind \"Email\""));
+    json::Array taken;
+    json::Object renamed = fields.at(0).toObject();
+    renamed.set("name", "bill");
+    taken.append(renamed);
+    proposal.set("fields", taken);
+    json::Object const after = ask("adopt", {{"settings", GetParam()}, {"proposal", proposal}});
+    json::Object const told =
+        ask("evaluate", {{"document", "Invoice 17.pdf"}, {"settings", after.get("settings")}});
+    EXPECT_EQ(json::toText(told.get("lint")), "[]");
+    EXPECT_EQ(told.get("extract_preset").toObject().get("pointer").textOrEmpty(),
+              after.get("pointer").textOrEmpty());
+    EXPECT_EQ(told.get("verdict").textOrEmpty(), "ready");
+    EXPECT_EQ(fieldState(told, "bill"), "found");
+    EXPECT_EQ(fieldState(told, "email"), "not there");
+    EXPECT_EQ(edited(GetParam(), after.get("edits")), after.get("settings").textOrEmpty());
+}
+
+INSTANTIATE_TEST_SUITE_P(TakenInto, AProposal,
+                         testing::Values("{}", "{\n  \"extract_presets\": [],\n  \"pack_presets\": []\n}\n",
+                                         R"({"presets": {
+ "extract_presets": [
+  {"match": "Letter .*", "pack_preset": "Draft", "zones": [{"name": "_Address", "fields": [
+    {"name": "postal", "value_extract": "\\A(?<VAL>(.{1,72}\\n){1,8}.{1,72})\\Z", "priority": 1, "send_to_server": true}]}]}
+ ],
+ "pack_presets": [{"name": "Draft"}]
+}})"));
+
+TEST_F(WorkbenchDesk, ProposesNothingFromWhatIsNoProposal) {
+    EXPECT_EQ(desk.answer("propose", R"({"documents": []})").status, 400);
+    EXPECT_EQ(desk.answer("adopt", R"({"settings": "{}", "proposal": {"fields": 1}})").status, 400);
+}
+
 class RepairedExamples : public WorkbenchDesk, public testing::WithParamInterface<std::string> {};
 
 std::vector<std::string> brokenLetters() {
