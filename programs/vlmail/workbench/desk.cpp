@@ -129,10 +129,17 @@ Reader::Document& Desk::document(json::Object const& query) {
 
 Answer Desk::evaluate(json::Object const& query) {
     std::optional<BrokenText> const broken = whatIsBroken(query.get("settings").toString());
-    json::Object answer = linted(broken, broken ? nullptr : &settings(query));
-    answer.set("document", query.get("document").toString());
-    if (broken)
+    if (broken) {
+        json::Object answer = linted(broken, nullptr);
+        answer.set("document", query.get("document").toString());
         return answerOf(answer);
+    }
+    // Looking a pattern over costs more than reading a letter by it: that goes with the slower look at the
+    // paper.
+    json::Object answer{{"broken", json::Value(json_null())}};
+    if (query.get("checks").isTrue() || settings(query).isLookedOver())
+        answer.set("lint", settings(query).findings());
+    answer.set("document", query.get("document").toString());
     try {
         if (!query.get("checks").isTrue()) {
             addEvaluation(answer, document(query), settings(query), nullptr);
@@ -287,6 +294,7 @@ Answer Desk::expectation(json::Object const& query) {
     return answerOf({{"text", printed(expectationOf(reading))}});
 }
 
+// All that is asked is a member of one type. NOLINTNEXTLINE(readability-make-member-function-const)
 Answer Desk::propose(json::Object const& query) {
     std::vector<Reader::Document> documents;
     for (json::Value const& name : query.get("documents").toArray())

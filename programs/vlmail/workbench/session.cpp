@@ -155,7 +155,8 @@ void Session::answer(std::string const& what, std::string body, Door::Respond co
         if (what == "propose")
             for (std::string const& name : documentsOf(query))
                 requireDocument(name);
-        front_.ask({what, std::move(body), document, reading->isReplaceable}, respond);
+        ReaderProcess& process = query.get("checks").isTrue() ? back_ : front_;
+        process.ask({what, std::move(body), document, reading->isReplaceable}, respond);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (json::Exc const& wrong) {

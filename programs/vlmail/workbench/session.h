@@ -39,7 +39,7 @@ private:
     std::unique_ptr<SettingsStore> store_;
     /// For the document that a person looks at.
     ReaderProcess front_;
-    /// For all the others, behind it.
+    /// For all the others, and for what takes longer, behind it.
     ReaderProcess back_;
     /// The verdicts that were asked for last.
     std::shared_ptr<Batch> batch_;

@@ -20,6 +20,8 @@ public:
     PresetsDocument const& document() const { return document_; }
     /// What lint finds, as {"severity", "kind", "pointer", "from", "to", "what", "advice"}.
     json::Array const& findings();
+    /// Whether they are known.
+    bool isLookedOver() const { return findings_.has_value(); }
 
     /// Throw Base::Error when the settings cannot be used.
     NodeSettings const& node() { return used().node; }

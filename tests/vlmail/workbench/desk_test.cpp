@@ -154,6 +154,18 @@ TEST_F(WorkbenchDesk, SaysWhatLintSaysAndWhere) {
     EXPECT_EQ(finding.get("pointer").textOrEmpty(), "/extract_presets/0/zones/0/fields/0/value_extract");
 }
 
+TEST_F(WorkbenchDesk, LooksSettingsOverBehindTheFirstAnswer) {
+    std::ofstream(folder.path() / "invoice 17.txt") << WORKBENCH_LETTER;
+    json::Object query{{"document", "invoice 17.txt"}, {"settings", TOTAL_SETTINGS}};
+    EXPECT_FALSE(ask("evaluate", query).get("lint"));
+    query.set("checks", json::Value(json_true()));
+    json::Object const whole = ask("evaluate", query);
+    EXPECT_TRUE(whole.get("lint").isArray());
+    EXPECT_EQ(fieldState(whole, "total"), "found");
+    query.set("checks", json::Value(json_false()));
+    EXPECT_EQ(json::toText(ask("evaluate", query).get("lint")), json::toText(whole.get("lint")));
+}
+
 TEST_F(WorkbenchDesk, ShowsTheEnginesRefusalOfARunawayPattern) {
     std::ofstream(folder.path() / "invoice 17.txt") << "\n\n" << std::string(60, 'a') << "!\n";
     json::Object const told = evaluate("invoice 17.txt", totalWith("^(?<VAL>(a|aa)+)$"));
@@ -217,7 +229,7 @@ TEST_P(AProposal, IsAPresetThatReadsItsDocumentAndThatLintFindsNoFaultWith) {
     json::Object const after = ask("adopt", {{"settings", GetParam()}, {"proposal", proposal}});
     json::Object const told =
         ask("evaluate", {{"document", "Invoice 17.pdf"}, {"settings", after.get("settings")}});
-    EXPECT_EQ(json::toText(told.get("lint")), "[]");
+    EXPECT_EQ(json::toText(ask("lint", {{"settings", after.get("settings")}}).get("lint")), "[]");
     EXPECT_EQ(told.get("extract_preset").toObject().get("pointer").textOrEmpty(),
               after.get("pointer").textOrEmpty());
     EXPECT_EQ(told.get("verdict").textOrEmpty(), "ready");
@@ -282,7 +294,8 @@ TEST_P(RepairedExamples, FindTheFieldByWhatANearMissProposes) {
     std::string const repaired = edited(settings, miss.get("edits"));
     json::Object const after = evaluate(repaired);
     EXPECT_EQ(fieldState(after, field), "found") << miss.get("change").textOrEmpty();
-    EXPECT_THAT(json::toText(after.get("lint")), "[]") << repaired;
+    Answer const linted = reader.answer("lint", json::toText(json::Object{{"settings", repaired}}));
+    EXPECT_EQ(linted.body, "{\"broken\":null,\"lint\":[]}\n") << repaired;
 }
 
 INSTANTIATE_TEST_SUITE_P(OfBrokenLetters, RepairedExamples, testing::ValuesIn(brokenLetters()),

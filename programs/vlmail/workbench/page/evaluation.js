@@ -60,7 +60,7 @@ export class Evaluation {
         session.evaluated(await this.api.call(document ? "evaluate" : "lint", request, signal), text);
         session.tell("idle");
         this.#judge();
-        if (document && !session.broken && session.evaluation.letters?.length)
+        if (document && !session.broken)
             session.evaluated(await this.api.call("evaluate", { ...request, checks: true }, signal), text);
     }
 

@@ -132,7 +132,7 @@ export class Session extends EventTarget {
     /** Takes an answer over; one that no document was read for has findings alone. */
     evaluated(evaluation, text) {
         this.broken = evaluation.broken ?? null;
-        this.lint = evaluation.lint ?? [];
+        this.lint = evaluation.lint ?? this.lint;
         if (!this.broken && evaluation.document) {
             this.evaluation = evaluation;
             this.evaluatedText = text;
