@@ -454,8 +454,10 @@ private:
     }
 
     void stop() {
+        // First, whatever fails: timers that have expired already are not stopped by a cancel.
+        isStopping_ = true;
         manager_.onStopping();
-        held_.releaseAll();
+        releaseHeld();
         server_->stop();
         discovery_.reset();
         upkeep_.cancel();
@@ -465,8 +467,17 @@ private:
         poll_.cancel();
         if (neighbours_)
             neighbours_->stop();
-        isStopping_ = true;
         signals_.cancel();
+    }
+
+    /// Their clients are told by the end of the connection otherwise.
+    void releaseHeld() {
+        try {
+            held_.releaseAll();
+        } catch (Database::QueryError const& failure) {
+            Log::Lock(4).logStreamLine()
+                << "Questions about jobs stay without an answer: " << Base::oneLine(failure.what());
+        }
     }
 
     Neighbours::Heard heard() {
@@ -483,7 +494,7 @@ private:
     void awaitHold() {
         hold_.expires_after(std::chrono::milliseconds(jobs_.holder().seconds * 1000 / 4));
         hold_.async_wait([this](boost::system::error_code const& ec) {
-            if (ec)
+            if (ec || isStopping_)
                 return;
             awaitHold();
             runner_.keepHold();
@@ -498,7 +509,7 @@ private:
     void awaitPoll() {
         poll_.expires_after(POLL_TIME);
         poll_.async_wait([this](boost::system::error_code const& ec) {
-            if (ec || !neighbours_)
+            if (ec || isStopping_ || !neighbours_)
                 return;
             awaitPoll();
             settings_.forgetRead();
@@ -545,7 +556,7 @@ private:
     void awaitUpkeep() {
         upkeep_.expires_after(RETRY_TIME);
         upkeep_.async_wait([this](boost::system::error_code const& ec) {
-            if (ec)
+            if (ec || isStopping_)
                 return;
             awaitUpkeep();
             keepUp();

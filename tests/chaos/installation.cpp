@@ -191,15 +191,19 @@ bool Installation::start(std::size_t service, ServiceProcess::Environment const&
     return place.port != 0;
 }
 
+int Installation::end(std::size_t service) {
+    ServiceProcess& process = *places_.at(service).process;
+    process.signal(SIGTERM);
+    return process.wait();
+}
+
 std::vector<std::string> Installation::restartAll() {
     std::vector<std::string> wrong;
     for (std::size_t service = 0; service < SERVICES; ++service) {
-        ServiceProcess& process = *places_[service].process;
-        process.signal(SIGTERM);
-        int const status = process.wait();
+        int const status = end(service);
         if (places_[service].port != 0 && status != 0)
             wrong.push_back("service " + std::to_string(service) + " ended with status " +
-                            std::to_string(status) + ": " + process.errors());
+                            std::to_string(status) + ": " + places_[service].process->errors());
         kill(service);
         if (!start(service))
             wrong.push_back("service " + std::to_string(service) +

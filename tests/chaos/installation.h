@@ -82,6 +82,8 @@ public:
 
     /// Starts the service anew when it does not run. False when it did not come up.
     bool start(std::size_t service, ServiceProcess::Environment const& more = {});
+    /// Has the service end in order, and gives its exit status.
+    int end(std::size_t service);
     bool runs(std::size_t service) const { return places_.at(service).process->isRunning(); }
     /// Ends each and starts it anew; what went wrong with that, a line each.
     std::vector<std::string> restartAll();
