@@ -302,6 +302,23 @@ class Saving(BrowserTest):
         page.type_settings(page.settings().replace("^Invoice:", "^No such label:"))
         page.wait(lambda: "1 not as kept" in page.texts("#tab-effect")[0], "the difference")
 
+    def test_a_preset_is_made_from_the_document_by_ticking(self):
+        bench = self.begin("office")
+        bench.write("{}\n")
+        page = self.page_of(bench)
+        page.one("#propose").click()
+        page.one("dialog[open]")
+        ticks = page.find("dialog[open] .tick")
+        self.assertGreater(len(ticks), 2)
+        ticks[-1].find_element("css selector", "input[type=checkbox]").click()
+        left_out = ticks[-1].find_element("css selector", "strong").text
+        self.accept(page)
+        page.wait(lambda: page.find("#fields-body .field"), "the fields")
+        values = page.wait(lambda: page.texts("#fields-body .value"), "values")
+        self.assertIn("Ms Ada Brook\n14 Mill Lane\nHEBDEN BRIDGE\nHX7 8AB", values)
+        self.assertNotIn(left_out, values)
+        page.wait(lambda: not page.find("#lint li.error"), "no errors")
+
 
 class Safety(BrowserTest):
     def test_a_wrong_token_host_or_origin_is_refused(self):
