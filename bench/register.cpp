@@ -49,7 +49,7 @@ public:
         register_.enter({"p", "", 1, 2}, letters(0, FEW), LetterRegister::Known::Refused);
         database_->change(
             "WITH RECURSIVE n(number) AS (SELECT $1 UNION ALL SELECT number + 1 FROM n WHERE number < $2) "
-            "INSERT INTO registered_letters SELECT hex(randomblob(22)), 2, number, 2, 0 FROM n WHERE "
+            "INSERT INTO registered_letters SELECT hex(randomblob(22)), 0, 2, number, 2, 0 FROM n WHERE "
             "number < $2 ORDER BY 1",
             FEW, count);
         transaction.commit();

@@ -6,6 +6,7 @@
 #include "programs/channel/token.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <map>
 #include <set>
 
@@ -16,7 +17,8 @@ namespace {
 constexpr std::size_t AT_ONCE = 100;
 /// Others wait meanwhile.
 constexpr int REMOVED_AT_ONCE = 1000;
-constexpr long long EVER = std::numeric_limits<long long>::max();
+/// Of a letter that is sent for the first time, and as if it were.
+constexpr long long FIRST_TURN = 0;
 
 std::string secretIn(Database::Connection& database) {
     Database::Rows rows = database.query("SELECT secret FROM register_secret");
@@ -34,6 +36,14 @@ std::string secretOf(Database::Connection& database) {
 }
 
 std::string placeholder(std::size_t number) { return '$' + std::to_string(number); }
+
+/// A statement's one column.
+std::set<std::string> lettersIn(Database::Rows rows) {
+    std::set<std::string> letters;
+    while (rows.next())
+        letters.insert(rows.text(0));
+    return letters;
+}
 
 } // namespace
 
@@ -57,28 +67,52 @@ long long LetterRegister::mailingId(RegisteredMailing const& mailing) {
     return id;
 }
 
-std::vector<std::string> LetterRegister::insert(Keys const& keys, std::size_t from, std::size_t to,
-                                                long long mailing, long long endsAt, long long freeAt) {
-    constexpr std::size_t COMMON = 3;
-    Database::Values values{mailing, endsAt, freeAt};
+std::set<std::string> LetterRegister::insert(Keys const& keys, RegisteredMailing const& mailing, long long id,
+                                             long long turn) {
+    constexpr std::size_t COMMON = 4;
+    Database::Values values{id, mailing.endsAt, mailing.at, turn};
     std::string rows;
-    for (std::size_t i = from; i < to; ++i) {
+    for (std::size_t i = 0; i < keys.size(); ++i) {
         values.emplace_back(keys[i].first);
         values.emplace_back(keys[i].second);
-        std::size_t const at = COMMON + 2 * (i - from);
-        rows +=
-            (rows.empty() ? "(" : ", (") + placeholder(at + 1) + ", $1, " + placeholder(at + 2) + ", $2, 0)";
+        std::size_t const at = COMMON + 2 * i;
+        rows += (rows.empty() ? "(" : ", (") + placeholder(at + 1) + ", $4, $1, " + placeholder(at + 2) +
+                ", $2, 0)";
     }
-    Database::Rows entered = database_.queryAll(
-        "INSERT INTO registered_letters (letter, mailing, number, ends_at, is_free) VALUES " + rows +
-            " ON CONFLICT (letter) DO UPDATE SET mailing = excluded.mailing, number = excluded.number, "
-            "ends_at = excluded.ends_at, is_free = 0 WHERE registered_letters.is_free = 1 OR "
-            "registered_letters.ends_at <= $3 RETURNING letter",
-        values);
-    std::vector<std::string> all;
-    while (entered.next())
-        all.push_back(entered.text(0));
-    return all;
+    return lettersIn(database_.queryAll(
+        "INSERT INTO registered_letters (letter, turn, mailing, number, ends_at, is_free) VALUES " + rows +
+            " ON CONFLICT (letter, turn) DO UPDATE SET mailing = excluded.mailing, number = "
+            "excluded.number, ends_at = excluded.ends_at, is_free = 0 WHERE registered_letters.is_free = 1 "
+            "OR registered_letters.ends_at <= $3 RETURNING letter",
+        values));
+}
+
+std::set<std::string> LetterRegister::sentAgain(Keys const& keys, long long now) const {
+    Database::Values values{now};
+    std::string letters;
+    for (auto const& [letter, number] : keys) {
+        values.emplace_back(letter);
+        letters += (letters.empty() ? "" : ", ") + placeholder(values.size());
+    }
+    return lettersIn(database_.queryAll("SELECT letter FROM registered_letters WHERE letter IN (" + letters +
+                                            ") AND turn > 0 AND is_free = 0 AND ends_at > $1",
+                                        values));
+}
+
+void LetterRegister::enterOnce(Keys const& keys, RegisteredMailing const& mailing, long long id,
+                               std::set<long long>& refused) {
+    std::set<std::string> const entered = insert(keys, mailing, id, FIRST_TURN);
+    std::set<std::string> const again = sentAgain(keys, mailing.at);
+    for (auto const& [letter, number] : keys)
+        if (!entered.contains(letter) || again.contains(letter))
+            refused.insert(number);
+}
+
+void LetterRegister::enterAgain(Keys keys, RegisteredMailing const& mailing, long long id) {
+    std::set<std::string> const entered = insert(keys, mailing, id, FIRST_TURN);
+    std::erase_if(keys, [&](auto const& key) { return entered.contains(key.first); });
+    if (!keys.empty())
+        insert(keys, mailing, id, id);
 }
 
 std::vector<long long> LetterRegister::enter(RegisteredMailing const& mailing,
@@ -91,14 +125,14 @@ std::vector<long long> LetterRegister::enter(RegisteredMailing const& mailing,
     // In the order of their keys, so that two services never wait for one another.
     Keys const keys(byKey.begin(), byKey.end());
     long long const id = mailingId(mailing);
-    for (std::size_t from = 0; from < keys.size(); from += AT_ONCE) {
-        std::size_t const to = std::min(from + AT_ONCE, keys.size());
-        std::vector<std::string> const entered =
-            insert(keys, from, to, id, mailing.endsAt, known == Known::Refused ? mailing.at : EVER);
-        std::set<std::string> const there(entered.begin(), entered.end());
-        for (std::size_t i = from; i < to; ++i)
-            if (!there.contains(keys[i].first))
-                refused.insert(keys[i].second);
+    for (auto from = keys.begin(); from != keys.end();) {
+        auto const to = from + std::min<std::ptrdiff_t>(AT_ONCE, keys.end() - from);
+        Keys const some(from, to);
+        if (known == Known::SentAgain)
+            enterAgain(some, mailing, id);
+        else
+            enterOnce(some, mailing, id, refused);
+        from = to;
     }
     return {refused.begin(), refused.end()};
 }
@@ -111,7 +145,8 @@ std::vector<RegisteredLetter> LetterRegister::find(std::vector<std::string> cons
         Database::Rows rows =
             database_.query("SELECT m.pack, m.node, m.at, l.ends_at, l.number FROM registered_letters l "
                             "JOIN registered_mailings m ON m.id = l.mailing "
-                            "WHERE l.letter = $1 AND l.is_free = 0 AND l.ends_at > $2",
+                            "WHERE l.letter = $1 AND l.is_free = 0 AND l.ends_at > $2 "
+                            "ORDER BY m.at DESC, m.id DESC LIMIT 1",
                             key, now);
         if (rows.next())
             found.push_back(
@@ -128,8 +163,8 @@ bool LetterRegister::removeSome(long long now) {
     long long const id = past.number(0);
     past.next();
     Database::Transaction transaction(database_);
-    if (database_.change("DELETE FROM registered_letters WHERE letter IN (SELECT letter FROM "
-                         "registered_letters WHERE mailing = $1 LIMIT " +
+    if (database_.change("DELETE FROM registered_letters WHERE mailing = $1 AND letter IN (SELECT letter "
+                         "FROM registered_letters WHERE mailing = $1 LIMIT " +
                              std::to_string(REMOVED_AT_ONCE) + ")",
                          id) == 0)
         database_.change("DELETE FROM registered_mailings WHERE id = $1", id);

@@ -5,7 +5,7 @@
 #include "programs/mailing/mailing_outline.h"
 
 #include <cstddef>
-#include <limits>
+#include <set>
 #include <string>
 #include <utility>
 #include <vector>
@@ -54,9 +54,14 @@ private:
 
     std::string keyOf(std::string const& digest) const;
     long long mailingId(RegisteredMailing const& mailing);
-    /// The keys that could be entered, of some of them.
-    std::vector<std::string> insert(Keys const& keys, std::size_t from, std::size_t to, long long mailing,
-                                    long long endsAt, long long freeAt);
+    /// The letters that could be entered, of not too many.
+    std::set<std::string> insert(Keys const& keys, RegisteredMailing const& mailing, long long id,
+                                 long long turn);
+    /// Those that a mailing has in which they were sent again.
+    std::set<std::string> sentAgain(Keys const& keys, long long now) const;
+    void enterOnce(Keys const& keys, RegisteredMailing const& mailing, long long id,
+                   std::set<long long>& refused);
+    void enterAgain(Keys keys, RegisteredMailing const& mailing, long long id);
 
     Database::Connection& database_;
     std::string secret_;

@@ -276,6 +276,8 @@ FOR EACH STATEMENT EXECUTE FUNCTION tell_of_letters();
 /// Letters that were accepted, each under a key that tells nothing of it, until somebody may send the same
 /// one again. `number` is that of what it goes out in; a key that is free belongs to a letter that went
 /// nowhere. Triggers keep that in step with jobs and letters, whoever changes them.
+/// The turn of a letter is 0, or the id of a mailing that it was sent again in: each frees its own, and it may go out once
+/// more when none of them has it.
 constexpr char const* SCHEMA_12 = R"sql(
 CREATE TABLE register_secret (
     one    INTEGER NOT NULL PRIMARY KEY CHECK (one = 1),
@@ -290,13 +292,16 @@ CREATE TABLE registered_mailings (
 );
 CREATE INDEX registered_mailings_by_end ON registered_mailings (ends_at);
 CREATE TABLE registered_letters (
-    letter  TEXT NOT NULL PRIMARY KEY,
+    letter  TEXT NOT NULL,
+    turn    INTEGER NOT NULL,
     mailing INTEGER NOT NULL,
     number  INTEGER NOT NULL,
     ends_at INTEGER NOT NULL,
-    is_free INTEGER NOT NULL
+    is_free INTEGER NOT NULL,
+    PRIMARY KEY (letter, turn)
 ) WITHOUT ROWID;
 CREATE INDEX registered_letters_by_mailing ON registered_letters (mailing, number);
+CREATE INDEX letters_sent_again ON registered_letters (letter) WHERE turn > 0;
 )sql";
 
 constexpr char const* SQLITE_12 = R"sql(

@@ -106,6 +106,31 @@ TEST_P(LetterRegisterTest, GivesLettersThatAreSentAgainToTheLaterMailing) {
     EXPECT_THAT(packsOf({1}), ElementsAre("p2 1"));
 }
 
+TEST_P(LetterRegisterTest, KnowsALetterThatWasSentAgainUntilNeitherMailingHasIt) {
+    for (std::string const pack : {"p1", "p2", "p3"})
+        accept(pack);
+    EXPECT_THAT(enter("p1", {1}), IsEmpty());
+    EXPECT_THAT(enter("p2", {1}, Known::SentAgain), IsEmpty());
+    EXPECT_THAT(enter("p3", {1}, Known::SentAgain), IsEmpty());
+    EXPECT_TRUE(jobs_->cancel("p3", 1001));
+    EXPECT_THAT(packsOf({1}), ElementsAre("p2 1"));
+    EXPECT_TRUE(jobs_->cancel("p1", 1001));
+    EXPECT_THAT(packsOf({1}), ElementsAre("p2 1"));
+    EXPECT_THAT(enter("p4", {1}), ElementsAre(1));
+    EXPECT_TRUE(jobs_->cancel("p2", 1001));
+    EXPECT_THAT(packsOf({1}), IsEmpty());
+    EXPECT_THAT(enter("p4", {1}), IsEmpty());
+}
+
+TEST_P(LetterRegisterTest, KnowsALetterThatWasSentAgainForLongerThanTheFirstTime) {
+    EXPECT_THAT(enter("p1", {1}), IsEmpty());
+    EXPECT_THAT(enter("p2", {1}, Known::SentAgain, ENDS_AT - 1), IsEmpty());
+    while (register_->removeSome(ENDS_AT)) {
+    }
+    EXPECT_THAT(packsOf({1}, ENDS_AT), ElementsAre("p2 1"));
+    EXPECT_THAT(enter("p3", {1}, Known::Refused, ENDS_AT), ElementsAre(1));
+}
+
 TEST_P(LetterRegisterTest, KnowsALetterAsLongAsItsMailingSays) {
     EXPECT_THAT(enter("p1", {1}), IsEmpty());
     EXPECT_THAT(packsOf({1}, ENDS_AT - 1), ElementsAre("p1 1"));
