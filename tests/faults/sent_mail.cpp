@@ -55,11 +55,19 @@ void SentMail::check(Ended const& ended) {
     std::multiset<std::string> const after = mailings();
     if (after.size() > before_.size() + 1 ||
         std::set<std::string>(after.begin(), after.end()).size() != after.size())
-        find("sends a mailing twice");
+        find("sends a mailing twice, of " + std::to_string(before_.size()) + " before:" + newOnes(after));
     for (std::string const& id : after)
         if (!before_.contains(id) &&
             !isSaid(service_.verify(service_.data() / "outbox" / (id + ".mailing")), "all whole"))
             find("sends the mailing " + id + ", which is not whole");
+}
+
+std::string SentMail::newOnes(std::multiset<std::string> const& after) const {
+    std::string all;
+    for (std::string const& id : after)
+        if (!before_.contains(id) || after.count(id) > 1)
+            all += ' ' + id;
+    return all;
 }
 
 void SentMail::resumeStranded() {
@@ -69,13 +77,15 @@ void SentMail::resumeStranded() {
             find("leaves the mailing " + id + ", which cannot be resumed: " + ended.err);
 }
 
-std::multiset<std::string> SentMail::mailings() const {
+std::multiset<std::string> SentMail::mailings() {
     auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(2);
-    std::string listed;
+    Ended listed;
     do
-        listed = service_.vlmail({"status", "--json"}).out;
-    while (isSaid(listed, "\"state\":\"accepted\"") && std::chrono::steady_clock::now() < end);
-    std::vector<std::string> const ids = idsIn(listed);
+        listed = service_.vlmail({"status", "--json"});
+    while (isSaid(listed.out, "\"state\":\"accepted\"") && std::chrono::steady_clock::now() < end);
+    if (listed.status != 0)
+        find("does not tell which mailings there are: " + listed.err);
+    std::vector<std::string> const ids = idsIn(listed.out);
     return {ids.begin(), ids.end()};
 }
 

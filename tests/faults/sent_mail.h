@@ -25,7 +25,9 @@ private:
     void check(Ended const& ended);
     void resumeStranded();
     /// The ids of all mailings, once the service has fetched them.
-    std::multiset<std::string> mailings() const;
+    std::multiset<std::string> mailings();
+    /// A line of those that were not there before.
+    std::string newOnes(std::multiset<std::string> const& after) const;
     void find(std::string const& what) { findings_.push_back(what); }
 
     ServiceAtHand service_;
