@@ -632,7 +632,8 @@ std::vector<Case> const CASES{
       "error /pack_presets/0/production/tolerence: \"tolerence\" is no key here: no letter that is sent "
       "by "
       "this pack preset can go out | write one of \"sheet\", \"window\", \"clear_zones\", \"tolerance\", "
-      "\"address_lines\", \"postcode\", \"repair\", \"copies\", \"fallback\" [production-refused]",
+      "\"address_lines\", \"postcode\", \"repair\", \"copies\", \"fallback\", \"duplicate_days\" "
+      "[production-refused]",
       "error /pack_presets/0/production/window: has no area: it goes from 90 to 1 mm across and from 0 "
       "to 1 mm "
       "down: no letter that is sent by this pack preset can go out | write \"left\" less than \"right\", "
