@@ -4,9 +4,10 @@
 #include "programs/base/error.h"
 #include "programs/base/hex.h"
 
+#include <openssl/core_names.h>
 #include <openssl/crypto.h>
 #include <openssl/evp.h>
-#include <openssl/hmac.h>
+#include <openssl/params.h>
 #include <openssl/sha.h>
 
 #include <array>
@@ -54,6 +55,20 @@ std::string combined(std::string_view a, std::string_view b) {
     return bytes;
 }
 
+void requireDone(bool isDone) {
+    if (!isDone)
+        throw Base::Error(Base::Code::ProgramLimited, "The crypto library cannot compute a proof.");
+}
+
+template<typename Pointer>
+EVP_MAC_CTX* in(Pointer const& context) {
+    return static_cast<EVP_MAC_CTX*>(context.get());
+}
+
+unsigned char const* bytesOf(std::string_view text) {
+    return reinterpret_cast<unsigned char const*>(text.data());
+}
+
 } // namespace
 
 TokenKeys keysOf(std::string_view token) {
@@ -93,16 +108,35 @@ bool isSameProof(std::string_view a, std::string_view b) {
     return !a.empty() && a.size() == b.size() && CRYPTO_memcmp(a.data(), b.data(), a.size()) == 0;
 }
 
-std::string hmac(std::string_view key, std::string_view message) {
+void HmacKey::Release::operator()(void* context) const {
+    EVP_MAC_CTX_free(static_cast<EVP_MAC_CTX*>(context));
+}
+
+HmacKey::HmacKey(std::string_view key) {
     Base::requireCrypto();
+    std::unique_ptr<EVP_MAC, decltype(&EVP_MAC_free)> const mac(EVP_MAC_fetch(nullptr, "HMAC", nullptr),
+                                                                EVP_MAC_free);
+    requireDone(mac != nullptr);
+    context_.reset(EVP_MAC_CTX_new(mac.get()));
+    requireDone(context_ != nullptr);
+    std::string digest = "SHA256";
+    OSSL_PARAM const parameters[] = {
+        OSSL_PARAM_construct_utf8_string(OSSL_MAC_PARAM_DIGEST, digest.data(), digest.size()),
+        OSSL_PARAM_construct_end()};
+    // Without an address, the library would go on with the key that it has.
+    requireDone(EVP_MAC_init(in(context_), bytesOf(key.empty() ? "" : key), key.size(), parameters) == 1);
+}
+
+std::string HmacKey::codeOf(std::string_view message) const {
     std::array<unsigned char, EVP_MAX_MD_SIZE> bytes;
-    unsigned int length = 0;
-    if (!HMAC(EVP_sha256(), key.data(), static_cast<int>(key.size()),
-              reinterpret_cast<unsigned char const*>(message.data()), message.size(), bytes.data(),
-              &length) ||
-        length != SHA256_DIGEST_LENGTH)
-        throw Base::Error(Base::Code::ProgramLimited, "The crypto library cannot compute a proof.");
+    std::size_t length = 0;
+    requireDone(EVP_MAC_init(in(context_), nullptr, 0, nullptr) == 1 &&
+                EVP_MAC_update(in(context_), bytesOf(message), message.size()) == 1 &&
+                EVP_MAC_final(in(context_), bytes.data(), &length, bytes.size()) == 1 &&
+                length == SHA256_DIGEST_LENGTH);
     return {reinterpret_cast<char const*>(bytes.data()), length};
 }
+
+std::string hmac(std::string_view key, std::string_view message) { return HmacKey(key).codeOf(message); }
 
 } // namespace Channel

@@ -3,6 +3,7 @@
 // afterwards.
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <string_view>
 
@@ -54,6 +55,23 @@ std::string makeDiscoveryProof(std::string_view token, std::string_view nonce, s
                                std::uint16_t port);
 /// Takes the same time wherever the two differ. An empty proof is never the same.
 bool isSameProof(std::string_view a, std::string_view b);
+
+/// A key of HMAC-SHA-256 that is prepared once for many messages. Used by one thread. Throws Error when the
+/// crypto library fails.
+class HmacKey {
+public:
+    explicit HmacKey(std::string_view key);
+
+    /// 32 bytes.
+    std::string codeOf(std::string_view message) const;
+
+private:
+    struct Release {
+        void operator()(void* context) const;
+    };
+
+    std::unique_ptr<void, Release> context_;
+};
 
 /// HMAC-SHA-256, 32 bytes. Throws Error when the crypto library fails.
 std::string hmac(std::string_view key, std::string_view message);

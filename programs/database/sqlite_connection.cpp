@@ -66,12 +66,12 @@ public:
     ~StatementRows() override { connection_.giveBack(sql_, std::move(statement_)); }
 
     bool next() override {
-        return orQueryError([&] { return statement_->executeStep(); });
+        return orQueryError([&] { return statement_.run->executeStep(); });
     }
-    bool isNull(int column) const override { return statement_->getColumn(column).isNull(); }
-    long long number(int column) const override { return statement_->getColumn(column).getInt64(); }
+    bool isNull(int column) const override { return statement_.run->getColumn(column).isNull(); }
+    long long number(int column) const override { return statement_.run->getColumn(column).getInt64(); }
     std::string_view bytes(int column) const override {
-        SQLite::Column const value = statement_->getColumn(column);
+        SQLite::Column const value = statement_.run->getColumn(column);
         auto const* const data = static_cast<char const*>(value.getBlob());
         return data ? std::string_view(data, static_cast<std::size_t>(value.getBytes())) : std::string_view();
     }
@@ -93,26 +93,33 @@ void SqliteConnection::run(std::string const& script) {
     orQueryError([&] { database_.exec(script); });
 }
 
+/// The library looks for a name among all of a statement's.
+int SqliteConnection::Statement::placeOf(std::size_t value) {
+    for (std::size_t i = places.size(); i <= value; ++i)
+        places.push_back(run->getIndex(('$' + std::to_string(i + 1)).c_str()));
+    return places[value];
+}
+
 SqliteConnection::Statement SqliteConnection::prepared(std::string const& sql, Values const& values) {
     Statement statement;
     if (auto const found = idle_.find(sql); found != idle_.end())
         statement = std::move(idle_.extract(found).mapped());
     else
-        statement = std::make_unique<SQLite::Statement>(database_, sql);
+        statement.run = std::make_unique<SQLite::Statement>(database_, sql);
     for (std::size_t i = 0; i < values.size(); ++i) {
         // One that the text does not name is of no use.
-        if (int const index = statement->getIndex(('$' + std::to_string(i + 1)).c_str()); index > 0)
-            std::visit(Binding{*statement, index}, values[i].get());
+        if (int const place = statement.placeOf(i); place > 0)
+            std::visit(Binding{*statement.run, place}, values[i].get());
     }
     return statement;
 }
 
 void SqliteConnection::giveBack(std::string const& sql, Statement statement) noexcept {
-    statement->tryReset();
+    statement.run->tryReset();
     if (idle_.size() >= MAX_IDLE)
         return;
     try {
-        statement->clearBindings();
+        statement.run->clearBindings();
         idle_.emplace(sql, std::move(statement));
     } catch (std::exception const&) {
         // The next one is prepared anew.

@@ -6,8 +6,12 @@
 
 #include <SQLiteCpp/Statement.h>
 
+#include <cstddef>
 #include <functional>
 #include <map>
+#include <memory>
+#include <string>
+#include <vector>
 
 namespace Database {
 
@@ -24,7 +28,14 @@ public:
     void setClock(std::function<long long()> clock) { *clock_ = std::move(clock); }
 
 private:
-    using Statement = std::unique_ptr<SQLite::Statement>;
+    struct Statement {
+        /// Where a value stands, by its number from 0; 0 when the text does not name it.
+        int placeOf(std::size_t value);
+
+        std::unique_ptr<SQLite::Statement> run = {};
+        /// Those that were asked for.
+        std::vector<int> places = {};
+    };
     class StatementRows;
 
     std::unique_ptr<Rows::Cursor> select(std::string const& sql, Values const& values) override;

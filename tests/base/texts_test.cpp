@@ -8,6 +8,9 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <optional>
+#include <string>
+#include <string_view>
 
 namespace {
 
@@ -16,6 +19,24 @@ TEST(Hex, HasTwoDigitsAByteAndAsManyOfANumberAsAreAskedFor) {
     EXPECT_EQ(Base::toHex(nullptr, 0), "");
     EXPECT_EQ(Base::hexNumber(0xBEEF, 8), "0000beef");
     EXPECT_EQ(Base::hexNumber(0x12345, 4), "2345");
+}
+
+TEST(Hex, IsReadAsPairsOfLowerCaseDigits) {
+    struct {
+        std::string_view text;
+        std::optional<std::string> bytes;
+    } const cases[] = {{"000fff", std::string("\x00\x0F\xFF", 3)},
+                       {"9a", "\x9A"},
+                       {"", ""},
+                       {"0", std::nullopt},
+                       {"9A", std::nullopt},
+                       {"9g", std::nullopt},
+                       {"/9", std::nullopt},
+                       {":9", std::nullopt},
+                       {"`a", std::nullopt},
+                       {" 9", std::nullopt}};
+    for (auto const& c : cases)
+        EXPECT_EQ(Base::fromHex(c.text), c.bytes) << c.text;
 }
 
 TEST(Digest, IsThatOfTheStandard) {

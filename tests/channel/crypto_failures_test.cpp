@@ -92,6 +92,19 @@ TEST_F(CryptoFailures, AreToldWhenAProofIsComputed) {
     });
 }
 
+TEST_F(CryptoFailures, LeaveAKeyAsItWas) {
+    HmacKey const key("key");
+    std::string const code = key.codeOf("message");
+    withEachAllocationFailing([&] {
+        try {
+            EXPECT_EQ(key.codeOf("message"), code);
+        } catch (Base::Error const& failure) {
+            EXPECT_STREQ(failure.what(), "The crypto library cannot compute a proof.");
+        }
+    });
+    EXPECT_EQ(key.codeOf("message"), code);
+}
+
 TEST_F(CryptoFailures, LetNoStrangerInAtTheService) {
     for (Terms const& terms : {TERMS, OLD_TERMS}) {
         int welcomes = 0;

@@ -209,6 +209,17 @@ std::vector<Terms> variants(Terms const& terms) {
     return all;
 }
 
+TEST(Keys, GiveTheCodesOfTheStandardHoweverOftenTheyAreAsked) {
+    auto const hexOf = [](std::string const& bytes) { return Base::toHex(bytes.data(), bytes.size()); };
+    HmacKey const key("Jefe");
+    for (int i = 0; i < 2; ++i)
+        EXPECT_EQ(hexOf(key.codeOf("what do ya want for nothing?")),
+                  "5bdcc146bf60754e6a042426089575c75a003f089d2739839dec58b964ec3843");
+    EXPECT_EQ(key.codeOf(""), hmac("Jefe", ""));
+    EXPECT_EQ(hexOf(HmacKey("").codeOf("")),
+              "b613679a0814d9ec772f95d778c35fc5ff1697c493715653c6c712144292c5ad");
+}
+
 TEST(Proofs, DependOnEverythingThatTheyProve) {
     std::vector<std::string> proofs;
     for (Terms const& terms : variants(plainTerms(2)))

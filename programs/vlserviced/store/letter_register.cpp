@@ -2,7 +2,6 @@
 
 #include "programs/base/base64.h"
 #include "programs/base/hex.h"
-#include "programs/channel/proof.h"
 #include "programs/channel/token.h"
 
 #include <algorithm>
@@ -51,7 +50,7 @@ LetterRegister::LetterRegister(Database::Connection& database)
     : database_(database), secret_(Base::fromHex(secretOf(database)).value_or("")) {}
 
 std::string LetterRegister::keyOf(std::string const& digest) const {
-    return Base::toBase64(Channel::hmac(secret_, Base::fromHex(digest).value_or(digest)));
+    return Base::toBase64(secret_.codeOf(Base::fromHex(digest).value_or(digest)));
 }
 
 /// A pack whose job is forgotten may be sent once more.
@@ -88,6 +87,9 @@ std::set<std::string> LetterRegister::insert(Keys const& keys, RegisteredMailing
 }
 
 std::set<std::string> LetterRegister::sentAgain(Keys const& keys, long long now) const {
+    // Where nobody has sent any again there is nothing to look for.
+    if (!database_.query("SELECT 1 FROM registered_letters WHERE turn > 0 LIMIT 1").next())
+        return {};
     Database::Values values{now};
     std::string letters;
     for (auto const& [letter, number] : keys) {

@@ -1,6 +1,7 @@
 #pragma once
 // The register of letters that were accepted: it knows a letter again, and tells nothing of it.
 
+#include "programs/channel/proof.h"
 #include "programs/database/connection.h"
 #include "programs/mailing/mailing_outline.h"
 
@@ -64,7 +65,7 @@ private:
     void enterAgain(Keys keys, RegisteredMailing const& mailing, long long id);
 
     Database::Connection& database_;
-    std::string secret_;
+    Channel::HmacKey secret_;
 };
 
 } // namespace VlServiced

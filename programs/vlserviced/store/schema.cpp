@@ -276,8 +276,8 @@ FOR EACH STATEMENT EXECUTE FUNCTION tell_of_letters();
 /// Letters that were accepted, each under a key that tells nothing of it, until somebody may send the same
 /// one again. `number` is that of what it goes out in; a key that is free belongs to a letter that went
 /// nowhere. Triggers keep that in step with jobs and letters, whoever changes them.
-/// The turn of a letter is 0, or the id of a mailing that it was sent again in: each frees its own, and it may go out once
-/// more when none of them has it.
+/// The turn of a letter is 0, or the id of a mailing that it was sent again in: each frees its own, and it
+/// may go out once more when none of them has it.
 constexpr char const* SCHEMA_12 = R"sql(
 CREATE TABLE register_secret (
     one    INTEGER NOT NULL PRIMARY KEY CHECK (one = 1),
@@ -348,6 +348,9 @@ constexpr char const* SCHEMA_13 = R"sql(
 ALTER TABLE document_contents ADD COLUMN touched_at INTEGER NOT NULL DEFAULT 0;
 )sql";
 
+/// In KiB: all but the leaves of an index of 10 million letters stay at hand. What is not used takes nothing.
+constexpr char const* BEGINNING = "PRAGMA cache_size = -32768";
+
 } // namespace
 
 Database::DatabaseKind const& serviceDatabase() {
@@ -365,7 +368,8 @@ Database::DatabaseKind const& serviceDatabase() {
                                               {SCHEMA_10, "", POSTGRES_10},
                                               {SCHEMA_11, "", POSTGRES_11},
                                               {SCHEMA_12, SQLITE_12, POSTGRES_12},
-                                              SCHEMA_13}};
+                                              SCHEMA_13},
+                                             BEGINNING};
     return kind;
 }
 
