@@ -85,6 +85,7 @@ constexpr QuestionRight OF_QUESTIONS[] = {
     {Protocol::TokenRevocation::KIND, {Role::Admin, Place::Anywhere}},
     {Protocol::HistoryQuery::KIND, {Role::Admin, Place::Anywhere}},
     {Protocol::SettingsImpactQuery::KIND, {Role::Settings, Place::Node}},
+    {Protocol::SettingsReplacement::KIND, {Role::Settings, Place::Node}},
 };
 
 std::string placeInWords(std::string const& node) { return node.empty() ? "the root" : Base::oneLine(node); }

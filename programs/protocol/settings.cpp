@@ -11,7 +11,16 @@ namespace Protocol {
 namespace {
 
 constexpr char const* OWN = "own";
+constexpr char const* WAS = "was";
 constexpr char const* CARRIERS = "carriers";
+
+json::Object objectIn(json::Object const& question, char const* key, char const* owner) {
+    json::Value const values = question.get(key);
+    if (!values.isObject())
+        throw Base::Error(Base::Code::RequestInvalid,
+                          '"' + std::string(key) + "\" of " + owner + " has to be an object");
+    return values.toObject();
+}
 
 } // namespace
 
@@ -19,6 +28,7 @@ struct SettingsQuery::Keys {
     static constexpr std::tuple TABLE{
         Asked{"parts", &SettingsQuery::parts, TextsForm{MAX_PARTS}},
         Asked{CARRIERS, &SettingsQuery::carriers, FlagForm{}},
+        Asked{"inherited", &SettingsQuery::inherited, FlagForm{}},
     };
 };
 
@@ -42,6 +52,12 @@ struct SettingsAnswer::Keys {
 struct SettingsImpactQuery::Keys {
     static constexpr std::tuple TABLE{
         Asked{"part", &SettingsImpactQuery::part, TextForm{}},
+    };
+};
+
+struct SettingsReplacedAnswer::Keys {
+    static constexpr std::tuple TABLE{
+        Always{OWN, &SettingsReplacedAnswer::own},
     };
 };
 
@@ -117,11 +133,7 @@ SettingsImpactQuery::SettingsImpactQuery(std::string nodeId, std::string partNam
 
 SettingsImpactQuery::SettingsImpactQuery(json::Object const& object) : id(nodeIn(object, IN_WORDS)) {
     json::readKeys(Keys::TABLE, object, *this);
-    json::Value const values = object.get(OWN);
-    if (!values.isObject())
-        throw Base::Error(Base::Code::RequestInvalid,
-                          std::string("\"own\" of ") + IN_WORDS + " has to be an object");
-    own = values.toObject();
+    own = objectIn(object, OWN, IN_WORDS);
 }
 
 json::Object SettingsImpactQuery::serialize() const {
@@ -131,6 +143,26 @@ json::Object SettingsImpactQuery::serialize() const {
     object.set(OWN, own);
     return object;
 }
+
+SettingsReplacement::SettingsReplacement(std::string nodeId, json::Object valuesBefore, json::Object values)
+    : id(std::move(nodeId)), was(std::move(valuesBefore)), own(std::move(values)) {}
+
+SettingsReplacement::SettingsReplacement(json::Object const& object)
+    : id(nodeIn(object, IN_WORDS)), was(objectIn(object, WAS, IN_WORDS)),
+      own(objectIn(object, OWN, IN_WORDS)) {}
+
+json::Object SettingsReplacement::serialize() const {
+    json::Object object = question(KIND);
+    object.set(NODE_ID, id);
+    object.set(WAS, was);
+    object.set(OWN, own);
+    return object;
+}
+
+SettingsReplacedAnswer::SettingsReplacedAnswer(json::Object const& object) {
+    json::readKeys(Keys::TABLE, object, *this);
+}
+json::Object SettingsReplacedAnswer::serialize() const { return writeRecord(*this); }
 
 ImpactedNode::ImpactedNode(std::string nodeId, std::vector<std::string> changedKeys)
     : id(std::move(nodeId)), keys(std::move(changedKeys)) {}

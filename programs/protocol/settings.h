@@ -22,6 +22,8 @@ struct SettingsQuery {
     std::vector<std::string> parts;
     /// Whether the channels are to be told that letters leave the service by.
     bool carriers = false;
+    /// Whether values and origins are to be those that would count if the node had none of its own.
+    bool inherited = false;
 
     SettingsQuery() = default;
     SettingsQuery(std::string nodeId, std::vector<std::string> wantedParts);
@@ -87,6 +89,34 @@ struct SettingsImpactQuery {
     SettingsImpactQuery(std::string nodeId, std::string partName, json::Object values);
     /// Throws Error when there is no id, or on a wrong type.
     explicit SettingsImpactQuery(json::Object const& object);
+    json::Object serialize() const;
+
+    struct Keys;
+};
+
+/// Replaces all own values of a node at once, if they still are what was read.
+struct SettingsReplacement {
+    static constexpr char const* KIND = "replace_settings";
+    static constexpr char const* IN_WORDS = "a replacement of settings";
+
+    std::string id;
+    /// Both by the names of parts, in the form that a set command takes; one that is left out has no values.
+    json::Object was;
+    json::Object own;
+
+    SettingsReplacement() = default;
+    SettingsReplacement(std::string nodeId, json::Object valuesBefore, json::Object values);
+    /// Throws Error when there is no id, or on a wrong type.
+    explicit SettingsReplacement(json::Object const& object);
+    json::Object serialize() const;
+};
+
+struct SettingsReplacedAnswer {
+    /// As they are stored.
+    json::Object own;
+
+    SettingsReplacedAnswer() = default;
+    explicit SettingsReplacedAnswer(json::Object const& object);
     json::Object serialize() const;
 
     struct Keys;

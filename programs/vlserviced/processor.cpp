@@ -204,6 +204,10 @@ std::vector<Processor::Question> const& Processor::answerers() {
          [](Processor& self, json::Object const& question) {
              return self.around_.settings.impact(SettingsImpactQuery(question)).serialize();
          }},
+        {SettingsReplacement::KIND,
+         [](Processor& self, json::Object const& question) {
+             return self.around_.settings.replace(SettingsReplacement(question)).serialize();
+         }},
         {RegisterQuery::KIND,
          [](Processor& self, json::Object const& question) {
              return knownLetters(RegisterQuery(question), self.around_.letterRegister, self.around_.jobs,

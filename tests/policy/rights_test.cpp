@@ -51,6 +51,7 @@ std::map<std::string, Row> const OF_QUESTIONS{
     {"health", {"admin", "root"}},
     {"history", {"admin", "any"}},
     {"settings_impact", {"settings", "node"}},
+    {"replace_settings", {"settings", "node"}},
     {"register", {"send", "node"}},
 };
 

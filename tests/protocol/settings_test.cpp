@@ -6,6 +6,9 @@
 
 #include <gtest/gtest.h>
 
+#include <map>
+#include <string>
+
 namespace {
 
 using Protocol::SettingsAnswer;
@@ -27,6 +30,18 @@ TEST(SettingsQueryReading, TakesFewPartsAlone) {
     EXPECT_EQ(failureOf([&] { SettingsQuery{parse(R"({"id":"","parts":[1]})")}; }), message);
     many.parts.pop_back();
     EXPECT_EQ(SettingsQuery(many.serialize()).parts.size(), 20u);
+}
+
+TEST(SettingsReplacementReading, WantsANodeAndBothSides) {
+    using Protocol::SettingsReplacement;
+    std::string const text =
+        R"({"query":"replace_settings","id":"a=acme","was":{},"own":{"po":{"code":"A"}}})";
+    EXPECT_EQ(print(SettingsReplacement(parse(text)).serialize()), text);
+    for (auto const& row : std::map<std::string, std::string>{
+             {R"({"was":{},"own":{}})", "\"id\" of a replacement of settings has to be the id of a node"},
+             {R"({"id":"","own":{}})", "\"was\" of a replacement of settings has to be an object"},
+             {R"({"id":"","was":{},"own":[]})", "\"own\" of a replacement of settings has to be an object"}})
+        EXPECT_EQ(failureOf([&] { SettingsReplacement{parse(row.first)}; }), row.second) << row.first;
 }
 
 TEST(SettingsAnswerReading, GivesEachPartByItsName) {

@@ -40,6 +40,18 @@ TEST_F(HistoryTest, TellsWhoChangedSettingsAndWhatTheyWere) {
                          "bob u=eve/a=acme node: there -> \n");
 }
 
+TEST_F(HistoryTest, TellsOfSettingsThatWereReplacedTogether) {
+    ask(R"({"query":"replace_settings","id":"a=acme","was":{},"own":{"po":{"code":"R-1"},"app":{"descr":"A"}}})");
+    by_.name = "bob";
+    ask(R"({"query":"replace_settings","id":"a=acme","was":{},"own":{"po":{"code":"R-2"}}})");
+    ask(R"({"query":"replace_settings","id":"a=acme","was":{"po":{"code":"R-1"},"app":{"descr":"A"}},)"
+        R"("own":{"po":{"code":"R-1"}}})");
+    EXPECT_EQ(entries(), "ada a=acme node:  -> added\n"
+                         "ada a=acme settings app:  -> {\"descr\":\"A\"}\n"
+                         "ada a=acme settings po:  -> {\"code\":\"R-1\"}\n"
+                         "bob a=acme settings app: {\"descr\":\"A\"} -> \n");
+}
+
 TEST_F(HistoryTest, TellsOfSettingsThatWentWithTheirNode) {
     send(15, R"({"cfg_id":"a=acme","part":{"code":"R-1"}})");
     send(22, R"({"cfg_id":"a=acme","reset_cfg":true})");

@@ -90,11 +90,11 @@ TEST_F(ProcessorTest, AnswersQueriesForSettings) {
     EXPECT_EQ(
         send(29, R"({"query":"x"})"),
         R"({"err":"there is no query \"x\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, register, begin_pack [service-outdated]"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, replace_settings, register, begin_pack [service-outdated]"})");
     EXPECT_EQ(
         send(29, "{}"),
         R"({"err":"there is no query \"\"; there are settings, jobs, change_jobs, documents, )"
-        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, register, begin_pack [service-outdated]"})");
+        R"(document_piece, put_document, remove_document, change_letter, delivery_report, carriers, change_carrier, add_token, tokens, revoke_token, health, history, settings_impact, replace_settings, register, begin_pack [service-outdated]"})");
 }
 
 TEST_F(ProcessorTest, KeepsTheServicesSettings) {

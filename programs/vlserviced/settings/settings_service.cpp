@@ -45,10 +45,26 @@ bool isNodeOf(std::string const& user, std::string const& id) {
     return id.substr(0, id.find(Cfg::Id::CFG_ID_DELIM)) == Cfg::Id::USER_PREFIX + user;
 }
 
-/// Empty where the node has none.
+/// Empty where there are none.
+json::Object valuesIn(json::Object const& parts, std::string const& part) {
+    json::Value const values = parts.get(part);
+    return values.isObject() ? values.toObject() : json::Object();
+}
+
 json::Object ownValues(SettingsStore const& store, std::string const& id, std::string const& part) {
-    json::Value const own = store.parts(id).get(part);
-    return own ? own.toObject() : json::Object();
+    return valuesIn(store.parts(id), part);
+}
+
+/// What would count if the first node had no values of its own, and those that it has.
+json::Object inheritedParts(std::vector<SettingsLevel> chain, std::vector<std::string> const& names) {
+    json::Object const own = std::exchange(chain.front().parts, {});
+    json::Object parts;
+    for (auto const& [name, part] : resolve(chain, names)) {
+        Protocol::PartSettings settings(part.toObject());
+        settings.own = valuesIn(own, name);
+        parts.set(name, settings.serialize());
+    }
+    return parts;
 }
 
 /// The empty text for no folder.
@@ -126,7 +142,8 @@ Protocol::SettingsAnswer SettingsService::effective(Protocol::SettingsQuery cons
     answer.known = store_.contains(query.id);
     for (SettingsLevel const& level : chain)
         answer.chain.push_back(level.id);
-    answer.parts = resolve(chain, query.parts.empty() ? partNames() : query.parts);
+    std::vector<std::string> const& parts = query.parts.empty() ? partNames() : query.parts;
+    answer.parts = query.inherited ? inheritedParts(chain, parts) : resolve(chain, parts);
     if (query.carriers)
         answer.carriers = carrierTypes(service().carriers());
     return answer;
@@ -155,6 +172,49 @@ void SettingsService::setPart(std::string const& id, std::string const& part, js
 void SettingsService::noteNode(std::string const& id, bool wasKnown) const {
     if (!wasKnown)
         recorder_.note(id, "node", "", "added");
+}
+
+namespace {
+
+json::Object ownForms(json::Object const& sent) {
+    json::Object own;
+    for (auto const& [part, values] : sent)
+        if (json::Value const form = ownForm(part, values))
+            own.set(part, form);
+    return own;
+}
+
+void requireUnchanged(json::Object const& stored, Protocol::SettingsReplacement const& replacement) {
+    for (std::string const& part : partNames())
+        if (!(valuesIn(stored, part) == valuesIn(replacement.was, part)))
+            throw Base::Error(Base::Code::SettingsChanged,
+                              "the settings \"" + part + "\" of " +
+                                  (replacement.id.empty() ? "the root" : "node " + replacement.id) +
+                                  " were changed by somebody else since they were read; look at both and "
+                                  "save what is to stay");
+}
+
+} // namespace
+
+Protocol::SettingsReplacedAnswer SettingsService::replace(Protocol::SettingsReplacement const& replacement) {
+    requireChangeable();
+    std::string const& id = replacement.id;
+    checkNodeId(id);
+    Protocol::SettingsReplacedAnswer answer;
+    answer.own = ownForms(replacement.own);
+    if (json::Value const presets = answer.own.get(Cfg::Presets::PART_NAME))
+        requireAllowedPresets(presets.toObject(), store_.chain(id), clock_());
+    rules_.clear();
+    recorder_.together([&] {
+        noteNode(id, store_.contains(id));
+        store_.changeParts(id, [&](json::Object const& stored) {
+            requireUnchanged(stored, replacement);
+            for (std::string const& part : partNames())
+                recorder_.note(id, "settings " + part, valuesIn(stored, part), valuesIn(answer.own, part));
+            return answer.own;
+        });
+    });
+    return answer;
 }
 
 void SettingsService::update(std::string const& id, bool reset) {

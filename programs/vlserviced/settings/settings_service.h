@@ -52,6 +52,9 @@ public:
     void setPart(std::string const& id, std::string const& part, json::Value const& sent);
     /// What would count otherwise if a part's own values were replaced so, at the node and all below it.
     Protocol::SettingsImpactAnswer impact(Protocol::SettingsImpactQuery const& query) const;
+    /// Replaces all own values of a node by setPart()'s rules, all of them or none. Throws Error when they are
+    /// not any more what the asker has read.
+    Protocol::SettingsReplacedAnswer replace(Protocol::SettingsReplacement const& replacement);
     /// Adds the node, when it is new, and tests that all its settings can be read. With `reset`, its own
     /// values are erased first; those of the root cannot be.
     void update(std::string const& id, bool reset);

@@ -131,6 +131,21 @@ void SettingsStore::setPart(std::string const& id, std::string const& part, json
     transaction.commit();
 }
 
+void SettingsStore::changeParts(std::string const& id,
+                                std::function<json::Object(json::Object const&)> const& change) {
+    Database::Transaction transaction(database_, Database::Transaction::ALONE);
+    addChain(id);
+    json::Object const was = parts(id);
+    json::Object const own = change(was);
+    for (auto const& [part, values] : was)
+        if (!own.get(part))
+            setPart(id, part, {});
+    for (auto const& [part, values] : own)
+        if (!(was.get(part) == values))
+            setPart(id, part, values);
+    transaction.commit();
+}
+
 void SettingsStore::clear(std::string const& id) {
     Database::Transaction transaction(database_, Database::Transaction::ALONE);
     addChain(id);

@@ -49,6 +49,9 @@ public:
     /// Replaces the node's own value of a part, adding the node when it is new. The empty handle erases it.
     /// Throws Error for more than MAX_PART_BYTES.
     void setPart(std::string const& id, std::string const& part, json::Value const& value);
+    /// Replaces all own values of the node, in the form of parts(), by what `change` makes of them while
+    /// nobody else changes them; adds the node when it is new.
+    void changeParts(std::string const& id, std::function<json::Object(json::Object const&)> const& change);
     /// Erases all own values of the node, and adds it when it is new.
     void clear(std::string const& id);
     /// Throws Error when there is no such node, when it has children, and for the root.

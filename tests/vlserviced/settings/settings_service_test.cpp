@@ -83,6 +83,69 @@ TEST_F(SettingsServiceTest, TheEffectiveSettingsHaveChainValuesAndOrigins) {
     EXPECT_EQ(service_.effective({"", {}}).parts.size(), 6u);
 }
 
+TEST_F(SettingsServiceTest, TellsWhatWouldCountWithoutTheNodesOwnValues) {
+    service_.setPart("", "po", parse(R"({"code":"R"})"));
+    service_.setPart("a=acme", "profiles", parse(R"({"vals":[{"name":"Letters"}]})"));
+    service_.setPart("u=bob/a=acme", "po", parse(R"({"code":"B","expiry":5})"));
+    service_.setPart("u=bob/a=acme", "profiles", parse(R"({"vals":[{"name":"Faxes"}]})"));
+    Protocol::SettingsQuery query("u=bob/a=acme", {"po", "profiles"});
+    query.inherited = true;
+    EXPECT_EQ(print(service_.effective(query).parts),
+              R"({"po":{"own":{"code":"B","expiry":5},"values":{"code":"R","expiry":0},)"
+              R"("origins":{"code":"","expiry":null}},"profiles":{"own":{"vals":[{"name":"Faxes"}]},)"
+              R"("values":{"vals":[{"name":"Letters"}]},"origins":{"vals":["a=acme"]}}})");
+    query.id = "";
+    query.parts = {"po"};
+    EXPECT_EQ(print(service_.effective(query).parts),
+              R"({"po":{"own":{"code":"R"},"values":{"code":"","expiry":0},)"
+              R"("origins":{"code":null,"expiry":null}}})");
+}
+
+TEST_F(SettingsServiceTest, ReplacesAllOwnValuesOfANodeThatStillAreWhatWasRead) {
+    service_.setPart("a=acme", "po", parse(R"({"code":"A"})"));
+    service_.setPart("a=acme", "app", parse(R"({"descr":"Acme"})"));
+    auto const replaced = service_.replace({"a=acme", parse(R"({"po":{"code":"A"},"app":{"descr":"Acme"}})"),
+                                            parse(R"({"po":{"expiry":5},"profiles":{"vals":[]}})")});
+    EXPECT_EQ(print(replaced.own), R"({"po":{"expiry":5}})");
+    EXPECT_EQ(print(store_.parts("a=acme")), R"({"po":{"expiry":5}})");
+    service_.replace({"u=new/", parse("{}"), parse(R"({"po":{"code":"N"}})")});
+    EXPECT_EQ(print(store_.parts("u=new/")), R"({"po":{"code":"N"}})");
+}
+
+TEST_F(SettingsServiceTest, ReplacesNothingThatSomebodyElseHasChanged) {
+    service_.setPart("a=acme", "po", parse(R"({"code":"theirs"})"));
+    for (char const* const was : {"{}", R"({"po":{}})", R"({"po":{"code":"A"}})", R"({"po":7})"})
+        EXPECT_EQ(failureOf([&] {
+                      service_.replace({"a=acme", parse(was), parse(R"({"po":{"code":"mine"}})")});
+                  }),
+                  "the settings \"po\" of node a=acme were changed by somebody else since they were read; "
+                  "look at both and save what is to stay")
+            << was;
+    EXPECT_EQ(
+        failureOf([&] {
+            service_.replace({"", parse(R"({"app":{"descr":"x"}})"), parse(R"({"po":{"code":"mine"}})")});
+        }),
+        "the settings \"app\" of the root were changed by somebody else since they were read; look at "
+        "both and save what is to stay");
+    EXPECT_EQ(print(store_.parts("a=acme")), R"({"po":{"code":"theirs"}})");
+    EXPECT_EQ(print(store_.parts("")), "{}");
+}
+
+TEST_F(SettingsServiceTest, ReplacesAllOrNothing) {
+    auto const fails = [&](char const* own) {
+        return failureOf([&] { service_.replace({"a=acme", parse("{}"), parse(own)}); });
+    };
+    EXPECT_EQ(
+        fails(R"({"po":{"code":"A"},"app":{"descr":7}})"),
+        "the settings \"app\" were not changed: JSON error: Wrong type: integer. Expected type: string");
+    EXPECT_EQ(fails(R"({"po":{"code":"A"},"apps":{}})"),
+              "there are no settings \"apps\"; there are app, inet, po, deps, profiles, presets");
+    EXPECT_EQ(
+        fails(R"({"po":{"code":"A"},"app":7})"),
+        "the settings \"app\" were not changed: JSON error: Wrong type: integer. Expected type: object");
+    EXPECT_FALSE(store_.contains("a=acme"));
+}
+
 TEST_F(SettingsServiceTest, APartThatIsSetToNothingIsInheritedAgain) {
     service_.setPart("a=acme", "po", parse(R"({"code":"A"})"));
     service_.setPart("a=acme", "po", json::Value());
@@ -136,6 +199,7 @@ TEST_F(SettingsServiceTest, NothingIsChangedWhileChangesAreHeldBack) {
     EXPECT_EQ(failureOf([&] { service_.setPart("a=acme", "po", {}); }), held);
     EXPECT_EQ(failureOf([&] { service_.update("a=acme", true); }), held);
     EXPECT_EQ(failureOf([&] { service_.remove("a=acme"); }), held);
+    EXPECT_EQ(failureOf([&] { service_.replace({"a=acme", {}, {}}); }), held);
     EXPECT_EQ(failureOf([&] { service_.changeService({}); }), held);
     EXPECT_EQ(failureOf([&] { service_.effective({"a=acme", {}}); }), "nothing was thrown");
     service_.suspend(0);
