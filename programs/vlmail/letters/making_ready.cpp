@@ -282,6 +282,10 @@ std::vector<MadeAttachment> const& MakingReady::attachmentsOf(std::string const&
     return found == attachments_.end() ? none : found->second.made;
 }
 
+bool MakingReady::isWhole() const {
+    return std::ranges::all_of(documents_, [](auto const& one) { return one.second.error.empty(); });
+}
+
 std::vector<UsedDocument> MakingReady::usedDocuments() const {
     std::vector<UsedDocument> used;
     for (auto const& [id, document] : documents_)

@@ -64,6 +64,8 @@ public:
     bool countsColours(Cfg::PackPreset const& preset) const;
     /// In the order of the preset's list.
     std::vector<MadeAttachment> const& attachmentsOf(std::string const& packPreset) const;
+    /// All documents that are named could be used.
+    bool isWhole() const;
     /// Those that could be used, by their ids: all, or those that one pack preset names.
     std::vector<UsedDocument> usedDocuments() const;
     std::vector<UsedDocument> usedDocumentsOf(Cfg::PackPreset const& preset) const;

@@ -20,6 +20,8 @@ using State = Field::State;
 
 /// Text can be read, and a page is some 100 KB.
 constexpr double DOTS_PER_INCH = 110;
+/// What lies where can be seen, and a side is some 10 KB.
+constexpr double SMALL_DOTS_PER_INCH = 36;
 
 State stateOf(FieldTrace const& field) {
     if (!field.value)
@@ -127,7 +129,10 @@ void turn(Zone& zone, Production::PageSize page, int quarterTurns) {
 
 std::vector<Side> sidesOf(LetterReading const& letter, ShownPages& pages) {
     try {
-        return pages.sides(letter);
+        std::vector<Side> sides = pages.sides(letter);
+        for (Side& side : sides)
+            side.png = pages.picture(letter, side, SMALL_DOTS_PER_INCH);
+        return sides;
     } catch (Base::Error const&) {
         // What keeps the letter from being made ready is said beside it.
         return {};

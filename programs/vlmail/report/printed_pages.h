@@ -2,6 +2,7 @@
 // The pages of a document's letters as they are printed.
 
 #include "programs/production/letter_parts.h"
+#include "programs/production/production_rules.h"
 #include "programs/reader/document.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/letters/reading.h"
@@ -23,8 +24,11 @@ public:
     virtual Production::PageSize size(int page) const = 0;
     /// A PNG of a page of the letter; empty where pictures are shown in another way. Throws Base::Error.
     virtual std::string picture(LetterReading const& letter, int page, double dotsPerInch) = 0;
-    /// What goes out with the letter; mostly none.
+    /// All sides of the letter with what goes out with it, without their pictures; none when it is made of
+    /// its pages alone.
     virtual std::vector<Side> sides(LetterReading const& letter) = 0;
+    /// As that of a page; none of a blank side.
+    virtual std::string picture(LetterReading const& letter, Side const& side, double dotsPerInch) = 0;
 };
 
 class PrintedPages : public ShownPages {
@@ -38,19 +42,25 @@ public:
     Production::PageSize size(int page) const override;
     /// Of a letter that goes out by itself.
     std::string picture(LetterReading const& letter, int page, double dotsPerInch) override;
-    /// All sides of such a letter with what goes out with it, small; none when it is made of its pages alone.
+    /// Of such a letter, the first of many.
     std::vector<Side> sides(LetterReading const& letter) override;
+    std::string picture(LetterReading const& letter, Side const& side, double dotsPerInch) override;
 
 private:
-    struct Part;
+    using Part = std::vector<Side>;
 
-    std::vector<Part> partsOf(LetterReading const& letter);
+    std::vector<Part> partsOf(LetterReading const& letter) const;
+    Part pagesOf(LetterReading const& letter) const;
     Part attachment(std::size_t position) const;
+    Production::ProductionRules rules() const;
 
     Reader::Document& document_;
     Cfg::PackPreset const& preset_;
     MakingReady& making_;
 };
+
+/// A PNG of a page of a document as it is, with the annotations that a print has. Throws Base::Error.
+std::string pictureOf(Reader::Document& document, int page, double dotsPerInch);
 
 /// Where a box on a page of that size lies when the page is turned.
 Reader::Box turned(Reader::Box const& box, Production::PageSize page, int quarterTurns);

@@ -1,5 +1,6 @@
 #include "programs/vlmail/report/report.h"
 
+#include "programs/base/quoting.h"
 #include "programs/vlmail/letters/outcome.h"
 #include "programs/vlmail/presets/words.h"
 #include "programs/vlmail/report/html.h"
@@ -187,7 +188,7 @@ std::string letterHeading(Letter const& letter, std::string const& anchor, std::
 }
 
 std::string sideHtml(Side const& side) {
-    std::string const name = isolated(side.name);
+    std::string const name = isolated(inWords(side));
     std::string const picture = side.png.empty() ? "" : "<img alt=\"\" src=\"" + pngUri(side.png) + "\">";
     return "<li><div class=\"side\" style=\"--w:" + std::to_string(std::max(side.width, 1)) +
            ";--h:" + std::to_string(std::max(side.height, 1)) + "\">" + picture + "</div>" + name + "</li>\n";
@@ -274,6 +275,21 @@ std::string headOf(std::string const& outcome) {
 }
 
 } // namespace
+
+std::string inWords(Side const& side) {
+    std::string const page = "page " + std::to_string(side.page);
+    switch (side.kind) {
+    case Side::Kind::Blank:
+        return "blank side";
+    case Side::Kind::Cover:
+        return "cover page";
+    case Side::Kind::Attachment:
+        return page + " of " + Base::inQuotes(side.id);
+    case Side::Kind::Page:
+        break;
+    }
+    return page;
+}
 
 std::string section(Document const& document, std::size_t place) {
     std::string const anchor = anchorOf(place);

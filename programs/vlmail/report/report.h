@@ -75,13 +75,23 @@ struct Fault {
 
 /// A side of paper, small.
 struct Side {
-    std::string name;
-    /// None of a blank side.
-    std::string png = {};
+    enum class Kind { Page, Blank, Attachment, Cover };
+
+    Kind kind = Kind::Page;
     /// In 1/100 mm.
     int width = 0;
     int height = 0;
+    /// Of the letter's document, or of the attachment; from 1.
+    int page = 0;
+    /// Its place in the pack preset's list, and the id that it has there.
+    std::size_t attachment = 0;
+    std::string id = {};
+    /// None of a blank side.
+    std::string png = {};
 };
+
+/// Such as "page 2 of "terms"".
+std::string inWords(Side const& side);
 
 struct Letter {
     /// All its pages in words.

@@ -47,12 +47,6 @@ h3 .state, .why { white-space: normal; }
 figure { margin: 0; }
 figcaption { margin-top: .4rem; color: var(--quiet); font-size: .9em; }
 
-.sides { display: flex; flex-wrap: wrap; gap: 1rem; margin: 1.25rem 0 0; padding: 0; list-style: none;
-    color: var(--quiet); font-size: .85em; }
-.side { width: calc(8rem * var(--w) / var(--h)); height: 8rem; margin-bottom: .25rem; background: #fff;
-    box-shadow: 0 0 0 1px var(--line); }
-.side img { display: block; width: 100%; height: 100%; }
-
 table { width: 100%; border-collapse: collapse; }
 caption { text-align: left; font-weight: 600; padding-bottom: .4rem; }
 th, td { padding: .35rem .6rem .35rem 0; text-align: left; vertical-align: top; border-bottom: 1px solid var(--line);

@@ -9,7 +9,9 @@
 #include "programs/vlmail/golden/expectation.h"
 #include "programs/vlmail/golden/test_case.h"
 #include "programs/vlmail/letters/making_ready.h"
+#include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/workbench/evaluation.h"
+#include "programs/vlmail/workbench/printed_picture.h"
 #include "programs/vlmail/workbench/proposal.h"
 #include "vlservice/json/json_text.h"
 
@@ -141,13 +143,12 @@ Answer Desk::evaluate(json::Object const& query) {
         answer.set("lint", settings(query).findings());
     answer.set("document", query.get("document").toString());
     try {
+        answer.set("version", versionOf(markOf(fileOf(query, folders_.documents))));
         if (!query.get("checks").isTrue()) {
             addEvaluation(answer, document(query), settings(query), nullptr);
             return answerOf(answer);
         }
-        MakingReady making(MakingReady::Colours::Ignored);
-        making.prepareFor({fileOf(query, folders_.documents).string()}, settings(query).presets().presets(),
-                          DocumentFolder(folders_.letterheads), {});
+        MakingReady& making = making_.making(fileOf(query, folders_.documents), settings(query));
         addEvaluation(answer, document(query), settings(query), &making);
     } catch (Base::Error const& failure) {
         answer.set("verdict", "failed");
@@ -179,10 +180,16 @@ Answer Desk::picture(json::Object const& query) {
     long long const dots = query.get("dots").toInt();
     if (dots < LEAST || dots > MOST)
         throw Base::Error(Base::Code::RequestInvalid, "\"dots\" is from 20 to 300 an inch");
-    std::optional<Reader::Document> printed = read.printed(page);
     auto const dotsPerInch = static_cast<double>(dots);
     return {200, "image/png",
-            printed ? printed->renderPage(1, dotsPerInch) : read.renderPage(page, dotsPerInch)};
+            query.get("settings").isString() ? printedPage(query, page, dotsPerInch)
+                                             : Report::pictureOf(read, page, dotsPerInch)};
+}
+
+std::string Desk::printedPage(json::Object const& query, int page, double dotsPerInch) {
+    SettingsInWork& by = settings(query);
+    MakingReady& making = making_.making(fileOf(query, folders_.documents), by);
+    return printedPicture(document(query), by, making, {page, sideIn(query.get("side")), dotsPerInch});
 }
 
 Answer Desk::blocks(json::Object const& query) {

@@ -3,6 +3,7 @@
 
 #include "programs/vlmail/workbench/answer.h"
 #include "programs/vlmail/workbench/kept_documents.h"
+#include "programs/vlmail/workbench/kept_making.h"
 #include "programs/vlmail/workbench/settings_in_work.h"
 #include "programs/vlmail/workbench/verdict.h"
 
@@ -28,9 +29,9 @@ struct Folders {
 /// search for it alone. Used by one process.
 class Desk {
 public:
-    explicit Desk(Folders folders) : folders_(std::move(folders)) {}
+    explicit Desk(Folders folders) : folders_(std::move(folders)), making_(folders_.letterheads) {}
 
-    /// What is asked and its parameters as JSON; docs/workbench.md lists them. Failures are answers.
+    /// What is asked, such as "evaluate", and its parameters as JSON. Failures are answers.
     Answer answer(std::string const& what, std::string const& query);
 
     // Each takes its parameters and throws Base::Error or json::Exc.
@@ -38,6 +39,8 @@ public:
     Answer evaluate(json::Object const& query);
     Answer lint(json::Object const& query);
     Answer edit(json::Object const& query);
+    /// Of a page as it was read; with settings as it is printed, and of any side that goes out with its
+    /// letter.
     Answer picture(json::Object const& query);
     Answer blocks(json::Object const& query);
     /// Of one document, against the settings before where they are told.
@@ -61,10 +64,12 @@ private:
     }
     SettingsInWork& settingsOf(std::string const& text);
     Reader::Document& document(json::Object const& query);
+    std::string printedPage(json::Object const& query, int page, double dotsPerInch);
     DocumentVerdict const& judge(std::string const& text, std::string const& document);
 
     Folders folders_;
     KeptDocuments documents_;
+    KeptMaking making_;
     /// The last are the first.
     std::list<SettingsInWork> settings_;
     std::list<std::pair<std::string, std::map<std::string, Judged>>> judged_;

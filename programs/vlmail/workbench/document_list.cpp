@@ -1,8 +1,10 @@
 #include "programs/vlmail/workbench/document_list.h"
 
+#include "programs/base/error.h"
 #include "programs/base/quoting.h"
 #include "programs/base/utf8.h"
 #include "programs/vlmail/golden/test_case.h"
+#include "programs/vlmail/workbench/kept_documents.h"
 
 #include <algorithm>
 #include <cctype>
@@ -61,7 +63,16 @@ private:
             return addProblem(list_, one.path(), "its name is no UTF-8; rename it");
         files_.insert(name);
         if (isDocument(one.path()))
-            list_.documents.push_back({name, one.file_size(ignored)});
+            document(one.path(), name);
+    }
+
+    void document(fs::path const& file, std::string const& name) {
+        try {
+            FileMark const mark = markOf(file);
+            list_.documents.push_back({name, mark.size, versionOf(mark)});
+        } catch (Base::Error const&) {
+            // It has gone while the others were looked at.
+        }
     }
 
     fs::path root_;

@@ -12,6 +12,8 @@ struct ListedDocument {
     /// Its place in the folder.
     std::string name;
     std::uint64_t size = 0;
+    /// Another one when the file has changed.
+    std::string version = {};
     /// Something is expected of it: a file NAME.expected.json lies beside it.
     bool isGolden = false;
 };

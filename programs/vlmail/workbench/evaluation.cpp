@@ -1,41 +1,59 @@
 #include "programs/vlmail/workbench/evaluation.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/error.h"
 #include "programs/base/utf8.h"
 #include "programs/vlmail/explain/explain.h"
 #include "programs/vlmail/report/describe.h"
+#include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/report/report_file.h"
 #include "programs/vlmail/report/shapes.h"
 #include "programs/vlmail/workbench/changes.h"
+#include "programs/vlmail/workbench/printed_picture.h"
 #include "programs/vlmail/workbench/verdict.h"
 
 #include <algorithm>
 #include <array>
 #include <functional>
 #include <optional>
+#include <sstream>
+#include <string>
+#include <utility>
+#include <vector>
 
 namespace VlMail::Workbench {
 namespace {
 
+using Reader::Box;
 using Report::Field;
 using Report::Letter;
 using Report::Shape;
 using Report::Sheet;
 
-/// Pages as they were read: zones are told from their corners. Their pictures come one by one.
-class PagesAsRead : public Report::ShownPages {
+/// Pages as reports have them; their pictures come one by one.
+class PagesWithoutPictures : public Report::ShownPages {
 public:
-    explicit PagesAsRead(Reader::Document& document) : document_(document) {}
+    /// What goes out with letters is known where they are made ready.
+    PagesWithoutPictures(Report::PrintedPages& pages, bool areMadeReady)
+        : pages_(pages), areMadeReady_(areMadeReady) {}
 
-    Reader::Document& document() const override { return document_; }
-    int quarterTurns(int) const override { return 0; }
-    Production::PageSize size(int page) const override { return document_.pageSize(page); }
+    Reader::Document& document() const override { return pages_.document(); }
+    int quarterTurns(int page) const override { return pages_.quarterTurns(page); }
+    Production::PageSize size(int page) const override { return pages_.size(page); }
     std::string picture(LetterReading const&, int, double) override { return {}; }
-    std::vector<Report::Side> sides(LetterReading const&) override { return {}; }
+    std::string picture(LetterReading const&, Report::Side const&, double) override { return {}; }
+    std::vector<Report::Side> sides(LetterReading const& letter) override {
+        return areMadeReady_ ? pages_.sides(letter) : std::vector<Report::Side>();
+    }
+    bool areMadeReady() const { return areMadeReady_; }
 
 private:
-    Reader::Document& document_;
+    Report::PrintedPages& pages_;
+    bool const areMadeReady_;
 };
+
+/// The digits that a page's mark is told in: enough to tell states of one document.
+constexpr std::size_t MARK_DIGITS = 16;
 
 /// In the order of Field::State.
 constexpr std::array STATES{"found", "default", "unused", "not_found", "invalid", "missing"};
@@ -78,6 +96,13 @@ json::Array sheetsOf(Letter const& letter) {
     return sheets;
 }
 
+json::Array sidesOf(Letter const& letter) {
+    json::Array sides;
+    for (Report::Side const& side : letter.sides)
+        sides.append(Workbench::toJson(side));
+    return sides;
+}
+
 json::Array findingsOf(Letter const& letter) {
     json::Array findings;
     for (Report::Fault const& fault : letter.faults) {
@@ -95,6 +120,35 @@ json::Array findingsOf(Letter const& letter) {
     return findings;
 }
 
+/// Where the zone lies on its page as it was read, as settings tell it.
+Box asRead(Report::Zone const& zone, Letter const& letter, Report::ShownPages const& pages) {
+    constexpr int WHOLE = 4;
+    Sheet const& sheet = letter.sheets[zone.sheet];
+    int const back = (WHOLE - pages.quarterTurns(sheet.page)) % WHOLE;
+    return Report::turned(zone.box, {sheet.width, sheet.height}, back);
+}
+
+/// Those that are printed otherwise, {"page": quarters clockwise}.
+json::Object turnedPages(Report::ShownPages const& pages) {
+    json::Object turned;
+    for (int page = 1; page <= pages.document().pageCount(); ++page)
+        if (int const quarters = pages.quarterTurns(page); quarters != 0)
+            turned.set(std::to_string(page), quarters);
+    return turned;
+}
+
+/// Another one when the pages would be printed otherwise.
+std::string markOf(OpenDocument const& read, std::vector<LetterReading> const& letters,
+                   MakingReady const& making) {
+    std::ostringstream all;
+    all << read.packPreset.serialize(false);
+    for (LetterReading const& letter : letters)
+        all << toJsonArray(letter.pages) << letter.coverAddress;
+    for (UsedDocument const& used : making.usedDocuments())
+        all << used.id << used.sha256;
+    return Base::sha256(std::move(all).str()).substr(0, MARK_DIGITS);
+}
+
 /// The letters of one document, with what its explanation says of them and where the settings have them.
 class Teller {
 public:
@@ -104,15 +158,18 @@ public:
 
     /// `page` is that of the letter in the trace, `explained` in the explanation.
     json::Object tell(Letter const& letter, LetterReading const& reading, Reader::PageTrace const& page,
-                      json::Object const& explained) {
+                      json::Object const& explained, PagesWithoutPictures const& pages) {
         json::Array zones;
         json::Array const traced = explained.get(Explanation::ZONES).toArray();
-        for (std::size_t i = 0; i < letter.zones.size(); ++i)
-            zones.append(zone(letter.zones[i], page.zones[i], traced.at(i).toObject()));
+        for (std::size_t i = 0; i < letter.zones.size(); ++i) {
+            Report::Zone const& one = letter.zones[i];
+            zones.append(zone(one, asRead(one, letter, pages), page.zones[i], traced.at(i).toObject()));
+        }
         return {{"pages", toJsonArray(reading.pages)},
                 {"pages_in_words", letter.pages},
                 {"why_not", letter.whyNot},
                 {"sheets", sheetsOf(letter)},
+                {"sides", pages.areMadeReady() ? json::Value(sidesOf(letter)) : null()},
                 {"zones", zones},
                 {"findings", findingsOf(letter)}};
     }
@@ -123,7 +180,7 @@ public:
     json::Value packPointer() const { return pointerOf(pack_); }
 
 private:
-    json::Object zone(Report::Zone const& zone, Reader::ZoneTrace const& trace,
+    json::Object zone(Report::Zone const& zone, Box const& box, Reader::ZoneTrace const& trace,
                       json::Object const& explained) {
         ListedZone const* const listed = settings_.listed(listed_, preset_, *trace.definition);
         json::Array fields;
@@ -133,7 +190,7 @@ private:
                                 traced.at(i).toObject()));
         return {{"name", zone.name},
                 {"sheet", static_cast<long long>(zone.sheet)},
-                {"box", Workbench::toJson(zone.box)},
+                {"box", Workbench::toJson(box)},
                 {"address_window", zone.isAddressWindow},
                 {"by_point", zone.isByPoint},
                 {"nowhere", zone.whyNowhere},
@@ -187,8 +244,10 @@ private:
 };
 
 void addLetters(json::Object& answer, DocumentReading const& reading, OpenDocument const& read,
-                json::Object const& explanation, SettingsInWork& settings) {
-    PagesAsRead pages(read.document);
+                json::Object const& explanation, SettingsInWork& settings, MakingReady* making) {
+    MakingReady none;
+    Report::PrintedPages printed(read.document, read.packPreset, making ? *making : none);
+    PagesWithoutPictures pages(printed, making != nullptr);
     Report::Document const described = Report::describe(reading, pages, read.trace);
     Teller teller(settings, read.preset, read.packPreset.name());
     json::Array letters;
@@ -197,13 +256,16 @@ void addLetters(json::Object& answer, DocumentReading const& reading, OpenDocume
         if (!read.trace.pages[i].beginsLetter)
             continue;
         letters.append(teller.tell(described.letters[next], (*reading.letters)[next], read.trace.pages[i],
-                                   explained.at(i).toObject()));
+                                   explained.at(i).toObject(), pages));
         ++next;
     }
     answer.set("extract_preset", teller.presetToJson());
     answer.set("pack_preset",
                json::Object{{"name", read.packPreset.name()}, {"pointer", teller.packPointer()}});
     answer.set("letters", letters);
+    answer.set("turned", turnedPages(pages));
+    if (making)
+        answer.set("printed", markOf(read, *reading.letters, *making));
 }
 
 /// Which presets were tried; the last of them is the one that answered.
@@ -244,7 +306,7 @@ void addEvaluation(json::Object& answer, Reader::Document& document, SettingsInW
         json::Object explanation = result.reading.trace.toObject();
         explainPages(explanation, read.document, read.preset, Reader::ReadingRules::of(read.packPreset),
                      read.trace);
-        addLetters(answer, result.reading, read, explanation, settings);
+        addLetters(answer, result.reading, read, explanation, settings, making);
     };
     DocumentReading const reading =
         readDocument(document, settings.presets(), settings.node(), along).reading;

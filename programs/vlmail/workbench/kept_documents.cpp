@@ -10,19 +10,39 @@
 
 namespace VlMail::Workbench {
 
-FileMark markOf(std::filesystem::path const& file) {
-    constexpr std::int64_t NANOSECONDS = 1'000'000'000;
+namespace {
+
+struct stat statusOf(std::filesystem::path const& file) {
     struct stat status {};
     if (::stat(file.c_str(), &status) != 0)
         throw Base::Error(Base::Code::FileUnreadable, "cannot read " + Base::inQuotes(file.string()) + ": " +
                                                           std::generic_category().message(errno) +
                                                           "; look whether it is still there");
-    if (!S_ISREG(status.st_mode))
-        throw Base::Error(Base::Code::FileUnsuitable,
-                          "cannot read " + Base::inQuotes(file.string()) + ": it is no ordinary file");
+    return status;
+}
+
+FileMark markIn(struct stat const& status) {
+    constexpr std::int64_t NANOSECONDS = 1'000'000'000;
     return {status.st_dev, status.st_ino, static_cast<std::uint64_t>(status.st_size),
             status.st_mtim.tv_sec * NANOSECONDS + status.st_mtim.tv_nsec};
 }
+
+} // namespace
+
+std::string versionOf(FileMark const& mark) {
+    return std::to_string(mark.device) + '-' + std::to_string(mark.inode) + '-' + std::to_string(mark.size) +
+           '-' + std::to_string(mark.modified);
+}
+
+FileMark markOf(std::filesystem::path const& file) {
+    struct stat const status = statusOf(file);
+    if (!S_ISREG(status.st_mode))
+        throw Base::Error(Base::Code::FileUnsuitable,
+                          "cannot read " + Base::inQuotes(file.string()) + ": it is no ordinary file");
+    return markIn(status);
+}
+
+FileMark markOfFolder(std::filesystem::path const& folder) { return markIn(statusOf(folder)); }
 
 Reader::Document& KeptDocuments::document(std::filesystem::path const& file) {
     FileMark const mark = markOf(file);

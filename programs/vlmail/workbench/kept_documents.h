@@ -22,8 +22,13 @@ struct FileMark {
     friend bool operator==(FileMark const&, FileMark const&) = default;
 };
 
+/// As a text for those who only compare it.
+std::string versionOf(FileMark const& mark);
+
 /// Throws Base::Error for what is no ordinary file.
 FileMark markOf(std::filesystem::path const& file);
+/// Of a folder; another one when something comes into it or leaves it.
+FileMark markOfFolder(std::filesystem::path const& folder);
 
 class KeptDocuments {
 public:

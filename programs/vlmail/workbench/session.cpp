@@ -50,6 +50,7 @@ ReaderProcess::Work deskWork(Folders const& folders) {
 json::Object toJson(ListedDocument const& document) {
     return {{"name", document.name},
             {"size", static_cast<long long>(document.size)},
+            {"version", document.version},
             {"golden", document.isGolden}};
 }
 

@@ -67,9 +67,11 @@ export class Api {
 
     /**
      * Throws as call() does.
+     * @param {{document: string, page: number, dots: number}} wanted
+     * @param {AbortSignal} [signal]
      * @returns {Promise<Blob>} the page's picture
      */
-    async picture(document, page, dots, signal) {
-        return (await this.#post("picture", { document, page, dots }, signal)).blob();
+    async picture(wanted, signal) {
+        return (await this.#post("picture", wanted, signal)).blob();
     }
 }

@@ -1,37 +1,12 @@
 // The page's picture with what was searched and found where. The marks are those of a report, in its style.
 import { byId, el, isolated } from "./dom.js";
 import { isGivenUp } from "./api.js";
+import { turned, turnedBack, turnedSize } from "./turning.js";
 
 const DOTS = 110;
-/** Pictures that are kept, so that going back and forth costs nothing. */
-const MOST_PICTURES = 12;
+/** In 1/100 mm. */
+const INCH = 2540;
 const A4 = { width: 21000, height: 29700 };
-
-/** Pictures of pages by document and page, the latest ones. */
-class Pictures {
-    #urls = new Map();
-
-    constructor(api) {
-        this.api = api;
-    }
-
-    async get(document, page, signal) {
-        const key = JSON.stringify([document, page]);
-        const url = this.#urls.get(key) ?? URL.createObjectURL(await this.api.picture(document, page, DOTS, signal));
-        this.#urls.delete(key);
-        this.#urls.set(key, url);
-        this.#forget();
-        return url;
-    }
-
-    #forget() {
-        while (this.#urls.size > MOST_PICTURES) {
-            const [key, url] = this.#urls.entries().next().value;
-            URL.revokeObjectURL(url);
-            this.#urls.delete(key);
-        }
-    }
-}
 
 function percent(part, whole) {
     return part / whole * 100 + "%";
@@ -39,17 +14,19 @@ function percent(part, whole) {
 
 export class Canvas extends EventTarget {
     #abort = new AbortController();
+    /** As it is shown. */
     #size = A4;
+    #shown = null;
 
     /**
      * Tells "drawn" when marks have been put onto the page.
      * @param {import("./state.js").Session} session
-     * @param {import("./api.js").Api} api
+     * @param {import("./pictures.js").Pictures} pictures
      * @param {import("./texts.js").Texts} texts
      */
-    constructor(session, api, texts) {
+    constructor(session, pictures, texts) {
         super();
-        Object.assign(this, { session, texts, pictures: new Pictures(api), stage: byId("stage"), note: byId("picture-note") });
+        Object.assign(this, { session, texts, pictures, stage: byId("stage"), note: byId("picture-note"), view: byId("view") });
         this.image = el("img", { alt: "", draggable: "false" });
         this.marks = el("div", { class: "marks" });
         this.sheet = el("div", { class: "sheet" }, this.image, this.marks);
@@ -57,6 +34,7 @@ export class Canvas extends EventTarget {
         this.image.addEventListener("load", () => this.#fit());
         session.on("page", () => this.#turn());
         session.on("page evaluation", () => this.draw());
+        session.on("evaluation", () => this.#keepUp());
         session.on("look", (miss) => this.#look(miss));
         session.on("choice", () => this.#reveal());
         this.#listenToPaging();
@@ -70,6 +48,8 @@ export class Canvas extends EventTarget {
             this.session.turnTo(this.#within(Math.round(Number(event.target.value)) || 1));
             event.target.value = this.session.page;
         });
+        this.view.append(...["printed", "read"].map((view) => el("option", { value: view }, this.texts.of("view_" + view))));
+        this.view.addEventListener("change", () => this.session.show(this.view.value === "printed"));
     }
 
     get #count() {
@@ -84,23 +64,43 @@ export class Canvas extends EventTarget {
         this.#abort.abort();
         this.#abort = new AbortController();
         const { signal } = this.#abort;
-        const { document, page } = this.session;
+        const { document, page, side, isPrinted } = this.session;
+        this.#shown = null;
+        if (side?.kind === "blank")
+            return this.#showBlank();
         try {
             this.stage.setAttribute("aria-busy", "true");
-            const url = await this.pictures.get(document, page, signal);
+            const picture = await this.pictures.get({ page, side: side ?? undefined, isPrinted, dots: DOTS }, signal);
             if (!signal.aborted)
-                this.#showPicture(url, document, page);
+                this.#showPicture(picture, side ? this.texts.side(side) : this.texts.of("pictureOf", { page, document }));
         } catch (failure) {
             if (!isGivenUp(failure))
                 this.#showFailure(failure);
         }
+        return undefined;
     }
 
-    #showPicture(url, document, page) {
+    /** The letters may be printed otherwise by settings that have changed, and files change, too. */
+    #keepUp() {
+        const { evaluation } = this.session;
+        if (evaluation?.printed)
+            this.pictures.confirm();
+        if (this.#shown && evaluation && (evaluation.printed || !this.session.isPrinted) && !this.pictures.isCurrent(this.#shown))
+            this.#turn();
+    }
+
+    #showPicture(picture, says) {
+        this.#shown = picture;
         this.note.textContent = "";
         this.image.hidden = false;
-        this.image.src = url;
-        this.image.alt = this.texts.of("pictureOf", { page, document });
+        this.image.src = picture.url;
+        this.image.alt = says;
+    }
+
+    #showBlank() {
+        this.stage.removeAttribute("aria-busy");
+        this.image.hidden = true;
+        this.note.textContent = this.texts.side(this.session.side);
     }
 
     #showFailure(failure) {
@@ -113,8 +113,41 @@ export class Canvas extends EventTarget {
     /** A page without marks is as large as its picture says. */
     #fit() {
         this.stage.removeAttribute("aria-busy");
-        if (!this.session.sheet)
-            this.#resize(A4.width, A4.width * this.image.naturalHeight / this.image.naturalWidth);
+        if (this.#marked)
+            return;
+        const { naturalWidth: width, naturalHeight: height } = this.image;
+        this.#resize(width / DOTS * INCH, height / DOTS * INCH);
+        this.dispatchEvent(new CustomEvent("drawn"));
+    }
+
+    /** @returns {object|null} what is drawn on the page, as it is shown */
+    get #marked() {
+        const { sheet } = this.session;
+        return sheet && { ...turnedSize(sheet, this.#quartersBack), shapes: sheet.shapes.map((shape) => ({ ...shape,
+            box: turned(shape.box, sheet, this.#quartersBack) })) };
+    }
+
+    /** From the page as it is printed to the page as it is shown. */
+    get #quartersBack() {
+        return this.session.isPrinted ? 0 : (4 - this.session.quarters) % 4;
+    }
+
+    /** From the page as it was read to the page as it is shown. */
+    get #quarters() {
+        return this.session.isPrinted ? this.session.quarters : 0;
+    }
+
+    /**
+     * @param {import("./snapping.js").Box} box  on the page as it was read
+     * @returns {import("./snapping.js").Box} on the page as it is shown
+     */
+    shown(box) {
+        return turned(box, turnedSize(this.#size, this.#quarters), this.#quarters);
+    }
+
+    /** The way back from shown(). */
+    read(box) {
+        return turnedBack(box, this.#size, this.#quarters);
     }
 
     #resize(width, height) {
@@ -129,14 +162,16 @@ export class Canvas extends EventTarget {
         byId("page-count").textContent = this.texts.of("ofPages", { count: this.#count });
         byId("page-back").disabled = this.session.page <= 1;
         byId("page-on").disabled = this.session.page >= this.#count;
+        this.view.value = this.session.isPrinted ? "printed" : "read";
     }
 
     draw() {
-        const { sheet } = this.session;
-        if (sheet)
-            this.#resize(sheet.width, sheet.height);
+        const marked = this.#marked;
+        const { side } = this.session;
+        if (marked ?? side)
+            this.#resize((marked ?? side).width, (marked ?? side).height);
         this.#showPaging();
-        this.#place((sheet?.shapes ?? []).map((shape) => this.#mark(shape)));
+        this.#place((marked?.shapes ?? []).map((shape) => this.#mark(shape)));
         this.dispatchEvent(new CustomEvent("drawn"));
     }
 
@@ -169,7 +204,7 @@ export class Canvas extends EventTarget {
         this.session.turnTo(page ?? this.session.page);
         const frame = el("div", { class: "look" });
         this.marks.append(frame);
-        this.put(frame, box);
+        this.put(frame, this.shown(box));
         frame.scrollIntoView({ block: "nearest" });
     }
 
@@ -200,7 +235,7 @@ export class Canvas extends EventTarget {
     /**
      * Lays an element over the page.
      * @param {HTMLElement} element
-     * @param {import("./snapping.js").Box} box
+     * @param {import("./snapping.js").Box} box  on the page as it is shown
      */
     put(element, box) {
         const { width, height } = this.#size;
@@ -212,7 +247,7 @@ export class Canvas extends EventTarget {
 
     /**
      * @param {PointerEvent} event
-     * @returns {{x: number, y: number}} on the page, in 1/100 mm
+     * @returns {{x: number, y: number}} on the page as it is shown, in 1/100 mm
      */
     placeOf(event) {
         const box = this.sheet.getBoundingClientRect();

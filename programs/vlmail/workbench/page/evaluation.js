@@ -32,7 +32,7 @@ export class Evaluation {
     constructor(session, api, failed) {
         Object.assign(this, { session, api, failed });
         session.on("text", () => this.#soon());
-        session.on("document", () => this.#readNow());
+        session.on("document file", () => this.#readNow());
         session.on("baseline", () => this.#judge());
     }
 

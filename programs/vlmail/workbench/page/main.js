@@ -12,9 +12,11 @@ import { Fields } from "./fields.js";
 import { Form } from "./form.js";
 import { Golden } from "./golden.js";
 import { NewField } from "./new_field.js";
+import { Pictures } from "./pictures.js";
 import { Proposals } from "./proposals.js";
 import { Saving } from "./saving.js";
 import { Schema } from "./schema.js";
+import { Sides } from "./sides.js";
 import { Session } from "./state.js";
 import { Tabs } from "./tabs.js";
 import { Texts } from "./texts.js";
@@ -58,7 +60,9 @@ class Page {
         const newField = new NewField(session, edits, texts);
         this.evaluation = new Evaluation(session, api, failed);
         this.list = new DocumentList(session, texts);
-        const canvas = new Canvas(session, api, texts);
+        const pictures = new Pictures(session, api);
+        const canvas = new Canvas(session, pictures, texts);
+        this.sides = new Sides(session, pictures, texts);
         const tools = new ZoneTools({ session, canvas, api, edits, texts,
             drawn: (box, lines) => newField.inNewZone(box, lines) });
         const addField = (zone) => newField.inZone(zone);
@@ -148,8 +152,7 @@ class Page {
         const state = await this.api.call("state").catch((failure) => void this.failed(failure));
         if (!state)
             return;
-        session.documents = state.documents;
-        session.tell("documents");
+        session.relist(state.documents);
         if (state.settings.version !== session.settings.version)
             session.say(this.texts.of("changedOutside", { name: state.settings.name }), "bad");
     }

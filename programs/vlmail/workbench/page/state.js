@@ -4,7 +4,7 @@ import { History } from "./history.js";
 
 /**
  * What happens, and what has changed then: "text" the settings' text, "saved" what it is compared with, "documents"
- * their list, "document" which one is open, "page" which page of it, "evaluation" what reading it gave, "verdicts" those
+ * their list, "file" the file of the one that is open, "document" which one is open, "page" which page or side of it and how it is shown, "evaluation" what reading it gave, "verdicts" those
  * of the others, "choice" what is chosen on the page, "message" what there is to say.
  */
 export class Session extends EventTarget {
@@ -21,6 +21,10 @@ export class Session extends EventTarget {
         this.history = new History("");
         this.document = "";
         this.page = 1;
+        /** What is shown in its stead of what goes out with its letter; null for the page itself. */
+        this.side = null;
+        /** Pages are shown as they will be printed, not as they were read. */
+        this.isPrinted = true;
         /** The last one of settings that could be read; null before. */
         this.evaluation = null;
         /** The settings' text that it is of. */
@@ -71,6 +75,19 @@ export class Session extends EventTarget {
         this.tell("text");
     }
 
+    /** Takes over which files there are. Those that have changed are read anew. */
+    relist(documents) {
+        const versions = new Map(this.documents.map(({ name, version }) => [name, version]));
+        const changed = documents.filter(({ name, version }) => versions.get(name) !== version).map(({ name }) => name);
+        this.documents = documents;
+        changed.forEach((name) => this.verdicts.delete(name));
+        this.tell("documents");
+        if (changed.includes(this.document))
+            this.tell("file");
+        else if (changed.length > 0)
+            this.tell("baseline");
+    }
+
     /**
      * @param {string} text
      * @param {string} says  what was done, for the names of undo and redo
@@ -111,6 +128,7 @@ export class Session extends EventTarget {
             return this.turnTo(page);
         this.document = document;
         this.page = page;
+        this.side = null;
         this.evaluation = null;
         this.tell("document");
         this.tell("page");
@@ -118,9 +136,25 @@ export class Session extends EventTarget {
     }
 
     turnTo(page) {
-        if (page === this.page)
+        if (page === this.page && !this.side)
             return;
         this.page = page;
+        this.side = null;
+        this.tell("page");
+    }
+
+    /** @param {object} side  of those that go out with the letter */
+    turnToSide(side) {
+        if (side.kind === "page")
+            return this.turnTo(side.page);
+        this.side = side;
+        return this.tell("page");
+    }
+
+    /** @param {boolean} isPrinted */
+    show(isPrinted) {
+        this.isPrinted = isPrinted;
+        this.side = isPrinted ? this.side : null;
         this.tell("page");
     }
 
@@ -134,10 +168,33 @@ export class Session extends EventTarget {
         this.broken = evaluation.broken ?? null;
         this.lint = evaluation.lint ?? this.lint;
         if (!this.broken && evaluation.document) {
+            this.#keepSides(evaluation);
+            this.#noteVersion(evaluation);
             this.evaluation = evaluation;
             this.evaluatedText = text;
+            this.#leaveLostSide();
         }
         this.tell("evaluation");
+    }
+
+    /** Settings that have changed may send something else along. */
+    #leaveLostSide() {
+        const shown = JSON.stringify(this.side);
+        if (this.side && !this.letter?.sides?.some((side) => JSON.stringify(side) === shown))
+            this.turnTo(this.page);
+    }
+
+    #noteVersion({ document, version }) {
+        const listed = this.documents.find(({ name }) => name === document);
+        if (listed && version)
+            listed.version = version;
+    }
+
+    /** What goes out with letters is told behind the rest: until then it is what it was. */
+    #keepSides({ document, letters = [] }) {
+        const before = this.evaluation?.document === document ? this.evaluation.letters ?? [] : [];
+        for (const letter of letters)
+            letter.sides ??= before.find(({ pages }) => pages[0] === letter.pages[0])?.sides ?? null;
     }
 
     judged(verdicts) {
@@ -159,7 +216,22 @@ export class Session extends EventTarget {
 
     /** @returns {object|null} what is drawn on the page */
     get sheet() {
-        return this.letter?.sheets.find((sheet) => sheet.page === this.page) ?? null;
+        return this.side ? null : this.letter?.sheets.find((sheet) => sheet.page === this.page) ?? null;
+    }
+
+    /** @returns {number} the quarters by which the page is printed clockwise */
+    get quarters() {
+        return this.evaluation?.turned?.[this.page] ?? 0;
+    }
+
+    /** @returns {string} another one when the open document's file is another */
+    get version() {
+        return this.documents.find(({ name }) => name === this.document)?.version ?? "";
+    }
+
+    /** @returns {string} the settings as they are, or as they were before they became unreadable; empty without any */
+    get readableText() {
+        return this.broken ? this.evaluatedText : this.text;
     }
 
     /** @returns {object|null} the zone of the letter that stands there in the settings */

@@ -17,6 +17,8 @@ const EN = {
     verdict_trouble: ({ letters: count, ready }) => letters(count, "letter", "letters") + `, ${count - ready} cannot go out`,
     verdict_attachment: "attachment", verdict_failed: "cannot be read",
     page: "Page", paging: "Pages and zones", pageBack: "Previous page", pageOn: "Next page", pageNumber: "Page", ofPages: "of {count}",
+    view: "Shown", view_printed: "as printed", view_read: "as read", sides: "What goes out with the letter, side by side",
+    side_page: "page {page}", side_blank: "blank side", side_attachment: "page {page} of \u201c{id}\u201d", side_cover: "cover page",
     draw: "Draw a zone", stage: "The page with its zones and what was found in them", pictureOf: "page {page} of {document}",
     zoneKeys: "Arrows move the zone, with Shift they move its right and lower edges, with Ctrl by tenths of a millimetre; F fits it to its text, Delete removes it, Enter shows it as numbers",
     draft: "New zone", draftKeys: "Draw the zone with the mouse, or move it with the arrows, resize it with Shift and the arrows, and press Enter; Esc gives it up",
@@ -88,6 +90,8 @@ const DE = {
     verdict_trouble: ({ letters: count, ready }) => letters(count, "Brief", "Briefe") + `, ${count - ready} nicht versandfähig`,
     verdict_attachment: "Anlage", verdict_failed: "nicht lesbar",
     page: "Seite", paging: "Seiten und Zonen", pageBack: "Vorige Seite", pageOn: "Nächste Seite", pageNumber: "Seite", ofPages: "von {count}",
+    view: "Gezeigt", view_printed: "wie gedruckt", view_read: "wie gelesen", sides: "Was mit dem Brief hinausgeht, Seite für Seite",
+    side_page: "Seite {page}", side_blank: "leere Seite", side_attachment: "Seite {page} von \u201e{id}\u201c", side_cover: "Deckblatt",
     draw: "Zone zeichnen", stage: "Die Seite mit ihren Zonen und dem, was darin gefunden wurde", pictureOf: "Seite {page} von {document}",
     zoneKeys: "Pfeile verschieben die Zone, mit Umschalt den rechten und unteren Rand, mit Strg um Zehntelmillimeter; F passt sie ihrem Text an, Entf entfernt sie, Eingabe zeigt sie in Zahlen",
     draft: "Neue Zone", draftKeys: "Zone mit der Maus zeichnen, oder mit den Pfeilen verschieben, mit Umschalt und Pfeilen vergrößern und Eingabe drücken; Esc bricht ab",
@@ -178,6 +182,11 @@ export class Texts {
     /** @returns {string} what was found of a document */
     verdict(verdict) {
         return this.of("verdict_" + verdict.verdict, verdict);
+    }
+
+    /** @returns {string} what a side of paper is */
+    side(side) {
+        return this.of("side_" + side.kind, side);
     }
 
     /** @returns {string} where a box lies, in millimetres */

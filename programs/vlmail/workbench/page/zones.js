@@ -73,7 +73,7 @@ export class ZoneTools {
     /** Text blocks of the page that is shown; empty as long as they are not known. */
     async #load() {
         const { document, page } = this.session;
-        const key = JSON.stringify([document, page]);
+        const key = JSON.stringify([document, page, this.session.version]);
         if (!document || this.#blocks.key === key)
             return;
         this.#blocks = { key, blocks: [], lines: [] };
@@ -123,7 +123,8 @@ export class ZoneTools {
     // Gestures: a zone's box as it would be, and what becomes of it at the end.
 
     #begin(zone, edges, at) {
-        this.#gesture = { zone, edges, at, box: zone.box, mark: this.#markOf(zone.pointer), isMoving: false };
+        const start = this.canvas.shown(zone.box);
+        this.#gesture = { zone, edges, at, start, box: start, mark: this.#markOf(zone.pointer), isMoving: false };
     }
 
     #show(box) {
@@ -133,7 +134,7 @@ export class ZoneTools {
     }
 
     #tellPlace(box) {
-        this.canvas.note.textContent = this.texts.place(box);
+        this.canvas.note.textContent = this.texts.place(this.canvas.read(box));
     }
 
     #giveUp() {
@@ -151,7 +152,7 @@ export class ZoneTools {
         this.canvas.note.textContent = "";
         if (isDraft)
             return this.#finishDraft(box);
-        return this.place(zone, box);
+        return this.place(zone, this.canvas.read(box));
     }
 
     /**
@@ -207,10 +208,10 @@ export class ZoneTools {
             this.#show(this.#dragged(gesture, to, by, event.altKey));
     }
 
-    #dragged({ zone, edges, at, isDraft }, to, by, isFree) {
-        const box = isDraft ? between(at, to) : edges === "m" ? moved(zone.box, by) : resized(zone.box, edges, by);
+    #dragged({ start, edges, at, isDraft }, to, by, isFree) {
+        const box = isDraft ? between(at, to) : edges === "m" ? moved(start, by) : resized(start, edges, by);
         const reach = isFree ? 0 : REACH_PX * this.canvas.unitsPerPixel;
-        return snapped(box, isDraft ? "ltrb" : edges, this.#blocks.blocks, reach);
+        return snapped(box, isDraft ? "ltrb" : edges, this.#blocks.blocks.map((block) => this.canvas.shown(block)), reach);
     }
 
     #release() {
@@ -297,6 +298,8 @@ export class ZoneTools {
     beginDraft() {
         if (!this.session.presetPointer)
             return this.session.say(this.texts.of("noOwnPreset"), "bad");
+        if (this.session.side)
+            this.session.turnTo(this.session.page);
         const mark = el("div", { class: "draft", role: "button", tabindex: 0, "aria-label": this.texts.of("draft"),
             "aria-description": this.texts.of("draftKeys") });
         this.#draft = { isDraft: true, box: FIRST, mark };
@@ -321,8 +324,9 @@ export class ZoneTools {
 
     #finishDraft(box) {
         this.#endDraft();
-        if (isMeant(box))
-            this.drawn(box, this.#linesIn(box));
+        const read = this.canvas.read(box);
+        if (isMeant(read))
+            this.drawn(read, this.#linesIn(read));
     }
 
     #linesIn(box) {

@@ -22,9 +22,9 @@ class BrowserTest(unittest.TestCase):
         at.look(self.driver)
         self.driver.get_log("browser")
 
-    def begin(self, folder, settings="settings.json"):
-        """A workbench with a folder of its own, which is a copy of one of the examples."""
-        bench = at.Workbench(VLMAIL, os.path.join(EXAMPLES, folder), settings)
+    def begin(self, folder, settings="settings.json", *options):
+        """A workbench with a folder of its own, which is a copy of one of the examples, or of another folder."""
+        bench = at.Workbench(VLMAIL, os.path.join(EXAMPLES, folder), settings, *options)
         self.addCleanup(bench.end)
         return bench
 

@@ -72,6 +72,16 @@ class Modules(BrowserTest):
         snapped = self.page.imported("snapping.js", "m.snapped(a[0], 'lb', [a[1]], 200)", box, block)
         self.assertEqual(snapped, {"left": 1050, "top": 1000, "right": 3000, "bottom": 2050})
 
+    def test_a_box_is_turned_with_its_page_and_back(self):
+        box = {"left": 1000, "top": 2000, "right": 5000, "bottom": 2500}
+        page = {"width": 21000, "height": 29700}
+        turned = self.page.imported("turning.js", "[0, 1, 2, 3].map((q) => m.turned(a[0], a[1], q))", box, page)
+        edges = ("left", "top", "right", "bottom")
+        expected = ((1000, 2000, 5000, 2500), (27200, 1000, 27700, 5000), (16000, 27200, 20000, 27700), (2000, 16000, 2500, 20000))
+        self.assertEqual(turned, [dict(zip(edges, one)) for one in expected])
+        back = "[0, 1, 2, 3].map((q) => m.turnedBack(m.turned(a[0], a[1], q), m.turnedSize(a[1], q), q))"
+        self.assertEqual(self.page.imported("turning.js", back, box, page), [box] * 4)
+
     def test_a_value_behind_a_label_is_proposed_first(self):
         found = self.page.imported("new_field.js", "m.proposals(a[0])[0]", ["Dear Sir", "Total (EUR): 12.30"])
         self.assertEqual(found, {"kind": "behind", "label": "Total (EUR):", "pattern": "^Total \\(EUR\\):\\h*(?<VAL>\\S.*)$"})

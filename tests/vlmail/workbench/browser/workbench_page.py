@@ -26,17 +26,16 @@ def missing_parts():
 class Workbench:
     """The program with a folder of its own, which is a copy of one of the examples."""
 
-    def __init__(self, vlmail, folder, settings):
+    def __init__(self, vlmail, folder, settings, *options):
         self.home = tempfile.mkdtemp(prefix="workbench")
         self.folder = os.path.join(self.home, "letters")
         shutil.copytree(folder, self.folder)
         self.settings = os.path.join(self.home, "node.json")
-        options = []
         if settings:
             shutil.move(os.path.join(self.folder, settings), self.settings)
-            options = ["--settings", self.settings]
+            options += ("--settings", self.settings)
         self.process = subprocess.Popen(
-            [vlmail, "workbench", self.folder] + options,
+            [vlmail, "workbench", self.folder, *options],
             stdout=subprocess.PIPE,
             env={**os.environ, "HOME": self.home},
             text=True,
@@ -104,6 +103,16 @@ def look(driver, scheme="light", size=(1500, 1000), language="en-GB"):
     command("Emulation.setDeviceMetricsOverride", {"width": size[0], "height": size[1], "deviceScaleFactor": 1, "mobile": False})
     agent = driver.execute_script("return navigator.userAgent")
     command("Emulation.setUserAgentOverride", {"userAgent": agent, "acceptLanguage": language})
+
+
+def marks_in(driver, sheet):
+    """What is drawn on a sheet of the workbench or of a report: looks, words, names, and places in per cent."""
+    script = """
+        const within = (mark) => ["left", "top", "width", "height"].map((side) => mark.style[side]);
+        return [...document.querySelector(arguments[0]).querySelectorAll("a")].map((mark) => [mark.className.replace("chosen", "").trim(),
+            mark.ariaLabel, mark.querySelector(".tag")?.textContent ?? "", ...within(mark).map((side) => Math.round(parseFloat(side) * 100) / 100)]);
+    """
+    return driver.execute_script(script, sheet)
 
 
 class Page:
@@ -192,6 +201,16 @@ class Page:
 
         chain = ActionChains(self.driver, 0).key_down(modifier)
         chain.send_keys(*keys).key_up(modifier).perform()
+
+    def select(self, selector, value):
+        """Chooses from a list of choices."""
+        from selenium.webdriver.support.ui import Select
+
+        Select(self.one(selector)).select_by_value(value)
+
+    def marks(self):
+        """What is drawn on the page that is shown, in per cent of it."""
+        return marks_in(self.driver, "#stage .sheet")
 
     def drag(self, selector, start, by):
         """From a part of the element, such as (0.5, 1) for the middle of its lower edge, by so many millimetres of the page."""

@@ -4,11 +4,13 @@
 With UPDATE_GOLDEN=1 it writes the pictures that the documents show anew, into the folder PICTURES."""
 import json
 import os
+import subprocess
 import sys
+import tempfile
 
 sys.dont_write_bytecode = True
 import workbench_page as at
-from browser_test import EXAMPLES, BrowserTest, main
+from browser_test import EXAMPLES, VLMAIL, BrowserTest, main
 
 BROKEN = os.path.join(EXAMPLES, "broken")
 XSS = "<img src=x onerror=\"document.title='taken'\"><script>document.title='taken'</script>"
@@ -244,6 +246,106 @@ class Zones(BrowserTest):
         page.keys("greeting", keys.ENTER)
         page.wait(lambda: page.field("greeting"), "the new field")
         self.assertEqual(json.loads(page.settings())["extract_presets"][0]["zones"][2]["name"], "Zone 3")
+
+
+class Printed(BrowserTest):
+    """Pages as they will be printed, as the report shows them."""
+
+    def begin_with(self, keys):
+        home = tempfile.TemporaryDirectory()
+        self.addCleanup(home.cleanup)
+        letters, self.parts = os.path.join(home.name, "letters"), os.path.join(home.name, "parts")
+        address = {"name": "postal", "value_extract": "\\A(?<VAL>(.{1,72}\\n){1,8}.{1,72})\\Z", "priority": 1, "send_to_server": True}
+        zones = [
+            {"name": "Address", "location": {"left": 2000, "top": 3000, "right": 9000, "bottom": 6500}, "fields": [address]},
+            {"name": "Text", "location": {"left": 2000, "top": 7500, "right": 20000, "bottom": 12000}, "fields": [{"name": "bill", "value_extract": "^Bill: (?<VAL>.*)$"}]},
+        ]
+        settings = {"extract_presets": [{"match": ".*", "pack_preset": "P", "zones": zones}], "pack_presets": [{"name": "P", **keys}]}
+        for file, text in (
+            ("letters/a.txt", "\n\n\n\n\nAda Brook\n14 Mill Lane\nHEBDEN BRIDGE\nHX7 8AB\n\n\n\n\nDear Ada,\n\nBill: 17\n"),
+            ("letters/settings.json", json.dumps(settings, indent=1)),
+            ("parts/head.txt", "\n\n" + " " * 40 + "THE MILL"),
+            ("parts/terms.txt", "Terms\fmore of them"),
+        ):
+            os.makedirs(os.path.dirname(os.path.join(home.name, file)), exist_ok=True)
+            with open(os.path.join(home.name, file), "w", encoding="utf-8") as out:
+                out.write(text)
+        self.bench = self.begin(letters, "settings.json", "--documents", self.parts)
+        return self.page_of(self.bench).wait_for_picture()
+
+    def reported(self):
+        """What the report of the same document draws."""
+        report = os.path.join(self.bench.home, "report.html")
+        arguments = ["letter", os.path.join(self.bench.folder, "a.txt"), "--settings", self.bench.settings, "--documents", self.parts, "--report", report]
+        subprocess.run([VLMAIL] + arguments, stdout=subprocess.DEVNULL, check=False)
+        at.leave(self.driver)
+        self.driver.get("file://" + report)
+        sides = "return [...document.querySelectorAll('.sides li')].map((one) => one.textContent.trim().replace(/\"(.*)\"/, '\u201c$1\u201d'))"
+        return at.marks_in(self.driver, ".sheet"), self.driver.execute_script(sides)
+
+    def test_marks_and_sides_are_those_of_the_report(self):
+        window = {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000}
+        for name, keys in (
+            ("findings", {"production": {"window": window}}),
+            ("turned", {"orientation": 2}),
+            ("all that goes out", {"duplex": True, "letterheads": ["head"], "attachments": ["terms"], "production": {"window": window, "repair": ["cover-page"]}}),
+        ):
+            with self.subTest(name):
+                page = self.begin_with(keys)
+                page.wait(lambda: len(page.marks()) > 2 or "production" not in keys or "repair" in keys["production"], "the findings")
+                if "attachments" in keys:
+                    page.wait(lambda: len(page.find("#sides img")) == 4, "the sides")
+                drawn = page.marks(), page.texts("#sides li")
+                self.assertEqual(drawn, self.reported())
+
+    def test_findings_are_drawn_on_the_page_and_told_beside_it(self):
+        page = self.begin_with({"production": {"window": {"left": 2000, "top": 4500, "right": 10500, "bottom": 9000}}})
+        fault = page.one("#stage .fault")
+        self.assertEqual(fault.text, "address-outside-window")
+        self.assertIn("the address stands at 25 to", page.texts(".findings li.bad")[0])
+        page.wait(lambda: "cannot go out" in page.texts("#fields-body h3")[0], "the letter cannot go out")
+        page.type_settings(page.settings().replace('"top": 4500', '"top": 2700').replace('"bottom": 9000', '"bottom": 6600'))
+        page.wait(lambda: not page.find("#stage .fault") and not page.find(".findings"), "nothing is wrong")
+
+    def test_a_zone_is_moved_on_a_page_that_is_printed_turned(self):
+        page = self.begin_with({"orientation": 2})
+        zone = '#stage .zone[aria-label="zone Text"]'
+        left, top, width, height = page.rectangle(zone)
+        self.assertLess(width, height)
+        page.one(zone).send_keys(at.keys().ARROW_LEFT)
+        page.wait(lambda: '"top": 7600' in page.settings(), "a millimetre to the left is one down on the page as it is read")
+        page.wait(lambda: page.rectangle(zone)[0] < left, "the zone follows")
+        page.select("#view", "read")
+        page.wait(lambda: page.rectangle(zone)[2] > page.rectangle(zone)[3], "the page as it is read")
+        page.wait(lambda: page.run("const i = document.querySelector('#stage img'); return i.naturalWidth < i.naturalHeight"), "its picture")
+        page.one(zone).send_keys(at.keys().ARROW_LEFT)
+        page.wait(lambda: '"left": 1900' in page.settings(), "a millimetre to the left")
+
+    def test_what_goes_out_along_is_shown_without_zones(self):
+        page = self.begin_with({"letterheads": ["head"], "attachments": ["terms"]})
+        page.wait(lambda: page.texts("#sides li") == ["page 1", "page 1 of \u201cterms\u201d", "page 2 of \u201cterms\u201d"], "the sides")
+        self.assertEqual(page.run("return [...document.querySelectorAll('#sides [aria-current]')].map((one) => one.ariaLabel)"), ["page 1"])
+        page.find("#sides button")[2].click()
+        page.wait(lambda: page.run("return document.querySelector('#stage img').alt") == "page 2 of \u201cterms\u201d", "the attachment")
+        self.assertEqual(page.marks(), [])
+        page.find("#sides button")[0].click()
+        page.wait(lambda: len(page.marks()) == 4, "the letter's own page")
+        page.find("#sides button")[1].click()
+        page.wait(lambda: page.marks() == [], "the attachment again")
+        page.type_settings(page.settings().replace('"attachments"', '"attachment"'))
+        page.wait(lambda: len(page.marks()) == 4 and page.texts("#sides li") == ["page 1"], "the page, when nothing goes out along any more")
+
+    def test_a_picture_is_made_anew_when_it_would_be_printed_otherwise_alone(self):
+        page = self.begin_with({"letterheads": ["head"]})
+        page.wait(lambda: page.texts("#sides li") == ["page 1"], "the sides")
+        shown = "return document.querySelector('#stage img').src"
+        first = page.run(shown)
+        page.type_settings(page.settings().replace("^Bill: ", "^Bill:\\\\s"))
+        page.wait_for_field("bill", "17")
+        page.wait(lambda: page.find("#lint p"), "all that is found out about the change")
+        self.assertEqual(page.run(shown), first)
+        page.type_settings(page.settings().replace('"head"', '{"id": "head", "skip_letters": true}'))
+        page.wait(lambda: page.run(shown) not in (first, ""), "the picture without the letterhead")
 
 
 class Saving(BrowserTest):
