@@ -2,6 +2,7 @@
 // pdf_page.
 #include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
+#include "programs/reader/document.h"
 #include "programs/reader/page_objects.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_extras.h"
@@ -387,6 +388,8 @@ private:
 };
 
 } // namespace
+
+void prepareToReadPdfs() { preparePoppler(); }
 
 std::unique_ptr<PageSource> openPdf(std::string bytes, std::string const& where) {
     return std::make_unique<PdfSource>(std::move(bytes), where);

@@ -1,0 +1,43 @@
+# cmake -DPROGRAM=FILE -DLIBRARIES=A.so,B.so -DOUT=FILE.cpp -DNM=nm -DOBJDUMP=objdump -P WriteLateCalls.cmake: the functions of
+# the libraries that the program calls, as calls that load their library.
+
+# The names in a table of dynamic symbols that are marked by one of the letters.
+function(names_in result file letters)
+    execute_process(COMMAND ${NM} -D ${file} OUTPUT_VARIABLE table COMMAND_ERROR_IS_FATAL ANY)
+    string(REGEX MATCHALL " [${letters}] [A-Za-z0-9_.$]+" rows "${table}")
+    list(TRANSFORM rows REPLACE "^ . " "")
+    set(${result} ${rows} PARENT_SCOPE)
+endfunction()
+
+# The loader's name of a library.
+function(soname_of result file)
+    execute_process(COMMAND ${OBJDUMP} -p ${file} OUTPUT_VARIABLE headers COMMAND_ERROR_IS_FATAL ANY)
+    if(NOT headers MATCHES "SONAME +([^\n ]+)")
+        message(FATAL_ERROR "${file} has no name by which programs load it")
+    endif()
+    set(${result} ${CMAKE_MATCH_1} PARENT_SCOPE)
+endfunction()
+
+string(REPLACE "," ";" libraries "${LIBRARIES}")
+names_in(wanted ${PROGRAM} U)
+set(calls "")
+set(functions "")
+set(number 0)
+foreach(library IN LISTS libraries)
+    soname_of(soname ${library})
+    names_in(defined ${library} T)
+    foreach(name IN LISTS defined)
+        set("home_of_${name}" ${soname})
+    endforeach()
+endforeach()
+foreach(name IN LISTS wanted)
+    if(DEFINED "home_of_${name}")
+        string(APPEND calls "    VLSERVICE_LATE_CALL(\"${name}\", ${number})\n")
+        string(APPEND functions "    {\"${name}\", \"${home_of_${name}}\"},\n")
+        math(EXPR number "${number} + 1")
+    endif()
+endforeach()
+if(number EQUAL 0)
+    message(FATAL_ERROR "${PROGRAM} calls nothing of ${LIBRARIES}")
+endif()
+file(WRITE "${OUT}" "#include \"programs/base/late_calls.h\"\n\nBase::LateFunction const Base::LATE_FUNCTIONS[] = {\n${functions}};\n\nasm(VLSERVICE_LATE_CALLS\n${calls});\n")

@@ -1,0 +1,3 @@
+#include "tests/base/late/late_sample.h"
+
+int LateNowhere::anything() { return 0; }
