@@ -4,17 +4,19 @@
 #include "programs/base/marked_folder.h"
 #include "programs/base/plain_text.h"
 #include "programs/base/private_file.h"
-#include "programs/carriers/curl_stop.h"
 
 #include <curl/curl.h>
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <cstring>
 #include <map>
 #include <mutex>
 #include <new>
 #include <sstream>
+#include <sys/socket.h>
+#include <unistd.h>
 #include <utility>
 #include <vector>
 
@@ -23,7 +25,7 @@ namespace {
 
 constexpr long CONNECT_SECONDS = 30;
 /// A connection over which nothing goes for so long is given up.
-constexpr long STILL_SECONDS = 30;
+constexpr std::chrono::seconds STILL_TIME{30};
 constexpr std::string_view SCHEME = "sftp://";
 constexpr std::string_view HOME = "/~/";
 
@@ -60,6 +62,61 @@ std::size_t append(char* bytes, std::size_t size, std::size_t count, void* to) {
     static_cast<std::string*>(to)->append(bytes, size * count);
     return size * count;
 }
+
+/// Gives a transfer up when a stop sign is raised, or when nothing goes over its connection for too long. It
+/// shuts the connection down then: libcurl would say goodbye to a machine that hangs, wait for an answer, and
+/// leave the session in memory when none comes.
+class Watch {
+public:
+    explicit Watch(StopSign stop) : stop_(std::move(stop)) {}
+
+    void over(CURL* handle) {
+        isStill_ = false;
+        sent_ = 0;
+        since_ = Clock::now();
+        curl_easy_setopt(handle, CURLOPT_SOCKOPTFUNCTION, &Watch::onSocket);
+        curl_easy_setopt(handle, CURLOPT_SOCKOPTDATA, this);
+        curl_easy_setopt(handle, CURLOPT_CLOSESOCKETFUNCTION, &Watch::onClose);
+        curl_easy_setopt(handle, CURLOPT_CLOSESOCKETDATA, this);
+        curl_easy_setopt(handle, CURLOPT_NOPROGRESS, 0L);
+        curl_easy_setopt(handle, CURLOPT_XFERINFOFUNCTION, &Watch::onProgress);
+        curl_easy_setopt(handle, CURLOPT_XFERINFODATA, this);
+    }
+    bool wasStill() const { return isStill_; }
+
+private:
+    using Clock = std::chrono::steady_clock;
+
+    static int onSocket(void* self, curl_socket_t socket, curlsocktype) {
+        static_cast<Watch*>(self)->socket_ = socket;
+        return CURL_SOCKOPT_OK;
+    }
+    static int onClose(void* self, curl_socket_t socket) {
+        auto& known = static_cast<Watch*>(self)->socket_;
+        if (known == socket)
+            known = CURL_SOCKET_BAD;
+        return ::close(socket);
+    }
+    /// About once a second, also while nothing comes.
+    static int onProgress(void* self, curl_off_t, curl_off_t, curl_off_t, curl_off_t sent) {
+        return static_cast<Watch*>(self)->isOver(sent) ? 1 : 0;
+    }
+    bool isOver(curl_off_t sent) {
+        if (std::exchange(sent_, sent) != sent)
+            since_ = Clock::now();
+        isStill_ = Clock::now() - since_ >= STILL_TIME;
+        if (!isStill_ && !stop_.isRaised())
+            return false;
+        ::shutdown(socket_, SHUT_RDWR);
+        return true;
+    }
+
+    StopSign stop_;
+    curl_socket_t socket_ = CURL_SOCKET_BAD;
+    curl_off_t sent_ = 0;
+    Clock::time_point since_;
+    bool isStill_ = false;
+};
 
 /// Commands for the other side; one that begins with "*" may fail.
 class Commands {
@@ -101,7 +158,7 @@ std::optional<unsigned long long> roomIn(std::string const& told) {
 class SftpSession::Impl {
 public:
     Impl(SftpTarget target, StopSign stop)
-        : target_(std::move(target)), stop_(std::move(stop)), host_(hostIn(target_.url)),
+        : target_(std::move(target)), watch_(std::move(stop)), host_(hostIn(target_.url)),
           folder_(folderIn(target_.url)) {
         startLibrary();
         handle_ = curl_easy_init();
@@ -180,7 +237,7 @@ private:
         // The library reads the file by its name, and says nothing of whom it is open to.
         Base::readPrivateFile(target_.identityFile);
         failure_.front() = '\0';
-        giveUpWhenRaised(handle_, stop_);
+        watch_.over(handle_);
         set(CURLOPT_ERRORBUFFER, failure_.data());
         set(CURLOPT_NOSIGNAL, 1L);
         set(CURLOPT_PROTOCOLS_STR, "sftp");
@@ -190,8 +247,6 @@ private:
             target_.hostKey.substr(target_.hostKey.find(':') + 1).c_str());
         set(CURLOPT_SSH_PRIVATE_KEYFILE, target_.identityFile.c_str());
         set(CURLOPT_CONNECTTIMEOUT, CONNECT_SECONDS);
-        set(CURLOPT_LOW_SPEED_LIMIT, 1L);
-        set(CURLOPT_LOW_SPEED_TIME, STILL_SECONDS);
     }
 
     template<typename Value>
@@ -203,6 +258,8 @@ private:
     std::string inWords(CURLcode code) const {
         std::string const said =
             Base::plainLine(failure_.front() ? failure_.data() : curl_easy_strerror(code));
+        if (watch_.wasStill())
+            return host_ + " has said nothing for " + std::to_string(STILL_TIME.count()) + " seconds";
         if (code == CURLE_PEER_FAILED_VERIFICATION)
             return host_ + " is not the machine with the \"host_key\" of the settings: " + said;
         if (code == CURLE_LOGIN_DENIED)
@@ -211,7 +268,7 @@ private:
     }
 
     SftpTarget target_;
-    StopSign stop_;
+    Watch watch_;
     std::string host_;
     std::string folder_;
     CURL* handle_ = nullptr;

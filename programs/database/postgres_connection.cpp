@@ -307,6 +307,11 @@ struct PostgresListener::Impl {
             receivers.push_back(std::make_unique<Receiver>(session.connection, name, hear));
     }
 
+    /// A receiver that signs off makes the connection tell what came meanwhile, to whoever listens still.
+    ~Impl() {
+        hear = [](std::string const&, std::string const&) {};
+    }
+
     Hear hear;
     PostgresSession session;
     std::vector<std::unique_ptr<Receiver>> receivers;

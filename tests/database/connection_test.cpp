@@ -276,6 +276,23 @@ TEST_F(PostgresConnectionTest, HearsWhatOthersTell) {
     EXPECT_THAT(heard, ElementsAre("one1", "two2"));
 }
 
+TEST_F(PostgresConnectionTest, TellsNothingMoreToAListenerThatGoes) {
+    Database::PostgresConnection connection(database_.address());
+    std::vector<std::string> heard;
+    {
+        Database::PostgresListener listener(database_.address(), {"one", "two"},
+                                            [&](std::string const& channel, std::string const& payload) {
+                                                heard.push_back(channel + payload);
+                                            });
+        connection.run("SELECT pg_notify('one', '1'); SELECT pg_notify('two', '2')");
+        struct pollfd at {
+            listener.descriptor(), POLLIN, 0
+        };
+        ASSERT_GT(::poll(&at, 1, 10'000), 0);
+    }
+    EXPECT_THAT(heard, ElementsAre());
+}
+
 TEST_F(PostgresConnectionTest, MakesASchemaOnceAndBringsItUpToDate) {
     Database::PostgresConnection connection(database_.address());
     auto const first = kind({"CREATE TABLE a (id INTEGER NOT NULL PRIMARY KEY, t TEXT) WITHOUT ROWID;"});
