@@ -61,9 +61,11 @@ SharedMemBuffer bufferIn(SQLite::Column const& column) {
     return SharedMemBuffer::copyOf(data, static_cast<unsigned long long>(column.getBytes()));
 }
 
-PackInfo infoIn(SQLite::Database& database, fs::path const& file, std::string const& packId) {
-    SQLite::Statement query(database, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = 1");
+PackInfo infoIn(SQLite::Database& database, fs::path const& file, std::string const& packId,
+                bool isFinished = true) {
+    SQLite::Statement query(database, "SELECT id, cfg_id, title FROM packs WHERE id = ? AND complete = ?");
     query.bind(1, packId);
+    query.bind(2, isFinished ? 1 : 0);
     if (!query.executeStep())
         throw Database::DatabaseError(Base::Code::MailingUnknown, "the pack database " + file.string() +
                                                                       " has no finished pack " + packId);
@@ -123,7 +125,7 @@ PackDatabaseWriter::~PackDatabaseWriter() {
     if (finished_)
         return;
     try {
-        eraseUnfinished();
+        drop();
     } catch (std::exception const&) {
         // It stays unfinished, and whoever opens the database a day later erases it.
     }
@@ -182,23 +184,50 @@ void PackDatabaseWriter::insertBatch() {
     batchBytes_ = 0;
 }
 
+void PackDatabaseWriter::insertMetadata(SharedMemBuffer const& metadata) {
+    SQLite::Statement change(database_, "UPDATE packs SET metadata = ? WHERE id = ?");
+    change.bindNoCopy(1, metadata.data(), static_cast<int>(metadata.size()));
+    change.bindNoCopy(2, savedPackId());
+    change.exec();
+}
+
+void PackDatabaseWriter::markFinished() {
+    SQLite::Statement change(database_, "UPDATE packs SET complete = 1 WHERE id = ?");
+    change.bindNoCopy(1, savedPackId());
+    change.exec();
+}
+
 void PackDatabaseWriter::finish(SharedMemBuffer metadata) {
     orDatabaseError(file_, [&] {
         SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
         insertBatch();
-        SQLite::Statement change(database_, "UPDATE packs SET metadata = ?, complete = 1 WHERE id = ?");
-        change.bindNoCopy(1, metadata.data(), static_cast<int>(metadata.size()));
-        change.bindNoCopy(2, savedPackId());
-        change.exec();
+        insertMetadata(metadata);
+        markFinished();
         transaction.commit();
         finished_ = true;
     });
 }
 
-void PackDatabaseWriter::eraseUnfinished() {
-    SQLite::Statement deletion(database_, "DELETE FROM packs WHERE id = ? AND complete = 0");
-    deletion.bind(1, savedPackId());
-    deletion.exec();
+void PackDatabaseWriter::store(SharedMemBuffer const& metadata) {
+    orDatabaseError(file_, [&] {
+        SQLite::Transaction transaction(database_, SQLite::TransactionBehavior::IMMEDIATE);
+        insertBatch();
+        insertMetadata(metadata);
+        transaction.commit();
+    });
+}
+
+void PackDatabaseWriter::finish() {
+    orDatabaseError(file_, [&] { markFinished(); });
+    finished_ = true;
+}
+
+void PackDatabaseWriter::drop() {
+    orDatabaseError(file_, [&] {
+        SQLite::Statement deletion(database_, "DELETE FROM packs WHERE id = ? AND complete = 0");
+        deletion.bindNoCopy(1, savedPackId());
+        deletion.exec();
+    });
 }
 
 PackDatabaseReader::PackDatabaseReader(fs::path const& file, std::string const& packId)
@@ -217,11 +246,11 @@ SharedMemBuffer PackDatabaseReader::metadata() {
     return orDatabaseError(file_.path(), [&] { return metadataIn(file_.begin(), packId()); });
 }
 
-OwnPackReader::OwnPackReader(fs::path const& file, std::string const& packId)
+OwnPackReader::OwnPackReader(fs::path const& file, std::string const& packId, Sees sees)
     : PackSource(packId), file_(file),
       database_(Database::openDatabase(file, packDatabase(), Database::Journal::Rollback)) {
     orDatabaseError(file, [&] {
-        info_ = infoIn(database_, file, packId);
+        info_ = infoIn(database_, file, packId, sees == Sees::Finished);
         pages_ = namesIn(database_, packId);
     });
 }

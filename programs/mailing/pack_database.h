@@ -41,6 +41,14 @@ public:
     /// From here on readers see the pack, also after a crash or a power failure.
     void finish(SharedMemBuffer metadata);
 
+    // The same in two steps, for who looks at the whole pack in between.
+
+    /// The pack is whole, and for readers of unfinished packs alone.
+    void store(SharedMemBuffer const& metadata);
+    void finish();
+    /// Erases what was stored, in place of finishing it.
+    void drop();
+
 private:
     struct Page {
         std::string document;
@@ -49,9 +57,10 @@ private:
     };
 
     void begin(PackInfo const& pack);
-    /// Within a transaction.
+    // Within a transaction.
     void insertBatch();
-    void eraseUnfinished();
+    void insertMetadata(SharedMemBuffer const& metadata);
+    void markFinished();
 
     std::filesystem::path file_;
     SQLite::Database database_;
@@ -84,8 +93,10 @@ private:
 /// The same of a database of the user's own, in which others may store packs meanwhile.
 class OwnPackReader : public PackSource {
 public:
-    /// Throws Database::DatabaseError when there is no such finished pack.
-    OwnPackReader(std::filesystem::path const& file, std::string const& packId);
+    enum class Sees { Finished, Unfinished };
+
+    /// Throws Database::DatabaseError when there is no such pack.
+    OwnPackReader(std::filesystem::path const& file, std::string const& packId, Sees sees = Sees::Finished);
 
     PackInfo const& info() const override { return info_; }
     std::vector<PageName> const& pages() const override { return pages_; }

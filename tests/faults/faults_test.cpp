@@ -1,10 +1,12 @@
 // Each command of vlmail, and vlserviced with one job, while their calls fail, one after the other.
 // scripts/torture goes through all of them.
+#include "programs/mailing/pack_database.h"
 #include "programs/vlmail/commands/command.h"
 #include "tests/faults/asked_command.h"
 #include "tests/faults/one_job.h"
 #include "tests/faults/scenario.h"
 #include "tests/faults/sent_mail.h"
+#include "tests/faults/service_at_hand.h"
 #include "tests/support/sanitized.h"
 
 #include <gmock/gmock.h>
@@ -96,6 +98,30 @@ TEST_P(MailThatIsSent, IsNotLostAndNotDoubledWhenItsCallsFail) {
 
 INSTANTIATE_TEST_SUITE_P(OfAKind, MailThatIsSent, testing::ValuesIn(CALLS),
                          [](auto const& each) { return each.param; });
+
+/// The same letters again, when what was left of them could not be sent: both packs could be sent then.
+TEST(MailThatIsSentAgain, LeavesNoSecondPackOfTheSameLettersWhereverItIsKilled) {
+    ServiceAtHand const service;
+    std::vector<std::string> const mail{"mail", "letter.txt", "--send", "--node", "a=acme", "--jobs", "1"};
+    auto const left = [&] {
+        std::vector<std::string> ids;
+        for (Mailing::StoredPack const& pack : Mailing::finishedPacks(service.packDatabase()))
+            ids.push_back(pack.info.id);
+        return ids;
+    };
+    service.vlmail({"settings", "service", R"(disabled=["a=acme"])"});
+    EXPECT_EQ(service.vlmail(mail).status, 1);
+    std::vector<std::string> const first = left();
+    ASSERT_EQ(first.size(), 1u);
+    Fault killed{"sync", 0, 1};
+    for (bool isKilled = true; isKilled && !testing::Test::HasFailure(); ++killed.number) {
+        isKilled = service.vlmail(mail, killed).status < 0;
+        EXPECT_EQ(left(), first) << killed.text();
+    }
+    EXPECT_GT(killed.number, 5);
+    service.vlmail({"settings", "service", "disabled="});
+    EXPECT_THAT(service.vlmail(mail).out, testing::HasSubstr(first.front() + ", "));
+}
 
 /// The names of the commands that do something, as they are typed.
 void leavesOf(Base::CommandInfo const& command, std::string const& before, std::set<std::string>& names) {

@@ -32,7 +32,7 @@ protected:
         writer.savePage("two.pdf", "1", zipped("page three"));
         writer.finish(zipped("metadata"));
     }
-    std::string page(PackDatabaseReader& reader, std::string const& document, std::string const& name) {
+    std::string page(Mailing::PackSource& reader, std::string const& document, std::string const& name) {
         std::string result = "not called";
         reader.requestPageData(document, name, [&](SharedMemBuffer const& data) { result = text(data); });
         return result;
@@ -93,6 +93,32 @@ TEST_F(PackDatabase, ShowsAPackOnlyWhenItIsFinished) {
     writer.finish(zipped(""));
     EXPECT_EQ(readingFailure("p1"), "nothing was thrown");
     EXPECT_EQ(readingFailure("p2"), noSuchPack("p2"));
+}
+
+TEST_F(PackDatabase, ShowsAStoredPackToWhoLooksForUnfinishedOnesUntilItIsFinished) {
+    using Sees = Mailing::OwnPackReader::Sees;
+    PackDatabaseWriter writer(file_, {"p1", "", ""});
+    writer.savePage("one.pdf", "1", zipped("page"));
+    writer.store(zipped("metadata"));
+    EXPECT_EQ(readingFailure("p1"), noSuchPack("p1"));
+    {
+        Mailing::OwnPackReader reader(file_, "p1", Sees::Unfinished);
+        EXPECT_EQ(page(reader, "one.pdf", "1"), "page");
+        EXPECT_EQ(text(reader.metadata()), "metadata");
+    }
+    writer.finish();
+    EXPECT_EQ(readingFailure("p1"), "nothing was thrown");
+    EXPECT_THROW(Mailing::OwnPackReader(file_, "p1", Sees::Unfinished), Database::DatabaseError);
+}
+
+TEST_F(PackDatabase, LeavesNothingOfAPackThatIsDropped) {
+    PackDatabaseWriter writer(file_, {"p1", "", ""});
+    writer.savePage("one.pdf", "1", zipped("page"));
+    writer.store(zipped("metadata"));
+    writer.drop();
+    SQLite::Database database(file_);
+    EXPECT_EQ(database.execAndGet("SELECT count(*) FROM packs").getInt(), 0);
+    EXPECT_EQ(database.execAndGet("SELECT count(*) FROM pages").getInt(), 0);
 }
 
 TEST_F(PackDatabase, LeavesNothingOfAPackThatWasNotFinished) {

@@ -52,8 +52,8 @@ public:
     MailingBuilder& builder() override { return builder_; }
 
     void finish() override {
-        pack_.finish(builder_.finish().toBlob());
-        goOnWithWhatWasLeftBehind();
+        pack_.store(builder_.finish().toBlob());
+        finishPack();
         try {
             deliver();
         } catch (NothingToSend const&) {
@@ -75,12 +75,13 @@ private:
         state_ = Protocol::stateName(deliverPack(service_, database_, id_, upload_, {}, noteLeftOut).state);
     }
 
-    /// The same letters under the id that the service may know already, so that none goes out twice.
-    void goOnWithWhatWasLeftBehind() {
+    /// What an earlier run has left of the same letters goes in its place, under the id that the service may
+    /// know already. Of two packs with them each could be sent, so that there is never a second one.
+    void finishPack() {
         std::optional<std::string> const left = samePackLeftBehind(database_, id_);
         if (!left)
-            return;
-        Mailing::removePack(database_, id_);
+            return pack_.finish();
+        pack_.drop();
         id_ = *left;
     }
 

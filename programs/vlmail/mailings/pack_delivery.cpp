@@ -136,10 +136,8 @@ Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack,
 }
 
 std::optional<std::string> samePackLeftBehind(fs::path const& database, std::string const& packId) {
-    Mailing::OwnPackReader pack(database, packId);
+    Mailing::OwnPackReader pack(database, packId, Mailing::OwnPackReader::Sees::Unfinished);
     for (Mailing::StoredPack const& other : Mailing::finishedPacks(database)) {
-        if (other.info.id == packId)
-            continue;
         Mailing::OwnPackReader left(database, other.info.id);
         if (isSame(left, pack))
             return other.info.id;

@@ -28,8 +28,8 @@ Protocol::JobReport deliverPack(ServiceLine& service, std::filesystem::path cons
 Protocol::JobReport deliverPack(ServiceLine& service, Mailing::PackSource& pack, bool upload,
                                 UploadWatcher const& watcher = {}, LeftOutWatcher const& leftOut = {});
 
-/// The id of another finished pack of the database that says the same in the same pages, for the same node:
-/// what is left of a sending that was not finished. Throws Error.
+/// The id of a finished pack of the database that says the same in the same pages, for the same node, as one
+/// that is whole and not finished: what is left of an earlier sending that was not finished. Throws Error.
 std::optional<std::string> samePackLeftBehind(std::filesystem::path const& database,
                                               std::string const& packId);
 
