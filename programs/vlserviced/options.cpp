@@ -85,7 +85,8 @@ void requireOwnDatabase(Options const& options) {
         throw Base::UsageError(
             "restore makes the database of a data folder; --migrate-to takes that to PostgreSQL");
     if (!options.migrateTo.empty() && (options.task != Task::Serve || !options.database.empty()))
-        throw Base::UsageError("--migrate-to goes with the data folder alone");
+        throw Base::UsageError(
+            "--migrate-to moves the data folder's own database: leave --database out until that is done");
 }
 
 } // namespace

@@ -326,9 +326,11 @@ TEST_F(RestoredService, IsMadeInADataFolderAlone) {
         restored({"--database", "postgresql:///x"}),
         "1 vlserviced: restore makes the database of a data folder; --migrate-to takes that to PostgreSQL; "
         "--help explains [usage]\n");
-    EXPECT_EQ(carriedOut({"--migrate-to", "postgresql:///x", "--database", "postgresql:///x", "--data",
-                          data_.string()}),
-              "1 vlserviced: --migrate-to goes with the data folder alone; --help explains [usage]\n");
+    EXPECT_EQ(
+        carriedOut(
+            {"--migrate-to", "postgresql:///x", "--database", "postgresql:///x", "--data", data_.string()}),
+        "1 vlserviced: --migrate-to moves the data folder's own database: leave --database out until that is "
+        "done; --help explains [usage]\n");
 }
 
 TEST_F(ServiceProcessTest, TakesAFreePortOfItsOwnOrTheOneItIsGiven) {

@@ -139,6 +139,25 @@ void requireNotMoved(DataFolder const& data) {
                               " is what was moved)");
 }
 
+void requireMoved(DataFolder const& data, std::string const& address) {
+    if (fs::exists(data.database()))
+        throw Base::Error(Base::Code::DatabaseUnusable,
+                          "all that this service knows is in " + data.database().string() +
+                              ": move it by --migrate-to in place of --database, or remove the file where "
+                              "nothing of it is wanted");
+    if (!fs::exists(movedNameOf(data.database())))
+        return;
+    Database::requirePostgresAddress(address);
+    Database::PostgresConnection target(address);
+    if (target.number("SELECT count(*) FROM pg_tables WHERE schemaname = current_schema() AND tablename = "
+                      "'jobs'") == 0)
+        throw Base::Error(Base::Code::DatabaseUnusable,
+                          "the database " + Database::shownPostgresAddress(address) +
+                              " has no tables, and the one of " + data.path().string() +
+                              " was moved: name the one that it was moved to, or give the files "
+                              "service.db.moved and packs.db.moved their former names and move them again");
+}
+
 void copyFromPostgres(std::string const& address, fs::path const& database, fs::path const& packs) {
     Database::requirePostgresAddress(address);
     Database::PostgresConnection source(address);

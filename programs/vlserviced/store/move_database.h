@@ -23,6 +23,10 @@ MovedRecord moveToPostgres(DataFolder const& data, std::string const& address);
 /// Throws Error when the database of the folder was moved away.
 void requireNotMoved(DataFolder const& data);
 
+/// Throws Error when the folder has a database of its own, which would be left behind by a service that uses
+/// that one, and when that one has nothing although the folder's was to be moved there.
+void requireMoved(DataFolder const& data, std::string const& address);
+
 /// Copies what services keep in a PostgreSQL database, as it is at one moment, into new files. Throws
 /// std::exception.
 void copyFromPostgres(std::string const& address, std::filesystem::path const& database,

@@ -74,6 +74,25 @@ TEST_F(MoveDatabaseTest, HasAllRowsThereAndLeavesFilesThatNobodyStartsOn) {
     EXPECT_EQ(failure(), moved);
 }
 
+TEST_F(MoveDatabaseTest, HasToComeBeforeAServiceUsesTheOtherDatabase) {
+    EXPECT_EQ(
+        failureOf([&] { VlServiced::requireMoved(*folder_, postgres_.address()); }),
+        "all that this service knows is in " + (data_ / "service.db").string() +
+            ": move it by --migrate-to in place of --database, or remove the file where nothing of it is "
+            "wanted");
+    VlServiced::moveToPostgres(*folder_, postgres_.address());
+    EXPECT_EQ(failureOf([&] { VlServiced::requireMoved(*folder_, postgres_.address()); }),
+              "nothing was thrown");
+    VLServiceTest::PostgresDatabase const other;
+    EXPECT_EQ(failureOf([&] { VlServiced::requireMoved(*folder_, other.address()); }),
+              "the database " + Database::shownPostgresAddress(other.address()) +
+                  " has no tables, and the one of " + data_.string() +
+                  " was moved: name the one that it was moved to, or give the files service.db.moved and "
+                  "packs.db.moved their former names and move them again");
+    VlServiced::DataFolder const fresh(temporary_ / "fresh");
+    EXPECT_EQ(failureOf([&] { VlServiced::requireMoved(fresh, other.address()); }), "nothing was thrown");
+}
+
 TEST_F(MoveDatabaseTest, IsRefusedWhereTheTargetHoldsAnything) {
     {
         auto const shared = VlServiced::openSharedDatabase(postgres_.address());
