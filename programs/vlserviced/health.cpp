@@ -109,6 +109,26 @@ HealthCheck certificateCheck(std::optional<long long> const& ends, long long now
             "put a new one under the names given with --certificate and --key, and start the service again"};
 }
 
+/// Another secret makes all letters new ones; what is past is no harm but room that is lost.
+HealthCheck registerCheck(HealthSources const& sources, long long now) {
+    constexpr char const* NAME = "sent letters";
+    return looked(NAME, "see that the database answers; until then no mailing is accepted", [&] {
+        RegisterState const state = sources.letterRegister();
+        if (!state.hasItsSecret)
+            return HealthCheck(NAME, HealthState::Bad,
+                               "the database has another secret: letters that were sent are not known again",
+                               "start the service again, as the database was changed under it");
+        if (!state.nextEnd)
+            return HealthCheck::well(NAME, "none are known");
+        if (*state.nextEnd > now - DAY)
+            return HealthCheck::well(NAME,
+                                     "are known again, the next until " + LocalTime::toText(*state.nextEnd));
+        return HealthCheck(NAME, HealthState::Doubtful,
+                           "some should have been forgotten by " + LocalTime::toText(*state.nextEnd),
+                           "the log says why they cannot be removed; the service looks each hour");
+    });
+}
+
 HealthCheck discoveryCheck(bool isAnswered) {
     if (isAnswered)
         return HealthCheck::well("discovery", "the service answers clients that look for it");
@@ -127,7 +147,8 @@ Protocol::HealthAnswer healthOf(HealthSources const& sources) {
                      uploadFolderCheck(sources, settings),
                      suspensionCheck(settings),
                      certificateCheck(sources.certificateEnds, answer.now),
-                     discoveryCheck(sources.answersDiscovery)};
+                     discoveryCheck(sources.answersDiscovery),
+                     registerCheck(sources, answer.now)};
     for (Protocol::CarrierReport const& carrier : sources.carriers().carriers)
         answer.checks.push_back(carrierCheck(carrier));
     return answer;

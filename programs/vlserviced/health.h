@@ -13,6 +13,13 @@
 
 namespace VlServiced {
 
+/// Of the letters that were sent.
+struct RegisterState {
+    bool hasItsSecret = true;
+    /// When the next of them are past, or were; nothing when there are none.
+    std::optional<long long> nextEnd = {};
+};
+
 struct HealthSources {
     /// Begins a change and takes it back. Throws std::exception when none can be made.
     std::function<void()> tryDatabase;
@@ -26,6 +33,8 @@ struct HealthSources {
     std::optional<long long> certificateEnds;
     bool answersDiscovery = false;
     std::function<long long()> now;
+    /// Throws std::exception when the database does not tell.
+    std::function<RegisterState()> letterRegister = [] { return RegisterState(); };
 };
 
 /// Throws nothing of what it looks at: what cannot be had is told as bad.

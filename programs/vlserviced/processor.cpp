@@ -210,9 +210,7 @@ std::vector<Processor::Question> const& Processor::answerers() {
          }},
         {RegisterQuery::KIND,
          [](Processor& self, json::Object const& question) {
-             return knownLetters(RegisterQuery(question), self.around_.letterRegister, self.around_.jobs,
-                                 self.around_.letters.store(), self.around_.now(), self.by_)
-                 .serialize();
+             return self.knownIn(RegisterQuery(question)).serialize();
          }},
         {BeginPack::KIND, nullptr},
     };
@@ -264,6 +262,14 @@ Protocol::HistoryAnswer Processor::historyOf(Protocol::HistoryQuery const& query
         around_.access.require(Policy::Role::Admin, *query.id, by_);
     Protocol::HistoryAnswer answer;
     answer.entries = around_.history.of(query.id.value_or(by_.node), query.limit);
+    return answer;
+}
+
+Protocol::RegisterAnswer Processor::knownIn(Protocol::RegisterQuery const& query) const {
+    Protocol::RegisterAnswer answer = knownLetters(query, around_.letterRegister, around_.jobs,
+                                                   around_.letters.store(), around_.now(), by_);
+    if (measures_)
+        measures_->noteSentBefore(LeftOut::Told, answer.letters.size());
     return answer;
 }
 

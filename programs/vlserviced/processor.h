@@ -3,6 +3,7 @@
 
 #include "programs/protocol/delivery_report.h"
 #include "programs/protocol/health.h"
+#include "programs/protocol/letter_register.h"
 #include "programs/vlserviced/access.h"
 #include "programs/vlserviced/jobs/job_runner.h"
 #include "programs/vlserviced/jobs/letter_runner.h"
@@ -97,6 +98,7 @@ private:
     json::Object changeCarrier(Protocol::CarrierChange const& change);
     Protocol::JobsAnswer listed(Protocol::JobsQuery const& query) const;
     Protocol::HistoryAnswer historyOf(Protocol::HistoryQuery const& query);
+    Protocol::RegisterAnswer knownIn(Protocol::RegisterQuery const& query) const;
     void requireJob(std::string const& packId) const;
     void testCarrier(std::string const& channel, Ipc::CSConfigIdsList& cmd);
     json::Object serviceOverview() const;

@@ -89,8 +89,10 @@ Holder newHolder(Options const& options) {
 }
 
 SharedDatabase openDatabase(Options const& options, DataFolder const& data) {
-    if (!options.database.empty())
+    if (!options.database.empty()) {
+        requireMoved(data, options.database);
         return openSharedDatabase(options.database);
+    }
     requireNotMoved(data);
     return {openServiceDatabase(data.database()), true};
 }
@@ -665,7 +667,10 @@ private:
                 history_,
                 took_,
                 &letterRegister_,
-                [this](std::string const& packId) { packs_.drop(packId); }};
+                [this](std::string const& packId, std::size_t letters) {
+                    measures_.noteSentBefore(LeftOut::Refused, letters);
+                    packs_.drop(packId);
+                }};
     }
 
     LetterSurroundings letterSurroundings() {
@@ -716,7 +721,10 @@ private:
                 [this] { return letterRunner_.list(); },
                 server_->certificateEnds(),
                 discovery_.has_value(),
-                &now};
+                &now,
+                [this] {
+                    return RegisterState{letterRegister_.hasItsSecret(), letterRegister_.nextEnd()};
+                }};
     }
 
     Measures measures_;

@@ -57,7 +57,7 @@ TEST_F(HealthTest, TellsTheTimeAndThatAllIsWell) {
     settings_ = {{"upload_folder", folder_.path().string()}};
     Protocol::HealthAnswer const answer(VlServiced::healthOf(sources_).serialize());
     EXPECT_EQ(answer.now, NOW);
-    EXPECT_EQ(answer.checks.size(), 7u);
+    EXPECT_EQ(answer.checks.size(), 8u);
     for (HealthCheck const& check : answer.checks)
         EXPECT_EQ(check.state, Protocol::HealthState::Well) << check.name << ": " << check.says;
 }
@@ -147,6 +147,24 @@ TEST_F(HealthTest, TellsWhetherDiscoveryIsAnswered) {
 TEST(HealthChecks, AreDoubtfulInAStateThatIsNotKnown) {
     HealthCheck const check(json::Object{{"name", "x"}, {"state", "feverish"}, {"says", "y"}});
     EXPECT_EQ(check.state, Protocol::HealthState::Doubtful);
+}
+
+TEST_F(HealthTest, TellsOfTheLettersThatWereSent) {
+    EXPECT_EQ(told("sent letters"), "well: none are known");
+    VlServiced::RegisterState state{true, NOW - DAY_SECONDS + 1};
+    sources_.letterRegister = [&] { return state; };
+    EXPECT_EQ(told("sent letters"), "well: are known again, the next until 2026/11/17 11:06:41");
+    state.nextEnd = NOW - DAY_SECONDS;
+    EXPECT_EQ(told("sent letters"),
+              "doubtful: some should have been forgotten by 2026/11/17 11:06:40 | the log says "
+              "why they cannot be removed; the service looks each hour");
+    state.hasItsSecret = false;
+    EXPECT_EQ(told("sent letters"),
+              "bad: the database has another secret: letters that were sent are not known again | start the "
+              "service again, as the database was changed under it");
+    sources_.letterRegister = []() -> VlServiced::RegisterState { throw std::runtime_error("gone"); };
+    EXPECT_EQ(told("sent letters"),
+              "bad: gone | see that the database answers; until then no mailing is accepted");
 }
 
 } // namespace

@@ -87,8 +87,9 @@ void enterLetters(LetterRegister& letterRegister, Job const& job, PackSummary co
         {job.pack.packId, job.cfgId, job.acceptedAt, job.acceptedAt + days * DAY}, summary.digests, known);
     if (!refused.empty())
         throw SentBefore(numbersInWords(refused) + " of pack " + job.pack.packId +
-                         " went out before: send the others without them, or all of them with \"--again "
-                         "REASON\"");
+                             " went out before: send the others without them, or all of them with \"--again "
+                             "REASON\"",
+                         refused.size());
 }
 
 Job jobFor(PackLocation const& pack, PackSummary const& summary, Policy::Moment const& moment) {

@@ -39,7 +39,14 @@ void requireAllowed(std::string const& packId, PackSummary const& summary, Polic
 /// Why a pack is not taken of which letters went out before.
 class SentBefore : public Base::Error {
 public:
-    explicit SentBefore(std::string const& says) : Error(Base::Code::SentBefore, says) {}
+    SentBefore(std::string const& says, std::size_t letters)
+        : Error(Base::Code::SentBefore, says), letters_(letters) {}
+
+    /// How many.
+    std::size_t letters() const { return letters_; }
+
+private:
+    std::size_t letters_;
 };
 
 /// Enters its letters in the register, for as long as its pack preset says; a trial run sends none. Within

@@ -274,8 +274,8 @@ void JobRunner::enter(Job const& job, PackSummary const& summary) {
                                         inHistory(job) + (summary.again.empty() ? "" : ", again: ") +
                                             summary.again);
         });
-    } catch (SentBefore const&) {
-        surroundings_.refusedLetters(job.pack.packId);
+    } catch (SentBefore const& refused) {
+        surroundings_.refusedLetters(job.pack.packId, refused.letters());
         throw;
     }
 }

@@ -67,7 +67,8 @@ struct JobSurroundings {
     /// Letters that went out are in it; null where nobody looks.
     LetterRegister* letterRegister = nullptr;
     /// Told that a pack is not taken as it is: of the same id it comes with other letters, if at all.
-    std::function<void(std::string const& packId)> refusedLetters = [](std::string const&) {};
+    std::function<void(std::string const& packId, std::size_t letters)> refusedLetters =
+        [](std::string const&, std::size_t) {};
 };
 
 /// Every step is put on record before and after it, so that a job goes on where it was, whatever ended the

@@ -24,6 +24,8 @@ char const* nameOf(Refusal reason) {
     return "request";
 }
 
+char const* nameOf(LeftOut which) { return which == LeftOut::Told ? "told" : "refused"; }
+
 Family<Histogram>& times(prometheus::Registry& registry, char const* name, char const* help) {
     return prometheus::BuildHistogram().Name(name).Help(help).Register(registry);
 }
@@ -42,12 +44,16 @@ Measures::Measures()
       database_(times(registry_, "vlserviced_database_seconds",
                       "How long the service's thread waited for the database.")),
       letters_(counts(registry_, "vlserviced_letters",
-                      "What became of letters that were handed over to carriers.")) {
+                      "What became of letters that were handed over to carriers.")),
+      sentBefore_(counts(registry_, "vlserviced_letters_sent_before",
+                         "Letters that were not accepted since they went out before.")) {
     // What has not happened yet is 0, and not missing.
     for (Step const step : ALL_STEPS)
         steps_.Add({{"step", stepName(step)}}, STEP_BOUNDS);
     for (Refusal const reason : {Refusal::Token, Refusal::Rights, Refusal::Request})
         refusals_.Add({{"reason", nameOf(reason)}});
+    for (LeftOut const which : {LeftOut::Told, LeftOut::Refused})
+        sentBefore_.Add({{"outcome", nameOf(which)}});
 }
 
 void Measures::noteStep(Step step, Duration took) {
@@ -67,6 +73,10 @@ void Measures::noteDatabase(char const* operation, Duration took) {
 void Measures::noteLetters(std::string const& channel, Protocol::LetterState outcome, std::size_t count) {
     letters_.Add({{"channel", channel}, {"outcome", Protocol::letterStateName(outcome)}})
         .Increment(static_cast<double>(count));
+}
+
+void Measures::noteSentBefore(LeftOut which, std::size_t count) {
+    sentBefore_.Add({{"outcome", nameOf(which)}}).Increment(static_cast<double>(count));
 }
 
 } // namespace VlServiced

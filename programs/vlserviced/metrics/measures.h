@@ -26,6 +26,14 @@ enum class Refusal {
     Request,
 };
 
+/// What came of letters that were sent before.
+enum class LeftOut {
+    /// A client that asked was told, and leaves them out.
+    Told,
+    /// Their mailing was not accepted.
+    Refused,
+};
+
 /// May be used by any thread.
 class Measures {
 public:
@@ -42,6 +50,8 @@ public:
     /// What became of letters that were handed over, or were to be.
     void noteLetters(std::string const& channel, Protocol::LetterState outcome, std::size_t count);
 
+    void noteSentBefore(LeftOut which, std::size_t count);
+
     std::vector<prometheus::MetricFamily> collect() const { return registry_.Collect(); }
 
 private:
@@ -51,6 +61,7 @@ private:
     prometheus::Family<prometheus::Counter>& refusals_;
     prometheus::Family<prometheus::Histogram>& database_;
     prometheus::Family<prometheus::Counter>& letters_;
+    prometheus::Family<prometheus::Counter>& sentBefore_;
 };
 
 } // namespace VlServiced

@@ -1,6 +1,7 @@
 #include "programs/vlserviced/metrics/metrics_page.h"
 
 #include "programs/vlserviced/metrics/open_metrics.h"
+#include "programs/vlserviced/store/letter_register.h"
 #include "programs/vlserviced/store/letter_store.h"
 
 #include <exception>
@@ -91,6 +92,7 @@ void MetricsPage::addStored(Families& families, std::vector<std::string> const& 
             database_ = sources_.openDatabase();
         addJobs(stored);
         addLetters(stored, channels);
+        addRegister(stored);
     } catch (std::bad_alloc const&) {
         throw;
     } catch (std::exception const&) {
@@ -138,6 +140,20 @@ void MetricsPage::addLetters(Families& families, std::vector<std::string> const&
     }
     for (Gauges* const gauges : {&waiting, &uncertain, &paused, &failures})
         gauges->into(families);
+}
+
+/// Counting millions takes its time, of which it gets a small part.
+void MetricsPage::addRegister(Families& families) {
+    constexpr int PART_OF_THE_TIME = 100;
+    auto const begin = std::chrono::steady_clock::now();
+    if (!countAt_ || *countAt_ <= begin) {
+        registered_ = registeredLetters(*database_, sources_.now());
+        auto const end = std::chrono::steady_clock::now();
+        countAt_ = end + PART_OF_THE_TIME * (end - begin);
+    }
+    Gauges("vlserviced_letters_registered", "Letters that are known again, each as often as it went out.")
+        .add({}, registered_)
+        .into(families);
 }
 
 void MetricsPage::addMoment(Families& families, Moment const& moment) const {

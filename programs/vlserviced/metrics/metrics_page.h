@@ -57,6 +57,7 @@ private:
     Families families();
     void addJobs(Families& families);
     void addLetters(Families& families, std::vector<std::string> const& channels);
+    void addRegister(Families& families);
     void addStored(Families& families, std::vector<std::string> const& channels);
     void addMoment(Families& families, Moment const& moment) const;
     void addDisks(Families& families) const;
@@ -65,6 +66,9 @@ private:
     PageSources sources_;
     long long startedAt_;
     std::unique_ptr<Database::Connection> database_;
+    long long registered_ = 0;
+    /// When it may be counted again.
+    std::optional<std::chrono::steady_clock::time_point> countAt_;
     std::string text_;
     std::optional<std::chrono::steady_clock::time_point> madeAt_;
 };

@@ -46,6 +46,10 @@ std::set<std::string> lettersIn(Database::Rows rows) {
 
 } // namespace
 
+long long registeredLetters(Database::Connection& database, long long now) {
+    return database.number("SELECT count(*) FROM registered_letters WHERE is_free = 0 AND ends_at > $1", now);
+}
+
 LetterRegister::LetterRegister(Database::Connection& database)
     : database_(database), secret_(Base::fromHex(secretOf(database)).value_or("")) {}
 
@@ -172,6 +176,17 @@ bool LetterRegister::removeSome(long long now) {
         database_.change("DELETE FROM registered_mailings WHERE id = $1", id);
     transaction.commit();
     return true;
+}
+
+bool LetterRegister::hasItsSecret() const {
+    std::string const anyDigest;
+    return Channel::hmac(Base::fromHex(secretIn(database_)).value_or(""), anyDigest) ==
+           secret_.codeOf(anyDigest);
+}
+
+std::optional<long long> LetterRegister::nextEnd() const {
+    Database::Rows next = database_.query("SELECT ends_at FROM registered_mailings ORDER BY ends_at LIMIT 1");
+    return next.next() ? std::optional(next.number(0)) : std::nullopt;
 }
 
 } // namespace VlServiced

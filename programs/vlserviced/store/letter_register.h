@@ -6,6 +6,7 @@
 #include "programs/mailing/mailing_outline.h"
 
 #include <cstddef>
+#include <optional>
 #include <set>
 #include <string>
 #include <utility>
@@ -30,6 +31,10 @@ struct RegisteredLetter {
     long long number = 0;
 };
 
+/// How many letters would be known again at that time, each as often as it went out. Costs what the register
+/// is large.
+long long registeredLetters(Database::Connection& database, long long now);
+
 /// A letter stands there under an HMAC-SHA-256 of its digest, by a secret that the database keeps. Letters
 /// and mailings that fail or are called back free it, in the transaction that notes that.
 class LetterRegister {
@@ -48,6 +53,11 @@ public:
 
     /// Removes some of what is past; false when nothing is left.
     bool removeSome(long long now);
+
+    /// Whether the database has the secret still that letters are entered and looked for by.
+    bool hasItsSecret() const;
+    /// When the next mailing's letters are past, or were; nothing when there is none.
+    std::optional<long long> nextEnd() const;
 
 private:
     /// Keys with their letters' numbers.

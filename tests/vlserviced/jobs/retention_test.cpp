@@ -1,5 +1,6 @@
 #include "programs/vlserviced/jobs/retention.h"
 
+#include "programs/base/digest.h"
 #include "programs/vlserviced/jobs/hand_over.h"
 #include "programs/vlserviced/store/schema.h"
 #include "tests/support/temporary_folder.h"
@@ -169,6 +170,31 @@ TEST_F(RetentionTest, LeavesNoByteOfAJobInDatabaseAndLog) {
     EXPECT_EQ(left().size(), 0u);
     EXPECT_THAT(allBytes(), Not(HasSubstr("Secret")));
     EXPECT_EQ(fs::file_size(folder_ / "service.db-wal"), 0u);
+}
+
+TEST_F(RetentionTest, KeepsTheLettersThatWereSentForAsLongAsTheirOwnDaysSay) {
+    auto const enter = [&](std::string const& pack, long long days) {
+        register_.enter({pack, "a=acme", now_, now_ + days * DAY}, {{Base::sha256(pack), 1}},
+                        VlServiced::LetterRegister::Known::Refused);
+    };
+    auto const isKnown = [&](std::string const& pack) {
+        return !register_.find({Base::sha256(pack)}, now_).empty();
+    };
+    auto const entries = [&] { return database_->number("SELECT count(*) FROM registered_letters"); };
+    add("short", JobState::Delivered);
+    enter("short", 30);
+    add("long", JobState::Delivered);
+    enter("long", 365);
+    now_ += 91 * DAY;
+    sweep();
+    EXPECT_EQ(left().size(), 0u);
+    EXPECT_FALSE(isKnown("short"));
+    EXPECT_TRUE(isKnown("long")) << "longer than its job";
+    EXPECT_EQ(entries(), 1);
+    settings_ = parse(R"({"retention_days":0})");
+    now_ += 365 * DAY;
+    sweep();
+    EXPECT_EQ(entries(), 0) << "also where jobs are kept for ever";
 }
 
 } // namespace

@@ -1,7 +1,9 @@
 #include "programs/vlserviced/metrics/metrics_page.h"
 
+#include "programs/base/digest.h"
 #include "programs/base/read_file.h"
 #include "programs/database/postgres_connection.h"
+#include "programs/vlserviced/store/letter_register.h"
 #include "programs/vlserviced/store/letter_store.h"
 #include "tests/vlserviced/store_database.h"
 
@@ -49,6 +51,15 @@ protected:
                         TEN_O_CLOCK);
         letters_.finish({{"pack-of-jane", 2}}, LetterState::Uncertain, "jane@example.org", TEN_O_CLOCK);
         letters_.setCarrier("fax", {true, 3, "no line to +49 30 12", TEN_O_CLOCK, 0});
+    }
+    /// That are known again, and one whose time is up.
+    void enterTwoLetters() {
+        VlServiced::LetterRegister letterRegister(*database_);
+        using Known = VlServiced::LetterRegister::Known;
+        letterRegister.enter({"p1", "a=acme", TEN_O_CLOCK - 9, TEN_O_CLOCK + 1},
+                             {{Base::sha256("1"), 1}, {Base::sha256("2"), 2}}, Known::Refused);
+        letterRegister.enter({"p2", "a=acme", TEN_O_CLOCK - 9, TEN_O_CLOCK}, {{Base::sha256("3"), 1}},
+                             Known::Refused);
     }
     /// The page as it is when all that can happen has.
     MetricsPage full() {
@@ -169,6 +180,16 @@ TEST_P(MetricsPageTest, TellsOfTheServiceAndItsSurroundings) {
                 Contains("vlserviced_certificate_end_timestamp_seconds " + std::to_string(TEN_O_CLOCK + 7)));
     EXPECT_THAT(told, Contains(HasSubstr("vlserviced_disk_free_bytes{folder=\"data\"} ")));
     EXPECT_THAT(told, Not(Contains(HasSubstr("nowhere"))));
+}
+
+TEST_P(MetricsPageTest, TellsOfTheRegisterOfSentLetters) {
+    enterTwoLetters();
+    measures_.noteSentBefore(VlServiced::LeftOut::Told, 3);
+    MetricsPage tested = page();
+    auto const told = lines(tested.text());
+    EXPECT_THAT(told, Contains("vlserviced_letters_registered 2"));
+    EXPECT_THAT(told, Contains("vlserviced_letters_sent_before_total{outcome=\"told\"} 3"));
+    EXPECT_THAT(told, Contains("vlserviced_letters_sent_before_total{outcome=\"refused\"} 0"));
 }
 
 TEST_P(MetricsPageTest, NamesNoPersonAndNoMailing) {

@@ -149,6 +149,26 @@ TEST_P(LetterRegisterTest, RemovesWhatIsPastAndNothingElse) {
     EXPECT_THAT(packsOf({1, 2, 3}), ElementsAre("p2 1"));
 }
 
+TEST_P(LetterRegisterTest, CountsThoseThatAreKnownAgainAndSaysWhenTheNextArePast) {
+    EXPECT_EQ(register_->nextEnd(), std::nullopt);
+    accept("p3");
+    EXPECT_THAT(enter("p2", {3}, Known::Refused, ACCEPTED_AT + 1), IsEmpty());
+    EXPECT_THAT(enter("p1", {1, 2}), IsEmpty());
+    EXPECT_THAT(enter("p3", {4}), IsEmpty());
+    EXPECT_TRUE(jobs_->cancel("p3", 1001));
+    EXPECT_EQ(VlServiced::registeredLetters(*database_, ENDS_AT - 1), 3);
+    EXPECT_EQ(VlServiced::registeredLetters(*database_, ENDS_AT), 1);
+    EXPECT_EQ(register_->nextEnd(), ENDS_AT);
+}
+
+TEST_P(LetterRegisterTest, NoticesThatTheDatabaseHasAnotherSecret) {
+    EXPECT_TRUE(register_->hasItsSecret());
+    database_->change("UPDATE register_secret SET secret = $1", std::string(64, 'a'));
+    EXPECT_FALSE(register_->hasItsSecret());
+    database_->change("DELETE FROM register_secret");
+    EXPECT_FALSE(register_->hasItsSecret());
+}
+
 TEST_P(LetterRegisterTest, FreesLettersOfMailingsThatAreCalledBackOrGivenUp) {
     accept("p1");
     accept("p2");
