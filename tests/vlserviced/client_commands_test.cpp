@@ -18,6 +18,7 @@
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/cs_config_ids_list.h"
 
+#include <SQLiteCpp/Database.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -360,6 +361,38 @@ TEST_F(ClientCommands, LettersAreShownWhereTheyAre) {
               "vlmail: \"one\" is no number of a letter: vlmail status MAILING shows them [usage]\n");
     EXPECT_EQ(complaint({"resend", "p1", "3"}),
               "vlmail: there is no letter 3 of mailing p1 [letter-unknown]\n");
+}
+
+TEST_F(ClientCommands, LettersAreShownWithTheChannelsThatTheyFailedByAndWhetherTheyGoByThemselves) {
+    fs::create_directory(folder_ / "shop");
+    output({"settings", "service",
+            R"(carriers={"postal":{"type":"folder","unit":"mailing","folder":")" +
+                (folder_ / "shop").string() + R"("},"email":{"type":"command","program":"/bin/true"}})"});
+    // What waits for it keeps the mailing's pages.
+    output({"carriers", "pause", "email"});
+    storeLetters(folder_ / "packs.db", "p1", {"postal", "postal", "email"});
+    output({"resume", "p1", "--database", (folder_ / "packs.db").string(), "--upload"});
+    std::string shown;
+    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+    do
+        shown = output({"status", "p1"});
+    while (shown.find(" 2  postal   accepted") == std::string::npos &&
+           std::chrono::steady_clock::now() < end);
+    {
+        // As another side would have it.
+        SQLite::Database database((data_ / "service.db").string(), SQLite::OPEN_READWRITE);
+        database.setBusyTimeout(10'000);
+        database.exec("UPDATE letters SET tried = 'email fax' WHERE number = 1");
+        database.exec("UPDATE letters SET state = 'failed' WHERE number = 2");
+    }
+    output({"resend", "p1", "2"});
+    do
+        shown = output({"status", "p1"});
+    while (shown.find("goes by itself; in ") == std::string::npos && std::chrono::steady_clock::now() < end);
+    std::string const folder = (folder_ / "shop").string();
+    EXPECT_THAT(shown,
+                testing::ContainsRegex("\np1 +1  postal +accepted  .*  failed by email, fax; in " + folder));
+    EXPECT_THAT(shown, testing::ContainsRegex("\np1 +2  postal +accepted  .*  goes by itself; in " + folder));
 }
 
 TEST_F(ClientCommands, ReportsOfEMailsAreTakenFromAMailbox) {

@@ -46,11 +46,14 @@ void print(std::ostream& out, std::vector<Protocol::JobReport> const& jobs) {
         table.print(out);
 }
 
-/// By which channels it failed before, and what its carrier says.
+/// By which channels it failed before, whether it left its mailing's file, and what its carrier says.
 std::string noteOn(Protocol::LetterReport const& letter) {
     std::string note;
     for (std::string const& channel : letter.tried)
-        note += (note.empty() ? "behind " : ", ") + channel;
+        if (channel != letter.channel)
+            note += (note.empty() ? "failed by " : ", ") + channel;
+    if (std::ranges::find(letter.tried, letter.channel) != letter.tried.end())
+        note += std::string(note.empty() ? "" : "; ") + "goes by itself";
     return note + (note.empty() || letter.says.empty() ? "" : "; ") + letter.says;
 }
 

@@ -277,6 +277,20 @@ bool LetterStore::holdChannel(std::string const& channel, std::string const& say
     return true;
 }
 
+std::vector<std::string> LetterStore::channelsLeft() const {
+    if (!isShared())
+        return {};
+    Database::Rows rows = database_.query(
+        "SELECT DISTINCT l.channel FROM letters l LEFT JOIN carriers c ON c.channel = l.channel WHERE "
+        "l.state = 'handed over' AND l.by_carrier = 1 AND "
+        "(c.channel IS NULL OR (c.holder <> $1 AND c.held_until <= clock_ms())) ORDER BY l.channel",
+        jobs_.holder().name);
+    std::vector<std::string> channels;
+    while (rows.next())
+        channels.push_back(rows.text(0));
+    return channels;
+}
+
 void LetterStore::finish(std::vector<LetterId> const& letters, LetterState state, std::string const& says,
                          long long now, LettersAre are) {
     Database::Transaction transaction(database_);
@@ -323,12 +337,13 @@ void LetterStore::postpone(std::vector<LetterId> const& letters, std::string con
 void LetterStore::fallBack(LetterId const& letter, std::string const& channel,
                            std::vector<Mailing::OtherWay> const& left, std::string const& says, long long now,
                            LettersAre are) {
-    database_.change(
-        "UPDATE letters SET tried = CASE WHEN tried = '' THEN channel ELSE tried || ' ' || channel END, "
-        "channel = $1, other_ways = $2, state = 'waiting', says = $3, changed_at = $4, due = 0, "
-        "attempts = 0, first_try = 0 WHERE pack = $5 AND number = $6" +
-            conditionOf(are),
-        channel, textOf(left), says, now, letter.packId, letter.number);
+    database_.change("UPDATE letters SET tried = CASE WHEN tried = '' OR tried = channel THEN channel ELSE "
+                     "tried || ' ' || "
+                     "channel END, "
+                     "channel = $1, other_ways = $2, state = 'waiting', says = $3, changed_at = $4, due = 0, "
+                     "attempts = 0, first_try = 0 WHERE pack = $5 AND number = $6" +
+                         conditionOf(are),
+                     channel, textOf(left), says, now, letter.packId, letter.number);
 }
 
 void LetterStore::holdBack(std::string const& packId, std::string const& channel, long long due) {

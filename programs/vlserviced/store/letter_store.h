@@ -163,6 +163,9 @@ public:
     /// Takes hold of a channel, or holds it on; false while another service has it. Letters that a former
     /// holder may have handed over are uncertain from then on, which `says` tells why.
     bool holdChannel(std::string const& channel, std::string const& says, long long now);
+    /// The channels with letters that may have been handed over and that nobody holds any more; of those that
+    /// services share.
+    std::vector<std::string> channelsLeft() const;
     /// Whether several services may hand letters over.
     bool isShared() const { return jobs_.isShared(); }
 
