@@ -8,6 +8,7 @@
 #include "tests/channel/test_certificate.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/postgres_server.h"
+#include "tests/support/taking_carrier.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/two_networks.h"
 #include "tests/vlserviced/pack_help.h"
@@ -25,74 +26,22 @@
 #include <map>
 #include <memory>
 #include <mutex>
-#include <poll.h>
 #include <sstream>
-#include <sys/inotify.h>
 #include <thread>
-#include <unistd.h>
 
 namespace {
 
 namespace fs = std::filesystem;
 
 using testing::HasSubstr;
-
-/// What comes into a folder is counted, and taken away as a carrier does.
-class TakingCarrier {
-public:
-    explicit TakingCarrier(fs::path folder)
-        : folder_(std::move(folder)), watch_(::inotify_init1(IN_CLOEXEC)) {
-        ::inotify_add_watch(watch_, folder_.c_str(), IN_MOVED_TO);
-        thread_ = std::thread([this] { take(); });
-    }
-    ~TakingCarrier() {
-        isEnding_ = true;
-        thread_.join();
-        ::close(watch_);
-    }
-    TakingCarrier(TakingCarrier const&) = delete;
-    TakingCarrier& operator=(TakingCarrier const&) = delete;
-
-    std::map<std::string, int> taken() {
-        std::scoped_lock const lock(mutex_);
-        return taken_;
-    }
-
-private:
-    void take() {
-        while (!isEnding_) {
-            takeAll();
-            struct pollfd at {
-                watch_, POLLIN, 0
-            };
-            char buffer[4096];
-            if (::poll(&at, 1, 100) > 0)
-                (void)!::read(watch_, buffer, sizeof buffer);
-        }
-    }
-    void takeAll() {
-        std::vector<fs::path> found;
-        for (fs::directory_entry const& entry : fs::directory_iterator(folder_))
-            if (!entry.path().filename().string().starts_with('.'))
-                found.push_back(entry.path());
-        std::scoped_lock const lock(mutex_);
-        for (fs::path const& container : found) {
-            ++taken_[container.stem().string()];
-            fs::remove(container);
-        }
-    }
-
-    fs::path folder_;
-    int watch_;
-    std::atomic<bool> isEnding_{false};
-    std::mutex mutex_;
-    std::map<std::string, int> taken_;
-    std::thread thread_;
-};
+using VLServiceTest::TakingCarrier;
 
 class SharedDatabaseTest : public testing::Test {
 protected:
-    SharedDatabaseTest() { fs::create_directory(upload_); }
+    SharedDatabaseTest() {
+        fs::create_directory(upload_);
+        fs::create_directory(taken_);
+    }
     void SetUp() override {
         if (!server_.whyNot().empty())
             GTEST_SKIP() << server_.whyNot();
@@ -152,6 +101,7 @@ protected:
 
     TemporaryFolder folder_;
     fs::path upload_ = folder_ / "upload";
+    fs::path taken_ = folder_ / "taken";
     VLServiceTest::PostgresServer server_;
     VLServiceTest::PostgresDatabase database_{server_.folder()};
     std::mutex mutex_;
@@ -211,7 +161,7 @@ TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStil
     for (std::size_t i : {0, 1, 2})
         start(i);
     setUploadFolder();
-    TakingCarrier carrier(upload_);
+    TakingCarrier const carrier(upload_, taken_);
     std::vector<std::thread> clients;
     std::atomic<int> sent{0};
     for (int c = 0; c < CLIENTS; ++c)
@@ -244,6 +194,31 @@ TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStil
         EXPECT_EQ(times, 1) << id;
 }
 
+/// A timer that is over again when its handler returns is not stopped by a cancel.
+TEST_F(SharedDatabaseTest, EndsWhenItIsToldToHoweverMuchSlowerTheDatabaseIsThanItsTimers) {
+    start(0);
+    Database::PostgresConnection database(database_.address());
+    // Each look for jobs takes longer than the time from one look to the next, a fourth of the lease.
+    database.run("CREATE FUNCTION slow() RETURNS trigger LANGUAGE plpgsql AS $$ BEGIN PERFORM "
+                 "pg_sleep(0.7); RETURN NULL; END $$; CREATE TRIGGER slow BEFORE UPDATE ON jobs FOR EACH "
+                 "STATEMENT EXECUTE FUNCTION slow()");
+    auto const isSlow = [&] {
+        return database.number("SELECT count(*) FROM pg_stat_activity WHERE wait_event = 'PgSleep' AND "
+                               "datname = current_database() AND pid <> pg_backend_pid()") > 0;
+    };
+    for (int looks = 0; looks < 3; ++looks) {
+        while (!isSlow())
+            pass(database, "0.01");
+        while (isSlow())
+            pass(database, "0.01");
+    }
+    signal(0, SIGTERM);
+    for (int i = 0; i < 300 && services_[0]->isRunning(); ++i)
+        pass(database, "0.1");
+    ASSERT_FALSE(services_[0]->isRunning());
+    EXPECT_EQ(services_[0]->wait(), 0) << services_[0]->errors();
+}
+
 // --- on the way to them
 
 /// Two services in a network, and a client in another one that knows the first alone.
@@ -259,6 +234,10 @@ TEST_F(SharedDatabaseTest, GoesOnWithWhatAFolderHeldThatWasMovedThere) {
         EXPECT_NE(ServiceProcess({"--data", data(0).string(), "--migrate-to", database_.address()}).wait(),
                   0);
     }
+    ServiceProcess tooEarly(
+        {"--data", data(0).string(), "--no-discovery", "--database", database_.address()});
+    EXPECT_EQ(tooEarly.wait(), 1);
+    EXPECT_THAT(tooEarly.errors(), HasSubstr("service.db: move it by --migrate-to in place of --database"));
     ServiceProcess moving({"--data", data(0).string(), "--migrate-to", database_.address()});
     EXPECT_EQ(moving.wait(), 0) << moving.errors();
     EXPECT_THAT(moving.firstLine(),
@@ -270,12 +249,12 @@ TEST_F(SharedDatabaseTest, GoesOnWithWhatAFolderHeldThatWasMovedThere) {
     EXPECT_THAT(without.errors(), HasSubstr("was moved to PostgreSQL: name that one by --database"));
     ServiceProcess const service({"--data", data(0).string(), "--no-discovery", "--local-packs",
                                   folder_.path().string(), "--database", database_.address()});
-    TakingCarrier carrier(upload_);
+    TakingCarrier const carrier(upload_, taken_);
     auto const owner = clientOf(service, data(0));
     owner->call<Ipc::UploadQueued>("", "");
     while (carrier.taken().empty())
         owner->call<Ipc::GetSvcCfg>();
-    EXPECT_EQ(carrier.taken(), (std::map<std::string, int>{{"p1", 1}}));
+    EXPECT_EQ(carrier.taken(), (std::map<std::string, int>{{"p1.mailing", 1}}));
 }
 
 class ServicesOnAnotherMachine : public testing::Test {

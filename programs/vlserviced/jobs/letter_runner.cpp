@@ -158,6 +158,17 @@ void LetterRunner::keepHold() {
         if (isInUse || firstToGo(name, channels_[name], std::numeric_limits<long long>::max()))
             hold(name);
     }
+    takeUpLeft();
+}
+
+/// Where no further letter waits for a channel, nobody would take hold of it and see what its former holder
+/// has left.
+void LetterRunner::takeUpLeft() {
+    std::vector<std::string> const left = letters_.channelsLeft();
+    for (std::string const& name : left)
+        hold(name);
+    if (!left.empty())
+        proceed();
 }
 
 void LetterRunner::proceed() {
@@ -596,9 +607,12 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
     if (!letter->byCarrier)
         throw Base::Error(Base::Code::StateRefused, name + " goes in the mailing's container");
     bool const isResent = change.action == Protocol::LetterAction::Resend;
-    if (isResent && !id.isNotice() &&
-        !std::filesystem::exists(LetterSource::container(surroundings_.outbox, id.packId)))
-        throw Base::Error(Base::Code::MailingDamaged, "the pages of " + name + " are gone: mail it anew");
+    if (isResent && !id.isNotice() && !hasPages(id.packId))
+        throw Base::Error(Base::Code::MailingDamaged,
+                          "the pages of " + name +
+                              (letters_.isShared()
+                                   ? " are not here: ask the service that has had it, or mail it anew"
+                                   : " are gone: mail it anew"));
     if (!recordDecision(change, *letter))
         throw Base::Error(Base::Code::StateRefused,
                           name + " is " + Protocol::letterStateName(letter->state) + ": " +
@@ -607,6 +621,14 @@ void LetterRunner::decide(Protocol::LetterChange const& change) {
     if (!id.isNotice())
         unsettled_.insert(id.packId);
     proceed();
+}
+
+/// The container may be made again as long as the pages are kept that it was made from.
+bool LetterRunner::hasPages(std::string const& packId) const {
+    if (std::filesystem::exists(LetterSource::container(surroundings_.outbox, packId)))
+        return true;
+    std::optional<Job> const job = jobs_.find(packId);
+    return job && job->pack.isWithService() && !isDoneWithPages(*job);
 }
 
 void LetterRunner::noteInHistory(StoredLetter const& letter, LetterState to) {

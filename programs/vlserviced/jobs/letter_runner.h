@@ -76,7 +76,8 @@ public:
     void resume();
     /// Hands over what may be handed over by now.
     void proceed();
-    /// Holds the channels on that it has; to be called a few times in the time of the jobs' holder.
+    /// Holds the channels on that it has, and takes up those that a service has left which is gone; to be
+    /// called a few times in the time of the jobs' holder.
     void keepHold();
     /// When something could be handed over that cannot by now; nothing when nothing waits for the clock.
     std::optional<long long> nextTime();
@@ -146,6 +147,7 @@ private:
     };
 
     bool hold(std::string const& name);
+    void takeUpLeft();
     Channel& channelOf(std::string const& name, Protocol::CarrierSettings const& settings);
     void proceedAll();
     void proceed(std::string const& name, Channel& channel);
@@ -182,6 +184,7 @@ private:
     void settleJob(std::string const& packId);
     bool isDelivering(std::string const& packId) const;
     bool isHandedOver(std::string const& packId) const;
+    bool hasPages(std::string const& packId) const;
     void noteInHistory(StoredLetter const& letter, LetterState to);
     bool goesWithOthers(StoredLetter const& letter) const;
     bool recordDecision(Protocol::LetterChange const& change, StoredLetter const& letter);

@@ -278,6 +278,26 @@ TEST_P(LetterStoreTest, GivesAChannelIntoOnePairOfHandsWhereServicesShareIt) {
     EXPECT_EQ(state("p1", 1), LetterState::Accepted);
 }
 
+TEST_P(LetterStoreTest, TellsWhichChannelsWereLeftWithLettersThatMayHaveBeenHandedOver) {
+    divide("p1", {{1, "fax", true}, {2, "sms", true}, {3, "email", true}, {4, "postal", false}});
+    std::unique_ptr<Database::Connection> const connection = open();
+    VlServiced::JobStore jobs(*connection, {"other", 60});
+    LetterStore const other(*connection, jobs);
+    letters_.beginHandingOver({{"p1", 1}, {"p1", 4}}, 7);
+    EXPECT_EQ(other.channelsLeft(),
+              isPostgres() ? std::vector<std::string>{"fax"} : std::vector<std::string>())
+        << "nobody has ever held it";
+    for (char const* const channel : {"fax", "sms"})
+        EXPECT_TRUE(letters_.holdChannel(channel, "ended", 7));
+    EXPECT_EQ(state("p1", 1), isPostgres() ? LetterState::Uncertain : LetterState::HandedOver);
+    letters_.beginHandingOver({{"p1", 2}}, 7);
+    EXPECT_THAT(other.channelsLeft(), IsEmpty()) << "it is held";
+    database_->run("UPDATE carriers SET held_until = 0");
+    EXPECT_THAT(letters_.channelsLeft(), IsEmpty()) << "it is in its own hands";
+    EXPECT_EQ(other.channelsLeft(),
+              isPostgres() ? std::vector<std::string>{"sms"} : std::vector<std::string>());
+}
+
 TEST(LetterKeys, AreNoneOfAnotherLetterOrOfAMailing) {
     EXPECT_EQ((LetterId{"p1", 3}.key()), "p1-3");
     EXPECT_NE((LetterId{"p1-3", 1}.key()), (LetterId{"p1", 31}.key()));
