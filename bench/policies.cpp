@@ -49,8 +49,8 @@ std::string metadataText(std::string const& id, int letters) {
             R"({"name":"number","value":)" +
             number +
             R"(},{"name":"total","value":119.5},{"name":"date","value":1707091200,"type":1},{"name":"reference","value":"2024-)" +
-            number + R"("}],"sheets":2,"coloured_pages":0,"digests":[")" + Base::sha256(id + number) +
-            R"("]})";
+            number + R"("}],"sheets":2,"coloured_pages":0,"digests":[")" +
+            Base::sha256(id + " letter " + number) + R"("]})";
     }
     return text + R"(],"made_ready":true,"entries_digest":")" + std::string(64, 'a') + "\"}";
 }
