@@ -72,7 +72,7 @@ export class Session extends EventTarget {
         this.history.restart(state.settings.text);
         this.documents = state.documents;
         this.tell("documents");
-        this.tell("text");
+        this.tell("text", "begin");
     }
 
     /** Takes over which files there are. Those that have changed are read anew. */

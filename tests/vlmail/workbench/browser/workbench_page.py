@@ -23,10 +23,34 @@ def missing_parts():
     return None
 
 
+def endless_pdf():
+    """A page of forms that draw each other, ten times each and forty deep: nobody ends reading it."""
+    font = "/Font << /F 4 0 R >>"
+    objects = {
+        1: "<< /Type /Catalog /Pages 2 0 R >>",
+        2: "<< /Type /Pages /Kids [3 0 R] /Count 1 >>",
+        3: "<< /Type /Page /Parent 2 0 R /MediaBox [0 0 595 842] /Contents 5 0 R /Resources << %s /XObject << /X6 6 0 R >> >> >>" % font,
+        4: "<< /Type /Font /Subtype /Type1 /BaseFont /Helvetica >>",
+        5: "<< /Length 6 >>\nstream\n/X6 Do\nendstream",
+    }
+    for number in range(6, 46):
+        content = "BT /F 10 Tf 72 700 Td (Hello) Tj ET" + " /X%d Do" % (number + 1) * 10
+        keys = "/Type /XObject /Subtype /Form /BBox [0 0 595 842] /Resources << %s /XObject << /X%d %d 0 R >> >>" % (font, number + 1, number + 1)
+        objects[number] = "<< /Length %d %s >>\nstream\n%s\nendstream" % (len(content), keys, content)
+    objects[46] = "<< /Length 0 /Type /XObject /Subtype /Form /BBox [0 0 595 842] >>\nstream\n\nendstream"
+    pdf, offsets = "%PDF-1.7\n", []
+    for number, body in sorted(objects.items()):
+        offsets.append(len(pdf))
+        pdf += "%d 0 obj\n%s\nendobj\n" % (number, body)
+    table = "".join("%010d 00000 n \n" % offset for offset in offsets)
+    end = "xref\n0 %d\n0000000000 65535 f \n%strailer\n<< /Size %d /Root 1 0 R >>\nstartxref\n%d\n%%%%EOF\n"
+    return (pdf + end % (len(objects) + 1, table, len(objects) + 1, len(pdf))).encode()
+
+
 class Workbench:
     """The program with a folder of its own, which is a copy of one of the examples."""
 
-    def __init__(self, vlmail, folder, settings, *options):
+    def __init__(self, vlmail, folder, settings, *options, user=None):
         self.home = tempfile.mkdtemp(prefix="workbench")
         self.folder = os.path.join(self.home, "letters")
         shutil.copytree(folder, self.folder)
@@ -34,11 +58,14 @@ class Workbench:
         if settings:
             shutil.move(os.path.join(self.folder, settings), self.settings)
             options += ("--settings", self.settings)
+        if user is not None:
+            os.chmod(self.home, 0o755)
         self.process = subprocess.Popen(
             [vlmail, "workbench", self.folder, *options],
             stdout=subprocess.PIPE,
             env={**os.environ, "HOME": self.home},
             text=True,
+            user=user,
         )
         self.url = self.process.stdout.readline().strip()
         self.origin, _, self.token = self.url.partition("/#")
@@ -80,7 +107,7 @@ def start_browser(language="en-GB", scheme="light", size=(1500, 1000)):
     options.add_experimental_option("prefs", {"intl.accept_languages": language})
     options.set_capability("goog:loggingPrefs", {"browser": "ALL"})
     driver = webdriver.Chrome(service=Service(shutil.which("chromedriver")), options=options)
-    driver.set_script_timeout(WAIT_SECONDS)
+    driver.set_script_timeout(2 * WAIT_SECONDS)
     look(driver, scheme, size)
     return driver
 
@@ -115,6 +142,14 @@ def marks_in(driver, sheet):
     return driver.execute_script(script, sheet)
 
 
+# The settings as the editor has them, the one of the system or a plain field.
+SETTINGS = "(document.querySelector('#editor .CodeMirror')?.CodeMirror.getValue() ?? document.querySelector('#editor textarea').value)"
+
+# The state and the value that the field a[0] is shown with.
+FIELD = """[...document.querySelectorAll('#fields-body .field')].filter((one) => one.ariaLabel === a[0])
+    .map((card) => [card.querySelector('.state').textContent, card.querySelector('.value')?.innerText ?? ''])[0]"""
+
+
 class Page:
     """What a person sees and does, by the names that are on the page."""
 
@@ -127,17 +162,36 @@ class Page:
         from selenium.common.exceptions import StaleElementReferenceException, TimeoutException
         from selenium.webdriver.support.ui import WebDriverWait
 
-        waiting = WebDriverWait(self.driver, WAIT_SECONDS, 0.02, [StaleElementReferenceException])
+        waiting = WebDriverWait(self.driver, WAIT_SECONDS, 0.05, [StaleElementReferenceException])
         try:
             return waiting.until(lambda _: condition())
         except TimeoutException:
             raise AssertionError("waited in vain: %s; the page says: %s" % (what, self.texts("#message, #alert, #counts")))
 
+    def until(self, expression, what, *arguments):
+        """The first value that counts as true of an expression with the arguments `a`. The page itself looks whenever something on it
+        changes: asking again and again from here would take the time that the page needs."""
+        script = """
+            const [a, seconds, done] = [arguments[0], arguments[1], arguments[2]];
+            const value = () => { try { return (%s); } catch (failure) { return null; } };
+            const observer = new MutationObserver(() => look());
+            const end = (answer) => { observer.disconnect(); clearTimeout(timer); removeEventListener("load", look, true); done(answer); };
+            const look = () => { const found = value(); if (found) end([found]); };
+            const timer = setTimeout(() => end(null), seconds * 1000);
+            observer.observe(document, { subtree: true, childList: true, attributes: true, characterData: true });
+            addEventListener("load", look, true);
+            look();
+        """
+        found = self.driver.execute_async_script(script % expression, arguments, WAIT_SECONDS)
+        if found is None:
+            raise AssertionError("waited in vain: %s; the page says: %s" % (what, self.texts("#message, #alert, #counts")))
+        return found[0]
+
     def find(self, selector):
         return self.driver.find_elements("css selector", selector)
 
     def one(self, selector):
-        return self.wait(lambda: next((one for one in self.find(selector) if one.is_displayed()), None), selector)
+        return self.until("[...document.querySelectorAll(a[0])].find((one) => one.checkVisibility({ checkVisibilityCSS: true }))", selector, selector)
 
     def texts(self, selector):
         return self.run("return [...document.querySelectorAll(arguments[0])].map((one) => one.innerText)", selector)
@@ -157,35 +211,28 @@ class Page:
 
     def wait_until_read(self):
         """Until the document that is open was read by the settings as they are, and drawn."""
-        self.wait(lambda: not self.find("#fields-body[aria-busy]") and self.find("#fields-body .quietly, #fields-body .why"), "the reading")
+        self.until("!document.querySelector('#fields-body[aria-busy]') && document.querySelector('#fields-body .quietly, #fields-body .why')", "the reading")
         return self
 
     def wait_for_picture(self):
-        self.wait(lambda: self.run("const i = document.querySelector('#stage img'); return i.complete && i.naturalWidth > 0"), "the picture")
+        self.until("[document.querySelector('#stage img')].find((one) => one.complete && one.naturalWidth > 0)", "the picture")
         return self
 
     def choose(self, document):
         """Opens a document of the list by the mouse."""
-        row = "return [...document.querySelectorAll('#list .row')].find((one) => one.innerText.startsWith(arguments[0]))"
-        self.wait(lambda: self.run(row, document).click() is None, "the row of " + document)
+        self.until("[...document.querySelectorAll('#list .row')].find((one) => one.innerText.startsWith(a[0]))", "the row of " + document, document).click()
 
     def field(self, name):
         """The state and the value that the field is shown with."""
-        script = """
-            const card = [...document.querySelectorAll('#fields-body .field')].find((one) => one.ariaLabel === arguments[0]);
-            return card && [card.querySelector('.state').textContent, card.querySelector('.value')?.innerText ?? ''];
-        """
-        return self.run(script, name)
+        return self.run("const a = arguments; return " + FIELD, name)
 
     def wait_for_field(self, name, value):
-        self.wait(lambda: self.field(name) == ["\u2713 found", value], "the field %s as %r: %r" % (name, value, self.field(name)))
+        shown = "JSON.stringify(%s) === JSON.stringify(['\u2713 found', a[1]])" % FIELD
+        self.until(shown, "the field %s as %r: %r" % (name, value, self.field(name)), name, value)
 
     def settings(self):
         """The settings as the editor has them."""
-        return self.run(
-            "const m = document.querySelector('#editor .CodeMirror');"
-            "return m ? m.CodeMirror.getValue() : document.querySelector('#editor textarea').value"
-        )
+        return self.run("return " + SETTINGS)
 
     def type_settings(self, text):
         """Replaces all that stands in the editor, as if it was typed."""
