@@ -37,6 +37,10 @@
 #endif
 
 #ifdef VLSERVICE_LEAKS_ARE_SOUGHT
+#ifdef __clang__
+// The sanitizer asks for it by this name.
+#pragma clang diagnostic ignored "-Wreserved-identifier"
+#endif
 /// The library with which poppler looks for fonts keeps some bytes to itself.
 extern "C" __attribute__((visibility("default"))) char const* __lsan_default_suppressions();
 char const* __lsan_default_suppressions() { return "leak:libfontconfig\n"; }
