@@ -28,19 +28,25 @@ namespace fs = std::filesystem;
 
 struct Question {
     char const* name;
-    Answer (Desk::*answer)(json::Object const&);
+    Answer (*answer)(Desk& desk, json::Object const& query);
 };
 
+/// A member of the desk, whether it changes the desk or not.
+template<auto member>
+Answer by(Desk& desk, json::Object const& query) {
+    return (desk.*member)(query);
+}
+
 constexpr std::array QUESTIONS{
-    Question{"evaluate", &Desk::evaluate},
-    Question{"lint", &Desk::lint},
-    Question{"edit", &Desk::edit},
-    Question{"picture", &Desk::picture},
-    Question{"blocks", &Desk::blocks},
-    Question{"verdict", &Desk::verdict},
-    Question{"expectation", &Desk::expectation},
-    Question{"propose", &Desk::propose},
-    Question{"adopt", &Desk::adopt},
+    Question{"evaluate", by<&Desk::evaluate>},
+    Question{"lint", by<&Desk::lint>},
+    Question{"edit", by<&Desk::edit>},
+    Question{"picture", by<&Desk::picture>},
+    Question{"blocks", by<&Desk::blocks>},
+    Question{"verdict", by<&Desk::verdict>},
+    Question{"expectation", by<&Desk::expectation>},
+    Question{"propose", by<&Desk::propose>},
+    Question{"adopt", by<&Desk::adopt>},
 };
 
 json::Object brokenToJson(BrokenText const& broken) {
@@ -98,7 +104,7 @@ Answer Desk::answer(std::string const& what, std::string const& query) {
         json::Object const parameters = json::strToObject(query.data(), query.size());
         for (Question const& question : QUESTIONS)
             if (what == question.name)
-                return (this->*question.answer)(parameters);
+                return question.answer(*this, parameters);
         return failureOf(404, Base::Code::RequestInvalid,
                          "there is no request " + Base::inQuotes(Base::validUtf8(what)));
     } catch (std::bad_alloc const&) {
@@ -301,8 +307,7 @@ Answer Desk::expectation(json::Object const& query) {
     return answerOf({{"text", printed(expectationOf(reading))}});
 }
 
-// All that is asked is a member of one type. NOLINTNEXTLINE(readability-make-member-function-const)
-Answer Desk::propose(json::Object const& query) {
+Answer Desk::propose(json::Object const& query) const {
     std::vector<Reader::Document> documents;
     for (json::Value const& name : query.get("documents").toArray())
         documents.push_back(Reader::openDocument(folders_.documents / name.toString()));

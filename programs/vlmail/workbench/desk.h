@@ -48,7 +48,7 @@ public:
     /// What would be kept as a golden case.
     Answer expectation(json::Object const& query);
     /// A new preset from documents, and the settings with it.
-    Answer propose(json::Object const& query); // NOLINT(readability-make-member-function-const)
+    Answer propose(json::Object const& query) const;
     Answer adopt(json::Object const& query);
 
 private:

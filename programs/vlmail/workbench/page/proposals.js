@@ -1,6 +1,19 @@
-// A new preset from the document that is open: the program proposes, the person ticks what is right.
+// A new preset from the document that is open and those of its kind: the program proposes, the person ticks what is right.
 import { el, isolated } from "./dom.js";
 import { Dialog } from "./dialog.js";
+
+/** What they have in common is sought in so many. */
+const MOST = 10;
+
+/**
+ * @param {string[]} names
+ * @param {string} open
+ * @returns {string[]} the open one, and others that are named like it but for their numbers
+ */
+export function alike(names, open) {
+    const kind = (name) => name.replace(/\d+/g, "0");
+    return [open, ...names.filter((name) => name !== open && kind(name) === kind(open))].slice(0, MOST);
+}
 
 export class Proposals {
     /**
@@ -17,22 +30,22 @@ export class Proposals {
         const { session } = this;
         if (!session.document)
             return;
+        const documents = alike(session.documents.map(({ name }) => name), session.document);
         try {
-            const proposal = await this.api.call("propose", { documents: [session.document], settings: session.text });
-            this.#show(proposal);
+            this.#show(await this.api.call("propose", { documents, settings: session.text }), documents);
         } catch (failure) {
             this.failed(failure);
         }
     }
 
-    #show(proposal) {
+    #show(proposal, documents) {
         const { texts } = this;
-        const match = el("input", { type: "text", value: proposal.match.proposal, spellcheck: "false" });
+        const match = el("input", { type: "text", class: "wide", value: proposal.match.proposal, spellcheck: "false" });
         const address = proposal.address && this.#tick(texts.of("addressZone"), proposal.address, true);
         const fields = proposal.fields.map((field) => this.#field(field));
         const dialog = new Dialog(texts, "proposalTitle");
-        dialog.show([el("p", {}, texts.of("proposalIntro")), el("label", {}, el("span", {}, texts.of("documentsNamed")), " ", match),
-            el("p", { class: "note" }, isolated(proposal.match.says)),
+        dialog.show([el("p", {}, texts.of("proposalIntro")), el("p", { class: "note" }, texts.of("madeFrom"), " ", isolated(documents.join(", "))), el("label", {}, el("span", {}, texts.of("documentsNamed")), " ", match),
+            el("p", { class: "note" }, texts.of("matchSays")),
             el("fieldset", {}, el("legend", {}, texts.of("readFromIt")), address?.row, ...fields.map(({ row }) => row),
                 fields.length === 0 && !address && el("p", {}, texts.of("nothingProposed")))], "adopt",
         () => this.#adopt({ ...proposal, match: { ...proposal.match, proposal: match.value },

@@ -84,7 +84,24 @@ class Modules(BrowserTest):
 
     def test_a_value_behind_a_label_is_proposed_first(self):
         found = self.page.imported("new_field.js", "m.proposals(a[0])[0]", ["Dear Sir", "Total (EUR): 12.30"])
-        self.assertEqual(found, {"kind": "behind", "label": "Total (EUR):", "pattern": "^Total \\(EUR\\):\\h*(?<VAL>\\S.*)$"})
+        pattern = "^\\h*Total \\(EUR\\):\\h*(?<VAL>\\S.*)$"
+        self.assertEqual(found, {"kind": "behind", "label": "Total (EUR):", "pattern": pattern, "value": "12.30", "name": "total_eur"})
+
+    def test_what_is_proposed_tells_what_it_would_find(self):
+        lines = ["Ref: RK 88/2024", "Datum: 02.05.2024", "Betrag 7.812,40 an a@example.org"]
+        found = self.page.imported("new_field.js", "m.proposals(a[0]).map((p) => [p.kind, p.value])", lines)
+        self.assertEqual(found, [
+            ["behind", "RK 88/2024"], ["behind", "02.05.2024"], ["line", lines[0]], ["whole", "\n".join(lines)],
+            ["number", "88"], ["amount", "7.812,40"], ["date", "02.05.2024"], ["email", "a@example.org"],
+        ])
+        kinds = "m.proposals(a[0]).map((p) => p.kind)"
+        self.assertEqual(self.page.imported("new_field.js", kinds, ["Dear Sir"]), ["line", "whole"])
+        self.assertEqual(self.page.imported("new_field.js", kinds, []), ["line"])
+
+    def test_a_preset_is_made_from_documents_that_are_named_alike(self):
+        names = ["Invoice 17.pdf", "Invoice 18.pdf", "Invoices March.pdf", "b/Invoice 19.pdf"]
+        self.assertEqual(self.page.imported("proposals.js", "m.alike(a[0], a[1])", names, "Invoice 18.pdf"), ["Invoice 18.pdf", "Invoice 17.pdf"])
+        self.assertEqual(self.page.imported("proposals.js", "m.alike(a[0], a[1])", names, "Invoices March.pdf"), ["Invoices March.pdf"])
 
     def test_keys_are_completed_where_keys_stand(self):
         context = "m.contextOf(a[0])"

@@ -665,7 +665,7 @@ class Access(BrowserTest):
         page.type_settings(text.replace('"pack_preset"', 'pack_preset"', 1))
         page.until("document.querySelector('#alert').innerText.startsWith('\u2717 Zeile 5: ')", "the line of the fault")
         page.type_settings(text)
-        page.one(".repair").click()
+        page.wait_until_read().one(".repair").click()
         page.until("document.querySelector('#tab-effect').innerText === 'Wirkung: 1 besser, 0 schlechter'", "the effect")
         page.one("#save").click()
         self.assertEqual(page.texts("dialog[open] h2, dialog[open] button"), ["Einstellungen sichern", "Sichern", "Abbrechen"])
