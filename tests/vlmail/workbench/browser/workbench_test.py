@@ -290,7 +290,7 @@ class Changing(BrowserTest):
         page.keys(at.keys().DELETE)
         page.until("document.querySelector('#alert').innerText === ''", "the end of the complaint")
         self.assertEqual(page.settings(), text)
-        page.one(".repair").click()
+        page.wait_until_read().one(".repair").click()
         page.wait_for_field("total", "12.3")
         self.assertIn("(?i)", area.get_attribute("value"))
         page.one("#undo").click()
