@@ -27,6 +27,7 @@
 #include <boost/asio/post.hpp>
 #include <boost/asio/read.hpp>
 #include <boost/asio/ssl/stream.hpp>
+#include <boost/asio/steady_timer.hpp>
 #include <boost/asio/thread_pool.hpp>
 #include <boost/asio/write.hpp>
 
@@ -163,7 +164,14 @@ public:
                      {[this](Work work) { asio::post(storeThread_, std::move(work)); },
                       [this](Work work) { asio::post(io_, std::move(work)); }, [] { return 1LL; },
                       [](std::string const&) { return std::nullopt; },
-                      [](std::string const&) { return false; }}),
+                      [](std::string const&) { return false; },
+                      [this](Work work) {
+                          pieces_.expires_after(std::chrono::milliseconds(20));
+                          pieces_.async_wait([work = std::move(work)](auto const& ec) {
+                              if (!ec)
+                                  work();
+                          });
+                      }}),
           server_(
               std::in_place, io_, settings(certificate), &Ipc::makeEmptyCmd,
               [this](std::shared_ptr<Ipc::CmdI> const& cmd, Channel::Answer const& answer) {
@@ -232,6 +240,7 @@ private:
         Database::openDatabase(":memory:", VlServiced::serviceDatabase(), Database::Journal::Rollback)};
     VlServiced::JobStore jobs_{database_};
     asio::io_context io_;
+    asio::steady_timer pieces_{io_};
     asio::thread_pool storeThread_{1};
     VlServiced::PackReception reception_;
     std::optional<Channel::Server> server_;

@@ -5,7 +5,7 @@
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/post.hpp>
-#include <boost/asio/ssl/stream.hpp>
+#include <boost/asio/ssl/context.hpp>
 #include <boost/asio/write.hpp>
 
 #include <openssl/evp.h>
@@ -26,25 +26,6 @@ namespace asio = boost::asio;
 namespace ssl = asio::ssl;
 
 namespace {
-
-/// In the form in which the tools for certificates print it.
-std::string fingerprintOf(X509 const* certificate) {
-    std::array<unsigned char, EVP_MAX_MD_SIZE> digest;
-    unsigned int length = 0;
-    // Short of memory, the library may give the digest of another function and call that a success.
-    if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1 ||
-        length != SHA256_DIGEST_LENGTH)
-        throw Base::Error(Base::Code::TlsUnusable, "The fingerprint of the certificate cannot be computed.");
-    constexpr char const* DIGITS = "0123456789ABCDEF";
-    std::string text;
-    for (unsigned int i = 0; i < length; ++i) {
-        if (i > 0)
-            text += ':';
-        text += DIGITS[digest[i] >> 4];
-        text += DIGITS[digest[i] & 15];
-    }
-    return text;
-}
 
 asio::ip::address unmapped(asio::ip::address const& address) {
     if (address.is_v6() && address.to_v6().is_v4_mapped())
@@ -79,34 +60,6 @@ private:
     tcp::socket socket_;
 };
 
-class TlsStream : public Stream {
-public:
-    TlsStream(tcp::socket socket, ssl::context& context, TlsRole role)
-        : stream_(std::move(socket), context), role_(role) {}
-
-    void handshake(Done done) override {
-        stream_.async_handshake(
-            role_ == TlsRole::Client ? ssl::stream_base::client : ssl::stream_base::server, std::move(done));
-    }
-    void readSome(std::span<char> room, Moved done) override {
-        stream_.async_read_some(asio::buffer(room.data(), room.size()), std::move(done));
-    }
-    void writeAll(std::string_view bytes, Done done) override {
-        asio::async_write(stream_, asio::buffer(bytes.data(), bytes.size()),
-                          [done = std::move(done)](error_code const& ec, std::size_t) { done(ec); });
-    }
-    std::string fingerprint() override {
-        std::unique_ptr<X509, decltype(&X509_free)> const certificate(
-            SSL_get1_peer_certificate(stream_.native_handle()), X509_free);
-        return fingerprintOf(certificate.get());
-    }
-    tcp::socket& socket() override { return stream_.next_layer(); }
-
-private:
-    ssl::stream<tcp::socket> stream_;
-    TlsRole role_;
-};
-
 std::unique_ptr<ssl::context> makeContext(ssl::context::method method) {
     auto context = std::make_unique<ssl::context>(method);
     if (SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_3_VERSION) != 1)
@@ -126,10 +79,6 @@ std::unique_ptr<Stream> makePlainStream(tcp::socket socket) {
     return std::make_unique<PlainStream>(std::move(socket));
 }
 
-std::unique_ptr<Stream> makeTlsStream(tcp::socket socket, ssl::context& context, TlsRole role) {
-    return std::make_unique<TlsStream>(std::move(socket), context, role);
-}
-
 std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateFile,
                                                  std::string const& keyFile) {
     auto context = makeContext(ssl::context::tls_server);
@@ -146,6 +95,24 @@ std::unique_ptr<ssl::context> makeServiceContext(std::string const& certificateF
     context->use_private_key(asio::buffer(key), ssl::context::pem, ec);
     orThrow(ec, "private key", keyFile);
     return context;
+}
+
+std::string fingerprintOf(X509 const* certificate) {
+    std::array<unsigned char, EVP_MAX_MD_SIZE> digest;
+    unsigned int length = 0;
+    // Short of memory, the library may give the digest of another function and call that a success.
+    if (!certificate || X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1 ||
+        length != SHA256_DIGEST_LENGTH)
+        throw Base::Error(Base::Code::TlsUnusable, "The fingerprint of the certificate cannot be computed.");
+    constexpr char const* DIGITS = "0123456789ABCDEF";
+    std::string text;
+    for (unsigned int i = 0; i < length; ++i) {
+        if (i > 0)
+            text += ':';
+        text += DIGITS[digest[i] >> 4];
+        text += DIGITS[digest[i] & 15];
+    }
+    return text;
 }
 
 std::string fingerprintOf(ssl::context& context) {

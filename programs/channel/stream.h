@@ -13,6 +13,8 @@
 #include <string>
 #include <string_view>
 
+#include <openssl/types.h>
+
 namespace Channel {
 
 using boost::asio::ip::tcp;
@@ -45,6 +47,9 @@ std::unique_ptr<Stream> makeTlsStream(tcp::socket socket, boost::asio::ssl::cont
 /// The context of a service that shows this certificate. Throws Error.
 std::unique_ptr<boost::asio::ssl::context> makeServiceContext(std::string const& certificateFile,
                                                               std::string const& keyFile);
+/// In the form in which the tools for certificates print it. Throws Error when there is none, or when it
+/// cannot be computed.
+std::string fingerprintOf(X509 const* certificate);
 /// The fingerprint of the certificate that a context shows. Throws Error.
 std::string fingerprintOf(boost::asio::ssl::context& context);
 /// When that certificate ends, in seconds since the epoch. Throws Error.

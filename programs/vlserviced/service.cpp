@@ -68,6 +68,8 @@ constexpr std::chrono::hours ENDED_SWEEP_TIME{1};
 constexpr std::size_t MAX_PATH_BYTES = 1000;
 /// How long carriers get for what they have begun when the service ends.
 constexpr std::chrono::seconds CARRIERS_PATIENCE{3};
+/// How long a piece of a pack waits for others that go to the disk with it.
+constexpr std::chrono::milliseconds PIECES_PATIENCE{20};
 
 constexpr char const* REVOKED = "this access token was revoked: ask for another one (\"vlmail token add\")";
 
@@ -707,9 +709,17 @@ private:
                         work();
                     });
                 },
-                [this](ReceptionSurroundings::Work work) { asio::post(io_, std::move(work)); }, &now,
+                [this](ReceptionSurroundings::Work work) { asio::post(io_, std::move(work)); },
+                &now,
                 [this](std::string const& node) { return settings_.service().quotaOf(node); },
-                [this](std::string const& node) { return settings_.service().isDisabled(node); }};
+                [this](std::string const& node) { return settings_.service().isDisabled(node); },
+                [this](ReceptionSurroundings::Work work) {
+                    pieces_.expires_after(PIECES_PATIENCE);
+                    pieces_.async_wait([work = std::move(work)](boost::system::error_code const& ec) {
+                        if (!ec)
+                            work();
+                    });
+                }};
     }
 
     HealthSources healthSources() {
@@ -768,6 +778,8 @@ private:
     SystemManager manager_{io_};
     asio::signal_set signals_{io_, SIGTERM, SIGINT};
     asio::steady_timer upkeep_{io_};
+    /// For pieces of packs that wait for others.
+    asio::steady_timer pieces_{io_};
     /// For the next job that is held and due.
     asio::steady_timer due_{io_};
     /// For the next letter that waits for the clock.

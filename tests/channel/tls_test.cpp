@@ -12,7 +12,9 @@
 #include "tests/support/two_networks.h"
 
 #include <boost/asio/buffer.hpp>
+#include <boost/asio/read.hpp>
 #include <boost/asio/ssl/stream.hpp>
+#include <boost/asio/write.hpp>
 
 #include <gmock/gmock.h>
 
@@ -23,6 +25,10 @@
 #include <chrono>
 #include <filesystem>
 #include <fstream>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
 
 using namespace testing;
 using namespace ChannelTest;
@@ -284,6 +290,151 @@ TEST_F(TlsFiles, MustKeepTheKeyPrivate) {
 }
 
 // --- addresses
+
+/// A stream of the service's side, on a thread of its own, and a foreign client.
+class TlsStreams : public Test {
+protected:
+    using ForeignStream = asio::ssl::stream<asio::ip::tcp::socket>;
+
+    TlsStreams() {
+        asio::ip::tcp::acceptor acceptor(io_, {asio::ip::address_v4::loopback(), 0});
+        foreign_.next_layer().connect(acceptor.local_endpoint());
+        own_ = Channel::makeTlsStream(acceptor.accept(), *service_, Channel::TlsRole::Service);
+    }
+    ~TlsStreams() override { fs::remove_all(folder_); }
+
+    /// Both sides agree.
+    void agree() {
+        own_->handshake([this](Channel::error_code const& ec) { told_ = ec.message(); });
+        std::thread thread([this] { foreign_.handshake(asio::ssl::stream_base::client); });
+        io_.run();
+        io_.restart();
+        thread.join();
+        ASSERT_EQ(told_, Channel::error_code().message());
+    }
+    /// Reads until so much is there, or the end, which is told.
+    void read(std::size_t wanted) {
+        if (got_.size() >= wanted)
+            return;
+        own_->readSome(room_, [this, wanted](Channel::error_code const& ec, std::size_t size) {
+            got_.append(room_.data(), size);
+            told_ = ec.message();
+            if (!ec)
+                read(wanted);
+        });
+    }
+    void write(std::string const& text) {
+        own_->writeAll(text, [this](Channel::error_code const& ec) { written_ = ec.message(); });
+    }
+    static std::string textOf(std::size_t size) {
+        std::string text(size, 'x');
+        for (std::size_t i = 0; i < size; ++i)
+            text[i] = static_cast<char>(i * 7 + i / 4096);
+        return text;
+    }
+    std::string readForeign(std::size_t size) {
+        std::string text(size, 'x');
+        asio::read(foreign_, asio::buffer(text));
+        return text;
+    }
+
+    static constexpr std::size_t MUCH = 3'000'001;
+
+    fs::path const folder_ = fs::temp_directory_path() / ("tls_streams_" + std::to_string(::getpid()));
+    TestCertificate const certificate_ = [this] {
+        fs::create_directory(folder_);
+        return makeCertificate(folder_.string(), "service");
+    }();
+    std::unique_ptr<asio::ssl::context> service_ =
+        Channel::makeServiceContext(certificate_.certificateFile, certificate_.keyFile);
+    std::unique_ptr<asio::ssl::context> client_ = Channel::makeClientContext();
+    asio::io_context io_;
+    ForeignStream foreign_{io_, *client_};
+    std::unique_ptr<Channel::Stream> own_;
+    std::vector<char> room_ = std::vector<char>(100'000);
+    std::string got_;
+    std::string told_;
+    std::string written_;
+};
+
+TEST_F(TlsStreams, CarryMuchInBothDirectionsAtOnce) {
+    agree();
+    std::string const there = textOf(MUCH);
+    std::string const back = textOf(MUCH + 5);
+    std::string seen;
+    std::thread thread([&] {
+        asio::write(foreign_, asio::buffer(there));
+        seen = readForeign(back.size());
+    });
+    write(back);
+    read(there.size());
+    io_.run();
+    thread.join();
+    EXPECT_TRUE(got_ == there);
+    EXPECT_TRUE(seen == back);
+    EXPECT_EQ(written_, Channel::error_code().message());
+}
+
+TEST_F(TlsStreams, GoOnUnderNewKeysThatTheOtherSideAsksFor) {
+    agree();
+    std::string seen;
+    std::thread thread([&] {
+        for (char const* word : {"one", "two"}) {
+            SSL_key_update(foreign_.native_handle(), SSL_KEY_UPDATE_REQUESTED);
+            asio::write(foreign_, asio::buffer(word, 3));
+        }
+        seen = readForeign(5);
+    });
+    read(6);
+    io_.run();
+    io_.restart();
+    write("three");
+    io_.run();
+    thread.join();
+    EXPECT_EQ(got_, "onetwo");
+    EXPECT_EQ(seen, "three");
+}
+
+TEST_F(TlsStreams, TellAFarewell) {
+    agree();
+    std::thread thread([&] {
+        asio::write(foreign_, asio::buffer("bye", 3));
+        Channel::error_code ignored;
+        foreign_.shutdown(ignored);
+    });
+    read(4);
+    io_.run();
+    own_->socket().close();
+    thread.join();
+    EXPECT_EQ(got_, "bye");
+    EXPECT_EQ(told_, Channel::error_code(asio::error::eof).message());
+}
+
+TEST_F(TlsStreams, TellAnEndWithoutAFarewell) {
+    agree();
+    foreign_.next_layer().shutdown(asio::ip::tcp::socket::shutdown_send);
+    read(1);
+    io_.run();
+    EXPECT_EQ(told_, Channel::error_code(asio::ssl::error::stream_truncated).message());
+}
+
+TEST_F(TlsStreams, EndWhatIsUnderWayWhenTheyAreClosed) {
+    agree();
+    read(1);
+    own_->socket().close();
+    io_.run();
+    EXPECT_EQ(told_, Channel::error_code(asio::error::operation_aborted).message());
+}
+
+TEST_F(TlsStreams, TellTheOtherSideThatTheHandshakeFailed) {
+    asio::write(foreign_.next_layer(), asio::buffer("\x16\x03\x01\x00\x05hello", 10));
+    own_->handshake([this](Channel::error_code const& ec) { told_ = ec.category().name(); });
+    io_.run();
+    EXPECT_EQ(told_, asio::error::get_ssl_category().name());
+    char kind = 0;
+    asio::read(foreign_.next_layer(), asio::buffer(&kind, 1));
+    EXPECT_EQ(kind, 0x15) << "an alert";
+}
 
 TEST(LoopbackAddresses, AreToldInAllTheirForms) {
     std::pair<char const*, bool> const cases[] = {

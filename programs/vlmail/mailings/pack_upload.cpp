@@ -9,11 +9,16 @@
 #include "vlservice/ipc/process_pack.h"
 
 #include <algorithm>
+#include <cstddef>
+#include <future>
+#include <iterator>
 #include <optional>
+#include <span>
 #include <stdexcept>
 #include <string>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace VlMail {
 namespace {
@@ -42,6 +47,43 @@ SharedMemBuffer blobAt(PackSource& pack, long long position) {
                           isPage ? "page " + std::to_string(position + 1) + " of it cannot be read"
                                  : "its metadata cannot be read");
     return blob;
+}
+
+/// Blobs of a pack, some MiB of them, or one.
+struct Blobs {
+    std::vector<SharedMemBuffer> blobs = {};
+    std::size_t bytes = 0;
+};
+
+/// From a position on, to the metadata at the most.
+Blobs blobsFrom(PackSource& pack, long long position, long long metadataAt) {
+    constexpr std::size_t ENOUGH = 8 << 20;
+    Blobs some;
+    for (; position <= metadataAt && some.bytes < ENOUGH; ++position) {
+        some.blobs.push_back(blobAt(pack, position));
+        some.bytes += some.blobs.back().size();
+    }
+    return some;
+}
+
+std::vector<std::string> digestsOf(std::span<SharedMemBuffer const> blobs) {
+    std::vector<std::string> digests;
+    for (SharedMemBuffer const& blob : blobs)
+        digests.push_back(Base::sha256(Mailing::viewOf(blob)));
+    return digests;
+}
+
+/// Half of what is much is another thread's, where there is one to be had.
+std::vector<std::string> digestsOf(Blobs const& some) {
+    constexpr std::size_t MUCH = 1 << 20;
+    std::span<SharedMemBuffer const> const all(some.blobs);
+    if (some.bytes < MUCH)
+        return digestsOf(all);
+    std::size_t const half = all.size() / 2;
+    auto rest = std::async([part = all.subspan(half)] { return digestsOf(part); });
+    std::vector<std::string> digests = digestsOf(all.first(half));
+    std::ranges::move(rest.get(), std::back_inserter(digests));
+    return digests;
 }
 
 /// The texts of data messages, from a position on.
@@ -134,12 +176,15 @@ BeginPack beginningOf(PackSource& pack) {
     beginning.title = pack.info().title;
     beginning.pages = static_cast<long long>(pack.pages().size());
     Mailing::PackDigest digest;
-    for (long long position = 0; position <= beginning.pages; ++position) {
-        SharedMemBuffer const blob = blobAt(pack, position);
-        PackSource::PageName const name = nameAt(pack, position);
-        auto const size = static_cast<long long>(blob.size());
-        digest.add(name.document, name.page, size, Base::sha256(Mailing::viewOf(blob)));
-        beginning.bytes += size;
+    for (long long position = 0; position <= beginning.pages;) {
+        Blobs const some = blobsFrom(pack, position, beginning.pages);
+        std::vector<std::string> const digests = digestsOf(some);
+        for (std::size_t i = 0; i < digests.size(); ++i, ++position) {
+            PackSource::PageName const name = nameAt(pack, position);
+            auto const size = static_cast<long long>(some.blobs[i].size());
+            digest.add(name.document, name.page, size, digests[i]);
+            beginning.bytes += size;
+        }
     }
     beginning.sha256 = digest.text();
     if (beginning.bytes > BeginPack::MAX_BYTES || beginning.pages > BeginPack::MAX_PAGES)

@@ -20,6 +20,8 @@ using Protocol::BeginPackAnswer;
 constexpr std::size_t MAX_TITLE_BYTES = 500;
 /// How long a pack waits for its rest, or for its Process Pack.
 constexpr long long UNFINISHED_SECONDS = 24 * 60 * 60;
+/// What goes to the disk without waiting for more: a transaction costs as much as storing a MiB does.
+constexpr std::size_t ENOUGH_BYTES = 4 << 20;
 
 void checkBeginning(BeginPack const& pack) {
     if (!Mailing::isPackId(pack.id))
@@ -273,8 +275,14 @@ void PackReception::begin(BeginPack const& pack, Sender const& sender,
 void PackReception::letSend(std::string const& packId, Sender const& sender) {
     senders_[packId] = sender;
     Pieces const all = std::exchange(waiting_, {});
+    waitingBytes_ = 0;
     for (Piece const& piece : all)
-        piece.packId == packId ? piece.stored(notItsOwn(packId)) : waiting_.push_back(piece);
+        piece.packId == packId ? piece.stored(notItsOwn(packId)) : await(piece);
+}
+
+void PackReception::await(Piece piece) {
+    waitingBytes_ += piece.text.size();
+    waiting_.push_back(std::move(piece));
 }
 
 bool PackReception::maySend(std::string const& packId,
@@ -285,17 +293,33 @@ bool PackReception::maySend(std::string const& packId,
 
 void PackReception::take(std::shared_ptr<Ipc::CmdProcessorI> const& connection, std::string text,
                          Stored stored) {
-    std::string packId(Channel::parseData(text).packId);
+    Channel::DataPiece const piece = Channel::parseData(text);
+    std::string packId(piece.packId);
     if (!maySend(packId, connection))
         return stored(notItsOwn(packId));
-    waiting_.push_back({std::move(packId), std::move(text), std::move(stored)});
-    storeWaiting();
+    isEndWaiting_ = isEndWaiting_ || (piece.document.empty() && piece.isLast());
+    await({std::move(packId), std::move(text), std::move(stored)});
+    storeSoon();
+}
+
+/// More is on its way unless a pack is at its end, or its client waits for word of what it has sent.
+void PackReception::storeSoon() {
+    if (!surroundings_.soon || isEndWaiting_ || waitingBytes_ >= ENOUGH_BYTES)
+        return storeWaiting();
+    if (waiting_.empty() || isStoring_ || std::exchange(isReminded_, true))
+        return;
+    surroundings_.soon([this] {
+        isReminded_ = false;
+        storeWaiting();
+    });
 }
 
 /// All that came while the disk was busy goes there at once.
 void PackReception::storeWaiting() {
     if (waiting_.empty() || std::exchange(isStoring_, true))
         return;
+    waitingBytes_ = 0;
+    isEndWaiting_ = false;
     auto const pieces = std::make_shared<Pieces>(std::exchange(waiting_, {}));
     surroundings_.onStoreThread([this, pieces, shelf = shelf_, onOwnThread = surroundings_.onOwnThread] {
         std::stable_sort(pieces->begin(), pieces->end(),
@@ -308,7 +332,7 @@ void PackReception::storeWaiting() {
         onOwnThread([this, dropped = shelf->dropped()] {
             isStoring_ = false;
             eraseAll(dropped);
-            storeWaiting();
+            storeSoon();
         });
     });
 }
@@ -320,6 +344,7 @@ void PackReception::eraseAll(std::set<std::string> const& packIds) {
 
 void PackReception::complete(std::string const& packId,
                              std::function<void(std::string const& failure)> done) {
+    storeWaiting();
     surroundings_.onStoreThread(
         [this, packId, shelf = shelf_, onOwnThread = surroundings_.onOwnThread, done] {
             std::string const failure = failureOf([&] { shelf->complete(packId); });

@@ -32,6 +32,9 @@ struct ReceptionSurroundings {
     /// How many bytes the packs of a node may have together.
     std::function<std::optional<long long>(std::string const& cfgId)> quota;
     std::function<bool(std::string const& cfgId)> isDisabled;
+    /// Runs work on the reception's own thread some milliseconds later, so that pieces that come one upon the
+    /// other go to the disk at once. Without it none waits for another.
+    std::function<void(Work)> soon = {};
 };
 
 /// Used by one thread, which never waits for the disk. One connection at a time sends a pack: whoever began
@@ -81,8 +84,10 @@ private:
     /// What the store's thread has to itself.
     class Shelf;
 
+    void storeSoon();
     void storeWaiting();
     void letSend(std::string const& packId, Sender const& sender);
+    void await(Piece piece);
     void erase(std::string const& packId);
     void eraseMore(std::string const& packId);
     void eraseBy(std::string const& packId, std::function<bool()> const& step);
@@ -97,7 +102,12 @@ private:
     std::map<std::string, Sender> senders_;
     /// Those that the store's thread has not been given yet.
     Pieces waiting_;
+    std::size_t waitingBytes_ = 0;
+    /// Whether one that waits is the last of its pack.
+    bool isEndWaiting_ = false;
     bool isStoring_ = false;
+    /// Whether it has asked to be reminded of those that wait.
+    bool isReminded_ = false;
     /// Packs that something kept from being erased.
     std::set<std::string> unerased_;
 };

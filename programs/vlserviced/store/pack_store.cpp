@@ -25,7 +25,7 @@ using State = KeptPack::State;
 constexpr int APPLICATION_ID = 0x564C5350;
 
 /// Large pages suit what is long; what is freed goes back to the disk in steps.
-constexpr char const* BEGINNING = "PRAGMA page_size = 32768; PRAGMA auto_vacuum = INCREMENTAL";
+constexpr char const* BEGINNING = "PRAGMA page_size = 32768; PRAGMA auto_vacuum = INCREMENTAL; PRAGMA cache_size = -8192";
 
 /// A pack's state is that of KeptPack. Of an erased one the title is empty.
 constexpr char const* SCHEMA_1 = R"sql(

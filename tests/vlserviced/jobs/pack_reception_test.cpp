@@ -42,7 +42,7 @@ protected:
 
     using Connection = std::shared_ptr<NoProcessor>;
 
-    void open(fs::path const& file) {
+    void open(fs::path const& file, std::function<void(std::function<void()>)> const& soon = {}) {
         store_ = VlServiced::openSqlitePackStore(file);
         reception_.emplace(store_, jobs_,
                            VlServiced::ReceptionSurroundings{
@@ -55,6 +55,7 @@ protected:
                                [this] { return now_; },
                                [this](std::string const&) { return quota_; },
                                [](std::string const& node) { return node == "a=closed"; },
+                               soon,
                            });
     }
     void doWork() {
@@ -198,6 +199,67 @@ TEST_F(PackReceptionTest, TakesAllThatCameMeanwhileAtOnce) {
     worksAtOnce_ = true;
     EXPECT_EQ(complete("p1"), "");
     EXPECT_EQ(complete("p2"), "");
+}
+
+/// Pieces go to the disk when a test says that some time has passed.
+class PackReceptionWithTime : public PackReceptionTest {
+protected:
+    PackReceptionWithTime() {
+        open(file_, [this](std::function<void()> work) { reminders_.push_back(std::move(work)); });
+        begin(pack_);
+    }
+    void take(std::string const& text) {
+        reception_->take(connection_, text, [this](std::string const& failure) { told_.push_back(failure); });
+    }
+    void letTimePass() {
+        for (auto const& work : std::exchange(reminders_, {}))
+            work();
+    }
+
+    SentPack pack_{"p1"};
+    std::vector<std::function<void()>> reminders_;
+    std::vector<std::string> told_;
+};
+
+TEST_F(PackReceptionWithTime, PutsPiecesOnTheDiskAtOnceThatComeOneUponTheOther) {
+    take(pack_.text(0));
+    take(pack_.text(1));
+    EXPECT_THAT(told_, testing::IsEmpty());
+    EXPECT_EQ(reminders_.size(), 1u);
+    letTimePass();
+    EXPECT_THAT(told_, testing::ElementsAre("", ""));
+    take(pack_.text(2));
+    EXPECT_EQ(told_.size(), 2u);
+    EXPECT_EQ(reminders_.size(), 1u);
+}
+
+TEST_F(PackReceptionWithTime, LetsTheEndOfAPackWaitForNothing) {
+    for (std::size_t i = 0; i < pack_.pages.size(); ++i)
+        take(pack_.text(i));
+    EXPECT_THAT(told_, testing::ElementsAre("", "", "", ""));
+    EXPECT_EQ(complete("p1"), "");
+}
+
+TEST_F(PackReceptionWithTime, LetsNothingWaitThatIsEnoughForATransaction) {
+    pack_ = SentPack("p2");
+    pack_.pages.front().blob.resize(5 * Channel::MAX_PIECE, 'x');
+    pack_.settle();
+    begin(pack_);
+    for (std::size_t piece = 0; piece < 3; ++piece)
+        take(pack_.text(0, piece * Channel::MAX_PIECE, Channel::MAX_PIECE));
+    EXPECT_THAT(told_, testing::IsEmpty());
+    take(pack_.text(0, 3 * Channel::MAX_PIECE, Channel::MAX_PIECE));
+    EXPECT_THAT(told_, testing::ElementsAre("", "", "", ""));
+    letTimePass();
+    EXPECT_EQ(told_.size(), 4u);
+}
+
+TEST_F(PackReceptionWithTime, LooksWhetherAPackIsWholeBehindWhatWaits) {
+    for (std::size_t i = 0; i + 1 < pack_.pages.size(); ++i)
+        take(pack_.text(i));
+    EXPECT_EQ(complete("p1"),
+              "pack p1 is not whole: page 4 of 4 is missing, counting its metadata [mailing-damaged]");
+    EXPECT_THAT(told_, testing::ElementsAre("", "", ""));
 }
 
 TEST_F(PackReceptionTest, LetsWhoBeganLastGoOn) {
