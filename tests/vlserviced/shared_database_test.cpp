@@ -2,30 +2,40 @@
 #include "programs/base/error.h"
 #include "programs/channel/stream.h"
 #include "programs/database/postgres_connection.h"
+#include "programs/protocol/carrier.h"
+#include "programs/protocol/job.h"
 #include "programs/vlmail/commands/service_options.h"
 #include "programs/vlmail/mailings/pack_delivery.h"
+#include "programs/vlmail/mailings/pack_upload.h"
 #include "programs/vlmail/service/service_client.h"
 #include "tests/channel/test_certificate.h"
+#include "tests/faults/fault.h"
 #include "tests/support/failure_of.h"
 #include "tests/support/postgres_server.h"
 #include "tests/support/taking_carrier.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/two_networks.h"
+#include "tests/vlserviced/letter_help.h"
 #include "tests/vlserviced/pack_help.h"
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/ipc/get_svc_cfg.h"
 #include "vlservice/ipc/process_pack.h"
 #include "vlservice/ipc/set_svc_cfg.h"
+#include "vlservice/ipc/update_status.h"
 #include "vlservice/ipc/upload_queued.h"
 
+#include <SQLiteCpp/Database.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <csignal>
+#include <fstream>
+#include <iterator>
 #include <map>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <sstream>
 #include <thread>
 
@@ -70,6 +80,16 @@ protected:
     }
     void setUploadFolder() {
         client(0)->call<Ipc::SetSvcCfg>(json::Object{{"upload_folder", upload_.string()}});
+    }
+    /// That the second one knows in the end what is set by the first.
+    void expectToldOfSettings() {
+        auto const overview = [this] { return print(client(1)->call<Ipc::GetSvcCfg>()->resp()); };
+        EXPECT_THAT(overview(), testing::Not(HasSubstr(upload_.string())));
+        setUploadFolder();
+        Database::PostgresConnection database(database_.address());
+        for (int i = 0; i < 300 && overview().find(upload_.string()) == std::string::npos; ++i)
+            pass(database, "0.1");
+        EXPECT_THAT(overview(), HasSubstr(upload_.string()));
     }
     VlMail::ServiceLine lineTo(std::size_t number) {
         return VlMail::ServiceLine([this, number] { return client(number); },
@@ -146,13 +166,15 @@ TEST_F(SharedDatabaseTest, MakesAContainerAnewWhoseMachineIsGone) {
 TEST_F(SharedDatabaseTest, TellsTheOthersOfSettingsThatHaveChanged) {
     start(0);
     start(1);
-    auto const overview = [this] { return print(client(1)->call<Ipc::GetSvcCfg>()->resp()); };
-    EXPECT_THAT(overview(), testing::Not(HasSubstr(upload_.string())));
-    setUploadFolder();
-    Database::PostgresConnection database(database_.address());
-    for (int i = 0; i < 50 && overview().find(upload_.string()) == std::string::npos; ++i)
-        pass(database, "0.1");
-    EXPECT_THAT(overview(), HasSubstr(upload_.string()));
+    expectToldOfSettings();
+}
+
+TEST_F(SharedDatabaseTest, HasTheOthersLookForSettingsThatNoNoticeTellsOf) {
+    start(0);
+    start(1);
+    Database::PostgresConnection(database_.address())
+        .run("DROP TRIGGER service_settings_changed ON service_settings");
+    expectToldOfSettings();
 }
 
 TEST_F(SharedDatabaseTest, HandsEachAnsweredPackOverOnceWhateverDiesOrStandsStill) {
@@ -255,6 +277,153 @@ TEST_F(SharedDatabaseTest, GoesOnWithWhatAFolderHeldThatWasMovedThere) {
     while (carrier.taken().empty())
         owner->call<Ipc::GetSvcCfg>();
     EXPECT_EQ(carrier.taken(), (std::map<std::string, int>{{"p1.mailing", 1}}));
+}
+
+/// A data folder whose service has brought a mailing, or a letter, into each state, and was killed then.
+class FolderWithMailingsInEachState : public SharedDatabaseTest {
+protected:
+    void SetUp() override {
+        SharedDatabaseTest::SetUp();
+        if (IsSkipped())
+            return;
+        write("program",
+              "#!/bin/sh\ncd '" + folder_.path().string() + "'\n[ -e refuses ] && exit 1\necho $1 >>had\n");
+        fs::permissions(folder_ / "program", fs::perms::owner_all);
+        startOnFile();
+        setUploadFolder();
+    }
+
+    /// Without the database, on the folder's own.
+    void startOnFile(ServiceProcess::Environment const& more = {}) {
+        services_[0].reset();
+        services_[0] = std::make_unique<ServiceProcess>(
+            std::vector<std::string>{"--data", data(0).string(), "--no-discovery"}, more);
+    }
+    void write(char const* name, std::string const& text) const { std::ofstream(folder_ / name) << text; }
+    void add(std::string const& id, std::string const& preset = "", bool upload = false) {
+        storePack(folder_ / "packs.db", id, "a=acme", preset);
+        auto line = lineTo(0);
+        VlMail::deliverPack(line, folder_ / "packs.db", id, upload);
+    }
+    void report(std::string const& id, std::string const& state) {
+        add(id, "", true);
+        await(id, "submitted");
+        std::ofstream(upload_ / (id + ".mailing.status")) << "{\"state\": \"" << state << "\"}";
+    }
+    void addLetters(std::string const& id, std::vector<std::string> const& channels) {
+        storeLetters(folder_ / "packs.db", id, channels);
+        auto line = lineTo(0);
+        Mailing::OwnPackReader pack(folder_ / "packs.db", id);
+        VlMail::uploadPack(line, pack);
+        VlMail::ask(*client(0), Protocol::JobsChange(Protocol::JobAction::Upload, {id}));
+    }
+    void setCarrier() {
+        json::Object const sms{{"type", "command"},
+                               {"program", (folder_ / "program").string()},
+                               {"arguments", parse(R"({"all":["{key}"]})").get("all")}};
+        client(0)->call<Ipc::SetSvcCfg>(json::Object{{"carriers", json::Object{{"sms", sms}, {"fax", sms}}}});
+        VlMail::ask(*client(0), Protocol::CarrierChange(Protocol::CarrierAction::Pause, "fax"));
+    }
+    /// "submitted", or of letters "delivering: accepted: waiting".
+    std::map<std::string, std::string> states() {
+        Protocol::JobsQuery query;
+        query.letters = true;
+        std::map<std::string, std::string> states;
+        for (Protocol::JobReport const& job : Protocol::JobsAnswer(VlMail::ask(*client(0), query)).jobs) {
+            std::string& state = states[job.id] = Protocol::stateName(job.state);
+            for (Protocol::LetterReport const& letter : job.letters)
+                state += std::string(": ") + Protocol::letterStateName(letter.state);
+        }
+        return states;
+    }
+    void await(std::string const& id, std::string const& state) {
+        Database::PostgresConnection clock(database_.address());
+        for (int i = 0; i < 300 && states()[id] != state; ++i)
+            pass(clock, "0.1");
+        EXPECT_EQ(states()[id], state) << id;
+    }
+    void change(Protocol::JobAction action, std::string const& id) {
+        VlMail::ask(*client(0), Protocol::JobsChange(action, {id}));
+    }
+    /// Killed in front of the renaming that publishes it.
+    void killWhileItSubmits(std::string const& id) {
+        add(id);
+        signal(0, SIGKILL);
+        services_[0]->wait();
+        startOnFile(Faults::environmentOf({"rename", 0, 1}, folder_ / "calls"));
+        try {
+            change(Protocol::JobAction::Upload, id);
+        } catch (std::exception const&) {
+            // It dies of that.
+        }
+        EXPECT_EQ(services_[0]->wait(), -SIGKILL);
+    }
+};
+
+TEST_F(FolderWithMailingsInEachState, IsGoneOnWithWhereItWasOnceItWasMoved) {
+    using Protocol::JobAction;
+    add("held", R"("process_mode": 8, )");
+    add("tried", R"("process_mode": 128, )");
+    add("cancelled");
+    change(JobAction::Cancel, "cancelled");
+    add("queued");
+    report("delivered", "delivered");
+    report("failed", "failed");
+    add("submitted", "", true);
+    add("lodged", "", true);
+    for (char const* const id : {"submitted", "lodged"})
+        await(id, "submitted");
+    fs::remove(upload_ / "lodged.mailing");
+    client(0)->call<Ipc::UpdateStatus>("", "");
+    setCarrier();
+    write("refuses", "");
+    addLetters("refused", {"sms"});
+    await("refused", "failed: failed");
+    fs::remove(folder_ / "refuses");
+    addLetters("taken", {"sms", "fax"});
+    await("taken", "delivering: accepted: waiting");
+    addLetters("waiting", {"fax"});
+    await("waiting", "delivering: waiting");
+    killWhileItSubmits("submitting");
+    {
+        SQLite::Database database((data(0) / "service.db").string(), SQLite::OPEN_READWRITE);
+        EXPECT_EQ(database.execAndGet("SELECT state FROM jobs WHERE pack = 'submitting'").getString(),
+                  "submitting");
+        // As the end of a process leaves it that had begun with it.
+        database.exec("UPDATE letters SET state = 'handed over' WHERE pack = 'taken' AND number = 2");
+    }
+    ServiceProcess moving({"--data", data(0).string(), "--migrate-to", database_.address()});
+    ASSERT_EQ(moving.wait(), 0) << moving.errors();
+    start(0);
+    await("submitting", "submitted");
+    await("taken", "delivering: accepted: uncertain");
+    EXPECT_EQ(states(), (std::map<std::string, std::string>{{"held", "held"},
+                                                            {"tried", "tried"},
+                                                            {"cancelled", "cancelled"},
+                                                            {"queued", "queued"},
+                                                            {"delivered", "delivered"},
+                                                            {"failed", "failed"},
+                                                            {"lodged", "lodged"},
+                                                            {"submitted", "submitted"},
+                                                            {"submitting", "submitted"},
+                                                            {"refused", "failed: failed"},
+                                                            {"taken", "delivering: accepted: uncertain"},
+                                                            {"waiting", "delivering: waiting"}}));
+    change(JobAction::Release, "held");
+    for (char const* const id : {"held", "queued"})
+        change(JobAction::Upload, id);
+    VlMail::ask(*client(0), Protocol::CarrierChange(Protocol::CarrierAction::Resume, "fax"));
+    for (char const* const id : {"held", "queued"})
+        await(id, "submitted");
+    await("waiting", "lodged: accepted");
+    std::set<std::string> containers;
+    for (fs::directory_entry const& entry : fs::directory_iterator(upload_))
+        if (entry.path().extension() == ".mailing")
+            containers.insert(entry.path().stem().string());
+    EXPECT_EQ(containers,
+              (std::set<std::string>{"delivered", "failed", "held", "queued", "submitted", "submitting"}));
+    std::ifstream had(folder_ / "had");
+    EXPECT_EQ(std::string(std::istreambuf_iterator<char>(had), {}), "taken-1\nwaiting-1\n");
 }
 
 class ServicesOnAnotherMachine : public testing::Test {
