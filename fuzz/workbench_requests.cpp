@@ -3,10 +3,12 @@
 // patterns of the settings is left to the targets for patterns, which know what they cost.
 
 #include "fuzz/private_folder.h"
+#include "programs/base/error.h"
 #include "programs/vlmail/workbench/admission.h"
 #include "programs/vlmail/workbench/desk.h"
 #include "programs/vlmail/workbench/document_list.h"
 #include "programs/vlmail/workbench/page_files.h"
+#include "programs/vlmail/workbench/printed_picture.h"
 #include "programs/vlmail/workbench/request.h"
 #include "vlservice/json/json_text.h"
 
@@ -46,6 +48,24 @@ void checkEdited(Answer const& answer) {
         std::abort();
 }
 
+/// Printed pages are read by the settings first. Which side is asked for is told in a form of its own.
+bool asksForPrinted(std::string const& body) {
+    try {
+        json::Object const query = json::strToObject(body.data(), body.size());
+        if (auto const side = sideIn(query.get("side"))) {
+            auto const again = sideIn(json::Value(toJson(*side)));
+            if (!again || again->kind != side->kind || again->page != side->page ||
+                again->attachment != side->attachment)
+                std::abort();
+        }
+        return query.get("settings").isString();
+    } catch (json::Exc const&) {
+        return false;
+    } catch (Base::Error const&) {
+        return false;
+    }
+}
+
 Answer answerTo(Request const& request) {
     if (auto refusal = ADMISSION.refusalOf(request))
         return *refusal;
@@ -58,7 +78,7 @@ Answer answerTo(Request const& request) {
     if (request.token != ADMISSION.token)
         std::abort();
     std::string const name = request.target.substr(std::string_view(API).size());
-    if (!runsNoPatterns(name))
+    if (!runsNoPatterns(name) || asksForPrinted(request.body))
         return {200, "text/plain", ""};
     Answer answer = desk().answer(name, request.body);
     if (name == "edit" || name == "adopt")

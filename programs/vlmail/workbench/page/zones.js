@@ -8,6 +8,8 @@ const MILLIMETRE = 100;
 const REACH_PX = 7;
 /** A pointer that moves less has clicked. */
 const STILL_PX = 3;
+/** The share of a page that is as good as all of it. */
+const WHOLE_PAGE = 0.9;
 const EDGES = ["left", "top", "right", "bottom"];
 const HANDLES = ["lt", "t", "rt", "r", "rb", "b", "lb", "l"];
 const FIRST = { left: 2000, top: 10000, right: 9000, bottom: 12000 };
@@ -191,10 +193,18 @@ export class ZoneTools {
         const zone = this.#zoneOf(event.target);
         if (!zone?.pointer || !this.#markOf(zone.pointer))
             return;
-        this.#begin(zone, event.target.dataset.edges ?? "m", this.canvas.placeOf(event));
+        const edges = event.target.dataset.edges ?? "m";
+        if (edges !== "m" || !this.#isWholePage(zone))
+            this.#begin(zone, edges, this.canvas.placeOf(event));
         const mark = event.target.closest("[data-place]");
         mark.focus({ preventScroll: true });
         event.preventDefault();
+    }
+
+    /** Whoever presses such a zone means the page: it is moved by its edges and by keys alone. */
+    #isWholePage({ box }) {
+        const { width, height } = this.canvas.size;
+        return (box.right - box.left) * (box.bottom - box.top) > WHOLE_PAGE * width * height;
     }
 
     #drag(event) {

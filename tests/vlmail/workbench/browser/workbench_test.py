@@ -558,6 +558,41 @@ class Saving(BrowserTest):
         page.wait(lambda: not page.find("#lint li.error"), "no errors")
 
 
+class FiveMinutes(BrowserTest):
+    """What the documents tell of setting up a new invoice, as somebody does it who has never seen the JSON."""
+
+    def test_a_new_invoice_is_set_up_without_looking_at_the_json(self):
+        at.look(self.driver, size=(1400, 1000))
+        bench = self.begin("office")
+        bench.write("{}\n")
+        page = self.page_of(bench).wait_for_picture()
+        page.one("#propose").click()
+        self.assertEqual(page.one("dialog[open] .wide").get_attribute("value"), "Invoice \\d+\\.pdf")
+        self.assertIn("Invoice 17.pdf, Invoice 18.pdf, Invoice 19.pdf", page.texts("dialog[open]")[0])
+        page.one('dialog[open] button[value="accept"]').click()
+        page.wait_for_field("number", "2024-17")
+        proposed = page.settings()
+        page.drag('#stage .zone[aria-label="address window _Address"]', (1.5, 0.5), (20, 10))
+        self.assertEqual(page.one("#zone-form input").get_attribute("value"), "Email")
+        page.one("#draw").click()
+        self.assertEqual(page.settings(), proposed)
+        page.drag('#stage .zone[aria-label="address window _Address"]', (1.03, -0.15), (85, 24))
+        page.select("dialog[open] select", "2")
+        choice = page.run("return document.querySelector('dialog[open] select').selectedOptions[0].textContent")
+        self.assertEqual(choice, "what follows \u201cCustomer:\u201d: C-1008")
+        self.assertEqual(page.one("dialog[open] input[autocomplete=off]").get_attribute("value"), "customer")
+        self.write_picture(page, "workbench-new-field.png")
+        page.one('dialog[open] button[value="accept"]').click()
+        page.wait_for_field("customer", "C-1008")
+        page.chord(at.keys().CONTROL, "s")
+        page.one('dialog[open] button[value="accept"]').click()
+        page.until("document.querySelector('#message').innerText.startsWith('Saved in ')", "the saving")
+        letter = [VLMAIL, "letter", os.path.join(bench.folder, "Invoice 17.pdf"), "--settings", bench.settings, "--json"]
+        read = json.loads(subprocess.run(letter, stdout=subprocess.PIPE, check=True).stdout)["letters"][0]
+        self.assertEqual(read["production_ready"], True)
+        self.assertIn("C-1008", json.dumps([field for field in read["fields"] if field["name"] == "customer"]))
+
+
 class Safety(BrowserTest):
     def test_a_wrong_token_host_or_origin_is_refused(self):
         bench = self.begin("office")
