@@ -26,6 +26,9 @@ bool isSaid(std::string const& text, std::string const& part) { return text.find
 
 std::vector<std::string> SentMail::run(Fault const& fault) {
     before_ = mailings();
+    // All would seem to be new.
+    if (!findings_.empty())
+        return std::exchange(findings_, {});
     Ended const ended = send(fault);
     for (std::string const& wrong : faultsInEnd(fault, ended))
         find(wrong);

@@ -348,6 +348,7 @@ protected:
     /// Killed in front of the renaming that publishes it.
     void killWhileItSubmits(std::string const& id) {
         add(id);
+        await(id, "queued");
         signal(0, SIGKILL);
         services_[0]->wait();
         startOnFile(Faults::environmentOf({"rename", 0, 1}, folder_ / "calls"));
@@ -367,6 +368,8 @@ TEST_F(FolderWithMailingsInEachState, IsGoneOnWithWhereItWasOnceItWasMoved) {
     add("cancelled");
     change(JobAction::Cancel, "cancelled");
     add("queued");
+    for (char const* const id : {"held", "tried", "queued"})
+        await(id, id);
     report("delivered", "delivered");
     report("failed", "failed");
     add("submitted", "", true);
@@ -375,6 +378,8 @@ TEST_F(FolderWithMailingsInEachState, IsGoneOnWithWhereItWasOnceItWasMoved) {
         await(id, "submitted");
     fs::remove(upload_ / "lodged.mailing");
     client(0)->call<Ipc::UpdateStatus>("", "");
+    for (char const* const id : {"delivered", "failed", "lodged"})
+        await(id, id);
     setCarrier();
     write("refuses", "");
     addLetters("refused", {"sms"});
