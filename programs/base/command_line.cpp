@@ -1,6 +1,7 @@
 #include "programs/base/command_line.h"
 
 #include "programs/base/option_lines.h"
+#include "programs/base/read_file.h"
 
 #include <CLI/CLI.hpp>
 
@@ -168,6 +169,10 @@ bool CommandLine::read(int argc, char const* const* argv, std::ostream& out) {
         return true;
     } catch (OptionLineError const& wrong) {
         throw UsageError(app_->get_config_ptr()->as<std::string>() + ", " + wrong.what());
+    } catch (CLI::FileError const& wrong) {
+        // It does not tell why the file cannot be read.
+        readFile(app_->get_config_ptr()->as<std::string>());
+        throw UsageError(wrong.what());
     } catch (CLI::ParseError const& wrong) {
         // Asking for help is one of them.
         if (wrong.get_exit_code() != 0)

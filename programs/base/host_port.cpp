@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cerrno>
 #include <charconv>
+#include <system_error>
 
 namespace Base {
 namespace {
@@ -45,6 +47,22 @@ bool isHost(std::string_view host) {
            std::all_of(host.begin(), host.end(), [](unsigned char c) {
                return std::isalnum(c) || std::string_view(".-_:%").find(static_cast<char>(c)) < 5;
            });
+}
+
+std::string whyNotListening(int error) {
+    auto const remedy = [error] {
+        switch (error) {
+        case EADDRINUSE:
+            return "end what listens there, or listen elsewhere";
+        case EADDRNOTAVAIL:
+            return "name an address of this machine";
+        case EACCES:
+            return "get the right to, which ports below 1024 want, or listen elsewhere";
+        default:
+            return "listen elsewhere";
+        }
+    };
+    return std::generic_category().message(error) + "; " + remedy();
 }
 
 } // namespace Base

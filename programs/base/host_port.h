@@ -25,4 +25,7 @@ std::optional<HostPort> hostPortIn(std::string_view text);
 /// Whether it can be the host of an address: 1 to 255 letters, digits and ".-_:%" of ASCII.
 bool isHost(std::string_view host);
 
+/// Why nobody can listen at an address or a path, by `errno`, and what to do about it.
+std::string whyNotListening(int error);
+
 } // namespace Base

@@ -1,6 +1,7 @@
 #include "programs/channel/server.h"
 
 #include "programs/base/error.h"
+#include "programs/base/host_port.h"
 #include "programs/channel/peer.h"
 #include "programs/channel/token.h"
 
@@ -63,7 +64,7 @@ tcp::acceptor listenOn(asio::io_context& io, tcp::endpoint const& endpoint, int 
         return socket < 0 ? tcp::acceptor(io, endpoint) : tcp::acceptor(io, endpoint.protocol(), socket);
     } catch (boost::system::system_error const& e) {
         std::ostringstream message;
-        message << "Cannot listen on " << endpoint << ": " << e.code().message() << '.';
+        message << "Cannot listen on " << endpoint << ": " << Base::whyNotListening(e.code().value()) << '.';
         throw Base::Error(Base::Code::AddressUnusable, message.str());
     }
 }

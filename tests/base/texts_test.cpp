@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <limits>
 #include <optional>
 #include <string>
@@ -86,6 +87,16 @@ TEST(HostAndPort, AreRefusedWhenOneIsMissingOrNone) {
                                    "a\n:80", "a/b:80", "user@host:80", "h\xC3\xBC:80"})
         EXPECT_FALSE(Base::hostPortIn(text)) << text;
     EXPECT_FALSE(Base::hostPortIn(std::string(256, 'a') + ":80"));
+}
+
+TEST(WhyNobodyCanListen, GoesWithWhatToDo) {
+    EXPECT_EQ(Base::whyNotListening(EADDRINUSE),
+              "Address already in use; end what listens there, or listen elsewhere");
+    EXPECT_EQ(Base::whyNotListening(EADDRNOTAVAIL),
+              "Cannot assign requested address; name an address of this machine");
+    EXPECT_EQ(Base::whyNotListening(EACCES),
+              "Permission denied; get the right to, which ports below 1024 want, or listen elsewhere");
+    EXPECT_EQ(Base::whyNotListening(ENOENT), "No such file or directory; listen elsewhere");
 }
 
 } // namespace

@@ -474,7 +474,8 @@ TEST(Servers, RefuseWhatTheyCannotListenOn) {
     boost::asio::ip::tcp::acceptor const taken(io, {boost::asio::ip::address_v4::loopback(), 0});
     settings.port = taken.local_endpoint().port();
     EXPECT_EQ(refusal(settings),
-              "Cannot listen on 127.0.0.1:" + std::to_string(settings.port) + ": Address already in use.");
+              "Cannot listen on 127.0.0.1:" + std::to_string(settings.port) +
+                  ": Address already in use; end what listens there, or listen elsewhere.");
 }
 
 } // namespace

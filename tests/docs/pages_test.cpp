@@ -26,6 +26,23 @@ TEST(Pages, NamePlacesThatAreThere) { EXPECT_THAT(missingPlaces(SOURCE_FOLDER), 
 
 TEST(Pages, NameTestsThatAreThere) { EXPECT_THAT(missingTests(SOURCE_FOLDER), IsEmpty()); }
 
+/// The words of a list that a line of a file begins.
+std::string listIn(char const* file, std::string const& begin, char end) {
+    std::ifstream in(fs::path(SOURCE_FOLDER) / file);
+    for (std::string line; std::getline(in, line);)
+        if (std::size_t const at = line.find(begin); at != std::string::npos)
+            return line.substr(at + begin.size(), line.find(end, at) - at - begin.size());
+    return {};
+}
+
+TEST(Workflow, TakesEveryStepThatAPersonCanCheck) {
+    std::string const steps = listIn("scripts/check", "steps=(", ')');
+    EXPECT_THAT(steps, testing::HasSubstr("dev"));
+    EXPECT_EQ(
+        std::regex_replace(listIn(".github/workflows/check.yml", "step: [", ']'), std::regex(", "), " "),
+        steps);
+}
+
 /// By their numbers, each with the text up to the next.
 std::map<int, std::string> promisesOf(fs::path const& page) {
     std::regex const numbered(R"((\d+)\. \*\*.*)");

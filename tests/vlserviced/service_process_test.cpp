@@ -139,7 +139,8 @@ TEST_F(ServiceProcessTest, FailsWithOneLineThatSaysWhatIsWrong) {
     std::ofstream(folder_ / "file") << "x";
     EXPECT_EQ(startFailure({"--data", (folder_ / "file").string()}),
               "vlserviced: cannot write into the folder " + (folder_ / "file").string() +
-                  ": Not a directory [data-folder-unusable]\n");
+                  ": Not a directory; give this user the right to, or name another folder "
+                  "[data-folder-unusable]\n");
     fs::create_directory(data_);
     std::ofstream(data_ / "service.db") << std::string(5000, 'x');
     EXPECT_EQ(startFailure(arguments()), "vlserviced: " + (data_ / "service.db").string() +
@@ -148,6 +149,29 @@ TEST_F(ServiceProcessTest, FailsWithOneLineThatSaysWhatIsWrong) {
     std::string const text = startFailure(arguments({"--listen", "nowhere"}));
     EXPECT_TRUE(text.starts_with("vlserviced: ")) << text;
     EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1) << text;
+}
+
+TEST_F(ServiceProcessTest, EndsWhereItsPortIsTakenAndLeavesWhoeverListensThereAlone) {
+    ServiceProcess const first(arguments());
+    std::string const port = std::to_string(first.port());
+    EXPECT_EQ(
+        startFailure({"--data", (folder_ / "second").string(), "--no-discovery", "--port", port}),
+        "vlserviced: Cannot listen on 127.0.0.1:" + port +
+            ": Address already in use; end what listens there, or listen elsewhere. [address-unusable]\n");
+    EXPECT_NO_THROW(clientOf(first, data_)->call<Ipc::GetSvcCfg>());
+}
+
+TEST_F(ServiceProcessTest, EndsOverADatabaseOfANewerVersionAndLeavesItAsItIs) {
+    { ServiceProcess const first(arguments()); }
+    fs::path const file = data_ / "service.db";
+    SQLite::Database database(file.string(), SQLite::OPEN_READWRITE);
+    int const known = database.execAndGet("PRAGMA user_version").getInt();
+    database.exec("PRAGMA user_version = 1000000");
+    EXPECT_EQ(startFailure(arguments()),
+              "vlserviced: the service database " + file.string() +
+                  " was written by a newer version of this program (schema 1000000, known is " +
+                  std::to_string(known) + "): use that version [database-newer]\n");
+    EXPECT_EQ(database.execAndGet("PRAGMA user_version").getInt(), 1000000);
 }
 
 /// The page of metrics behind a socket.

@@ -70,6 +70,23 @@ TEST_F(ManagedServices, EndWithOneLineForAFileOfOptionsThatIsWrong) {
                                     ", line 3: there is no option \"prot\"; --help explains [usage]\n");
 }
 
+TEST_F(ManagedServices, EndWithOneLineForAFileOfOptionsThatIsCutOff) {
+    ServiceProcess service(config("port = 71"));
+    EXPECT_EQ(service.wait(), 1);
+    EXPECT_EQ(service.errors(), "vlserviced: " + (folder_ / "conf").string() +
+                                    ", line 3: does not end with a line feed; the file may be cut off; "
+                                    "--help explains [usage]\n");
+    EXPECT_FALSE(fs::exists(data_));
+}
+
+TEST_F(ManagedServices, EndWithOneLineForAFileOfOptionsThatIsNotThere) {
+    fs::path const file = folder_ / "nowhere";
+    ServiceProcess service({"--config", file.string()});
+    EXPECT_EQ(service.wait(), 1);
+    EXPECT_EQ(service.errors(),
+              "vlserviced: " + file.string() + ": there is no such file; check the name [file-unreadable]\n");
+}
+
 TEST_F(ManagedServices, AnswerOnTheSocketThatTheyAreHanded) {
     tcp::acceptor listening(io_, {asio::ip::address_v4::loopback(), 0});
     ServiceProcess const service(config("port = 1\n"), {}, nullptr, listening.native_handle());
@@ -82,8 +99,8 @@ TEST_F(ManagedServices, RefuseASocketThatDoesNotListen) {
     tcp::socket silent(io_, tcp::v4());
     ServiceProcess service(config(), {}, nullptr, silent.native_handle());
     EXPECT_EQ(service.wait(), 1);
-    EXPECT_EQ(service.errors(),
-              "vlserviced: The socket that the system's manager hands over does not listen for TCP. [address-unusable]\n");
+    EXPECT_EQ(service.errors(), "vlserviced: The socket that the system's manager hands over does not listen "
+                                "for TCP. [address-unusable]\n");
 }
 
 TEST_F(ManagedServices, SayThatTheyAreReadyThatTheyLiveAndThatTheyEnd) {

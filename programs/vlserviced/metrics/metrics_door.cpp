@@ -70,9 +70,9 @@ tcp::endpoint endpointIn(std::string const& place) {
     return {address, port};
 }
 
-[[noreturn]] void failToListen(std::string const& place, std::string const& why) {
-    throw Base::Error(Base::Code::AddressUnusable,
-                      "Cannot listen for metrics on " + Base::oneLine(place) + ": " + why + '.');
+[[noreturn]] void failToListen(std::string const& place, error_code const& why) {
+    throw Base::Error(Base::Code::AddressUnusable, "Cannot listen for metrics on " + Base::oneLine(place) +
+                                                       ": " + Base::whyNotListening(why.value()) + '.');
 }
 
 bool isSocket(std::string const& path) {
@@ -100,7 +100,7 @@ Local::acceptor listenAt(asio::io_context& io, std::string const& path) {
     error_code failure;
     acceptor.bind(Local::endpoint(path), failure);
     if (failure)
-        failToListen(std::string(UNIX) + path, failure.message());
+        failToListen(std::string(UNIX) + path, failure);
     // Nobody can connect before it listens.
     ::chmod(path.c_str(), S_IRUSR | S_IWUSR | S_IRGRP | S_IWGRP);
     acceptor.listen();
@@ -111,7 +111,7 @@ tcp::acceptor listenAt(asio::io_context& io, tcp::endpoint const& endpoint, std:
     try {
         return tcp::acceptor(io, endpoint);
     } catch (boost::system::system_error const& failure) {
-        failToListen(place, failure.code().message());
+        failToListen(place, failure.code());
     }
 }
 

@@ -63,8 +63,10 @@ void makeWritableFolder(fs::path const& folder) {
             fs::permissions(folder, fs::perms::owner_all);
         Base::PendingFile const probe(folder / "probe");
     } catch (std::system_error const& failure) {
-        throw Base::Error(Base::Code::DataFolderUnusable, "cannot write into the folder " + folder.string() +
-                                                              ": " + failure.code().message());
+        throw Base::Error(Base::Code::DataFolderUnusable,
+                          "cannot write into the folder " + folder.string() + ": " +
+                              failure.code().message() +
+                              "; give this user the right to, or name another folder");
     }
 }
 

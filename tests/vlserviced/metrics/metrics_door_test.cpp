@@ -103,14 +103,16 @@ TEST_F(MetricsDoorTest, ListensOnNoOtherAddressThanALoopbackOne) {
 TEST_F(MetricsDoorTest, SaysThatAPortIsTaken) {
     MetricsDoor const first("127.0.0.1:0");
     EXPECT_EQ(failureOf([&] { MetricsDoor const second(first.place()); }),
-              "Cannot listen for metrics on " + first.place() + ": Address already in use.");
+              "Cannot listen for metrics on " + first.place() +
+                  ": Address already in use; end what listens there, or listen elsewhere.");
 }
 
 TEST_F(MetricsDoorTest, LeavesTheSocketAloneOfWhoeverListens) {
     MetricsDoor first("unix:" + file_.string());
     first.open(&hello);
     EXPECT_EQ(failureOf([&] { MetricsDoor const second(first.place()); }),
-              "Cannot listen for metrics on unix:" + file_.string() + ": Address already in use.");
+              "Cannot listen for metrics on unix:" + file_.string() +
+                  ": Address already in use; end what listens there, or listen elsewhere.");
     EXPECT_THAT(askedAt(file_), EndsWith("hello\n"));
 }
 
@@ -125,7 +127,8 @@ TEST_F(MetricsDoorTest, TakesThePlaceOfASocketThatAProcessHasLeft) {
 TEST_F(MetricsDoorTest, TakesThePlaceOfNoOtherFile) {
     std::ofstream(file_) << "precious";
     EXPECT_EQ(failureOf([&] { MetricsDoor const door("unix:" + file_.string()); }),
-              "Cannot listen for metrics on unix:" + file_.string() + ": Address already in use.");
+              "Cannot listen for metrics on unix:" + file_.string() +
+                  ": Address already in use; end what listens there, or listen elsewhere.");
     EXPECT_EQ(fs::file_size(file_), 8U);
 }
 

@@ -44,10 +44,11 @@ TEST(DataFolder, ThatCannotBeMadeIsNamed) {
     TemporaryFolder temporary;
     fs::path const file = temporary / "file";
     std::ofstream(file) << "x";
+    std::string const advice = "; give this user the right to, or name another folder";
     EXPECT_EQ(failureOf([&] { DataFolder folder(file); }),
-              "cannot write into the folder " + file.string() + ": Not a directory");
+              "cannot write into the folder " + file.string() + ": Not a directory" + advice);
     EXPECT_EQ(failureOf([&] { DataFolder folder(file / "below"); }),
-              "cannot write into the folder " + (file / "below").string() + ": Not a directory");
+              "cannot write into the folder " + (file / "below").string() + ": Not a directory" + advice);
 }
 
 TEST(DataFolder, ThatCannotBeWrittenIsNamed) {
