@@ -6,6 +6,8 @@
 #include "programs/vlmail/commands/settings.h"
 #include "programs/vlmail/service/service_documents.h"
 
+#include <chrono>
+#include <map>
 #include <memory>
 #include <utility>
 #include <vector>
@@ -23,11 +25,68 @@ NodeSettings settingsFromService(Channel::Client& service, std::string const& no
                                   "the service, at " + nodeInWords(nodeId));
 }
 
-FoundDocument fetched(ServiceLine& line, Protocol::StoredDocument const& document) {
-    std::string bytes =
-        line.repeat([&](Channel::Client& service) { return fetchDocument(service, document.sha256); });
-    return {"service:" + document.node + '/' + document.name,
-            std::make_shared<std::string const>(std::move(bytes))};
+using Bytes = std::shared_ptr<std::string const>;
+
+/// How a service is asked for documents.
+struct DocumentQuestions {
+    std::function<Protocol::DocumentsAnswer()> list;
+    std::function<Bytes(std::string const& sha256)> fetch;
+};
+
+DocumentsElsewhere documentsBy(DocumentQuestions const& questions, std::string const& nodeId) {
+    auto const known = std::make_shared<std::optional<Protocol::DocumentsAnswer>>();
+    auto const find = [questions, known](std::string const& id) -> std::optional<FoundDocument> {
+        try {
+            if (!*known)
+                *known = questions.list();
+            Protocol::StoredDocument const* const document = (*known)->find(id);
+            if (!document)
+                return std::nullopt;
+            return FoundDocument{"service:" + document->node + '/' + document->name,
+                                 questions.fetch(document->sha256)};
+        } catch (Base::Error const& failure) {
+            throw Base::Error(Base::Code::DocumentUnknown, std::string(Production::DOCUMENT_UNKNOWN) +
+                                                               "the service does not give \"" + id +
+                                                               "\": " + failure.what());
+        }
+    };
+    return {find,
+            " at " + nodeInWords(nodeId) +
+                " in the service; put it there with \"vlmail documents put\", or correct the pack preset"};
+}
+
+DocumentQuestions questionsBy(std::function<ServiceLine&()> const& line, std::string const& nodeId) {
+    return {
+        [=] { return line().repeat([&](Channel::Client& service) { return documentsOf(service, nodeId); }); },
+        [=](std::string const& sha256) {
+            return std::make_shared<std::string const>(
+                line().repeat([&](Channel::Client& service) { return fetchDocument(service, sha256); }));
+        }};
+}
+
+/// For a person who waits.
+constexpr Patience SHORT{std::chrono::milliseconds(500), std::chrono::milliseconds(100)};
+
+/// A line that is made when it is used first.
+std::function<ServiceLine&()> laterLine(ServiceLine::Connect connect) {
+    return [connect = std::move(connect),
+            line = std::make_shared<std::optional<ServiceLine>>()]() -> ServiceLine& {
+        return *line ? **line : line->emplace(connect, SHORT);
+    };
+}
+
+/// Keeps what was fetched last.
+std::function<Bytes(std::string const&)> keeping(std::function<Bytes(std::string const&)> fetch) {
+    constexpr std::size_t MOST = 16;
+    return [fetch = std::move(fetch),
+            kept = std::make_shared<std::map<std::string, Bytes>>()](std::string const& sha256) {
+        if (auto const known = kept->find(sha256); known != kept->end())
+            return known->second;
+        Bytes const bytes = fetch(sha256);
+        if (kept->size() >= MOST)
+            kept->clear();
+        return kept->emplace(sha256, bytes).first->second;
+    };
 }
 
 } // namespace
@@ -64,22 +123,13 @@ DocumentFolder BatchSources::documents() {
 }
 
 DocumentsElsewhere documentsInService(ServiceLine& line, std::string const& nodeId) {
-    auto const known = std::make_shared<std::optional<Protocol::DocumentsAnswer>>();
-    auto const find = [&line, nodeId, known](std::string const& id) -> std::optional<FoundDocument> {
-        try {
-            if (!*known)
-                *known = line.repeat([&](Channel::Client& service) { return documentsOf(service, nodeId); });
-            Protocol::StoredDocument const* const document = (*known)->find(id);
-            return document ? std::optional(fetched(line, *document)) : std::nullopt;
-        } catch (Base::Error const& failure) {
-            throw Base::Error(Base::Code::DocumentUnknown, std::string(Production::DOCUMENT_UNKNOWN) +
-                                                               "the service does not give \"" + id +
-                                                               "\": " + failure.what());
-        }
-    };
-    return {find,
-            " at " + nodeInWords(nodeId) +
-                " in the service; put it there with \"vlmail documents put\", or correct the pack preset"};
+    return documentsBy(questionsBy([&line]() -> ServiceLine& { return line; }, nodeId), nodeId);
+}
+
+std::function<DocumentsElsewhere()> documentsAnew(ServiceLine::Connect connect, std::string const& nodeId) {
+    DocumentQuestions questions = questionsBy(laterLine(std::move(connect)), nodeId);
+    questions.fetch = keeping(std::move(questions.fetch));
+    return [questions, nodeId] { return documentsBy(questions, nodeId); };
 }
 
 } // namespace VlMail

@@ -5,6 +5,7 @@
 #include "programs/vlmail/letters/document_folder.h"
 #include "programs/vlmail/letters/node_settings.h"
 
+#include <functional>
 #include <optional>
 #include <string>
 
@@ -52,5 +53,8 @@ private:
 /// A document by its id among those that count at a node, of which the service is asked once, when the first
 /// is looked for. The line has to outlive it.
 DocumentsElsewhere documentsInService(ServiceLine& line, std::string const& nodeId);
+/// The same for who looks for documents again and again, each time among those that count then. Connects in
+/// the process that looks, with the first, and keeps what was fetched.
+std::function<DocumentsElsewhere()> documentsAnew(ServiceLine::Connect connect, std::string const& nodeId);
 
 } // namespace VlMail

@@ -23,7 +23,7 @@ void addServiceOptions(Base::Command const& command, ServiceOptions& options) {
                     "Go on with a service that speaks version 1 of the connection alone");
 }
 
-ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal) {
+ServiceLine::Connect routeToService(ServiceOptions const& options, Terminal const& terminal) {
     auto const tell = [&terminal](ServiceAddress const& lost, ServiceAddress const& next) {
         terminal.err << "note: the service " << lost.text() << " was lost; going on with " << next.text()
                      << '\n';
@@ -34,7 +34,11 @@ ServiceLine lineToService(ServiceOptions const& options, Terminal const& termina
             return connectToService(address, options, terminal.err);
         },
         [&options] { return searchProven(tokenIfAny(options)); }, tell);
-    return ServiceLine([route] { return route->connect(); });
+    return [route] { return route->connect(); };
+}
+
+ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal) {
+    return ServiceLine(routeToService(options, terminal));
 }
 
 void addPackDatabaseOptions(Base::Command const& command, PackDatabaseOptions& options) {

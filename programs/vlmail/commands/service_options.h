@@ -14,6 +14,9 @@ namespace VlMail {
 /// `options` has to outlive the parsing of the command line.
 void addServiceOptions(Base::Command const& command, ServiceOptions& options);
 
+/// Leads to the service that is found at once; when that is lost, to the next that knows the token, which is
+/// told. The options and the terminal have to outlive it.
+ServiceLine::Connect routeToService(ServiceOptions const& options, Terminal const& terminal);
 /// A connection that is made again when it breaks. The options and the terminal have to outlive it.
 ServiceLine lineToService(ServiceOptions const& options, Terminal const& terminal);
 

@@ -1,7 +1,9 @@
 // vlmail workbench: presets are changed in a browser, and the letters with them.
 #include "programs/vlmail/workbench/workbench.h"
 #include "programs/vlmail/commands/batch_command.h"
+#include "programs/vlmail/commands/batch_sources.h"
 #include "programs/vlmail/commands/command.h"
+#include "programs/vlmail/commands/settings.h"
 
 #include <memory>
 #include <ostream>
@@ -17,6 +19,9 @@ namespace {
 struct Options {
     Workbench::Setup setup;
     std::string settings;
+    /// Empty when none was named.
+    std::string node;
+    ServiceOptions service;
     bool opens = false;
     WorkerOptions reading;
 };
@@ -35,11 +40,22 @@ void open(std::string const& url, Terminal const& terminal) {
         terminal.note("no browser could be opened; open the address above in one");
 }
 
+/// Where the settings are, which may bring letterheads and attachments along.
+std::unique_ptr<Workbench::SettingsStore> storeFor(Options const& options, Workbench::Setup& setup,
+                                                   Terminal const& terminal) {
+    if (options.node.empty())
+        return options.settings.empty() ? Workbench::settingsNowhere()
+                                        : Workbench::settingsInFile(options.settings);
+    std::string const node = nodeIdIn(options.node);
+    ServiceLine::Connect const connect = routeToService(options.service, terminal);
+    setup.elsewhere = documentsAnew(connect, node);
+    return Workbench::settingsOfNode(node, nodeInWords(node), connect);
+}
+
 int work(Options const& options, Terminal const& terminal) {
     Workbench::Setup setup = options.setup;
     setup.limits = options.reading.workers().limits;
-    auto store =
-        options.settings.empty() ? Workbench::settingsNowhere() : Workbench::settingsInFile(options.settings);
+    auto store = storeFor(options, setup, terminal);
     Workbench::serve(setup, std::move(store), [&](std::string const& url) {
         terminal.out << url << std::endl;
         if (options.opens)
@@ -55,8 +71,15 @@ void addWorkbenchCommand(Base::Command const& app, Task& task) {
     Base::Command const command = app.addCommand(
         "workbench", "Shows presets and documents in a browser: a preset is changed and the letter with it");
     command.addOption("FOLDER", options->setup.folder, "The folder with the documents").required();
-    command.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
+    Base::Option const settings =
+        command.addOption("--settings", options->settings, "A JSON document with settings parts of a node");
     command.addOption("--documents", options->setup.letterheads, DOCUMENTS_HELP);
+    command
+        .addOption("--node", options->node,
+                   "The node of the service whose settings are changed, and whose documents count where "
+                   "--documents has none")
+        .excludes(settings);
+    addServiceOptions(command, options->service);
     command.addFlag("--open", options->opens, "Open the address in a browser, too");
     addLimitOptions(command, options->reading);
     command.whenNamed(

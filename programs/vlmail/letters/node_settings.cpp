@@ -12,6 +12,7 @@
 #include "vlservice/cfg/po.h"
 #include "vlservice/cfg/profiles.h"
 #include "vlservice/json/json_text.h"
+#include "vlservice/presets/settings_parts.h"
 
 #include <algorithm>
 #include <iterator>
@@ -46,7 +47,64 @@ void requirePartNames(json::Object const& document, std::string const& file) {
     }
 }
 
+/// What of a part is the node's own, in the order in which it counts.
+template<typename Part>
+void addOwn(json::Object& own, json::Value const& written, std::string const& place) {
+    try {
+        if (json::Value const form = Part(written, false, true).serialize())
+            own.set(Part::PART_NAME, form);
+    } catch (std::exception const& wrong) {
+        throw Base::Error(Base::Code::SettingsMalformed, "cannot use the part \"" + Part::PART_NAME +
+                                                             "\" in " + place + ": " + wrong.what() +
+                                                             "; correct it there");
+    }
+}
+
+template<typename... Parts>
+json::Object ownParts(NodeSettings const& settings, Cfg::PartList<Parts...>) {
+    json::Object own;
+    (addOwn<Parts>(own, settings.part(Parts::PART_NAME), settings.place()), ...);
+    return own;
+}
+
+json::Array joined(json::Array front, json::Array const& back) {
+    for (json::Value const& one : back)
+        front.append(one);
+    return front;
+}
+
+json::Array repeated(std::string const& text, std::size_t times) {
+    json::Array array;
+    for (std::size_t i = 0; i < times; ++i)
+        array.append(text);
+    return array;
+}
+
+/// A list that is inherited by elements, which has an origin for each, has the node's own ones first.
+Protocol::PartSettings withOwn(Protocol::PartSettings settings, json::Object const& own,
+                               std::string const& node) {
+    for (auto const& [key, value] : own) {
+        json::Value const origins = settings.origins.get(key);
+        bool const isByElements = origins.isArray();
+        settings.values.set(
+            key,
+            isByElements ? json::Value(joined(value.toArray(), settings.values.get(key).toArray())) : value);
+        settings.origins.set(
+            key, isByElements ? json::Value(joined(repeated(node, value.toArray().size()), origins.toArray()))
+                              : json::Value(node));
+    }
+    settings.own = own;
+    return settings;
+}
+
 } // namespace
+
+NodeSettings NodeSettings::over(Protocol::SettingsAnswer inherited) const {
+    json::Object const own = ownParts(*this, Cfg::SettingsParts());
+    for (auto const& [name, values] : own)
+        inherited.parts.set(name, withOwn(inherited.part(name), values.toObject(), inherited.id).serialize());
+    return resolved(inherited, place_);
+}
 
 NodeSettings NodeSettings::fromFile(fs::path const& file) {
     NodeSettings settings = fromText(Base::readFile(file), file.string());

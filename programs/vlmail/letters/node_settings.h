@@ -33,6 +33,10 @@ public:
     /// The same, with the node that each value comes from.
     static NodeSettings resolved(Protocol::SettingsAnswer const& answer, std::string place);
 
+    /// These as a node's own values over those that it inherits, which a service was asked for; called the
+    /// same. Throws Error when a part cannot be understood.
+    NodeSettings over(Protocol::SettingsAnswer inherited) const;
+
     /// Completed by the global defaults, so that a pair of presets exists for every document's name.
     /// Throws Error when the part cannot be understood. Every call builds new objects from JSON of their own.
     Cfg::Presets presets() const;

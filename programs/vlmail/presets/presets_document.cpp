@@ -100,15 +100,13 @@ std::string inWords(Cfg::ExtractPreset const& preset) {
     return preset.name().empty() ? match : inQuotes(preset.name()) + " (" + match + ')';
 }
 
-PresetsDocument::PresetsDocument(std::string const& text)
+PresetsDocument::PresetsDocument(std::string const& text, json::Object const& above)
     : document_(json::strToObject(text.data(), text.size())), duplicateKey_(findDuplicateKey(text)) {
     isPartAlone_ = document_.get(EXTRACT_PRESETS) || document_.get(PACK_PRESETS);
     if (!isPartAlone_)
         partPlace_ = partPlace_ / Cfg::Presets::PART_NAME;
     json::Value const node = isPartAlone_ ? json::Value(document_) : document_.get(Cfg::Presets::PART_NAME);
-    if (!node.isObject())
-        return;
-    json::Object const& part = node.toObject();
+    json::Object const part = node.isObject() ? node.toObject() : json::Object();
     forEachElement(arrayOf(part, EXTRACT_PRESETS), partPlace_ / EXTRACT_PRESETS,
                    [&](json::Object const& object, Place const& place, bool inherited) {
                        extractPresets_.push_back(extractPresetFrom(object, place, inherited));
@@ -119,6 +117,18 @@ PresetsDocument::PresetsDocument(std::string const& text)
                    [&](json::Object const& object, Place const& place, bool inherited) {
                        packPresets_.push_back({place, object, inherited, object.get("name").textOrEmpty()});
                    });
+    addInherited(above, arrayOf(part, EXTRACT_PRESETS).size(), arrayOf(part, PACK_PRESETS).size());
+}
+
+void PresetsDocument::addInherited(json::Object const& part, std::size_t ownExtract, std::size_t ownPack) {
+    forEachElement(arrayOf(part, EXTRACT_PRESETS), {}, [&](json::Object const& object, Place const&, bool) {
+        extractPresets_.push_back(
+            extractPresetFrom(object, partPlace_ / EXTRACT_PRESETS / ownExtract++, true));
+    });
+    forEachElement(arrayOf(part, PACK_PRESETS), {}, [&](json::Object const& object, Place const&, bool) {
+        packPresets_.push_back(
+            {partPlace_ / PACK_PRESETS / ownPack++, object, true, object.get("name").textOrEmpty()});
+    });
 }
 
 Cfg::Presets PresetsDocument::matchingPart() const {

@@ -58,8 +58,9 @@ struct ListedPackPreset {
 /// stands there is left out of the lists.
 class PresetsDocument {
 public:
-    /// Throws json::Exc when the text is no JSON object.
-    explicit PresetsDocument(std::string const& text);
+    /// Presets of the part "above", which are inherited and not in the text, stand behind those that are, at
+    /// places that the text does not have. Throws json::Exc when the text is no JSON object.
+    explicit PresetsDocument(std::string const& text, json::Object const& above = {});
 
     json::Object const& json() const { return document_; }
     bool isPartAlone() const { return isPartAlone_; }
@@ -75,6 +76,8 @@ public:
     Cfg::Presets matchingPart() const;
 
 private:
+    void addInherited(json::Object const& part, std::size_t ownExtract, std::size_t ownPack);
+
     json::Object document_;
     bool isPartAlone_;
     Place partPlace_;

@@ -41,6 +41,9 @@ Answer failureOf(int status, Base::Code code, std::string const& line) {
 }
 
 Answer failureOf(std::exception const& failure) {
+    if (dynamic_cast<json::Exc const*>(&failure))
+        return failureOf(400, Base::Code::RequestInvalid,
+                         std::string("a parameter of the request is wrong: ") + failure.what());
     Base::Code const code = Base::codeOf(failure);
     return failureOf(statusFor(code), code, failure.what());
 }

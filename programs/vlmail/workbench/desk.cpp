@@ -17,7 +17,6 @@
 
 #include <algorithm>
 #include <array>
-#include <new>
 #include <system_error>
 #include <vector>
 
@@ -100,21 +99,30 @@ json::Array blocksOf(Reader::Layout const& layout) {
 } // namespace
 
 Answer Desk::answer(std::string const& what, std::string const& query) {
-    try {
+    return answered([&] {
         json::Object const parameters = json::strToObject(query.data(), query.size());
+        inherit(parameters.get(INHERITED).textOrEmpty());
         for (Question const& question : QUESTIONS)
             if (what == question.name)
                 return question.answer(*this, parameters);
         return failureOf(404, Base::Code::RequestInvalid,
                          "there is no request " + Base::inQuotes(Base::validUtf8(what)));
-    } catch (std::bad_alloc const&) {
-        throw;
-    } catch (json::Exc const& wrong) {
-        return failureOf(400, Base::Code::RequestInvalid,
-                         std::string("a parameter of the request is wrong: ") + wrong.what());
-    } catch (std::exception const& failure) {
-        return failureOf(failure);
-    }
+    });
+}
+
+/// What settings mean depends on it.
+void Desk::inherit(std::string const& told) {
+    if (told == inheritedText_)
+        return;
+    auto const parts =
+        told.empty()
+            ? nullptr
+            : std::make_shared<Protocol::SettingsAnswer const>(json::strToObject(told.data(), told.size()));
+    settings_.clear();
+    judged_.clear();
+    making_.forget();
+    inheritedText_ = told;
+    inherited_ = parts;
 }
 
 SettingsInWork& Desk::settingsOf(std::string const& text) {
@@ -125,7 +133,7 @@ SettingsInWork& Desk::settingsOf(std::string const& text) {
     if (known != settings_.end())
         settings_.splice(settings_.begin(), settings_, known);
     else
-        settings_.emplace_front(text);
+        settings_.emplace_front(text, inherited_);
     if (settings_.size() > MOST)
         settings_.pop_back();
     return settings_.front();

@@ -1,7 +1,9 @@
 #pragma once
 // What the reading process does: documents by settings that are being written.
 
+#include "programs/protocol/settings.h"
 #include "programs/vlmail/workbench/answer.h"
+#include "programs/vlmail/workbench/folders.h"
 #include "programs/vlmail/workbench/kept_documents.h"
 #include "programs/vlmail/workbench/kept_making.h"
 #include "programs/vlmail/workbench/settings_in_work.h"
@@ -9,27 +11,23 @@
 
 #include "vlservice/json/json.h"
 
-#include <filesystem>
 #include <list>
 #include <map>
+#include <memory>
 #include <optional>
 #include <string>
 #include <utility>
 
 namespace VlMail::Workbench {
 
-/// Where the documents lie, and those that pack presets name.
-struct Folders {
-    std::filesystem::path documents;
-    /// Empty for none.
-    std::filesystem::path letterheads = {};
-};
+/// The parameter of whatever has settings that tells what they inherit, as StoredSettings has it.
+constexpr char const* INHERITED = "inherited";
 
 /// Keeps what it has read and what it has understood of settings, so that a change of a pattern costs the
 /// search for it alone. Used by one process.
 class Desk {
 public:
-    explicit Desk(Folders folders) : folders_(std::move(folders)), making_(folders_.letterheads) {}
+    explicit Desk(Folders folders) : folders_(std::move(folders)), making_(folders_) {}
 
     /// What is asked, such as "evaluate", and its parameters as JSON. Failures are answers.
     Answer answer(std::string const& what, std::string const& query);
@@ -59,6 +57,7 @@ private:
         DocumentVerdict verdict;
     };
 
+    void inherit(std::string const& told);
     SettingsInWork& settings(json::Object const& query) {
         return settingsOf(query.get("settings").toString());
     }
@@ -70,6 +69,9 @@ private:
     Folders folders_;
     KeptDocuments documents_;
     KeptMaking making_;
+    /// As it was told, and what it means; null for nothing.
+    std::string inheritedText_;
+    std::shared_ptr<Protocol::SettingsAnswer const> inherited_;
     /// The last are the first.
     std::list<SettingsInWork> settings_;
     std::list<std::pair<std::string, std::map<std::string, Judged>>> judged_;

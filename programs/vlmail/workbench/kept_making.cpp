@@ -6,8 +6,8 @@ namespace VlMail::Workbench {
 
 KeptMaking::Marks KeptMaking::marksNow() const {
     Marks marks;
-    if (!folder_.empty())
-        marks.emplace_back(folder_, markOfFolder(folder_));
+    if (!folders_.letterheads.empty())
+        marks.emplace_back(folders_.letterheads, markOfFolder(folders_.letterheads));
     for (UsedDocument const& used : making_->usedDocuments())
         if (!used.isOfService)
             marks.emplace_back(used.file, markOf(used.file));
@@ -27,7 +27,7 @@ MakingReady& KeptMaking::making(std::filesystem::path const& document, SettingsI
     if (document == document_ && settings.text().text() == settings_ && isCurrent())
         return *making_;
     making_ = std::make_unique<MakingReady>(MakingReady::Colours::Ignored);
-    making_->prepareFor({document.string()}, settings.presets().presets(), DocumentFolder(folder_), {});
+    making_->prepareFor({document.string()}, settings.presets().presets(), folders_.named(), {});
     document_ = document;
     settings_ = settings.text().text();
     marks_ = marksNow();

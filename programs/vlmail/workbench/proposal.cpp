@@ -183,7 +183,7 @@ json::Object proposalFrom(std::vector<Reader::Document>& documents) {
 }
 
 Adopted adopted(SettingsInWork const& settings, json::Object const& proposal) {
-    std::string const name = freeName(settings.document(), proposal.get(NAME).toString());
+    std::string const name = freeName(settings.whole(), proposal.get(NAME).toString());
     json::Object pack = proposal.get("pack_preset").toObject();
     pack.set(NAME, name);
     json::Object const preset{{"match", proposal.get("match").toObject().get("proposal").toString()},

@@ -47,6 +47,45 @@ ReaderProcess::Work deskWork(Folders const& folders) {
     };
 }
 
+constexpr std::string_view STATE = "state";
+constexpr std::string_view SAVE = "save";
+/// What the store is asked for.
+constexpr std::array OF_STORE{STATE, std::string_view("reload"), SAVE};
+
+json::Object toJson(StoredSettings const& stored) {
+    return {{"text", stored.text}, {"version", stored.version}, {INHERITED, stored.inherited}};
+}
+
+Answer conflict(StoredSettings const& theirs, Base::Error const& failure) {
+    return answerOf(
+        {{"error", json::Object{{"code", Base::nameOf(failure.code())}, {"line", failure.what()}}},
+         {"theirs", theirs.text},
+         {"version", theirs.version},
+         {INHERITED, theirs.inherited}},
+        statusFor(failure.code()));
+}
+
+Answer save(SettingsStore& store, json::Object const& query) {
+    SettingsText const known(query.get("text").toString());
+    std::string const version = query.get("version").toString();
+    try {
+        return answerOf(toJson(store.write(known.text(), version)));
+    } catch (Base::Error const& failure) {
+        if (failure.code() != Base::Code::SettingsChanged)
+            throw;
+        return conflict(store.read(), failure);
+    }
+}
+
+ReaderProcess::Work storeWork(std::shared_ptr<SettingsStore> store) {
+    return [store = std::move(store)](std::string const& what, std::string const& query) {
+        return answered([&] {
+            return what == SAVE ? save(*store, json::strToObject(query.data(), query.size()))
+                                : answerOf(toJson(store->read()));
+        });
+    };
+}
+
 json::Object toJson(ListedDocument const& document) {
     return {{"name", document.name},
             {"size", static_cast<long long>(document.size)},
@@ -111,6 +150,7 @@ Answer writeGolden(std::filesystem::path const& file, std::string const& text, b
 struct Batch {
     std::vector<std::string> documents;
     std::string settings;
+    std::string inherited;
     /// The empty handle when nothing is compared.
     json::Value before;
     Door::Respond respond;
@@ -124,7 +164,7 @@ struct Batch {
     /// The next one.
     std::string const& document() const { return documents[verdicts.size()]; }
     std::string query() const {
-        json::Object query{{"document", document()}, {"settings", settings}};
+        json::Object query{{"document", document()}, {"settings", settings}, {INHERITED, inherited}};
         if (before.isString())
             query.set("before", before);
         return json::toText(query);
@@ -137,7 +177,8 @@ struct Batch {
 
 Session::Session(boost::asio::io_context& io, Folders folders, JobLimits const& limits,
                  std::unique_ptr<SettingsStore> store)
-    : folders_(std::move(folders)), store_(std::move(store)), front_(io, limits, deskWork(folders_)),
+    : folders_(std::move(folders)), store_(std::move(store)), inherited_(store_->read().inherited),
+      keeper_(io, limits, storeWork(store_)), front_(io, limits, deskWork(folders_)),
       back_(io, limits, deskWork(folders_)) {}
 
 void Session::answer(std::string const& what, std::string body, Door::Respond const& respond) {
@@ -148,8 +189,10 @@ void Session::answer(std::string const& what, std::string body, Door::Respond co
             return judge(query, respond);
         if (what == "golden")
             return keepGolden(query, std::move(body), respond);
+        if (std::ranges::find(OF_STORE, what) != OF_STORE.end())
+            return ofStore(what, std::move(body), respond);
         if (reading == READINGS.end())
-            return respond(here(what, query));
+            return respond(here(what));
         std::string const document = query.get("document").textOrEmpty();
         if (reading->isOfDocument)
             requireDocument(document);
@@ -157,12 +200,9 @@ void Session::answer(std::string const& what, std::string body, Door::Respond co
             for (std::string const& name : documentsOf(query))
                 requireDocument(name);
         ReaderProcess& process = query.get("checks").isTrue() ? back_ : front_;
-        process.ask({what, std::move(body), document, reading->isReplaceable}, respond);
+        process.ask({what, inContext(query, std::move(body)), document, reading->isReplaceable}, respond);
     } catch (std::bad_alloc const&) {
         throw;
-    } catch (json::Exc const& wrong) {
-        respond(failureOf(400, Base::Code::RequestInvalid,
-                          std::string("the request is not what is wanted: ") + wrong.what()));
     } catch (std::exception const& failure) {
         respond(failureOf(failure));
     }
@@ -174,8 +214,8 @@ void Session::requireDocument(std::string const& name) const {
 }
 
 void Session::judge(json::Object const& query, Door::Respond const& respond) {
-    auto const batch = std::make_shared<Batch>(
-        Batch{documentsOf(query), query.get("settings").toString(), query.get("before"), respond});
+    auto const batch = std::make_shared<Batch>(Batch{documentsOf(query), query.get("settings").toString(),
+                                                     inherited_, query.get("before"), respond});
     if (auto const broken = whatIsBroken(batch->settings))
         throw Base::Error(Base::Code::JsonMalformed, "the settings are no JSON: " + broken->says);
     if (auto const older = std::exchange(batch_, batch))
@@ -210,7 +250,7 @@ void Session::keepGolden(json::Object const& query, std::string body, Door::Resp
     requireDocument(document);
     bool const mayReplace = query.get("replace").isTrue();
     auto const file = expectationBeside(folders_.documents / document);
-    front_.ask({"expectation", std::move(body), document}, [=](Answer answer) {
+    front_.ask({"expectation", inContext(query, std::move(body)), document}, [=](Answer answer) {
         if (answer.status != 200)
             return respond(std::move(answer));
         json::Object const kept = json::strToObject(answer.body.data(), answer.body.size());
@@ -218,56 +258,51 @@ void Session::keepGolden(json::Object const& query, std::string body, Door::Resp
     });
 }
 
-Answer Session::here(std::string const& what, json::Object const& query) {
-    if (what == "state")
-        return state();
-    if (what == "reload")
-        return reload();
-    if (what == "save")
-        return save(query);
+Answer Session::here(std::string const& what) {
     if (what == "schema")
         return schema();
     return failureOf(404, Base::Code::RequestInvalid,
                      "there is no request " + Base::inQuotes(Base::validUtf8(what)));
 }
 
-Answer Session::state() {
+void Session::ofStore(std::string const& what, std::string body, Door::Respond const& respond) {
+    keeper_.ask({what, std::move(body), store_->name()}, [=, this](Answer const& answer) {
+        json::Object const told = takeInherited(json::strToObject(answer.body.data(), answer.body.size()));
+        bool const isState = what == STATE && answer.status == 200;
+        respond(answerOf(isState ? state(told) : told, answer.status));
+    });
+}
+
+/// It stays here, and goes with each question that wants it.
+json::Object Session::takeInherited(json::Object const& told) {
+    json::Object rest;
+    for (auto const& [key, value] : told)
+        if (std::string_view(key) == INHERITED)
+            inherited_ = value.textOrEmpty();
+        else
+            rest.set(key, value);
+    return rest;
+}
+
+json::Object Session::state(json::Object const& stored) const {
     DocumentList const list = documentsIn(folders_.documents);
     json::Array documents;
     for (ListedDocument const& document : list.documents)
         documents.append(toJson(document));
-    StoredSettings const stored = store_->read();
-    return answerOf({{"folder", Base::validUtf8(folders_.documents.string())},
-                     {"settings", json::Object{{"kind", store_->kind()},
-                                               {"name", store_->name()},
-                                               {"text", stored.text},
-                                               {"version", stored.version}}},
-                     {"documents", documents},
-                     {"problems", arrayOf(list.problems)}});
+    json::Object settings{{"kind", store_->kind()}, {"name", store_->name()}};
+    for (auto const& [key, value] : stored)
+        settings.set(key, value);
+    return {{"folder", Base::validUtf8(folders_.documents.string())},
+            {"settings", settings},
+            {"documents", documents},
+            {"problems", arrayOf(list.problems)}};
 }
 
-Answer Session::reload() {
-    StoredSettings const stored = store_->read();
-    return answerOf({{"text", stored.text}, {"version", stored.version}});
-}
-
-Answer Session::save(json::Object const& query) {
-    std::string const text = query.get("text").toString();
-    std::string const version = query.get("version").toString();
-    SettingsText const known(text);
-    StoredSettings const theirs = store_->read();
-    if (theirs.version != version)
-        return answerOf(
-            {{"error",
-              json::Object{{"code", Base::nameOf(Base::Code::SettingsChanged)},
-                           {"line",
-                            "the settings were changed by somebody else since they were read; look at "
-                            "both and save what is to stay"}}},
-             {"theirs", theirs.text},
-             {"version", theirs.version}},
-            statusFor(Base::Code::SettingsChanged));
-    StoredSettings const written = store_->write(known.text());
-    return answerOf({{"text", written.text}, {"version", written.version}});
+std::string Session::inContext(json::Object query, std::string body) const {
+    if (inherited_.empty())
+        return body;
+    query.set(INHERITED, inherited_);
+    return json::toText(query);
 }
 
 Answer Session::schema() { return answerOf(documentOf(*schemaNamed("settings"))); }

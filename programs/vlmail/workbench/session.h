@@ -24,11 +24,12 @@ public:
     void answer(std::string const& what, std::string body, Door::Respond const& respond);
 
 private:
-    Answer here(std::string const& what, json::Object const& query);
-    Answer state();
-    Answer reload();
-    Answer save(json::Object const& query);
+    static Answer here(std::string const& what);
     static Answer schema();
+    void ofStore(std::string const& what, std::string body, Door::Respond const& respond);
+    json::Object takeInherited(json::Object const& told);
+    json::Object state(json::Object const& stored) const;
+    std::string inContext(json::Object query, std::string body) const;
     void judge(json::Object const& query, Door::Respond const& respond);
     void passOverMissing(Batch& batch) const;
     void judgeNext(std::shared_ptr<Batch> const& batch);
@@ -36,7 +37,11 @@ private:
     void requireDocument(std::string const& name) const;
 
     Folders folders_;
-    std::unique_ptr<SettingsStore> store_;
+    std::shared_ptr<SettingsStore> store_;
+    /// As the store has told it last.
+    std::string inherited_;
+    /// Asks the store: a service may take its time.
+    ReaderProcess keeper_;
     /// For the document that a person looks at.
     ReaderProcess front_;
     /// For all the others, and for what takes longer, behind it.

@@ -4,6 +4,8 @@
 
 #include <algorithm>
 #include <iterator>
+#include <span>
+#include <utility>
 
 namespace VlMail::Workbench {
 namespace {
@@ -22,6 +24,16 @@ json::Object placed(Finding const& finding, SettingsText const& text) {
             {"to", toJson(text.positionOf(isWide ? place.begin + 1 : place.end))},
             {"what", finding.what},
             {"advice", finding.advice}};
+}
+
+/// Presets that are inherited have places behind those in the text, which cannot change what is found there.
+bool isOfInherited(Place const& place, SettingsText const& text) {
+    std::vector<std::string> const steps = stepsOf(place.pointer());
+    auto const list = std::ranges::find_if(
+        steps, [](std::string const& step) { return step == "extract_presets" || step == "pack_presets"; });
+    if (list == steps.end() || std::next(list) == steps.end())
+        return false;
+    return !text.find((Place() / std::span(steps.begin(), std::next(list, 2))).pointer());
 }
 
 /// The element of a list that the other list has at the same place, or by that name.
@@ -52,23 +64,32 @@ json::Array toJson(std::vector<Edit> const& edits) {
     return array;
 }
 
-SettingsInWork::SettingsInWork(std::string text) : text_(std::move(text)), document_(text_.text()) {}
+SettingsInWork::SettingsInWork(std::string text, std::shared_ptr<Protocol::SettingsAnswer const> inherited)
+    : text_(std::move(text)), inherited_(std::move(inherited)), document_(text_.text()) {}
+
+PresetsDocument SettingsInWork::whole() const {
+    return inherited_ ? PresetsDocument(text_.text(), inherited_->part(Cfg::Presets::PART_NAME).values)
+                      : document_;
+}
 
 json::Array const& SettingsInWork::findings() {
     if (!findings_) {
         findings_.emplace();
-        for (Finding const& finding : lint(document_))
-            findings_->append(placed(finding, text_));
+        for (Finding const& finding : lint(whole()))
+            if (!isOfInherited(finding.place, text_))
+                findings_->append(placed(finding, text_));
     }
     return *findings_;
 }
 
-SettingsInWork::Used::Used(std::string const& text)
-    : node(NodeSettings::fromText(text, NAME)), presets(node.presets()), index(presets) {}
+SettingsInWork::Used::Used(NodeSettings settings)
+    : node(std::move(settings)), presets(node.presets()), index(presets) {}
 
 SettingsInWork::Used& SettingsInWork::used() {
-    if (!used_)
-        used_.emplace(text_.text());
+    if (!used_) {
+        NodeSettings const written = NodeSettings::fromText(text_.text(), NAME);
+        used_.emplace(inherited_ ? written.over(*inherited_) : written);
+    }
     return *used_;
 }
 

@@ -1,11 +1,13 @@
 #pragma once
 // Settings while they are being written: the text, what it means, and what stands where.
 
+#include "programs/protocol/settings.h"
 #include "programs/vlmail/letters/node_settings.h"
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/presets/presets_document.h"
 #include "programs/vlmail/workbench/settings_text.h"
 
+#include <memory>
 #include <optional>
 #include <string>
 
@@ -13,11 +15,13 @@ namespace VlMail::Workbench {
 
 class SettingsInWork {
 public:
-    /// Throws Base::Error for what is no JSON.
-    explicit SettingsInWork(std::string text);
+    /// With what a node inherits, if they are a node's. Throws Base::Error for what is no JSON.
+    explicit SettingsInWork(std::string text, std::shared_ptr<Protocol::SettingsAnswer const> inherited = {});
 
     SettingsText const& text() const { return text_; }
     PresetsDocument const& document() const { return document_; }
+    /// With the presets that are inherited behind those in the text.
+    PresetsDocument whole() const;
     /// What lint finds, as {"severity", "kind", "pointer", "from", "to", "what", "advice"}.
     json::Array const& findings();
     /// Whether they are known.
@@ -38,7 +42,7 @@ public:
 
 private:
     struct Used {
-        explicit Used(std::string const& text);
+        explicit Used(NodeSettings settings);
 
         NodeSettings node;
         Cfg::Presets presets;
@@ -48,6 +52,7 @@ private:
     Used& used();
 
     SettingsText text_;
+    std::shared_ptr<Protocol::SettingsAnswer const> inherited_;
     PresetsDocument document_;
     std::optional<json::Array> findings_;
     std::optional<Used> used_;

@@ -38,8 +38,10 @@ public:
 
     StoredSettings read() override { return stored(Base::readFile(file_, MAX_BODY_BYTES)); }
 
-    StoredSettings write(std::string const& text) override {
+    StoredSettings write(std::string const& text, std::string const& version) override {
         std::string const before = Base::readFile(file_, MAX_BODY_BYTES);
+        if (stored(before).version != version)
+            throw settingsChanged();
         bool const isOther = before.find(OTHER_LINE_END) != std::string::npos;
         std::string const bytes = isOther ? withLineEnds(text, "\n", OTHER_LINE_END) : text;
         try {
@@ -72,13 +74,19 @@ public:
     StoredSettings read() override {
         return {"{\n  \"extract_presets\": [],\n  \"pack_presets\": []\n}\n", "none"};
     }
-    StoredSettings write(std::string const&) override {
-        throw Base::Error(Base::Code::Usage, "these settings lie in no file; begin the workbench with "
-                                             "--settings NODE.json and put them there");
+    StoredSettings write(std::string const&, std::string const&) override {
+        throw Base::Error(Base::Code::Usage, "these settings lie in no file and at no node; begin the "
+                                             "workbench with --settings NODE.json or --node NODE and put "
+                                             "them there");
     }
 };
 
 } // namespace
+
+Base::Error settingsChanged() {
+    return {Base::Code::SettingsChanged, "the settings were changed by somebody else since they were read; "
+                                         "look at both and save what is to stay"};
+}
 
 std::unique_ptr<SettingsStore> settingsInFile(fs::path file) {
     return std::make_unique<InFile>(std::move(file));

@@ -35,11 +35,11 @@ std::filesystem::path requireFolder(std::filesystem::path const& folder) {
 
 void serve(Setup const& setup, std::unique_ptr<SettingsStore> store,
            std::function<void(std::string const& url)> const& begun) {
-    store->read();
     boost::asio::io_context io(1);
     boost::asio::signal_set signals(io, SIGINT, SIGTERM);
     signals.async_wait([&](boost::system::error_code const&, int) { io.stop(); });
-    Session session(io, {requireFolder(setup.folder), setup.letterheads}, setup.limits, std::move(store));
+    Session session(io, {requireFolder(setup.folder), setup.letterheads, setup.elsewhere}, setup.limits,
+                    std::move(store));
     Door door(io);
     Admission const admission{Channel::makeNonce(), door.port()};
     door.open([&](Request request, Door::Respond const& respond) {

@@ -1,6 +1,7 @@
 #pragma once
 // The workbench: presets and the letters that they read, side by side in a browser of this machine.
 
+#include "programs/vlmail/letters/document_folder.h"
 #include "programs/vlmail/letters/worker_pool.h"
 #include "programs/vlmail/workbench/settings_store.h"
 
@@ -16,6 +17,8 @@ struct Setup {
     std::filesystem::path folder;
     /// With letterheads and attachments; empty for none.
     std::filesystem::path letterheads = {};
+    /// Those of a service, as Folders has them.
+    std::function<DocumentsElsewhere()> elsewhere = {};
     /// What a document may take.
     JobLimits limits = {};
 };

@@ -37,6 +37,19 @@ class BrowserTest(unittest.TestCase):
         self.addCleanup(at.leave, self.driver)
         return page
 
+    def accept(self, page):
+        page.one('dialog[open] button[value="accept"]').click()
+
+    def second_tab(self):
+        self.first = self.driver.current_window_handle
+        self.driver.switch_to.new_window("tab")
+        self.addCleanup(at.look, self.driver)
+        return self.driver
+
+    def leave_second_tab(self):
+        self.driver.close()
+        self.driver.switch_to.window(self.first)
+
     def write_picture(self, page, name):
         """The picture that a page of the documents shows; it has to be there."""
         file = os.path.join(PICTURES, name)

@@ -97,6 +97,52 @@ class Workbench:
         return status
 
 
+class Service:
+    """The service that keeps settings of nodes, on this machine, and what other people do there."""
+
+    def __init__(self, vlmail):
+        self.vlmail = vlmail
+        self.home = tempfile.mkdtemp(prefix="service")
+        self.data = os.path.join(self.home, "data")
+        program = os.path.join(os.path.dirname(os.path.dirname(vlmail)), "vlserviced", "vlserviced")
+        self.process = subprocess.Popen([program, "--data", self.data, "--no-discovery"], stdout=subprocess.PIPE, text=True)
+        self.address = self.process.stdout.readline().split()[-1]
+        self.options = self.options_with(os.path.join(self.data, "token"))
+
+    def options_with(self, token):
+        return "--service", self.address, "--token", token
+
+    def run(self, *arguments):
+        command = [self.vlmail, *arguments, *self.options]
+        return subprocess.run(command, check=True, stdout=subprocess.PIPE, text=True, env={**os.environ, "HOME": self.home}).stdout
+
+    def write(self, name, text):
+        file = os.path.join(self.home, name)
+        with os.fdopen(os.open(file, os.O_WRONLY | os.O_CREAT | os.O_TRUNC, 0o600), "w", encoding="utf-8") as out:
+            out.write(text)
+        return file
+
+    def set(self, node, part, values):
+        self.run("settings", "set", node, part, self.write("part.json", json.dumps(values)))
+
+    def own(self, node, part):
+        return json.loads(self.run("settings", "show", node, part, "--json"))["parts"][part]["own"]
+
+    def token(self, name, role, node):
+        """The file with a new one."""
+        added = self.run("token", "add", name, "--role", role, "--node", node, "--json")
+        return self.write(name, json.loads(added)["token"])
+
+    def stop(self):
+        self.process.terminate()
+        self.process.wait(WAIT_SECONDS)
+
+    def end(self):
+        self.stop()
+        self.process.stdout.close()
+        shutil.rmtree(self.home)
+
+
 def start_browser(language="en-GB", scheme="light", size=(1500, 1000)):
     from selenium import webdriver
     from selenium.webdriver.chrome.service import Service

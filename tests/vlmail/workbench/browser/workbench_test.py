@@ -464,9 +464,6 @@ class Printed(BrowserTest):
 
 
 class Saving(BrowserTest):
-    def accept(self, page):
-        page.one('dialog[open] button[value="accept"]').click()
-
     def test_what_differs_is_shown_before_it_is_saved(self):
         page = self.open("broken/other-letter-case")
         before = self.bench.text()
@@ -520,16 +517,6 @@ class Saving(BrowserTest):
         self.accept(page)
         page.until("document.querySelector('#message').innerText.startsWith('Saved in ')", "the saving")
         self.assertEqual(self.bench.text(), mine)
-
-    def second_tab(self):
-        self.first = self.driver.current_window_handle
-        self.driver.switch_to.new_window("tab")
-        self.addCleanup(at.look, self.driver)
-        return self.driver
-
-    def leave_second_tab(self):
-        self.driver.close()
-        self.driver.switch_to.window(self.first)
 
     def test_what_is_shown_is_kept_as_right_by_one_button(self):
         page = self.open("office")
@@ -591,6 +578,76 @@ class FiveMinutes(BrowserTest):
         read = json.loads(subprocess.run(letter, stdout=subprocess.PIPE, check=True).stdout)["letters"][0]
         self.assertEqual(read["production_ready"], True)
         self.assertIn("C-1008", json.dumps([field for field in read["fields"] if field["name"] == "customer"]))
+
+
+class AtANode(BrowserTest):
+    """The settings of a node: it has the extraction preset, and the node above it the pack preset."""
+
+    NODE = "u=bob/a=acme"
+
+    def setUp(self):
+        super().setUp()
+        self.service = at.Service(VLMAIL)
+        self.addCleanup(self.service.end)
+        with open(os.path.join(BROKEN, "other-letter-case", "settings.json"), encoding="utf-8") as file:
+            settings = json.load(file)
+        self.service.set(self.NODE, "presets", {"extract_presets": settings["extract_presets"]})
+        self.service.set("a=acme", "presets", {"pack_presets": settings["pack_presets"]})
+
+    def begin_at_node(self):
+        return self.begin("broken/other-letter-case", None, "--node", self.NODE, *self.service.options)
+
+    def pattern(self):
+        return self.service.own(self.NODE, "presets")["extract_presets"][0]["zones"][1]["fields"][0]["value_extract"]
+
+    def test_a_node_is_edited_and_saved(self):
+        page = self.page_of(self.begin_at_node())
+        self.assertEqual(page.texts("#settings-name"), [self.NODE])
+        self.assertNotIn("pack_presets", page.settings())
+        self.assertIn("Invoices", page.texts("#fields-body .quietly")[0])
+        self.assertEqual(page.find("#lint li.error"), [])
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        page.one("#save").click()
+        self.assertIn("(?i)", page.texts(".diff tr.new .text")[0])
+        self.accept(page)
+        page.wait(lambda: page.texts("#message") == ["Saved in %s." % self.NODE], "the saving")
+        self.assertIn("(?i)", self.pattern())
+
+    def test_two_people_that_save_one_node_see_both_sides(self):
+        page = self.page_of(self.begin_at_node())
+        other = at.Page(self.second_tab(), self.begin_at_node().url).wait_until_read()
+        other.type_settings(other.settings().replace("invoice.*", "(invoice|bill).*"))
+        other.one("#save").click()
+        self.accept(other)
+        other.wait(lambda: other.texts("#message") == ["Saved in %s." % self.NODE], "the saving")
+        self.leave_second_tab()
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        page.one("#save").click()
+        self.accept(page)
+        page.wait(lambda: len(page.find("dialog[open] .diff")) == 3, "both sides")
+        self.assertIn("bill", page.texts(".diff")[0])
+        self.assertIn("(?i)", page.texts(".diff")[1])
+        self.assertNotIn("(?i)", self.pattern())
+        self.accept(page)
+        page.wait(lambda: "(?i)" in self.pattern(), "the saving over it")
+
+    def test_nothing_is_lost_when_the_service_refuses_or_has_gone(self):
+        secret = self.service.token("reader", "read", self.NODE)
+        bench = self.begin("broken/other-letter-case", None, "--node", self.NODE, *self.service.options_with(secret))
+        page = self.page_of(bench)
+        page.one(".repair").click()
+        page.wait_for_field("total", "12.3")
+        changed = page.settings()
+        for said in ("this needs the role settings at " + self.NODE, "Nobody answers there"):
+            page.one("#save").click()
+            self.accept(page)
+            page.wait(lambda: said in page.texts("#alert")[0], "the line %r" % said)
+            self.assertEqual(page.settings(), changed)
+            self.service.stop()
+        page.type_settings(changed.replace("(?i)", ""))
+        page.wait(lambda: page.field("total")[0] == "\u2717 missing", "the reading without a service")
 
 
 class Safety(BrowserTest):
