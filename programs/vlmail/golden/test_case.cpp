@@ -17,13 +17,6 @@ namespace fs = std::filesystem;
 constexpr std::string_view EXPECTED_ENDING = ".expected.json";
 constexpr std::string_view ZONES_ENDING = ".zones";
 
-bool isDocument(fs::path const& file) {
-    std::string ending = file.extension().string();
-    std::ranges::transform(ending, ending.begin(),
-                           [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-    return ending == ".pdf" || ending == ".txt" || ending == ZONES_ENDING;
-}
-
 /// The document that an expectation belongs to; empty for any other file.
 fs::path documentBeside(fs::path const& expectation) {
     std::string text = expectation.string();
@@ -50,9 +43,18 @@ std::vector<fs::path> filesIn(fs::path const& folder) {
 
 } // namespace
 
+bool isTestDocument(fs::path const& file) {
+    std::string ending = file.extension().string();
+    std::ranges::transform(ending, ending.begin(),
+                           [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    return ending == ".pdf" || ending == ".txt" || isZonesText(file);
+}
+
+bool isZonesText(fs::path const& file) { return file.extension() == ZONES_ENDING; }
+
 fs::path expectationBeside(fs::path const& document) { return document.string().append(EXPECTED_ENDING); }
 
-bool TestCase::isZonesText() const { return document.extension() == ZONES_ENDING; }
+bool TestCase::isZonesText() const { return VlMail::isZonesText(document); }
 
 std::vector<TestCase> testCasesIn(fs::path const& folder) {
     std::vector<TestCase> cases;
@@ -63,7 +65,7 @@ std::vector<TestCase> testCasesIn(fs::path const& folder) {
     };
     for (fs::path const& file : files) {
         fs::path const document = documentBeside(file);
-        if (isDocument(file))
+        if (isTestDocument(file))
             cases.push_back({file, expectationBeside(file), nameOf(file)});
         else if (!document.empty() && !known.contains(document))
             cases.push_back({{}, file, nameOf(file)});

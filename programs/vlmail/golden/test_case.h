@@ -20,6 +20,10 @@ struct TestCase {
     bool isZonesText() const;
 };
 
+/// Whether a file is one that something can be expected of, by its ending.
+bool isTestDocument(std::filesystem::path const& file);
+/// The same of those that are letters as the texts of their zones.
+bool isZonesText(std::filesystem::path const& file);
 /// The file of what is expected of a document.
 std::filesystem::path expectationBeside(std::filesystem::path const& document);
 

@@ -64,7 +64,7 @@ TestResult TestRun::run(TestCase const& one) const {
 DocumentReading TestRun::readingOf(TestCase const& one) const {
     if (!one.isZonesText())
         return readings_.at(one.document.string());
-    return readZonesText(Base::readFile(one.document), Base::validUtf8(one.document.stem().string()), index_);
+    return readZonesFile(one.document, index_);
 }
 
 TestResult TestRun::compare(TestCase const& one, DocumentReading const& reading) const {

@@ -1,6 +1,8 @@
 #include "programs/vlmail/golden/zones_text.h"
 
 #include "programs/base/error.h"
+#include "programs/base/read_file.h"
+#include "programs/base/utf8.h"
 #include "programs/reader/letters.h"
 #include "programs/vlmail/presets/words.h"
 
@@ -78,6 +80,10 @@ DocumentReading readZonesText(std::string const& text, std::string const& docume
     reading.letters = {
         {{}, std::move(letter.fields), std::move(letter.missing), {}, std::move(letter.warnings)}};
     return reading;
+}
+
+DocumentReading readZonesFile(std::filesystem::path const& file, PresetIndex const& presets) {
+    return readZonesText(Base::readFile(file), Base::validUtf8(file.stem().string()), presets);
 }
 
 } // namespace VlMail

@@ -10,6 +10,7 @@
 #include "programs/vlmail/letters/preset_index.h"
 #include "programs/vlmail/letters/reading.h"
 
+#include <filesystem>
 #include <string>
 
 namespace VlMail {
@@ -18,5 +19,8 @@ namespace VlMail {
 /// Throws Error, without the name of the file, when the text is not such a letter or the presets fail.
 DocumentReading readZonesText(std::string const& text, std::string const& documentName,
                               PresetIndex const& presets);
+
+/// The same of a file, under the name of it that is without its ending.
+DocumentReading readZonesFile(std::filesystem::path const& file, PresetIndex const& presets);
 
 } // namespace VlMail

@@ -58,7 +58,7 @@ struct ListedPackPreset {
 /// stands there is left out of the lists.
 class PresetsDocument {
 public:
-    /// Presets of the part "above", which are inherited and not in the text, stand behind those that are, at
+    /// Presets of a part that is inherited and not in the text stand behind those that are, at
     /// places that the text does not have. Throws json::Exc when the text is no JSON object.
     explicit PresetsDocument(std::string const& text, json::Object const& above = {});
 

@@ -8,6 +8,7 @@
 #include "programs/reader/lines.h"
 #include "programs/vlmail/golden/expectation.h"
 #include "programs/vlmail/golden/test_case.h"
+#include "programs/vlmail/golden/zones_text.h"
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/workbench/evaluation.h"
@@ -62,6 +63,12 @@ json::Object linted(std::optional<BrokenText> const& broken, SettingsInWork* set
 
 fs::path fileOf(json::Object const& query, fs::path const& folder) {
     return folder / query.get("document").toString();
+}
+
+fs::path withPages(fs::path file) {
+    if (isZonesText(file))
+        throw Base::Error(Base::Code::FileUnsuitable, "a letter as the texts of its zones has no pages");
+    return file;
 }
 
 int pageOf(json::Object const& query, Reader::Document const& document) {
@@ -140,7 +147,7 @@ SettingsInWork& Desk::settingsOf(std::string const& text) {
 }
 
 Reader::Document& Desk::document(json::Object const& query) {
-    return documents_.document(fileOf(query, folders_.documents));
+    return documents_.document(withPages(fileOf(query, folders_.documents)));
 }
 
 Answer Desk::evaluate(json::Object const& query) {
@@ -158,6 +165,10 @@ Answer Desk::evaluate(json::Object const& query) {
     answer.set("document", query.get("document").toString());
     try {
         answer.set("version", versionOf(markOf(fileOf(query, folders_.documents))));
+        if (isZonesText(fileOf(query, folders_.documents))) {
+            addReading(answer, readingOf(query.get("document").toString(), settings(query)), settings(query));
+            return answerOf(answer);
+        }
         if (!query.get("checks").isTrue()) {
             addEvaluation(answer, document(query), settings(query), nullptr);
             return answerOf(answer);
@@ -229,13 +240,6 @@ std::optional<FileMark> markIfThere(fs::path const& file) {
     return fs::exists(file, ignored) ? std::optional(markOf(file)) : std::nullopt;
 }
 
-/// As a batch reads it, without looking at paper.
-DocumentReading readingOf(Reader::Document& document, SettingsInWork& settings) {
-    Along along;
-    along.limits = Along::Limits::Yes;
-    return readDocument(document, settings.presets(), settings.node(), along).reading;
-}
-
 /// The definitions that the document was read by; none when it got no preset.
 Cfg::ExtractZones definitionsFor(DocumentReading const& reading, SettingsInWork& settings) {
     return reading.failed() ? Cfg::ExtractZones()
@@ -252,6 +256,16 @@ DocumentReading unreadable(std::string const& document, Base::Error const& failu
 }
 
 } // namespace
+
+/// As a batch reads it, without looking at paper.
+DocumentReading Desk::readingOf(std::string const& name, SettingsInWork& settings) {
+    fs::path const file = folders_.documents / name;
+    if (isZonesText(file))
+        return readZonesFile(file, settings.presets());
+    Along along;
+    along.limits = Along::Limits::Yes;
+    return readDocument(documents_.document(file), settings.presets(), settings.node(), along).reading;
+}
 
 DocumentVerdict const& Desk::judge(std::string const& text, std::string const& name) {
     // Those of a few steps back, too.
@@ -273,7 +287,7 @@ DocumentVerdict const& Desk::judge(std::string const& text, std::string const& n
         if (found != byName.end() && found->second.document == mark && found->second.expectation == expected)
             return found->second.verdict;
         SettingsInWork& settings = settingsOf(text);
-        DocumentReading reading = readingOf(documents_.document(file), settings);
+        DocumentReading reading = readingOf(name, settings);
         Cfg::ExtractZones const definitions = definitionsFor(reading, settings);
         return byName
             .insert_or_assign(name,
@@ -309,7 +323,7 @@ Answer Desk::verdict(json::Object const& query) {
 }
 
 Answer Desk::expectation(json::Object const& query) {
-    DocumentReading const reading = readingOf(document(query), settings(query));
+    DocumentReading const reading = readingOf(query.get("document").toString(), settings(query));
     if (reading.failed())
         throw Base::Error(reading.code, reading.error);
     return answerOf({{"text", printed(expectationOf(reading))}});
@@ -318,7 +332,7 @@ Answer Desk::expectation(json::Object const& query) {
 Answer Desk::propose(json::Object const& query) const {
     std::vector<Reader::Document> documents;
     for (json::Value const& name : query.get("documents").toArray())
-        documents.push_back(Reader::openDocument(folders_.documents / name.toString()));
+        documents.push_back(Reader::openDocument(withPages(folders_.documents / name.toString())));
     if (documents.empty())
         throw Base::Error(Base::Code::RequestInvalid, "a proposal is made from 1 document or more");
     return answerOf(proposalFrom(documents));

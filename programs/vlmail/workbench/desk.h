@@ -63,6 +63,7 @@ private:
     }
     SettingsInWork& settingsOf(std::string const& text);
     Reader::Document& document(json::Object const& query);
+    DocumentReading readingOf(std::string const& name, SettingsInWork& settings);
     std::string printedPage(json::Object const& query, int page, double dotsPerInch);
     DocumentVerdict const& judge(std::string const& text, std::string const& document);
 

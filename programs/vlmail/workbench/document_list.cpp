@@ -7,7 +7,6 @@
 #include "programs/vlmail/workbench/kept_documents.h"
 
 #include <algorithm>
-#include <cctype>
 #include <set>
 #include <string_view>
 #include <system_error>
@@ -16,13 +15,6 @@ namespace VlMail::Workbench {
 namespace {
 
 namespace fs = std::filesystem;
-
-bool isDocument(fs::path const& file) {
-    std::string ending = file.extension().string();
-    std::ranges::transform(ending, ending.begin(),
-                           [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-    return ending == ".pdf" || ending == ".txt";
-}
 
 void addProblem(DocumentList& list, fs::path const& where, std::string const& why) {
     list.problems.push_back("cannot look into " + Base::inQuotes(Base::validUtf8(where.string())) + ": " +
@@ -62,7 +54,7 @@ private:
         if (!Base::isUtf8(name))
             return addProblem(list_, one.path(), "its name is no UTF-8; rename it");
         files_.insert(name);
-        if (isDocument(one.path()))
+        if (isTestDocument(one.path()))
             document(one.path(), name);
     }
 
@@ -87,7 +79,7 @@ DocumentList documentsIn(fs::path const& folder) { return Walk(folder).list(); }
 bool isNameInside(fs::path const& folder, std::string const& name) {
     fs::path const path = name;
     bool const isPlain = !name.empty() && name.find('\0') == std::string::npos && path.is_relative() &&
-                         path.lexically_normal() == path && *path.begin() != ".." && isDocument(path);
+                         path.lexically_normal() == path && *path.begin() != ".." && isTestDocument(path);
     std::error_code failure;
     return isPlain && fs::is_regular_file(folder / path, failure);
 }

@@ -25,7 +25,8 @@ struct DocumentList {
     std::vector<std::string> problems;
 };
 
-/// PDF and text files, those of inner folders too; names that are no UTF-8 are problems. Reads none of them.
+/// Files of documents and of letters as the texts of their zones, those of inner folders too; names that are
+/// no UTF-8 are problems. Reads none of them.
 DocumentList documentsIn(std::filesystem::path const& folder);
 
 /// Whether a name is one that the list of this folder may have; others lead out of it.

@@ -4,6 +4,7 @@
 #include "programs/base/error.h"
 #include "programs/base/utf8.h"
 #include "programs/vlmail/explain/explain.h"
+#include "programs/vlmail/explain/refusal.h"
 #include "programs/vlmail/report/describe.h"
 #include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/report/report_file.h"
@@ -174,6 +175,16 @@ public:
                 {"findings", findingsOf(letter)}};
     }
 
+    /// A letter as the texts of its zones.
+    json::Object tell(LetterReading const& letter) const {
+        json::Array zones;
+        for (Cfg::ExtractZone const& zone : preset_.zones())
+            zones.append(givenZone(zone, letter));
+        return {{"pages", json::Array()},   {"pages_in_words", ""}, {"why_not", letter.whyNot()},
+                {"sheets", json::Array()},  {"sides", null()},      {"zones", zones},
+                {"findings", json::Array()}};
+    }
+
     json::Object presetToJson() const {
         return {{"name", preset_.name()}, {"match", preset_.strRegex()}, {"pointer", pointerOf(listed_)}};
     }
@@ -200,6 +211,52 @@ private:
                 {"text", explained.get(Explanation::TEXT)},
                 {"text_box", orNull(explained.get(Explanation::BOX))},
                 {"fields", fields}};
+    }
+
+    json::Object givenZone(Cfg::ExtractZone const& zone, LetterReading const& letter) const {
+        ListedZone const* const listed = settings_.listed(listed_, preset_, zone);
+        json::Array fields;
+        for (Cfg::ExtractField const& definition : zone.fields())
+            fields.append(givenField(definition, settings_.listed(listed, zone, definition), letter));
+        return {{"name", zone.name()},
+                {"sheet", 0},
+                {"box", Workbench::toJson(Box())},
+                {"address_window", false},
+                {"by_point", false},
+                {"nowhere", "its text is given"},
+                {"pointer", pointerOf(listed)},
+                {"location_pointer", null()},
+                {"anchor", null()},
+                {"text", ""},
+                {"text_box", null()},
+                {"fields", fields}};
+    }
+
+    static json::Object givenField(Cfg::ExtractField const& definition, ListedField const* listed,
+                                   LetterReading const& letter) {
+        auto const [state, value] = stateIn(letter, definition.name());
+        return {{"name", definition.name()},
+                {"value", value},
+                {"state", STATES.at(static_cast<std::size_t>(state))},
+                {"note", ""},
+                {"says", ""},
+                {"pattern", definition.strRegex()},
+                {"type", typeInWords(definition)},
+                {"obligatory", definition.mustHave()},
+                {"match", json::Array()},
+                {"raw", null()},
+                {"pointer", pointerOf(listed)},
+                {"near_misses", json::Array()}};
+    }
+
+    static std::pair<Field::State, std::string> stateIn(LetterReading const& letter,
+                                                        std::string const& name) {
+        for (auto const& [priority, field] : letter.fields)
+            if (field.name() == name)
+                return {field.isValid() ? Field::State::Found : Field::State::Invalid,
+                        Base::validUtf8(field.valueToStr())};
+        bool const isMissing = std::ranges::find(letter.missing, name) != letter.missing.end();
+        return {isMissing ? Field::State::Missing : Field::State::NotFound, ""};
     }
 
     json::Object field(Field const& field, Cfg::ExtractZone const& zone, Cfg::ExtractField const& definition,
@@ -287,6 +344,13 @@ json::Value errorOf(DocumentReading const& reading) {
     return json::Object{{"code", Base::nameOf(reading.code)}, {"line", reading.error}};
 }
 
+void addVerdict(json::Object& answer, DocumentReading const& reading, int pageCount) {
+    answer.set("page_count", pageCount);
+    answer.set("verdict", verdictWord(reading));
+    answer.set("says", Report::stateOf(reading));
+    answer.set("error", errorOf(reading));
+}
+
 } // namespace
 
 json::Object toJson(Reader::Box const& box) {
@@ -310,11 +374,20 @@ void addEvaluation(json::Object& answer, Reader::Document& document, SettingsInW
     };
     DocumentReading const reading =
         readDocument(document, settings.presets(), settings.node(), along).reading;
-    answer.set("page_count", document.pageCount());
-    answer.set("verdict", verdictWord(reading));
-    answer.set("says", Report::stateOf(reading));
-    answer.set("error", errorOf(reading));
+    addVerdict(answer, reading, document.pageCount());
     addPresets(answer, reading, settings);
+}
+
+void addReading(json::Object& answer, DocumentReading const& reading, SettingsInWork& settings) {
+    addVerdict(answer, reading, 0);
+    auto const [preset, pack] = settings.presets().findMatch(reading.document);
+    Teller const teller(settings, preset, pack.name());
+    json::Array letters;
+    for (LetterReading const& letter : *reading.letters)
+        letters.append(teller.tell(letter));
+    answer.set("extract_preset", teller.presetToJson());
+    answer.set("pack_preset", json::Object{{"name", pack.name()}, {"pointer", teller.packPointer()}});
+    answer.set("letters", letters);
 }
 
 } // namespace VlMail::Workbench

@@ -15,4 +15,7 @@ json::Object toJson(Reader::Box const& box);
 void addEvaluation(json::Object& answer, Reader::Document& document, SettingsInWork& settings,
                    MakingReady* making);
 
+/// The same of a letter as the texts of its zones, of which nothing has a place on a page.
+void addReading(json::Object& answer, DocumentReading const& reading, SettingsInWork& settings);
+
 } // namespace VlMail::Workbench

@@ -199,6 +199,53 @@ TEST_F(WorkbenchSession, KeepsWhatIsShownAsAGoldenCaseAndHoldsLaterSettingsAgain
     EXPECT_THAT(golden(after), HasSubstr("\"ok\""));
 }
 
+TEST_F(WorkbenchSession, ReadsLettersAsTheTextsOfTheirZonesLikeOtherDocuments) {
+    write("invoice 3.zones", "[All]\nDear Ms Roe\nTotal: 9.90 EUR\n");
+    json::Object const listed = ask("state", {}).get("documents").toArray().at(0).toObject();
+    EXPECT_EQ(listed.get("name").textOrEmpty(), "invoice 3.zones");
+    json::Object query{{"document", "invoice 3.zones"}, {"settings", INVOICES}};
+    auto const field = [&](std::string const& settings, char const* key) {
+        json::Object const read = ask("evaluate", {{"document", "invoice 3.zones"}, {"settings", settings}});
+        json::Object const zone =
+            read.get("letters").toArray().at(0).toObject().get("zones").toArray().at(0).toObject();
+        return zone.get("fields").toArray().at(0).toObject().get(key).textOrEmpty();
+    };
+    EXPECT_EQ(ask("evaluate", query).get("page_count").toInt(), 0);
+    EXPECT_EQ(field(INVOICES, "value"), "9.90");
+    EXPECT_EQ(field(INVOICES, "state"), "found");
+    EXPECT_EQ(field(INVOICES, "pointer"), "/extract_presets/0/zones/0/fields/0");
+    EXPECT_EQ(ask("golden", query).get("file").textOrEmpty(), "invoice 3.zones.expected.json");
+    std::string after = INVOICES;
+    after.replace(after.find("EUR"), 3, "USD");
+    EXPECT_EQ(field(after, "state"), "missing");
+    json::Array documents;
+    documents.append("invoice 3.zones");
+    json::Object const verdict =
+        ask("verdicts", {{"settings", after}, {"before", INVOICES}, {"documents", documents}})
+            .get("verdicts")
+            .toArray()
+            .at(0)
+            .toObject();
+    EXPECT_EQ(verdict.get("change").textOrEmpty(), "worse");
+    EXPECT_EQ(verdict.get("golden").toObject().get("verdict").textOrEmpty(), "differs");
+}
+
+TEST_F(WorkbenchSession, SaysWhyALetterAsTheTextsOfItsZonesCannotBeReadOrDrawn) {
+    write("invoice 3.zones", "Total: 9.90 EUR\n");
+    json::Object const read = ask("evaluate", {{"document", "invoice 3.zones"}, {"settings", INVOICES}});
+    EXPECT_EQ(read.get("verdict").textOrEmpty(), "failed");
+    EXPECT_EQ(read.get("error").toObject().get("line").textOrEmpty(),
+              "it does not begin with the name of a zone; put [Name] in front");
+    for (char const* const what : {"blocks", "picture"}) {
+        json::Object const refused = ask(what, {{"document", "invoice 3.zones"}, {"page", 1}, {"dots", 50}});
+        EXPECT_EQ(refused.get("error").toObject().get("line").textOrEmpty(),
+                  "a letter as the texts of its zones has no pages");
+    }
+    json::Array documents;
+    documents.append("invoice 3.zones");
+    EXPECT_EQ(codeIn(ask("propose", {{"documents", documents}})), "file-unsuitable");
+}
+
 TEST_F(WorkbenchSession, GivesTheSchemaOfSettings) {
     EXPECT_THAT(answer("schema", {}).body, HasSubstr("extract_presets"));
 }
