@@ -1,11 +1,15 @@
 #include "programs/vlmail/commands/command.h"
 #include "programs/vlmail/letters/node_settings.h"
 
+#include "vlservice/json/json_text.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <stdexcept>
+#include <string>
 
 namespace {
 
@@ -49,6 +53,47 @@ TEST_F(NodeSettingsTest, TakesPartsUnderTheirNames) {
                                           "pack_presets": [{"name": "A"}]}})");
     EXPECT_EQ(packPresetFor(path, "abc"), "A");
     EXPECT_EQ(packPresetFor(path, "xyz"), "GLOBAL");
+}
+
+/// What a node of the account acme inherits from the root.
+Protocol::SettingsAnswer inheritedSettings() {
+    std::string const text =
+        R"({"id":"a=acme","known":true,"chain":["a=acme",""],"parts":{)"
+        R"("app":{"own":{},"values":{"descr":"above","db_name":"n"},"origins":{"descr":"","db_name":null}},)"
+        R"("presets":{"own":{},"values":{"extract_presets":[{"match":".*","pack_preset":"P"}],)"
+        R"("pack_presets":[{"name":"P"}]},"origins":{"extract_presets":[""],"pack_presets":[""]}}}})";
+    return Protocol::SettingsAnswer(json::strToObject(text.data(), text.size()));
+}
+
+TEST_F(NodeSettingsTest, AreANodesOwnOverWhatItInherits) {
+    VlMail::NodeSettings const settings =
+        VlMail::NodeSettings::fromText(R"({"app": {"descr": "own"}, "presets": {
+            "extract_presets": [{"match": "a.*", "pack_preset": "late", "order": 9},
+                                {"match": "ab.*", "pack_preset": "early", "order": 3}],
+            "pack_presets": [{"name": "early"}, {"name": "late"}]}})",
+                                       "mine")
+            .over(inheritedSettings());
+    EXPECT_EQ(json::toText(settings.part("app")), R"({"descr":"own","db_name":"n"})");
+    EXPECT_EQ(settings.sourced().sourceOf("app", "descr"), "a=acme");
+    EXPECT_EQ(settings.sourced().sourceOf("app", "db_name"), "the built-in settings");
+    EXPECT_EQ(settings.sourced().sourceOfPackPreset("early"), "a=acme");
+    EXPECT_EQ(settings.sourced().sourceOfPackPreset("P"), "the root");
+    Cfg::Presets const presets = settings.presets();
+    EXPECT_EQ(presets.findMatch("abc").second.name(), "early");
+    EXPECT_EQ(presets.findMatch("acc").second.name(), "late");
+    EXPECT_EQ(presets.findMatch("xyz").second.name(), "P");
+}
+
+TEST_F(NodeSettingsTest, NameThePartThatCannotStandOverWhatIsInherited) {
+    VlMail::NodeSettings const settings = VlMail::NodeSettings::fromText(R"({"app": {"descr": 7}})", "mine");
+    try {
+        settings.over(inheritedSettings());
+        FAIL() << "nothing was thrown";
+    } catch (std::runtime_error const& error) {
+        EXPECT_STREQ(error.what(),
+                     "cannot use the part \"app\" in \"mine\": JSON error: Wrong type: integer. "
+                     "Expected type: string; correct it there");
+    }
 }
 
 TEST_F(NodeSettingsTest, TakesThePresetsPartByItself) {

@@ -145,6 +145,12 @@ json::Value placeIn(json::Object const& evaluation, char const* preset) {
     return evaluation.get(preset).toObject().get("pointer");
 }
 
+TEST(WorkbenchOptions, NameAFileOrANodeAndNotBoth) {
+    Ran const ran = runVlMail({"workbench", ".", "--settings", "node.json", "--node", NODE});
+    EXPECT_EQ(ran.status, 1);
+    EXPECT_EQ(ran.err, "vlmail: --settings excludes --node; --help explains [usage]\n");
+}
+
 TEST_F(WorkbenchAtANode, EditsWhatTheNodeHasOfItsOwn) {
     set(NODE, "app", R"({"descr":"Bob"})");
     json::Object const settings = ask("state", {}).get("settings").toObject();

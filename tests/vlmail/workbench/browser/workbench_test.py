@@ -33,6 +33,21 @@ class Reading(BrowserTest):
         page.wait_for_field("number", "2024-18")
         self.assertEqual(page.texts("#list [aria-selected=true] .name"), ["Invoice 18.pdf"])
 
+    def test_a_letter_as_the_texts_of_its_zones_has_fields_and_no_page(self):
+        bench = self.begin("broken/other-letter-case")
+        with open(os.path.join(bench.folder, "invoice 18.zones"), "w", encoding="utf-8") as file:
+            file.write("[Text]\nTotal: 7.50 EUR\n")
+        page = self.page_of(bench)
+        page.choose("invoice 18.zones")
+        page.wait_for_field("total", "7.5")
+        self.assertIn("Letter 1 of 1, texts of its zones", page.texts("#fields-body h3")[0])
+        self.assertEqual(page.texts("#picture-note"), ["a letter as the texts of its zones has no pages"])
+        page.one("#golden").click()
+        page.wait(lambda: page.texts("#message") == ["Kept in invoice 18.zones.expected.json."], "the case")
+        page.type_settings(page.settings().replace("^Total", "^Sum"))
+        page.wait(lambda: "1 not as kept" in page.texts("#tab-effect")[0], "the difference")
+        self.assertEqual(page.logged(), [])
+
     def test_the_list_filters_by_name_and_by_verdict(self):
         page = self.open("office")
         page.wait(lambda: page.texts("#counts")[0].startswith("4 of 4 shown") and "not read" not in page.texts("#counts")[0], "the verdicts")
