@@ -12,7 +12,6 @@
 #include "programs/vlmail/letters/making_ready.h"
 #include "programs/vlmail/report/printed_pages.h"
 #include "programs/vlmail/workbench/evaluation.h"
-#include "programs/vlmail/workbench/printed_picture.h"
 #include "programs/vlmail/workbench/proposal.h"
 #include "vlservice/json/json_text.h"
 
@@ -128,6 +127,7 @@ void Desk::inherit(std::string const& told) {
     settings_.clear();
     judged_.clear();
     making_.forget();
+    letters_.reset();
     inheritedText_ = told;
     inherited_ = parts;
 }
@@ -211,10 +211,24 @@ Answer Desk::picture(json::Object const& query) {
                                              : Report::pictureOf(read, page, dotsPerInch)};
 }
 
-std::string Desk::printedPage(json::Object const& query, int page, double dotsPerInch) {
+PrintedLetters const& Desk::printedLetters(json::Object const& query, Along::Checks checks) {
     SettingsInWork& by = settings(query);
-    MakingReady& making = making_.making(fileOf(query, folders_.documents), by);
-    return printedPicture(document(query), by, making, {page, sideIn(query.get("side")), dotsPerInch});
+    fs::path const file = fileOf(query, folders_.documents);
+    FileMark const mark = markOf(file);
+    bool const isKnown = letters_ && letters_->settings == by.text().text() && letters_->file == file &&
+                         letters_->mark == mark &&
+                         (letters_->letters.areChecked || checks == Along::Checks::No);
+    if (!isKnown)
+        letters_ = {by.text().text(), file, mark, lettersIn(document(query), by, checks)};
+    return letters_->letters;
+}
+
+std::string Desk::printedPage(json::Object const& query, int page, double dotsPerInch) {
+    WantedPicture const wanted{page, sideIn(query.get("side")), dotsPerInch};
+    auto const checks = wanted.isCover() ? Along::Checks::Yes : Along::Checks::No;
+    PrintedLetters const& letters = printedLetters(query, checks);
+    MakingReady& making = making_.making(fileOf(query, folders_.documents), settings(query));
+    return printedPicture(document(query), letters, making, wanted);
 }
 
 Answer Desk::blocks(json::Object const& query) {

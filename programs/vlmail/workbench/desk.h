@@ -6,6 +6,7 @@
 #include "programs/vlmail/workbench/folders.h"
 #include "programs/vlmail/workbench/kept_documents.h"
 #include "programs/vlmail/workbench/kept_making.h"
+#include "programs/vlmail/workbench/printed_picture.h"
 #include "programs/vlmail/workbench/settings_in_work.h"
 #include "programs/vlmail/workbench/verdict.h"
 
@@ -62,6 +63,15 @@ private:
         return settingsOf(query.get("settings").toString());
     }
     SettingsInWork& settingsOf(std::string const& text);
+    /// What the picture before was made from: those of one document come one behind the other.
+    struct KeptLetters {
+        std::string settings;
+        std::filesystem::path file;
+        FileMark mark;
+        PrintedLetters letters;
+    };
+
+    PrintedLetters const& printedLetters(json::Object const& query, Along::Checks checks);
     Reader::Document& document(json::Object const& query);
     DocumentReading readingOf(std::string const& name, SettingsInWork& settings);
     std::string printedPage(json::Object const& query, int page, double dotsPerInch);
@@ -73,6 +83,7 @@ private:
     /// As it was told, and what it means; null for nothing.
     std::string inheritedText_;
     std::shared_ptr<Protocol::SettingsAnswer const> inherited_;
+    std::optional<KeptLetters> letters_;
     /// The last are the first.
     std::list<SettingsInWork> settings_;
     std::list<std::pair<std::string, std::map<std::string, Judged>>> judged_;

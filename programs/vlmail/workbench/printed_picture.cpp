@@ -2,14 +2,12 @@
 
 #include "programs/base/error.h"
 #include "programs/reader/document.h"
-#include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/report/printed_pages.h"
 
 #include <algorithm>
 #include <array>
 #include <string_view>
 #include <utility>
-#include <vector>
 
 namespace VlMail::Workbench {
 namespace {
@@ -28,44 +26,42 @@ bool isSame(Side const& one, Side const& other) {
                       "nothing like " + inWords(side) + " goes out with the letter");
 }
 
-std::string pictureIn(std::vector<LetterReading> const& letters, Report::PrintedPages& pages,
-                      WantedPicture const& wanted) {
-    auto const letter = std::ranges::find_if(letters, [&](LetterReading const& one) {
-        return std::ranges::find(one.pages, wanted.page) != one.pages.end();
-    });
-    if (!wanted.side)
-        return letter == letters.end() ? Report::pictureOf(pages.document(), wanted.page, wanted.dotsPerInch)
-                                       : pages.picture(*letter, wanted.page, wanted.dotsPerInch);
-    if (letter == letters.end())
-        refuse(*wanted.side);
-    for (Side const& side : pages.sides(*letter))
-        if (isSame(side, *wanted.side))
-            return pages.picture(*letter, side, wanted.dotsPerInch);
-    refuse(*wanted.side);
+std::string pictureOf(Side const& wanted, LetterReading const& letter, Report::PrintedPages& pages,
+                      double dotsPerInch) {
+    for (Side const& side : pages.sides(letter))
+        if (isSame(side, wanted))
+            return pages.picture(letter, side, dotsPerInch);
+    refuse(wanted);
 }
 
 } // namespace
 
-std::string printedPicture(Reader::Document& document, SettingsInWork& settings, MakingReady& making,
-                           WantedPicture const& wanted) {
-    std::optional<std::string> png;
-    bool hasLetters = false;
+PrintedLetters lettersIn(Reader::Document& document, SettingsInWork& settings, Along::Checks checks) {
+    PrintedLetters printed;
+    printed.areChecked = checks == Along::Checks::Yes;
     Along along;
-    // Only a look at the paper tells which letter gets a cover page.
-    along.checks =
-        wanted.side && wanted.side->kind == Side::Kind::Cover ? Along::Checks::Yes : Along::Checks::No;
-    along.afterReading = [&](ReadResult& result, OpenDocument const& read) {
-        hasLetters = true;
-        Report::PrintedPages pages(read.document, read.packPreset, making);
-        png = pictureIn(*result.reading.letters, pages, wanted);
+    along.checks = checks;
+    along.afterReading = [&](ReadResult const&, OpenDocument const& read) {
+        printed.packPreset = read.packPreset;
     };
-    DocumentReading const reading =
-        readDocument(document, settings.presets(), settings.node(), along).reading;
-    if (hasLetters && reading.failed())
-        throw Base::Error(reading.code, reading.error);
-    if (!png && wanted.side)
+    DocumentReading reading = readDocument(document, settings.presets(), settings.node(), along).reading;
+    if (reading.letters)
+        printed.letters = *std::move(reading.letters);
+    return printed;
+}
+
+std::string printedPicture(Reader::Document& document, PrintedLetters const& printed, MakingReady& making,
+                           WantedPicture const& wanted) {
+    auto const letter = std::ranges::find_if(printed.letters, [&](LetterReading const& one) {
+        return std::ranges::find(one.pages, wanted.page) != one.pages.end();
+    });
+    Report::PrintedPages pages(document, printed.packPreset, making);
+    if (letter != printed.letters.end())
+        return wanted.side ? pictureOf(*wanted.side, *letter, pages, wanted.dotsPerInch)
+                           : pages.picture(*letter, wanted.page, wanted.dotsPerInch);
+    if (wanted.side)
         refuse(*wanted.side);
-    return png ? *std::move(png) : Report::pictureOf(document, wanted.page, wanted.dotsPerInch);
+    return Report::pictureOf(document, wanted.page, wanted.dotsPerInch);
 }
 
 json::Object toJson(Side const& side) {

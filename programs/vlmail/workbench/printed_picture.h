@@ -2,11 +2,13 @@
 // Pictures of what goes out: pages with their letterheads, and what is sent along with a letter.
 
 #include "programs/vlmail/letters/making_ready.h"
+#include "programs/vlmail/letters/reading.h"
 #include "programs/vlmail/report/report.h"
 #include "programs/vlmail/workbench/settings_in_work.h"
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace Reader {
 class Document;
@@ -19,11 +21,23 @@ struct WantedPicture {
     /// Of the letter that the page belongs to; the page itself without one.
     std::optional<Report::Side> side = {};
     double dotsPerInch = 0;
+
+    bool isCover() const { return side && side->kind == Report::Side::Kind::Cover; }
 };
 
-/// A PNG; empty for a blank side. A page of a document that the settings make no letters of is as it is.
-/// Throws Base::Error.
-std::string printedPicture(Reader::Document& document, SettingsInWork& settings, MakingReady& making,
+/// What pictures of a document's letters are made from.
+struct PrintedLetters {
+    /// None of a document that the settings make no letters of.
+    std::vector<LetterReading> letters = {};
+    Cfg::PackPreset packPreset = {};
+    /// Only a look at the paper tells which letter gets a cover page.
+    bool areChecked = false;
+};
+
+PrintedLetters lettersIn(Reader::Document& document, SettingsInWork& settings, Along::Checks checks);
+
+/// A PNG; empty for a blank side. Without letters a page is as it is. Throws Base::Error.
+std::string printedPicture(Reader::Document& document, PrintedLetters const& letters, MakingReady& making,
                            WantedPicture const& wanted);
 
 /// {"kind", "width", "height", "page", "attachment", "id"}.

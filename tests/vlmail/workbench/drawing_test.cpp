@@ -332,6 +332,27 @@ TEST_F(DeskOfTurnedPages, FollowsLetterheadsThatChange) {
     EXPECT_NE(picture().body, second);
 }
 
+TEST_F(DeskOfTurnedPages, DrawsWhatTheDocumentAndTheSettingsAreByThen) {
+    Shown const shown = with(R"("title": "as it is")");
+    Workbench::Desk desk({shown.folder, shown.documents});
+    auto const picture = [&] {
+        return desk
+            .answer("picture", json::toText(json::Object{{"document", shown.document},
+                                                         {"settings", textOf(shown.settings)},
+                                                         {"page", 1},
+                                                         {"dots", 40}}))
+            .body;
+    };
+    std::string const first = picture();
+    with(R"("orientation": 2)");
+    std::string const turned = picture();
+    EXPECT_NE(turned, first);
+    with(R"("title": "as it is")");
+    EXPECT_EQ(picture(), first);
+    write("letters/a.txt", "\n\nAnother letter altogether");
+    EXPECT_NE(picture(), first);
+}
+
 TEST_F(DeskOfTurnedPages, RefusesSidesThatAreNone) {
     Shown const shown = with(ALL_SIDES);
     Workbench::Desk desk({shown.folder, shown.documents});
