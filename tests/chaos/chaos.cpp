@@ -6,8 +6,11 @@
 
 #include <chrono>
 #include <cstdlib>
+#include <exception>
 #include <iostream>
 #include <random>
+#include <string>
+#include <vector>
 
 namespace {
 
@@ -23,20 +26,35 @@ void tell(std::vector<Chaos::Step> const& steps) {
         std::cout << "    step " << step + 1 << ": " << steps[step].text() << '\n';
 }
 
+void tellHowToRepeat(std::vector<Chaos::Step> const& steps, unsigned seed, unsigned number) {
+    tell(steps);
+    std::cout << "  to repeat: scripts/chaos --repeat " << seed << ' ' << number << std::endl;
+}
+
+/// What was found; where not even that can be had, it says in which round.
+std::vector<std::string> findingsOf(Chaos::Round& round, std::vector<Chaos::Step> const& steps, unsigned seed,
+                                    unsigned number) {
+    try {
+        return round.run(steps, CLIENTS);
+    } catch (std::exception const& failure) {
+        std::cout << "round " << number << " has no end: " << failure.what() << '\n';
+        tellHowToRepeat(steps, seed, number);
+        throw;
+    }
+}
+
 /// Whether there was a finding.
 bool runRound(Chaos::Installation& installation, unsigned seed, unsigned number) {
     unsigned const own = seedOf(seed, number);
     std::vector<Chaos::Step> const steps = Chaos::randomSteps(own, STEPS);
     Chaos::Round round(installation, "m" + std::to_string(seed) + '-' + std::to_string(number), own);
-    std::vector<std::string> const findings = round.run(steps, CLIENTS);
+    std::vector<std::string> const findings = findingsOf(round, steps, seed, number);
     std::cout << "round " << number << ": " << round.answered() << " mailings answered, " << round.decided()
               << " letters decided by a person, " << findings.size() << " findings" << std::endl;
     for (std::string const& finding : findings)
         std::cout << "  FOUND: " << finding << '\n';
-    if (!findings.empty()) {
-        tell(steps);
-        std::cout << "  to repeat: scripts/chaos --repeat " << seed << ' ' << number << std::endl;
-    }
+    if (!findings.empty())
+        tellHowToRepeat(steps, seed, number);
     return !findings.empty();
 }
 
@@ -51,7 +69,24 @@ int chaos(Chaos::Installation& installation, double minutes, unsigned seed) {
     return findings == 0 ? 0 : 1;
 }
 
-unsigned numberIn(char const* text) { return static_cast<unsigned>(std::strtoul(text, nullptr, 10)); }
+unsigned numberIn(std::string const& text) {
+    return static_cast<unsigned>(std::strtoul(text.c_str(), nullptr, 10));
+}
+
+int run(std::vector<std::string> const& words, bool repeats, double minutes) {
+    Chaos::Installation installation;
+    if (!installation.whyNot().empty()) {
+        std::cerr << "chaos: " << installation.whyNot() << '\n';
+        return 1;
+    }
+    if (!installation.whyNoSmallDisk().empty())
+        std::cout << "no disk is ever full: " << installation.whyNoSmallDisk() << std::endl;
+    if (!installation.whyNoRelay().empty())
+        std::cout << "no connection of clients is cut: " << installation.whyNoRelay() << std::endl;
+    if (repeats)
+        return runRound(installation, numberIn(words[1]), numberIn(words[2])) ? 1 : 0;
+    return chaos(installation, minutes, words.size() == 2 ? numberIn(words[1]) : std::random_device{}());
+}
 
 } // namespace
 
@@ -63,16 +98,10 @@ int main(int argc, char** argv) {
         std::cerr << "usage: chaos MINUTES [SEED] | chaos --repeat SEED ROUND\n";
         return 1;
     }
-    Chaos::Installation installation;
-    if (!installation.whyNot().empty()) {
-        std::cerr << "chaos: " << installation.whyNot() << '\n';
+    try {
+        return run(words, repeats, minutes);
+    } catch (std::exception const& failure) {
+        std::cerr << "chaos: " << failure.what() << '\n';
         return 1;
     }
-    if (!installation.whyNoSmallDisk().empty())
-        std::cout << "no disk is ever full: " << installation.whyNoSmallDisk() << std::endl;
-    if (!installation.whyNoRelay().empty())
-        std::cout << "no connection of clients is cut: " << installation.whyNoRelay() << std::endl;
-    if (repeats)
-        return runRound(installation, numberIn(argv[2]), numberIn(argv[3])) ? 1 : 0;
-    return chaos(installation, minutes, words.size() == 2 ? numberIn(argv[2]) : std::random_device{}());
 }

@@ -83,6 +83,32 @@ TEST_F(ServiceProcessTest, EndsCleanlyOnATermSignalAndKeepsWhatItHas) {
     }
 }
 
+TEST_F(ServiceProcessTest, ForgetsAtItsStartWhatTheTimeIsUpOf) {
+    {
+        ServiceProcess const service(arguments());
+        storePack(folder_ / "packs.db", "p1");
+        auto const client = clientOf(service, data_);
+        client->call<Ipc::ProcessPack>(folder_.path().string(), "packs.db", "p1");
+        client->call<Ipc::CSConfigIdsList>(
+            parse(R"({"query":"change_jobs","action":"cancel","ids":["p1"]})"));
+    }
+    SQLite::Database database((data_ / "service.db").string(), SQLite::OPEN_READWRITE);
+    database.setBusyTimeout(10'000);
+    EXPECT_EQ(database.execAndGet("SELECT state FROM jobs").getString(), "cancelled");
+    database.exec("UPDATE jobs SET accepted_at = 1, changed_at = 1");
+    database.exec("INSERT INTO registered_mailings (id, pack, node, at, ends_at) VALUES (1, 'p0', '', 1, 2)");
+    ServiceProcess const next(arguments());
+    auto const left = [&] {
+        return database
+            .execAndGet("SELECT (SELECT count(*) FROM jobs) + (SELECT count(*) FROM registered_mailings)")
+            .getInt();
+    };
+    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+    while (left() > 0 && std::chrono::steady_clock::now() < end) {
+    }
+    EXPECT_EQ(left(), 0);
+}
+
 TEST_F(ServiceProcessTest, TellsErrorsOfCommandsWithoutAnAnswerAsErrors) {
     ServiceProcess const service(arguments());
     auto const client = clientOf(service, data_);
