@@ -42,6 +42,9 @@ private:
     fs::path file_;
 };
 
+/// What is laid on letters, or goes along with them, stands in a folder of its own.
+bool isLetter(std::string const& pdf) { return fs::path(pdf).parent_path().filename() != "documents"; }
+
 bool hasOnePage(std::string const& pdf) {
     std::unique_ptr<poppler::document> const document(poppler::document::load_from_file(pdf));
     return document && document->pages() == 1;
@@ -49,7 +52,7 @@ bool hasOnePage(std::string const& pdf) {
 
 std::vector<std::string> letters() {
     std::vector<std::string> found = Bench::documents();
-    std::erase_if(found, [](std::string const& pdf) { return !hasOnePage(pdf); });
+    std::erase_if(found, [](std::string const& pdf) { return !isLetter(pdf) || !hasOnePage(pdf); });
     return found;
 }
 
