@@ -30,6 +30,6 @@ function(vlservice_add_late_program name)
             -DNM=${CMAKE_NM} -DOBJDUMP=${CMAKE_OBJDUMP} -P ${PROJECT_SOURCE_DIR}/cmake/WriteLateCalls.cmake
         DEPENDS ${name}_at_once ${PROJECT_SOURCE_DIR}/cmake/WriteLateCalls.cmake VERBATIM)
     target_sources(${name} PRIVATE ${calls})
-    target_link_libraries(${name} PRIVATE VLService::base ${CMAKE_DL_LIBS})
+    target_link_libraries(${name} PRIVATE VLService::base)
     target_link_options(${name} PRIVATE -Wl,--as-needed)
 endfunction()
