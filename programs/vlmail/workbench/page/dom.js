@@ -57,17 +57,19 @@ function retyped(old, fresh) {
         fresh.setSelectionRange(old.selectionStart, old.selectionEnd);
 }
 
-/** The same children in the end; those that are as they are to be are left alone, with whatever is done to them just now. */
+/** The same children in the end; those that are as they are to be are left alone, with whatever is done to them just now,
+    though others come and go in front of them. */
 function replaceDifferent(parent, children) {
-    children.forEach((child, place) => {
-        const old = parent.childNodes[place];
-        if (!old)
-            parent.append(child);
-        else if (!old.isEqualNode(child))
-            old.replaceWith(child);
+    const old = [...parent.childNodes];
+    const shown = children.map((child) => {
+        const same = old.findIndex((one) => one.isEqualNode(child));
+        return same < 0 ? child : old.splice(same, 1)[0];
     });
-    while (parent.childNodes.length > children.length)
-        parent.lastChild.remove();
+    old.forEach((one) => one.remove());
+    shown.forEach((child, place) => {
+        if (parent.childNodes[place] !== child)
+            parent.insertBefore(child, parent.childNodes[place] ?? null);
+    });
 }
 
 /**

@@ -156,6 +156,14 @@ class Modules(BrowserTest):
         edits = [{"from": {"line": 1, "ch": 1}, "to": {"line": 1, "ch": 2}, "text": "XY"}, {"from": {"line": 0, "ch": 0}, "to": {"line": 0, "ch": 0}, "text": "- "}]
         self.assertEqual(self.page.imported("edits.js", "m.edited(a[0], a[1])", "one\ntwo", edits), "- one\ntXYo")
 
+    def test_what_looks_the_same_stays_the_same_element_whatever_comes_in_front_of_it(self):
+        kept = """(() => { const p = document.createElement("div"); const made = (...texts) => texts.map((t) => m.el("b", {}, t));
+            m.show(p, ...made("a", "b", "c")); const [a, b, c] = p.children; const seen = [];
+            for (const texts of [["x", "a", "b", "c"], ["b", "c"], ["c", "y", "b"]]) {
+                m.show(p, ...made(...texts)); seen.push([p.textContent, [...p.children].indexOf(b), [...p.children].indexOf(c)]); }
+            return seen; })()"""
+        self.assertEqual(self.page.imported("dom.js", kept), [["xabc", 2, 3], ["bc", 0, 1], ["cyb", 2, 0]])
+
     def test_every_language_has_every_text(self):
         self.assertEqual(self.page.imported("texts.js", "m.missing()"), [])
 
