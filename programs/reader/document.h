@@ -73,9 +73,6 @@ private:
     std::pair<int, std::optional<Picture>> lastOverview_;
 };
 
-/// Does what comes before the first PDF; processes that are forked behind it have it done.
-void prepareToReadPdfs();
-
 /// Opens a PDF, or a text file whose pages end with form feeds. Throws Error.
 Document openDocument(std::filesystem::path const& path);
 

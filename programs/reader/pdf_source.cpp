@@ -2,7 +2,6 @@
 // pdf_page.
 #include "programs/base/error.h"
 #include "programs/reader/clean_text.h"
-#include "programs/reader/document.h"
 #include "programs/reader/page_objects.h"
 #include "programs/reader/page_source.h"
 #include "programs/reader/pdf_extras.h"
@@ -392,8 +391,6 @@ private:
 };
 
 } // namespace
-
-void prepareToReadPdfs() { preparePoppler(); }
 
 std::unique_ptr<PageSource> openPdf(std::string bytes, std::string const& where) {
     return std::make_unique<PdfSource>(std::move(bytes), where);

@@ -1,6 +1,5 @@
 #include "programs/vlmail/letters/worker_pool.h"
 
-#include "programs/reader/document.h"
 #include "programs/vlmail/letters/process_usage.h"
 #include "programs/vlmail/letters/worker_socket.h"
 
@@ -253,9 +252,6 @@ void runJobs(std::size_t count, Workers const& workers, Job const& job, Consumer
              Progress const& progress) {
     if (count == 0)
         return;
-    // What is done here is done for all workers; a single one does what its document takes.
-    if (count > 1)
-        Reader::prepareToReadPdfs();
     Pool(count, workers, job, consume, progress).run();
 }
 
