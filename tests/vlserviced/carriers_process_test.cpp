@@ -289,16 +289,18 @@ protected:
         client.call<Ipc::ProcessPack>(folder_.path().string(), "counted.db", "s1");
         client.call<Ipc::UploadQueued>(folder_.path().string(), "counted.db");
     }
-    bool send(ServiceProcess const& service) const {
+    /// Whether nothing is under way any more.
+    testing::AssertionResult send(ServiceProcess const& service) const {
         try {
             auto const client = clientOf(service, data_);
             begin(*client);
             auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
             while (isUnderWay(told(*client)) && std::chrono::steady_clock::now() < end) {
             }
-            return !isUnderWay(told(*client));
-        } catch (std::exception const&) {
-            return false;
+            std::string const states = told(*client);
+            return (isUnderWay(states) ? testing::AssertionFailure() : testing::AssertionSuccess()) << states;
+        } catch (std::exception const& failure) {
+            return testing::AssertionFailure() << failure.what();
         }
     }
     static bool isUnderWay(std::string const& states) {
