@@ -38,7 +38,7 @@ class BrowserTest(unittest.TestCase):
         return page
 
     def accept(self, page):
-        page.one('dialog[open] button[value="accept"]').click()
+        page.press('dialog[open] button[value="accept"]')
 
     def second_tab(self):
         self.first = self.driver.current_window_handle

@@ -239,6 +239,10 @@ class Page:
     def one(self, selector):
         return self.until("[...document.querySelectorAll(a[0])].find((one) => one.checkVisibility({ checkVisibilityCSS: true }))", selector, selector)
 
+    def press(self, selector):
+        """Clicks what a person sees there, whatever is put in its place while the page goes on reading."""
+        self.wait(lambda: self.one(selector).click() is None, "a press of " + selector)
+
     def texts(self, selector):
         return self.run("return [...document.querySelectorAll(arguments[0])].map((one) => one.innerText)", selector)
 

@@ -42,7 +42,7 @@ class Reading(BrowserTest):
         page.wait_for_field("total", "7.5")
         self.assertIn("Letter 1 of 1, texts of its zones", page.texts("#fields-body h3")[0])
         self.assertEqual(page.texts("#picture-note"), ["a letter as the texts of its zones has no pages"])
-        page.one("#golden").click()
+        page.press("#golden")
         page.wait(lambda: page.texts("#message") == ["Kept in invoice 18.zones.expected.json."], "the case")
         page.type_settings(page.settings().replace("^Total", "^Sum"))
         page.wait(lambda: "1 not as kept" in page.texts("#tab-effect")[0], "the difference")
@@ -124,7 +124,7 @@ class Reading(BrowserTest):
         page.until("document.querySelectorAll('#list .row').length === 5 && document.querySelector('#tab-effect').innerText.includes('4 worse')", "the effect on the others")
         page.choose("Invoice 18.pdf")
         page.until("document.querySelector('#stage img').alt.endsWith('Invoice 18.pdf')", "the picture")
-        page.one("#undo").click()
+        page.press("#undo")
         page.wait_for_field("number", "2024-18")
 
     def test_a_folder_without_rights_is_told_in_a_line(self):
@@ -193,7 +193,7 @@ class Changing(BrowserTest):
                 continue
             repaired += 1
             page.until("%s !== a[1] && %s[0] === '\u2713 found'" % (at.SETTINGS, at.FIELD), "%s, mended by miss %d" % (field, place + 1), field, before)
-            page.one("#undo").click()
+            page.press("#undo")
             page.until("%s === a[0] && document.querySelectorAll('.near li').length === a[1] && !document.querySelector('[aria-busy]')" % at.SETTINGS, "the settings before", before, misses)
         self.assertGreater(repaired, 0)
 
@@ -208,15 +208,15 @@ class Changing(BrowserTest):
     def test_undo_and_redo_go_through_the_whole_session(self):
         page = self.open("broken/other-letter-case")
         first = page.settings()
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
         second = page.settings()
         page.type_settings(second.replace("Invoices", "Bills"))
         page.wait(lambda: "Bills" in "".join(page.texts("#fields-body .quietly")), "the new name")
-        page.one("#undo").click()
-        page.one("#undo").click()
+        page.press("#undo")
+        page.press("#undo")
         page.wait(lambda: page.settings() == first and page.field("total")[0] == "\u2717 missing", "the settings at first")
-        page.one("#redo").click()
+        page.press("#redo")
         page.wait_for_field("total", "12.3")
         self.assertEqual(page.settings(), second)
 
@@ -236,7 +236,7 @@ class Changing(BrowserTest):
         page.type_settings(page.settings().replace('"obligatory"', '"obligatry"'))
         line = page.settings().split("\n").index('       "obligatry": true') + 1
         page.wait(lambda: "Line %d" % line in page.texts("#lint li button"), "the finding at line %d" % line)
-        page.one("#lint li button").click()
+        page.press("#lint li button")
         self.assertEqual(page.run("return document.querySelector('#editor .CodeMirror').CodeMirror.getCursor().line"), line - 1)
 
     def test_a_key_is_completed_with_its_documentation(self):
@@ -251,22 +251,22 @@ class Changing(BrowserTest):
 
     def test_a_form_changes_a_key_and_tells_what_it_is_for(self):
         page = self.open("broken/other-letter-case")
-        page.one("#tab-form").click()
+        page.press("#tab-form")
         row = page.one('[data-pointer="/extract_presets/0/skip_first_page"]')
         says = page.run("return document.getElementById(arguments[0].getAttribute('aria-describedby')).textContent", row)
         self.assertEqual(says, "the first page is a cover sheet and belongs to no letter")
         row.click()
         page.wait(lambda: '"skip_first_page": true' in page.settings(), "the key")
-        page.one("#undo").click()
+        page.press("#undo")
         page.wait(lambda: "skip_first_page" not in page.settings(), "no key")
 
     def test_what_becomes_better_and_worse_can_be_walked_through(self):
         page = self.open("broken/other-letter-case")
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait(lambda: page.texts("#tab-effect") == ["Effect: 1 better, 0 worse"], "what is better")
-        page.one("#tab-effect").click()
+        page.press("#tab-effect")
         self.assertEqual(page.texts(".effect.better .link"), ["invoice 17.txt"])
-        page.one('[data-key="compareFromHere"]').click()
+        page.press('[data-key="compareFromHere"]')
         page.wait(lambda: page.texts("#tab-effect") == ["Effect: 0 better, 0 worse"], "the comparison from here")
 
 
@@ -276,15 +276,15 @@ class Changing(BrowserTest):
         page.type_settings(page.settings().replace("^Customer:", "^No such label:"))
         page.until("/: 0 better, [1-4] worse/.test(document.querySelector('#tab-effect').innerText)", "the effect")
         page.until("!document.querySelector('#list .waiting')", "all verdicts")
-        page.one("#tab-effect").click()
+        page.press("#tab-effect")
         worse = page.texts(".effect.worse .link")
         self.assertGreater(len(worse), 1)
         opened = "document.querySelector('#list [aria-selected=true] .name').innerText === a[0]"
         for name in worse[1:] + worse[:1]:
-            page.one('[data-key="walkOn"]').click()
+            page.press('[data-key="walkOn"]')
             page.until(opened, "the next one", name)
             self.assertEqual(page.texts('.effect.worse [aria-current="true"]'), [name])
-        page.one('[data-key="walkBack"]').click()
+        page.press('[data-key="walkBack"]')
         page.until(opened, "the last one again", worse[-1])
 
     def test_settings_are_edited_in_a_plain_field_where_there_is_no_editor(self):
@@ -300,22 +300,22 @@ class Changing(BrowserTest):
         page.run("arguments[0].setSelectionRange(arguments[1], arguments[1])", area, len(text))
         area.send_keys("x")
         page.until("document.querySelector('#alert').innerText.includes('Line ')", "the line of the fault")
-        page.one("#lint li button").click()
+        page.press("#lint li button")
         self.assertEqual(page.run("return document.activeElement.selectionStart"), len(text))
         page.keys(at.keys().DELETE)
         page.until("document.querySelector('#alert').innerText === ''", "the end of the complaint")
         self.assertEqual(page.settings(), text)
-        page.wait_until_read().one(".repair").click()
+        page.wait_until_read().press(".repair")
         page.wait_for_field("total", "12.3")
         self.assertIn("(?i)", area.get_attribute("value"))
-        page.one("#undo").click()
+        page.press("#undo")
         page.until("%s === a[0]" % at.SETTINGS, "the settings before", text)
 
 
 class Zones(BrowserTest):
     def test_a_zone_is_dragged_and_the_field_appears(self):
         page = self.open("broken/zone-ends-too-high").wait_for_picture()
-        page.one('#stage .zone[aria-label="zone Text"]').click()
+        page.press('#stage .zone[aria-label="zone Text"]')
         page.drag('#stage .zone[aria-label="zone Text"] .handle.b', (0.5, 0.5), (0, 9))
         page.wait_for_field("total", "12.3")
         bottom = json.loads(page.settings())["extract_presets"][0]["zones"][1]["location"]["bottom"]
@@ -357,12 +357,12 @@ class Zones(BrowserTest):
 
     def test_a_new_zone_is_drawn_and_its_field_is_read(self):
         page = self.open("broken/zone-ends-too-high").wait_for_picture()
-        page.one("#draw").click()
+        page.press("#draw")
         page.drag('#stage .zone[aria-label="address window Address"]', (0.02, 0.02), (60, 18))
         page.one("dialog[open]")
         page.keys("first")
         page.select("dialog[open] select", "0")
-        page.one('dialog[open] button[value="accept"]').click()
+        page.press('dialog[open] button[value="accept"]')
         page.wait_for_field("first", "Anna Arnold")
 
     def test_a_new_zone_is_made_by_keyboard_alone(self):
@@ -482,10 +482,10 @@ class Saving(BrowserTest):
     def test_what_differs_is_shown_before_it_is_saved(self):
         page = self.open("broken/other-letter-case")
         before = self.bench.text()
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
         self.assertEqual(self.bench.text(), before)
-        page.one("#save").click()
+        page.press("#save")
         self.assertEqual(len(page.find(".diff tr.gone")), 1)
         self.assertIn("(?i)", page.texts(".diff tr.new .text")[0])
         self.accept(page)
@@ -497,13 +497,13 @@ class Saving(BrowserTest):
         text = self.bench.text()
         other = at.Page(self.second_tab(), self.bench.url).wait_until_read()
         other.type_settings(text.replace("Invoices", "Bills"))
-        other.one("#save").click()
+        other.press("#save")
         self.accept(other)
         other.wait(lambda: other.texts("#message") == ["Saved in %s." % self.bench.settings], "the saving")
         self.leave_second_tab()
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
-        page.one("#save").click()
+        page.press("#save")
         self.accept(page)
         page.wait(lambda: len(page.find("dialog[open] .diff")) == 3, "both sides")
         self.assertIn("Bills", page.texts(".diff")[0])
@@ -516,18 +516,18 @@ class Saving(BrowserTest):
         page = self.open("broken/other-letter-case")
         theirs = self.bench.text().replace("Invoices", "Bills")
         self.bench.write(theirs)
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
         mine = page.settings()
-        page.one("#save").click()
+        page.press("#save")
         self.accept(page)
-        page.one('dialog[open] [data-text="takeTheirs"]').click()
+        page.press('dialog[open] [data-text="takeTheirs"]')
         page.until("%s === a[0] && %s[0] === '\u2717 missing'" % (at.SETTINGS, at.FIELD.replace("a[0]", "a[1]")), "their settings", theirs, "total")
         self.assertEqual(page.find("dialog[open]"), [])
         self.assertNotIn("not saved", page.texts("#settings-name")[0])
-        page.one("#undo").click()
+        page.press("#undo")
         page.until("%s === a[0]" % at.SETTINGS, "one's own", mine)
-        page.one("#save").click()
+        page.press("#save")
         self.assertIn("(?i)", "".join(page.texts(".diff tr.new .text")))
         self.accept(page)
         page.until("document.querySelector('#message').innerText.startsWith('Saved in ')", "the saving")
@@ -536,7 +536,7 @@ class Saving(BrowserTest):
     def test_what_is_shown_is_kept_as_right_by_one_button(self):
         page = self.open("office")
         page.wait_for_field("number", "2024-17")
-        page.one("#golden").click()
+        page.press("#golden")
         page.wait(lambda: page.texts("#message") == ["Kept in Invoice 17.pdf.expected.json."], "the case")
         self.assertTrue(os.path.exists(os.path.join(self.bench.folder, "Invoice 17.pdf.expected.json")))
         page.type_settings(page.settings().replace("^Invoice:", "^No such label:"))
@@ -546,7 +546,7 @@ class Saving(BrowserTest):
         bench = self.begin("office")
         bench.write("{}\n")
         page = self.page_of(bench)
-        page.one("#propose").click()
+        page.press("#propose")
         page.one("dialog[open]")
         ticks = page.find("dialog[open] .tick")
         self.assertGreater(len(ticks), 2)
@@ -568,15 +568,15 @@ class FiveMinutes(BrowserTest):
         bench = self.begin("office")
         bench.write("{}\n")
         page = self.page_of(bench).wait_for_picture()
-        page.one("#propose").click()
+        page.press("#propose")
         self.assertEqual(page.one("dialog[open] .wide").get_attribute("value"), "Invoice \\d+\\.pdf")
         self.assertIn("Invoice 17.pdf, Invoice 18.pdf, Invoice 19.pdf", page.texts("dialog[open]")[0])
-        page.one('dialog[open] button[value="accept"]').click()
+        page.press('dialog[open] button[value="accept"]')
         page.wait_for_field("number", "2024-17")
         proposed = page.settings()
         page.drag('#stage .zone[aria-label="address window _Address"]', (1.5, 0.5), (20, 10))
         self.assertEqual(page.one("#zone-form input").get_attribute("value"), "Email")
-        page.one("#draw").click()
+        page.press("#draw")
         self.assertEqual(page.settings(), proposed)
         page.drag('#stage .zone[aria-label="address window _Address"]', (1.03, -0.15), (85, 24))
         page.select("dialog[open] select", "2")
@@ -584,10 +584,10 @@ class FiveMinutes(BrowserTest):
         self.assertEqual(choice, "what follows \u201cCustomer:\u201d: C-1008")
         self.assertEqual(page.one("dialog[open] input[autocomplete=off]").get_attribute("value"), "customer")
         self.write_picture(page, "workbench-new-field.png")
-        page.one('dialog[open] button[value="accept"]').click()
+        page.press('dialog[open] button[value="accept"]')
         page.wait_for_field("customer", "C-1008")
         page.chord(at.keys().CONTROL, "s")
-        page.one('dialog[open] button[value="accept"]').click()
+        page.press('dialog[open] button[value="accept"]')
         page.until("document.querySelector('#message').innerText.startsWith('Saved in ')", "the saving")
         letter = [VLMAIL, "letter", os.path.join(bench.folder, "Invoice 17.pdf"), "--settings", bench.settings, "--json"]
         read = json.loads(subprocess.run(letter, stdout=subprocess.PIPE, check=True).stdout)["letters"][0]
@@ -621,9 +621,9 @@ class AtANode(BrowserTest):
         self.assertNotIn("pack_presets", page.settings())
         self.assertIn("Invoices", page.texts("#fields-body .quietly")[0])
         self.assertEqual(page.find("#lint li.error"), [])
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
-        page.one("#save").click()
+        page.press("#save")
         self.assertIn("(?i)", page.texts(".diff tr.new .text")[0])
         self.accept(page)
         page.wait(lambda: page.texts("#message") == ["Saved in %s." % self.NODE], "the saving")
@@ -633,13 +633,13 @@ class AtANode(BrowserTest):
         page = self.page_of(self.begin_at_node())
         other = at.Page(self.second_tab(), self.begin_at_node().url).wait_until_read()
         other.type_settings(other.settings().replace("invoice.*", "(invoice|bill).*"))
-        other.one("#save").click()
+        other.press("#save")
         self.accept(other)
         other.wait(lambda: other.texts("#message") == ["Saved in %s." % self.NODE], "the saving")
         self.leave_second_tab()
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
-        page.one("#save").click()
+        page.press("#save")
         self.accept(page)
         page.wait(lambda: len(page.find("dialog[open] .diff")) == 3, "both sides")
         self.assertIn("bill", page.texts(".diff")[0])
@@ -652,11 +652,11 @@ class AtANode(BrowserTest):
         secret = self.service.token("reader", "read", self.NODE)
         bench = self.begin("broken/other-letter-case", None, "--node", self.NODE, *self.service.options_with(secret))
         page = self.page_of(bench)
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
         changed = page.settings()
         for said in ("this needs the role settings at " + self.NODE, "Nobody answers there"):
-            page.one("#save").click()
+            page.press("#save")
             self.accept(page)
             page.wait(lambda: said in page.texts("#alert")[0], "the line %r" % said)
             self.assertEqual(page.settings(), changed)
@@ -706,7 +706,7 @@ class Safety(BrowserTest):
         self.assertIn("<img", page.texts("#list .name")[0])
         self.assertIn("<img", "".join(page.texts("#fields-body")))
         for tab in ("#tab-form", "#tab-effect", "#tab-json"):
-            page.one(tab).click()
+            page.press(tab)
         self.assertEqual(page.run("return [...document.querySelectorAll('img')].length"), 1)
         self.assertNotIn("taken", page.run("return document.title"))
         self.assertEqual(page.logged(), [])
@@ -748,7 +748,7 @@ class Access(BrowserTest):
     def test_whatever_can_be_operated_has_a_role_and_a_name(self):
         page = self.open("broken/other-letter-case")
         for tab in ("#tab-json", "#tab-form", "#tab-effect"):
-            page.one(tab).click()
+            page.press(tab)
             nodes = self.driver.execute_cdp_cmd("Accessibility.getFullAXTree", {})["nodes"]
             operated = {"button", "textbox", "checkbox", "combobox", "listbox", "option", "spinbutton", "searchbox", "tab", "link"}
             nameless = [
@@ -772,9 +772,9 @@ class Access(BrowserTest):
         page.type_settings(text.replace('"pack_preset"', 'pack_preset"', 1))
         page.until("document.querySelector('#alert').innerText.startsWith('\u2717 Zeile 5: ')", "the line of the fault")
         page.type_settings(text)
-        page.wait_until_read().one(".repair").click()
+        page.wait_until_read().press(".repair")
         page.until("document.querySelector('#tab-effect').innerText === 'Wirkung: 1 besser, 0 schlechter'", "the effect")
-        page.one("#save").click()
+        page.press("#save")
         self.assertEqual(page.texts("dialog[open] h2, dialog[open] button"), ["Einstellungen sichern", "Sichern", "Abbrechen"])
 
     def test_no_control_is_lost_at_twice_the_size(self):
@@ -789,7 +789,7 @@ class Access(BrowserTest):
                 .filter((one) => one.closest('.CodeMirror') === null).map((one) => one.outerHTML);
         """
         self.assertEqual(page.run(script), [])
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("total", "12.3")
 
     def test_texts_can_be_read_in_light_and_dark(self):
@@ -827,11 +827,11 @@ class Pictures(BrowserTest):
             bench.write(bench.text().replace("^Customer:", "^customer:"))
             page = self.page_of(bench).wait_for_picture()
             page.wait(lambda: "not read" not in page.texts("#counts")[0], "the verdicts")
-            page.one('#stage .zone[aria-label="zone Details"]').click()
+            page.press('#stage .zone[aria-label="zone Details"]')
             self.write_picture(page, "workbench-%s.png" % scheme)
-        page.one(".repair").click()
+        page.press(".repair")
         page.wait_for_field("customer", "C-1008")
-        page.one("#save").click()
+        page.press("#save")
         page.one(".diff")
         self.write_picture(page, "workbench-save.png")
 
