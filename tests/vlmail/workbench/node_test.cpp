@@ -5,6 +5,7 @@
 #include "programs/vlmail/workbench/session.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/vlmail/run_vlmail.h"
+#include "tests/vlmail/workbench/session_answers.h"
 #include "tests/vlserviced/json_help.h"
 #include "tests/vlserviced/service_process.h"
 #include "vlservice/json/json_text.h"
@@ -86,11 +87,7 @@ protected:
     Answer answer(std::string const& what, json::Object const& query) {
         if (!session_)
             begin();
-        std::optional<Answer> got;
-        session_->answer(what, json::toText(query), [&](Answer one) { got = std::move(one); });
-        while (!got)
-            io_.run_one();
-        return *got;
+        return answerOf(io_, *session_, what, query);
     }
     json::Object ask(std::string const& what, json::Object const& query) {
         Answer const got = answer(what, query);

@@ -3,6 +3,7 @@
 #include "programs/vlmail/workbench/document_list.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/without_rights.h"
+#include "tests/vlmail/workbench/session_answers.h"
 #include "vlservice/json/json_text.h"
 
 #include <boost/asio/io_context.hpp>
@@ -13,11 +14,9 @@
 #include <gmock/gmock.h>
 #include <iterator>
 #include <memory>
-#include <optional>
 #include <regex>
 #include <string>
 #include <system_error>
-#include <utility>
 #include <vector>
 
 namespace {
@@ -55,11 +54,7 @@ protected:
         if (!session_)
             session_ = std::make_unique<Session>(io_, Folders{folder_.path()}, VlMail::JobLimits(),
                                                  settingsInFile(path("node.json")));
-        std::optional<Answer> got;
-        session_->answer(what, json::toText(query), [&](Answer one) { got = std::move(one); });
-        while (!got)
-            io_.run_one();
-        return *got;
+        return answerOf(io_, *session_, what, query);
     }
     json::Object ask(std::string const& what, json::Object const& query) {
         Answer const got = answer(what, query);

@@ -40,6 +40,16 @@ class BrowserTest(unittest.TestCase):
     def accept(self, page):
         page.press('dialog[open] button[value="accept"]')
 
+    def see_both_sides(self, page, theirs):
+        """Saves a repair over what somebody else has saved meanwhile."""
+        page.press(".repair")
+        page.wait_for_field("total", "12.3")
+        page.press("#save")
+        self.accept(page)
+        page.wait(lambda: len(page.find("dialog[open] .diff")) == 3, "both sides")
+        self.assertIn(theirs, page.texts(".diff")[0])
+        self.assertIn("(?i)", page.texts(".diff")[1])
+
     def second_tab(self):
         self.first = self.driver.current_window_handle
         self.driver.switch_to.new_window("tab")
